@@ -1,0 +1,20 @@
+// Names and paths as text for a person.
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+
+namespace tallowmere::cli {
+
+// An HFS name as UTF-8.
+std::string Utf8OfHFSName(std::string_view name);
+
+// The text with each control character as a backslash and three octal digits, so that no name can
+// break a table or steer a terminal.
+std::string Printable(std::string_view text);
+
+// How many characters the UTF-8 text has.
+std::size_t CharacterCount(std::string_view text);
+
+}  // namespace tallowmere::cli

@@ -1,0 +1,27 @@
+// tallowmere-cli: the service's requests for people and scripts.
+
+#include <CLI/CLI.hpp>
+
+#include "cli/Commands.h"
+
+namespace {
+constexpr int kWrongUsage = 2;
+}
+
+int main(int argumentCount, char** arguments) {
+  CLI::App app("Asks the tallowmere service about files and volumes.", "tallowmere-cli");
+  app.require_subcommand(1);
+
+  tallowmere::ClientOptions options;
+  app.add_option("--service", options.service, "The service's program")->type_name("PATH");
+  const CLI::App* const volumes =
+      app.add_subcommand("volumes", "Print number, name and mount point of every volume");
+
+  try {
+    app.parse(argumentCount, arguments);
+  } catch (const CLI::ParseError& error) {
+    return app.exit(error) == 0 ? 0 : kWrongUsage;
+  }
+  if (volumes->parsed()) return tallowmere::cli::PrintVolumes(options);
+  return kWrongUsage;
+}

@@ -1,0 +1,151 @@
+#include "client/Client.h"
+
+#include <unistd.h>
+
+#include <array>
+#include <climits>
+#include <cstdlib>
+#include <cstring>
+#include <type_traits>
+#include <utility>
+
+#include "service/Protocol.h"
+
+namespace tallowmere {
+namespace {
+
+constexpr std::string_view kProgramName = "tallowmere";
+
+bool IsProgram(const std::string& path) {
+  return access(path.c_str(), X_OK) == 0;
+}
+
+std::string BesideThisProgram() {
+  std::array<char, PATH_MAX> own;
+  const ssize_t length = readlink("/proc/self/exe", own.data(), own.size());
+  if (length <= 0) return {};
+  const std::string_view path(own.data(), static_cast<std::size_t>(length));
+  return std::string(path.substr(0, path.rfind('/') + 1)).append(kProgramName);
+}
+
+std::string OnSearchPath() {
+  const char* const variable = std::getenv("PATH");
+  std::string_view folders = variable == nullptr ? "" : variable;
+  while (!folders.empty()) {
+    const std::size_t end = std::min(folders.find(':'), folders.size());
+    std::string path(folders.substr(0, end));
+    path.append("/").append(kProgramName);
+    if (end > 0 && IsProgram(path)) return path;
+    folders.remove_prefix(std::min(end + 1, folders.size()));
+  }
+  return {};
+}
+
+std::string FindService() {
+  std::string beside = BesideThisProgram();
+  return IsProgram(beside) ? beside : OnSearchPath();
+}
+
+}  // namespace
+
+// One request and its response. An error stays: what follows it does nothing.
+class Client::Exchange {
+ public:
+  Exchange(Client& client, protocol::RequestCode code)
+      : mClient(client), mDeadline(std::chrono::steady_clock::now() + client.mDeadline) {
+    Put<std::uint16_t>(code);
+  }
+
+  template <class Number>
+  void Put(Number number) {
+    mRequest.append(reinterpret_cast<const char*>(&number), sizeof number);
+  }
+
+  // A counted string with its NUL. REQUIRES: below 65535 bytes.
+  void PutString(std::string_view text) {
+    Put(static_cast<std::uint16_t>(text.size() + 1));
+    mRequest.append(text).push_back('\0');
+  }
+
+  void Send() {
+    if (mClient.mFailure) return;
+    if (const auto sent = mClient.mService.Send(mRequest, mDeadline); !sent) {
+      mClient.mFailure = sent.Failure();
+    }
+  }
+
+  template <class Number>
+  Number Take() {
+    Number number{};
+    const std::string bytes = TakeBytes(sizeof number);
+    if (bytes.size() == sizeof number) std::memcpy(&number, bytes.data(), sizeof number);
+    return number;
+  }
+
+  // A counted string without its NUL.
+  std::string TakeString() {
+    std::string text = TakeBytes(Take<std::uint16_t>());
+    if (!text.empty()) text.pop_back();
+    return text;
+  }
+
+  // The response is whole: `value`, or what went wrong before.
+  template <class T>
+  Result<T> Finish(T value) {
+    const std::string trailer = TakeBytes(protocol::kTrailer.size());
+    if (mClient.mFailure) return *mClient.mFailure;
+    if (trailer != protocol::kTrailer) {
+      mClient.mFailure = Error{"the service's answer does not end as the protocol says"};
+      return *mClient.mFailure;
+    }
+    return value;
+  }
+
+ private:
+  std::string TakeBytes(std::size_t size) {
+    if (mClient.mFailure) return {};
+    auto bytes = mClient.mService.Receive(size, mDeadline);
+    if (bytes) return *std::move(bytes);
+    mClient.mFailure = bytes.Failure();
+    return {};
+  }
+
+  Client& mClient;
+  Deadline mDeadline;
+  std::string mRequest;
+};
+
+Result<Client> Client::Start(const ClientOptions& options) {
+  const std::string path = options.service.empty() ? FindService() : options.service;
+  if (path.empty()) {
+    return Error{"the service \"tallowmere\" is neither beside this program nor on PATH"};
+  }
+  auto service = ServiceProcess::Start(path);
+  if (!service) return service.Failure();
+  return Client(*std::move(service), options.deadline);
+}
+
+Client::Client(ServiceProcess service, std::chrono::milliseconds deadline)
+    : mService(std::move(service)), mDeadline(deadline) {}
+
+Result<std::optional<std::int16_t>> Client::GetVolRefnumByHFSName(std::string_view name) {
+  if (name.size() >= protocol::kLongestVolumeName || name.find('\0') != std::string_view::npos) {
+    return std::optional<std::int16_t>{};
+  }
+  Exchange exchange(*this, protocol::kRequestGetVolRefnumByHFSName);
+  exchange.PutString(name);
+  exchange.Send();
+  const auto number = exchange.Take<std::int16_t>();
+  return exchange.Finish(number == protocol::kNoVolume ? std::nullopt : std::optional(number));
+}
+
+Result<std::optional<std::string>> Client::GetHFSVolumeName(std::int16_t number) {
+  Exchange exchange(*this, protocol::kRequestGetHFSVolumeName);
+  exchange.Put(number);
+  exchange.Send();
+  const bool found = exchange.Take<std::uint8_t>() != 0;
+  std::string name = exchange.TakeString();
+  return exchange.Finish(found ? std::optional(std::move(name)) : std::nullopt);
+}
+
+}  // namespace tallowmere

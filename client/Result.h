@@ -1,0 +1,38 @@
+// A value, or the reason why there is none.
+#pragma once
+
+#include <string>
+#include <utility>
+#include <variant>
+
+namespace tallowmere {
+
+struct Error {
+  std::string message;  // one sentence for a person, without a final stop
+};
+
+template <class T>
+class [[nodiscard]] Result {
+ public:
+  // Implicit, so that a function returns either one as it stands.
+  Result(T value) : mContent(std::move(value)) {}      // NOLINT(google-explicit-constructor)
+  Result(Error error) : mContent(std::move(error)) {}  // NOLINT(google-explicit-constructor)
+
+  bool HasValue() const { return std::holds_alternative<T>(mContent); }
+  explicit operator bool() const { return HasValue(); }
+
+  // REQUIRES: HasValue().
+  T& operator*() & { return std::get<T>(mContent); }
+  T&& operator*() && { return std::get<T>(std::move(mContent)); }
+  const T& operator*() const& { return std::get<T>(mContent); }
+  T* operator->() { return &std::get<T>(mContent); }
+  const T* operator->() const { return &std::get<T>(mContent); }
+
+  // REQUIRES: !HasValue().
+  const Error& Failure() const { return std::get<Error>(mContent); }
+
+ private:
+  std::variant<T, Error> mContent;
+};
+
+}  // namespace tallowmere

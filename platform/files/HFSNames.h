@@ -1,0 +1,28 @@
+// What an item is called in HFS terms: the one place where a Linux name becomes a File Manager
+// name.
+//
+// An HFS name is Mac Roman bytes in which ':' separates and '/' is an ordinary character, the other
+// way round than in a Linux name; ':' and '/' are exchanged on the way.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace tallowmere::files {
+
+// The longest name, in bytes, that an FSSpec can hold, and that a Str255 can.
+inline constexpr std::size_t kLongestSpecName = 63;
+inline constexpr std::size_t kLongestStr255Name = 255;
+
+// The name itself in HFS form, when Mac Roman has all of it and it takes at most `limit` bytes.
+std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t limit);
+
+// What stands for a name that has no plain form, at most 31 bytes: as much of the name as fits, '?'
+// for what Mac Roman lacks, "#", the node id in capital hexadecimal, and the extension if it has
+// one of 1 to 5 characters that all can be encoded: "A very long name th#1B4A3F.aif".
+std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID);
+
+}  // namespace tallowmere::files

@@ -1,0 +1,43 @@
+// The kernel's table of mounted file systems as text, and which volumes it describes.
+//
+// Pure: nothing here opens or asks anything but the text it is given and the caller's `isFolder`.
+// The text's format is in proc(5), /proc/[pid]/mountinfo.
+#pragma once
+
+#include <sys/types.h>
+
+#include <cstddef>
+#include <functional>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace tallowmere::files {
+
+// One line of the table.
+struct Mount {
+  int id;            // unique while mounted
+  int parent;        // the mount that this one is mounted on
+  dev_t device;      // of the file system; what stat reports can differ (subvolumes, overlays)
+  std::string root;  // the folder of the file system that is shown at the mount point
+  std::string mountPoint;  // absolute, as this process sees it
+  std::string type;        // of the file system: "ext4", "tmpfs", …
+};
+
+// The lines in the kernel's order, escapes undone. A malformed line is passed over.
+std::vector<Mount> ParseMountInfo(std::string_view text);
+
+// False for the file systems that are kernel interfaces and hold no user's files.
+bool HoldsFiles(std::string_view fileSystemType);
+
+// The index of the mount that is the place of each volume, in the order of volumes: the volume of
+// "/" first, then the kernel's order. Mounts of one file system are one volume; its place is the
+// first reachable mount of the file system's root folder, else its first reachable mount for which
+// `isFolder` says true (a file can be mounted alone). `isFolder` is asked for no other mount.
+//
+// Reachable: not covered by another mount at its own mount point, nor by one further up the way.
+std::vector<std::size_t> VolumePlaces(const std::vector<Mount>& mounts,
+                                      const std::function<bool(const Mount&)>& isFolder);
+
+}  // namespace tallowmere::files

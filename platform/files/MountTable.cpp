@@ -1,0 +1,181 @@
+#include "files/MountTable.h"
+
+#include <fcntl.h>
+#include <linux/fs.h>
+#include <poll.h>
+#include <sys/ioctl.h>
+#include <sys/stat.h>
+#include <sys/sysmacros.h>
+
+#include <algorithm>
+#include <array>
+#include <limits>
+#include <utility>
+
+#include "files/HFSNames.h"
+#include "files/NodeID.h"
+
+namespace tallowmere::files {
+namespace {
+
+constexpr VolumeNumber kLowestNumber = std::numeric_limits<VolumeNumber>::min();
+
+// How often a table that changes while it is read is read again before it is taken as it is. The
+// next question finds the change signalled.
+constexpr int kReadAttempts = 8;
+
+// What the volume of "/" is called when its file system has no label.
+constexpr const char* kUnlabelledRoot = "Root";
+
+// The kernel answers from what it has: neither a dead server nor an automounter is waited for.
+constexpr int kWithoutWaiting = AT_STATX_DONT_SYNC | AT_NO_AUTOMOUNT;
+
+bool IsFolder(const Mount& mount) {
+  struct statx about {};
+  return statx(AT_FDCWD, mount.mountPoint.c_str(), kWithoutWaiting, STATX_TYPE, &about) == 0 &&
+         S_ISDIR(about.stx_mode);
+}
+
+// The mount of "/" where the table does not tell: there is no table, or "/" is a folder inside a
+// mount (chroot).
+Mount RootMount() {
+  Mount root{};
+  root.mountPoint = "/";
+  struct statx about {};
+  if (statx(AT_FDCWD, "/", kWithoutWaiting, STATX_TYPE | STATX_MNT_ID, &about) == 0) {
+    root.device = makedev(about.stx_dev_major, about.stx_dev_minor);
+    if ((about.stx_mask & STATX_MNT_ID) != 0) root.id = static_cast<int>(about.stx_mnt_id);
+  }
+  return root;
+}
+
+bool HasRoot(const std::vector<Mount>& mounts) {
+  return std::any_of(mounts.begin(), mounts.end(),
+                     [](const Mount& mount) { return mount.mountPoint == "/"; });
+}
+
+std::string LabelOfRoot() {
+  const Descriptor root(open("/", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  std::array<char, FSLABEL_MAX + 1> label{};
+  if (!root.IsOpen() || ioctl(root.Get(), FS_IOC_GETFSLABEL, label.data()) != 0) return {};
+  return label.data();
+}
+
+std::string LinuxNameOf(const std::string& mountPoint) {
+  if (mountPoint != "/") return mountPoint.substr(mountPoint.rfind('/') + 1);
+  std::string label = LabelOfRoot();
+  if (label.empty()) return kUnlabelledRoot;
+  // A label may hold what no name of an item can.
+  std::replace(label.begin(), label.end(), '/', ':');
+  return label;
+}
+
+}  // namespace
+
+Volume::Volume(VolumeNumber number, const Mount& place)
+    : mNumber(number), mMountPoint(place.mountPoint) {}
+
+const std::string& Volume::Name() const {
+  if (!mName) {
+    const std::string name = LinuxNameOf(mMountPoint);
+    auto plain = PlainHFSName(name, kLongestSpecName);
+    mName = plain ? *std::move(plain) : ShortHFSName(name, kRootFolderID);
+  }
+  return *mName;
+}
+
+MountTable& MountTable::OfThisProcess() {
+  static MountTable table;
+  return table;
+}
+
+MountTable::MountTable(std::string source) : mSource(std::move(source)) {}
+
+const Volume* MountTable::AtIndex(std::size_t index) {
+  const bool goesOn = mLastIndex && index == *mLastIndex + 1;
+  if (!goesOn) Refresh();
+  mLastIndex = index;
+  return index < mVolumes.size() ? &mVolumes[index] : nullptr;
+}
+
+const Volume* MountTable::WithNumber(VolumeNumber number) {
+  Refresh();
+  if (number == 0) return &mVolumes.front();
+  const auto found = std::find_if(mVolumes.begin(), mVolumes.end(), [number](const Volume& volume) {
+    return volume.Number() == number;
+  });
+  return found == mVolumes.end() ? nullptr : &*found;
+}
+
+void MountTable::Refresh() {
+  if (!IsCurrent()) Read();
+}
+
+bool MountTable::IsCurrent() const {
+  if (!mDescriptor.IsOpen()) return false;
+  pollfd table{mDescriptor.Get(), POLLPRI, 0};
+  return poll(&table, 1, 0) == 0;
+}
+
+void MountTable::Read() {
+  mLastIndex.reset();
+  std::vector<Mount> mounts;
+  for (int attempt = 0; attempt < kReadAttempts; ++attempt) {
+    const auto text = ReadSource();
+    mounts = text ? ParseMountInfo(*text) : std::vector<Mount>{};
+    // The text comes in several pieces; a mount made between two of them can be missing or shift
+    // others out. The kernel has signalled it, so a table that is current now was whole.
+    if (!text || IsCurrent()) break;
+  }
+  if (!HasRoot(mounts)) mounts.insert(mounts.begin(), RootMount());
+
+  mVolumes.clear();
+  for (const std::size_t place : VolumePlaces(mounts, IsFolder)) {
+    if (const auto number = NumberOf(mounts[place], mounts)) {
+      mVolumes.emplace_back(*number, mounts[place]);
+    }
+  }
+}
+
+// None, and the descriptor closed, when it cannot be opened or read whole.
+std::optional<std::string> MountTable::ReadSource() {
+  if (!mDescriptor.IsOpen()) mDescriptor = Descriptor(open(mSource.c_str(), O_RDONLY | O_CLOEXEC));
+  if (!mDescriptor.IsOpen()) return std::nullopt;
+  std::string text;
+  ssize_t got = 0;
+  do {
+    std::array<char, 16384> piece;
+    got = pread(mDescriptor.Get(), piece.data(), piece.size(), static_cast<off_t>(text.size()));
+    if (got > 0) text.append(piece.data(), static_cast<std::size_t>(got));
+  } while (got > 0);
+  if (got == 0) return text;
+  mDescriptor.Close();
+  return std::nullopt;
+}
+
+// None when every number is taken.
+std::optional<VolumeNumber> MountTable::NumberOf(const Mount& place,
+                                                 const std::vector<Mount>& mounts) {
+  const auto assigned = mAssignedNumbers.find(place.id);
+  if (assigned != mAssignedNumbers.end()) return assigned->second;
+
+  const auto isAssigned = [this](int number) {
+    return std::any_of(mAssignedNumbers.begin(), mAssignedNumbers.end(),
+                       [number](const auto& entry) { return entry.second == number; });
+  };
+  if (place.id > 0 && -place.id >= kLowestNumber && !isAssigned(-place.id)) {
+    return static_cast<VolumeNumber>(-place.id);
+  }
+  const auto isMountID = [&mounts](int id) {
+    return std::any_of(mounts.begin(), mounts.end(),
+                       [id](const Mount& mount) { return mount.id == id; });
+  };
+  for (int number = kLowestNumber; number < 0; ++number) {
+    if (isAssigned(number) || isMountID(-number)) continue;
+    mAssignedNumbers[place.id] = static_cast<VolumeNumber>(number);
+    return static_cast<VolumeNumber>(number);
+  }
+  return std::nullopt;
+}
+
+}  // namespace tallowmere::files

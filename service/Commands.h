@@ -1,0 +1,15 @@
+// The commands, one function each, in three movements: take the fields, do the work, put the
+// answer.
+//
+// A command starts its work only after its last field has arrived: when the channel has failed by
+// then it returns at once. The trailer is not the command's.
+#pragma once
+
+#include "service/Channel.h"
+
+namespace tallowmere::service {
+
+void GetVolRefnumByHFSName(Channel& channel);
+void GetHFSVolumeName(Channel& channel);
+
+}  // namespace tallowmere::service

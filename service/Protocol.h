@@ -1,0 +1,38 @@
+// What travels on the two pipes: the constants that the service and its clients share.
+//
+// All integers are in the byte order of the machine that runs both processes. A request is its code
+// (16 bits) and the fields of its command; a response is the command's fields and the trailer.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+
+namespace tallowmere::protocol {
+
+enum RequestCode : std::uint16_t {
+  kRequestQuit = 0,
+  kRequestMakeFullPath = 1,
+  kRequestMakeFileRefFromPath = 2,
+  kRequestGetVolRefnumByHFSName = 3,
+  kRequestGetHFSVolumeName = 4,
+  kRequestGetHFSName = 5,
+  kRequestAddHFSName = 6,
+  kRequestGetFSSpec = 7,
+  kRequestSetFileRefFromFSSpecData = 8,
+  kRequestSetFileRefFromFSSpec = 9,
+  kRequestGetAIFFExportSettings = 10,
+};
+
+inline constexpr std::uint16_t kLastRequestCode = kRequestGetAIFFExportSettings;
+
+// Ends every complete response, and nothing else.
+inline constexpr std::string_view kTrailer = "MWLT";
+
+// The longest volume name in a request, in bytes with its NUL.
+inline constexpr std::size_t kLongestVolumeName = 256;
+
+// Stands for "no volume" where a volume reference number is expected.
+inline constexpr std::int16_t kNoVolume = 32767;
+
+}  // namespace tallowmere::protocol
