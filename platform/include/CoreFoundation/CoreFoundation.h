@@ -83,10 +83,10 @@ CFIndex CFStringGetMaximumSizeForEncoding(CFIndex length, CFStringEncoding encod
 
 // The string of a constant, made on its first use and never ended. REQUIRES: a literal of UTF-8
 // text. A process without memory for its constants ends.
-#define CFSTR(literal)                                                               \
-  ([]() -> CFStringRef {                                                             \
-    static const CFStringRef constant = __CFStringMakeConstantString("" literal ""); \
-    return constant;                                                                 \
+#define CFSTR(literal)                                                                \
+  ([]() -> CFStringRef {                                                              \
+    static const CFStringRef sConstant = __CFStringMakeConstantString("" literal ""); \
+    return sConstant;                                                                 \
   }())
 CFStringRef __CFStringMakeConstantString(const char* utf8);
 
