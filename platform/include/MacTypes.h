@@ -29,6 +29,9 @@ using ConstStr255Param = const unsigned char*;
 // Result codes, each with the published constant's name.
 enum : OSErr {
   noErr = 0,
-  nsvErr = -35,  // no such volume
-  ioErr = -36,   // input or output failed
+  nsvErr = -35,                // no such volume
+  ioErr = -36,                 // input or output failed
+  fnfErr = -43,                // no such item
+  errFSBadFSRef = -1401,       // a reference to no item
+  errFSRefsDifferent = -1420,  // two references to different items
 };

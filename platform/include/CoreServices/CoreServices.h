@@ -6,6 +6,8 @@
 #include <CoreFoundation/CoreFoundation.h>
 #include <MacTypes.h>
 
+#include <cstddef>
+
 extern "C" {
 
 // --- Pascal strings ---------------------------------------------------------------------------
@@ -56,4 +58,49 @@ using FSVolumeInfoParamPtr = FSVolumeInfoParam*;
 
 // The number of the volume at an index or with a number, with the results of PBHGetVInfoSync.
 OSErr PBGetVolumeInfoSync(FSVolumeInfoParamPtr paramBlock);
+
+// --- Files ------------------------------------------------------------------------------------
+
+// A reference to an existing item, taken by CFURLGetFSRef. It follows its item through a rename
+// within the process. All bytes zero: no item.
+struct FSRef {
+  UInt8 hidden[80];
+};
+static_assert(sizeof(FSRef) == 80);
+
+// An item by its volume, the id of the folder that holds it, and its HFS name in that folder. It
+// may name an item that does not exist yet.
+#pragma pack(push, 2)
+struct FSSpec {
+  SInt16 vRefNum;
+  SInt32 parID;
+  Str63 name;
+};
+#pragma pack(pop)
+static_assert(sizeof(FSSpec) == 70);
+static_assert(offsetof(FSSpec, parID) == 2);
+static_assert(offsetof(FSSpec, name) == 6);
+
+// Whether two references are to the same item, by what they hold: noErr, or errFSRefsDifferent.
+// errFSBadFSRef when one of them is null or to no item.
+OSErr FSCompareFSRefs(const FSRef* first, const FSRef* second);
+
+// --- Aliases ----------------------------------------------------------------------------------
+//
+// Only a Finder alias is an alias, and Linux has none: a symbolic link is not one.
+
+enum : unsigned long { kResolveAliasFileNoUI = 1 };
+
+// Puts the target of the alias `item` in its place; with `resolveAliasChains` the last one of a
+// chain. Says, each unless null, whether the target is a folder and whether `item` was an alias at
+// all: never, so noErr leaves `item` as it is, without a look at whether it still exists. fnfErr
+// when `item` is null or no item; nothing is written then.
+OSErr FSResolveAliasFile(FSRef* item, Boolean resolveAliasChains, Boolean* targetIsFolder,
+                         Boolean* wasAliased);
+
+// The same; `mountFlags` (0 or kResolveAliasFileNoUI) says whether volumes that have to be mounted
+// may ask the user.
+OSErr FSResolveAliasFileWithMountFlags(FSRef* item, Boolean resolveAliasChains,
+                                       Boolean* targetIsFolder, Boolean* wasAliased,
+                                       unsigned long mountFlags);
 }

@@ -3,7 +3,7 @@
 #include <utility>
 
 #include "TestStrings.h"
-#include "foundation/CFOwned.h"
+#include "Source/CFOwned.h"
 
 namespace tallowmere::foundation::test {
 namespace {

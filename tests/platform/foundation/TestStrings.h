@@ -7,7 +7,7 @@
 #include <string>
 #include <string_view>
 
-#include "foundation/CFOwned.h"
+#include "Source/CFOwned.h"
 
 namespace tallowmere::foundation::test {
 

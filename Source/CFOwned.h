@@ -5,8 +5,6 @@
 
 #include <utility>
 
-namespace tallowmere::foundation {
-
 // Holds one reference to an object, or null, and gives it back at its end:
 //   const CFOwned name(CFURLCopyLastPathComponent(url));
 template <typename Reference>
@@ -35,5 +33,3 @@ class CFOwned {
  private:
   Reference mObject = nullptr;
 };
-
-}  // namespace tallowmere::foundation
