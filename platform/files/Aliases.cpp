@@ -5,16 +5,16 @@
 
 using tallowmere::files::Unpack;
 
-OSErr FSResolveAliasFile(FSRef* reference, Boolean, Boolean* targetIsFolder, Boolean* wasAliased) {
-  const auto item = Unpack(reference);
-  if (!item) return fnfErr;
-  if (targetIsFolder != nullptr) *targetIsFolder = S_ISDIR(item->type);
+OSErr FSResolveAliasFile(FSRef* item, Boolean, Boolean* targetIsFolder, Boolean* wasAliased) {
+  const auto found = Unpack(item);
+  if (!found) return fnfErr;
+  if (targetIsFolder != nullptr) *targetIsFolder = S_ISDIR(found->type);
   if (wasAliased != nullptr) *wasAliased = false;
   return noErr;
 }
 
-OSErr FSResolveAliasFileWithMountFlags(FSRef* reference, Boolean resolveAliasChains,
+OSErr FSResolveAliasFileWithMountFlags(FSRef* item, Boolean resolveAliasChains,
                                        Boolean* targetIsFolder, Boolean* wasAliased,
                                        unsigned long) {
-  return FSResolveAliasFile(reference, resolveAliasChains, targetIsFolder, wasAliased);
+  return FSResolveAliasFile(item, resolveAliasChains, targetIsFolder, wasAliased);
 }

@@ -14,24 +14,24 @@ using tallowmere::foundation::OrZero;
 
 // One statx as a rule. The path is without "/" at its end, so a link in the last place is read
 // itself.
-Boolean CFURLGetFSRef(CFURLRef url, FSRef* reference) {
+Boolean CFURLGetFSRef(CFURLRef url, FSRef* item) {
   return OrZero([&]() -> Boolean {
     const auto path = AbsolutePathOfUrl(url);
     if (!path) return false;
-    const auto item = ReadItem(AT_FDCWD, path->c_str());
-    if (!item) return false;
-    RememberPlace(*item, *path);
-    *reference = Pack(*item);
+    const auto found = ReadItem(AT_FDCWD, path->c_str());
+    if (!found) return false;
+    RememberPlace(*found, *path);
+    *item = Pack(*found);
     return true;
   });
 }
 
-CFURLRef CFURLCreateFromFSRef(CFAllocatorRef, const FSRef* reference) {
+CFURLRef CFURLCreateFromFSRef(CFAllocatorRef, const FSRef* item) {
   return OrZero([&]() -> CFURLRef {
-    const auto item = Unpack(reference);
-    if (!item) return nullptr;
-    const auto path = FindPlace(*item);
-    return path ? CreateUrlOfPath(*path, S_ISDIR(item->type)) : nullptr;
+    const auto wanted = Unpack(item);
+    if (!wanted) return nullptr;
+    const auto path = FindPlace(*wanted);
+    return path ? CreateUrlOfPath(*path, S_ISDIR(wanted->type)) : nullptr;
   });
 }
 
