@@ -1,14 +1,17 @@
 // tallowmere-cli: the service's requests for people and scripts.
 
 #include <CLI/CLI.hpp>
+#include <exception>
+#include <iostream>
 
 #include "cli/Commands.h"
 
 namespace {
-constexpr int kWrongUsage = 2;
-}
 
-int main(int argumentCount, char** arguments) {
+constexpr int kFailed = 1;
+constexpr int kWrongUsage = 2;
+
+int Run(int argumentCount, char** arguments) {
   CLI::App app("Asks the tallowmere service about files and volumes.", "tallowmere-cli");
   app.require_subcommand(1);
 
@@ -24,4 +27,15 @@ int main(int argumentCount, char** arguments) {
   }
   if (volumes->parsed()) return tallowmere::cli::PrintVolumes(options);
   return kWrongUsage;
+}
+
+}  // namespace
+
+int main(int argumentCount, char** arguments) {
+  try {
+    return Run(argumentCount, arguments);
+  } catch (const std::exception& error) {
+    std::cerr << "tallowmere-cli: " << error.what() << '\n';
+    return kFailed;
+  }
 }

@@ -14,8 +14,6 @@
 #include <system_error>
 #include <utility>
 
-extern char** environ;
-
 namespace tallowmere {
 namespace {
 

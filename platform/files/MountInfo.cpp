@@ -93,6 +93,7 @@ class Coverings {
   explicit Coverings(const std::vector<Mount>& mounts) : mMounts(mounts) {
     for (std::size_t i = 0; i < mounts.size(); ++i) {
       mByID.emplace(mounts[i].id, i);
+      if (IsItsOwnParent(mounts[i])) continue;
       // Of two mounts on one place of one parent the kernel finds the later one.
       mByPlace.insert_or_assign({mounts[i].parent, mounts[i].mountPoint}, i);
     }
@@ -106,8 +107,9 @@ class Coverings {
   bool OnTheWay(std::size_t index) {
     const auto known = mOnTheWay.find(index);
     if (known != mOnTheWay.end()) return known->second;
-    mOnTheWay[index] = true;  // ends the walk where a mount is its own ancestor, as a root can be
-    const bool result = !CoveredFurtherUp(index) && ParentOnTheWay(index);
+    mOnTheWay[index] = true;  // ends the walk in a table where mounts are each other's ancestors
+    const bool result =
+        IsItsOwnParent(mMounts[index]) || (!CoveredFurtherUp(index) && ParentOnTheWay(index));
     mOnTheWay[index] = result;
     return result;
   }
@@ -117,6 +119,9 @@ class Coverings {
     const auto cover = mByPlace.find({mMounts[index].id, mMounts[index].mountPoint});
     return cover != mByPlace.end() && cover->second != index;
   }
+
+  // As the first mount of a system is.
+  static bool IsItsOwnParent(const Mount& mount) { return mount.parent == mount.id; }
 
   bool ParentOnTheWay(std::size_t index) {
     const auto parent = mByID.find(mMounts[index].parent);

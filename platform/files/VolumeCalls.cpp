@@ -1,6 +1,6 @@
 #include <CoreServices/CoreServices.h>
 
-#include <cstring>
+#include <algorithm>
 
 #include "files/MountTable.h"
 
@@ -17,7 +17,7 @@ const Volume* VolumeFor(long index, SInt16 number) {
 
 void CopyName(const std::string& name, StringPtr destination) {
   destination[0] = static_cast<unsigned char>(name.size());
-  std::memcpy(destination + 1, name.data(), name.size());
+  std::copy(name.begin(), name.end(), destination + 1);
 }
 
 }  // namespace

@@ -1,0 +1,35 @@
+# Sourced by the scripts beside it: sees to the Debian packages that they need.
+
+# need PACKAGE…: installs what is missing. Where that takes another user's rights, names the command
+# to run and stops.
+need() {
+  local missing=() package
+  for package in "$@"; do
+    dpkg-query -W -f '${Status}' "$package" 2>/dev/null | grep -q 'ok installed' || missing+=("$package")
+  done
+  [ ${#missing[@]} -eq 0 ] && return
+  if [ "$(id -u)" -ne 0 ]; then
+    printf 'Some Debian packages are missing. As root, run\n\n  apt-get install --no-install-recommends %s\n\nand start this script again.\n' \
+      "${missing[*]}" >&2
+    exit 1
+  fi
+  echo "== Installing ${missing[*]}"
+  export DEBIAN_FRONTEND=noninteractive
+  if ! { apt-get update -qq && apt-get install -qq -y --no-install-recommends "${missing[@]}"; } \
+       >/tmp/tallowmere-apt.log 2>&1; then
+    cat /tmp/tallowmere-apt.log >&2
+    echo "apt-get could not install the packages." >&2
+    exit 1
+  fi
+}
+
+to_build=(g++ cmake ninja-build libcli11-dev)
+to_test=(libgtest-dev libgmock-dev librapidcheck-dev strace)
+to_check=(clang-format clang-tidy)
+
+# build PRESET: configures where that has not been done, and builds.
+build() {
+  echo "== Building ($1)"
+  [ -f "build/$1/build.ninja" ] || cmake --preset "$1" >/dev/null
+  cmake --build --preset "$1" -- --quiet
+}

@@ -1,0 +1,79 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "support/ChildProgram.h"
+#include "support/MountNamespace.h"
+#include "support/TemporaryFolder.h"
+#include "support/Wire.h"
+
+namespace tallowmere::test {
+namespace {
+
+using testing::ContainsRegex;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+TEST(CommandLine, VolumesPrintsNumberNameAndMountPointOfEachVolume) {
+  Service service;
+  const std::string name = service.NameOf(0);
+  ChildProgram cli(TALLOWMERE_CLI, {"volumes"});
+  const std::string text = cli.ReadToEnd();
+  EXPECT_EQ(cli.Wait(), 0);
+  EXPECT_THAT(text, StartsWith("vRefNum  name"));
+  EXPECT_THAT(text, HasSubstr(std::to_string(service.NumberOf(name)) + "  "));
+  EXPECT_THAT(text, ContainsRegex(" /\n"));
+}
+
+TEST(CommandLine, VolumesPrintsNamesAsUtf8AndControlCharactersInOctal) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  const ScopedMount volume("none", folder.MakeFolder("\xC3\x89t\xC3\xA9\n:\x1B[1m").string(),
+                           "tmpfs");
+  ASSERT_TRUE(volume.IsMounted());
+  ChildProgram cli(TALLOWMERE_CLI, {"volumes"});
+  const std::string text = cli.ReadToEnd();
+  EXPECT_EQ(cli.Wait(), 0);
+  EXPECT_THAT(text, HasSubstr("  \xC3\x89t\xC3\xA9\\012/\\033[1m  "));
+  EXPECT_THAT(text, HasSubstr("/\xC3\x89t\xC3\xA9\\012:\\033[1m\n"));
+}
+
+TEST(CommandLine, VolumesTellsWhichOfTwoVolumesWithOneNameAnswersToIt) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  const ScopedMount first("none", folder.MakeFolder("a/Twin").string(), "tmpfs");
+  const ScopedMount second("none", folder.MakeFolder("b/Twin").string(), "tmpfs");
+  ASSERT_TRUE(second.IsMounted());
+  ChildProgram cli(TALLOWMERE_CLI, {"volumes"});
+  const std::string text = cli.ReadToEnd();
+  EXPECT_EQ(cli.Wait(), 0);
+  EXPECT_THAT(text, HasSubstr("/a/Twin\n"));
+  EXPECT_THAT(text, HasSubstr("/b/Twin  (the first volume of this name answers to it)\n"));
+}
+
+TEST(CommandLine, AMissingServiceIsStatus1AndOneSentence) {
+  ChildProgram cli(TALLOWMERE_CLI, {"--service", "/nonexistent/service", "volumes"});
+  EXPECT_EQ(
+      cli.ReadErrorsToEnd(),
+      "tallowmere-cli: the service /nonexistent/service could not be started: No such file or "
+      "directory\n");
+  EXPECT_EQ(cli.ReadToEnd(), "");
+  EXPECT_EQ(cli.Wait(), 1);
+}
+
+TEST(CommandLine, WrongUsageIsStatus2) {
+  for (const std::vector<std::string>& arguments :
+       {std::vector<std::string>{}, {"nonsense"}, {"volumes", "--nonsense"}}) {
+    ChildProgram cli(TALLOWMERE_CLI, arguments);
+    EXPECT_NE(cli.ReadErrorsToEnd(), "");
+    EXPECT_EQ(cli.Wait(), 2);
+  }
+}
+
+TEST(CommandLine, HelpIsStatus0) {
+  ChildProgram cli(TALLOWMERE_CLI, {"--help"});
+  EXPECT_THAT(cli.ReadToEnd(), HasSubstr("volumes"));
+  EXPECT_EQ(cli.Wait(), 0);
+}
+
+}  // namespace
+}  // namespace tallowmere::test

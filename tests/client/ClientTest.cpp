@@ -1,0 +1,149 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+
+#include <filesystem>
+
+#include "client/Client.h"
+#include "support/TemporaryFolder.h"
+
+namespace tallowmere {
+namespace {
+
+using std::chrono::milliseconds;
+using test::TemporaryFolder;
+using testing::HasSubstr;
+
+Result<Client> StartClient() {
+  return Client::Start({.service = TALLOWMERE_SERVICE});
+}
+
+// The path of a shell script that takes the service's place.
+std::string Impostor(const TemporaryFolder& folder, const std::string& script) {
+  const std::string path = folder.MakeFile("impostor", "#!/bin/sh\n" + script + "\n").string();
+  chmod(path.c_str(), 0755);
+  return path;
+}
+
+std::string FailureOfFirstRequest(const std::string& service) {
+  auto client = Client::Start({.service = service, .deadline = milliseconds(300)});
+  if (!client) return client.Failure().message;
+  const auto name = client->GetHFSVolumeName(0);
+  return name ? "" : name.Failure().message;
+}
+
+TEST(Client, AsksForTheVolumesNamesAndNumbers) {
+  auto client = StartClient();
+  ASSERT_TRUE(client);
+  const auto name = client->GetHFSVolumeName(0);
+  ASSERT_TRUE(name);
+  ASSERT_TRUE(name->has_value());
+  const auto number = client->GetVolRefnumByHFSName(**name);
+  ASSERT_TRUE(number);
+  ASSERT_TRUE(number->has_value());
+  EXPECT_LT(**number, 0);
+}
+
+TEST(Client, WhatIsNotMountedIsNoneAndNoError) {
+  auto client = StartClient();
+  ASSERT_TRUE(client);
+  const auto name = client->GetHFSVolumeName(32767);
+  ASSERT_TRUE(name);
+  EXPECT_FALSE(name->has_value());
+  const auto number = client->GetVolRefnumByHFSName("no such volume");
+  ASSERT_TRUE(number);
+  EXPECT_FALSE(number->has_value());
+}
+
+TEST(Client, ANameThatTheServiceWouldRefuseIsNoVolumesAndTheServiceLives) {
+  auto client = StartClient();
+  ASSERT_TRUE(client);
+  for (const std::string& name : {std::string(255, 'x'), std::string(256, 'x'),
+                                  std::string(70000, 'x'), std::string(3, '\0')}) {
+    const auto number = client->GetVolRefnumByHFSName(name);
+    ASSERT_TRUE(number);
+    EXPECT_FALSE(number->has_value());
+  }
+  EXPECT_TRUE(client->GetHFSVolumeName(0));
+}
+
+TEST(Client, AMissingProgramIsSaid) {
+  EXPECT_THAT(FailureOfFirstRequest("/nonexistent/tallowmere"),
+              HasSubstr("/nonexistent/tallowmere could not be started: No such file"));
+}
+
+TEST(Client, AProgramThatExitsAtOnceIsSaid) {
+  EXPECT_EQ(FailureOfFirstRequest("/bin/true"), "the service ended before it answered");
+}
+
+TEST(Client, ATruncatedAnswerIsSaid) {
+  const TemporaryFolder folder;
+  EXPECT_EQ(FailureOfFirstRequest(Impostor(folder, "head -c 4 >/dev/null; printf '\\001\\005'")),
+            "the service ended before it answered");
+}
+
+TEST(Client, AnAnswerWithAnotherTrailerIsSaid) {
+  const TemporaryFolder folder;
+  EXPECT_EQ(FailureOfFirstRequest(Impostor(
+                folder, "head -c 4 >/dev/null; printf '\\000\\001\\000\\000mwlt'; sleep 2")),
+            "the service's answer does not end as the protocol says");
+}
+
+TEST(Client, AServiceThatNeverAnswersIsSaidWhenTheDeadlineHasPassed) {
+  const TemporaryFolder folder;
+  EXPECT_EQ(FailureOfFirstRequest(Impostor(folder, "exec sleep 60")),
+            "the service did not answer in time");
+}
+
+TEST(Client, AfterAnErrorEveryRequestGivesIt) {
+  auto client = Client::Start({.service = "/bin/true"});
+  ASSERT_TRUE(client);
+  EXPECT_FALSE(client->GetHFSVolumeName(0));
+  const auto again = client->GetHFSVolumeName(0);
+  ASSERT_FALSE(again);
+  EXPECT_EQ(again.Failure().message, "the service ended before it answered");
+}
+
+TEST(Client, EndsItsServiceAndLeavesNeitherProcessNorDescriptor) {
+  const auto openDescriptors = [] {
+    const auto folder = std::filesystem::directory_iterator("/proc/self/fd");
+    return std::distance(begin(folder), end(folder));
+  };
+  const auto before = openDescriptors();
+  for (int i = 0; i < 20; ++i) {
+    auto client = StartClient();
+    ASSERT_TRUE(client);
+    ASSERT_TRUE(client->GetHFSVolumeName(0));
+    Client moved = *std::move(client);
+    ASSERT_TRUE(moved.GetHFSVolumeName(0));
+  }
+  EXPECT_EQ(openDescriptors(), before);
+  EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);
+  EXPECT_EQ(errno, ECHILD);
+}
+
+TEST(Client, AServiceThatDoesNotEndByItselfIsKilled) {
+  const TemporaryFolder folder;
+  EXPECT_EQ(FailureOfFirstRequest(Impostor(folder, "trap '' PIPE; exec sleep 60")),
+            "the service did not answer in time");
+  EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);
+}
+
+TEST(Client, StartsWithTheStandardDescriptorsClosed) {
+  const pid_t child = fork();
+  if (child == 0) {
+    close(0);
+    close(1);
+    auto client = StartClient();
+    const bool works = client && client->GetHFSVolumeName(0);
+    _exit(works ? 0 : 1);
+  }
+  int status = -1;
+  waitpid(child, &status, 0);
+  EXPECT_EQ(status, 0);
+}
+
+}  // namespace
+}  // namespace tallowmere

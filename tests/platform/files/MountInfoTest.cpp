@@ -1,0 +1,221 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/sysmacros.h>
+
+#include "files/MountInfo.h"
+
+namespace tallowmere::files {
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::SizeIs;
+
+// The mount points of the volumes' places. Every mount but a path that ends in "file" is a folder.
+std::vector<std::string> PlacesIn(std::string_view table) {
+  const std::vector<Mount> mounts = ParseMountInfo(table);
+  std::vector<std::string> places;
+  for (const std::size_t place : VolumePlaces(
+           mounts, [](const Mount& mount) { return !mount.mountPoint.ends_with("file"); })) {
+    places.push_back(mounts[place].mountPoint);
+  }
+  return places;
+}
+
+TEST(MountInfo, ALineHasItsFields) {
+  const auto mounts = ParseMountInfo(
+      "36 35 98:7 /sub /mnt rw,noatime shared:1 master:2 propagate_from:3 - ext3 /dev/x rw,a=b\n");
+  ASSERT_THAT(mounts, SizeIs(1));
+  EXPECT_EQ(mounts[0].id, 36);
+  EXPECT_EQ(mounts[0].parent, 35);
+  EXPECT_EQ(mounts[0].device, makedev(98, 7));
+  EXPECT_EQ(mounts[0].root, "/sub");
+  EXPECT_EQ(mounts[0].mountPoint, "/mnt");
+  EXPECT_EQ(mounts[0].type, "ext3");
+}
+
+TEST(MountInfo, OptionalFieldsMayBeMissing) {
+  EXPECT_EQ(ParseMountInfo("1 0 8:1 / / rw - xfs /dev/x rw").at(0).type, "xfs");
+}
+
+TEST(MountInfo, EscapesAreUndone) {
+  const auto mounts = ParseMountInfo(
+      "2 1 0:5 /a\\134b /My\\040Disk\\011x\\012y\\043z\\134040 rw - tmpfs none rw\n");
+  ASSERT_THAT(mounts, SizeIs(1));
+  EXPECT_EQ(mounts[0].root, "/a\\b");
+  EXPECT_EQ(mounts[0].mountPoint, "/My Disk\tx\ny#z\\040");
+}
+
+TEST(MountInfo, ABackslashThatBeginsNoEscapeStaysAsItIs) {
+  EXPECT_EQ(ParseMountInfo("2 1 0:5 / /a\\04 rw - tmpfs none rw\n").at(0).mountPoint, "/a\\04");
+  EXPECT_EQ(ParseMountInfo("2 1 0:5 / /a\\89z rw - tmpfs none rw\n").at(0).mountPoint, "/a\\89z");
+}
+
+TEST(MountInfo, MalformedLinesArePassedOverAndTheRestIsKept) {
+  EXPECT_THAT(PlacesIn("1 0 8:1 / / rw - ext4 /dev/a rw\n"
+                       "\n"
+                       "x 1 8:2 / /no-id rw - ext4 /dev/b rw\n"
+                       "3 1 8 / /no-minor rw - ext4 /dev/b rw\n"
+                       "4 1 8:4 / relative rw - ext4 /dev/b rw\n"
+                       "5 1 8:5 / /no-type rw -\n"
+                       "6 1 8:6 / /no-separator rw shared:1 ext4\n"
+                       "7 1 8:7\n"
+                       "99999999999 1 8:8 / /overflow rw - ext4 /dev/b rw\n"
+                       "9 1 8:9 / /good rw - ext4 /dev/c rw\n"),
+              ElementsAre("/", "/good"));
+}
+
+TEST(MountInfo, NoTextHasNoMounts) {
+  EXPECT_THAT(ParseMountInfo(""), IsEmpty());
+}
+
+TEST(MountInfo, KernelInterfacesAreNoVolumes) {
+  EXPECT_THAT(PlacesIn("1 0 8:1 / / rw - ext4 /dev/a rw\n"
+                       "2 1 0:2 / /proc rw - proc proc rw\n"
+                       "3 1 0:3 / /sys rw - sysfs sysfs rw\n"
+                       "4 3 0:4 / /sys/fs/cgroup rw - cgroup2 cgroup2 rw\n"
+                       "5 1 0:5 / /dev rw - devtmpfs devtmpfs rw\n"
+                       "6 5 0:6 / /dev/pts rw - devpts devpts rw\n"
+                       "7 5 0:7 / /dev/mqueue rw - mqueue mqueue rw\n"
+                       "8 2 0:8 / /proc/sys/fs/binfmt_misc rw - autofs systemd-1 rw\n"
+                       "9 1 0:9 net:[4026531992] /run/netns/x rw - nsfs nsfs rw\n"),
+              ElementsAre("/"));
+}
+
+TEST(MountInfo, NetworkOverlayMemoryAndFuseFileSystemsAreVolumes) {
+  EXPECT_THAT(PlacesIn("1 0 0:30 / / rw - overlay overlay rw\n"
+                       "2 1 0:31 / /net rw - nfs4 host:/x rw\n"
+                       "3 1 0:32 / /smb rw - cifs //host/x rw\n"
+                       "4 1 0:33 / /tmp rw - tmpfs tmpfs rw\n"
+                       "5 1 0:34 / /fuse rw - fuse.sshfs host: rw\n"
+                       "6 1 0:35 / /new rw - somethingfs none rw\n"),
+              ElementsAre("/", "/net", "/smb", "/tmp", "/fuse", "/new"));
+}
+
+TEST(MountInfo, TheRootComesFirstThenTheKernelsOrder) {
+  EXPECT_THAT(PlacesIn("20 30 0:31 / /b rw - tmpfs none rw\n"
+                       "21 30 0:32 / /a rw - tmpfs none rw\n"
+                       "30 1 8:1 / / rw - ext4 /dev/a rw\n"
+                       "31 30 0:33 / /c rw - tmpfs none rw\n"),
+              ElementsAre("/", "/b", "/a", "/c"));
+}
+
+TEST(MountInfo, TheRootIsAVolumeWhateverItsType) {
+  EXPECT_THAT(PlacesIn("1 1 0:2 / / rw - devtmpfs none rw\n"), ElementsAre("/"));
+}
+
+TEST(MountInfo, BtrfsSubvolumesOfOneFileSystemAreOneVolume) {
+  EXPECT_THAT(PlacesIn("25 1 0:22 /@ / rw - btrfs /dev/sda2 rw,subvolid=256,subvol=/@\n"
+                       "40 25 0:22 /@home /home rw - btrfs /dev/sda2 rw,subvolid=257\n"
+                       "41 25 8:1 / /boot rw - ext4 /dev/sda1 rw\n"),
+              ElementsAre("/", "/boot"));
+}
+
+TEST(MountInfo, TheFileSystemsRootFolderIsThePlaceBeforeAnEarlierMountOfAFolder) {
+  EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+                       "40 25 0:22 /@home /home rw - btrfs /dev/sda2 rw\n"
+                       "41 25 0:22 / /mnt/all rw - btrfs /dev/sda2 rw\n"),
+              ElementsAre("/", "/mnt/all"));
+}
+
+TEST(MountInfo, TheVolumeOfTheRootComesFirstEvenWhenItsPlaceIsElsewhere) {
+  EXPECT_THAT(PlacesIn("20 25 0:30 / /early rw - tmpfs none rw\n"
+                       "25 1 8:1 /inner / rw - ext4 /dev/sda1 rw\n"
+                       "41 25 8:1 / /mnt/outer rw - ext4 /dev/sda1 rw\n"),
+              ElementsAre("/mnt/outer", "/early"));
+}
+
+TEST(MountInfo, BindMountsAddNoVolume) {
+  EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+                       "26 25 8:1 /srv/data /export rw - ext4 /dev/sda1 rw\n"
+                       "27 25 8:1 / /again rw - ext4 /dev/sda1 rw\n"),
+              ElementsAre("/"));
+}
+
+TEST(MountInfo, AFileMountedAloneIsNoVolumeAndTheNextFolderIsThePlace) {
+  EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+                       "26 25 8:2 /hosts /etc/file rw - ext4 /dev/sda2 rw\n"
+                       "27 25 8:3 /resolv /run/file rw - ext4 /dev/sda3 rw\n"
+                       "28 25 8:3 /data /data rw - ext4 /dev/sda3 rw\n"),
+              ElementsAre("/", "/data"));
+}
+
+TEST(MountInfo, OnlyMountsOfInnerFoldersAreAskedWhetherTheyAreFolders) {
+  std::vector<std::string> asked;
+  VolumePlaces(ParseMountInfo("25 1 8:1 /inner / rw - ext4 /dev/sda1 rw\n"
+                              "26 25 0:40 / /net rw - nfs host:/x rw\n"
+                              "27 25 0:40 /sub /sub rw - nfs host:/x rw\n"
+                              "28 25 0:41 /bound /bound rw - tmpfs none rw\n"),
+               [&](const Mount& mount) {
+                 asked.push_back(mount.mountPoint);
+                 return true;
+               });
+  EXPECT_THAT(asked, ElementsAre("/bound"));
+}
+
+TEST(MountInfo, OfStackedMountsOnlyTheTopmostIsAVolume) {
+  const auto mounts = ParseMountInfo(
+      "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+      "26 25 0:40 / /mnt rw - tmpfs none rw\n"
+      "27 26 0:41 / /mnt rw - tmpfs none rw\n"
+      "28 27 0:42 / /mnt rw - ext4 /dev/sdb1 rw\n");
+  EXPECT_THAT(VolumePlaces(mounts, [](const Mount&) { return true; }), ElementsAre(0, 3));
+}
+
+TEST(MountInfo, MountsUnderACoveredFolderAreHiddenWithIt) {
+  EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+                       "26 25 0:40 / /mnt/a/deep rw - tmpfs none rw\n"
+                       "27 26 0:41 / /mnt/a/deep/er rw - tmpfs none rw\n"
+                       "28 25 0:42 / /mnt/a rw - tmpfs none rw\n"
+                       "29 28 0:43 / /mnt/a/new rw - tmpfs none rw\n"
+                       "30 25 0:44 / /mnt/ab rw - tmpfs none rw\n"),
+              ElementsAre("/", "/mnt/a", "/mnt/a/new", "/mnt/ab"));
+}
+
+TEST(MountInfo, MountsOnACoveredMountAreHidden) {
+  EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+                       "26 25 0:40 / /mnt rw - tmpfs none rw\n"
+                       "27 26 0:41 / /mnt/inner rw - tmpfs none rw\n"
+                       "28 26 0:42 / /mnt rw - tmpfs none rw\n"),
+              ElementsAre("/", "/mnt"));
+}
+
+TEST(MountInfo, ARootMountedOverTheRootHidesWhatWasBelow) {
+  EXPECT_THAT(PlacesIn("1 1 0:2 / / rw - rootfs rootfs rw\n"
+                       "2 1 0:3 / /old rw - tmpfs none rw\n"
+                       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+                       "26 25 0:40 / /mnt rw - tmpfs none rw\n"),
+              ElementsAre("/", "/mnt"));
+}
+
+TEST(MountInfo, AThousandEntriesKeepTheirOrder) {
+  std::string table = "1 0 8:1 / / rw - ext4 /dev/a rw\n";
+  std::vector<std::string> expected = {"/"};
+  for (int i = 0; i < 1000; ++i) {
+    const std::string place = "/mnt/" + std::to_string((i * 7919) % 1000);
+    table += std::to_string(100 + i) + " 1 0:" + std::to_string(100 + i) + " / " + place +
+             " rw - tmpfs none rw\n";
+    expected.push_back(place);
+  }
+  EXPECT_EQ(PlacesIn(table), expected);
+}
+
+TEST(MountInfo, AChainOfAThousandMountsHasAnEnd) {
+  std::string table = "1 1 8:1 / / rw - ext4 /dev/a rw\n";
+  std::string place;
+  for (int i = 2; i < 1002; ++i) {
+    place += "/d";
+    table += std::to_string(i) + " " + std::to_string(i - 1) + " 0:" + std::to_string(i) + " / " +
+             place + " rw - tmpfs none rw\n";
+  }
+  EXPECT_THAT(PlacesIn(table), SizeIs(1001));
+}
+
+TEST(MountInfo, MountsThatAreEachOthersParentsHaveAnEnd) {
+  EXPECT_THAT(PlacesIn("5 6 8:1 / / rw - ext4 /dev/a rw\n"
+                       "6 5 8:2 / /mnt rw - ext4 /dev/b rw\n"),
+              SizeIs(2));
+}
+
+}  // namespace
+}  // namespace tallowmere::files

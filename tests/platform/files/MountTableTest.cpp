@@ -1,0 +1,157 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <optional>
+#include <set>
+
+#include "files/MountTable.h"
+#include "support/MountNamespace.h"
+#include "support/TemporaryFolder.h"
+
+namespace tallowmere::files {
+namespace {
+
+using test::TemporaryFolder;
+
+// A file system of its own, mounted at the top or somewhere below.
+std::string Line(int id, const std::string& place) {
+  const std::string number = std::to_string(id);
+  const std::string parent = place == "/" ? " 1 " : " 27 ";
+  return number + parent + "0:" + number + " / " + place + " rw - tmpfs none rw\n";
+}
+
+// A table that never changes, from a recorded text.
+class RecordedTable {
+ public:
+  explicit RecordedTable(const std::string& text)
+      : mTable(mFolder.MakeFile("mountinfo", text).string()) {}
+
+  MountTable* operator->() { return &mTable; }
+  VolumeNumber NumberAt(std::size_t index) { return mTable.AtIndex(index)->Number(); }
+
+ private:
+  TemporaryFolder mFolder;
+  MountTable mTable;
+};
+
+TEST(MountTable, AVolumesNumberIsMinusTheMountIDOfItsPlace) {
+  RecordedTable table(Line(27, "/") + Line(31, "/mnt/a") + Line(32768, "/mnt/b"));
+  EXPECT_EQ(table.NumberAt(0), -27);
+  EXPECT_EQ(table.NumberAt(1), -31);
+  EXPECT_EQ(table.NumberAt(2), -32768);
+}
+
+TEST(MountTable, AMountIDBeyond16BitsGetsAFreeNegativeNumber) {
+  RecordedTable table(Line(27, "/") + Line(70000, "/mnt/a") + Line(32768, "/mnt/b") +
+                      Line(2147483647, "/mnt/c") + Line(32767, "/mnt/d"));
+  std::set<VolumeNumber> numbers;
+  for (std::size_t i = 0; i < 5; ++i) {
+    EXPECT_LT(table.NumberAt(i), 0);
+    numbers.insert(table.NumberAt(i));
+    EXPECT_EQ(table->WithNumber(table.NumberAt(i))->MountPoint(), table->AtIndex(i)->MountPoint());
+  }
+  EXPECT_EQ(numbers.size(), 5u);
+  EXPECT_EQ(table.NumberAt(2), -32768);
+  EXPECT_EQ(table.NumberAt(4), -32767);
+}
+
+TEST(MountTable, Number0IsTheVolumeOfTheRoot) {
+  RecordedTable table(Line(31, "/mnt/a") + Line(27, "/"));
+  EXPECT_EQ(table->WithNumber(0)->MountPoint(), "/");
+}
+
+TEST(MountTable, UnknownNumbersAndIndexesPastTheLastHaveNoVolume) {
+  RecordedTable table(Line(27, "/") + Line(31, "/mnt/a"));
+  EXPECT_EQ(table->WithNumber(-28), nullptr);
+  EXPECT_EQ(table->WithNumber(27), nullptr);
+  EXPECT_EQ(table->WithNumber(32767), nullptr);
+  EXPECT_NE(table->AtIndex(1), nullptr);
+  EXPECT_EQ(table->AtIndex(2), nullptr);
+  EXPECT_EQ(table->AtIndex(1000), nullptr);
+}
+
+TEST(MountTable, AVolumeIsCalledAsTheLastComponentOfItsMountPoint) {
+  RecordedTable table(Line(27, "/") + Line(31, "/media/user/My\\040Disk") + Line(32, "/mnt/a:b"));
+  EXPECT_EQ(table->AtIndex(1)->Name(), "My Disk");
+  EXPECT_EQ(table->AtIndex(2)->Name(), "a/b");
+}
+
+TEST(MountTable, NamesOf63BytesStayWholeAndLongerOnesBecomeShort) {
+  const std::string longest(63, 'n');
+  RecordedTable table(Line(27, "/") + Line(31, "/mnt/" + longest) + Line(32, "/mnt/n" + longest));
+  EXPECT_EQ(table->AtIndex(1)->Name(), longest);
+  EXPECT_EQ(table->AtIndex(2)->Name(), std::string(29, 'n') + "#2");
+}
+
+TEST(MountTable, TheRootVolumeHasAName) {
+  MountTable table;
+  const std::string& name = table.AtIndex(0)->Name();
+  EXPECT_FALSE(name.empty());
+  EXPECT_LE(name.size(), 63u);
+  EXPECT_EQ(name.find(':'), std::string::npos);
+}
+
+TEST(MountTable, ARootThatIsNoMountPointIsStillTheFirstVolume) {
+  MountTable real;
+  const VolumeNumber number = real.AtIndex(0)->Number();
+  RecordedTable table(Line(31000, "/mnt/a"));
+  EXPECT_EQ(table->AtIndex(0)->MountPoint(), "/");
+  EXPECT_EQ(table->AtIndex(1)->MountPoint(), "/mnt/a");
+  EXPECT_EQ(table.NumberAt(0), number);
+}
+
+TEST(MountTable, WithoutATableThereIsTheRootVolumeWithItsUsualNumber) {
+  MountTable real;
+  MountTable table("/nonexistent/mountinfo");
+  ASSERT_NE(table.AtIndex(0), nullptr);
+  EXPECT_EQ(table.AtIndex(0)->MountPoint(), "/");
+  EXPECT_EQ(table.AtIndex(0)->Number(), real.AtIndex(0)->Number());
+  EXPECT_EQ(table.AtIndex(1), nullptr);
+}
+
+TEST(MountTable, ATableThatCannotBeReadIsAsGoodAsNone) {
+  const TemporaryFolder folder;
+  MountTable table(folder.Path().string());  // a folder opens, but has no text
+  EXPECT_EQ(table.AtIndex(0)->MountPoint(), "/");
+  EXPECT_EQ(table.AtIndex(1), nullptr);
+}
+
+TEST(MountTable, AWalkSeesOneStateWhileVolumesComeAndGo) {
+  if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  MountTable table;
+  std::vector<std::string> before;
+  for (std::size_t i = 0; const Volume* volume = table.AtIndex(i); ++i) {
+    before.push_back(volume->MountPoint());
+  }
+
+  std::optional<test::ScopedMount> appearing;
+  std::vector<std::string> during;
+  for (std::size_t i = 0; const Volume* volume = table.AtIndex(i); ++i) {
+    during.push_back(volume->MountPoint());
+    if (!appearing) appearing.emplace("none", folder.MakeFolder("new").string(), "tmpfs");
+  }
+  ASSERT_TRUE(appearing->IsMounted());
+  EXPECT_EQ(during, before);
+
+  std::vector<std::string> after;
+  for (std::size_t i = 0; const Volume* volume = table.AtIndex(i); ++i) {
+    after.push_back(volume->MountPoint());
+  }
+  before.push_back((folder.Path() / "new").string());
+  EXPECT_EQ(after, before);
+}
+
+TEST(MountTable, AnIndexThatContinuesNoWalkSeesTheVolumesOfNow) {
+  if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  MountTable table;
+  std::size_t count = 0;
+  while (table.AtIndex(count) != nullptr) ++count;
+  const test::ScopedMount appearing("none", folder.MakeFolder("new").string(), "tmpfs");
+  ASSERT_TRUE(appearing.IsMounted());
+  EXPECT_NE(table.AtIndex(count), nullptr);
+}
+
+}  // namespace
+}  // namespace tallowmere::files

@@ -1,0 +1,101 @@
+#include <gtest/gtest.h>
+
+#include "support/Wire.h"
+
+namespace tallowmere::test {
+namespace {
+
+const std::string kAnyRequest = VolumeNameRequest(32767);
+const std::string kItsResponse = kNoVolumeNameResponse;
+
+TEST(Framing, ARequestCodeInTwoReadsIsServedNormally) {
+  Service service;
+  service.Write(kAnyRequest.substr(0, 1));
+  usleep(20'000);
+  EXPECT_EQ(service.Ask(kAnyRequest.substr(1), 8), kItsResponse);
+}
+
+TEST(Framing, EndOfInputAfterTheFirstByteOfTheCodeWritesNothing) {
+  Service service;
+  service.Write(kAnyRequest.substr(0, 1));
+  service.CloseInput();
+  EXPECT_EQ(service.ReadToEnd(), "");
+  EXPECT_EQ(service.Wait(), 0);
+}
+
+TEST(Framing, RequestsAByteAtATimeAreServedNormally) {
+  Service service;
+  for (const std::string& request : {VolumeNumberRequest("no such volume"), kAnyRequest}) {
+    for (const char byte : request) {
+      service.Write({&byte, 1});
+      usleep(500);
+    }
+  }
+  EXPECT_EQ(service.Read(14), VolumeNumberResponse(32767) + kItsResponse);
+}
+
+TEST(Framing, AHundredRequestsWrittenAtOnceAreAnsweredInOrder) {
+  Service service;
+  std::string requests;
+  std::string responses;
+  for (int i = 0; i < 50; ++i) {
+    requests += VolumeNumberRequest("no such volume") + kAnyRequest;
+    responses += VolumeNumberResponse(32767) + kItsResponse;
+  }
+  service.Write(requests + kQuit);
+  EXPECT_EQ(service.ReadToEnd(), responses);
+  EXPECT_EQ(service.Wait(), 0);
+}
+
+// A request cut at each of its bytes, the first request of the service or the second.
+class CutRequest : public testing::TestWithParam<std::string> {};
+
+TEST_P(CutRequest, IsNotAnsweredWhereverItIsCut) {
+  for (std::size_t length = 0; length < GetParam().size(); ++length) {
+    Service service;
+    service.Write(kAnyRequest + GetParam().substr(0, length));
+    service.CloseInput();
+    EXPECT_EQ(service.ReadToEnd(), kItsResponse) << length;
+    EXPECT_EQ(service.Wait(), 0) << length;
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Framing, CutRequest,
+                         testing::Values(VolumeNumberRequest("Volume"), VolumeNameRequest(-1)));
+
+TEST(Framing, AStringWithoutItsNulInsideTheCountEndsWhereTheCountEnds) {
+  Service service;
+  const std::string name = service.NameOf(0);
+  const int number = service.NumberOf(name);
+  EXPECT_LT(number, 0);
+  const std::string longer = name + "and more";
+  service.Write(U16(3) + CString(longer));  // leaves its bytes where the next name will stand
+  EXPECT_EQ(service.Read(6), VolumeNumberResponse(32767));
+  EXPECT_EQ(service.Ask(U16(3) + Counted(name), 6), VolumeNumberResponse(number));
+}
+
+TEST(Framing, AStringEndsAtANulInsideTheCount) {
+  Service service;
+  const std::string name = service.NameOf(0);
+  const std::string withMore = std::string(name).append(1, '\0').append("more");
+  EXPECT_EQ(service.Ask(U16(3) + CString(withMore), 6),
+            VolumeNumberResponse(service.NumberOf(name)));
+}
+
+TEST(Framing, AStringOfLength1HoldingTheNulIsTheEmptyString) {
+  Service service;
+  EXPECT_EQ(service.Ask(U16(3) + CString(""), 6), VolumeNumberResponse(32767));
+}
+
+TEST(Framing, AStringOfLength0IsTheEmptyString) {
+  Service service;
+  EXPECT_EQ(service.Ask(U16(3) + U16(0), 6), VolumeNumberResponse(32767));
+}
+
+TEST(Framing, AnEmptyStringInAResponseIsALengthOf1AndItsNul) {
+  Service service;
+  EXPECT_EQ(service.Ask(VolumeNameRequest(32767), 8), std::string("\0\1\0\0MWLT", 8));
+}
+
+}  // namespace
+}  // namespace tallowmere::test

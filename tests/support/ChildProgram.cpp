@@ -1,0 +1,127 @@
+#include "support/ChildProgram.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <signal.h>
+#include <sys/ioctl.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <array>
+#include <cstdlib>
+#include <limits>
+#include <utility>
+
+namespace tallowmere::test {
+namespace {
+
+constexpr int kPatience = 10'000;  // milliseconds
+constexpr int kStillRuns = -1000;
+
+void Close(int& descriptor) {
+  if (descriptor >= 0) close(std::exchange(descriptor, -1));
+}
+
+std::array<int, 2> MakePipe() {
+  std::array<int, 2> ends{};
+  if (pipe2(ends.data(), O_CLOEXEC) != 0) std::abort();
+  return ends;
+}
+
+std::string ReadUpTo(int descriptor, std::size_t size) {
+  std::string bytes;
+  while (bytes.size() < size) {
+    pollfd awaited{descriptor, POLLIN, 0};
+    if (poll(&awaited, 1, kPatience) != 1) break;
+    std::array<char, 4096> piece;
+    const ssize_t got = read(descriptor, piece.data(), std::min(piece.size(), size - bytes.size()));
+    if (got <= 0) break;
+    bytes.append(piece.data(), static_cast<std::size_t>(got));
+  }
+  return bytes;
+}
+
+}  // namespace
+
+ChildProgram::ChildProgram(const std::string& path, const std::vector<std::string>& arguments,
+                           BrokenPipe brokenPipe) {
+  const auto input = MakePipe();
+  const auto output = MakePipe();
+  const auto errors = MakePipe();
+  std::vector<char*> vector{const_cast<char*>(path.c_str())};
+  for (const std::string& argument : arguments) {
+    vector.push_back(const_cast<char*>(argument.c_str()));
+  }
+  vector.push_back(nullptr);
+
+  mProcess = fork();
+  if (mProcess < 0) std::abort();
+  if (mProcess == 0) {
+    signal(SIGPIPE, brokenPipe == BrokenPipe::kEnds ? SIG_DFL : SIG_IGN);
+    dup2(input[0], STDIN_FILENO);
+    dup2(output[1], STDOUT_FILENO);
+    dup2(errors[1], STDERR_FILENO);
+    execvp(path.c_str(), vector.data());
+    _exit(127);
+  }
+  mInputReader = input[0];
+  mInput = input[1];
+  mOutput = output[0];
+  mErrors = errors[0];
+  close(output[1]);
+  close(errors[1]);
+}
+
+ChildProgram::~ChildProgram() {
+  if (mProcess > 0) {
+    kill(mProcess, SIGKILL);
+    waitpid(mProcess, nullptr, 0);
+  }
+  for (int* const descriptor : {&mInput, &mInputReader, &mOutput, &mErrors}) Close(*descriptor);
+}
+
+void ChildProgram::Write(std::string_view bytes) {
+  while (!bytes.empty()) {
+    const ssize_t sent = write(mInput, bytes.data(), bytes.size());
+    if (sent < 0) std::abort();
+    bytes.remove_prefix(static_cast<std::size_t>(sent));
+  }
+}
+
+void ChildProgram::CloseInput() {
+  Close(mInput);
+}
+void ChildProgram::CloseOutput() {
+  Close(mOutput);
+}
+
+std::string ChildProgram::Read(std::size_t size) {
+  return ReadUpTo(mOutput, size);
+}
+std::string ChildProgram::ReadToEnd() {
+  return ReadUpTo(mOutput, std::numeric_limits<std::size_t>::max());
+}
+std::string ChildProgram::ReadErrorsToEnd() {
+  return ReadUpTo(mErrors, std::numeric_limits<std::size_t>::max());
+}
+
+std::size_t ChildProgram::UnreadInput() const {
+  int unread = 0;
+  if (ioctl(mInputReader, FIONREAD, &unread) != 0) std::abort();
+  return static_cast<std::size_t>(unread);
+}
+
+int ChildProgram::Wait() {
+  int status = 0;
+  for (int waited = 0; waited < kPatience; ++waited) {
+    const pid_t ended = waitpid(mProcess, &status, WNOHANG);
+    if (ended == mProcess) {
+      mProcess = -1;
+      return WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
+    }
+    usleep(1000);
+  }
+  return kStillRuns;
+}
+
+}  // namespace tallowmere::test

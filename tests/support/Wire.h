@@ -1,0 +1,85 @@
+// Requests and responses as bytes, written down field by field: the tests' own reading of the
+// protocol, independent of the client's.
+#pragma once
+
+#include <unistd.h>
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+#include "support/ChildProgram.h"
+
+namespace tallowmere::test {
+
+inline constexpr std::string_view kTrailer = "MWLT";
+
+// A little-endian integer of the type's width.
+template <class Integer>
+std::string Bytes(Integer value) {
+  return {reinterpret_cast<const char*>(&value), sizeof value};
+}
+inline std::string U16(unsigned value) {
+  return Bytes(static_cast<std::uint16_t>(value));
+}
+inline std::string I16(int value) {
+  return Bytes(static_cast<std::int16_t>(value));
+}
+
+// A 16-bit count and the bytes as they are.
+inline std::string Counted(std::string_view bytes) {
+  return U16(static_cast<unsigned>(bytes.size())).append(bytes);
+}
+
+// A text as a counted string, its NUL inside the count.
+inline std::string CString(std::string_view text) {
+  return Counted(std::string(text).append(1, '\0'));
+}
+
+inline const std::string kQuit = U16(0);
+inline std::string VolumeNumberRequest(std::string_view name) {
+  return U16(3) + CString(name);
+}
+inline std::string VolumeNameRequest(int number) {
+  return U16(4) + I16(number);
+}
+
+inline std::string VolumeNumberResponse(int number) {
+  return I16(number).append(kTrailer);
+}
+inline std::string VolumeNameResponse(std::string_view name) {
+  return ("\1" + CString(name)).append(kTrailer);
+}
+inline const std::string kNoVolumeNameResponse = std::string("\0\1\0\0MWLT", 8);
+
+// A running service whose parent is this process.
+class Service : public ChildProgram {
+ public:
+  explicit Service(const std::string& parent = std::to_string(getpid()),
+                   BrokenPipe brokenPipe = BrokenPipe::kEnds)
+      : ChildProgram(TALLOWMERE_SERVICE, {parent}, brokenPipe) {}
+
+  std::string Ask(std::string_view request, std::size_t responseSize) {
+    Write(request);
+    return Read(responseSize);
+  }
+
+  // The number of the volume with a name, by code 3.
+  int NumberOf(std::string_view name) {
+    const std::string response = Ask(VolumeNumberRequest(name), 6);
+    if (response.size() != 6 || !response.ends_with(kTrailer)) return 0;
+    return static_cast<std::int16_t>(static_cast<unsigned char>(response[0]) |
+                                     static_cast<unsigned char>(response[1]) << 8);
+  }
+
+  // The name of the volume with a number, by code 4; empty when there is none.
+  std::string NameOf(int number) {
+    const std::string head = Ask(VolumeNameRequest(number), 3);
+    if (head.size() != 3) return {};
+    const std::size_t length = static_cast<unsigned char>(head[1]);
+    const std::string rest = Read(length + kTrailer.size());
+    return rest.substr(0, rest.size() - kTrailer.size() - 1);
+  }
+};
+
+}  // namespace tallowmere::test
