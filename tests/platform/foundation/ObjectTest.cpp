@@ -1,7 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <array>
 #include <thread>
-#include <vector>
 
 #include "TestStrings.h"
 
@@ -25,9 +25,9 @@ TEST(Object, CountsEveryReferenceOfSeveralThreads) {
   constexpr int kThreads = 4;
   constexpr int kReferences = 20000;
   const auto string = MakeString(u"a");
-  std::vector<std::thread> threads;
-  for (int i = 0; i < kThreads; ++i) {
-    threads.emplace_back([&string] {
+  std::array<std::thread, kThreads> threads;
+  for (std::thread& thread : threads) {
+    thread = std::thread([&string] {
       for (int k = 0; k < kReferences; ++k) {
         CFRetain(string.Get());
         CFRetain(string.Get());
