@@ -3,10 +3,12 @@
 #include <algorithm>
 #include <cstdarg>
 #include <cstring>
+#include <exception>
 #include <limits>
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 
 #include "foundation/Encodings.h"
 #include "foundation/FileNameText.h"
@@ -100,10 +102,10 @@ CFIndex CFStringGetMaximumSizeForEncoding(CFIndex length, CFStringEncoding encod
 // --- Making -----------------------------------------------------------------------------------
 
 CFStringRef __CFStringMakeConstantString(const char* utf8) {
-  const CFStringRef constant =
-      CFStringCreateWithCString(kCFAllocatorDefault, utf8, kCFStringEncodingUTF8);
+  const CFStringRef constant = OrZero([&] { return CreateDecoded(utf8, kCFStringEncodingUTF8); });
   if (constant == nullptr) std::terminate();
-  return constant;
+  // A constant is never given back.
+  return constant;  // NOLINT(clang-analyzer-osx.cocoa.RetainCount)
 }
 
 CFStringRef CFStringCreateWithCharacters(CFAllocatorRef, const UniChar* characters,

@@ -41,5 +41,5 @@ CFIndex CFGetRetainCount(CFTypeRef object) {
 }
 
 Boolean CFEqual(CFTypeRef first, CFTypeRef second) {
-  return first == second || ObjectOf(first).Equals(ObjectOf(second));
+  return ObjectOf(first).Equals(ObjectOf(second));
 }

@@ -17,7 +17,7 @@ class Object {
   void Release() const noexcept;  // the last one deletes the object
   CFIndex RetainCount() const noexcept;
 
-  // The meaning of CFEqual for two different objects.
+  // The meaning of CFEqual.
   virtual bool Equals(const Object& other) const noexcept = 0;
 
  protected:

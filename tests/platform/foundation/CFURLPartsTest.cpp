@@ -51,7 +51,7 @@ TEST(CFURLLastComponent, OfTheRootIsASlash) {
 }
 
 TEST(CFURLLastComponent, OfNoPathIsNull) {
-  EXPECT_EQ(LastOf(ParseUrl("http://host?a/b")), std::nullopt);
+  EXPECT_EQ(CFURLCopyLastPathComponent(ParseUrl("http://host?a/b").Get()), nullptr);
 }
 
 TEST(CFURLLastComponent, IsPercentDecoded) {
@@ -60,7 +60,8 @@ TEST(CFURLLastComponent, IsPercentDecoded) {
 }
 
 TEST(CFURLLastComponent, WithAnEncodedNulIsNull) {
-  EXPECT_EQ(LastOf(ParseUrl("file:///a/b%00c")), std::nullopt);
+  EXPECT_EQ(CFURLCopyLastPathComponent(ParseUrl("file:///a/b%00c").Get()), nullptr);
+  EXPECT_EQ(CFURLCopyPathExtension(ParseUrl("file:///a/b.c%00").Get()), nullptr);
 }
 
 TEST(CFURLExtension, FollowsTheLastDot) {
@@ -231,6 +232,7 @@ TEST(CFURLBytes, MustBeAUrl) {
   EXPECT_FALSE(ParseUrl(""));
   EXPECT_FALSE(ParseUrl("a b"));
   EXPECT_FALSE(ParseUrl("\xC3\xA9"));
+  EXPECT_FALSE(ParseUrl("\xC5\xA1"));  // U+0161, whose lower half is a letter
 }
 
 TEST(CFURLBytes, MayBeInAnyEncoding) {

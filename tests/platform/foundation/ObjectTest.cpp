@@ -1,7 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <array>
+#include <latch>
 #include <thread>
-#include <vector>
 
 #include "TestStrings.h"
 
@@ -23,16 +24,14 @@ TEST(Object, RetainReturnsTheObjectWithOneReferenceMore) {
 
 TEST(Object, CountsEveryReferenceOfSeveralThreads) {
   constexpr int kThreads = 4;
-  constexpr int kReferences = 20000;
+  constexpr int kReferences = 100000;
   const auto string = MakeString(u"a");
-  std::vector<std::thread> threads;
-  for (int i = 0; i < kThreads; ++i) {
-    threads.emplace_back([&string] {
-      for (int k = 0; k < kReferences; ++k) {
-        CFRetain(string.Get());
-        CFRetain(string.Get());
-        CFRelease(string.Get());
-      }
+  std::latch start(kThreads);
+  std::array<std::thread, kThreads> threads;
+  for (std::thread& thread : threads) {
+    thread = std::thread([&string, &start] {
+      start.arrive_and_wait();
+      for (int k = 0; k < kReferences; ++k) CFRetain(string.Get());
     });
   }
   for (std::thread& thread : threads) thread.join();

@@ -157,7 +157,7 @@ RC_GTEST_PROP(WindowsPath, LeadsBackToTheSamePath, ()) {
   const std::string path = *test::AnyPath();
   const auto windows = WindowsPathOfLinuxPath(path);
   if (windows) RC_ASSERT(LinuxPathOfWindowsPath(*windows) == path);
-  RC_ASSERT(windows.has_value() || path.find('\\') != path.npos || path.find(":") == 1);
+  RC_ASSERT(windows.has_value() || path.find('\\') != path.npos || path.find(':') == 1);
 }
 
 }  // namespace

@@ -196,6 +196,11 @@ TEST(UrlGrammar, RefusesALiteralOfAnyLength) {
   EXPECT_FALSE(IsUrl("//[::1\0]"sv));
 }
 
+TEST(UrlGrammar, ReadsNothingBehindTheText) {
+  EXPECT_FALSE(IsUrl("a%41"sv.substr(0, 3)));
+  EXPECT_FALSE(IsUrl("a%41"sv.substr(0, 2)));
+}
+
 RC_GTEST_PROP(UrlGrammar, AdmitsTheSameWithAnotherLetterCaseOfItsHexDigits, ()) {
   const int byte = *rc::gen::inRange(0, 256);
   char lower[8];

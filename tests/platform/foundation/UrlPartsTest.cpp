@@ -54,6 +54,7 @@ TEST(PercentEncoding, DecodesBothLetterCases) {
 }
 
 TEST(PercentEncoding, LeavesWhatIsNoSequence) {
+  EXPECT_EQ(PercentDecode(std::string_view("%41").substr(0, 2)), "%4");
   EXPECT_EQ(PercentDecode("%"), "%");
   EXPECT_EQ(PercentDecode("%4"), "%4");
   EXPECT_EQ(PercentDecode("%4g%%41"), "%4g%A");
