@@ -160,8 +160,8 @@ bool HoldsFiles(std::string_view fileSystemType) {
   return !std::binary_search(kKernelInterfaces.begin(), kKernelInterfaces.end(), fileSystemType);
 }
 
-std::vector<std::size_t> VolumePlaces(const std::vector<Mount>& mounts,
-                                      const std::function<bool(const Mount&)>& isFolder) {
+std::vector<std::vector<std::size_t>> GroupIntoVolumes(
+    const std::vector<Mount>& mounts, const std::function<bool(const Mount&)>& isFolder) {
   Coverings coverings(mounts);
   std::map<dev_t, std::vector<std::size_t>> fileSystems;
   std::optional<dev_t> rootDevice;
@@ -172,8 +172,8 @@ std::vector<std::size_t> VolumePlaces(const std::vector<Mount>& mounts,
     if (isRoot || HoldsFiles(mounts[i].type)) fileSystems[mounts[i].device].push_back(i);
   }
 
-  std::vector<std::size_t> places;
-  for (const auto& [device, indexes] : fileSystems) {
+  std::vector<std::vector<std::size_t>> volumes;
+  for (auto& [device, indexes] : fileSystems) {
     auto place = std::find_if(indexes.begin(), indexes.end(),
                               [&](std::size_t i) { return mounts[i].root == "/"; });
     if (place == indexes.end()) {
@@ -181,14 +181,16 @@ std::vector<std::size_t> VolumePlaces(const std::vector<Mount>& mounts,
         return mounts[i].mountPoint == "/" || isFolder(mounts[i]);
       });
     }
-    if (place != indexes.end()) places.push_back(*place);
+    if (place == indexes.end()) continue;
+    std::rotate(indexes.begin(), place, place + 1);
+    volumes.push_back(std::move(indexes));
   }
-  std::sort(places.begin(), places.end(), [&](std::size_t a, std::size_t b) {
-    const bool aIsRoot = mounts[a].device == rootDevice;
-    const bool bIsRoot = mounts[b].device == rootDevice;
-    return aIsRoot != bIsRoot ? aIsRoot : a < b;
+  std::sort(volumes.begin(), volumes.end(), [&](const auto& a, const auto& b) {
+    const bool aHasRoot = mounts[a.front()].device == rootDevice;
+    const bool bHasRoot = mounts[b.front()].device == rootDevice;
+    return aHasRoot != bHasRoot ? aHasRoot : a.front() < b.front();
   });
-  return places;
+  return volumes;
 }
 
 }  // namespace tallowmere::files

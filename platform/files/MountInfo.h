@@ -31,13 +31,14 @@ std::vector<Mount> ParseMountInfo(std::string_view text);
 // False for the file systems that are kernel interfaces and hold no user's files.
 bool HoldsFiles(std::string_view fileSystemType);
 
-// The index of the mount that is the place of each volume, in the order of volumes: the volume of
-// "/" first, then the kernel's order. Mounts of one file system are one volume; its place is the
-// first reachable mount of the file system's root folder, else its first reachable mount for which
-// `isFolder` says true (a file can be mounted alone). `isFolder` is asked for no other mount.
+// The mounts that make each volume, by index, its place in front; the volumes in their order: the
+// one of "/" first, then the kernel's order of places. Mounts of one file system are one volume.
+// Its place is the first reachable mount of the file system's root folder, else its first reachable
+// mount for which `isFolder` says true (a file can be mounted alone); behind it stand its other
+// reachable mounts. `isFolder` is asked only where no mount shows the root folder.
 //
 // Reachable: not covered by another mount at its own mount point, nor by one further up the way.
-std::vector<std::size_t> VolumePlaces(const std::vector<Mount>& mounts,
-                                      const std::function<bool(const Mount&)>& isFolder);
+std::vector<std::vector<std::size_t>> GroupIntoVolumes(
+    const std::vector<Mount>& mounts, const std::function<bool(const Mount&)>& isFolder);
 
 }  // namespace tallowmere::files

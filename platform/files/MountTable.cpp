@@ -54,6 +54,11 @@ bool HasRoot(const std::vector<Mount>& mounts) {
                      [](const Mount& mount) { return mount.mountPoint == "/"; });
 }
 
+bool IsWithin(std::string_view path, std::string_view folder) {
+  if (folder == "/") return path.starts_with('/');
+  return path.starts_with(folder) && (path.size() == folder.size() || path[folder.size()] == '/');
+}
+
 std::string LabelOfRoot() {
   const Descriptor root(open("/", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   std::array<char, FSLABEL_MAX + 1> label{};
@@ -72,12 +77,19 @@ std::string LinuxNameOf(const std::string& mountPoint) {
 
 }  // namespace
 
-Volume::Volume(VolumeNumber number, const Mount& place)
-    : mNumber(number), mMountPoint(place.mountPoint) {}
+Volume::Volume(VolumeNumber number, const std::vector<Mount>& mounts)
+    : mNumber(number), mType(mounts.front().type) {
+  for (const Mount& mount : mounts) mMountPoints.push_back(mount.mountPoint);
+}
+
+const std::optional<ItemReference>& Volume::Root() const {
+  if (!mRoot) mRoot = ReadItem(AT_FDCWD, MountPoint().c_str());
+  return mRoot;
+}
 
 const std::string& Volume::Name() const {
   if (!mName) {
-    const std::string name = LinuxNameOf(mMountPoint);
+    const std::string name = LinuxNameOf(MountPoint());
     auto plain = PlainHFSName(name, kLongestSpecName);
     mName = plain ? *std::move(plain) : ShortHFSName(name, kRootFolderID);
   }
@@ -91,20 +103,52 @@ MountTable& MountTable::OfThisProcess() {
 
 MountTable::MountTable(std::string source) : mSource(std::move(source)) {}
 
-const Volume* MountTable::AtIndex(std::size_t index) {
+VolumePointer MountTable::AtIndex(std::size_t index) {
   const bool goesOn = mLastIndex && index == *mLastIndex + 1;
   if (!goesOn) Refresh();
   mLastIndex = index;
-  return index < mVolumes.size() ? &mVolumes[index] : nullptr;
+  return index < mVolumes.size() ? mVolumes[index] : nullptr;
 }
 
-const Volume* MountTable::WithNumber(VolumeNumber number) {
+VolumePointer MountTable::WithNumber(VolumeNumber number) {
   Refresh();
-  if (number == 0) return &mVolumes.front();
-  const auto found = std::find_if(mVolumes.begin(), mVolumes.end(), [number](const Volume& volume) {
-    return volume.Number() == number;
-  });
-  return found == mVolumes.end() ? nullptr : &*found;
+  if (number == 0) return mVolumes.front();
+  return FirstWith([number](const Volume& volume) { return volume.Number() == number; });
+}
+
+VolumePointer MountTable::WithName(std::string_view name) {
+  Refresh();
+  return FirstWith([name](const Volume& volume) { return volume.Name() == name; });
+}
+
+VolumePointer MountTable::OfItem(const ItemReference& item, std::string_view path) {
+  if (item.mount == kNoMount) {
+    Refresh();
+    auto volume = FirstWith([&item](const Volume& candidate) {
+      return candidate.Root() && candidate.Root()->device == item.device;
+    });
+    return volume ? volume : OfPath(path);
+  }
+  Refresh();
+  const auto found = mByMount.find(item.mount);
+  return found == mByMount.end() ? nullptr : found->second;
+}
+
+VolumePointer MountTable::OfPath(std::string_view path) {
+  Refresh();
+  VolumePointer longest;
+  for (const VolumePointer& volume : mVolumes) {
+    if (!IsWithin(path, volume->MountPoint())) continue;
+    if (!longest || volume->MountPoint().size() > longest->MountPoint().size()) longest = volume;
+  }
+  return longest;
+}
+
+template <class Predicate>
+VolumePointer MountTable::FirstWith(Predicate predicate) const {
+  const auto found = std::find_if(mVolumes.begin(), mVolumes.end(),
+                                  [&](const VolumePointer& volume) { return predicate(*volume); });
+  return found == mVolumes.end() ? nullptr : *found;
 }
 
 void MountTable::Refresh() {
@@ -129,11 +173,26 @@ void MountTable::Read() {
   }
   if (!HasRoot(mounts)) mounts.insert(mounts.begin(), RootMount());
 
+  MakeVolumes(mounts);
+}
+
+void MountTable::MakeVolumes(const std::vector<Mount>& mounts) {
   mVolumes.clear();
-  for (const std::size_t place : VolumePlaces(mounts, IsFolder)) {
-    if (const auto number = NumberOf(mounts[place], mounts)) {
-      mVolumes.emplace_back(*number, mounts[place]);
-    }
+  mByMount.clear();
+  mMountPoints.clear();
+  mHolders.clear();
+  for (const Mount& mount : mounts) {
+    mMountPoints.insert(mount.mountPoint);
+    mHolders.insert(
+        mount.mountPoint.substr(0, std::max<std::size_t>(mount.mountPoint.rfind('/'), 1)));
+  }
+  for (const auto& indexes : GroupIntoVolumes(mounts, IsFolder)) {
+    std::vector<Mount> own;
+    for (const std::size_t index : indexes) own.push_back(mounts[index]);
+    const auto number = NumberOf(own.front(), mounts);
+    if (!number) continue;
+    mVolumes.push_back(std::make_shared<Volume>(*number, own));
+    for (const Mount& mount : own) mByMount[mount.id] = mVolumes.back();
   }
 }
 

@@ -8,6 +8,8 @@ namespace {
 constexpr long kNever = -1;
 long gUntilFailure = kNever;
 long gLive = 0;
+long gArrays = 0;
+std::size_t gLastArraySize = 0;
 
 }  // namespace
 
@@ -18,6 +20,13 @@ void* operator new(std::size_t size) {
   if (memory == nullptr) throw std::bad_alloc();
   ++gLive;
   return memory;
+}
+
+// The form that does not throw comes here as well.
+void* operator new[](std::size_t size) {
+  ++gArrays;
+  gLastArraySize = size;
+  return operator new(size);
 }
 
 void operator delete(void* memory) noexcept {
@@ -41,6 +50,14 @@ void FailNoAllocation() {
 
 long LiveAllocations() {
   return gLive;
+}
+
+long ArrayAllocations() {
+  return gArrays;
+}
+
+std::size_t SizeOfLastArray() {
+  return gLastArraySize;
 }
 
 }  // namespace tallowmere::foundation::test

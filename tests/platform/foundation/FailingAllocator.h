@@ -1,6 +1,8 @@
 // The process's operator new, made to fail on purpose. One thread.
 #pragma once
 
+#include <cstddef>
+
 namespace tallowmere::foundation::test {
 
 // `count` more allocations succeed, then every one throws std::bad_alloc.
@@ -9,5 +11,9 @@ void FailNoAllocation();
 
 // How many allocations have not been given back.
 long LiveAllocations();
+
+// How many allocations were made by new[], and the bytes of the last one.
+long ArrayAllocations();
+std::size_t SizeOfLastArray();
 
 }  // namespace tallowmere::foundation::test
