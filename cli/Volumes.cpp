@@ -27,7 +27,7 @@ Result<std::vector<Row>> AskForVolumes(const ClientOptions& options) {
   if (!client) return client.Failure();
   std::vector<Row> rows;
   files::MountTable& table = files::MountTable::OfThisProcess();
-  for (std::size_t i = 0; const files::Volume* volume = table.AtIndex(i); ++i) {
+  for (std::size_t i = 0; const files::VolumePointer volume = table.AtIndex(i); ++i) {
     const auto name = client->GetHFSVolumeName(volume->Number());
     if (!name) return name.Failure();
     if (!*name) continue;  // unmounted in between

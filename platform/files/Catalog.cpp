@@ -120,7 +120,10 @@ std::optional<Place> WithID(const VolumePointer& volume, std::uint32_t id, bool 
 
 // An item that can be told by its inode number is remembered by it.
 Path RememberedPath(const Volume& volume, std::uint32_t id) {
-  const auto* const remembered = PlaceMemory::OfThisProcess().Recall(volume.Root()->device, id);
+  ItemReference item{};
+  item.device = volume.Root()->device;
+  item.inode = id;
+  const auto* const remembered = PlaceMemory::OfThisProcess().Recall(item);
   if (remembered == nullptr) return std::nullopt;
   return remembered->canonical ? Path(remembered->path) : CanonicalPath(remembered->path);
 }
@@ -149,7 +152,7 @@ std::string FolderOf(const std::string& path) {
 }
 
 std::optional<std::string> FindPlace(const ItemReference& item) {
-  const auto* const remembered = PlaceMemory::OfThisProcess().Recall(item.device, item.inode);
+  const auto* const remembered = PlaceMemory::OfThisProcess().Recall(item);
   const std::string former = remembered == nullptr ? "" : remembered->path;
   if (remembered != nullptr) {
     const bool wasCanonical = remembered->canonical;

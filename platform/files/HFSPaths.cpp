@@ -42,9 +42,15 @@ Steps ReadPath(std::string_view path) {
   return steps;
 }
 
+// On the way a missing item is a missing folder.
+OSErr OnTheWay(OSErr error) {
+  if (error == fnfErr) return dirNFErr;
+  return error;
+}
+
 OSErr FolderAt(const std::string& path, Folder& folder) {
   const auto real = RealPath(path);
-  if (!real) return ErrorOfSystem() == fnfErr ? dirNFErr : ErrorOfSystem();
+  if (!real) return OnTheWay(ErrorOfSystem());
   const auto item = ReadItem(AT_FDCWD, real->c_str());
   if (!item || !S_ISDIR(item->type)) return dirNFErr;
   folder.place = {*real, *item};
@@ -72,11 +78,11 @@ OSErr Step(std::string_view name, Folder& folder) {
     Folder above;
     const OSErr error = HoldingFolder(folder.place, above);
     if (error == noErr) folder = above;
-    return error == fnfErr ? dirNFErr : error;
+    return OnTheWay(error);
   }
   Place item;
   const OSErr error = LookUpHFSName(folder, name, item);
-  if (error != noErr) return error == fnfErr ? dirNFErr : error;
+  if (error != noErr) return OnTheWay(error);
   return FolderAt(item.path, folder);
 }
 

@@ -47,8 +47,8 @@ void PlaceMemory::Remember(const ItemReference& item, std::string_view path, boo
   while (mSize > mLimit) ForgetTheOldest();
 }
 
-const PlaceMemory::Remembered* PlaceMemory::Recall(std::uint64_t device, std::uint64_t inode) {
-  const auto known = mIndex.find({device, inode});
+const PlaceMemory::Remembered* PlaceMemory::Recall(const ItemReference& item) {
+  const auto known = mIndex.find({item.device, item.inode});
   if (known == mIndex.end()) return nullptr;
   mPlaces.splice(mPlaces.begin(), mPlaces, known->second);
   return &known->second->remembered;

@@ -35,7 +35,7 @@ class PlaceMemory {
 
   // The item's place, which counts as a use; null when none is remembered. Valid until the next
   // Remember.
-  const Remembered* Recall(std::uint64_t device, std::uint64_t inode);
+  const Remembered* Recall(const ItemReference& item);
 
   // The path last remembered or recalled, empty when there is none.
   std::string_view Latest() const;

@@ -19,7 +19,12 @@ VolumePointer VolumeOfRoot(const Place& item) {
 OSErr HoldingFolder(const Place& item, Folder& folder) {
   if (item.path == "/") return fnfErr;
   folder.place.path = FolderOf(item.path);
-  const auto found = ReadItem(AT_FDCWD, folder.place.path.c_str());
+  auto found = ReadItem(AT_FDCWD, folder.place.path.c_str());
+  if (found && !S_ISDIR(found->type)) {
+    // A link has taken the folder's place since the item's path was canonical, and leads to it.
+    folder.place.path = RealPath(folder.place.path).value_or("");
+    found = ReadItem(AT_FDCWD, folder.place.path.c_str());
+  }
   if (!found) return ErrorOfSystem();
   folder.place.item = *found;
   folder.volume = MountTable::OfThisProcess().OfItem(*found, folder.place.path);

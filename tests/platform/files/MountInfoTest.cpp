@@ -15,9 +15,9 @@ using testing::SizeIs;
 std::vector<std::string> PlacesIn(std::string_view table) {
   const std::vector<Mount> mounts = ParseMountInfo(table);
   std::vector<std::string> places;
-  for (const std::size_t place : VolumePlaces(
+  for (const auto& volume : GroupIntoVolumes(
            mounts, [](const Mount& mount) { return !mount.mountPoint.ends_with("file"); })) {
-    places.push_back(mounts[place].mountPoint);
+    places.push_back(mounts[volume.front()].mountPoint);
   }
   return places;
 }
@@ -142,14 +142,14 @@ TEST(MountInfo, AFileMountedAloneIsNoVolumeAndTheNextFolderIsThePlace) {
 
 TEST(MountInfo, OnlyMountsOfInnerFoldersAreAskedWhetherTheyAreFolders) {
   std::vector<std::string> asked;
-  VolumePlaces(ParseMountInfo("25 1 8:1 /inner / rw - ext4 /dev/sda1 rw\n"
-                              "26 25 0:40 / /net rw - nfs host:/x rw\n"
-                              "27 25 0:40 /sub /sub rw - nfs host:/x rw\n"
-                              "28 25 0:41 /bound /bound rw - tmpfs none rw\n"),
-               [&](const Mount& mount) {
-                 asked.push_back(mount.mountPoint);
-                 return true;
-               });
+  GroupIntoVolumes(ParseMountInfo("25 1 8:1 /inner / rw - ext4 /dev/sda1 rw\n"
+                                  "26 25 0:40 / /net rw - nfs host:/x rw\n"
+                                  "27 25 0:40 /sub /sub rw - nfs host:/x rw\n"
+                                  "28 25 0:41 /bound /bound rw - tmpfs none rw\n"),
+                   [&](const Mount& mount) {
+                     asked.push_back(mount.mountPoint);
+                     return true;
+                   });
   EXPECT_THAT(asked, ElementsAre("/bound"));
 }
 
@@ -159,7 +159,8 @@ TEST(MountInfo, OfStackedMountsOnlyTheTopmostIsAVolume) {
       "26 25 0:40 / /mnt rw - tmpfs none rw\n"
       "27 26 0:41 / /mnt rw - tmpfs none rw\n"
       "28 27 0:42 / /mnt rw - ext4 /dev/sdb1 rw\n");
-  EXPECT_THAT(VolumePlaces(mounts, [](const Mount&) { return true; }), ElementsAre(0, 3));
+  EXPECT_THAT(GroupIntoVolumes(mounts, [](const Mount&) { return true; }),
+              ElementsAre(ElementsAre(0), ElementsAre(3)));
 }
 
 TEST(MountInfo, MountsUnderACoveredFolderAreHiddenWithIt) {

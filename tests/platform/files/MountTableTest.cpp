@@ -121,13 +121,13 @@ TEST(MountTable, AWalkSeesOneStateWhileVolumesComeAndGo) {
   const TemporaryFolder folder;
   MountTable table;
   std::vector<std::string> before;
-  for (std::size_t i = 0; const Volume* volume = table.AtIndex(i); ++i) {
+  for (std::size_t i = 0; const VolumePointer volume = table.AtIndex(i); ++i) {
     before.push_back(volume->MountPoint());
   }
 
   std::optional<test::ScopedMount> appearing;
   std::vector<std::string> during;
-  for (std::size_t i = 0; const Volume* volume = table.AtIndex(i); ++i) {
+  for (std::size_t i = 0; const VolumePointer volume = table.AtIndex(i); ++i) {
     during.push_back(volume->MountPoint());
     if (!appearing) appearing.emplace("none", folder.MakeFolder("new").string(), "tmpfs");
   }
@@ -135,7 +135,7 @@ TEST(MountTable, AWalkSeesOneStateWhileVolumesComeAndGo) {
   EXPECT_EQ(during, before);
 
   std::vector<std::string> after;
-  for (std::size_t i = 0; const Volume* volume = table.AtIndex(i); ++i) {
+  for (std::size_t i = 0; const VolumePointer volume = table.AtIndex(i); ++i) {
     after.push_back(volume->MountPoint());
   }
   before.push_back((folder.Path() / "new").string());
