@@ -214,7 +214,7 @@ TEST_F(IdentityOnAVolume, AnIdInTheUpperHalfIsNegativeWhereItIsSigned) {
   EXPECT_EQ(mData->Ref("folder/missing").GetParentID(), folder.GetDirectoryID());
   FSSpec spec;
   ASSERT_TRUE(mData->Ref("folder/missing").GetFSSpec(&spec));
-  EXPECT_EQ(spec.parID, folder.GetDirectoryID());
+  EXPECT_EQ(FieldsOf(spec).folder, folder.GetDirectoryID());
   CFileRef again;
   EXPECT_TRUE(again.Set(mData->Number(), folder.GetDirectoryID(), 0, nullptr, false));
   EXPECT_EQ(again, folder);

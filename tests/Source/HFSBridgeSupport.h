@@ -101,7 +101,7 @@ class Volume {
     return Path(item);
   }
   std::string MakeFile(std::string_view item) const {
-    std::ofstream(mRoot / item);
+    const std::ofstream file(mRoot / item);
     return Path(item);
   }
 
