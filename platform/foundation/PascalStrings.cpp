@@ -1,11 +1,11 @@
+#include "foundation/PascalStrings.h"
+
 #include <CoreServices/CoreServices.h>
 
 #include <cstddef>
 #include <cstring>
 
-namespace {
-constexpr std::size_t kLongestPascalString = 255;
-}
+using tallowmere::foundation::kLongestPascalString;
 
 void c2pstrcpy(StringPtr destination, const char* source) {
   const std::size_t length = strnlen(source, kLongestPascalString);

@@ -1,0 +1,652 @@
+#include "CFileRef.h"
+
+#include <AppKit/Workspace.h>
+#include <pwd.h>
+#include <strings.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <iostream>
+#include <memory>
+#include <new>
+#include <string_view>
+
+#include "CFOwned.h"
+
+namespace {
+
+using Text = std::unique_ptr<char[]>;
+
+// What an empty FSSpec holds.
+constexpr SInt16 kNoVolume = 32767;
+constexpr SInt32 kNoFolder = -1;
+
+// Room for a path or a name, in bytes with the NUL. A longer path is converted on the heap; a
+// longer name is refused.
+constexpr std::size_t kTextBufferSize = 1024;
+
+// Room for an extension that is compared, with the NUL.
+constexpr std::size_t kExtensionBufferSize = 20;
+
+// Parts of st_mode.
+constexpr mode_t kTypeMask = 0xF000;
+constexpr mode_t kFolderType = 0x4000;
+constexpr mode_t kLinkType = 0xA000;
+constexpr mode_t kStickyBit = 0x200;
+
+// Other volumes are mounted below this folder, so the root does not contain what begins with it.
+constexpr std::string_view kRootPath = "/";
+constexpr std::string_view kVolumesPrefix = "/Volumes/";
+
+// What the platform may give for the folder of a bare name.
+constexpr std::string_view kThisFolder = ".";
+constexpr std::string_view kThisFolderMarked = "./";
+
+// --- Text -------------------------------------------------------------------------------------
+
+// Copies as much of `source` as fits into `size` bytes, NUL-terminated unless `size` is 0. The
+// length of `source`.
+std::size_t CopyBounded(char* destination, char const* source, std::size_t size) {
+  const std::size_t length = std::strlen(source);
+  if (size > 0) {
+    const std::size_t copied = std::min(length, size - 1);
+    std::memcpy(destination, source, copied);
+    destination[copied] = '\0';
+  }
+  return length;
+}
+
+// Null when there is no memory.
+Text AllocateText(std::size_t size) {
+  return Text(new (std::nothrow) char[size]);
+}
+
+std::size_t LengthWithoutTrailingSlashes(char const* path) {
+  std::size_t length = std::strlen(path);
+  while (length > 1 && path[length - 1] == '/') --length;
+  return length;
+}
+
+bool EqualIgnoringCase(char const* first, char const* second, std::size_t length) {
+  return strncasecmp(first, second, length) == 0;
+}
+
+// What follows the last "." of a name; null without one.
+char const* ExtensionIn(char const* name) {
+  char const* const dot = std::strrchr(name, '.');
+  return dot == nullptr ? nullptr : dot + 1;
+}
+
+char const* WithoutDot(std::string const& extension) {
+  return extension.c_str() + (extension.starts_with('.') ? 1 : 0);
+}
+
+// --- Strings and URLs of the platform ---------------------------------------------------------
+
+CFOwned<CFStringRef> JoinPaths(CFStringRef folder, CFStringRef remainder) {
+  return CFOwned<CFStringRef>(
+      CFStringCreateWithFormat(kCFAllocatorDefault, nullptr, CFSTR("%@/%@"), folder, remainder));
+}
+
+CFOwned<CFStringRef> StringOfUTF8(char const* text) {
+  return CFOwned<CFStringRef>(
+      CFStringCreateWithCString(kCFAllocatorDefault, text, kCFStringEncodingUTF8));
+}
+
+CFOwned<CFStringRef> StringOfPath(char const* path) {
+  return CFOwned<CFStringRef>(
+      CFStringCreateWithFileSystemRepresentation(kCFAllocatorDefault, path));
+}
+
+CFOwned<CFStringRef> PathOf(CFURLRef url) {
+  return CFOwned<CFStringRef>(CFURLCopyFileSystemPath(url, kCFURLPOSIXPathStyle));
+}
+
+CFURLRef CreateURLOfPath(CFStringRef path, bool isDirectory) {
+  return CFURLCreateWithFileSystemPath(kCFAllocatorDefault, path, kCFURLPOSIXPathStyle,
+                                       isDirectory);
+}
+
+CFURLPathStyle PlatformStyle(tPathStyle style) {
+  switch (style) {
+    case kPathStylePOSIX:
+      return kCFURLPOSIXPathStyle;
+    case kPathStyleHFS:
+      return kCFURLHFSPathStyle;
+    default:
+      return kCFURLWindowsPathStyle;
+  }
+}
+
+bool HasAbsolutePath(CFURLRef url) {
+  Boolean isAbsolute = true;
+  const CFOwned<CFStringRef> path(CFURLCopyStrictPath(url, &isAbsolute));
+  return isAbsolute;
+}
+
+// The string as a path on the heap, for one that is too long for the buffer on the stack. Null when
+// it is no path or there is no memory.
+Text LongPathOf(CFStringRef string) {
+  const CFIndex size = CFStringGetMaximumSizeOfFileSystemRepresentation(string);
+  if (size <= 0) return nullptr;
+  Text path = AllocateText(static_cast<std::size_t>(size));
+  if (path && !CFStringGetFileSystemRepresentation(string, path.get(), size)) path.reset();
+  return path;
+}
+
+// The folder and the name with "/" between them; a copy of the folder for a null name, of the name
+// for an empty folder. Null without memory for all of it.
+CFOwned<CFMutableStringRef> FolderAndName(CFStringRef folder, CFStringRef name) {
+  CFOwned<CFMutableStringRef> joined(CFStringCreateMutableCopy(kCFAllocatorDefault, 0, folder));
+  if (!joined || name == nullptr) return joined;
+  const CFIndex folderLength = CFStringGetLength(folder);
+  if (folderLength > 0) CFStringAppend(joined.Get(), CFSTR("/"));
+  CFStringAppend(joined.Get(), name);
+  const CFIndex expected = folderLength + (folderLength > 0 ? 1 : 0) + CFStringGetLength(name);
+  return CFStringGetLength(joined.Get()) == expected ? std::move(joined)
+                                                     : CFOwned<CFMutableStringRef>();
+}
+
+// --- "~" --------------------------------------------------------------------------------------
+
+// Stops the process with the report of a failed assertion, in every kind of build.
+[[noreturn]] void StopForNullPath() {
+  std::fputs(
+      "Assertion failed: (path != NULL), function CreateURLByExpandingTildePath, "
+      "file CFileRef.cpp, line 64.\n",
+      stderr);
+  std::abort();
+}
+
+// The user whose name are the `length` units behind the "~"; the current one for an empty name.
+passwd const* FindUser(CFStringRef tildePath, CFIndex length) {
+  const CFIndex size = CFStringGetMaximumSizeForEncoding(length, kCFStringEncodingUTF8);
+  std::string name(static_cast<std::size_t>(size), '\0');
+  CFIndex used = 0;
+  CFStringGetBytes(tildePath, CFRangeMake(1, length), kCFStringEncodingUTF8, 0, false,
+                   reinterpret_cast<UInt8*>(name.data()), size, &used);
+  name.resize(static_cast<std::size_t>(used));
+  return used == 0 ? getpwuid(getuid()) : getpwnam(name.c_str());
+}
+
+// What stands behind the "/" that ends the user's name; empty without one.
+CFOwned<CFStringRef> RemainderBehind(CFStringRef tildePath, CFIndex slash) {
+  const CFIndex length = CFStringGetLength(tildePath);
+  if (slash == length) {
+    return CFOwned<CFStringRef>(CFStringCreateWithCharacters(kCFAllocatorDefault, nullptr, 0));
+  }
+  return CFOwned<CFStringRef>(CFStringCreateWithSubstring(
+      kCFAllocatorDefault, tildePath, CFRangeMake(slash + 1, length - slash - 1)));
+}
+
+// The place of the "/" that ends the user's name, or the end of the path.
+CFIndex EndOfUserName(CFStringRef tildePath) {
+  const CFIndex length = CFStringGetLength(tildePath);
+  CFRange found = {};
+  const bool hasSlash =
+      CFStringFindWithOptions(tildePath, CFSTR("/"), CFRangeMake(1, length - 1), 0, &found);
+  return hasSlash ? found.location : length;
+}
+
+CFURLRef CreateURLInHomeFolder(CFStringRef tildePath, bool isDirectory) {
+  const CFIndex slash = EndOfUserName(tildePath);
+  const CFOwned<CFStringRef> remainder = RemainderBehind(tildePath, slash);
+  if (!remainder) return nullptr;
+  passwd const* const user = FindUser(tildePath, slash - 1);
+  if (user == nullptr) return nullptr;
+  const CFOwned<CFStringRef> home = StringOfPath(user->pw_dir);
+  if (!home) return nullptr;
+  if (CFStringGetLength(remainder.Get()) == 0) return CreateURLOfPath(home.Get(), true);
+  const CFOwned<CFStringRef> path = JoinPaths(home.Get(), remainder.Get());
+  return path ? CreateURLOfPath(path.Get(), isDirectory) : nullptr;
+}
+
+// --- Items on disk ----------------------------------------------------------------------------
+
+// Of the item itself; false when there is none.
+bool ReadMode(char const* path, mode_t* mode) {
+  struct stat about = {};
+  if (lstat(path, &about) != 0) return false;
+  *mode = about.st_mode;
+  return true;
+}
+
+bool IsFolderMode(mode_t mode) {
+  return (mode & kTypeMask) == kFolderType;
+}
+
+// The text of the link at `path`; null when it is none or cannot be read. The test is a mask, not
+// a comparison of types.
+Text ReadLink(char const* path) {
+  struct stat about = {};
+  if (lstat(path, &about) != 0 || (about.st_mode & kLinkType) != kLinkType) return nullptr;
+  const auto size = static_cast<std::size_t>(about.st_size);
+  Text target = AllocateText(size + 1);
+  if (!target) return nullptr;
+  const ssize_t length = readlink(path, target.get(), size);
+  if (length <= 0) return nullptr;
+  target[static_cast<std::size_t>(length)] = '\0';
+  return target;
+}
+
+}  // namespace
+
+// --- Life -------------------------------------------------------------------------------------
+
+const CFileRef CFileRef::None;
+CFStringEncoding CFileRef::mLocalEncoding = kCFStringEncodingMacRoman;
+
+CFileRef::CFileRef() {
+  Init();
+}
+
+CFileRef::CFileRef(CFileRef const& source) : CFileRef() {
+  if (source.IsValid()) Set(source.mURL);
+}
+
+CFileRef& CFileRef::operator=(CFileRef const& source) {
+  if (this == &source) return *this;
+  ReInit();
+  if (source.IsValid()) Set(source.mURL);
+  return *this;
+}
+
+CFileRef::~CFileRef() {
+  ReInit();
+}
+
+void CFileRef::Init() {
+  mValid = 0;
+  mURL = nullptr;
+  mPath = nullptr;
+  mFSRef = FSRef{};
+  mFSSpec.vRefNum = kNoVolume;
+  mFSSpec.parID = kNoFolder;
+  mFSSpec.name[0] = 0;
+}
+
+void CFileRef::ReInit() {
+  if (mURL != nullptr) CFRelease(mURL);
+  delete[] mPath;
+  Init();
+}
+
+void CFileRef::Invalidate() {
+  ReInit();
+}
+
+bool CFileRef::IsValid() const {
+  return (mValid & 1) != 0;
+}
+
+bool CFileRef::UpdateInternalFSRef() const {
+  if (!IsValid()) return false;
+  if (CFURLGetFSRef(mURL, &mFSRef)) return true;
+  mFSRef = FSRef{};
+  return false;
+}
+
+bool CFileRef::GetFSRef(FSRef* item) const {
+  char const* const path = GetPath();
+  if (path == nullptr || path[0] == '.') return false;
+  return CFURLGetFSRef(mURL, item);
+}
+
+CFileRef::operator FSRef const&() const {
+  UpdateInternalFSRef();
+  return mFSRef;
+}
+
+CFileRef::operator FSRef const*() const {
+  return &static_cast<FSRef const&>(*this);
+}
+
+// --- Setting ----------------------------------------------------------------------------------
+
+bool CFileRef::Hold(CFURLRef url) {
+  mURL = url;
+  mValid = url != nullptr ? 1 : 0;
+  return url != nullptr;
+}
+
+bool CFileRef::HoldPathOf(CFURLRef url, bool isDirectory) {
+  const CFOwned<CFStringRef> path = PathOf(url);
+  return path && Hold(CreateURLOfPath(path.Get(), isDirectory));
+}
+
+CFileRef::CFileRef(char const* path, bool isDirectory) : CFileRef() {
+  Set(path, isDirectory);
+}
+
+// The path is read before the reference is emptied, for it may be the reference's own.
+bool CFileRef::Set(char const* path, bool isDirectory) {
+  const auto string = path != nullptr ? StringOfPath(path) : CFOwned<CFStringRef>();
+  ReInit();
+  return string && Hold(CreateURLByExpandingTildePath(string.Get(), isDirectory));
+}
+
+CFileRef::CFileRef(CFStringRef path, tPathStyle style, bool isDirectory) : CFileRef() {
+  Set(path, style, isDirectory);
+}
+
+bool CFileRef::Set(CFStringRef path, tPathStyle style, bool isDirectory) {
+  ReInit();
+  if (path == nullptr) return false;
+  if (style == kPathStylePOSIX) return Hold(CreateURLByExpandingTildePath(path, isDirectory));
+  return Hold(
+      CFURLCreateWithFileSystemPath(kCFAllocatorDefault, path, PlatformStyle(style), isDirectory));
+}
+
+CFileRef::CFileRef(CFStringRef folder, CFStringRef name) : CFileRef() {
+  Set(folder, name);
+}
+
+bool CFileRef::Set(CFStringRef folder, CFStringRef name) {
+  const CFOwned<CFMutableStringRef> path = FolderAndName(folder, name);
+  ReInit();
+  return path && Hold(CreateURLByExpandingTildePath(path.Get(), name == nullptr));
+}
+
+bool CFileRef::SetFromURLString(std::string const& url) {
+  ReInit();
+  const CFOwned<CFURLRef> made(
+      CFURLCreateWithBytes(kCFAllocatorDefault, reinterpret_cast<UInt8 const*>(url.data()),
+                           static_cast<CFIndex>(url.size()), kCFStringEncodingUTF8, nullptr));
+  return Set(made.Get());
+}
+
+CFileRef::CFileRef(CFURLRef url) : CFileRef() {
+  Set(url);
+}
+
+bool CFileRef::Set(CFURLRef url) {
+  ReInit();
+  return url != nullptr && Hold(static_cast<CFURLRef>(CFRetain(url)));
+}
+
+bool CFileRef::Set(CFURLRef url, bool isDirectory) {
+  ReInit();
+  return url != nullptr && HoldPathOf(url, isDirectory);
+}
+
+CFileRef::CFileRef(FSRef const* item) : CFileRef() {
+  Set(item);
+}
+
+bool CFileRef::Set(FSRef const* item) {
+  ReInit();
+  return item != nullptr && Hold(CFURLCreateFromFSRef(kCFAllocatorDefault, item));
+}
+
+bool CFileRef::Set(CFileRef const& source, bool isDirectory) {
+  return Set(source.mURL, isDirectory);
+}
+
+// --- Path and state ---------------------------------------------------------------------------
+
+CFStringRef CFileRef::CopyFileSystemPath(tPathStyle style) const {
+  return IsValid() ? CFURLCopyFileSystemPath(mURL, PlatformStyle(style)) : nullptr;
+}
+
+char const* CFileRef::GetPath() const {
+  if (!IsValid()) return nullptr;
+  if (mPath != nullptr) return mPath;
+  if (!HasAbsolutePath(mURL)) return nullptr;
+  const CFOwned<CFStringRef> string = PathOf(mURL);
+  if (!string) return nullptr;
+
+  char buffer[kTextBufferSize];
+  buffer[0] = '\0';
+  Text longPath;
+  if (!CFStringGetFileSystemRepresentation(string.Get(), buffer, sizeof buffer)) {
+    longPath = LongPathOf(string.Get());
+  }
+  char const* const path = longPath ? longPath.get() : buffer;
+  if (!longPath && buffer[0] == '\0') return nullptr;
+
+  const std::size_t size = LengthWithoutTrailingSlashes(path) + 1;
+  mPath = AllocateText(size).release();
+  if (mPath != nullptr) CopyBounded(mPath, path, size);
+  return mPath;
+}
+
+CFileRef::operator char const*() const {
+  return GetPath();
+}
+
+bool CFileRef::GetPath(char* buffer, unsigned long size) const {
+  buffer[0] = '\0';
+  char const* const path = GetPath();
+  return path != nullptr && CopyBounded(buffer, path, size) < size;
+}
+
+CFileRef::operator std::string() const {
+  return GetPath();
+}
+
+bool CFileRef::Exists() const {
+  char const* const path = GetPath();
+  mode_t mode = 0;
+  if (path == nullptr || !ReadMode(path, &mode)) return false;
+  if ((mode & kTypeMask) != kLinkType || (mode & kStickyBit) != 0) return true;
+  struct stat target = {};
+  return stat(path, &target) == 0;
+}
+
+bool CFileRef::IsFolder() const {
+  char const* const path = GetPath();
+  mode_t mode = 0;
+  return path != nullptr && ReadMode(path, &mode) && IsFolderMode(mode);
+}
+
+bool CFileRef::IsFile() const {
+  char const* const path = GetPath();
+  mode_t mode = 0;
+  return path != nullptr && ReadMode(path, &mode) && !IsFolderMode(mode);
+}
+
+bool CFileRef::operator==(CFileRef const& other) const {
+  if (IsValid() != other.IsValid()) return false;
+  if (!IsValid()) return true;
+  if (UpdateInternalFSRef() && other.UpdateInternalFSRef()) {
+    return FSCompareFSRefs(&mFSRef, &other.mFSRef) == noErr;
+  }
+  return CFEqual(mURL, other.mURL);
+}
+
+bool CFileRef::operator!=(CFileRef const& other) const {
+  return !(*this == other);
+}
+
+bool CFileRef::PathContains(CFileRef const& other) const {
+  char const* const path = GetPath();
+  char const* const otherPath = other.GetPath();
+  if (path == nullptr || otherPath == nullptr) return false;
+  const std::size_t length = std::strlen(path);
+  const std::size_t otherLength = std::strlen(otherPath);
+  if (length > otherLength) return false;
+  if (path == kRootPath &&
+      EqualIgnoringCase(otherPath, kVolumesPrefix.data(), kVolumesPrefix.size())) {
+    return false;
+  }
+  if (!EqualIgnoringCase(path, otherPath, length)) return false;
+  return length == otherLength || otherPath[length] == '/';
+}
+
+void CFileRef::Trace() const {
+  if (!IsValid()) {
+    std::cout << "(invalid)";
+    return;
+  }
+  std::cout << GetPath() << (Exists() ? " (state: existing)" : " (state: not existing)");
+}
+
+bool CFileRef::IsExistingPackage() const {
+  if (!IsValid()) return false;
+  const CFOwned<CFStringRef> path = PathOf(mURL);
+  return Workspace::IsFilePackageAtPath(path.Get());
+}
+
+// --- Names and extensions ---------------------------------------------------------------------
+
+CFStringRef CFileRef::CopyFileName() const {
+  return IsValid() ? CFURLCopyLastPathComponent(mURL) : nullptr;
+}
+
+bool CFileRef::GetFileName(char* name, long size) const {
+  const CFOwned<CFStringRef> component(CopyFileName());
+  if (!component) return false;
+  char text[kTextBufferSize];
+  if (!CFStringGetFileSystemRepresentation(component.Get(), text, sizeof text)) return false;
+  const auto room = static_cast<std::size_t>(std::max(size, 0L));
+  // Without room the caller's text stays, but for the "/" at its end. With room the name overwrites
+  // it, and the caller's buffer need not be text at all.
+  if (room == 0 && name != nullptr) {
+    for (std::size_t end = std::strlen(name); end > 0 && name[end - 1] == '/'; --end) {
+      name[end - 1] = '\0';
+    }
+  }
+  return CopyBounded(name, text, room) <= room;
+}
+
+bool CFileRef::HasValidName() const {
+  char name[kTextBufferSize];
+  return GetFileName(name, sizeof name);
+}
+
+CFStringRef CFileRef::CopyFileExtension() const {
+  return IsValid() ? CFURLCopyPathExtension(mURL) : nullptr;
+}
+
+bool CFileRef::GetExtension(char* extension, unsigned long size) const {
+  char name[kTextBufferSize];
+  if (extension == nullptr || !GetFileName(name, sizeof name)) return false;
+  char const* const found = ExtensionIn(name);
+  if (found == nullptr || std::strlen(found) >= size) return false;
+  std::strncpy(extension, found, size);
+  return true;
+}
+
+bool CFileRef::GetExtension(std::string& extension) const {
+  char name[kTextBufferSize];
+  if (!GetFileName(name, sizeof name)) return false;
+  char const* const found = ExtensionIn(name);
+  if (found == nullptr) return false;
+  extension = found;
+  return true;
+}
+
+// Compares over the length of the name's extension only, so an empty one matches everything.
+bool CFileRef::HasExtension(std::string const& extension) const {
+  char name[kTextBufferSize];
+  if (extension.empty() || !GetFileName(name, sizeof name)) return false;
+  char const* const found = ExtensionIn(name);
+  if (found == nullptr) return false;
+  const std::size_t length = std::strlen(found);
+  return length < kExtensionBufferSize && EqualIgnoringCase(found, WithoutDot(extension), length);
+}
+
+void CFileRef::ReplaceExtensionBy(std::string const& extension) {
+  char name[kTextBufferSize];
+  if (!GetFileName(name, sizeof name)) return;
+  std::string replaced = name;
+  const std::size_t dot = replaced.rfind('.');
+  if (dot != std::string::npos) {
+    replaced.resize(extension.empty() ? dot : dot + 1);
+  } else {
+    replaced += '.';
+  }
+  replaced += WithoutDot(extension);
+  ReplaceName(replaced.c_str(), false);
+}
+
+// --- Editing ----------------------------------------------------------------------------------
+
+bool CFileRef::AddToPath(CFStringRef component, bool isDirectory) {
+  if (!IsValid()) return Set(component, kPathStylePOSIX, isDirectory);
+  const CFOwned<CFStringRef> path = PathOf(mURL);
+  if (!path) return false;
+  const CFOwned<CFStringRef> joined = JoinPaths(path.Get(), component);
+  if (!joined) return false;
+  return Set(joined.Get(), kPathStylePOSIX, isDirectory);
+}
+
+bool CFileRef::AddToPath(CFileRef const& other) {
+  if (!IsValid() || !other.IsValid()) return false;
+  const CFOwned<CFStringRef> component(other.CopyFileName());
+  return component && AddToPath(component.Get(), CFURLHasDirectoryPath(other.mURL));
+}
+
+bool CFileRef::AddToPath(char const* component, bool isDirectory) {
+  if (component == nullptr) return false;
+  const CFOwned<CFStringRef> string = StringOfUTF8(component);
+  return string && AddToPath(string.Get(), isDirectory);
+}
+
+// The new URL is made from the path of the appended one, so that it is a plain URL of a file.
+bool CFileRef::ReplaceName(CFStringRef name, bool isDirectory) {
+  if (!IsValid()) return !isDirectory && Set(name, kPathStylePOSIX, false);
+  const CFOwned<CFURLRef> folder(
+      CFURLCreateCopyDeletingLastPathComponent(kCFAllocatorDefault, mURL));
+  if (!folder) return false;
+  const CFOwned<CFURLRef> renamed(
+      CFURLCreateCopyAppendingPathComponent(kCFAllocatorDefault, folder.Get(), name, isDirectory));
+  if (!renamed) return false;
+  return Set(renamed.Get(), isDirectory);
+}
+
+bool CFileRef::ReplaceName(CFileRef const& other) {
+  const CFOwned<CFStringRef> name(other.CopyFileName());
+  return name && ReplaceName(name.Get(), CFURLHasDirectoryPath(other.mURL));
+}
+
+bool CFileRef::ReplaceName(char const* name, bool isDirectory) {
+  if (name == nullptr) return false;
+  const CFOwned<CFStringRef> string = StringOfUTF8(name);
+  return string && ReplaceName(string.Get(), isDirectory);
+}
+
+void CFileRef::SetToParent() {
+  if (!IsValid()) return;
+  const CFOwned<CFURLRef> folder(
+      CFURLCreateCopyDeletingLastPathComponent(kCFAllocatorDefault, mURL));
+  Set(folder.Get(), true);
+  char const* const path = GetPath();
+  if (path == nullptr || path == kThisFolderMarked || path == kThisFolder) ReInit();
+}
+
+bool CFileRef::ResolveAlias(bool allowInteraction) {
+  if (!UpdateInternalFSRef()) return false;
+  FSRef target = mFSRef;
+  Boolean targetIsFolder = false;
+  Boolean wasAliased = false;
+  unsigned long flags = 0;
+  if (!allowInteraction) flags |= kResolveAliasFileNoUI;
+  const OSErr result =
+      FSResolveAliasFileWithMountFlags(&target, true, &targetIsFolder, &wasAliased, flags);
+  return result == noErr && wasAliased ? Set(&target) : FollowLink();
+}
+
+// A relative text is looked at from the current folder, as it is used; a target that cannot be
+// looked at counts as a file, and so does a link.
+bool CFileRef::FollowLink() {
+  char const* const path = GetPath();
+  const Text target = path != nullptr ? ReadLink(path) : nullptr;
+  if (!target) return false;
+  mode_t mode = kTypeMask;
+  ReadMode(target.get(), &mode);
+  return Set(target.get(), IsFolderMode(mode));
+}
+
+// --- "~" --------------------------------------------------------------------------------------
+
+CFURLRef CreateURLByExpandingTildePath(CFStringRef path, bool isDirectory) {
+  if (path == nullptr) StopForNullPath();
+  if (CFStringHasPrefix(path, CFSTR("~"))) return CreateURLInHomeFolder(path, isDirectory);
+  const CFOwned<CFStringRef> copy(CFStringCreateCopy(kCFAllocatorDefault, path));
+  return copy ? CreateURLOfPath(copy.Get(), isDirectory) : nullptr;
+}

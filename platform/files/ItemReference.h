@@ -1,0 +1,68 @@
+// What an FSRef holds: which item of which file system, told so that another item that gets the
+// same numbers later is not taken for it.
+//
+// The proof of identity is the inode number with the time of birth. That is enough unless the item
+// was born just before it was read: file systems give a freed number away at once, and time moves
+// in ticks. A newborn item, and one without a known birth, also carries its file handle. Where
+// there is neither birth nor handle, the type and the mount have to be the same, and a new item of
+// the same type with the same number is not noticed; nor is it where a newborn has no handle and
+// the number goes round within one tick.
+#pragma once
+
+#include <CoreServices/CoreServices.h>
+
+#include <cstdint>
+#include <optional>
+#include <string>
+
+#include "files/FileHandle.h"
+
+namespace tallowmere::files {
+
+inline constexpr std::int32_t kNoMount = -1;
+inline constexpr std::uint32_t kNoBirth = 0xFFFFFFFF;
+
+// Plain bytes, an FSRef's own.
+struct ItemReference {
+  std::uint64_t inode;
+  std::uint64_t device;
+  std::int64_t birthSeconds;       // since 1970
+  std::uint32_t birthNanoseconds;  // kNoBirth: the file system does not tell
+  std::int32_t mount;              // the id in /proc/self/mountinfo; kNoMount: not told
+  std::uint32_t type;              // the S_IFMT part of the mode, never 0 for an item
+  FileHandle handle;               // of a newborn item alone
+};
+static_assert(sizeof(ItemReference) == sizeof(FSRef));
+
+// An existing item and where it is: the canonical absolute path, no links on the way, and the item
+// itself not followed when it is one.
+struct Place {
+  std::string path;
+  ItemReference item;
+};
+
+FSRef Pack(const ItemReference& item);
+
+// None for null and for what Pack does not make, all zero among it.
+std::optional<ItemReference> Unpack(const FSRef* reference);
+
+// Whether both are to one item, by device and inode number.
+bool AreEqual(const ItemReference& first, const ItemReference& second);
+
+// The item itself, links not followed and nothing mounted on the way; none when there is none.
+// `folder` as in openat(2); with an empty name, the open item itself.
+std::optional<ItemReference> ReadItem(int folder, const char* name);
+
+// The item without its handle, and when it was last changed.
+struct ItemStatus {
+  ItemReference item;
+  std::int64_t change;  // nanoseconds since 1970
+};
+
+// As ReadItem, in one system call.
+std::optional<ItemStatus> ReadStatus(int folder, const char* name);
+
+// Whether this very item is there now, on whichever mount.
+bool IsAt(const ItemReference& item, int folder, const char* name);
+
+}  // namespace tallowmere::files

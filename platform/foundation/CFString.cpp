@@ -1,0 +1,250 @@
+#include <CoreFoundation/CoreFoundation.h>
+
+#include <algorithm>
+#include <cstdarg>
+#include <cstring>
+#include <exception>
+#include <limits>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include "foundation/Encodings.h"
+#include "foundation/FileNameText.h"
+#include "foundation/NoThrow.h"
+#include "foundation/PascalStrings.h"
+#include "foundation/String.h"
+
+namespace {
+
+using namespace tallowmere::foundation;
+
+// UTF-8 spends at most 3 bytes on a UTF-16 unit, an escaped byte 1.
+constexpr CFIndex kFileNameBytesPerUnit = 3;
+
+CFIndex IndexOf(std::size_t count) {
+  return static_cast<CFIndex>(count);
+}
+
+std::size_t SizeOf(CFIndex index) {
+  return static_cast<std::size_t>(std::max<CFIndex>(index, 0));
+}
+
+// The units of a range; none when it does not lie within the string.
+std::optional<std::u16string_view> Slice(CFStringRef string, CFRange range) {
+  const std::u16string_view text = StringOf(string).Text();
+  if (range.location < 0 || range.length < 0 || SizeOf(range.location) > text.size() ||
+      SizeOf(range.length) > text.size() - SizeOf(range.location)) {
+    return std::nullopt;
+  }
+  return text.substr(SizeOf(range.location), SizeOf(range.length));
+}
+
+// A new string of bytes; null when they are not valid in the encoding.
+CFStringRef CreateDecoded(std::string_view bytes, CFStringEncoding id) {
+  const Encoding* const encoding = FindEncoding(id);
+  if (encoding == nullptr) return nullptr;
+  auto text = encoding->decode(bytes);
+  return text ? CreateString(*std::move(text)) : nullptr;
+}
+
+// What "%@" stands for; none for an object that is no string.
+std::optional<std::u16string_view> Described(CFTypeRef object) {
+  if (object == nullptr) return u"(null)";
+  const auto* const string = dynamic_cast<const String*>(static_cast<const Object*>(object));
+  if (string == nullptr) return std::nullopt;
+  return string->Text();
+}
+
+std::optional<std::u16string> Formatted(std::u16string_view format, va_list arguments) {
+  std::u16string text;
+  for (std::size_t i = 0; i < format.size(); ++i) {
+    if (format[i] != u'%') {
+      text.push_back(format[i]);
+      continue;
+    }
+    ++i;
+    const char16_t directive = i < format.size() ? format[i] : u'\0';
+    if (directive == u'%') {
+      text.push_back(u'%');
+    } else if (directive == u'@') {
+      const auto description = Described(va_arg(arguments, CFTypeRef));
+      if (!description) return std::nullopt;
+      text += *description;
+    } else {
+      return std::nullopt;
+    }
+  }
+  return text;
+}
+
+}  // namespace
+
+// --- Encodings --------------------------------------------------------------------------------
+
+CFStringEncoding CFStringGetSystemEncoding() {
+  return kCFStringEncodingMacRoman;
+}
+
+const CFStringEncoding* CFStringGetListOfAvailableEncodings() {
+  return EncodingList();
+}
+
+CFIndex CFStringGetMaximumSizeForEncoding(CFIndex length, CFStringEncoding encoding) {
+  const Encoding* const found = FindEncoding(encoding);
+  if (found == nullptr) return kCFNotFound;
+  const CFIndex bytesPerUnit = IndexOf(found->bytesPerUnit);
+  if (length > std::numeric_limits<CFIndex>::max() / bytesPerUnit) return kCFNotFound;
+  return length * bytesPerUnit;
+}
+
+// --- Making -----------------------------------------------------------------------------------
+
+CFStringRef __CFStringMakeConstantString(const char* utf8) {
+  const CFStringRef constant = OrZero([&] { return CreateDecoded(utf8, kCFStringEncodingUTF8); });
+  if (constant == nullptr) std::terminate();
+  // A constant is never given back.
+  return constant;  // NOLINT(clang-analyzer-osx.cocoa.RetainCount)
+}
+
+CFStringRef CFStringCreateWithCharacters(CFAllocatorRef, const UniChar* characters,
+                                         CFIndex length) {
+  if (length < 0) return nullptr;
+  return OrZero([&] { return CreateString({characters, characters + length}); });
+}
+
+CFStringRef CFStringCreateWithCString(CFAllocatorRef, const char* bytes,
+                                      CFStringEncoding encoding) {
+  return OrZero([&] { return CreateDecoded(bytes, encoding); });
+}
+
+CFStringRef CFStringCreateWithPascalString(CFAllocatorRef, ConstStr255Param bytes,
+                                           CFStringEncoding encoding) {
+  return OrZero([&] {
+    return CreateDecoded({reinterpret_cast<const char*>(bytes + 1), bytes[0]}, encoding);
+  });
+}
+
+CFStringRef CFStringCreateWithFileSystemRepresentation(CFAllocatorRef, const char* name) {
+  return OrZero([&] { return CreateString(TextOfFileName(name)); });
+}
+
+CFStringRef CFStringCreateWithFormat(CFAllocatorRef, CFDictionaryRef, CFStringRef format, ...) {
+  va_list arguments;
+  va_start(arguments, format);
+  const CFStringRef string = OrZero([&]() -> CFStringRef {
+    auto text = Formatted(StringOf(format).Text(), arguments);
+    return text ? CreateString(*std::move(text)) : nullptr;
+  });
+  va_end(arguments);
+  return string;
+}
+
+CFStringRef CFStringCreateCopy(CFAllocatorRef, CFStringRef string) {
+  return OrZero([&] { return CreateString(StringOf(string).Text()); });
+}
+
+CFStringRef CFStringCreateWithSubstring(CFAllocatorRef, CFStringRef string, CFRange range) {
+  const auto text = Slice(string, range);
+  if (!text) return nullptr;
+  return OrZero([&] { return CreateString(std::u16string(*text)); });
+}
+
+CFMutableStringRef CFStringCreateMutableCopy(CFAllocatorRef, CFIndex, CFStringRef string) {
+  return OrZero([&] { return CreateString(StringOf(string).Text()); });
+}
+
+// --- Changing ---------------------------------------------------------------------------------
+
+void CFStringAppend(CFMutableStringRef string, CFStringRef appended) {
+  OrZero([&] { StringOf(string).Text() += StringOf(appended).Text(); });
+}
+
+CFIndex CFStringFindAndReplace(CFMutableStringRef string, CFStringRef wanted,
+                               CFStringRef replacement, CFRange range, CFStringCompareFlags) {
+  const auto slice = Slice(string, range);
+  const std::u16string& pattern = StringOf(wanted).Text();
+  if (!slice || pattern.empty()) return 0;
+  return OrZero([&]() -> CFIndex {
+    std::u16string& text = StringOf(string).Text();
+    std::u16string changed = text.substr(0, SizeOf(range.location));
+    CFIndex count = 0;
+    std::size_t copied = 0;
+    for (auto at = slice->find(pattern); at != slice->npos; at = slice->find(pattern, copied)) {
+      changed += slice->substr(copied, at - copied);
+      changed += StringOf(replacement).Text();
+      copied = at + pattern.size();
+      ++count;
+    }
+    changed += slice->substr(copied);
+    changed += text.substr(SizeOf(range.location) + slice->size());
+    text = std::move(changed);
+    return count;
+  });
+}
+
+// --- Reading ----------------------------------------------------------------------------------
+
+CFIndex CFStringGetLength(CFStringRef string) {
+  return IndexOf(StringOf(string).Text().size());
+}
+
+void CFStringGetCharacters(CFStringRef string, CFRange range, UniChar* buffer) {
+  if (const auto text = Slice(string, range)) std::copy(text->begin(), text->end(), buffer);
+}
+
+Boolean CFStringHasPrefix(CFStringRef string, CFStringRef prefix) {
+  return StringOf(string).Text().starts_with(StringOf(prefix).Text());
+}
+
+Boolean CFStringFindWithOptions(CFStringRef string, CFStringRef wanted, CFRange range,
+                                CFStringCompareFlags, CFRange* found) {
+  const auto slice = Slice(string, range);
+  const std::u16string& pattern = StringOf(wanted).Text();
+  if (!slice || pattern.empty()) return false;
+  const auto at = slice->find(pattern);
+  if (at == slice->npos) return false;
+  if (found != nullptr) *found = {range.location + IndexOf(at), IndexOf(pattern.size())};
+  return true;
+}
+
+CFIndex CFStringGetBytes(CFStringRef string, CFRange range, CFStringEncoding encoding,
+                         UInt8 lossByte, Boolean, UInt8* buffer, CFIndex capacity, CFIndex* used) {
+  const auto text = Slice(string, range);
+  const Encoding* const found = FindEncoding(encoding);
+  EncodedLength done{0, 0};
+  if (text && found != nullptr) {
+    const std::size_t room =
+        buffer == nullptr ? std::numeric_limits<std::size_t>::max() : SizeOf(capacity);
+    done = Encode(*text, *found, lossByte, buffer, room);
+  }
+  if (used != nullptr) *used = IndexOf(done.bytes);
+  return IndexOf(done.units);
+}
+
+Boolean CFStringGetPascalString(CFStringRef string, StringPtr buffer, CFIndex capacity,
+                                CFStringEncoding encoding) {
+  const Encoding* const found = FindEncoding(encoding);
+  if (found == nullptr || capacity < 1) return false;
+  const std::u16string& text = StringOf(string).Text();
+  const std::size_t room = std::min(SizeOf(capacity) - 1, kLongestPascalString);
+  const EncodedLength done = Encode(text, *found, 0, nullptr, room);
+  if (done.units < text.size()) return false;
+  Encode(text, *found, 0, buffer + 1, room);
+  buffer[0] = static_cast<unsigned char>(done.bytes);
+  return true;
+}
+
+Boolean CFStringGetFileSystemRepresentation(CFStringRef string, char* buffer, CFIndex capacity) {
+  return OrZero([&] {
+    const auto name = FileNameOfText(StringOf(string).Text());
+    if (!name || name->size() >= SizeOf(capacity) || name->find('\0') != name->npos) return false;
+    std::memcpy(buffer, name->c_str(), name->size() + 1);
+    return true;
+  });
+}
+
+CFIndex CFStringGetMaximumSizeOfFileSystemRepresentation(CFStringRef string) {
+  return CFStringGetLength(string) * kFileNameBytesPerUnit + 1;
+}

@@ -1,0 +1,10 @@
+// The limit of a Pascal string: one length byte, then that many bytes of text.
+#pragma once
+
+#include <cstddef>
+
+namespace tallowmere::foundation {
+
+constexpr std::size_t kLongestPascalString = 255;  // bytes of text
+
+}  // namespace tallowmere::foundation

@@ -1,0 +1,34 @@
+// Components, extension and folder mark of a path with "/" between its components.
+//
+// Every function takes a path as Linux spells it or percent-encoded as in a URL, and answers in the
+// same form.
+#pragma once
+
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace tallowmere::foundation {
+
+// The path with one "/" more at its end if it has none (folder), or with none unless it is "/"
+// itself. REQUIRES: the path is not empty.
+std::string WithFolderMark(std::string_view path, bool folder);
+
+// The last component without the folder mark: "/a/b/" → "b", "/" → "/". None for an empty path.
+std::optional<std::string_view> LastComponent(std::string_view path);
+
+// Whether the path ends in "/" or its last component is "." or "..".
+bool HasFolderMark(std::string_view path);
+
+// The containing folder, with the folder mark: "/a/b/" → "/a/", "/" → "/", "a" → "./",
+// "a/.." → "a/../../". REQUIRES: the path is not empty.
+std::string ParentPath(std::string_view path);
+
+// The path and a component with a "/" between them, unless the path is empty or ends in one.
+std::string JoinPath(std::string_view path, std::string_view component);
+
+// What follows the last "." of a component. None when there is none, when it is empty and when the
+// only "." is the first character.
+std::optional<std::string_view> Extension(std::string_view component);
+
+}  // namespace tallowmere::foundation

@@ -1,0 +1,145 @@
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/mount.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "files/Descriptor.h"
+#include "files/FolderIndex.h"
+#include "files/NodeID.h"
+#include "support/MountNamespace.h"
+#include "support/TemporaryFolder.h"
+
+namespace tallowmere::files {
+namespace {
+
+using test::EnterOwnMountNamespace;
+using test::ScopedMount;
+using test::TemporaryFolder;
+
+class AFolderIndex : public testing::Test {
+ protected:
+  ItemReference ItemAt(const std::string& name) const {
+    const auto item = ReadItem(AT_FDCWD, (mFolder.Path() / name).c_str());
+    EXPECT_TRUE(item) << name;
+    return item.value_or(ItemReference{});
+  }
+  // Where a pass that starts at a folder finds what is at `name`, which must be there.
+  void ExpectFoundFrom(const std::string& start, const std::string& name) const {
+    EXPECT_EQ(Search(ItemAt(name), mFolder.Path() / start), mFolder.Path() / name);
+  }
+
+  // What a new index of the item's volume finds.
+  std::optional<std::string> Search(const ItemReference& item, const std::string& start) const {
+    const VolumePointer volume = MountTable::OfThisProcess().OfItem(item, start);
+    EXPECT_TRUE(volume);
+    const std::uint32_t id = NodeIDOf(item, *volume->Root());
+    return FolderIndex(volume).Find({id, &item, S_ISDIR(item.type)}, start);
+  }
+
+  const TemporaryFolder mFolder;
+};
+
+TEST_F(AFolderIndex, FindsAnItemInItsStart) {
+  mFolder.MakeFolder("a");
+  mFolder.MakeFile("a/x");
+  mFolder.MakeFile("a/y");
+  ExpectFoundFrom("a", "a/x");
+}
+
+TEST_F(AFolderIndex, FindsAnItemBelowBesideAndAbove) {
+  mFolder.MakeFolder("a/b/c/d");
+  mFolder.MakeFolder("a/e/f");
+  mFolder.MakeFile("a/b/c/d/x");
+  mFolder.MakeFile("a/e/f/y");
+  mFolder.MakeFile("z");
+  for (const char* start : {"a", "a/b", "a/b/c", "a/e/f"}) {
+    for (const char* name : {"a/b/c/d/x", "a/e/f/y", "z"}) ExpectFoundFrom(start, name);
+  }
+}
+
+TEST_F(AFolderIndex, FindsAFolderAndItsOwnStart) {
+  mFolder.MakeFolder("a/b/c");
+  mFolder.MakeFolder("d");
+  for (const char* name : {"a", "a/b", "a/b/c", "d"}) ExpectFoundFrom("a/b", name);
+}
+
+TEST_F(AFolderIndex, FindsEveryKindOfItem) {
+  mFolder.MakeFolder("a");
+  ASSERT_EQ(symlink("nowhere", (mFolder.Path() / "a/link").c_str()), 0);
+  ASSERT_EQ(mkfifo((mFolder.Path() / "a/pipe").c_str(), 0600), 0);
+  mFolder.MakeFile("a/\xFF\n: name");
+  for (const char* name : {"a/link", "a/pipe", "a/\xFF\n: name"}) ExpectFoundFrom("", name);
+}
+
+TEST_F(AFolderIndex, FollowsNoLinkToAFolder) {
+  mFolder.MakeFolder("a");
+  mFolder.MakeFolder("b");
+  mFolder.MakeFile("b/x");
+  ASSERT_EQ(symlink("../b", (mFolder.Path() / "a/link").c_str()), 0);
+  ASSERT_EQ(symlink("..", (mFolder.Path() / "a/loop").c_str()), 0);
+  ExpectFoundFrom("a", "b/x");
+}
+
+TEST_F(AFolderIndex, PassesOverFoldersThatCannotBeNamedFromTheRoot) {
+  mFolder.MakeFolder("a");
+  mFolder.MakeFolder("b");
+  mFolder.MakeFile("b/x");
+  Descriptor folder(open((mFolder.Path() / "a").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  const std::string name(250, 'd');
+  for (int depth = 0; depth < 20; ++depth) {
+    ASSERT_EQ(mkdirat(folder.Get(), name.c_str(), 0700), 0);
+    folder = Descriptor(openat(folder.Get(), name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  }
+  ExpectFoundFrom("a", "b/x");
+}
+
+// Where the whole volume is one folder's size, so that a pass over it comes to an end soon.
+class AFolderIndexOfAVolume : public AFolderIndex {
+ protected:
+  void SetUp() override {
+    if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    mVolume.emplace("tmpfs", mFolder.MakeFolder("volume"), "tmpfs");
+    ASSERT_TRUE(mVolume->IsMounted());
+    mFolder.MakeFolder("volume/a/mounted");
+    mFolder.MakeFile("volume/a/x");
+  }
+
+  std::string PathOf(const std::string& name) const { return mFolder.Path() / name; }
+
+  std::optional<ScopedMount> mVolume;
+};
+
+TEST_F(AFolderIndexOfAVolume, EndsWithoutAnItemThatIsGone) {
+  const ItemReference item = ItemAt("volume/a/x");
+  std::filesystem::remove(PathOf("volume/a/x"));
+  EXPECT_EQ(Search(item, PathOf("volume/a")), std::nullopt);
+  EXPECT_EQ(Search(item, PathOf("volume")), std::nullopt);
+}
+
+TEST_F(AFolderIndexOfAVolume, FindsAnItemWhereItIsBeforeWhereItIsMountedOnceMore) {
+  const ItemReference item = ItemAt("volume/a/x");
+  std::filesystem::rename(PathOf("volume/a"), PathOf("volume/b"));
+  // The same files once more, under another mount.
+  const ScopedMount again(PathOf("volume/b"), mFolder.MakeFolder("volume/first"), "", MS_BIND);
+  ASSERT_TRUE(again.IsMounted());
+  EXPECT_EQ(Search(item, PathOf("volume")), PathOf("volume/b/x"));
+}
+
+TEST_F(AFolderIndexOfAVolume, DoesNotTakeACoveredFolderForWhatCoversIt) {
+  const ItemReference covered = ItemAt("volume/a/mounted");
+  const ScopedMount cover("tmpfs", PathOf("volume/a/mounted"), "tmpfs");
+  ASSERT_TRUE(cover.IsMounted());
+  EXPECT_EQ(Search(covered, PathOf("volume")), std::nullopt);
+}
+
+TEST_F(AFolderIndexOfAVolume, StaysBelowItsRoot) {
+  mFolder.MakeFile("outside");
+  const ItemReference outside = ItemAt("outside");
+  ItemReference item = outside;
+  item.mount = ItemAt("volume/a/x").mount;
+  EXPECT_EQ(Search(item, PathOf("volume/a")), std::nullopt);
+}
+
+}  // namespace
+}  // namespace tallowmere::files

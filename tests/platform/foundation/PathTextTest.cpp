@@ -1,0 +1,48 @@
+#include <gtest/gtest.h>
+
+#include "foundation/PathText.h"
+
+namespace tallowmere::foundation {
+namespace {
+
+TEST(PathText, FolderMarkIsAddedOnce) {
+  EXPECT_EQ(WithFolderMark("a", true), "a/");
+  EXPECT_EQ(WithFolderMark("a//", true), "a//");
+}
+
+TEST(PathText, FolderMarkIsRemovedWholly) {
+  EXPECT_EQ(WithFolderMark("/a//", false), "/a");
+  EXPECT_EQ(WithFolderMark("///", false), "/");
+}
+
+TEST(PathText, LastComponentStandsBehindTheLastSlash) {
+  EXPECT_EQ(LastComponent("/a/b"), "b");
+  EXPECT_EQ(LastComponent("/a/b//"), "b");
+  EXPECT_EQ(LastComponent("b"), "b");
+  EXPECT_EQ(LastComponent("//"), "/");
+  EXPECT_EQ(LastComponent(""), std::nullopt);
+}
+
+TEST(PathText, ParentKeepsDoubledSlashes) {
+  EXPECT_EQ(ParentPath("/a//b"), "/a//");
+  EXPECT_EQ(ParentPath("//"), "/");
+}
+
+TEST(PathText, JoinNeedsNoSlashAtTheStart) {
+  EXPECT_EQ(JoinPath("", "a"), "a");
+  EXPECT_EQ(JoinPath("/", "a"), "/a");
+  EXPECT_EQ(JoinPath("a", "b"), "a/b");
+  EXPECT_EQ(JoinPath("a", ""), "a/");
+}
+
+TEST(PathText, ExtensionNeedsADotBehindTheFirstCharacter) {
+  EXPECT_EQ(Extension("a.b"), "b");
+  EXPECT_EQ(Extension("..b"), "b");
+  EXPECT_EQ(Extension(".b"), std::nullopt);
+  EXPECT_EQ(Extension("a."), std::nullopt);
+  EXPECT_EQ(Extension("."), std::nullopt);
+  EXPECT_EQ(Extension(""), std::nullopt);
+}
+
+}  // namespace
+}  // namespace tallowmere::foundation

@@ -1,0 +1,40 @@
+// Random names and paths as Linux may hold them.
+#pragma once
+
+#include <rapidcheck.h>
+
+#include <string>
+#include <vector>
+
+namespace tallowmere::foundation::test {
+
+inline std::string Concatenated(const std::vector<std::string>& pieces) {
+  std::string all;
+  for (const std::string& piece : pieces) all += piece;
+  return all;
+}
+
+// A byte, a character of valid UTF-8, or something that means something to URLs or path styles. No
+// NUL and no "/".
+inline rc::Gen<std::string> AnyNamePiece() {
+  return rc::gen::oneOf(
+      rc::gen::map(rc::gen::suchThat(rc::gen::inRange(1, 256), [](int c) { return c != '/'; }),
+                   [](int c) { return std::string(1, static_cast<char>(c)); }),
+      rc::gen::element<std::string>("\xC3\xA9", "e\xCC\x81", "\xE6\x97\xA5", "\xF0\x9F\x98\x80",
+                                    "\xED\xB2\x80", ".", "..", ":", "%2F", "%", "?", "#", "\\",
+                                    "C:", "~", " "));
+}
+
+// A possibly empty name.
+inline rc::Gen<std::string> AnyName() {
+  return rc::gen::map(rc::gen::container<std::vector<std::string>>(AnyNamePiece()), Concatenated);
+}
+
+// Names with "/" between, before and behind them, doubled ones too. May be empty.
+inline rc::Gen<std::string> AnyPath() {
+  return rc::gen::map(rc::gen::container<std::vector<std::string>>(
+                          rc::gen::oneOf(AnyNamePiece(), rc::gen::just(std::string("/")))),
+                      Concatenated);
+}
+
+}  // namespace tallowmere::foundation::test
