@@ -2,25 +2,19 @@
 
 #include <charconv>
 
+#include "foundation/ColonsAndSlashes.h"
 #include "foundation/FileNameText.h"
 #include "foundation/MacRoman.h"
 
 namespace tallowmere::files {
 namespace {
 
+constexpr char kMark = '#';
 constexpr std::size_t kLongestShortName = 31;
 constexpr std::size_t kLongestKeptExtension = 5;  // without its dot
 
 std::u16string ExchangedText(std::string_view linuxName) {
-  std::u16string text = foundation::TextOfFileName(linuxName);
-  for (char16_t& unit : text) {
-    if (unit == u':') {
-      unit = u'/';
-    } else if (unit == u'/') {
-      unit = u':';
-    }
-  }
-  return text;
+  return foundation::ExchangeColonsAndSlashes(foundation::TextOfFileName(linuxName));
 }
 
 // ".aif" of "a.aif", or nothing.
@@ -60,12 +54,42 @@ std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t 
   return name;
 }
 
-std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID) {
+std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID, std::size_t marks) {
   const std::u16string text = ExchangedText(linuxName);
   const std::string extension = KeptExtension(text);
-  const std::string tail = "#" + CapitalHexadecimal(nodeID) + extension;
+  const std::string tail = std::string(marks, kMark) + CapitalHexadecimal(nodeID) + extension;
   const std::u16string_view stem(text.data(), extension.empty() ? text.size() : text.rfind(u'.'));
   return EncodeWithQuestionMarks(stem, kLongestShortName - tail.size()) + tail;
+}
+
+std::optional<ShortNameParts> ReadShortHFSName(std::string_view name) {
+  if (name.size() > kLongestShortName) return std::nullopt;
+  const std::size_t mark = name.rfind(kMark);
+  if (mark == std::string_view::npos) return std::nullopt;
+  const std::string_view number = name.substr(mark + 1, name.find('.', mark) - mark - 1);
+  std::uint32_t id = 0;
+  const auto [end, error] = std::from_chars(number.data(), number.data() + number.size(), id, 16);
+  if (error != std::errc{} || CapitalHexadecimal(id) != number) return std::nullopt;
+  std::size_t marks = 1;
+  while (marks < kMostMarks && mark >= marks && name[mark - marks] == kMark) ++marks;
+  return ShortNameParts{id, marks};
+}
+
+bool CanBeLinuxName(std::string_view name) {
+  const std::string_view impossible("/\0", 2);
+  return !name.empty() && name != "." && name != ".." &&
+         name.find_first_of(impossible) == std::string_view::npos;
+}
+
+SpelledNames SpellHFSName(std::string_view name) {
+  const std::u16string text =
+      foundation::ExchangeColonsAndSlashes(foundation::DecodeMacRoman(name));
+  const std::u16string decomposed = foundation::DecomposeMacRoman(text);
+  SpelledNames names;
+  names.precomposed = foundation::FileNameOfText(text).value_or("");
+  if (!CanBeLinuxName(names.precomposed)) return {};
+  if (decomposed != text) names.decomposed = foundation::FileNameOfText(decomposed).value_or("");
+  return names;
 }
 
 }  // namespace tallowmere::files

@@ -22,7 +22,28 @@ std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t 
 
 // What stands for a name that has no plain form, at most 31 bytes: as much of the name as fits, '?'
 // for what Mac Roman lacks, "#", the node id in capital hexadecimal, and the extension if it has
-// one of 1 to 5 characters that all can be encoded: "A very long name th#1B4A3F.aif".
-std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID);
+// one of 1 to 5 characters that all can be encoded: "A very long name tha#1B4A3F.aif". Where an
+// item is really called so, the one that only stands for its name has more than one '#': `marks` of
+// them, 1 to kMostMarks.
+std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID, std::size_t marks = 1);
+inline constexpr std::size_t kMostMarks = 8;
+
+// The node id and the most marks that an HFS name has if it reads as a short one.
+struct ShortNameParts {
+  std::uint32_t nodeID;
+  std::size_t marks;
+};
+std::optional<ShortNameParts> ReadShortHFSName(std::string_view name);
+
+// Whether an item of a Linux folder can be called so: not empty, no '/', no NUL, not "." or "..".
+bool CanBeLinuxName(std::string_view name);
+
+// The Linux names that an HFS name can stand for as it is: precomposed and, when it has accented
+// letters, decomposed. Empty when no item can be called so.
+struct SpelledNames {
+  std::string precomposed;
+  std::string decomposed;  // empty: no accented letters
+};
+SpelledNames SpellHFSName(std::string_view name);
 
 }  // namespace tallowmere::files

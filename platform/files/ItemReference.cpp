@@ -13,6 +13,8 @@ namespace {
 // Longer than the coarsest tick of a stored time of birth, one second.
 constexpr std::int64_t kNewbornSeconds = 2;
 
+constexpr std::int64_t kNanosecondsInASecond = 1'000'000'000;
+
 bool HasBirth(const ItemReference& item) {
   return item.birthNanoseconds != kNoBirth;
 }
@@ -26,26 +28,6 @@ bool IsNewborn(const ItemReference& item) {
   timespec now{};
   clock_gettime(CLOCK_REALTIME, &now);
   return item.birthSeconds + kNewbornSeconds >= now.tv_sec;
-}
-
-// All but the handle.
-std::optional<ItemReference> ReadStatus(int folder, const char* name) {
-  struct statx about {};
-  const int emptyPath = *name == '\0' ? AT_EMPTY_PATH : 0;
-  if (statx(folder, name, AT_SYMLINK_NOFOLLOW | AT_NO_AUTOMOUNT | emptyPath,
-            STATX_TYPE | STATX_INO | STATX_BTIME | STATX_MNT_ID, &about) != 0) {
-    return std::nullopt;
-  }
-  ItemReference item{};
-  item.inode = about.stx_ino;
-  item.device = makedev(about.stx_dev_major, about.stx_dev_minor);
-  const bool hasBirth = (about.stx_mask & STATX_BTIME) != 0;
-  item.birthSeconds = hasBirth ? about.stx_btime.tv_sec : 0;
-  item.birthNanoseconds = hasBirth ? about.stx_btime.tv_nsec : kNoBirth;
-  const bool hasMount = (about.stx_mask & STATX_MNT_ID) != 0;
-  item.mount = hasMount ? static_cast<std::int32_t>(about.stx_mnt_id) : kNoMount;
-  item.type = about.stx_mode & S_IFMT;
-  return item;
 }
 
 }  // namespace
@@ -65,17 +47,40 @@ bool AreEqual(const ItemReference& first, const ItemReference& second) {
   return first.device == second.device && first.inode == second.inode;
 }
 
+std::optional<ItemStatus> ReadStatus(int folder, const char* name) {
+  struct statx about {};
+  const int emptyPath = *name == '\0' ? AT_EMPTY_PATH : 0;
+  if (statx(folder, name, AT_SYMLINK_NOFOLLOW | AT_NO_AUTOMOUNT | emptyPath,
+            STATX_TYPE | STATX_INO | STATX_BTIME | STATX_CTIME | STATX_MNT_ID, &about) != 0) {
+    return std::nullopt;
+  }
+  ItemReference item{};
+  item.inode = about.stx_ino;
+  item.device = makedev(about.stx_dev_major, about.stx_dev_minor);
+  const bool hasBirth = (about.stx_mask & STATX_BTIME) != 0;
+  item.birthSeconds = hasBirth ? about.stx_btime.tv_sec : 0;
+  item.birthNanoseconds = hasBirth ? about.stx_btime.tv_nsec : kNoBirth;
+  const bool hasMount = (about.stx_mask & STATX_MNT_ID) != 0;
+  item.mount = hasMount ? static_cast<std::int32_t>(about.stx_mnt_id) : kNoMount;
+  item.type = about.stx_mode & S_IFMT;
+  return ItemStatus{item, about.stx_ctime.tv_sec * kNanosecondsInASecond + about.stx_ctime.tv_nsec};
+}
+
 // The item may be replaced between the two calls. The reference is then to no item at all, unless
 // number and birth are the new one's as well.
 std::optional<ItemReference> ReadItem(int folder, const char* name) {
-  auto item = ReadStatus(folder, name);
-  if (item && (!HasBirth(*item) || IsNewborn(*item))) item->handle = ReadHandle(folder, name);
+  auto status = ReadStatus(folder, name);
+  if (!status) return std::nullopt;
+  ItemReference& item = status->item;
+  if (!HasBirth(item) || IsNewborn(item)) item.handle = ReadHandle(folder, name);
   return item;
 }
 
 bool IsAt(const ItemReference& item, int folder, const char* name) {
-  const auto found = ReadStatus(folder, name);
-  if (!found || !AreEqual(*found, item) || found->type != item.type) return false;
+  const auto status = ReadStatus(folder, name);
+  if (!status) return false;
+  const ItemReference* const found = &status->item;
+  if (!AreEqual(*found, item) || found->type != item.type) return false;
   if (found->birthSeconds != item.birthSeconds) return false;
   if (found->birthNanoseconds != item.birthNanoseconds) return false;
   if (HasHandle(item)) return ReadHandle(folder, name) == item.handle;

@@ -13,6 +13,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <string>
 
 #include "files/FileHandle.h"
 
@@ -33,6 +34,13 @@ struct ItemReference {
 };
 static_assert(sizeof(ItemReference) == sizeof(FSRef));
 
+// An existing item and where it is: the canonical absolute path, no links on the way, and the item
+// itself not followed when it is one.
+struct Place {
+  std::string path;
+  ItemReference item;
+};
+
 FSRef Pack(const ItemReference& item);
 
 // None for null and for what Pack does not make, all zero among it.
@@ -44,6 +52,15 @@ bool AreEqual(const ItemReference& first, const ItemReference& second);
 // The item itself, links not followed and nothing mounted on the way; none when there is none.
 // `folder` as in openat(2); with an empty name, the open item itself.
 std::optional<ItemReference> ReadItem(int folder, const char* name);
+
+// The item without its handle, and when it was last changed.
+struct ItemStatus {
+  ItemReference item;
+  std::int64_t change;  // nanoseconds since 1970
+};
+
+// As ReadItem, in one system call.
+std::optional<ItemStatus> ReadStatus(int folder, const char* name);
 
 // Whether this very item is there now, on whichever mount.
 bool IsAt(const ItemReference& item, int folder, const char* name);

@@ -36,22 +36,23 @@ bool IsFolder(const Mount& mount) {
          S_ISDIR(about.stx_mode);
 }
 
-// The mount of "/" where the table does not tell: there is no table, or "/" is a folder inside a
-// mount (chroot).
-Mount RootMount() {
-  Mount root{};
-  root.mountPoint = "/";
-  struct statx about {};
-  if (statx(AT_FDCWD, "/", kWithoutWaiting, STATX_TYPE | STATX_MNT_ID, &about) == 0) {
-    root.device = makedev(about.stx_dev_major, about.stx_dev_minor);
-    if ((about.stx_mask & STATX_MNT_ID) != 0) root.id = static_cast<int>(about.stx_mnt_id);
-  }
-  return root;
+bool HasMount(const std::vector<Mount>& mounts, int id) {
+  return std::any_of(mounts.begin(), mounts.end(),
+                     [id](const Mount& mount) { return mount.id == id; });
 }
 
-bool HasRoot(const std::vector<Mount>& mounts) {
-  return std::any_of(mounts.begin(), mounts.end(),
-                     [](const Mount& mount) { return mount.mountPoint == "/"; });
+// The table's own mount at "/", where the kernel reports no mount ids: the lowest of a stack.
+std::optional<int> LowestRoot(const std::vector<Mount>& mounts) {
+  for (const Mount& mount : mounts) {
+    const bool isLowest = mount.parent == mount.id || !HasMount(mounts, mount.parent);
+    if (mount.mountPoint == "/" && isLowest) return mount.id;
+  }
+  return std::nullopt;
+}
+
+bool IsWithin(std::string_view path, std::string_view folder) {
+  if (folder == "/") return path.starts_with('/');
+  return path.starts_with(folder) && (path.size() == folder.size() || path[folder.size()] == '/');
 }
 
 std::string LabelOfRoot() {
@@ -72,12 +73,19 @@ std::string LinuxNameOf(const std::string& mountPoint) {
 
 }  // namespace
 
-Volume::Volume(VolumeNumber number, const Mount& place)
-    : mNumber(number), mMountPoint(place.mountPoint) {}
+Volume::Volume(VolumeNumber number, const std::vector<Mount>& mounts)
+    : mNumber(number), mType(mounts.front().type) {
+  for (const Mount& mount : mounts) mMountPoints.push_back(mount.mountPoint);
+}
+
+const std::optional<ItemReference>& Volume::Root() const {
+  if (!mRoot) mRoot = ReadItem(AT_FDCWD, MountPoint().c_str());
+  return mRoot;
+}
 
 const std::string& Volume::Name() const {
   if (!mName) {
-    const std::string name = LinuxNameOf(mMountPoint);
+    const std::string name = LinuxNameOf(MountPoint());
     auto plain = PlainHFSName(name, kLongestSpecName);
     mName = plain ? *std::move(plain) : ShortHFSName(name, kRootFolderID);
   }
@@ -89,52 +97,120 @@ MountTable& MountTable::OfThisProcess() {
   return table;
 }
 
-MountTable::MountTable(std::string source) : mSource(std::move(source)) {}
+Mount MountTable::ReadRootMount() {
+  Mount root{};
+  root.mountPoint = "/";
+  struct statx about {};
+  if (statx(AT_FDCWD, "/", kWithoutWaiting, STATX_TYPE | STATX_MNT_ID, &about) == 0) {
+    root.device = makedev(about.stx_dev_major, about.stx_dev_minor);
+    if ((about.stx_mask & STATX_MNT_ID) != 0) root.id = static_cast<int>(about.stx_mnt_id);
+  }
+  return root;
+}
 
-const Volume* MountTable::AtIndex(std::size_t index) {
+MountTable::MountTable(std::string source, Mount (*readRoot)())
+    : mSource(std::move(source)), mReadRoot(readRoot) {}
+
+VolumePointer MountTable::AtIndex(std::size_t index) {
   const bool goesOn = mLastIndex && index == *mLastIndex + 1;
   if (!goesOn) Refresh();
   mLastIndex = index;
-  return index < mVolumes.size() ? &mVolumes[index] : nullptr;
+  return index < mState.volumes.size() ? mState.volumes[index] : nullptr;
 }
 
-const Volume* MountTable::WithNumber(VolumeNumber number) {
+VolumePointer MountTable::WithNumber(VolumeNumber number) {
   Refresh();
-  if (number == 0) return &mVolumes.front();
-  const auto found = std::find_if(mVolumes.begin(), mVolumes.end(), [number](const Volume& volume) {
-    return volume.Number() == number;
-  });
-  return found == mVolumes.end() ? nullptr : &*found;
+  if (number == 0) return mState.volumes.front();
+  return FirstWith([number](const Volume& volume) { return volume.Number() == number; });
+}
+
+VolumePointer MountTable::WithName(std::string_view name) {
+  Refresh();
+  return FirstWith([name](const Volume& volume) { return volume.Name() == name; });
+}
+
+VolumePointer MountTable::OfItem(const ItemReference& item, std::string_view path) {
+  if (item.mount == kNoMount) {
+    Refresh();
+    auto volume = FirstWith([&item](const Volume& candidate) {
+      return candidate.Root() && candidate.Root()->device == item.device;
+    });
+    return volume ? volume : OfPath(path);
+  }
+  Refresh();
+  const auto found = mState.byMount.find(item.mount);
+  return found == mState.byMount.end() ? nullptr : found->second;
+}
+
+VolumePointer MountTable::OfPath(std::string_view path) {
+  Refresh();
+  VolumePointer longest;
+  for (const VolumePointer& volume : mState.volumes) {
+    if (!IsWithin(path, volume->MountPoint())) continue;
+    if (!longest || volume->MountPoint().size() > longest->MountPoint().size()) longest = volume;
+  }
+  return longest;
+}
+
+template <class Predicate>
+VolumePointer MountTable::FirstWith(Predicate predicate) const {
+  const auto found = std::find_if(mState.volumes.begin(), mState.volumes.end(),
+                                  [&](const VolumePointer& volume) { return predicate(*volume); });
+  return found == mState.volumes.end() ? nullptr : *found;
 }
 
 void MountTable::Refresh() {
-  if (!IsCurrent()) Read();
+  if (!mIsCurrent || HasChanged()) Read();
 }
 
-bool MountTable::IsCurrent() const {
-  if (!mDescriptor.IsOpen()) return false;
+bool MountTable::HasChanged() const {
   pollfd table{mDescriptor.Get(), POLLPRI, 0};
-  return poll(&table, 1, 0) == 0;
+  return poll(&table, 1, 0) != 0;
 }
 
 void MountTable::Read() {
+  mIsCurrent = false;
   mLastIndex.reset();
   std::vector<Mount> mounts;
-  for (int attempt = 0; attempt < kReadAttempts; ++attempt) {
+  bool isWhole = false;
+  for (int attempt = 0; attempt < kReadAttempts && !isWhole; ++attempt) {
     const auto text = ReadSource();
-    mounts = text ? ParseMountInfo(*text) : std::vector<Mount>{};
+    if (!text) break;
+    mounts = ParseMountInfo(*text);
     // The text comes in several pieces; a mount made between two of them can be missing or shift
-    // others out. The kernel has signalled it, so a table that is current now was whole.
-    if (!text || IsCurrent()) break;
+    // others out. The kernel has signalled it by now, and signals it only once.
+    isWhole = !HasChanged();
   }
-  if (!HasRoot(mounts)) mounts.insert(mounts.begin(), RootMount());
+  const Mount root = mReadRoot();
+  int rootID = root.id;
+  if (!HasMount(mounts, rootID)) {
+    // There is no table, or "/" is a folder inside a mount (chroot), or the kernel tells no ids.
+    const auto lowest = rootID == 0 ? LowestRoot(mounts) : std::nullopt;
+    if (!lowest) mounts.insert(mounts.begin(), root);
+    rootID = lowest.value_or(root.id);
+  }
+  mState = StateOf(mounts, rootID);
+  mIsCurrent = isWhole;
+}
 
-  mVolumes.clear();
-  for (const std::size_t place : VolumePlaces(mounts, IsFolder)) {
-    if (const auto number = NumberOf(mounts[place], mounts)) {
-      mVolumes.emplace_back(*number, mounts[place]);
-    }
+MountTable::State MountTable::StateOf(const std::vector<Mount>& mounts, int rootID) {
+  State state;
+  std::unordered_set<int> mountIDs;
+  for (const Mount& mount : mounts) {
+    const std::size_t slash = mount.mountPoint.rfind('/');
+    state.mountPoints.insert(mount.mountPoint);
+    state.holders.insert(mount.mountPoint.substr(0, std::max<std::size_t>(slash, 1)));
+    mountIDs.insert(mount.id);
   }
+  for (const auto& indexes : GroupIntoVolumes(mounts, rootID, IsFolder)) {
+    std::vector<Mount> own;
+    for (const std::size_t index : indexes) own.push_back(mounts[index]);
+    const auto number = NumberOf(own.front().id, mountIDs);
+    if (!number) continue;
+    state.volumes.push_back(std::make_shared<Volume>(*number, own));
+    for (const Mount& mount : own) state.byMount[mount.id] = state.volumes.back();
+  }
+  return state;
 }
 
 // None, and the descriptor closed, when it cannot be opened or read whole.
@@ -154,25 +230,17 @@ std::optional<std::string> MountTable::ReadSource() {
 }
 
 // None when every number is taken.
-std::optional<VolumeNumber> MountTable::NumberOf(const Mount& place,
-                                                 const std::vector<Mount>& mounts) {
-  const auto assigned = mAssignedNumbers.find(place.id);
+std::optional<VolumeNumber> MountTable::NumberOf(int mountID,
+                                                 const std::unordered_set<int>& mountIDs) {
+  const auto assigned = mAssignedNumbers.find(mountID);
   if (assigned != mAssignedNumbers.end()) return assigned->second;
-
-  const auto isAssigned = [this](int number) {
-    return std::any_of(mAssignedNumbers.begin(), mAssignedNumbers.end(),
-                       [number](const auto& entry) { return entry.second == number; });
-  };
-  if (place.id > 0 && -place.id >= kLowestNumber && !isAssigned(-place.id)) {
-    return static_cast<VolumeNumber>(-place.id);
+  if (mountID > 0 && -mountID >= kLowestNumber && !mTakenNumbers.contains(-mountID)) {
+    return static_cast<VolumeNumber>(-mountID);
   }
-  const auto isMountID = [&mounts](int id) {
-    return std::any_of(mounts.begin(), mounts.end(),
-                       [id](const Mount& mount) { return mount.id == id; });
-  };
   for (int number = kLowestNumber; number < 0; ++number) {
-    if (isAssigned(number) || isMountID(-number)) continue;
-    mAssignedNumbers[place.id] = static_cast<VolumeNumber>(number);
+    if (mTakenNumbers.contains(number) || mountIDs.contains(-number)) continue;
+    mTakenNumbers.insert(number);
+    mAssignedNumbers[mountID] = static_cast<VolumeNumber>(number);
     return static_cast<VolumeNumber>(number);
   }
   return std::nullopt;

@@ -10,11 +10,16 @@
 
 #include <cstddef>
 #include <map>
+#include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
+#include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 #include "files/Descriptor.h"
+#include "files/ItemReference.h"
 #include "files/MountInfo.h"
 
 namespace tallowmere::files {
@@ -23,13 +28,23 @@ using VolumeNumber = short;
 
 class Volume {
  public:
-  Volume(VolumeNumber number, const Mount& place);
+  // `mounts` are the reachable mounts of one file system, the volume's place first.
+  Volume(VolumeNumber number, const std::vector<Mount>& mounts);
 
   // Below 0, unique while mounted, the same in every process: minus the mount id of its place.
   VolumeNumber Number() const { return mNumber; }
 
   // Where its root folder is, as this process sees it.
-  const std::string& MountPoint() const { return mMountPoint; }
+  const std::string& MountPoint() const { return mMountPoints.front(); }
+
+  // Everywhere that the volume is mounted; MountPoint() is the first.
+  const std::vector<std::string>& MountPoints() const { return mMountPoints; }
+
+  // The root folder, asked for when first needed; none when it cannot be read.
+  const std::optional<ItemReference>& Root() const;
+
+  // Of the file system: "ext4", "tmpfs", …
+  const std::string& Type() const { return mType; }
 
   // In HFS form, 1 to 63 bytes: the last component of the mount point; for "/" the label of the
   // file system, else "Root". Two volumes can have the same name.
@@ -37,38 +52,84 @@ class Volume {
 
  private:
   VolumeNumber mNumber;
-  std::string mMountPoint;
-  mutable std::optional<std::string>
-      mName;  // the label costs three system calls, so only on demand
+  std::vector<std::string> mMountPoints;
+  std::string mType;
+  // On demand: the label of "/" costs three system calls.
+  mutable std::optional<std::string> mName;
+  mutable std::optional<ItemReference> mRoot;
 };
+
+// A volume as it was in one state of the table. It stays valid for whoever holds it.
+using VolumePointer = std::shared_ptr<const Volume>;
 
 class MountTable {
  public:
   static MountTable& OfThisProcess();
 
-  // `source` is a file with the text that /proc/self/mountinfo has.
-  explicit MountTable(std::string source = "/proc/self/mountinfo");
+  // The mount that the process's root is in, as the kernel tells without the table.
+  static Mount ReadRootMount();
+
+  // `source` is a file with the text that /proc/self/mountinfo has, `readRoot` tells the mount at
+  // the process's root.
+  explicit MountTable(std::string source = "/proc/self/mountinfo",
+                      Mount (*readRoot)() = ReadRootMount);
 
   // The volumes in their order, "/" first; there is always one. `index` counts from 0. Null past
   // the last one. A walk 0, 1, 2, … sees one state of the table: going on from the last asked index
-  // does not look for changes. The volume stays valid until the next question.
-  const Volume* AtIndex(std::size_t index);
+  // does not look for changes.
+  VolumePointer AtIndex(std::size_t index);
 
   // The volume with a number; 0 is the volume of "/". Null when none has it.
-  const Volume* WithNumber(VolumeNumber number);
+  VolumePointer WithNumber(VolumeNumber number);
+
+  // The first volume with a name in HFS form; null when none has it.
+  VolumePointer WithName(std::string_view name);
+
+  // The volume that an item is on: by the mount that the kernel reports for it, where it reports
+  // none by the device, else by the mount point that `path` begins with. Null for an item of a
+  // kernel interface. REQUIRES: `path` is the item's canonical path.
+  VolumePointer OfItem(const ItemReference& item, std::string_view path);
+
+  // The volume at or below whose MountPoint() a path lies by its spelling; of several the one with
+  // the longest.
+  VolumePointer OfPath(std::string_view path);
+
+  // Whether something, a volume or not, is mounted at a path, or at a name in the folder with that
+  // path, in the state last looked at.
+  bool IsMountPoint(const std::string& path) const { return mState.mountPoints.contains(path); }
+  bool HoldsMountPoint(const std::string& path) const { return mState.holders.contains(path); }
+
+  // Makes the next question read the table whatever the kernel has signalled: a place was found not
+  // to be where the table says, as the kernel does not signal that a mount point was renamed.
+  void Distrust() { mIsCurrent = false; }
 
  private:
+  // What one reading of the table gave.
+  struct State {
+    std::vector<VolumePointer> volumes;
+    std::unordered_map<int, VolumePointer> byMount;  // by mount id
+    std::unordered_set<std::string> mountPoints;     // of every line of the table
+    std::unordered_set<std::string> holders;         // the folders that hold those
+  };
+
   void Refresh();
-  bool IsCurrent() const;
+  bool HasChanged() const;
   void Read();
   std::optional<std::string> ReadSource();
-  std::optional<VolumeNumber> NumberOf(const Mount& place, const std::vector<Mount>& mounts);
+  State StateOf(const std::vector<Mount>& mounts, int rootID);
+  std::optional<VolumeNumber> NumberOf(int mountID, const std::unordered_set<int>& mountIDs);
+  template <class Predicate>
+  VolumePointer FirstWith(Predicate predicate) const;
 
   std::string mSource;
-  Descriptor mDescriptor;  // open while mVolumes came from it
-  std::vector<Volume> mVolumes;
-  std::optional<std::size_t> mLastIndex;         // of a walk by AtIndex
-  std::map<int, VolumeNumber> mAssignedNumbers;  // by mount id, where minus the id does not serve
+  Mount (*mReadRoot)();
+  Descriptor mDescriptor;  // open while the state came from it
+  State mState;
+  bool mIsCurrent = false;                // as far as nothing was signalled since
+  std::optional<std::size_t> mLastIndex;  // of a walk by AtIndex
+  // Where minus the mount id does not serve: the numbers by mount id, and which are taken so.
+  std::map<int, VolumeNumber> mAssignedNumbers;
+  std::unordered_set<int> mTakenNumbers;
 };
 
 }  // namespace tallowmere::files

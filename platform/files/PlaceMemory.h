@@ -23,13 +23,22 @@ class PlaceMemory {
   // takes remembers none.
   explicit PlaceMemory(std::size_t limit);
 
-  // The item's place is `path` from now on. Forgets the places least recently used when the limit
-  // is passed. Without memory the exception leaves everything as it was.
-  void Remember(const ItemReference& item, std::string_view path);
+  // The item's place is `path` from now on, told to be `canonical` or not known to be. Forgets the
+  // places least recently used when the limit is passed. Without memory the exception leaves
+  // everything as it was.
+  void Remember(const ItemReference& item, std::string_view path, bool canonical);
+
+  struct Remembered {
+    std::string path;
+    bool canonical;
+  };
 
   // The item's place, which counts as a use; null when none is remembered. Valid until the next
   // Remember.
-  const std::string* Recall(const ItemReference& item);
+  const Remembered* Recall(const ItemReference& item);
+
+  // The path last remembered or recalled, empty when there is none.
+  std::string_view Latest() const;
 
   // Bytes in use, never above the limit.
   std::size_t Size() const { return mSize; }
@@ -45,7 +54,7 @@ class PlaceMemory {
   };
   struct Place {
     Key key;
-    std::string path;
+    Remembered remembered;
   };
   using Places = std::list<Place>;
 

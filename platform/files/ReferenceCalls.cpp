@@ -2,7 +2,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
-#include "files/ItemPlace.h"
+#include "files/Catalog.h"
 #include "files/ItemReference.h"
 #include "foundation/NoThrow.h"
 #include "foundation/Url.h"

@@ -1,6 +1,8 @@
 // The edge between C++ that may run out of memory and host calls that never throw.
 #pragma once
 
+#include <MacTypes.h>
+
 #include <exception>
 
 namespace tallowmere::foundation {
@@ -13,6 +15,16 @@ auto OrZero(Body&& body) noexcept -> decltype(body()) {
     return body();
   } catch (const std::exception&) {
     return decltype(body())();
+  }
+}
+
+// What `body` returns, or ioErr when it throws.
+template <typename Body>
+OSErr OrError(Body&& body) noexcept {
+  try {
+    return body();
+  } catch (const std::exception&) {
+    return ioErr;
   }
 }
 

@@ -14,6 +14,8 @@ using SInt32 = std::int32_t;
 
 using Boolean = unsigned char;  // 0 or 1
 using UniChar = UInt16;         // one UTF-16 unit
+using UniCharCount = unsigned long;
+using TextEncoding = UInt32;
 using ByteCount = unsigned long;
 using ItemCount = unsigned long;
 using OptionBits = UInt32;
@@ -31,7 +33,12 @@ enum : OSErr {
   noErr = 0,
   nsvErr = -35,                // no such volume
   ioErr = -36,                 // input or output failed
+  bdNamErr = -37,              // a name that cannot be
   fnfErr = -43,                // no such item
+  paramErr = -50,              // an argument that cannot be
+  dirNFErr = -120,             // no such folder
   errFSBadFSRef = -1401,       // a reference to no item
+  errFSNotAFolder = -1407,     // a folder was needed
   errFSRefsDifferent = -1420,  // two references to different items
+  afpAccessDenied = -5000,     // the user has no right to that
 };

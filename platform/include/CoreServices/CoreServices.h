@@ -85,6 +85,73 @@ static_assert(offsetof(FSSpec, name) == 6);
 // errFSBadFSRef when one of them is null or to no item.
 OSErr FSCompareFSRefs(const FSRef* first, const FSRef* second);
 
+// A name as UTF-16 in the HFS view: '/' is ordinary, ':' does not occur.
+struct HFSUniStr255 {
+  UInt16 length;  // in UTF-16 units
+  UniChar unicode[255];
+};
+
+// Which catalog information is wanted.
+using FSCatalogInfoBitmap = UInt32;
+enum : FSCatalogInfoBitmap {
+  kFSCatInfoNone = 0,
+  kFSCatInfoVolume = 4,
+  kFSCatInfoNodeID = 16,
+};
+
+struct FSCatalogInfo {
+  SInt16 volume;
+  UInt32 nodeID;
+};
+
+// What the catalog says of an existing item; each output may be null. `catalogInfo` has the fields
+// that `whichInfo` asks for, `outName` the item's name, `fsSpec` its record: the volume and the id
+// of the folder that really holds it, and its HFS name in it, or the volume's name under parent id
+// 1 for a volume's root. `parentRef` is the folder that holds it, all zero for a volume's root.
+// fnfErr for an item that is gone; nsvErr for one on no volume.
+OSErr FSGetCatalogInfo(const FSRef* ref, FSCatalogInfoBitmap whichInfo, FSCatalogInfo* catalogInfo,
+                       HFSUniStr255* outName, FSSpec* fsSpec, FSRef* parentRef);
+
+// The item, file or folder, with a node id on a volume; id 2 is the volume's root folder.
+// nsvErr for an unknown volume; fnfErr when no item has the id, or when that is not certain.
+OSErr FSResolveNodeID(SInt16 volume, UInt32 nodeID, FSRef* outRef);
+
+// The item with a name in a folder. Ignores the encoding hint. fnfErr when there is none,
+// errFSNotAFolder when `parentRef` is no folder.
+OSErr FSMakeFSRefUnicode(const FSRef* parentRef, UniCharCount nameLength, const UniChar* name,
+                         TextEncoding textEncodingHint, FSRef* newRef);
+
+// The record of an item by a volume, a folder on it and a name or HFS path, a Str255: with a colon
+// inside and none in front a full path, for which volume and folder do not count; else relative to
+// the folder. Each further adjacent colon climbs one level, a colon at the end names the folder
+// itself, an empty name is the given folder. Volume 0 and folder 0 are the current directory;
+// folder 0 is else the volume's root. Links to folders on the way are followed. fnfErr with the
+// record filled when only the last name is missing; dirNFErr when a folder on the way is missing or
+// no folder; nsvErr for an unknown volume; bdNamErr for a missing last name that no record can
+// hold.
+OSErr FSMakeFSSpec(SInt16 vRefNum, SInt32 dirID, ConstStr255Param fileName, FSSpec* spec);
+
+// The existing item that a record names. fnfErr when there is none, dirNFErr when its folder is
+// missing, nsvErr for an unknown volume.
+OSErr FSpMakeFSRef(const FSSpec* spec, FSRef* newRef);
+
+// What PBGetCatInfoSync takes and gives for a folder by its id.
+struct DirInfo {
+  StringPtr ioNamePtr;  // out: the folder's name as a Str255; null: not wanted
+  SInt16 ioVRefNum;     // in: the folder's volume
+  SInt16 ioFDirIndex;   // in: -1
+  SInt32 ioDrDirID;     // in: the folder's id
+  SInt32 ioDrParID;     // out: the id of the folder that holds it
+};
+union CInfoPBRec {
+  DirInfo dirInfo;
+};
+using CInfoPBPtr = CInfoPBRec*;
+
+// Name and parent of the folder with an id. The name has at most 255 bytes. nsvErr for an unknown
+// volume; dirNFErr when no folder has the id; paramErr for another index than -1.
+OSErr PBGetCatInfoSync(CInfoPBPtr paramBlock);
+
 // --- Aliases ----------------------------------------------------------------------------------
 //
 // Only a Finder alias is an alias, and Linux has none: a symbolic link is not one.

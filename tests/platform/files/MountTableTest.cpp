@@ -24,7 +24,8 @@ std::string Line(int id, const std::string& place) {
 class RecordedTable {
  public:
   explicit RecordedTable(const std::string& text)
-      : mTable(mFolder.MakeFile("mountinfo", text).string()) {}
+      : mTable(mFolder.MakeFile("mountinfo", text).string(),
+               [] { return Mount{27, 1, 27, "/", "/", "tmpfs"}; }) {}
 
   MountTable* operator->() { return &mTable; }
   VolumeNumber NumberAt(std::size_t index) { return mTable.AtIndex(index)->Number(); }
@@ -92,21 +93,35 @@ TEST(MountTable, TheRootVolumeHasAName) {
 }
 
 TEST(MountTable, ARootThatIsNoMountPointIsStillTheFirstVolume) {
-  MountTable real;
-  const VolumeNumber number = real.AtIndex(0)->Number();
-  RecordedTable table(Line(31000, "/mnt/a"));
+  RecordedTable table(Line(31, "/mnt/a"));
   EXPECT_EQ(table->AtIndex(0)->MountPoint(), "/");
+  EXPECT_EQ(table.NumberAt(0), -27);
   EXPECT_EQ(table->AtIndex(1)->MountPoint(), "/mnt/a");
-  EXPECT_EQ(table.NumberAt(0), number);
 }
 
-TEST(MountTable, WithoutATableThereIsTheRootVolumeWithItsUsualNumber) {
-  MountTable real;
-  MountTable table("/nonexistent/mountinfo");
+TEST(MountTable, WhereTheKernelTellsNoMountIDsTheLowestMountAtTheRootIsTheRoot) {
+  const TemporaryFolder folder;
+  const std::string text = Line(27, "/") + "40 27 0:40 / / rw - tmpfs none rw\n" + Line(41, "/mnt");
+  MountTable table(folder.MakeFile("mountinfo", text).string(),
+                   [] { return Mount{0, 0, 27, "", "/", ""}; });
+  EXPECT_EQ(table.AtIndex(0)->Number(), -27);
+  EXPECT_EQ(table.AtIndex(1)->Number(), -41);
+  EXPECT_EQ(table.AtIndex(2), nullptr);
+}
+
+TEST(MountTable, WithoutATableThereIsTheVolumeThatTheRootIsOn) {
+  MountTable table("/nonexistent/mountinfo", [] { return Mount{27, 0, 27, "", "/", ""}; });
   ASSERT_NE(table.AtIndex(0), nullptr);
   EXPECT_EQ(table.AtIndex(0)->MountPoint(), "/");
-  EXPECT_EQ(table.AtIndex(0)->Number(), real.AtIndex(0)->Number());
+  EXPECT_EQ(table.AtIndex(0)->Number(), -27);
   EXPECT_EQ(table.AtIndex(1), nullptr);
+}
+
+TEST(MountTable, WithNeitherTableNorMountIDTheRootStillHasANumber) {
+  MountTable table("/nonexistent/mountinfo", [] { return Mount{0, 0, 0, "", "/", ""}; });
+  const VolumeNumber number = table.AtIndex(0)->Number();
+  EXPECT_LT(number, 0);
+  EXPECT_EQ(table.AtIndex(0)->Number(), number);
 }
 
 TEST(MountTable, ATableThatCannotBeReadIsAsGoodAsNone) {
@@ -121,13 +136,13 @@ TEST(MountTable, AWalkSeesOneStateWhileVolumesComeAndGo) {
   const TemporaryFolder folder;
   MountTable table;
   std::vector<std::string> before;
-  for (std::size_t i = 0; const Volume* volume = table.AtIndex(i); ++i) {
+  for (std::size_t i = 0; const VolumePointer volume = table.AtIndex(i); ++i) {
     before.push_back(volume->MountPoint());
   }
 
   std::optional<test::ScopedMount> appearing;
   std::vector<std::string> during;
-  for (std::size_t i = 0; const Volume* volume = table.AtIndex(i); ++i) {
+  for (std::size_t i = 0; const VolumePointer volume = table.AtIndex(i); ++i) {
     during.push_back(volume->MountPoint());
     if (!appearing) appearing.emplace("none", folder.MakeFolder("new").string(), "tmpfs");
   }
@@ -135,7 +150,7 @@ TEST(MountTable, AWalkSeesOneStateWhileVolumesComeAndGo) {
   EXPECT_EQ(during, before);
 
   std::vector<std::string> after;
-  for (std::size_t i = 0; const Volume* volume = table.AtIndex(i); ++i) {
+  for (std::size_t i = 0; const VolumePointer volume = table.AtIndex(i); ++i) {
     after.push_back(volume->MountPoint());
   }
   before.push_back((folder.Path() / "new").string());

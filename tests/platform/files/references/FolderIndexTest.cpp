@@ -5,7 +5,8 @@
 #include <unistd.h>
 
 #include "files/Descriptor.h"
-#include "files/FolderPass.h"
+#include "files/FolderIndex.h"
+#include "files/NodeID.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
 
@@ -16,7 +17,7 @@ using test::EnterOwnMountNamespace;
 using test::ScopedMount;
 using test::TemporaryFolder;
 
-class AFolderPass : public testing::Test {
+class AFolderIndex : public testing::Test {
  protected:
   ItemReference ItemAt(const std::string& name) const {
     const auto item = ReadItem(AT_FDCWD, (mFolder.Path() / name).c_str());
@@ -25,20 +26,28 @@ class AFolderPass : public testing::Test {
   }
   // Where a pass that starts at a folder finds what is at `name`, which must be there.
   void ExpectFoundFrom(const std::string& start, const std::string& name) const {
-    EXPECT_EQ(SearchFolders(ItemAt(name), mFolder.Path() / start), mFolder.Path() / name);
+    EXPECT_EQ(Search(ItemAt(name), mFolder.Path() / start), mFolder.Path() / name);
+  }
+
+  // What a new index of the item's volume finds.
+  std::optional<std::string> Search(const ItemReference& item, const std::string& start) const {
+    const VolumePointer volume = MountTable::OfThisProcess().OfItem(item, start);
+    EXPECT_TRUE(volume);
+    const std::uint32_t id = NodeIDOf(item, *volume->Root());
+    return FolderIndex(volume).Find({id, &item, S_ISDIR(item.type)}, start);
   }
 
   const TemporaryFolder mFolder;
 };
 
-TEST_F(AFolderPass, FindsAnItemInItsStart) {
+TEST_F(AFolderIndex, FindsAnItemInItsStart) {
   mFolder.MakeFolder("a");
   mFolder.MakeFile("a/x");
   mFolder.MakeFile("a/y");
   ExpectFoundFrom("a", "a/x");
 }
 
-TEST_F(AFolderPass, FindsAnItemBelowBesideAndAbove) {
+TEST_F(AFolderIndex, FindsAnItemBelowBesideAndAbove) {
   mFolder.MakeFolder("a/b/c/d");
   mFolder.MakeFolder("a/e/f");
   mFolder.MakeFile("a/b/c/d/x");
@@ -49,13 +58,13 @@ TEST_F(AFolderPass, FindsAnItemBelowBesideAndAbove) {
   }
 }
 
-TEST_F(AFolderPass, FindsAFolderAndItsOwnStart) {
+TEST_F(AFolderIndex, FindsAFolderAndItsOwnStart) {
   mFolder.MakeFolder("a/b/c");
   mFolder.MakeFolder("d");
   for (const char* name : {"a", "a/b", "a/b/c", "d"}) ExpectFoundFrom("a/b", name);
 }
 
-TEST_F(AFolderPass, FindsEveryKindOfItem) {
+TEST_F(AFolderIndex, FindsEveryKindOfItem) {
   mFolder.MakeFolder("a");
   ASSERT_EQ(symlink("nowhere", (mFolder.Path() / "a/link").c_str()), 0);
   ASSERT_EQ(mkfifo((mFolder.Path() / "a/pipe").c_str(), 0600), 0);
@@ -63,7 +72,7 @@ TEST_F(AFolderPass, FindsEveryKindOfItem) {
   for (const char* name : {"a/link", "a/pipe", "a/\xFF\n: name"}) ExpectFoundFrom("", name);
 }
 
-TEST_F(AFolderPass, FollowsNoLinkToAFolder) {
+TEST_F(AFolderIndex, FollowsNoLinkToAFolder) {
   mFolder.MakeFolder("a");
   mFolder.MakeFolder("b");
   mFolder.MakeFile("b/x");
@@ -72,7 +81,7 @@ TEST_F(AFolderPass, FollowsNoLinkToAFolder) {
   ExpectFoundFrom("a", "b/x");
 }
 
-TEST_F(AFolderPass, PassesOverFoldersThatCannotBeNamedFromTheRoot) {
+TEST_F(AFolderIndex, PassesOverFoldersThatCannotBeNamedFromTheRoot) {
   mFolder.MakeFolder("a");
   mFolder.MakeFolder("b");
   mFolder.MakeFile("b/x");
@@ -86,7 +95,7 @@ TEST_F(AFolderPass, PassesOverFoldersThatCannotBeNamedFromTheRoot) {
 }
 
 // Where the whole volume is one folder's size, so that a pass over it comes to an end soon.
-class APassOverAVolume : public AFolderPass {
+class AFolderIndexOfAVolume : public AFolderIndex {
  protected:
   void SetUp() override {
     if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
@@ -101,36 +110,35 @@ class APassOverAVolume : public AFolderPass {
   std::optional<ScopedMount> mVolume;
 };
 
-TEST_F(APassOverAVolume, EndsWithoutAnItemThatIsGone) {
+TEST_F(AFolderIndexOfAVolume, EndsWithoutAnItemThatIsGone) {
   const ItemReference item = ItemAt("volume/a/x");
   std::filesystem::remove(PathOf("volume/a/x"));
-  EXPECT_EQ(SearchFolders(item, PathOf("volume/a")), std::nullopt);
-  EXPECT_EQ(SearchFolders(item, PathOf("volume")), std::nullopt);
+  EXPECT_EQ(Search(item, PathOf("volume/a")), std::nullopt);
+  EXPECT_EQ(Search(item, PathOf("volume")), std::nullopt);
 }
 
-TEST_F(APassOverAVolume, DoesNotEnterAnother) {
+TEST_F(AFolderIndexOfAVolume, FindsAnItemWhereItIsBeforeWhereItIsMountedOnceMore) {
   const ItemReference item = ItemAt("volume/a/x");
   std::filesystem::rename(PathOf("volume/a"), PathOf("volume/b"));
-  // The same files once more, under another mount: found there only by who enters it.
+  // The same files once more, under another mount.
   const ScopedMount again(PathOf("volume/b"), mFolder.MakeFolder("volume/first"), "", MS_BIND);
   ASSERT_TRUE(again.IsMounted());
-  EXPECT_EQ(SearchFolders(item, PathOf("volume")), PathOf("volume/b/x"));
-  EXPECT_EQ(SearchFolders(item, PathOf("volume/first")), std::nullopt);
+  EXPECT_EQ(Search(item, PathOf("volume")), PathOf("volume/b/x"));
 }
 
-TEST_F(APassOverAVolume, DoesNotTakeACoveredFolderForWhatCoversIt) {
+TEST_F(AFolderIndexOfAVolume, DoesNotTakeACoveredFolderForWhatCoversIt) {
   const ItemReference covered = ItemAt("volume/a/mounted");
   const ScopedMount cover("tmpfs", PathOf("volume/a/mounted"), "tmpfs");
   ASSERT_TRUE(cover.IsMounted());
-  EXPECT_EQ(SearchFolders(covered, PathOf("volume")), std::nullopt);
+  EXPECT_EQ(Search(covered, PathOf("volume")), std::nullopt);
 }
 
-TEST_F(APassOverAVolume, StaysBelowItsRoot) {
+TEST_F(AFolderIndexOfAVolume, StaysBelowItsRoot) {
   mFolder.MakeFile("outside");
   const ItemReference outside = ItemAt("outside");
   ItemReference item = outside;
   item.mount = ItemAt("volume/a/x").mount;
-  EXPECT_EQ(SearchFolders(item, PathOf("volume/a")), std::nullopt);
+  EXPECT_EQ(Search(item, PathOf("volume/a")), std::nullopt);
 }
 
 }  // namespace

@@ -1,0 +1,39 @@
+// Where is an item: by the reference that was taken of it, or by its node id on a volume.
+//
+// A remembered place first, verified with one look; then, where the process may, by the file
+// system's own handle; then by a pass over the volume's folders. Everything may throw
+// std::bad_alloc.
+#pragma once
+
+#include <CoreServices/CoreServices.h>
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "files/ItemReference.h"
+#include "files/MountTable.h"
+
+namespace tallowmere::files {
+
+// Remembers that the item was found at an absolute path, for as long as there is room.
+void RememberPlace(const ItemReference& item, std::string_view path);
+
+// The same for a canonical path.
+void RememberPlace(const Place& place);
+
+// The canonical path of a folder that a path leads to, all links followed.
+std::optional<std::string> RealPath(const std::string& path);
+
+// The folder that holds a path, which must not be "/".
+std::string FolderOf(const std::string& path);
+
+// The path of this very item now. None when it is gone or cannot be found with certainty.
+std::optional<std::string> FindPlace(const ItemReference& item);
+
+// The item with a node id on a volume; with `folder` nothing but a folder. None when there is none
+// and when it is not certain which item that is.
+std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder);
+
+}  // namespace tallowmere::files

@@ -1,0 +1,382 @@
+#include "files/FolderIndex.h"
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <array>
+#include <climits>
+#include <cstddef>
+#include <ctime>
+#include <limits>
+#include <utility>
+
+#include "files/NodeID.h"
+#include "foundation/PathText.h"
+
+namespace tallowmere::files {
+namespace {
+
+constexpr std::uint32_t kNone = 0xFFFFFFFF;
+constexpr std::int64_t kNotRead = std::numeric_limits<std::int64_t>::min();
+
+// A change this recent may be followed by another with the same time: file systems count in ticks,
+// of two seconds at the coarsest.
+constexpr std::int64_t kCoarsestTick = 2'000'000'000;
+
+// The most components that a path can have: a "/" and one byte each.
+constexpr std::size_t kMostComponents = PATH_MAX / 2;
+
+constexpr std::size_t kMostOpenFolders = 16;
+constexpr std::size_t kSmallestTable = 64;
+
+std::int64_t Now() {
+  timespec now{};
+  clock_gettime(CLOCK_REALTIME, &now);
+  return now.tv_sec * 1'000'000'000 + now.tv_nsec;
+}
+
+bool IsThisOrParent(const char* name) {
+  return name[0] == '.' && (name[1] == '\0' || (name[1] == '.' && name[2] == '\0'));
+}
+
+// Where an entry's number can be another than the item's own.
+bool HasUntrueEntries(const Volume& volume) {
+  return volume.Type() == "overlay" || volume.Type().starts_with("fuse") ||
+         volume.Type() == "virtiofs";
+}
+
+std::string WithoutFolderMark(const std::string& path) {
+  return foundation::WithFolderMark(path, false);
+}
+
+}  // namespace
+
+// One question on its way through the folders.
+class FolderIndex::Search {
+ public:
+  Search(const SearchedItem& item, const Volume& volume)
+      : mItem(item),
+        mRoot(*volume.Root()),
+        mUntrueEntries(HasUntrueEntries(volume)),
+        mCertain(item.reference != nullptr || IsInodeNumber(item.id)) {}
+
+  const ItemReference& Root() const { return mRoot; }
+  std::uint32_t ID() const { return mItem.id; }
+  bool WantsFolder() const { return mItem.folder; }
+
+  // Whether one find settles it. Else every folder has to be seen, or two finds.
+  bool IsCertain() const { return mCertain; }
+  bool IsSettled() const { return mFound.size() > (mCertain ? 0 : 1); }
+  bool HasFound() const { return !mFound.empty(); }
+
+  // The one item that was found.
+  std::optional<std::string> Answer() const {
+    if (mFound.size() != 1) return std::nullopt;
+    return mFound.front().path;
+  }
+
+  // Whether an entry is worth a look at its item.
+  bool MayBe(std::uint64_t inode, std::uint64_t device, bool folder) const {
+    if (mItem.folder && !folder) return false;
+    if (mUntrueEntries && !folder) return true;
+    return NodeIDOf(inode, device, mRoot) == mItem.id;
+  }
+
+  // Takes the item at `name` in `folder`, with the status that was read there, if it is the one.
+  template <class Path>
+  void Offer(const ItemReference& item, int folder, const char* name, const Path& path) {
+    if (NodeIDOf(item, mRoot) != mItem.id) return;
+    if (mItem.folder && !S_ISDIR(item.type)) return;
+    if (mItem.reference != nullptr && !IsAt(*mItem.reference, folder, name)) return;
+    const bool known = std::any_of(mFound.begin(), mFound.end(),
+                                   [&](const Found& found) { return AreEqual(found.item, item); });
+    if (!known) mFound.push_back({item, path()});
+  }
+
+ private:
+  struct Found {
+    ItemReference item;
+    std::string path;
+  };
+
+  const SearchedItem& mItem;
+  const ItemReference& mRoot;
+  bool mUntrueEntries;
+  bool mCertain;
+  std::vector<Found> mFound;  // different items
+};
+
+FolderIndex::FolderIndex(VolumePointer volume) : mVolume(std::move(volume)) {}
+
+std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std::string& start) {
+  Search search(item, *mVolume);
+  ++mSearches;
+  FindKnown(search);
+  if (search.HasFound() && (search.IsCertain() || (IsWhole() && item.folder))) {
+    return search.Answer();
+  }
+  // What is known are folders. Whoever looks for a file reads them all anew.
+  if (!item.folder) Clear();
+  Walk(start, search);
+  if (item.folder && !search.HasFound()) CheckKnown(search);
+  return search.Answer();
+}
+
+std::size_t FolderIndex::Size() const {
+  return mFolders.capacity() * sizeof(Folder) + mTable.capacity() * sizeof(mTable[0]) +
+         mNames.capacity();
+}
+
+void FolderIndex::Clear() {
+  mFolders.clear();
+  mTable.clear();
+  mNames.clear();
+  mWaiting.clear();
+  mOpen.clear();
+  mIsWhole = false;
+}
+
+void FolderIndex::FindKnown(Search& search) const {
+  if (mTable.empty()) return;
+  const std::size_t mask = mTable.size() - 1;
+  for (std::size_t slot = search.ID() & mask; mTable[slot] != kNone; slot = (slot + 1) & mask) {
+    const Folder& folder = mFolders[mTable[slot]];
+    if (folder.id != search.ID()) continue;
+    const std::string path = PathOf(mTable[slot]);
+    const auto status = ReadStatus(AT_FDCWD, path.c_str());
+    if (!status || status->item.inode != folder.inode) continue;
+    search.Offer(status->item, AT_FDCWD, path.c_str(), [&path] { return path; });
+  }
+}
+
+// Folders near `start` first, then those that earlier walks have left, then the rest of the volume.
+void FolderIndex::Walk(const std::string& start, Search& search) {
+  const auto& mountPoints = mVolume->MountPoints();
+  const auto isMountPoint = [&](const std::string& path) {
+    return std::find(mountPoints.begin(), mountPoints.end(), path) != mountPoints.end();
+  };
+  std::vector<std::string> starts;
+  for (std::string path = start;; path = WithoutFolderMark(foundation::ParentPath(path))) {
+    starts.push_back(path);
+    if (path == "/" || isMountPoint(path)) break;
+  }
+  starts.insert(starts.end(), mountPoints.begin(), mountPoints.end());
+
+  const std::size_t left = mWaiting.size();
+  for (const std::string& path : starts) {
+    Visit({kNone, path}, search);
+    VisitWaiting(left, search);
+    if (search.IsSettled()) return;
+  }
+  VisitWaiting(0, search);
+  if (!search.IsSettled()) mIsWhole = true;
+}
+
+void FolderIndex::VisitWaiting(std::size_t remaining, Search& search) {
+  while (mWaiting.size() > remaining && !search.IsSettled()) {
+    const Waiting next = std::move(mWaiting.back());
+    mWaiting.pop_back();
+    Visit(next, search);
+  }
+}
+
+void FolderIndex::Visit(const Waiting& waiting, Search& search) {
+  Descriptor descriptor = Open(waiting);
+  if (!descriptor.IsOpen()) return;
+  const auto status = ReadStatus(descriptor.Get(), "");
+  if (!status || !IsOfVolume(status->item, waiting)) return;
+
+  const std::uint32_t index = Learn(status->item, waiting);
+  search.Offer(status->item, descriptor.Get(), "", [&] { return PathOf(index); });
+  Folder& folder = mFolders[index];
+  if (folder.change == status->change) {
+    folder.checked = mSearches;
+    return;
+  }
+  folder.change = kNotRead;
+  const std::size_t before = mWaiting.size();
+  if (search.IsSettled() || !Read(index, descriptor, search)) {
+    mWaiting.resize(before);
+    mWaiting.push_back(waiting);
+    return;
+  }
+  const bool mayChangeUnseen = status->change + kCoarsestTick >= Now();
+  mFolders[index].change = mayChangeUnseen ? kNotRead : status->change;
+  mFolders[index].checked = mSearches;
+  if (mWaiting.size() > before) KeepOpen(index, std::move(descriptor));
+}
+
+// Whether it was read to its end: not when the search was settled on the way, nor when reading
+// failed.
+bool FolderIndex::Read(std::uint32_t index, const Descriptor& descriptor, Search& search) {
+  struct Entry {  // struct linux_dirent64 of getdents(2)
+    std::uint64_t inode;
+    std::int64_t offset;
+    std::uint16_t size;
+    std::uint8_t type;
+    char name[1];
+  };
+  const std::int32_t mount = mFolders[index].mount;
+  alignas(Entry) std::array<char, 32768> buffer;
+  while (true) {
+    const ssize_t got = getdents64(descriptor.Get(), buffer.data(), buffer.size());
+    if (got <= 0) return true;  // what cannot be read to its end is passed over
+    for (ssize_t at = 0; at < got;) {
+      const auto* const entry = reinterpret_cast<const Entry*>(buffer.data() + at);
+      const char* const name = buffer.data() + at + offsetof(Entry, name);
+      at += entry->size;
+      if (IsThisOrParent(name)) continue;
+      bool isFolder = entry->type == DT_DIR;
+      if (entry->type == DT_UNKNOWN || search.MayBe(entry->inode, search.Root().device, isFolder)) {
+        const auto status = ReadStatus(descriptor.Get(), name);
+        if (!status || status->item.mount != mount) continue;
+        isFolder = S_ISDIR(status->item.type);
+        search.Offer(status->item, descriptor.Get(), name,
+                     [&] { return foundation::JoinPath(PathOf(index), name); });
+        if (search.IsSettled()) return false;
+      }
+      if (isFolder) mWaiting.push_back({index, name});
+    }
+  }
+}
+
+// Looks at every folder that this search has not seen: folders that have changed are read again,
+// those that have moved are found where they are now.
+void FolderIndex::CheckKnown(Search& search) {
+  for (const bool last : {false, true}) {
+    for (std::uint32_t index = 0; index < mFolders.size() && !search.IsSettled(); ++index) {
+      const Folder& folder = mFolders[index];
+      if (folder.id == 0 || folder.checked == mSearches) continue;
+      if (!IsUnchanged(index)) {
+        Visit({folder.parent, std::string(NameOf(folder))}, search);
+        VisitWaiting(0, search);
+      }
+      Folder& seen = mFolders[index];
+      if (last && seen.checked != mSearches && !search.IsSettled()) seen.id = 0;
+    }
+  }
+}
+
+bool FolderIndex::IsUnchanged(std::uint32_t index) const {
+  const auto status = ReadStatus(AT_FDCWD, PathOf(index).c_str());
+  const Folder& folder = mFolders[index];
+  return status && status->item.inode == folder.inode && status->change == folder.change;
+}
+
+// The folder's index. One that was known may have moved.
+std::uint32_t FolderIndex::Learn(const ItemReference& item, const Waiting& waiting) {
+  const std::uint32_t id = NodeIDOf(item, *mVolume->Root());
+  std::uint32_t index = Known(item.inode, id);
+  if (index == kNone) {
+    index = static_cast<std::uint32_t>(mFolders.size());
+    mFolders.push_back({item.inode, kNotRead, id, kNone, 0, item.mount, 0});
+    mFolders.back().name = static_cast<std::uint32_t>(mNames.size());
+    mNames.append(waiting.name).push_back('\0');
+    mFolders.back().parent = waiting.parent;
+    Insert(index);
+    return index;
+  }
+  Folder& folder = mFolders[index];
+  // A folder under its parent is told by one step, which follows when the parent moves.
+  const bool isFurther = waiting.parent == kNone && folder.parent != kNone;
+  if (folder.mount == item.mount && isFurther) return index;
+  if (folder.parent != waiting.parent || NameOf(folder) != waiting.name) {
+    folder.name = static_cast<std::uint32_t>(mNames.size());
+    mNames.append(waiting.name).push_back('\0');
+    folder.parent = waiting.parent;
+    folder.mount = item.mount;
+  }
+  return index;
+}
+
+// Whether a folder that was come upon belongs to the walk: at a start it is on the volume, further
+// down on the mount of its parent. What is mounted on the way has starts of its own.
+bool FolderIndex::IsOfVolume(const ItemReference& item, const Waiting& waiting) const {
+  if (waiting.parent != kNone) {
+    if (item.mount == kNoMount) return item.device == mVolume->Root()->device;
+    return item.mount == mFolders[waiting.parent].mount;
+  }
+  const auto volume = MountTable::OfThisProcess().OfItem(item, waiting.name);
+  return volume && volume->Number() == mVolume->Number();
+}
+
+std::uint32_t FolderIndex::Known(std::uint64_t inode, std::uint32_t id) const {
+  if (mTable.empty()) return kNone;
+  const std::size_t mask = mTable.size() - 1;
+  for (std::size_t slot = id & mask; mTable[slot] != kNone; slot = (slot + 1) & mask) {
+    const Folder& folder = mFolders[mTable[slot]];
+    if (folder.id == id && folder.inode == inode) return mTable[slot];
+  }
+  return kNone;
+}
+
+void FolderIndex::Insert(std::uint32_t index) {
+  const auto put = [this](std::uint32_t entry) {
+    const std::size_t mask = mTable.size() - 1;
+    std::size_t slot = mFolders[entry].id & mask;
+    while (mTable[slot] != kNone) slot = (slot + 1) & mask;
+    mTable[slot] = entry;
+  };
+  // Three quarters full at the most. A folder that is gone keeps its slot until then.
+  if (mFolders.size() * 4 > mTable.size() * 3) {
+    mTable.assign(std::max(kSmallestTable, mTable.size() * 2), kNone);
+    for (std::uint32_t known = 0; known <= index; ++known) put(known);
+  } else {
+    put(index);
+  }
+}
+
+std::string FolderIndex::PathOf(std::uint32_t index) const {
+  std::vector<std::string_view> names;
+  for (; index != kNone; index = mFolders[index].parent) {
+    names.push_back(NameOf(mFolders[index]));
+    // Folders that changed places, half of it noticed, can seem to hold each other.
+    if (names.size() > kMostComponents) return {};
+  }
+  std::string path(names.back());
+  for (auto name = names.rbegin() + 1; name != names.rend(); ++name) {
+    if (path.back() != '/') path.push_back('/');
+    path.append(*name);
+  }
+  return path;
+}
+
+std::string FolderIndex::PathOf(const Waiting& waiting) const {
+  if (waiting.parent == kNone) return waiting.name;
+  return foundation::JoinPath(PathOf(waiting.parent), waiting.name);
+}
+
+// Not open where something is mounted, which to open could mean to wait.
+Descriptor FolderIndex::Open(const Waiting& waiting) {
+  constexpr int kFlags = O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC;
+  ++mOpenedFolders;
+  if (waiting.parent == kNone) return Descriptor(open(waiting.name.c_str(), kFlags));
+  const Descriptor* const parent = OpenParent(waiting.parent);
+  if (parent == nullptr) return {};
+  if (mOpen.back().holdsMountPoint && MountTable::OfThisProcess().IsMountPoint(PathOf(waiting))) {
+    return {};
+  }
+  return Descriptor(openat(parent->Get(), waiting.name.c_str(), kFlags));
+}
+
+// Null when it cannot be opened.
+const Descriptor* FolderIndex::OpenParent(std::uint32_t index) {
+  while (!mOpen.empty() && mOpen.back().index != index) mOpen.pop_back();
+  if (mOpen.empty()) {
+    Descriptor descriptor(
+        open(PathOf(index).c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+    if (!descriptor.IsOpen()) return nullptr;
+    KeepOpen(index, std::move(descriptor));
+  }
+  return &mOpen.back().descriptor;
+}
+
+void FolderIndex::KeepOpen(std::uint32_t index, Descriptor descriptor) {
+  if (mOpen.size() == kMostOpenFolders) mOpen.erase(mOpen.begin());
+  const bool holds = MountTable::OfThisProcess().HoldsMountPoint(PathOf(index));
+  mOpen.push_back({index, std::move(descriptor), holds});
+}
+
+}  // namespace tallowmere::files

@@ -1,0 +1,103 @@
+// The folders of one volume, learned by reading them: where is the folder with an id, and the pass
+// over the volume that answers when nothing shorter does.
+//
+// What a pass learns about folders is kept, under 64 bytes and the name for each; files are not
+// kept. A pass stops as soon as the answer is certain and goes on from there for the next question.
+// A folder that was read is read again only when its change time has moved. The index never leaves
+// its volume, waits for no server and no automounter, and passes over what it may not read.
+//
+// One thread. Everything may throw std::bad_alloc, after which the index is as good as new.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "files/Descriptor.h"
+#include "files/ItemReference.h"
+#include "files/MountTable.h"
+
+namespace tallowmere::files {
+
+// What a search looks for.
+struct SearchedItem {
+  std::uint32_t id;                          // its node id on the volume
+  const ItemReference* reference = nullptr;  // or this very item alone
+  bool folder = false;                       // nothing but a folder
+};
+
+class FolderIndex {
+ public:
+  // REQUIRES: the volume has a root.
+  explicit FolderIndex(VolumePointer volume);
+
+  // The canonical path of the item, verified. None when no folder that can be read holds it, and
+  // when two items have the id. Folders near `start` are read first: it, those below it, those
+  // above it. REQUIRES: `start` is the canonical path of a folder.
+  std::optional<std::string> Find(const SearchedItem& item, const std::string& start);
+
+  const VolumePointer& OfVolume() const { return mVolume; }
+
+  // How many folders were opened so far, for tests and benchmarks.
+  std::uint64_t OpenedFolders() const { return mOpenedFolders; }
+
+  // Bytes in use for what was learned.
+  std::size_t Size() const;
+
+ private:
+  class Search;
+
+  struct Folder {
+    std::uint64_t inode;
+    std::int64_t change;   // its change time when it was last read whole; kNotRead
+    std::uint32_t id;      // 0: it is gone
+    std::uint32_t parent;  // an index; kNone: the name is a whole path
+    std::uint32_t name;    // where it begins in mNames
+    std::int32_t mount;
+    std::uint32_t checked;  // the last search that has seen it as it is
+  };
+  struct Waiting {
+    std::uint32_t parent;
+    std::string name;
+  };
+  struct OpenFolder {
+    std::uint32_t index;
+    Descriptor descriptor;
+    bool holdsMountPoint;
+  };
+
+  void Clear();
+  bool IsWhole() const { return mIsWhole && mWaiting.empty(); }
+  void FindKnown(Search& search) const;
+  void Walk(const std::string& start, Search& search);
+  void VisitWaiting(std::size_t remaining, Search& search);
+  void Visit(const Waiting& waiting, Search& search);
+  bool Read(std::uint32_t index, const Descriptor& descriptor, Search& search);
+  void CheckKnown(Search& search);
+  bool IsUnchanged(std::uint32_t index) const;
+
+  std::uint32_t Learn(const ItemReference& item, const Waiting& waiting);
+  bool IsOfVolume(const ItemReference& item, const Waiting& waiting) const;
+  std::uint32_t Known(std::uint64_t inode, std::uint32_t id) const;
+  void Insert(std::uint32_t index);
+  std::string_view NameOf(const Folder& folder) const { return mNames.data() + folder.name; }
+  std::string PathOf(std::uint32_t index) const;
+  std::string PathOf(const Waiting& waiting) const;
+  Descriptor Open(const Waiting& waiting);
+  const Descriptor* OpenParent(std::uint32_t index);
+  void KeepOpen(std::uint32_t index, Descriptor descriptor);
+
+  VolumePointer mVolume;
+  std::vector<Folder> mFolders;
+  std::vector<std::uint32_t> mTable;  // open addressing by id, of indexes into mFolders
+  std::string mNames;                 // each with a NUL behind it
+  std::vector<Waiting> mWaiting;      // to be visited, the last one first
+  std::vector<OpenFolder> mOpen;      // the way to the folder in hand, its last part
+  bool mIsWhole = false;              // every start has been walked from
+  std::uint32_t mSearches = 0;
+  std::uint64_t mOpenedFolders = 0;
+};
+
+}  // namespace tallowmere::files

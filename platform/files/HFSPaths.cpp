@@ -1,0 +1,128 @@
+// FSMakeFSSpec: the record of an item by an HFS path.
+
+#include <CoreServices/CoreServices.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <string>
+#include <vector>
+
+#include "files/HFSNames.h"
+#include "files/NodeID.h"
+#include "files/PascalName.h"
+#include "files/Specs.h"
+#include "foundation/NoThrow.h"
+
+using namespace tallowmere::files;
+using tallowmere::foundation::OrError;
+
+namespace {
+
+constexpr char kSeparator = ':';
+
+// A path as steps from a folder: each a name, or empty for a climb to the folder above.
+struct Steps {
+  std::string_view volume;  // of a full path, else empty
+  std::vector<std::string_view> names;
+};
+
+Steps ReadPath(std::string_view path) {
+  Steps steps;
+  const std::size_t first = path.find(kSeparator);
+  if (first != std::string_view::npos && first > 0) {
+    steps.volume = path.substr(0, first);
+    path.remove_prefix(first);
+  }
+  if (path.starts_with(kSeparator)) path.remove_prefix(1);
+  while (!path.empty()) {
+    const std::size_t end = path.find(kSeparator);
+    steps.names.push_back(path.substr(0, end));
+    path.remove_prefix(end == std::string_view::npos ? path.size() : end + 1);
+  }
+  return steps;
+}
+
+// On the way a missing item is a missing folder.
+OSErr OnTheWay(OSErr error) {
+  if (error == fnfErr) return dirNFErr;
+  return error;
+}
+
+OSErr FolderAt(const std::string& path, Folder& folder) {
+  const auto real = RealPath(path);
+  if (!real) return OnTheWay(ErrorOfSystem());
+  const auto item = ReadItem(AT_FDCWD, real->c_str());
+  if (!item || !S_ISDIR(item->type)) return dirNFErr;
+  folder.place = {*real, *item};
+  folder.volume = MountTable::OfThisProcess().OfItem(*item, *real);
+  return folder.volume && folder.volume->Root() ? noErr : nsvErr;
+}
+
+OSErr RootOf(const VolumePointer& volume, Folder& folder) {
+  if (!volume) return nsvErr;
+  return FolderWithID(volume->Number(), kRootFolderID, folder);
+}
+
+OSErr StartingFolder(SInt16 vRefNum, SInt32 dirID, std::string_view volumeName, Folder& folder) {
+  MountTable& table = MountTable::OfThisProcess();
+  if (!volumeName.empty()) return RootOf(table.WithName(volumeName), folder);
+  if (vRefNum == 0 && dirID == 0) return FolderAt(".", folder);
+  if (dirID == 0) return RootOf(table.WithNumber(vRefNum), folder);
+  return FolderWithID(vRefNum, static_cast<UInt32>(dirID), folder);
+}
+
+// Into the folder with a name, a link to it followed, or with an empty name to the folder above.
+OSErr Step(std::string_view name, Folder& folder) {
+  if (name.empty()) {
+    if (VolumeOfRoot(folder.place)) return dirNFErr;
+    Folder above;
+    const OSErr error = HoldingFolder(folder.place, above);
+    if (error == noErr) folder = above;
+    return OnTheWay(error);
+  }
+  Place item;
+  const OSErr error = LookUpHFSName(folder, name, item);
+  if (error != noErr) return OnTheWay(error);
+  return FolderAt(item.path, folder);
+}
+
+OSErr SpecOfName(const Folder& folder, std::string_view name, FSSpec& spec) {
+  Place item;
+  const OSErr error = LookUpHFSName(folder, name, item);
+  if (error == noErr) {
+    RememberPlace(item);
+    return SpecOfPlace(item, spec);
+  }
+  if (error != fnfErr) return error;
+  if (name.size() > kLongestSpecName || SpellHFSName(name).precomposed.empty()) return bdNamErr;
+  RememberPlace(folder.place);
+  FillSpec(spec, folder.volume->Number(), folder.ID(), name);
+  return fnfErr;
+}
+
+OSErr MakeSpec(SInt16 vRefNum, SInt32 dirID, std::string_view path, FSSpec& spec) {
+  // The record of a root: the volume's name in the parent that every root has.
+  if (dirID == static_cast<SInt32>(kParentOfRootID) && path.find(kSeparator) == path.npos) {
+    const VolumePointer volume = MountTable::OfThisProcess().WithNumber(vRefNum);
+    if (!volume) return nsvErr;
+    if (volume->Name() != path) return fnfErr;
+    FillSpec(spec, volume->Number(), kParentOfRootID, path);
+    return noErr;
+  }
+  const Steps steps = ReadPath(path);
+  Folder folder;
+  if (const OSErr error = StartingFolder(vRefNum, dirID, steps.volume, folder)) return error;
+  if (steps.names.empty()) return SpecOfPlace(folder.place, spec);
+  for (std::size_t i = 0; i + 1 < steps.names.size(); ++i) {
+    if (const OSErr error = Step(steps.names[i], folder)) return error;
+  }
+  if (!steps.names.back().empty()) return SpecOfName(folder, steps.names.back(), spec);
+  const OSErr error = Step({}, folder);
+  return error == noErr ? SpecOfPlace(folder.place, spec) : error;
+}
+
+}  // namespace
+
+OSErr FSMakeFSSpec(SInt16 vRefNum, SInt32 dirID, ConstStr255Param fileName, FSSpec* spec) {
+  return OrError([&] { return MakeSpec(vRefNum, dirID, TextOfPascal(fileName), *spec); });
+}
