@@ -56,8 +56,11 @@ std::optional<Place> PlaceAt(std::string path) {
 }
 
 // The nearest folder to a former place of an item that is still there and on the volume; else the
-// volume's root folder.
+// volume's root folder. What seems to be on another volume is not looked at: that one may not
+// answer.
 std::string NearestFolder(const VolumePointer& volume, const std::string& formerPlace) {
+  const VolumePointer former = MountTable::OfThisProcess().OfPath(formerPlace);
+  if (!former || former->Number() != volume->Number()) return volume->MountPoint();
   for (std::string path = formerPlace; !path.empty() && path != "/";) {
     path = FolderOf(path);
     // Above a component "." or ".." the spelling leads nowhere.
@@ -98,9 +101,10 @@ FolderIndex& IndexOf(const VolumePointer& volume) {
   static std::vector<FolderIndex> indexes;
   for (FolderIndex& index : indexes) {
     const VolumePointer& known = index.OfVolume();
-    if (known->Number() == volume->Number() && AreEqual(*known->Root(), *volume->Root())) {
-      return index;
-    }
+    if (known->Number() != volume->Number() || !AreEqual(*known->Root(), *volume->Root())) continue;
+    // What was learned hangs on the places where the volume was mounted.
+    if (known->MountPoints() != volume->MountPoints()) index = FolderIndex(volume);
+    return index;
   }
   std::erase_if(indexes, [](const FolderIndex& index) {
     return !MountTable::OfThisProcess().WithNumber(index.OfVolume()->Number());
@@ -189,7 +193,7 @@ std::optional<std::string> FindPlace(const ItemReference& item) {
 }
 
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder) {
-  if (!volume->Root()) return std::nullopt;
+  if (!CanBeNodeID(id) || !volume->Root()) return std::nullopt;
   if (id == kRootFolderID) return RootOf(volume);
 
   std::optional<Place> place;

@@ -15,6 +15,7 @@
 #include <utility>
 
 #include "files/NodeID.h"
+#include "files/Spread.h"
 #include "foundation/PathText.h"
 
 namespace tallowmere::files {
@@ -142,6 +143,7 @@ std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std
     throw;
   }
   mOpen.clear();
+  if (mWaiting.empty()) mWaiting = {};
   return search.Answer();
 }
 
@@ -176,14 +178,16 @@ void FolderIndex::Clear() {
 void FolderIndex::FindKnown(Search& search) const {
   if (mTable.empty()) return;
   const std::size_t mask = mTable.size() - 1;
-  for (std::size_t slot = search.ID() & mask; mTable[slot] != kNone; slot = (slot + 1) & mask) {
+  for (std::size_t slot = FirstSlot(search.ID(), mTable.size()); mTable[slot] != kNone;
+       slot = (slot + 1) & mask) {
     const Folder& folder = mFolders[mTable[slot]];
     if (folder.id != search.ID()) continue;
     const std::string path = PathOf(mTable[slot]);
     if (!IsReachable(path)) continue;
     const auto status = ReadStatus(AT_FDCWD, path.c_str());
     if (!status || status->item.inode != folder.inode) continue;
-    search.Offer(status->item, AT_FDCWD, path.c_str(), [&path] { return path; });
+    search.Offer(status->item, AT_FDCWD, path.c_str(),
+                 [&path]() -> const std::string& { return path; });
   }
 }
 
@@ -296,7 +300,8 @@ bool FolderIndex::Read(std::uint32_t index, std::uint64_t device, const Descript
         const auto status = ReadStatus(descriptor.Get(), name);
         if (!status || status->item.mount != mount) continue;
         isFolder = S_ISDIR(status->item.type);
-        search.Offer(status->item, descriptor.Get(), name, [&path] { return path; });
+        search.Offer(status->item, descriptor.Get(), name,
+                     [&path]() -> const std::string& { return path; });
         if (search.IsSettled()) return false;
       }
       if (isFolder) mWaiting.push_back({index, name});
@@ -334,7 +339,8 @@ bool FolderIndex::CheckUnchanged(std::uint32_t index, Search& search) {
     return false;
   }
   folder.checked = mSearches;
-  search.Offer(status->item, AT_FDCWD, path.c_str(), [&path] { return path; });
+  search.Offer(status->item, AT_FDCWD, path.c_str(),
+               [&path]() -> const std::string& { return path; });
   return true;
 }
 
@@ -383,7 +389,8 @@ bool FolderIndex::IsOfVolume(const ItemReference& item, const Waiting& waiting) 
 std::uint32_t FolderIndex::Known(std::uint64_t inode, std::uint32_t id) const {
   if (mTable.empty()) return kNone;
   const std::size_t mask = mTable.size() - 1;
-  for (std::size_t slot = id & mask; mTable[slot] != kNone; slot = (slot + 1) & mask) {
+  for (std::size_t slot = FirstSlot(id, mTable.size()); mTable[slot] != kNone;
+       slot = (slot + 1) & mask) {
     const Folder& folder = mFolders[mTable[slot]];
     if (folder.id == id && folder.inode == inode) return mTable[slot];
   }
@@ -393,7 +400,7 @@ std::uint32_t FolderIndex::Known(std::uint64_t inode, std::uint32_t id) const {
 void FolderIndex::Insert(std::uint32_t index) {
   const auto put = [this](std::uint32_t entry) {
     const std::size_t mask = mTable.size() - 1;
-    std::size_t slot = mFolders[entry].id & mask;
+    std::size_t slot = FirstSlot(mFolders[entry].id, mTable.size());
     while (mTable[slot] != kNone) slot = (slot + 1) & mask;
     mTable[slot] = entry;
   };

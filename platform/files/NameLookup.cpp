@@ -3,6 +3,7 @@
 #include <dirent.h>
 #include <fcntl.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <memory>
 
@@ -25,10 +26,13 @@ OSErr LookUp(const Folder& folder, const std::string& linuxName, Place& item) {
   return noErr;
 }
 
-// Whether a short name stands for an item of the folder that is called `linuxName`.
-bool StandsFor(const ShortNameParts& parts, std::string_view name, const char* linuxName) {
+// Whether a short name, read in one way, stands for the item called `linuxName` of an open folder.
+bool StandsFor(const ShortNameParts& parts, std::string_view name, const Folder& folder,
+               DIR* entries, const char* linuxName) {
   for (std::size_t marks = 1; marks <= parts.marks; ++marks) {
-    if (ShortHFSName(linuxName, parts.nodeID, marks) == name) return true;
+    if (ShortHFSName(linuxName, parts.nodeID, marks) != name) continue;
+    const auto status = ReadStatus(dirfd(entries), linuxName);
+    return status && NodeIDOf(status->item, *folder.volume->Root()) == parts.nodeID;
   }
   return false;
 }
@@ -36,8 +40,8 @@ bool StandsFor(const ShortNameParts& parts, std::string_view name, const char* l
 // Goes through the whole folder. An entry whose HFS form is the name counts before one whose short
 // form it is; two of a kind are none.
 OSErr SearchFolder(const Folder& folder, std::string_view name, bool accented, Place& item) {
-  const auto parts = ReadShortHFSName(name);
-  if (!accented && !parts) return fnfErr;
+  const auto readings = ReadShortHFSName(name);
+  if (!accented && readings.empty()) return fnfErr;
   const std::unique_ptr<DIR, CloseFolder> entries(opendir(folder.place.path.c_str()));
   if (!entries) return ErrorOfSystem();
   std::string plain;
@@ -49,9 +53,9 @@ OSErr SearchFolder(const Folder& folder, std::string_view name, bool accented, P
     if (accented && PlainHFSName(linuxName, kLongestStr255Name) == name) {
       plain = linuxName;
       ++plainFound;
-    } else if (parts && StandsFor(*parts, name, linuxName)) {
-      const auto status = ReadStatus(dirfd(entries.get()), linuxName);
-      if (!status || NodeIDOf(status->item, *folder.volume->Root()) != parts->nodeID) continue;
+    } else if (std::any_of(readings.begin(), readings.end(), [&](const ShortNameParts& parts) {
+                 return StandsFor(parts, name, folder, entries.get(), linuxName);
+               })) {
       shortened = linuxName;
       ++shortenedFound;
     }

@@ -1,5 +1,7 @@
 #include "files/PlaceMemory.h"
 
+#include "files/Spread.h"
+
 namespace tallowmere::files {
 namespace {
 
@@ -8,9 +10,6 @@ constexpr std::size_t kLimitOfThisProcess = 1 << 20;
 
 // What the heap and the two containers add to a place and its path.
 constexpr std::size_t kOverhead = 96;
-
-// An odd number that spreads the bits of what it multiplies: 2^64 divided by the golden ratio.
-constexpr std::uint64_t kSpread = 0x9E3779B97F4A7C15;
 
 }  // namespace
 
