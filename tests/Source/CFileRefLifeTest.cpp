@@ -38,8 +38,10 @@ TEST(FileReference, TheLocalEncodingIsMacRomanAtTheStart) {
 
 TEST(FileReference, CopyOfAnEmptyReferenceIsEmpty) {
   const CFileRef empty;
-  const CFileRef copy(empty);
+  CFileRef copy(empty);
   EXPECT_TRUE(IsEmpty(copy));
+  EXPECT_TRUE(copy.AddToPath("/a", false));  // it is an object of its own
+  EXPECT_TRUE(IsEmpty(empty));
 }
 
 TEST(FileReference, CopySharesTheUrl) {
@@ -47,10 +49,12 @@ TEST(FileReference, CopySharesTheUrl) {
   const CFileRef source(url.Get());
   EXPECT_EQ(CFGetRetainCount(url.Get()), 2);
   {
-    const CFileRef copy(source);
+    CFileRef copy(source);
     EXPECT_TRUE(copy.IsValid());
     EXPECT_EQ(UrlOf(copy), url.Get());
     EXPECT_EQ(CFGetRetainCount(url.Get()), 3);
+    copy.Invalidate();
+    EXPECT_EQ(CFGetRetainCount(url.Get()), 2);
   }
   EXPECT_EQ(CFGetRetainCount(url.Get()), 2);
 }

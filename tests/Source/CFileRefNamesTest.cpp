@@ -222,6 +222,11 @@ std::string Buffer() {
   return std::string(1200, 'x');
 }
 
+// The text that ends with the first NUL.
+std::string TextIn(const std::string& buffer) {
+  return buffer.substr(0, buffer.find('\0'));
+}
+
 RC_GTEST_PROP(NameModel, GetFileName, ()) {
   const auto name = *rc::gen::suchThat(foundation::test::AnyName(), IsPlain);
   const auto size = *rc::gen::inRange<std::size_t>(0, 1101);
@@ -231,11 +236,11 @@ RC_GTEST_PROP(NameModel, GetFileName, ()) {
   const bool fits = Named(name).GetFileName(buffer.data(), static_cast<long>(size));
   RC_ASSERT(fits == (name.size() < 1024 && name.size() <= size));
   if (size == 0) {
-    RC_ASSERT(std::string(buffer.c_str()) == (name.size() < 1024 ? "old" : "old/"));
+    RC_ASSERT(TextIn(buffer) == (name.size() < 1024 ? "old" : "old/"));
   } else if (name.size() >= 1024) {
     RC_ASSERT(buffer == before);
   } else {
-    RC_ASSERT(std::string(buffer.c_str()) == name.substr(0, size - 1));
+    RC_ASSERT(TextIn(buffer) == name.substr(0, size - 1));
   }
 }
 
@@ -246,7 +251,7 @@ RC_GTEST_PROP(NameModel, GetFileNameOfLongNames, ()) {
   std::string buffer = Buffer();
   const bool fits = Named(name).GetFileName(buffer.data(), static_cast<long>(size));
   RC_ASSERT(fits == (name.size() < 1024 && name.size() <= size));
-  if (name.size() < 1024) RC_ASSERT(std::string(buffer.c_str()) == name.substr(0, size - 1));
+  if (name.size() < 1024) RC_ASSERT(TextIn(buffer) == name.substr(0, size - 1));
 }
 
 RC_GTEST_PROP(NameModel, GetExtension, ()) {

@@ -347,7 +347,7 @@ TEST(ExpandingATilde, KeepsNothingOfItsArgument) {
 }
 
 TEST(ExpandingATildeDeathTest, StopsTheProcessForANullPath) {
-  EXPECT_DEATH(CreateURLByExpandingTildePath(nullptr, false),
+  EXPECT_DEATH(const CFOwned url(CreateURLByExpandingTildePath(nullptr, false)),
                "path != NULL.*CreateURLByExpandingTildePath.*CFileRef.*line 64");
 }
 

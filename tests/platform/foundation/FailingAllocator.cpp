@@ -22,11 +22,18 @@ void* operator new(std::size_t size) {
   return memory;
 }
 
-// The form that does not throw comes here as well.
 void* operator new[](std::size_t size) {
   ++gArrays;
   gLastArraySize = size;
   return operator new(size);
+}
+
+void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
+  try {
+    return operator new[](size);
+  } catch (const std::bad_alloc&) {
+    return nullptr;
+  }
 }
 
 void operator delete(void* memory) noexcept {
@@ -35,6 +42,14 @@ void operator delete(void* memory) noexcept {
 }
 
 void operator delete(void* memory, std::size_t) noexcept {
+  operator delete(memory);
+}
+
+void operator delete[](void* memory) noexcept {
+  operator delete(memory);
+}
+
+void operator delete[](void* memory, std::size_t) noexcept {
   operator delete(memory);
 }
 
