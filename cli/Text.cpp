@@ -4,8 +4,30 @@
 
 #include "foundation/FileNameText.h"
 #include "foundation/MacRoman.h"
+#include "foundation/Utf16.h"
 
 namespace tallowmere::cli {
+namespace {
+
+// C0 and C1 control characters and DEL, each of one UTF-16 unit.
+bool IsControl(char16_t unit) {
+  return unit < 0x20 || (unit >= 0x7F && unit < 0xA0);
+}
+
+bool IsPlain(std::u16string_view character) {
+  return !IsControl(character[0]) && !foundation::IsEscapedByte(character[0]);
+}
+
+void AppendOctal(std::string_view bytes, std::string& text) {
+  for (const char byte : bytes) {
+    text.push_back('\\');
+    for (const int shift : {6, 3, 0}) {
+      text.push_back(static_cast<char>('0' + (static_cast<unsigned char>(byte) >> shift & 7)));
+    }
+  }
+}
+
+}  // namespace
 
 std::string Utf8OfHFSName(std::string_view name) {
   // No Mac Roman character is a surrogate, so there always is one.
@@ -14,15 +36,16 @@ std::string Utf8OfHFSName(std::string_view name) {
 
 std::string Printable(std::string_view text) {
   std::string printable;
-  for (const char c : text) {
-    const auto byte = static_cast<unsigned char>(c);
-    if (byte >= ' ' && byte != 0x7F) {
-      printable.push_back(c);
+  const std::u16string units = foundation::TextOfFileName(text);
+  for (std::u16string_view rest = units; !rest.empty();) {
+    const bool isPair = rest.size() > 1 && foundation::IsHighSurrogate(rest[0]);
+    const std::u16string_view character = rest.substr(0, isPair ? 2 : 1);
+    rest.remove_prefix(character.size());
+    const std::string bytes = foundation::FileNameOfText(character).value_or("");
+    if (IsPlain(character)) {
+      printable.append(bytes);
     } else {
-      printable.push_back('\\');
-      for (const int shift : {6, 3, 0}) {
-        printable.push_back(static_cast<char>('0' + (byte >> shift & 7)));
-      }
+      AppendOctal(bytes, printable);
     }
   }
   return printable;

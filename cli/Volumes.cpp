@@ -56,12 +56,14 @@ int PrintVolumes(const ClientOptions& options) {
   for (const Row& row : *rows) {
     std::cout << std::setw(kNumberTitle.size()) << row.number << "  " << padded(row.name) << "  "
               << row.mountPoint;
-    if (row.numberByName != row.number) {
+    if (row.numberByName && *row.numberByName != row.number) {
       std::cout << "  (the first volume of this name answers to it)";
     }
     std::cout << '\n';
   }
-  return std::cout.flush() ? 0 : 1;
+  if (std::cout.flush()) return 0;
+  std::cerr << "tallowmere-cli: the output could not be written\n";
+  return 1;
 }
 
 }  // namespace tallowmere::cli

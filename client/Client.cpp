@@ -1,5 +1,6 @@
 #include "client/Client.h"
 
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <array>
@@ -20,7 +21,9 @@ constexpr std::size_t kLongestText = 65534;
 constexpr std::string_view kProgramName = "tallowmere";
 
 bool IsProgram(const std::string& path) {
-  return access(path.c_str(), X_OK) == 0;
+  struct stat about {};
+  return stat(path.c_str(), &about) == 0 && S_ISREG(about.st_mode) &&
+         access(path.c_str(), X_OK) == 0;
 }
 
 std::string BesideThisProgram() {

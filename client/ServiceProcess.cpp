@@ -17,8 +17,8 @@
 namespace tallowmere {
 namespace {
 
-constexpr int kMillisecondsToEnd = 1000;
-constexpr long kLongestPoll = 60'000;  // milliseconds; a later deadline takes several
+constexpr std::chrono::seconds kTimeToEnd{1};
+constexpr std::chrono::milliseconds kLongestPoll{60'000};  // a later deadline takes several
 
 std::string MessageOf(int errorNumber) {
   return std::generic_category().message(errorNumber);
@@ -26,6 +26,16 @@ std::string MessageOf(int errorNumber) {
 
 void CloseIfOpen(int& descriptor) {
   if (descriptor >= 0) close(std::exchange(descriptor, -1));
+}
+
+// Moves a descriptor above the standard ones: what a program prints that has closed those must not
+// reach the service.
+bool MoveUp(int& descriptor) {
+  if (descriptor > STDERR_FILENO) return true;
+  const int moved = fcntl(descriptor, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+  if (moved < 0) return false;
+  close(std::exchange(descriptor, moved));
+  return true;
 }
 
 struct Pipe {
@@ -40,23 +50,12 @@ struct Pipe {
     CloseIfOpen(writeEnd);
   }
 
-  // Both ends above the standard descriptors, which the child replaces one after the other: an end
-  // that stood there (in a program that has closed them) would be lost on the way.
   bool Open() {
     int ends[2];
     if (pipe2(ends, O_CLOEXEC) != 0) return false;
     readEnd = ends[0];
     writeEnd = ends[1];
     return MoveUp(readEnd) && MoveUp(writeEnd);
-  }
-
- private:
-  static bool MoveUp(int& end) {
-    if (end > STDERR_FILENO) return true;
-    const int moved = fcntl(end, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
-    if (moved < 0) return false;
-    close(std::exchange(end, moved));
-    return true;
   }
 };
 
@@ -108,15 +107,20 @@ Error Ended() {
   return {"the service ended before it answered"};
 }
 
-// Waits until the descriptor can be read or written. None: it can, or its other end is closed.
+// For poll: at least 0, at most kLongestPoll.
+int MillisecondsUntil(Deadline deadline) {
+  const auto left =
+      std::chrono::ceil<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now());
+  return static_cast<int>(std::clamp(left, std::chrono::milliseconds(0), kLongestPoll).count());
+}
+
+// Waits until the descriptor can be read or written, or its other end is closed.
 Result<std::monostate> WaitFor(int descriptor, short events, Deadline deadline) {
   while (true) {
-    const auto left =
-        std::chrono::ceil<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now());
-    if (left.count() <= 0) return Error{"the service did not answer in time"};
+    const int left = MillisecondsUntil(deadline);
+    if (left == 0) return Error{"the service did not answer in time"};
     pollfd awaited{descriptor, events, 0};
-    const int ready =
-        poll(&awaited, 1, static_cast<int>(std::min<long>(left.count(), kLongestPoll)));
+    const int ready = poll(&awaited, 1, left);
     if (ready > 0) return std::monostate{};
     if (ready < 0 && errno != EINTR) return Error{"poll failed: " + MessageOf(errno)};
   }
@@ -139,15 +143,18 @@ Result<ServiceProcess> ServiceProcess::Start(const std::string& path) {
   if (const int error = Spawn(path, requests.readEnd, responses.writeEnd, process)) {
     return Error{"the service " + path + " could not be started: " + MessageOf(error)};
   }
-  return ServiceProcess(process, std::exchange(requests.writeEnd, -1),
+  int watch = static_cast<int>(syscall(SYS_pidfd_open, process, 0));
+  if (watch >= 0) MoveUp(watch);
+  return ServiceProcess(process, watch, std::exchange(requests.writeEnd, -1),
                         std::exchange(responses.readEnd, -1));
 }
 
-ServiceProcess::ServiceProcess(pid_t process, int requests, int responses)
-    : mProcess(process), mRequests(requests), mResponses(responses) {}
+ServiceProcess::ServiceProcess(pid_t process, int watch, int requests, int responses)
+    : mProcess(process), mWatch(watch), mRequests(requests), mResponses(responses) {}
 
 ServiceProcess::ServiceProcess(ServiceProcess&& other) noexcept
     : mProcess(std::exchange(other.mProcess, -1)),
+      mWatch(std::exchange(other.mWatch, -1)),
       mRequests(std::exchange(other.mRequests, -1)),
       mResponses(std::exchange(other.mResponses, -1)),
       mReceived(std::move(other.mReceived)) {}
@@ -156,6 +163,7 @@ ServiceProcess& ServiceProcess::operator=(ServiceProcess&& other) noexcept {
   if (this != &other) {
     End();
     mProcess = std::exchange(other.mProcess, -1);
+    mWatch = std::exchange(other.mWatch, -1);
     mRequests = std::exchange(other.mRequests, -1);
     mResponses = std::exchange(other.mResponses, -1);
     mReceived = std::move(other.mReceived);
@@ -167,15 +175,21 @@ ServiceProcess::~ServiceProcess() {
   End();
 }
 
+// Without a watch the process has been waited for by somebody else in this program (who ignores the
+// signal of a child's end, say), and its id may be another's by now.
 void ServiceProcess::End() {
   CloseIfOpen(mRequests);
   CloseIfOpen(mResponses);
-  if (mProcess < 0) return;
-  int process = static_cast<int>(syscall(SYS_pidfd_open, mProcess, 0));
-  pollfd ended{process, POLLIN, 0};
-  if (poll(&ended, 1, kMillisecondsToEnd) != 1) kill(mProcess, SIGKILL);
-  CloseIfOpen(process);
-  waitpid(mProcess, nullptr, 0);
+  if (mWatch >= 0) {
+    pollfd ended{mWatch, POLLIN, 0};
+    const auto deadline = std::chrono::steady_clock::now() + kTimeToEnd;
+    while (poll(&ended, 1, MillisecondsUntil(deadline)) < 0 && errno == EINTR) {
+    }
+    syscall(SYS_pidfd_send_signal, mWatch, SIGKILL, nullptr, 0);
+    while (waitpid(mProcess, nullptr, 0) < 0 && errno == EINTR) {
+    }
+  }
+  CloseIfOpen(mWatch);
   mProcess = -1;
 }
 

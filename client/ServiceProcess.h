@@ -33,10 +33,11 @@ class ServiceProcess {
   Result<std::string> Receive(std::size_t size, Deadline deadline);
 
  private:
-  ServiceProcess(pid_t process, int requests, int responses);
+  ServiceProcess(pid_t process, int watch, int requests, int responses);
   void End();
 
   pid_t mProcess;         // -1 when moved from
+  int mWatch;             // tells the process's end, and the process from a later one with its id
   int mRequests;          // written to by us, not blocking
   int mResponses;         // read from by us, not blocking
   std::string mReceived;  // read but not yet asked for

@@ -15,9 +15,10 @@ need() {
   fi
   echo "== Installing ${missing[*]}"
   export DEBIAN_FRONTEND=noninteractive
+  mkdir -p build
   if ! { apt-get update -qq && apt-get install -qq -y --no-install-recommends "${missing[@]}"; } \
-       >/tmp/tallowmere-apt.log 2>&1; then
-    cat /tmp/tallowmere-apt.log >&2
+       >build/apt.log 2>&1; then
+    cat build/apt.log >&2
     echo "apt-get could not install the packages." >&2
     exit 1
   fi

@@ -108,6 +108,18 @@ FolderIndex& IndexOf(const VolumePointer& volume) {
   return indexes.emplace_back(volume);
 }
 
+// The root folder where it is now. The kernel does not signal that a folder above it was renamed.
+std::optional<Place> RootOf(const VolumePointer& volume) {
+  for (VolumePointer current = volume; current;) {
+    auto place = PlaceAt(current->MountPoint());
+    if (place && AreEqual(place->item, *volume->Root()) && IsOnVolume(volume, *place)) return place;
+    if (current != volume) break;
+    MountTable::OfThisProcess().Distrust();
+    current = MountTable::OfThisProcess().WithNumber(volume->Number());
+  }
+  return std::nullopt;
+}
+
 // The item at the path if it is the one with the id.
 std::optional<Place> WithID(const VolumePointer& volume, std::uint32_t id, bool folder,
                             const Path& path) {
@@ -178,7 +190,7 @@ std::optional<std::string> FindPlace(const ItemReference& item) {
 
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder) {
   if (!volume->Root()) return std::nullopt;
-  if (id == kRootFolderID) return Place{volume->MountPoint(), *volume->Root()};
+  if (id == kRootFolderID) return RootOf(volume);
 
   std::optional<Place> place;
   if (IsInodeNumber(id)) {

@@ -127,8 +127,10 @@ OSErr FSpMakeFSRef(const FSSpec* spec, FSRef* newRef) {
     if (spec->parID == static_cast<SInt32>(kParentOfRootID)) {
       const VolumePointer volume = MountTable::OfThisProcess().WithNumber(spec->vRefNum);
       if (!volume) return nsvErr;
-      if (volume->Name() != name || !volume->Root()) return fnfErr;
-      return GiveReference({volume->MountPoint(), *volume->Root()}, newRef);
+      if (volume->Name() != name) return fnfErr;
+      const auto root = FindItem(volume, kRootFolderID, true);
+      if (!root) return fnfErr;
+      return GiveReference(*root, newRef);
     }
     Folder folder;
     const auto id = static_cast<UInt32>(spec->parID);

@@ -25,6 +25,29 @@ constexpr auto kKernelInterfaces = std::to_array<std::string_view>({
 });
 static_assert(std::is_sorted(kKernelInterfaces.begin(), kKernelInterfaces.end()));
 
+// Sorted; FUSE has many names of its own, all beginning so.
+constexpr auto kServed = std::to_array<std::string_view>({
+    "9p",
+    "afs",
+    "beegfs",
+    "ceph",
+    "cifs",
+    "coda",
+    "gfs2",
+    "lustre",
+    "ncpfs",
+    "nfs",
+    "nfs4",
+    "ocfs2",
+    "orangefs",
+    "smb3",
+    "smbfs",
+    "vboxsf",
+    "virtiofs",
+    "vmhgfs",
+});
+static_assert(std::is_sorted(kServed.begin(), kServed.end()));
+
 // Takes the text up to the next `separator` off the front of `rest`.
 std::string_view TakeUntil(std::string_view& rest, char separator) {
   const std::size_t end = rest.find(separator);
@@ -87,63 +110,80 @@ std::optional<Mount> ParseLine(std::string_view line) {
   return Mount{*id, *parent, *device, Unescape(root), Unescape(mountPoint), Unescape(type)};
 }
 
-// Which mounts stand on which, for asking what covers a path.
-class Coverings {
+// Which mounts stand on which, for asking what a path comes upon.
+class Ways {
  public:
-  explicit Coverings(const std::vector<Mount>& mounts) : mMounts(mounts) {
+  Ways(const std::vector<Mount>& mounts, int rootID)
+      : mMounts(mounts), mRootID(rootID), mState(mounts.size(), State::kUnknown) {
     for (std::size_t i = 0; i < mounts.size(); ++i) {
       mByID.emplace(mounts[i].id, i);
-      if (IsItsOwnParent(mounts[i])) continue;
+      if (mounts[i].mountPoint == "/") continue;
       // Of two mounts on one place of one parent the kernel finds the later one.
       mByPlace.insert_or_assign({mounts[i].parent, mounts[i].mountPoint}, i);
     }
   }
 
-  bool Reachable(std::size_t index) { return OnTheWay(index) && !CoveredAtItsRoot(index); }
+  bool IsRoot(std::size_t index) const { return mMounts[index].id == mRootID; }
+
+  bool IsReachable(std::size_t index) {
+    return IsOnTheWay(index) && !mByPlace.contains({mMounts[index].id, mMounts[index].mountPoint});
+  }
+
+  // Whether a server has to answer on the way to the mount or at its end.
+  bool NeedsServer(std::size_t index) const {
+    for (std::size_t steps = 0; steps <= mMounts.size(); ++steps) {
+      if (NeedsAServer(mMounts[index].type)) return true;
+      const auto parent = mByID.find(mMounts[index].parent);
+      if (IsRoot(index) || parent == mByID.end()) return false;
+      index = parent->second;
+    }
+    return true;
+  }
 
  private:
+  enum class State : char { kUnknown, kOnTheWay, kHidden };
+
   // Whether the way from the parent's mount point to this mount's own leads to this mount, and the
-  // same for each mount further up.
-  bool OnTheWay(std::size_t index) {
-    const auto known = mOnTheWay.find(index);
-    if (known != mOnTheWay.end()) return known->second;
-    mOnTheWay[index] = true;  // ends the walk in a table where mounts are each other's ancestors
-    const bool result =
-        IsItsOwnParent(mMounts[index]) || (!CoveredFurtherUp(index) && ParentOnTheWay(index));
-    mOnTheWay[index] = result;
-    return result;
-  }
-
-  // Whether another mount stands on this one's own root.
-  bool CoveredAtItsRoot(std::size_t index) const {
-    const auto cover = mByPlace.find({mMounts[index].id, mMounts[index].mountPoint});
-    return cover != mByPlace.end() && cover->second != index;
-  }
-
-  // As the first mount of a system is.
-  static bool IsItsOwnParent(const Mount& mount) { return mount.parent == mount.id; }
-
-  bool ParentOnTheWay(std::size_t index) {
-    const auto parent = mByID.find(mMounts[index].parent);
-    return parent == mByID.end() || OnTheWay(parent->second);
-  }
-
-  bool CoveredFurtherUp(std::size_t index) const {
-    const Mount& mount = mMounts[index];
-    std::string path = mount.mountPoint;
+  // same for each mount further up. Parents that are missing from the table are taken for
+  // reachable.
+  bool IsOnTheWay(std::size_t index) {
+    std::vector<std::size_t> chain;
+    bool onTheWay = true;
     while (true) {
+      if (mState[index] != State::kUnknown) {
+        onTheWay = mState[index] == State::kOnTheWay;
+        break;
+      }
+      mState[index] = State::kHidden;  // ends the walk where mounts are each other's ancestors
+      chain.push_back(index);
+      const auto parent = mByID.find(mMounts[index].parent);
+      if (IsRoot(index) || parent == mByID.end()) break;
+      index = parent->second;
+    }
+    for (auto step = chain.rbegin(); step != chain.rend(); ++step) {
+      onTheWay = IsRoot(*step) || (onTheWay && !IsCovered(*step));
+      mState[*step] = onTheWay ? State::kOnTheWay : State::kHidden;
+    }
+    return onTheWay;
+  }
+
+  // Whether the parent's way to the mount comes upon another mount first, at the mount point itself
+  // or further up. A mount over the root is come upon by nobody.
+  bool IsCovered(std::size_t index) const {
+    const Mount& mount = mMounts[index];
+    for (std::string path = mount.mountPoint; path != "/";) {
       const auto found = mByPlace.find({mount.parent, path});
       if (found != mByPlace.end() && found->second != index) return true;
-      if (path == "/") return false;
-      const std::size_t slash = path.rfind('/');
-      path.resize(std::max<std::size_t>(slash, 1));
+      path.resize(std::max<std::size_t>(path.rfind('/'), 1));
     }
+    return mount.mountPoint == "/";
   }
 
   const std::vector<Mount>& mMounts;
+  int mRootID;
+  std::vector<State> mState;
   std::unordered_map<int, std::size_t> mByID;
   std::map<std::pair<int, std::string>, std::size_t> mByPlace;
-  std::unordered_map<std::size_t, bool> mOnTheWay;
 };
 
 }  // namespace
@@ -160,35 +200,40 @@ bool HoldsFiles(std::string_view fileSystemType) {
   return !std::binary_search(kKernelInterfaces.begin(), kKernelInterfaces.end(), fileSystemType);
 }
 
+bool NeedsAServer(std::string_view fileSystemType) {
+  return fileSystemType.starts_with("fuse") ||
+         std::binary_search(kServed.begin(), kServed.end(), fileSystemType);
+}
+
 std::vector<std::vector<std::size_t>> GroupIntoVolumes(
-    const std::vector<Mount>& mounts, const std::function<bool(const Mount&)>& isFolder) {
-  Coverings coverings(mounts);
+    const std::vector<Mount>& mounts, int rootID,
+    const std::function<bool(const Mount&)>& isFolder) {
+  Ways ways(mounts, rootID);
   std::map<dev_t, std::vector<std::size_t>> fileSystems;
-  std::optional<dev_t> rootDevice;
   for (std::size_t i = 0; i < mounts.size(); ++i) {
-    if (!coverings.Reachable(i)) continue;
-    const bool isRoot = mounts[i].mountPoint == "/";
-    if (isRoot) rootDevice = mounts[i].device;
-    if (isRoot || HoldsFiles(mounts[i].type)) fileSystems[mounts[i].device].push_back(i);
+    const bool counts = ways.IsRoot(i) || HoldsFiles(mounts[i].type);
+    if (counts && ways.IsReachable(i)) fileSystems[mounts[i].device].push_back(i);
   }
 
+  const auto isRoot = [&](std::size_t i) { return ways.IsRoot(i); };
+  const auto showsRootFolder = [&](std::size_t i) { return mounts[i].root == "/"; };
+  const auto showsFolder = [&](std::size_t i) {
+    return ways.NeedsServer(i) || isFolder(mounts[i]);
+  };
   std::vector<std::vector<std::size_t>> volumes;
   for (auto& [device, indexes] : fileSystems) {
-    auto place = std::find_if(indexes.begin(), indexes.end(),
-                              [&](std::size_t i) { return mounts[i].root == "/"; });
+    auto place = std::find_if(indexes.begin(), indexes.end(), isRoot);
     if (place == indexes.end()) {
-      place = std::find_if(indexes.begin(), indexes.end(), [&](std::size_t i) {
-        return mounts[i].mountPoint == "/" || isFolder(mounts[i]);
-      });
+      place = std::find_if(indexes.begin(), indexes.end(), showsRootFolder);
     }
+    if (place == indexes.end()) place = std::find_if(indexes.begin(), indexes.end(), showsFolder);
     if (place == indexes.end()) continue;
     std::rotate(indexes.begin(), place, place + 1);
     volumes.push_back(std::move(indexes));
   }
   std::sort(volumes.begin(), volumes.end(), [&](const auto& a, const auto& b) {
-    const bool aHasRoot = mounts[a.front()].device == rootDevice;
-    const bool bHasRoot = mounts[b.front()].device == rootDevice;
-    return aHasRoot != bHasRoot ? aHasRoot : a.front() < b.front();
+    if (isRoot(a.front()) != isRoot(b.front())) return isRoot(a.front());
+    return a.front() < b.front();
   });
   return volumes;
 }

@@ -36,22 +36,18 @@ bool IsFolder(const Mount& mount) {
          S_ISDIR(about.stx_mode);
 }
 
-// The mount of "/" where the table does not tell: there is no table, or "/" is a folder inside a
-// mount (chroot).
-Mount RootMount() {
-  Mount root{};
-  root.mountPoint = "/";
-  struct statx about {};
-  if (statx(AT_FDCWD, "/", kWithoutWaiting, STATX_TYPE | STATX_MNT_ID, &about) == 0) {
-    root.device = makedev(about.stx_dev_major, about.stx_dev_minor);
-    if ((about.stx_mask & STATX_MNT_ID) != 0) root.id = static_cast<int>(about.stx_mnt_id);
-  }
-  return root;
+bool HasMount(const std::vector<Mount>& mounts, int id) {
+  return std::any_of(mounts.begin(), mounts.end(),
+                     [id](const Mount& mount) { return mount.id == id; });
 }
 
-bool HasRoot(const std::vector<Mount>& mounts) {
-  return std::any_of(mounts.begin(), mounts.end(),
-                     [](const Mount& mount) { return mount.mountPoint == "/"; });
+// The table's own mount at "/", where the kernel reports no mount ids: the lowest of a stack.
+std::optional<int> LowestRoot(const std::vector<Mount>& mounts) {
+  for (const Mount& mount : mounts) {
+    const bool isLowest = mount.parent == mount.id || !HasMount(mounts, mount.parent);
+    if (mount.mountPoint == "/" && isLowest) return mount.id;
+  }
+  return std::nullopt;
 }
 
 bool IsWithin(std::string_view path, std::string_view folder) {
@@ -101,18 +97,30 @@ MountTable& MountTable::OfThisProcess() {
   return table;
 }
 
-MountTable::MountTable(std::string source) : mSource(std::move(source)) {}
+Mount MountTable::ReadRootMount() {
+  Mount root{};
+  root.mountPoint = "/";
+  struct statx about {};
+  if (statx(AT_FDCWD, "/", kWithoutWaiting, STATX_TYPE | STATX_MNT_ID, &about) == 0) {
+    root.device = makedev(about.stx_dev_major, about.stx_dev_minor);
+    if ((about.stx_mask & STATX_MNT_ID) != 0) root.id = static_cast<int>(about.stx_mnt_id);
+  }
+  return root;
+}
+
+MountTable::MountTable(std::string source, Mount (*readRoot)())
+    : mSource(std::move(source)), mReadRoot(readRoot) {}
 
 VolumePointer MountTable::AtIndex(std::size_t index) {
   const bool goesOn = mLastIndex && index == *mLastIndex + 1;
   if (!goesOn) Refresh();
   mLastIndex = index;
-  return index < mVolumes.size() ? mVolumes[index] : nullptr;
+  return index < mState.volumes.size() ? mState.volumes[index] : nullptr;
 }
 
 VolumePointer MountTable::WithNumber(VolumeNumber number) {
   Refresh();
-  if (number == 0) return mVolumes.front();
+  if (number == 0) return mState.volumes.front();
   return FirstWith([number](const Volume& volume) { return volume.Number() == number; });
 }
 
@@ -130,14 +138,14 @@ VolumePointer MountTable::OfItem(const ItemReference& item, std::string_view pat
     return volume ? volume : OfPath(path);
   }
   Refresh();
-  const auto found = mByMount.find(item.mount);
-  return found == mByMount.end() ? nullptr : found->second;
+  const auto found = mState.byMount.find(item.mount);
+  return found == mState.byMount.end() ? nullptr : found->second;
 }
 
 VolumePointer MountTable::OfPath(std::string_view path) {
   Refresh();
   VolumePointer longest;
-  for (const VolumePointer& volume : mVolumes) {
+  for (const VolumePointer& volume : mState.volumes) {
     if (!IsWithin(path, volume->MountPoint())) continue;
     if (!longest || volume->MountPoint().size() > longest->MountPoint().size()) longest = volume;
   }
@@ -146,54 +154,63 @@ VolumePointer MountTable::OfPath(std::string_view path) {
 
 template <class Predicate>
 VolumePointer MountTable::FirstWith(Predicate predicate) const {
-  const auto found = std::find_if(mVolumes.begin(), mVolumes.end(),
+  const auto found = std::find_if(mState.volumes.begin(), mState.volumes.end(),
                                   [&](const VolumePointer& volume) { return predicate(*volume); });
-  return found == mVolumes.end() ? nullptr : *found;
+  return found == mState.volumes.end() ? nullptr : *found;
 }
 
 void MountTable::Refresh() {
-  if (!IsCurrent()) Read();
+  if (!mIsCurrent || HasChanged()) Read();
 }
 
-bool MountTable::IsCurrent() const {
-  if (!mDescriptor.IsOpen()) return false;
+bool MountTable::HasChanged() const {
   pollfd table{mDescriptor.Get(), POLLPRI, 0};
-  return poll(&table, 1, 0) == 0;
+  return poll(&table, 1, 0) != 0;
 }
 
 void MountTable::Read() {
+  mIsCurrent = false;
   mLastIndex.reset();
   std::vector<Mount> mounts;
-  for (int attempt = 0; attempt < kReadAttempts; ++attempt) {
+  bool isWhole = false;
+  for (int attempt = 0; attempt < kReadAttempts && !isWhole; ++attempt) {
     const auto text = ReadSource();
-    mounts = text ? ParseMountInfo(*text) : std::vector<Mount>{};
+    if (!text) break;
+    mounts = ParseMountInfo(*text);
     // The text comes in several pieces; a mount made between two of them can be missing or shift
-    // others out. The kernel has signalled it, so a table that is current now was whole.
-    if (!text || IsCurrent()) break;
+    // others out. The kernel has signalled it by now, and signals it only once.
+    isWhole = !HasChanged();
   }
-  if (!HasRoot(mounts)) mounts.insert(mounts.begin(), RootMount());
-
-  MakeVolumes(mounts);
+  const Mount root = mReadRoot();
+  int rootID = root.id;
+  if (!HasMount(mounts, rootID)) {
+    // There is no table, or "/" is a folder inside a mount (chroot), or the kernel tells no ids.
+    const auto lowest = rootID == 0 ? LowestRoot(mounts) : std::nullopt;
+    if (!lowest) mounts.insert(mounts.begin(), root);
+    rootID = lowest.value_or(root.id);
+  }
+  mState = StateOf(mounts, rootID);
+  mIsCurrent = isWhole;
 }
 
-void MountTable::MakeVolumes(const std::vector<Mount>& mounts) {
-  mVolumes.clear();
-  mByMount.clear();
-  mMountPoints.clear();
-  mHolders.clear();
+MountTable::State MountTable::StateOf(const std::vector<Mount>& mounts, int rootID) {
+  State state;
+  std::unordered_set<int> mountIDs;
   for (const Mount& mount : mounts) {
-    mMountPoints.insert(mount.mountPoint);
-    mHolders.insert(
-        mount.mountPoint.substr(0, std::max<std::size_t>(mount.mountPoint.rfind('/'), 1)));
+    const std::size_t slash = mount.mountPoint.rfind('/');
+    state.mountPoints.insert(mount.mountPoint);
+    state.holders.insert(mount.mountPoint.substr(0, std::max<std::size_t>(slash, 1)));
+    mountIDs.insert(mount.id);
   }
-  for (const auto& indexes : GroupIntoVolumes(mounts, IsFolder)) {
+  for (const auto& indexes : GroupIntoVolumes(mounts, rootID, IsFolder)) {
     std::vector<Mount> own;
     for (const std::size_t index : indexes) own.push_back(mounts[index]);
-    const auto number = NumberOf(own.front(), mounts);
+    const auto number = NumberOf(own.front().id, mountIDs);
     if (!number) continue;
-    mVolumes.push_back(std::make_shared<Volume>(*number, own));
-    for (const Mount& mount : own) mByMount[mount.id] = mVolumes.back();
+    state.volumes.push_back(std::make_shared<Volume>(*number, own));
+    for (const Mount& mount : own) state.byMount[mount.id] = state.volumes.back();
   }
+  return state;
 }
 
 // None, and the descriptor closed, when it cannot be opened or read whole.
@@ -213,25 +230,17 @@ std::optional<std::string> MountTable::ReadSource() {
 }
 
 // None when every number is taken.
-std::optional<VolumeNumber> MountTable::NumberOf(const Mount& place,
-                                                 const std::vector<Mount>& mounts) {
-  const auto assigned = mAssignedNumbers.find(place.id);
+std::optional<VolumeNumber> MountTable::NumberOf(int mountID,
+                                                 const std::unordered_set<int>& mountIDs) {
+  const auto assigned = mAssignedNumbers.find(mountID);
   if (assigned != mAssignedNumbers.end()) return assigned->second;
-
-  const auto isAssigned = [this](int number) {
-    return std::any_of(mAssignedNumbers.begin(), mAssignedNumbers.end(),
-                       [number](const auto& entry) { return entry.second == number; });
-  };
-  if (place.id > 0 && -place.id >= kLowestNumber && !isAssigned(-place.id)) {
-    return static_cast<VolumeNumber>(-place.id);
+  if (mountID > 0 && -mountID >= kLowestNumber && !mTakenNumbers.contains(-mountID)) {
+    return static_cast<VolumeNumber>(-mountID);
   }
-  const auto isMountID = [&mounts](int id) {
-    return std::any_of(mounts.begin(), mounts.end(),
-                       [id](const Mount& mount) { return mount.id == id; });
-  };
   for (int number = kLowestNumber; number < 0; ++number) {
-    if (isAssigned(number) || isMountID(-number)) continue;
-    mAssignedNumbers[place.id] = static_cast<VolumeNumber>(number);
+    if (mTakenNumbers.contains(number) || mountIDs.contains(-number)) continue;
+    mTakenNumbers.insert(number);
+    mAssignedNumbers[mountID] = static_cast<VolumeNumber>(number);
     return static_cast<VolumeNumber>(number);
   }
   return std::nullopt;

@@ -66,8 +66,13 @@ class MountTable {
  public:
   static MountTable& OfThisProcess();
 
-  // `source` is a file with the text that /proc/self/mountinfo has.
-  explicit MountTable(std::string source = "/proc/self/mountinfo");
+  // The mount that the process's root is in, as the kernel tells without the table.
+  static Mount ReadRootMount();
+
+  // `source` is a file with the text that /proc/self/mountinfo has, `readRoot` tells the mount at
+  // the process's root.
+  explicit MountTable(std::string source = "/proc/self/mountinfo",
+                      Mount (*readRoot)() = ReadRootMount);
 
   // The volumes in their order, "/" first; there is always one. `index` counts from 0. Null past
   // the last one. A walk 0, 1, 2, … sees one state of the table: going on from the last asked index
@@ -91,27 +96,40 @@ class MountTable {
 
   // Whether something, a volume or not, is mounted at a path, or at a name in the folder with that
   // path, in the state last looked at.
-  bool IsMountPoint(const std::string& path) const { return mMountPoints.contains(path); }
-  bool HoldsMountPoint(const std::string& path) const { return mHolders.contains(path); }
+  bool IsMountPoint(const std::string& path) const { return mState.mountPoints.contains(path); }
+  bool HoldsMountPoint(const std::string& path) const { return mState.holders.contains(path); }
+
+  // Makes the next question read the table whatever the kernel has signalled: a place was found not
+  // to be where the table says, as the kernel does not signal that a mount point was renamed.
+  void Distrust() { mIsCurrent = false; }
 
  private:
+  // What one reading of the table gave.
+  struct State {
+    std::vector<VolumePointer> volumes;
+    std::unordered_map<int, VolumePointer> byMount;  // by mount id
+    std::unordered_set<std::string> mountPoints;     // of every line of the table
+    std::unordered_set<std::string> holders;         // the folders that hold those
+  };
+
   void Refresh();
-  bool IsCurrent() const;
+  bool HasChanged() const;
   void Read();
-  void MakeVolumes(const std::vector<Mount>& mounts);
+  std::optional<std::string> ReadSource();
+  State StateOf(const std::vector<Mount>& mounts, int rootID);
+  std::optional<VolumeNumber> NumberOf(int mountID, const std::unordered_set<int>& mountIDs);
   template <class Predicate>
   VolumePointer FirstWith(Predicate predicate) const;
-  std::optional<std::string> ReadSource();
-  std::optional<VolumeNumber> NumberOf(const Mount& place, const std::vector<Mount>& mounts);
 
   std::string mSource;
-  Descriptor mDescriptor;  // open while mVolumes came from it
-  std::vector<VolumePointer> mVolumes;
-  std::unordered_map<int, VolumePointer> mByMount;  // by mount id
-  std::unordered_set<std::string> mMountPoints;     // of every line of the table
-  std::unordered_set<std::string> mHolders;         // the folders that hold those
-  std::optional<std::size_t> mLastIndex;            // of a walk by AtIndex
-  std::map<int, VolumeNumber> mAssignedNumbers;  // by mount id, where minus the id does not serve
+  Mount (*mReadRoot)();
+  Descriptor mDescriptor;  // open while the state came from it
+  State mState;
+  bool mIsCurrent = false;                // as far as nothing was signalled since
+  std::optional<std::size_t> mLastIndex;  // of a walk by AtIndex
+  // Where minus the mount id does not serve: the numbers by mount id, and which are taken so.
+  std::map<int, VolumeNumber> mAssignedNumbers;
+  std::unordered_set<int> mTakenNumbers;
 };
 
 }  // namespace tallowmere::files

@@ -2,11 +2,12 @@
 
 #include "files/MountTable.h"
 #include "files/PascalName.h"
+#include "foundation/NoThrow.h"
+
+using namespace tallowmere::files;
+using tallowmere::foundation::OrError;
 
 namespace {
-
-using tallowmere::files::MountTable;
-using tallowmere::files::VolumePointer;
 
 VolumePointer VolumeFor(long index, SInt16 number) {
   MountTable& table = MountTable::OfThisProcess();
@@ -17,17 +18,21 @@ VolumePointer VolumeFor(long index, SInt16 number) {
 }  // namespace
 
 OSErr PBHGetVInfoSync(HParmBlkPtr paramBlock) {
-  HVolumeParam& block = paramBlock->volumeParam;
-  const VolumePointer volume = VolumeFor(block.ioVolIndex, block.ioVRefNum);
-  if (!volume) return nsvErr;
-  if (block.ioNamePtr != nullptr) tallowmere::files::CopyToPascal(volume->Name(), block.ioNamePtr);
-  block.ioVRefNum = volume->Number();
-  return noErr;
+  return OrError([&]() -> OSErr {
+    HVolumeParam& block = paramBlock->volumeParam;
+    const VolumePointer volume = VolumeFor(block.ioVolIndex, block.ioVRefNum);
+    if (!volume) return nsvErr;
+    if (block.ioNamePtr != nullptr) CopyToPascal(volume->Name(), block.ioNamePtr);
+    block.ioVRefNum = volume->Number();
+    return noErr;
+  });
 }
 
 OSErr PBGetVolumeInfoSync(FSVolumeInfoParamPtr paramBlock) {
-  const VolumePointer volume = VolumeFor(paramBlock->volumeIndex, paramBlock->ioVRefNum);
-  if (!volume) return nsvErr;
-  paramBlock->ioVRefNum = volume->Number();
-  return noErr;
+  return OrError([&]() -> OSErr {
+    const VolumePointer volume = VolumeFor(paramBlock->volumeIndex, paramBlock->ioVRefNum);
+    if (!volume) return nsvErr;
+    paramBlock->ioVRefNum = volume->Number();
+    return noErr;
+  });
 }

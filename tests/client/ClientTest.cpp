@@ -1,3 +1,4 @@
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <signal.h>
@@ -131,14 +132,38 @@ TEST(Client, AServiceThatDoesNotEndByItselfIsKilled) {
   EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);
 }
 
-TEST(Client, StartsWithTheStandardDescriptorsClosed) {
+TEST(Client, TakesNoStandardDescriptorThatItsProgramHasClosed) {
   const pid_t child = fork();
   if (child == 0) {
     close(0);
     close(1);
     auto client = StartClient();
     const bool works = client && client->GetHFSVolumeName(0);
-    _exit(works ? 0 : 1);
+    // What such a program prints by mistake must not reach the service.
+    const bool untouched = write(1, "x", 1) == -1 && fcntl(0, F_GETFD) == -1;
+    _exit(works && untouched ? 0 : 1);
+  }
+  int status = -1;
+  waitpid(child, &status, 0);
+  EXPECT_EQ(status, 0);
+}
+
+TEST(Client, TellsTheServiceItsOwnProcessID) {
+  const TemporaryFolder folder;
+  EXPECT_EQ(FailureOfFirstRequest(
+                Impostor(folder, "test $1 = $PPID && printf '\\000\\001\\000\\000MWLT'; sleep 1")),
+            "");
+}
+
+TEST(Client, LeavesAProgramThatIgnoresTheEndOfItsChildrenAlone) {
+  const pid_t child = fork();
+  if (child == 0) {
+    signal(SIGCHLD, SIG_IGN);
+    {
+      auto client = StartClient();
+      if (!client || !client->GetHFSVolumeName(0)) _exit(1);
+    }
+    _exit(0);
   }
   int status = -1;
   waitpid(child, &status, 0);

@@ -35,20 +35,23 @@ TEST(Lifetime, FurtherArgumentsAreIgnored) {
   EXPECT_EQ(service.Wait(), 0);
 }
 
-// Each of these names something that exists for kill: this process group, every process, or this
-// process. The service then serves request after request.
-class ArgumentThatNamesAProcess : public testing::TestWithParam<std::string> {};
+// Each of these names something that exists for kill: this process group, every process, or (as P)
+// this process. The service then serves request after request.
+class ArgumentThatNamesAProcess : public testing::TestWithParam<const char*> {};
 
 TEST_P(ArgumentThatNamesAProcess, KeepsTheServiceServing) {
-  Service service(GetParam());
+  std::string argument = GetParam();
+  if (const auto place = argument.find('P'); place != std::string::npos) {
+    argument.replace(place, 1, std::to_string(getpid()));
+  }
+  Service service(argument);
   for (int i = 0; i < 3; ++i) ASSERT_EQ(service.Ask(kAnyRequest, 8), kItsResponse);
   service.Write(kQuit);
   EXPECT_EQ(service.Wait(), 0);
 }
 
 INSTANTIATE_TEST_SUITE_P(Lifetime, ArgumentThatNamesAProcess,
-                         testing::Values("abc", "-1", "", "0", " " + std::to_string(getpid()) + "x",
-                                         "\t+" + std::to_string(getpid())));
+                         testing::Values("abc", "-1", "", "0", " Px", "\t+P"));
 
 TEST(Lifetime, ANumberEndsAtTheFirstCharacterThatIsNoDigit) {
   Service service(" " + IDOfNoProcess() + "x");

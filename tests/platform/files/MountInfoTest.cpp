@@ -11,12 +11,21 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;
 
+// The lowest mount at "/".
+int RootIDOf(const std::vector<Mount>& mounts) {
+  for (const Mount& mount : mounts) {
+    if (mount.mountPoint == "/") return mount.id;
+  }
+  return 0;
+}
+
 // The mount points of the volumes' places. Every mount but a path that ends in "file" is a folder.
 std::vector<std::string> PlacesIn(std::string_view table) {
   const std::vector<Mount> mounts = ParseMountInfo(table);
   std::vector<std::string> places;
-  for (const auto& volume : GroupIntoVolumes(
-           mounts, [](const Mount& mount) { return !mount.mountPoint.ends_with("file"); })) {
+  for (const auto& volume : GroupIntoVolumes(mounts, RootIDOf(mounts), [](const Mount& mount) {
+         return !mount.mountPoint.ends_with("file");
+       })) {
     places.push_back(mounts[volume.front()].mountPoint);
   }
   return places;
@@ -118,11 +127,11 @@ TEST(MountInfo, TheFileSystemsRootFolderIsThePlaceBeforeAnEarlierMountOfAFolder)
               ElementsAre("/", "/mnt/all"));
 }
 
-TEST(MountInfo, TheVolumeOfTheRootComesFirstEvenWhenItsPlaceIsElsewhere) {
+TEST(MountInfo, TheRootIsThePlaceOfItsVolumeBeforeTheFileSystemsRootFolder) {
   EXPECT_THAT(PlacesIn("20 25 0:30 / /early rw - tmpfs none rw\n"
-                       "25 1 8:1 /inner / rw - ext4 /dev/sda1 rw\n"
-                       "41 25 8:1 / /mnt/outer rw - ext4 /dev/sda1 rw\n"),
-              ElementsAre("/mnt/outer", "/early"));
+                       "25 1 8:1 /@ / rw - btrfs /dev/sda1 rw\n"
+                       "41 25 8:1 / /mnt/toplevel rw - btrfs /dev/sda1 rw\n"),
+              ElementsAre("/", "/early"));
 }
 
 TEST(MountInfo, BindMountsAddNoVolume) {
@@ -146,7 +155,7 @@ TEST(MountInfo, OnlyMountsOfInnerFoldersAreAskedWhetherTheyAreFolders) {
                                   "26 25 0:40 / /net rw - nfs host:/x rw\n"
                                   "27 25 0:40 /sub /sub rw - nfs host:/x rw\n"
                                   "28 25 0:41 /bound /bound rw - tmpfs none rw\n"),
-                   [&](const Mount& mount) {
+                   25, [&](const Mount& mount) {
                      asked.push_back(mount.mountPoint);
                      return true;
                    });
@@ -159,7 +168,7 @@ TEST(MountInfo, OfStackedMountsOnlyTheTopmostIsAVolume) {
       "26 25 0:40 / /mnt rw - tmpfs none rw\n"
       "27 26 0:41 / /mnt rw - tmpfs none rw\n"
       "28 27 0:42 / /mnt rw - ext4 /dev/sdb1 rw\n");
-  EXPECT_THAT(GroupIntoVolumes(mounts, [](const Mount&) { return true; }),
+  EXPECT_THAT(GroupIntoVolumes(mounts, RootIDOf(mounts), [](const Mount&) { return true; }),
               ElementsAre(ElementsAre(0), ElementsAre(3)));
 }
 
@@ -181,12 +190,38 @@ TEST(MountInfo, MountsOnACoveredMountAreHidden) {
               ElementsAre("/", "/mnt"));
 }
 
-TEST(MountInfo, ARootMountedOverTheRootHidesWhatWasBelow) {
-  EXPECT_THAT(PlacesIn("1 1 0:2 / / rw - rootfs rootfs rw\n"
-                       "2 1 0:3 / /old rw - tmpfs none rw\n"
-                       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
-                       "26 25 0:40 / /mnt rw - tmpfs none rw\n"),
-              ElementsAre("/", "/mnt"));
+TEST(MountInfo, WhatIsMountedOverTheRootIsComeUponByNobody) {
+  EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+                       "26 25 0:40 / /mnt rw - tmpfs none rw\n"
+                       "27 25 0:41 / / rw - tmpfs none rw\n"
+                       "28 27 0:42 / /over rw - tmpfs none rw\n"
+                       "29 25 0:43 / /under rw - tmpfs none rw\n"),
+              ElementsAre("/", "/mnt", "/under"));
+}
+
+TEST(MountInfo, OfTwoMountsOnOnePlaceOfOneParentTheLaterIsComeUpon) {
+  const auto mounts = ParseMountInfo(
+      "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+      "26 25 0:40 / /mnt rw - tmpfs none rw\n"
+      "27 25 0:41 / /mnt rw - tmpfs none rw\n");
+  EXPECT_THAT(GroupIntoVolumes(mounts, 25, [](const Mount&) { return true; }),
+              ElementsAre(ElementsAre(0), ElementsAre(2)));
+}
+
+TEST(MountInfo, NobodyIsAskedForAFolderWhereAServerIsOnTheWay) {
+  std::vector<std::string> asked;
+  const auto mounts = ParseMountInfo(
+      "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+      "26 25 0:40 / /dead rw - fuse.sshfs host: rw\n"
+      "27 26 0:41 /inner /dead/local rw - tmpfs none rw\n"
+      "28 25 0:42 /inner /bound rw - nfs4 host:/x rw\n"
+      "29 25 0:43 /inner /near rw - tmpfs none rw\n");
+  const auto volumes = GroupIntoVolumes(mounts, 25, [&](const Mount& mount) {
+    asked.push_back(mount.mountPoint);
+    return true;
+  });
+  EXPECT_THAT(volumes, SizeIs(5));
+  EXPECT_THAT(asked, ElementsAre("/near"));
 }
 
 TEST(MountInfo, AThousandEntriesKeepTheirOrder) {

@@ -24,7 +24,8 @@ std::string Line(int id, const std::string& place) {
 class RecordedTable {
  public:
   explicit RecordedTable(const std::string& text)
-      : mTable(mFolder.MakeFile("mountinfo", text).string()) {}
+      : mTable(mFolder.MakeFile("mountinfo", text).string(),
+               [] { return Mount{27, 1, 27, "/", "/", "tmpfs"}; }) {}
 
   MountTable* operator->() { return &mTable; }
   VolumeNumber NumberAt(std::size_t index) { return mTable.AtIndex(index)->Number(); }
@@ -92,21 +93,35 @@ TEST(MountTable, TheRootVolumeHasAName) {
 }
 
 TEST(MountTable, ARootThatIsNoMountPointIsStillTheFirstVolume) {
-  MountTable real;
-  const VolumeNumber number = real.AtIndex(0)->Number();
-  RecordedTable table(Line(31000, "/mnt/a"));
+  RecordedTable table(Line(31, "/mnt/a"));
   EXPECT_EQ(table->AtIndex(0)->MountPoint(), "/");
+  EXPECT_EQ(table.NumberAt(0), -27);
   EXPECT_EQ(table->AtIndex(1)->MountPoint(), "/mnt/a");
-  EXPECT_EQ(table.NumberAt(0), number);
 }
 
-TEST(MountTable, WithoutATableThereIsTheRootVolumeWithItsUsualNumber) {
-  MountTable real;
-  MountTable table("/nonexistent/mountinfo");
+TEST(MountTable, WhereTheKernelTellsNoMountIDsTheLowestMountAtTheRootIsTheRoot) {
+  const TemporaryFolder folder;
+  const std::string text = Line(27, "/") + "40 27 0:40 / / rw - tmpfs none rw\n" + Line(41, "/mnt");
+  MountTable table(folder.MakeFile("mountinfo", text).string(),
+                   [] { return Mount{0, 0, 27, "", "/", ""}; });
+  EXPECT_EQ(table.AtIndex(0)->Number(), -27);
+  EXPECT_EQ(table.AtIndex(1)->Number(), -41);
+  EXPECT_EQ(table.AtIndex(2), nullptr);
+}
+
+TEST(MountTable, WithoutATableThereIsTheVolumeThatTheRootIsOn) {
+  MountTable table("/nonexistent/mountinfo", [] { return Mount{27, 0, 27, "", "/", ""}; });
   ASSERT_NE(table.AtIndex(0), nullptr);
   EXPECT_EQ(table.AtIndex(0)->MountPoint(), "/");
-  EXPECT_EQ(table.AtIndex(0)->Number(), real.AtIndex(0)->Number());
+  EXPECT_EQ(table.AtIndex(0)->Number(), -27);
   EXPECT_EQ(table.AtIndex(1), nullptr);
+}
+
+TEST(MountTable, WithNeitherTableNorMountIDTheRootStillHasANumber) {
+  MountTable table("/nonexistent/mountinfo", [] { return Mount{0, 0, 0, "", "/", ""}; });
+  const VolumeNumber number = table.AtIndex(0)->Number();
+  EXPECT_LT(number, 0);
+  EXPECT_EQ(table.AtIndex(0)->Number(), number);
 }
 
 TEST(MountTable, ATableThatCannotBeReadIsAsGoodAsNone) {

@@ -2,8 +2,8 @@
 
 #include <utility>
 
-#include "TestStrings.h"
 #include "Source/CFOwned.h"
+#include "TestStrings.h"
 
 namespace tallowmere::foundation::test {
 namespace {

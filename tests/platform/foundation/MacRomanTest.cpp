@@ -12,6 +12,22 @@ TEST(MacRoman, EveryByteDecodesAndEncodesBack) {
   }
 }
 
+TEST(MacRoman, TheUpperHalfIsThePublishedOne) {
+  EXPECT_EQ(DecodeMacRoman([] {
+              std::string bytes;
+              for (int byte = 0x80; byte < 0x100; ++byte) bytes.push_back(static_cast<char>(byte));
+              return bytes;
+            }()),
+            u"ÄÅÇÉÑÖÜáàâäãåçéè"
+            u"êëíìîïñóòôöõúùûü"
+            u"†°¢£§•¶ß®©™´¨≠ÆØ"
+            u"∞±≤≥¥µ∂∑∏π∫ªºΩæø"
+            u"¿¡¬√ƒ≈∆«»…\u00A0ÀÃÕŒœ"
+            u"–—“”‘’÷◊ÿŸ⁄€‹›ﬁﬂ"
+            u"‡·‚„‰ÂÊÁËÈÍÎÏÌÓÔ"
+            u"\uF8FFÒÚÛÙıˆ˜¯˘˙˚¸˝˛ˇ");
+}
+
 TEST(MacRoman, IsTheEuroSignRevision) {
   EXPECT_EQ(MacRomanToUnicode(0xDB), 0x20AC);
   EXPECT_EQ(MacRomanToUnicode(0xF0), 0xF8FF);
