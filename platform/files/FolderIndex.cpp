@@ -41,12 +41,6 @@ bool IsThisOrParent(const char* name) {
   return name[0] == '.' && (name[1] == '\0' || (name[1] == '.' && name[2] == '\0'));
 }
 
-// Where an entry's number can be another than the item's own.
-bool HasUntrueEntries(const Volume& volume) {
-  return volume.Type() == "overlay" || volume.Type().starts_with("fuse") ||
-         volume.Type() == "virtiofs";
-}
-
 std::string WithoutFolderMark(const std::string& path) {
   return foundation::WithFolderMark(path, false);
 }
@@ -59,7 +53,7 @@ class FolderIndex::Search {
   Search(const SearchedItem& item, const Volume& volume)
       : mItem(item),
         mRoot(*volume.Root()),
-        mUntrueEntries(HasUntrueEntries(volume)),
+        mUntrueEntries(volume.HasUntrueEntries()),
         mCertain(item.reference != nullptr || IsInodeNumber(item.id)) {}
 
   const ItemReference& Root() const { return mRoot; }

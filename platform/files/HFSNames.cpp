@@ -23,6 +23,7 @@ std::string KeptExtension(std::u16string_view text) {
   if (dot == std::u16string_view::npos || dot == 0) return {};
   const auto extension = foundation::EncodeMacRoman(text.substr(dot + 1));
   if (!extension || extension->empty() || extension->size() > kLongestKeptExtension) return {};
+  if (extension->find(kMark) != std::string::npos) return {};  // the last mark is the id's
   return "." + *extension;
 }
 

@@ -83,6 +83,10 @@ const std::optional<ItemReference>& Volume::Root() const {
   return mRoot;
 }
 
+bool Volume::HasUntrueEntries() const {
+  return mType == "overlay" || mType.starts_with("fuse") || mType == "virtiofs";
+}
+
 const std::string& Volume::Name() const {
   if (!mName) {
     const std::string name = LinuxNameOf(MountPoint());
