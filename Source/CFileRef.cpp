@@ -45,6 +45,7 @@ constexpr std::string_view kVolumesPrefix = "/Volumes/";
 // What the platform may give for the folder of a bare name.
 constexpr std::string_view kThisFolder = ".";
 constexpr std::string_view kThisFolderMarked = "./";
+constexpr std::string_view kFolderAbove = "..";
 
 // --- Text -------------------------------------------------------------------------------------
 
@@ -63,6 +64,14 @@ std::size_t CopyBounded(char* destination, char const* source, std::size_t size)
 // Null when there is no memory.
 Text AllocateText(std::size_t size) {
   return Text(new (std::nothrow) char[size]);
+}
+
+// Null for null, and when there is no memory.
+Text CopyText(char const* source) {
+  const std::size_t size = source != nullptr ? std::strlen(source) + 1 : 0;
+  Text copy = source != nullptr ? AllocateText(size) : nullptr;
+  if (copy) CopyBounded(copy.get(), source, size);
+  return copy;
 }
 
 std::size_t LengthWithoutTrailingSlashes(char const* path) {
@@ -223,14 +232,21 @@ bool IsFolderMode(mode_t mode) {
   return (mode & kTypeMask) == kFolderType;
 }
 
-// Whether the path ends in "." or ".." and leads nowhere. The folder above it is then "…/../..",
-// which leads nowhere either: climbing would not end.
-bool IsBelowNothing(char const* path) {
-  if (path == nullptr) return false;
-  std::string_view name(path);
-  name.remove_prefix(name.rfind('/') + 1);
+// Cuts components off an absolute path until something is there. False when that never comes: what
+// is not there and ends in "." or ".." has only "…/../.." above it, which is not there either.
+bool CutToExisting(char* path) {
+  std::size_t length = std::strlen(path);
   mode_t mode = 0;
-  return (name == "." || name == "..") && !ReadMode(path, &mode);
+  while (!ReadMode(path, &mode)) {
+    std::string_view rest(path, length);
+    const std::string_view name = rest.substr(rest.rfind('/') + 1);
+    if (name.empty() || name == kThisFolder || name == kFolderAbove) return false;
+    rest.remove_suffix(name.size());
+    while (rest.size() > 1 && rest.back() == '/') rest.remove_suffix(1);
+    length = rest.size();
+    path[length] = '\0';
+  }
+  return true;
 }
 
 // The text of the link at `path`; null when it is none or cannot be read. The test is a mask, not
@@ -701,11 +717,17 @@ short CFileRef::GetVolumeRefNumber() const {
   FSRef item = {};
   if (CFURLGetFSRef(mURL, &item)) return VolumeOf(item);
   CFileRef root(*this);
-  while (root.IsValid() && !root.IsRoot()) {
-    if (IsBelowNothing(root.GetPath())) return kNoVolume;
-    root.SetToParent();
-  }
+  while (root.ClimbToExisting() && !root.IsRoot()) root.SetToParent();
   return root.IsValid() && CFURLGetFSRef(root.mURL, &item) ? VolumeOf(item) : kNoVolume;
+}
+
+// All that is missing is left out at once, for a path can have tens of thousands of components.
+bool CFileRef::ClimbToExisting() {
+  if (IsFolder()) return true;
+  const Text existing = CopyText(GetPath());
+  if (existing && CutToExisting(existing.get())) return Set(existing.get(), true);
+  ReInit();
+  return false;
 }
 
 long CFileRef::GetParentID() const {

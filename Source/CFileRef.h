@@ -271,6 +271,7 @@ class CFileRef {
   bool Hold(CFURLRef url);  // takes the URL over, into an empty reference; whether it is one
   bool HoldPathOf(CFURLRef url, bool isDirectory);
   bool FollowLink();
+  bool ClimbToExisting();  // to the item itself if that exists; false, and empty, to none
 
   CFURLRef mURL;           // one reference of ours; null when empty
   UInt32 mValid;           // 1 exactly when mURL is not null; the lowest bit counts

@@ -51,7 +51,8 @@ std::optional<ItemStatus> ReadStatus(int folder, const char* name) {
   struct statx about {};
   const int emptyPath = *name == '\0' ? AT_EMPTY_PATH : 0;
   if (statx(folder, name, AT_SYMLINK_NOFOLLOW | AT_NO_AUTOMOUNT | emptyPath,
-            STATX_TYPE | STATX_INO | STATX_BTIME | STATX_CTIME | STATX_MNT_ID, &about) != 0) {
+            STATX_TYPE | STATX_INO | STATX_NLINK | STATX_BTIME | STATX_CTIME | STATX_MNT_ID,
+            &about) != 0) {
     return std::nullopt;
   }
   ItemReference item{};
@@ -63,7 +64,9 @@ std::optional<ItemStatus> ReadStatus(int folder, const char* name) {
   const bool hasMount = (about.stx_mask & STATX_MNT_ID) != 0;
   item.mount = hasMount ? static_cast<std::int32_t>(about.stx_mnt_id) : kNoMount;
   item.type = about.stx_mode & S_IFMT;
-  return ItemStatus{item, about.stx_ctime.tv_sec * kNanosecondsInASecond + about.stx_ctime.tv_nsec};
+  const std::int64_t change =
+      about.stx_ctime.tv_sec * kNanosecondsInASecond + about.stx_ctime.tv_nsec;
+  return ItemStatus{item, change, about.stx_nlink};
 }
 
 // The item may be replaced between the two calls. The reference is then to no item at all, unless

@@ -53,10 +53,11 @@ bool AreEqual(const ItemReference& first, const ItemReference& second);
 // `folder` as in openat(2); with an empty name, the open item itself.
 std::optional<ItemReference> ReadItem(int folder, const char* name);
 
-// The item without its handle, and when it was last changed.
+// The item without its handle, when it was last changed, and how many names it has.
 struct ItemStatus {
   ItemReference item;
   std::int64_t change;  // nanoseconds since 1970
+  std::uint32_t links;
 };
 
 // As ReadItem, in one system call.

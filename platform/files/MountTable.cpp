@@ -84,7 +84,10 @@ const std::optional<ItemReference>& Volume::Root() const {
 }
 
 bool Volume::HasUntrueEntries() const {
-  return mType == "overlay" || mType.starts_with("fuse") || mType == "virtiofs";
+  constexpr auto kOthers =
+      std::to_array<std::string_view>({"overlay", "virtiofs", "vfat", "msdos", "exfat"});
+  return mType.starts_with("fuse") ||
+         std::find(kOthers.begin(), kOthers.end(), mType) != kOthers.end();
 }
 
 const std::string& Volume::Name() const {
@@ -208,6 +211,7 @@ MountTable::State MountTable::StateOf(const std::vector<Mount>& mounts, int root
   }
   for (const auto& indexes : GroupIntoVolumes(mounts, rootID, IsFolder)) {
     std::vector<Mount> own;
+    own.reserve(indexes.size());
     for (const std::size_t index : indexes) own.push_back(mounts[index]);
     const auto number = NumberOf(own.front().id, mountIDs);
     if (!number) continue;

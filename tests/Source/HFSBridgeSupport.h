@@ -13,8 +13,8 @@
 #include <string>
 #include <string_view>
 
-#include "Source/CFOwned.h"
 #include "Source/LegacyHFSBridge.h"
+#include "TestReferences.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
 
@@ -36,21 +36,6 @@ class Pascal {
 
 inline std::string TextOfPascal(ConstStr255Param name) {
   return {reinterpret_cast<const char*>(name + 1), name[0]};
-}
-
-// The UTF-16 text; none for null.
-inline std::optional<std::u16string> TextOf(CFStringRef string) {
-  if (string == nullptr) return std::nullopt;
-  std::u16string text(static_cast<std::size_t>(CFStringGetLength(string)), u'\0');
-  CFStringGetCharacters(string, CFRangeMake(0, CFStringGetLength(string)),
-                        reinterpret_cast<UniChar*>(text.data()));
-  return text;
-}
-
-inline CFOwned<CFStringRef> StringOf(std::u16string_view text) {
-  return CFOwned(CFStringCreateWithCharacters(kCFAllocatorDefault,
-                                              reinterpret_cast<const UniChar*>(text.data()),
-                                              static_cast<CFIndex>(text.size())));
 }
 
 // --- Records ----------------------------------------------------------------------------------
@@ -88,12 +73,6 @@ inline Fields FieldsOf(const FSSpec& spec) {
 }
 inline const Fields kEmptyFields = {kNoVolume, kNoFolder, ""};
 
-// The path of a reference; none when it has none.
-inline std::optional<std::string> PathOf(const CFileRef& ref) {
-  const char* const path = ref.GetPath();
-  return path != nullptr ? std::optional<std::string>(path) : std::nullopt;
-}
-
 // --- Volumes ----------------------------------------------------------------------------------
 
 // A number that no volume has.
@@ -122,7 +101,7 @@ class Volume {
     return Path(item);
   }
   std::string MakeFile(std::string_view item) const {
-    std::ofstream(mRoot / item);
+    const std::ofstream file(mRoot / item);
     return Path(item);
   }
 

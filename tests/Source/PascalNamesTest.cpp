@@ -10,6 +10,8 @@
 namespace tallowmere::test {
 namespace {
 
+using foundation::test::TextOf;
+
 struct Converted {
   bool isWhole;
   std::string name;
@@ -23,13 +25,14 @@ std::ostream& operator<<(std::ostream& out, const Converted& converted) {
 // Into a buffer of exactly `size` bytes, so that a byte outside of it is noticed.
 Converted Convert(std::u16string_view name, SInt32 size = sizeof(Str255)) {
   const auto buffer = std::make_unique<unsigned char[]>(static_cast<std::size_t>(size));
-  const bool isWhole = GetPascalStringFromCFString(StringOf(name).Get(), buffer.get(), size);
+  const bool isWhole = GetPascalStringFromCFString(MakeString(name).Get(), buffer.get(), size);
   EXPECT_LT(buffer[0], size);
   return {isWhole, TextOfPascal(buffer.get())};
 }
 
 std::optional<std::u16string> Read(std::string_view name) {
-  return TextOf(CFOwned(CreateCFStringFromPascalString(Pascal(name).Get())).Get());
+  const CFOwned read(CreateCFStringFromPascalString(Pascal(name).Get()));
+  return read ? std::optional(TextOf(read.Get())) : std::nullopt;
 }
 
 // Sets the class-wide encoding for one test.

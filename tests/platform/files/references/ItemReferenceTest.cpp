@@ -127,6 +127,16 @@ TEST_F(AnItemReference, WithoutBirthIsNotToAnItemWithBirth) {
   EXPECT_FALSE(IsAtX(item));
 }
 
+TEST(AnItemReferenceWithoutBirthAndHandle, IsToAnItemOnItsOwnMountAlone) {
+  constexpr char kItem[] = "/proc/version";
+  auto item = ReadItem(AT_FDCWD, kItem);
+  if (!item || item->birthNanoseconds != kNoBirth) GTEST_SKIP() << "no item without a birth here";
+  item->handle = FileHandle{};
+  EXPECT_TRUE(IsAt(*item, AT_FDCWD, kItem));
+  item->mount += 1;
+  EXPECT_FALSE(IsAt(*item, AT_FDCWD, kItem));
+}
+
 TEST(PackedReference, ComesBack) {
   const auto item = ReadItem(AT_FDCWD, "/");
   ASSERT_TRUE(item);

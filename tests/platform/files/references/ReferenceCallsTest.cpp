@@ -304,6 +304,14 @@ TEST_F(AReferenceOnAVolume, FindsItsItemThoughItsPlaceIsForgotten) {
   EXPECT_EQ(PlaceOf(item), PathOf("volume/a/b/x"));
 }
 
+TEST_F(AReferenceOnAVolume, FindsItsItemFromTheRootWhenNoFolderOfItsPlaceIsThere) {
+  mFolder.MakeFolder("volume/a");
+  mFolder.MakeFile("volume/a/x");
+  const FSRef item = ReferenceTo(PathOf("volume/a/x"));
+  files::RememberPlace(*files::Unpack(&item), "/no such folder/x");
+  EXPECT_EQ(PlaceOf(item), PathOf("volume/a/x"));
+}
+
 // File systems give a freed inode number away at once, within one tick of the clock of births.
 TEST_F(AReferenceToAnItem, ThatIsDeletedIsNotTakenForANewItemOfItsNameAndNumber) {
   int sameNumber = 0;
