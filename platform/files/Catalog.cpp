@@ -192,21 +192,24 @@ std::optional<std::string> FindPlace(const ItemReference& item) {
   return place;
 }
 
+std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder) {
+  if (!volume->Root() || !IsInodeNumber(id)) return std::nullopt;
+  auto place = WithID(volume, id, folder, RememberedPath(*volume, id));
+  if (place) return place;
+  place = WithID(volume, id, folder, PathByHandle(*volume, HandleOf(*volume, id)));
+  if (place) RememberPlace(*place);
+  return place;
+}
+
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder) {
   if (!CanBeNodeID(id) || !volume->Root()) return std::nullopt;
   if (id == kRootFolderID) return RootOf(volume);
 
-  std::optional<Place> place;
-  if (IsInodeNumber(id)) {
-    place = WithID(volume, id, folder, RememberedPath(*volume, id));
-    if (place) return place;
-    place = WithID(volume, id, folder, PathByHandle(*volume, HandleOf(*volume, id)));
-  }
-  if (!place) {
-    const std::string latest(PlaceMemory::OfThisProcess().Latest());
-    const std::string start = NearestFolder(volume, latest);
-    place = WithID(volume, id, folder, IndexOf(volume).Find({id, nullptr, folder}, start));
-  }
+  auto place = FindItemAtOnce(volume, id, folder);
+  if (place) return place;
+  const std::string latest(PlaceMemory::OfThisProcess().Latest());
+  const std::string start = NearestFolder(volume, latest);
+  place = WithID(volume, id, folder, IndexOf(volume).Find({id, nullptr, folder}, start));
   if (place) RememberPlace(*place);
   return place;
 }

@@ -36,4 +36,8 @@ std::optional<std::string> FindPlace(const ItemReference& item);
 // and when it is not certain which item that is.
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder);
 
+// The same without reading a folder: none too when the item has no remembered place and cannot be
+// opened by its number.
+std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder);
+
 }  // namespace tallowmere::files

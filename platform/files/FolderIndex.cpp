@@ -48,12 +48,6 @@ bool IsAnyOf(const std::string& text, std::initializer_list<const char*> texts) 
   return std::find(texts.begin(), texts.end(), text) != texts.end();
 }
 
-// Where an entry's number can be another than the item's own.
-bool HasUntrueEntries(const Volume& volume) {
-  return volume.Type().starts_with("fuse") ||
-         IsAnyOf(volume.Type(), {"overlay", "virtiofs", "vfat", "msdos", "exfat"});
-}
-
 // Where a folder has two links and one more for each folder in it, or a single one when it has lost
 // count.
 bool CountsSubfolders(const Volume& volume) {
@@ -80,7 +74,7 @@ class FolderIndex::Search {
   Search(const SearchedItem& item, const Volume& volume)
       : mItem(item),
         mRoot(*volume.Root()),
-        mUntrueEntries(HasUntrueEntries(volume)),
+        mUntrueEntries(volume.HasUntrueEntries()),
         mCertain(item.reference != nullptr || IsInodeNumber(item.id)) {}
 
   const ItemReference& Root() const { return mRoot; }
