@@ -14,17 +14,16 @@ using test::TemporaryFolder;
 
 constexpr SInt16 kNoVolume = 32767;
 
-// Opaque for comparing; a call that fails leaves such bytes as they are.
+// Bytes that a call which fails leaves as they are, padding among them.
+constexpr unsigned char kFilling = 0xA5;
 template <class Record>
-Record Filled() {
-  Record record;
-  std::memset(&record, 0xA5, sizeof record);
-  return record;
+void Fill(Record& record) {
+  std::memset(&record, kFilling, sizeof record);
 }
 template <class Record>
 bool IsUntouched(const Record& record) {
-  const Record filled = Filled<Record>();
-  return std::memcmp(&record, &filled, sizeof record) == 0;
+  const auto* const bytes = reinterpret_cast<const unsigned char*>(&record);
+  return std::all_of(bytes, bytes + sizeof record, [](auto byte) { return byte == kFilling; });
 }
 
 std::u16string TextOf(const HFSUniStr255& name) {
@@ -61,7 +60,8 @@ class ItemCalls : public testing::Test {
 
 TEST_F(ItemCalls, CatalogInfoFillsOnlyWhatIsAskedFor) {
   const FSRef reference = ReferenceTo(mFile);
-  auto info = Filled<FSCatalogInfo>();
+  FSCatalogInfo info;
+  Fill(info);
   EXPECT_EQ(FSGetCatalogInfo(&reference, kFSCatInfoNone, &info, nullptr, nullptr, nullptr), noErr);
   EXPECT_TRUE(IsUntouched(info));
   FSCatalogInfo volumeAlone{};
@@ -96,7 +96,8 @@ TEST_F(ItemCalls, CatalogInfoOfARootIsThatOfTheVolume) {
   FSCatalogInfo info{};
   HFSUniStr255 name{};
   FSSpec spec{};
-  auto parent = Filled<FSRef>();
+  FSRef parent;
+  Fill(parent);
   ASSERT_EQ(FSGetCatalogInfo(&root, kFSCatInfoNodeID, &info, &name, &spec, &parent), noErr);
   EXPECT_EQ(info.nodeID, 2u);
   EXPECT_EQ(spec.parID, 1);
@@ -108,10 +109,14 @@ TEST_F(ItemCalls, CatalogInfoOfARootIsThatOfTheVolume) {
 TEST_F(ItemCalls, CatalogInfoOfAnItemThatIsGoneWritesNothing) {
   const FSRef reference = ReferenceTo(mFile);
   std::filesystem::remove(mFile);
-  auto info = Filled<FSCatalogInfo>();
-  auto name = Filled<HFSUniStr255>();
-  auto spec = Filled<FSSpec>();
-  auto parent = Filled<FSRef>();
+  FSCatalogInfo info;
+  Fill(info);
+  HFSUniStr255 name;
+  Fill(name);
+  FSSpec spec;
+  Fill(spec);
+  FSRef parent;
+  Fill(parent);
   EXPECT_EQ(FSGetCatalogInfo(&reference, kFSCatInfoNodeID, &info, &name, &spec, &parent), fnfErr);
   EXPECT_TRUE(IsUntouched(info) && IsUntouched(name) && IsUntouched(spec) && IsUntouched(parent));
 }
@@ -146,7 +151,8 @@ TEST_F(ItemCalls, ANodeIDFindsFilesFoldersAndTheRoot) {
 
 TEST_F(ItemCalls, IDsThatNoItemHasAreNotFound) {
   for (const std::uint32_t id : {0u, 1u, 3u, 15u, 0x7FFFFF00u, 0xFFFFFFF0u, 0xFFFFFFFFu}) {
-    auto reference = Filled<FSRef>();
+    FSRef reference;
+    Fill(reference);
     EXPECT_EQ(FSResolveNodeID(mInfo.volume, id, &reference), fnfErr) << id;
     EXPECT_TRUE(IsUntouched(reference));
     auto block = Block(id);
@@ -211,7 +217,8 @@ TEST_F(ItemCalls, AUnicodeNameThatNothingHasIsNotFound) {
                                           std::u16string(256, u'x'),
                                           std::u16string(255, u'\u00E9')};
   for (const auto& name : names) {
-    auto found = Filled<FSRef>();
+    FSRef found;
+    Fill(found);
     EXPECT_EQ(MakeReference(parent, name, found), fnfErr);
     EXPECT_TRUE(IsUntouched(found));
   }
