@@ -13,6 +13,7 @@ using test::TemporaryFolder;
 class HFSPathsToRecords : public testing::Test {
  protected:
   void SetUp() override {
+    EnterOwnMountNamespace();
     mTop = mFolder.Path();
     mFolder.MakeFolder("a/b/c");
     mFolder.MakeFile("a/b/file");

@@ -1,4 +1,6 @@
 // FSGetCatalogInfo, FSResolveNodeID, FSMakeFSRefUnicode, FSpMakeFSRef and PBGetCatInfoSync.
+#include <sys/mount.h>
+
 #include <vector>
 
 #include "CatalogFixture.h"
@@ -12,32 +14,35 @@ using test::TemporaryFolder;
 
 constexpr SInt16 kNoVolume = 32767;
 
-// Opaque for comparing; a call that fails leaves such bytes as they are.
+// Bytes that a call which fails leaves as they are, padding among them.
+constexpr unsigned char kFilling = 0xA5;
 template <class Record>
-Record Filled() {
-  Record record;
-  std::memset(&record, 0xA5, sizeof record);
-  return record;
+void Fill(Record& record) {
+  std::memset(&record, kFilling, sizeof record);
 }
 template <class Record>
 bool IsUntouched(const Record& record) {
-  const Record filled = Filled<Record>();
-  return std::memcmp(&record, &filled, sizeof record) == 0;
+  const auto* const bytes = reinterpret_cast<const unsigned char*>(&record);
+  return std::all_of(bytes, bytes + sizeof record, [](auto byte) { return byte == kFilling; });
 }
 
 std::u16string TextOf(const HFSUniStr255& name) {
-  return {name.unicode, name.length};
+  return std::u16string(name.unicode, name.unicode + name.length);
 }
 
 class ItemCalls : public testing::Test {
  protected:
   void SetUp() override {
+    // A volume of their own, where it is permitted, is soon searched for what is gone.
+    if (EnterOwnMountNamespace()) mVolume.emplace("tmpfs", mFolder.Path(), "tmpfs");
+    for (int i = 0; i < 20; ++i) std::filesystem::remove(mFolder.MakeFile("first"));
     mPath = mFolder.MakeFolder("folder");
     mFile = mFolder.MakeFile("folder/file");
     mInfo = InfoOf(mPath);
   }
   OSErr MakeReference(const FSRef& parent, std::u16string_view name, FSRef& reference) const {
-    return FSMakeFSRefUnicode(&parent, name.size(), name.data(), 0, &reference);
+    const std::vector<UniChar> units(name.begin(), name.end());
+    return FSMakeFSRefUnicode(&parent, units.size(), units.data(), 0, &reference);
   }
   OSErr CatalogInfo(CInfoPBRec& block) const { return PBGetCatInfoSync(&block); }
   CInfoPBRec Block(std::uint32_t id, StringPtr name = nullptr) const {
@@ -45,15 +50,9 @@ class ItemCalls : public testing::Test {
     block.dirInfo = {name, mInfo.volume, -1, static_cast<SInt32>(id), 0x5A5A5A5A};
     return block;
   }
-  // The id of an item that is gone.
-  std::uint32_t GoneID() const {
-    const std::string path = mFolder.MakeFolder("gone");
-    const std::uint32_t id = IDOf(path);
-    std::filesystem::remove(path);
-    return id;
-  }
 
   TemporaryFolder mFolder;
+  std::optional<ScopedMount> mVolume;
   std::string mPath;
   std::string mFile;
   FSCatalogInfo mInfo{};
@@ -61,7 +60,8 @@ class ItemCalls : public testing::Test {
 
 TEST_F(ItemCalls, CatalogInfoFillsOnlyWhatIsAskedFor) {
   const FSRef reference = ReferenceTo(mFile);
-  auto info = Filled<FSCatalogInfo>();
+  FSCatalogInfo info;
+  Fill(info);
   EXPECT_EQ(FSGetCatalogInfo(&reference, kFSCatInfoNone, &info, nullptr, nullptr, nullptr), noErr);
   EXPECT_TRUE(IsUntouched(info));
   FSCatalogInfo volumeAlone{};
@@ -96,7 +96,8 @@ TEST_F(ItemCalls, CatalogInfoOfARootIsThatOfTheVolume) {
   FSCatalogInfo info{};
   HFSUniStr255 name{};
   FSSpec spec{};
-  auto parent = Filled<FSRef>();
+  FSRef parent;
+  Fill(parent);
   ASSERT_EQ(FSGetCatalogInfo(&root, kFSCatInfoNodeID, &info, &name, &spec, &parent), noErr);
   EXPECT_EQ(info.nodeID, 2u);
   EXPECT_EQ(spec.parID, 1);
@@ -108,11 +109,14 @@ TEST_F(ItemCalls, CatalogInfoOfARootIsThatOfTheVolume) {
 TEST_F(ItemCalls, CatalogInfoOfAnItemThatIsGoneWritesNothing) {
   const FSRef reference = ReferenceTo(mFile);
   std::filesystem::remove(mFile);
-  auto info = Filled<FSCatalogInfo>();
-  auto name = Filled<HFSUniStr255>();
-  auto spec = Filled<FSSpec>();
-  auto parent = Filled<FSRef>();
-  // The volume is as large as this machine's, so the file is looked for as nobody.
+  FSCatalogInfo info;
+  Fill(info);
+  HFSUniStr255 name;
+  Fill(name);
+  FSSpec spec;
+  Fill(spec);
+  FSRef parent;
+  Fill(parent);
   EXPECT_EQ(FSGetCatalogInfo(&reference, kFSCatInfoNodeID, &info, &name, &spec, &parent), fnfErr);
   EXPECT_TRUE(IsUntouched(info) && IsUntouched(name) && IsUntouched(spec) && IsUntouched(parent));
 }
@@ -147,13 +151,15 @@ TEST_F(ItemCalls, ANodeIDFindsFilesFoldersAndTheRoot) {
 
 TEST_F(ItemCalls, IDsThatNoItemHasAreNotFound) {
   for (const std::uint32_t id : {0u, 1u, 3u, 15u, 0x7FFFFF00u, 0xFFFFFFF0u, 0xFFFFFFFFu}) {
-    auto reference = Filled<FSRef>();
+    FSRef reference;
+    Fill(reference);
     EXPECT_EQ(FSResolveNodeID(mInfo.volume, id, &reference), fnfErr) << id;
     EXPECT_TRUE(IsUntouched(reference));
     auto block = Block(id);
     EXPECT_EQ(CatalogInfo(block), dirNFErr) << id;
     EXPECT_EQ(block.dirInfo.ioDrParID, 0x5A5A5A5A);
-    if (id != 1) EXPECT_EQ(ItemOf(MakeRecord(mInfo.volume, id, "x")), "(-120)") << id;
+    const std::string result = id == 1 ? "(-43)" : "(-120)";
+    EXPECT_EQ(ItemOf(MakeRecord(mInfo.volume, id, "x")), result) << id;
   }
 }
 
@@ -211,7 +217,8 @@ TEST_F(ItemCalls, AUnicodeNameThatNothingHasIsNotFound) {
                                           std::u16string(256, u'x'),
                                           std::u16string(255, u'\u00E9')};
   for (const auto& name : names) {
-    auto found = Filled<FSRef>();
+    FSRef found;
+    Fill(found);
     EXPECT_EQ(MakeReference(parent, name, found), fnfErr);
     EXPECT_TRUE(IsUntouched(found));
   }
@@ -278,7 +285,7 @@ TEST_F(ItemCalls, AFileHasNoFolderInfo) {
 }
 
 TEST_F(ItemCalls, OnlyIndexMinus1IsTaken) {
-  for (const SInt16 index : {0, 1, -2, 32767, -32768}) {
+  for (const SInt16 index : std::vector<SInt16>{0, 1, -2, 32767, -32768}) {
     auto block = Block(mInfo.nodeID);
     block.dirInfo.ioFDirIndex = index;
     EXPECT_EQ(CatalogInfo(block), paramErr) << index;
@@ -286,14 +293,10 @@ TEST_F(ItemCalls, OnlyIndexMinus1IsTaken) {
 }
 
 TEST_F(ItemCalls, WhatIsGoneHasNoFolderInfoNorItems) {
-  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
-  const ScopedMount volume("tmpfs", mFolder.MakeFolder("volume"), "tmpfs");
-  for (int i = 0; i < 20; ++i) mFolder.MakeFile("volume/" + std::to_string(i));
-  const std::string path = mFolder.MakeFolder("volume/x");
+  const std::string path = mFolder.MakeFolder("x");
   const FSCatalogInfo info = InfoOf(path);
   std::filesystem::remove(path);
   auto block = Block(info.nodeID);
-  block.dirInfo.ioVRefNum = info.volume;
   EXPECT_EQ(CatalogInfo(block), dirNFErr);
   EXPECT_EQ(ItemOf(MakeRecord(info.volume, info.nodeID, "y")), "(-120)");
   FSRef found{};
