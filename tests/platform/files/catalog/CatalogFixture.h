@@ -55,6 +55,11 @@ inline std::string NameOf(const FSSpec& spec) {
   return std::string(TextOfPascal(spec.name));
 }
 
+// By value: the field is not aligned, so no reference may be bound to it.
+inline std::uint32_t ParentOf(const FSSpec& spec) {
+  return static_cast<std::uint32_t>(spec.parID);
+}
+
 inline FSCatalogInfo InfoOf(const std::string& path) {
   const FSRef reference = ReferenceTo(path);
   FSCatalogInfo info{};

@@ -54,7 +54,7 @@ TEST_F(HFSPathsToRecords, ANameIsOneInTheFolder) {
   EXPECT_EQ(From("file"), "a/b/file");
   EXPECT_EQ(From(":file"), "a/b/file");
   EXPECT_EQ(From("c"), "a/b/c");
-  EXPECT_EQ(static_cast<std::uint32_t>(mSpec.parID), mInfo.nodeID);
+  EXPECT_EQ(ParentOf(mSpec), mInfo.nodeID);
   EXPECT_EQ(mSpec.vRefNum, mInfo.volume);
 }
 
@@ -95,7 +95,7 @@ TEST_F(HFSPathsToRecords, AFullPathDoesNotMindVolumeAndFolder) {
 TEST_F(HFSPathsToRecords, AVolumeAloneIsItsRoot) {
   const std::string root = NameOf(SpecOf("/"));
   EXPECT_EQ(From(root + ":"), "/");
-  EXPECT_EQ(mSpec.parID, 1);
+  EXPECT_EQ(ParentOf(mSpec), 1U);
   EXPECT_EQ(From(0, 1, root), "/");
   EXPECT_EQ(From(root + "::"), "(-120)");
 }
@@ -119,16 +119,16 @@ TEST_F(HFSPathsToRecords, VolumeAndFolder0AreTheCurrentFolder) {
 
 TEST_F(HFSPathsToRecords, Folder0IsElseTheRoot) {
   EXPECT_EQ(From(mInfo.volume, 0, ""), From(mInfo.volume, 2, ""));
-  EXPECT_EQ(mSpec.parID, 1);
+  EXPECT_EQ(ParentOf(mSpec), 1U);
 }
 
 TEST_F(HFSPathsToRecords, AMissingLastNameFillsTheRecord) {
   EXPECT_EQ(Make(mInfo.volume, mInfo.nodeID, "new\x8E"), fnfErr);
   EXPECT_EQ(mSpec.vRefNum, mInfo.volume);
-  EXPECT_EQ(static_cast<std::uint32_t>(mSpec.parID), mInfo.nodeID);
+  EXPECT_EQ(ParentOf(mSpec), mInfo.nodeID);
   EXPECT_EQ(NameOf(mSpec), "new\x8E");
   EXPECT_EQ(Make(mInfo.volume, mInfo.nodeID, "::new"), fnfErr);
-  EXPECT_EQ(static_cast<std::uint32_t>(mSpec.parID), IDOf(mTop + "/a"));
+  EXPECT_EQ(ParentOf(mSpec), IDOf(mTop + "/a"));
 }
 
 TEST_F(HFSPathsToRecords, ARecordOfWhatIsMissingFindsItOnceItIsThere) {
@@ -166,9 +166,9 @@ TEST_F(HFSPathsToRecords, LinksToFoldersOnTheWayAreFollowed) {
   ASSERT_EQ(symlink("../..", (mTop + "/a/b/up").c_str()), 0);
   ASSERT_EQ(symlink("file", (mTop + "/a/b/link").c_str()), 0);
   EXPECT_EQ(From(":up:a:top"), "a/top");
-  EXPECT_EQ(static_cast<std::uint32_t>(mSpec.parID), IDOf(mTop + "/a"));
+  EXPECT_EQ(ParentOf(mSpec), IDOf(mTop + "/a"));
   EXPECT_EQ(From(":up:a:new"), "(-43)");
-  EXPECT_EQ(static_cast<std::uint32_t>(mSpec.parID), IDOf(mTop + "/a"));
+  EXPECT_EQ(ParentOf(mSpec), IDOf(mTop + "/a"));
   EXPECT_EQ(From("up"), "a/b/up");
   EXPECT_EQ(From("link"), "a/b/link");
   EXPECT_EQ(From(":link:x"), "(-120)");
@@ -195,10 +195,10 @@ TEST_F(HFSPathsToRecords, APathIntoAnotherVolumeGivesItsNumber) {
   const ScopedMount volume("tmpfs", mTop + "/a/b/c", "tmpfs");
   mFolder.MakeFile("a/b/c/x");
   EXPECT_EQ(From(":c:x"), "a/b/c/x");
-  EXPECT_EQ(mSpec.parID, 2);
+  EXPECT_EQ(ParentOf(mSpec), 2U);
   EXPECT_NE(mSpec.vRefNum, mInfo.volume);
   EXPECT_EQ(From("c"), "a/b/c");
-  EXPECT_EQ(mSpec.parID, 1);
+  EXPECT_EQ(ParentOf(mSpec), 1U);
   EXPECT_EQ(From("c:x"), "a/b/c/x");
   EXPECT_EQ(From(":c::file"), "(-120)");
 }

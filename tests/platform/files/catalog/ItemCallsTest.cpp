@@ -79,7 +79,7 @@ TEST_F(ItemCalls, CatalogInfoGivesNameRecordAndParentTogether) {
   ASSERT_EQ(FSGetCatalogInfo(&reference, kFSCatInfoNone, nullptr, &name, &spec, &parent), noErr);
   EXPECT_EQ(TextOf(name), u"file");
   EXPECT_EQ(spec.vRefNum, mInfo.volume);
-  EXPECT_EQ(static_cast<std::uint32_t>(spec.parID), mInfo.nodeID);
+  EXPECT_EQ(ParentOf(spec), mInfo.nodeID);
   EXPECT_EQ(NameOf(spec), "file");
   EXPECT_EQ(PathOf(parent), mPath);
 }
@@ -100,7 +100,7 @@ TEST_F(ItemCalls, CatalogInfoOfARootIsThatOfTheVolume) {
   Fill(parent);
   ASSERT_EQ(FSGetCatalogInfo(&root, kFSCatInfoNodeID, &info, &name, &spec, &parent), noErr);
   EXPECT_EQ(info.nodeID, 2u);
-  EXPECT_EQ(spec.parID, 1);
+  EXPECT_EQ(ParentOf(spec), 1U);
   EXPECT_EQ(TextOf(name).size(), spec.name[0]);
   EXPECT_EQ(0, std::memcmp(&parent, std::string(sizeof parent, '\0').data(), sizeof parent));
   EXPECT_EQ(ItemOf(spec), "/");
@@ -308,7 +308,7 @@ TEST_F(ItemCalls, TheRootOfAnotherVolumeHasParent1AndItsOwnName) {
   const ScopedMount volume("tmpfs", mFolder.MakeFolder("My Disk"), "tmpfs");
   const std::string path = mFolder.Path() / "My Disk";
   const FSSpec spec = SpecOf(path);
-  EXPECT_EQ(spec.parID, 1);
+  EXPECT_EQ(ParentOf(spec), 1U);
   EXPECT_NE(spec.vRefNum, mInfo.volume);
   EXPECT_EQ(NameOf(spec), "My Disk");
   EXPECT_EQ(ItemOf(spec), path);
