@@ -10,10 +10,10 @@
 #include <climits>
 #include <cstddef>
 #include <ctime>
-#include <initializer_list>
 #include <limits>
 #include <utility>
 
+#include "files/FileSystems.h"
 #include "files/NodeID.h"
 #include "files/Spread.h"
 #include "foundation/PathText.h"
@@ -44,15 +44,6 @@ bool IsThisOrParent(const char* name) {
   return name[0] == '.' && (name[1] == '\0' || (name[1] == '.' && name[2] == '\0'));
 }
 
-bool IsAnyOf(const std::string& text, std::initializer_list<const char*> texts) {
-  return std::find(texts.begin(), texts.end(), text) != texts.end();
-}
-
-// Where a folder has two links and one more for each folder in it, or a single one when it has lost
-// count.
-bool CountsSubfolders(const Volume& volume) {
-  return IsAnyOf(volume.Type(), {"ext2", "ext3", "ext4", "xfs", "tmpfs"});
-}
 constexpr std::uint32_t kLinksWithoutSubfolders = 2;
 
 // Containers double when they are full. These hold something for every folder of a volume.
@@ -74,7 +65,7 @@ class FolderIndex::Search {
   Search(const SearchedItem& item, const Volume& volume)
       : mItem(item),
         mRoot(*volume.Root()),
-        mUntrueEntries(volume.HasUntrueEntries()),
+        mUntrueEntries(HasUntrueEntries(volume.Type())),
         mCertain(item.reference != nullptr || IsInodeNumber(item.id)) {}
 
   const ItemReference& Root() const { return mRoot; }
@@ -124,7 +115,7 @@ class FolderIndex::Search {
 };
 
 FolderIndex::FolderIndex(VolumePointer volume)
-    : mVolume(std::move(volume)), mCountsSubfolders(CountsSubfolders(*mVolume)) {}
+    : mVolume(std::move(volume)), mCountsSubfolders(CountsSubfolders(mVolume->Type())) {}
 
 std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std::string& start) {
   Search search(item, *mVolume);

@@ -23,8 +23,9 @@ std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t 
 
 // What stands for a name that has no plain form, at most 31 bytes: as much of the name as fits, '?'
 // for what Mac Roman lacks, "#", the node id in capital hexadecimal, and the extension if it has
-// one of 1 to 5 characters that all can be encoded: "A very long name tha#1B4A3F.aif". Where an item is really called so, the one that only stands for its name has
-// more than one '#': `marks` of them, 1 to kMostMarks.
+// one of 1 to 5 characters that all can be encoded: "A very long name tha#1B4A3F.aif". Where an
+// item is really called so, the one that only stands for its name has more than one '#': `marks` of
+// them, 1 to kMostMarks.
 std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID, std::size_t marks = 1);
 inline constexpr std::size_t kMostMarks = 8;
 

@@ -19,15 +19,16 @@ bool HasBirth(const ItemReference& item) {
   return item.birthNanoseconds != kNoBirth;
 }
 
-bool HasHandle(const ItemReference& item) {
-  return item.handle.size != 0;
-}
-
 // True also for a birth in the future, by a clock that is not ours.
 bool IsNewborn(const ItemReference& item) {
   timespec now{};
   clock_gettime(CLOCK_REALTIME, &now);
   return item.birthSeconds + kNewbornSeconds >= now.tv_sec;
+}
+
+// Devices without hardware, as those of overlays, have the major number 0.
+bool IsProvedByBirth(const ItemReference& item) {
+  return HasBirth(item) && major(item.device) != 0 && !IsNewborn(item);
 }
 
 }  // namespace
@@ -41,6 +42,10 @@ std::optional<ItemReference> Unpack(const FSRef* reference) {
   const auto item = std::bit_cast<ItemReference>(*reference);
   if (item.type == 0 || item.handle.size > kLongestHandle) return std::nullopt;
   return item;
+}
+
+bool HasHandle(const ItemReference& item) {
+  return item.handle.size != 0;
 }
 
 bool AreEqual(const ItemReference& first, const ItemReference& second) {
@@ -75,7 +80,7 @@ std::optional<ItemReference> ReadItem(int folder, const char* name) {
   auto status = ReadStatus(folder, name);
   if (!status) return std::nullopt;
   ItemReference& item = status->item;
-  if (!HasBirth(item) || IsNewborn(item)) item.handle = ReadHandle(folder, name);
+  if (!IsProvedByBirth(item)) item.handle = ReadHandle(folder, name);
   return item;
 }
 
@@ -84,9 +89,9 @@ bool IsAt(const ItemReference& item, int folder, const char* name) {
   if (!status) return false;
   const ItemReference* const found = &status->item;
   if (!AreEqual(*found, item) || found->type != item.type) return false;
+  if (HasHandle(item)) return ReadHandle(folder, name) == item.handle;
   if (found->birthSeconds != item.birthSeconds) return false;
   if (found->birthNanoseconds != item.birthNanoseconds) return false;
-  if (HasHandle(item)) return ReadHandle(folder, name) == item.handle;
   return HasBirth(item) || found->mount == item.mount;
 }
 

@@ -83,13 +83,6 @@ const std::optional<ItemReference>& Volume::Root() const {
   return mRoot;
 }
 
-bool Volume::HasUntrueEntries() const {
-  constexpr auto kOthers =
-      std::to_array<std::string_view>({"overlay", "virtiofs", "vfat", "msdos", "exfat"});
-  return mType.starts_with("fuse") ||
-         std::find(kOthers.begin(), kOthers.end(), mType) != kOthers.end();
-}
-
 const std::string& Volume::Name() const {
   if (!mName) {
     const std::string name = LinuxNameOf(MountPoint());

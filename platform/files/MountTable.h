@@ -46,10 +46,6 @@ class Volume {
   // Of the file system: "ext4", "tmpfs", …
   const std::string& Type() const { return mType; }
 
-  // Whether a folder's entry can have another inode number than its item, also where nothing is
-  // mounted.
-  bool HasUntrueEntries() const;
-
   // In HFS form, 1 to 63 bytes: the last component of the mount point; for "/" the label of the
   // file system, else "Root". Two volumes can have the same name.
   const std::string& Name() const;

@@ -8,6 +8,7 @@
 #include <memory>
 
 #include "files/Catalog.h"
+#include "files/FileSystems.h"
 #include "files/HFSNames.h"
 #include "files/NodeID.h"
 #include "foundation/PathText.h"
@@ -66,7 +67,7 @@ OSErr SearchFolder(const Folder& folder, std::string_view name, bool accented, P
   }
   const std::unique_ptr<DIR, CloseFolder> entries(opendir(folder.place.path.c_str()));
   if (!entries) return ErrorOfSystem();
-  const bool untrueEntries = folder.volume->HasUntrueEntries() ||
+  const bool untrueEntries = HasUntrueEntries(folder.volume->Type()) ||
                              MountTable::OfThisProcess().HoldsMountPoint(folder.place.path);
   std::string plain;
   std::string shortened;

@@ -252,26 +252,54 @@ TEST_F(AnOverlay, FindsAFileByItsNumberAlone) {
   }));
 }
 
-// How often a program started with strace reads folders while it resolves one record.
+// The first rename of what lies below, and the first write to it, give it another birth.
+TEST_F(AnOverlay, LeavesReferencesValidThroughTheFirstChange) {
+  const std::string path = Top() + "/folder 3/below/file";
+  const FSRef item = ReferenceTo(path);
+  if (Unpack(&item)->handle.size == 0) GTEST_SKIP() << "this kernel has no handles for overlays";
+  const auto before = ReadItem(AT_FDCWD, path.c_str());
+  std::filesystem::rename(path, Top() + "/renamed");
+  std::ofstream(Top() + "/renamed") << "written to";
+  const auto after = ReadItem(AT_FDCWD, (Top() + "/renamed").c_str());
+  ASSERT_NE(before->birthNanoseconds, after->birthNanoseconds);
+  EXPECT_EQ(PathOf(item), Top() + "/renamed");
+}
+
+TEST_F(AnOverlay, DoesNotTakeANewItemForOneThatWasDeleted) {
+  const std::string path = Top() + "/folder 3/below/file";
+  const FSRef item = ReferenceTo(path);
+  std::filesystem::remove(path);
+  std::ofstream(path) << "new";
+  EXPECT_EQ(PathOf(item), "(none)");
+}
+
+// The system calls of a process of its own that resolves one record.
+std::string CallsOfResolving(const FSSpec& spec) {
+  const TemporaryFolder folder;
+  const std::string record = folder.MakeFile("record");
+  std::ofstream(record, std::ios::binary).write(reinterpret_cast<const char*>(&spec), sizeof spec);
+  const std::string calls = folder.Path() / "calls";
+  RunTool({"strace", "-E", "ASAN_OPTIONS=detect_leaks=0", "-e",
+           "trace=getdents64,open_by_handle_at", "-o", calls, "sh", "-c",
+           std::string("exec ") + TALLOWMERE_RESOLVE_SPEC + " <" + record});
+  std::ifstream file(calls);
+  return {std::istreambuf_iterator<char>(file), {}};
+}
+
 TEST_F(ARealFileSystem, Ext4IsNotSearchedByAPrivilegedProcess) {
   if (!RunTool({"strace", "-V"})) GTEST_SKIP() << "no strace here";
   MakeImage("ext4", {"mkfs.ext4", "-q", "-F"}, 32 * kMegabyte);
   if (IsSkipped()) return;
   const std::string top = mImage->Path();
   MakeItems(top, true);
-  const FSSpec spec = SpecOf(top + "/folder 3/below/deeper");
-  const TemporaryFolder folder;
-  const std::string record = folder.MakeFile("record");
-  std::ofstream(record, std::ios::binary).write(reinterpret_cast<const char*>(&spec), sizeof spec);
-  const std::string calls = folder.Path() / "calls";
-  ASSERT_TRUE(RunTool({"strace", "-E", "ASAN_OPTIONS=detect_leaks=0", "-e",
-                       "trace=getdents64,open_by_handle_at", "-o", calls, "sh", "-c",
-                       std::string("exec ") + TALLOWMERE_RESOLVE_SPEC + " <" + record}));
-  std::ifstream file(calls);
-  const std::string text{std::istreambuf_iterator<char>(file), {}};
-  if (text.find("EPERM") != std::string::npos) GTEST_SKIP() << "no handles for this process";
-  EXPECT_NE(text.find("open_by_handle_at"), std::string::npos) << text;
-  EXPECT_EQ(text.find("getdents64"), std::string::npos) << text;
+  const FSSpec present = SpecOf(top + "/folder 3/below/deeper");
+  const FSSpec missing = MakeRecord(present.vRefNum, 0x1000, "x");
+  for (const FSSpec& spec : {present, missing}) {
+    const std::string calls = CallsOfResolving(spec);
+    if (calls.find("EPERM") != std::string::npos) GTEST_SKIP() << "no handles for this process";
+    EXPECT_NE(calls.find("open_by_handle_at"), std::string::npos) << calls;
+    EXPECT_EQ(calls.find("getdents64"), std::string::npos) << calls;
+  }
 }
 
 }  // namespace
