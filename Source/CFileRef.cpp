@@ -16,18 +16,18 @@
 #include <string_view>
 
 #include "CFOwned.h"
+#include "LegacyHFSBridge.h"
 
 namespace {
 
 using Text = std::unique_ptr<char[]>;
 
-// What an empty FSSpec holds.
-constexpr SInt16 kNoVolume = 32767;
-constexpr SInt32 kNoFolder = -1;
-
 // Room for a path or a name, in bytes with the NUL. A longer path is converted on the heap; a
 // longer name is refused.
 constexpr std::size_t kTextBufferSize = 1024;
+
+// The longest name in an HFSUniStr255, in UTF-16 units.
+constexpr CFIndex kLongestUnicodeName = sizeof(HFSUniStr255::unicode) / sizeof(UniChar);
 
 // Room for an extension that is compared, with the NUL.
 constexpr std::size_t kExtensionBufferSize = 20;
@@ -45,6 +45,7 @@ constexpr std::string_view kVolumesPrefix = "/Volumes/";
 // What the platform may give for the folder of a bare name.
 constexpr std::string_view kThisFolder = ".";
 constexpr std::string_view kThisFolderMarked = "./";
+constexpr std::string_view kFolderAbove = "..";
 
 // --- Text -------------------------------------------------------------------------------------
 
@@ -63,6 +64,14 @@ std::size_t CopyBounded(char* destination, char const* source, std::size_t size)
 // Null when there is no memory.
 Text AllocateText(std::size_t size) {
   return Text(new (std::nothrow) char[size]);
+}
+
+// Null for null, and when there is no memory.
+Text CopyText(char const* source) {
+  const std::size_t size = source != nullptr ? std::strlen(source) + 1 : 0;
+  Text copy = source != nullptr ? AllocateText(size) : nullptr;
+  if (copy) CopyBounded(copy.get(), source, size);
+  return copy;
 }
 
 std::size_t LengthWithoutTrailingSlashes(char const* path) {
@@ -207,10 +216,14 @@ CFURLRef CreateURLInHomeFolder(CFStringRef tildePath, bool isDirectory) {
 
 // --- Items on disk ----------------------------------------------------------------------------
 
-// Of the item itself; false when there is none.
+// Of the item itself; false when there is none, and for null.
+bool ReadStatus(char const* path, struct stat* about) {
+  return path != nullptr && lstat(path, about) == 0;
+}
+
 bool ReadMode(char const* path, mode_t* mode) {
   struct stat about = {};
-  if (lstat(path, &about) != 0) return false;
+  if (!ReadStatus(path, &about)) return false;
   *mode = about.st_mode;
   return true;
 }
@@ -219,11 +232,28 @@ bool IsFolderMode(mode_t mode) {
   return (mode & kTypeMask) == kFolderType;
 }
 
+// Cuts components off an absolute path until something is there. False when that never comes: what
+// is not there and ends in "." or ".." has only "…/../.." above it, which is not there either.
+bool CutToExisting(char* path) {
+  std::size_t length = std::strlen(path);
+  mode_t mode = 0;
+  while (!ReadMode(path, &mode)) {
+    std::string_view rest(path, length);
+    const std::string_view name = rest.substr(rest.rfind('/') + 1);
+    if (name.empty() || name == kThisFolder || name == kFolderAbove) return false;
+    rest.remove_suffix(name.size());
+    while (rest.size() > 1 && rest.back() == '/') rest.remove_suffix(1);
+    length = rest.size();
+    path[length] = '\0';
+  }
+  return true;
+}
+
 // The text of the link at `path`; null when it is none or cannot be read. The test is a mask, not
 // a comparison of types.
 Text ReadLink(char const* path) {
   struct stat about = {};
-  if (lstat(path, &about) != 0 || (about.st_mode & kLinkType) != kLinkType) return nullptr;
+  if (!ReadStatus(path, &about) || (about.st_mode & kLinkType) != kLinkType) return nullptr;
   const auto size = static_cast<std::size_t>(about.st_size);
   Text target = AllocateText(size + 1);
   if (!target) return nullptr;
@@ -231,6 +261,48 @@ Text ReadLink(char const* path) {
   if (length <= 0) return nullptr;
   target[static_cast<std::size_t>(length)] = '\0';
   return target;
+}
+
+// --- Records ----------------------------------------------------------------------------------
+
+// The bytes behind the name stay as they are.
+void Empty(FSSpec* spec) {
+  spec->vRefNum = kNoVolume;
+  spec->parID = kNoFolder;
+  spec->name[0] = 0;
+}
+
+// False when the catalog does not tell.
+bool ReadCatalog(FSRef const& item, FSCatalogInfoBitmap wanted, FSCatalogInfo* about) {
+  return FSGetCatalogInfo(&item, wanted, about, nullptr, nullptr, nullptr) == noErr;
+}
+
+short VolumeOf(FSRef const& item) {
+  FSCatalogInfo about = {};
+  return ReadCatalog(item, kFSCatInfoVolume, &about) ? about.volume : kNoVolume;
+}
+
+// An id as an FSSpec holds it; kNoNode becomes kNoFolder.
+SInt32 SignedID(unsigned long id) {
+  return static_cast<SInt32>(id);
+}
+
+// The name in HFS form, bluntly cut where the record ends.
+void StoreName(CFStringRef name, FSSpec* spec) {
+  Str255 converted;
+  GetPascalStringFromCFString(name, converted, sizeof converted);
+  converted[0] = std::min<unsigned char>(converted[0], kLongestSpecName);
+  std::memcpy(spec->name, converted, std::size_t{1} + converted[0]);
+}
+
+// In another order of encodings than the names have: Mac Roman has no place of its own in it.
+CFOwned<CFStringRef> StringOfHFSPath(char const* path) {
+  for (const CFStringEncoding encoding : {CFileRef::mLocalEncoding, CFStringGetSystemEncoding(),
+                                          CFStringEncoding{kCFStringEncodingUnicode}}) {
+    CFOwned<CFStringRef> string(CFStringCreateWithCString(kCFAllocatorDefault, path, encoding));
+    if (string) return string;
+  }
+  return {};
 }
 
 }  // namespace
@@ -264,9 +336,7 @@ void CFileRef::Init() {
   mURL = nullptr;
   mPath = nullptr;
   mFSRef = FSRef{};
-  mFSSpec.vRefNum = kNoVolume;
-  mFSSpec.parID = kNoFolder;
-  mFSSpec.name[0] = 0;
+  Empty(&mFSSpec);
 }
 
 void CFileRef::ReInit() {
@@ -431,22 +501,20 @@ CFileRef::operator std::string() const {
 bool CFileRef::Exists() const {
   char const* const path = GetPath();
   mode_t mode = 0;
-  if (path == nullptr || !ReadMode(path, &mode)) return false;
+  if (!ReadMode(path, &mode)) return false;
   if ((mode & kTypeMask) != kLinkType || (mode & kStickyBit) != 0) return true;
   struct stat target = {};
   return stat(path, &target) == 0;
 }
 
 bool CFileRef::IsFolder() const {
-  char const* const path = GetPath();
   mode_t mode = 0;
-  return path != nullptr && ReadMode(path, &mode) && IsFolderMode(mode);
+  return ReadMode(GetPath(), &mode) && IsFolderMode(mode);
 }
 
 bool CFileRef::IsFile() const {
-  char const* const path = GetPath();
   mode_t mode = 0;
-  return path != nullptr && ReadMode(path, &mode) && !IsFolderMode(mode);
+  return ReadMode(GetPath(), &mode) && !IsFolderMode(mode);
 }
 
 bool CFileRef::operator==(CFileRef const& other) const {
@@ -634,12 +702,154 @@ bool CFileRef::ResolveAlias(bool allowInteraction) {
 // A relative text is looked at from the current folder, as it is used; a target that cannot be
 // looked at counts as a file, and so does a link.
 bool CFileRef::FollowLink() {
-  char const* const path = GetPath();
-  const Text target = path != nullptr ? ReadLink(path) : nullptr;
+  const Text target = ReadLink(GetPath());
   if (!target) return false;
   mode_t mode = kTypeMask;
   ReadMode(target.get(), &mode);
   return Set(target.get(), IsFolderMode(mode));
+}
+
+// --- Volume and folder ------------------------------------------------------------------------
+
+// The climb goes to the top, not just to the nearest folder that exists.
+short CFileRef::GetVolumeRefNumber() const {
+  if (!IsValid()) return kNoVolume;
+  FSRef item = {};
+  if (CFURLGetFSRef(mURL, &item)) return VolumeOf(item);
+  CFileRef root(*this);
+  while (root.ClimbToExisting() && !root.IsRoot()) root.SetToParent();
+  return root.IsValid() && CFURLGetFSRef(root.mURL, &item) ? VolumeOf(item) : kNoVolume;
+}
+
+// All that is missing is left out at once, for a path can have tens of thousands of components.
+bool CFileRef::ClimbToExisting() {
+  if (IsFolder()) return true;
+  const Text existing = CopyText(GetPath());
+  if (existing && CutToExisting(existing.get())) return Set(existing.get(), true);
+  ReInit();
+  return false;
+}
+
+long CFileRef::GetParentID() const {
+  CFileRef folder(*this);
+  folder.SetToParent();
+  return folder.IsFolder() ? SignedID(folder.GetNodeID()) : kNoFolder;
+}
+
+long CFileRef::GetDirectoryID() const {
+  return IsFolder() ? SignedID(GetNodeID()) : GetParentID();
+}
+
+unsigned long CFileRef::GetNodeID() const {
+  FSCatalogInfo about = {};
+  const bool known = UpdateInternalFSRef() && ReadCatalog(mFSRef, kFSCatInfoNodeID, &about);
+  return known ? about.nodeID : kNoNode;
+}
+
+bool CFileRef::IsRoot() const {
+  struct stat about = {};
+  if (!ReadStatus(GetPath(), &about)) return false;
+  CFileRef folder(*this);
+  folder.SetToParent();
+  struct stat aboutFolder = {};
+  if (!ReadStatus(folder.GetPath(), &aboutFolder)) return false;
+  return about.st_dev != aboutFolder.st_dev || about.st_ino == aboutFolder.st_ino;
+}
+
+bool CFileRef::UnicodeFileName(HFSUniStr255* name) const {
+  if (!IsValid()) return false;
+  if (UpdateInternalFSRef()) {
+    return FSGetCatalogInfo(&mFSRef, kFSCatInfoNone, nullptr, name, nullptr, nullptr) == noErr;
+  }
+  const CFOwned<CFStringRef> component(CopyFileName());
+  const CFIndex length = component ? CFStringGetLength(component.Get()) : kCFNotFound;
+  if (length == kCFNotFound || length > kLongestUnicodeName) return false;
+  name->length = static_cast<UInt16>(length);
+  CFStringGetCharacters(component.Get(), CFRangeMake(0, length), name->unicode);
+  return true;
+}
+
+// --- FSSpec -----------------------------------------------------------------------------------
+
+bool CFileRef::GetFSSpec(FSSpec* spec) const {
+  if (!IsValid()) return false;
+  Empty(spec);
+  if (UpdateInternalFSRef()) {
+    return FSGetCatalogInfo(&mFSRef, kFSCatInfoNone, nullptr, nullptr, spec, nullptr) == noErr;
+  }
+  CFileRef folder(*this);
+  folder.SetToParent();
+  FSCatalogInfo about = {};
+  if (folder.UpdateInternalFSRef() &&
+      ReadCatalog(folder.mFSRef, kFSCatInfoVolume | kFSCatInfoNodeID, &about)) {
+    spec->vRefNum = about.volume;
+    spec->parID = SignedID(about.nodeID);
+  }
+  const CFOwned<CFStringRef> name(CopyFileName());
+  if (!name) return false;
+  StoreName(name.Get(), spec);
+  return true;
+}
+
+CFileRef::operator FSSpec const&() const {
+  Empty(&mFSSpec);
+  GetFSSpec(&mFSSpec);
+  return mFSSpec;
+}
+
+CFileRef::operator FSSpec const*() const {
+  return &static_cast<FSSpec const&>(*this);
+}
+
+CFileRef::CFileRef(short vRefNum, long dirID, unsigned long nameLength, unsigned short const* name,
+                   bool last)
+    : CFileRef() {
+  Set(vRefNum, dirID, nameLength, name, last);
+}
+
+bool CFileRef::Set(short vRefNum, long dirID, unsigned long nameLength, unsigned short const* name,
+                   bool) {
+  FSRef folder = {};
+  if (FSResolveNodeID(vRefNum, static_cast<UInt32>(dirID), &folder) != noErr) return false;
+  if (nameLength > 0) {
+    FSRef child = {};
+    return FSMakeFSRefUnicode(&folder, nameLength, name, 0, &child) == noErr && Set(&child);
+  }
+  Set(&folder);
+  if (!IsFolder()) ReInit();
+  return IsValid();
+}
+
+// The path is read before the reference is emptied, for it may be the reference's own.
+bool CFileRef::SetFromHFSPath(char const* hfsPath, bool isFolder) {
+  const auto path = hfsPath != nullptr ? StringOfHFSPath(hfsPath) : CFOwned<CFStringRef>();
+  return Set(path.Get(), kPathStyleHFS, isFolder);
+}
+
+CFileRef::CFileRef(FSSpec const* spec, bool searchOtherVolumes, bool last) : CFileRef() {
+  SetFromFSSpec(spec, searchOtherVolumes, last);
+}
+
+CFileRef::CFileRef(FSSpec const& spec, bool searchOtherVolumes, bool last)
+    : CFileRef(&spec, searchOtherVolumes, last) {}
+
+// An alias that leads nowhere stays what it is.
+CFileRef::CFileRef(FSSpec* spec, bool searchOtherVolumes, bool last) : CFileRef() {
+  if (spec == nullptr) return;
+  const FSSpec wanted = BoundedFSSpec(*spec);
+  FSRef item = {};
+  if (FSpMakeFSRef(&wanted, &item) != noErr) {
+    SetFromFSSpec(&wanted, searchOtherVolumes, last);
+    return;
+  }
+  Boolean targetIsFolder = false;
+  Boolean wasAliased = false;
+  FSResolveAliasFile(&item, true, &targetIsFolder, &wasAliased);
+  Set(&item);
+}
+
+bool CFileRef::SetFromFSSpec(FSSpec const* spec, bool searchOtherVolumes, bool last) {
+  return CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC(this, spec, searchOtherVolumes, last);
 }
 
 // --- "~" --------------------------------------------------------------------------------------

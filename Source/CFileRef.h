@@ -24,6 +24,11 @@ enum tPathStyle : UInt32 {
   kPathStyleWindows = 2,  // "C:\a\b"
 };
 
+// What stands for no volume, for no folder and for no item at all.
+inline constexpr SInt16 kNoVolume = 32767;
+inline constexpr SInt32 kNoFolder = -1;
+inline constexpr unsigned long kNoNode = ~0UL;
+
 class CFileRef {
  public:
   // An empty reference, for reading only.
@@ -201,10 +206,72 @@ class CFileRef {
   // as it was, when the item is neither. A relative link text becomes a relative path as it stands.
   bool ResolveAlias(bool allowInteraction);
 
+  // --- Volume and folder ----------------------------------------------------------------------
+  //
+  // Ids are 32 bits wide. The signed results are ids as an FSSpec holds them, so one from
+  // 0x80000000 on is negative; GetNodeID() gives the same id unsigned. Where an id is an argument
+  // its lower 32 bits count, so both forms are taken.
+
+  // The volume that has the item, or the one that would: for an item that does not exist, that of
+  // the volume root above its path. kNoVolume on failure.
+  short GetVolumeRefNumber() const;
+
+  // The id of the folder that holds the item or would; kNoFolder when that is no folder on disk.
+  long GetParentID() const;
+
+  // A folder's own id; for everything else GetParentID().
+  long GetDirectoryID() const;
+
+  // The id of an existing item; kNoNode on failure.
+  unsigned long GetNodeID() const;
+
+  // Whether the item is the top folder of a file system: its parent is on another device, or is the
+  // item itself.
+  bool IsRoot() const;
+
+  // Writes the name as UTF-16. That of an existing item is the catalog's, in which ':' and '/' are
+  // exchanged; any other is the last component as it stands. False, with the record as it was, for
+  // an empty reference and for a component of more than 255 units.
+  bool UnicodeFileName(HFSUniStr255* name) const;
+
+  // --- FSSpec ---------------------------------------------------------------------------------
+  //
+  // The empty FSSpec has kNoVolume, kNoFolder and a name of length 0. Where a record is an
+  // argument, a name length above 63 counts as 63. `last` changes nothing.
+
+  // The record of an existing item is the File Manager's. Any other gets its folder's volume and id
+  // (the empty ones when there is no such folder) and its name, cut to 63 bytes. False, with the
+  // record untouched, for an empty reference; false as well for an item that the catalog refuses
+  // and for a path without a last component.
+  bool GetFSSpec(FSSpec* spec) const;
+
+  // The cached FSSpec, made anew with GetFSSpec(), whatever that says; valid like GetPath().
+  operator FSSpec const&() const;  // NOLINT(google-explicit-constructor)
+  operator FSSpec const*() const;  // NOLINT(google-explicit-constructor)
+
+  // The existing item with a name of `nameLength` UTF-16 units in the folder `dirID`; with length 0
+  // the folder itself. What cannot be found leaves the reference as it was; an id that is not a
+  // folder's, with length 0, leaves it empty.
+  CFileRef(short vRefNum, long dirID, unsigned long nameLength, unsigned short const* name,
+           bool last);
+  bool Set(short vRefNum, long dirID, unsigned long nameLength, unsigned short const* name,
+           bool last);
+
+  // An HFS path with its volume's name in front, in mLocalEncoding or the system's. Null fails.
+  bool SetFromHFSPath(char const* hfsPath, bool isFolder);
+
+  // What CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC makes of the record; null gives an empty
+  // reference. The form for a record that is not const resolves an alias, the others do not.
+  CFileRef(FSSpec const* spec, bool searchOtherVolumes, bool last);
+  CFileRef(FSSpec const& spec, bool searchOtherVolumes, bool last);
+  CFileRef(FSSpec* spec, bool searchOtherVolumes, bool last);
+  bool SetFromFSSpec(FSSpec const* spec, bool searchOtherVolumes, bool last);
+
  private:
   bool Hold(CFURLRef url);  // takes the URL over, into an empty reference; whether it is one
   bool HoldPathOf(CFURLRef url, bool isDirectory);
   bool FollowLink();
+  bool ClimbToExisting();  // to the item itself if that exists; false, and empty, to none
 
   CFURLRef mURL;           // one reference of ours; null when empty
   UInt32 mValid;           // 1 exactly when mURL is not null; the lowest bit counts

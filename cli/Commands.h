@@ -2,11 +2,18 @@
 // could not be answered, with the reason on standard error.
 #pragma once
 
+#include <string>
+
 #include "client/Client.h"
 
 namespace tallowmere::cli {
 
 // Prints number, name and mount point of every volume of this machine.
 int PrintVolumes(const ClientOptions& options);
+
+// Asks one service for the record of every item of a folder, and another for the path of every
+// record. Prints each item that does not come back, each folder that is left out and the figures;
+// 1 when an item did not come back. What vanishes meanwhile does not count.
+int TakeCensus(ClientOptions options, const std::string& folder);
 
 }  // namespace tallowmere::cli

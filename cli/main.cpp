@@ -3,6 +3,7 @@
 #include <CLI/CLI.hpp>
 #include <exception>
 #include <iostream>
+#include <string>
 
 #include "cli/Commands.h"
 
@@ -19,6 +20,10 @@ int Run(int argumentCount, char** arguments) {
   app.add_option("--service", options.service, "The service's program")->type_name("PATH");
   const CLI::App* const volumes =
       app.add_subcommand("volumes", "Print number, name and mount point of every volume");
+  std::string folder;
+  CLI::App* const census = app.add_subcommand(
+      "census", "Check that each item of a folder comes back by its record, in another process");
+  census->add_option("folder", folder, "The folder")->required()->check(CLI::ExistingDirectory);
 
   try {
     app.parse(argumentCount, arguments);
@@ -26,6 +31,7 @@ int Run(int argumentCount, char** arguments) {
     return app.exit(error) == 0 ? 0 : kWrongUsage;
   }
   if (volumes->parsed()) return tallowmere::cli::PrintVolumes(options);
+  if (census->parsed()) return tallowmere::cli::TakeCensus(options, folder);
   return kWrongUsage;
 }
 

@@ -15,6 +15,9 @@
 namespace tallowmere {
 namespace {
 
+// The longest text that a counted string can hold with its NUL, in bytes.
+constexpr std::size_t kLongestText = 65534;
+
 constexpr std::string_view kProgramName = "tallowmere";
 
 bool IsProgram(const std::string& path) {
@@ -70,6 +73,15 @@ class Client::Exchange {
     mRequest.append(text).push_back('\0');
   }
 
+  void PutFlag(bool flag) { Put<std::uint8_t>(flag ? 1 : 0); }
+
+  void PutSpec(const FileSpec& spec) {
+    Put(spec.volume);
+    Put(spec.parentID);
+    Put(static_cast<std::uint8_t>(spec.name.size()));
+    mRequest.append(spec.name).append(protocol::kLongestSpecName - spec.name.size(), '\0');
+  }
+
   void Send() {
     if (mClient.mFailure) return;
     if (const auto sent = mClient.mService.Send(mRequest, mDeadline); !sent) {
@@ -90,6 +102,15 @@ class Client::Exchange {
     std::string text = TakeBytes(Take<std::uint16_t>());
     if (!text.empty()) text.pop_back();
     return text;
+  }
+
+  FileSpec TakeSpec() {
+    FileSpec spec{};
+    spec.volume = Take<std::int16_t>();
+    spec.parentID = Take<std::int32_t>();
+    const auto length = Take<std::uint8_t>();
+    spec.name = TakeBytes(protocol::kLongestSpecName).substr(0, length);
+    return spec;
   }
 
   // The response is whole: `value`, or what went wrong before.
@@ -149,6 +170,31 @@ Result<std::optional<std::string>> Client::GetHFSVolumeName(std::int16_t number)
   const bool found = exchange.Take<std::uint8_t>() != 0;
   std::string name = exchange.TakeString();
   return exchange.Finish(found ? std::optional(std::move(name)) : std::nullopt);
+}
+
+Result<std::optional<FileSpec>> Client::GetFSSpec(std::string_view path) {
+  if (path.size() > kLongestText || path.find('\0') != std::string_view::npos) {
+    return std::optional<FileSpec>{};
+  }
+  Exchange exchange(*this, protocol::kRequestGetFSSpec);
+  exchange.PutString(path);
+  exchange.Send();
+  const bool usable = exchange.Take<std::uint8_t>() != 0;
+  FileSpec spec = exchange.TakeSpec();
+  return exchange.Finish(usable ? std::optional(std::move(spec)) : std::nullopt);
+}
+
+Result<std::optional<std::string>> Client::SetFileRefFromFSSpec(const FileSpec& spec,
+                                                                bool searchOtherVolumes) {
+  if (spec.name.size() > protocol::kLongestSpecName) return std::optional<std::string>{};
+  Exchange exchange(*this, protocol::kRequestSetFileRefFromFSSpec);
+  exchange.PutSpec(spec);
+  exchange.PutFlag(searchOtherVolumes);
+  exchange.PutFlag(false);  // changes nothing
+  exchange.Send();
+  const bool isSet = exchange.Take<std::uint8_t>() != 0;
+  std::string path = exchange.TakeString();
+  return exchange.Finish(isSet && !path.empty() ? std::optional(std::move(path)) : std::nullopt);
 }
 
 }  // namespace tallowmere

@@ -23,6 +23,15 @@ struct ClientOptions {
   std::chrono::milliseconds deadline{10'000};
 };
 
+// What an FSSpec record says: an item by its volume, the id of the folder that holds it and its HFS
+// name in that folder, at most 63 bytes. The id has 32 bits; from 0x80000000 on it is negative
+// here.
+struct FileSpec {
+  std::int16_t volume;
+  std::int32_t parentID;
+  std::string name;
+};
+
 class Client {
  public:
   static Result<Client> Start(const ClientOptions& options = {});
@@ -33,6 +42,16 @@ class Client {
 
   // The HFS name of the volume with that number, or none. 0 asks for the volume of "/".
   Result<std::optional<std::string>> GetHFSVolumeName(std::int16_t number);
+
+  // The record of the item at a POSIX path, or none. An item that does not exist has one where its
+  // folder does. A path above 65534 bytes or with a NUL has none.
+  Result<std::optional<FileSpec>> GetFSSpec(std::string_view path);
+
+  // The POSIX path of the item with that record, or none. Where there is no such item, it is first
+  // looked for on the other volumes if so wished, and is then the path that it would have. A name
+  // above 63 bytes is no record's.
+  Result<std::optional<std::string>> SetFileRefFromFSSpec(const FileSpec& spec,
+                                                          bool searchOtherVolumes);
 
  private:
   Client(ServiceProcess service, std::chrono::milliseconds deadline);

@@ -3,6 +3,7 @@
 #include <unistd.h>
 
 #include <cstring>
+#include <new>
 
 namespace tallowmere::service {
 
@@ -29,6 +30,16 @@ void Channel::TakeCounted(char* buffer, std::size_t longest) {
   buffer[length] = '\0';
 }
 
+std::unique_ptr<char[]> Channel::TakeAllocated() {
+  const std::size_t length = Take<std::uint16_t>();
+  std::unique_ptr<char[]> bytes(new (std::nothrow) char[length + 1]);
+  if (!bytes) Fail();
+  TakeBytes(bytes.get(), length);
+  if (mFailed) return nullptr;
+  bytes[length] = '\0';
+  return bytes;
+}
+
 void Channel::PutBytes(const void* bytes, std::size_t size) {
   const auto* const field = static_cast<const char*>(bytes);
   std::size_t count = 0;
@@ -43,7 +54,7 @@ void Channel::PutBytes(const void* bytes, std::size_t size) {
 }
 
 void Channel::PutString(const char* text) {
-  const std::size_t length = std::strlen(text) + 1;
+  const std::size_t length = text == nullptr ? 0 : std::strlen(text) + 1;
   Put(static_cast<std::uint16_t>(length));
   PutBytes(text, length);
 }

@@ -8,6 +8,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <type_traits>
 
 namespace tallowmere::service {
@@ -36,6 +37,10 @@ class Channel {
   // REQUIRES: `buffer` holds `longest` + 1 bytes.
   void TakeCounted(char* buffer, std::size_t longest);
 
+  // Counted bytes of any length, and a NUL behind them. Null after a failure; a lack of memory is
+  // one.
+  std::unique_ptr<char[]> TakeAllocated();
+
   template <class Number>
   void Put(Number number) {
     static_assert(std::is_arithmetic_v<Number>);
@@ -44,7 +49,8 @@ class Channel {
   void PutFlag(bool flag) { Put<std::uint8_t>(flag ? 1 : 0); }
   void PutBytes(const void* bytes, std::size_t size);
 
-  // The text as a counted string, its NUL inside the count. REQUIRES: below 65535 bytes.
+  // The text as a counted string, its NUL inside the count; for null a count of 0. REQUIRES: below
+  // 65535 bytes.
   void PutString(const char* text);
 
  private:

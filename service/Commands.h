@@ -12,4 +12,9 @@ namespace tallowmere::service {
 void GetVolRefnumByHFSName(Channel& channel);
 void GetHFSVolumeName(Channel& channel);
 
+void GetHFSName(Channel& channel);
+void GetFSSpec(Channel& channel);
+void SetFileRefFromFSSpecData(Channel& channel);
+void SetFileRefFromFSSpec(Channel& channel);
+
 }  // namespace tallowmere::service

@@ -32,6 +32,14 @@ inline constexpr std::string_view kTrailer = "MWLT";
 // The longest volume name in a request, in bytes with its NUL.
 inline constexpr std::size_t kLongestVolumeName = 256;
 
+// The longest HFS name in a request, in bytes with its NUL.
+inline constexpr std::size_t kLongestHFSName = 1024;
+
+// An FSSpec record: the volume reference number (16 bits), the id of the holding folder (32 bits)
+// and the name, a length byte and room for 63 bytes; what lies behind the name is unspecified.
+inline constexpr std::size_t kFileSpecSize = 70;
+inline constexpr std::size_t kLongestSpecName = 63;
+
 // Stands for "no volume" where a volume reference number is expected.
 inline constexpr std::int16_t kNoVolume = 32767;
 

@@ -26,6 +26,10 @@ constexpr auto kCommands = std::to_array<Command>({
     {protocol::kRequestQuit, Quit},
     {protocol::kRequestGetVolRefnumByHFSName, GetVolRefnumByHFSName},
     {protocol::kRequestGetHFSVolumeName, GetHFSVolumeName},
+    {protocol::kRequestGetHFSName, GetHFSName},
+    {protocol::kRequestGetFSSpec, GetFSSpec},
+    {protocol::kRequestSetFileRefFromFSSpecData, SetFileRefFromFSSpecData},
+    {protocol::kRequestSetFileRefFromFSSpec, SetFileRefFromFSSpec},
 });
 
 const Command* FindCommand(std::uint16_t code) {

@@ -1,10 +1,13 @@
 #include "files/Catalog.h"
 
 #include <fcntl.h>
+#include <linux/openat2.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <array>
+#include <cerrno>
 #include <climits>
 #include <cstdlib>
 #include <memory>
@@ -12,6 +15,7 @@
 
 #include "files/Descriptor.h"
 #include "files/FileHandle.h"
+#include "files/FileSystems.h"
 #include "files/FolderIndex.h"
 #include "files/NodeID.h"
 #include "files/PlaceMemory.h"
@@ -31,12 +35,53 @@ Path CanonicalPath(const std::string& path) {
   return foundation::JoinPath(*folder, name);
 }
 
-// The canonical path if the item is there. A path that was canonical when it was remembered is used
-// as it is: wherever its folders are by now, it still leads to this very item.
-Path Verified(const ItemReference& item, const std::string& path, bool isCanonical) {
-  auto canonical = isCanonical ? Path(path) : CanonicalPath(path);
-  if (!canonical || !IsAt(item, AT_FDCWD, canonical->c_str())) return std::nullopt;
-  return canonical;
+// Whether a path is canonical unless there are links on its way.
+bool IsSpelledOut(std::string_view path) {
+  if (path == "/") return true;
+  if (!path.starts_with('/')) return false;
+  while (!path.empty()) {
+    path.remove_prefix(1);
+    const auto name = path.substr(0, path.find('/'));
+    if (name.empty() || name == "." || name == "..") return false;
+    path.remove_prefix(name.size());
+  }
+  return true;
+}
+
+constexpr std::uint64_t kForItsPathAlone = O_PATH | O_NOFOLLOW | O_CLOEXEC;
+
+// Not open when a link is on the way.
+Descriptor OpenWithoutLinks(const std::string& path) {
+  open_how how{};
+  how.flags = kForItsPathAlone;
+  how.resolve = RESOLVE_NO_SYMLINKS;
+  return Descriptor(
+      static_cast<int>(syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how)));
+}
+
+// An item held while it is looked at, and the canonical path by which it was reached.
+struct ReachedItem {
+  std::string path;
+  Descriptor descriptor;
+};
+
+std::optional<ReachedItem> Reach(const std::string& path) {
+  if (IsSpelledOut(path)) {
+    Descriptor descriptor = OpenWithoutLinks(path);
+    if (descriptor.IsOpen()) return ReachedItem{path, std::move(descriptor)};
+  }
+  const Path canonical = CanonicalPath(path);
+  if (!canonical) return std::nullopt;
+  Descriptor descriptor(open(canonical->c_str(), kForItsPathAlone));
+  if (!descriptor.IsOpen()) return std::nullopt;
+  return ReachedItem{*canonical, std::move(descriptor)};
+}
+
+// The canonical path if this very item is there.
+Path Verified(const ItemReference& item, const std::string& path) {
+  auto reached = Reach(path);
+  if (!reached || !IsAt(item, reached->descriptor.Get(), "")) return std::nullopt;
+  return std::move(reached->path);
 }
 
 VolumePointer VolumeOf(const Place& place) {
@@ -48,16 +93,12 @@ bool IsOnVolume(const VolumePointer& volume, const Place& place) {
   return found && found->Number() == volume->Number();
 }
 
-// The item at a path that is taken for canonical, if there is one.
-std::optional<Place> PlaceAt(std::string path) {
-  const auto status = ReadStatus(AT_FDCWD, path.c_str());
-  if (!status) return std::nullopt;
-  return Place{std::move(path), status->item};
-}
-
 // The nearest folder to a former place of an item that is still there and on the volume; else the
-// volume's root folder.
+// volume's root folder. What seems to be on another volume is not looked at: that one may not
+// answer.
 std::string NearestFolder(const VolumePointer& volume, const std::string& formerPlace) {
+  const VolumePointer former = MountTable::OfThisProcess().OfPath(formerPlace);
+  if (!former || former->Number() != volume->Number()) return volume->MountPoint();
   for (std::string path = formerPlace; !path.empty() && path != "/";) {
     path = FolderOf(path);
     // Above a component "." or ".." the spelling leads nowhere.
@@ -79,18 +120,26 @@ Path PathOfDescriptor(const Descriptor& descriptor) {
   return std::string(text.data(), static_cast<std::size_t>(length));
 }
 
-std::optional<FileHandle> HandleOf(const Volume& volume, std::uint64_t inode) {
-  const auto root = volume.Root();
-  return HandleOfInode(ReadHandle(AT_FDCWD, volume.MountPoint().c_str()), root->inode, inode);
+// What a file system said about a handle.
+struct HandleAnswer {
+  Path path;            // not verified
+  bool isGone = false;  // the item is, for certain
+};
+
+// For a process with the privilege. One that has it only in a user namespace is refused what is not
+// below the mount that it asks through, so that a refusal says nothing of a volume's other mounts.
+HandleAnswer AskByHandle(const Volume& volume, const FileHandle& handle, bool findsAll) {
+  const Descriptor root(open(volume.MountPoint().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  if (!root.IsOpen()) return {};
+  const Descriptor opened = OpenByHandle(root.Get(), handle);
+  if (opened.IsOpen()) return {PathOfDescriptor(opened), false};
+  return {std::nullopt, findsAll && errno == ESTALE && volume.MountPoints().size() == 1};
 }
 
-// For a process with the privilege. The path is not verified.
-Path PathByHandle(const Volume& volume, const std::optional<FileHandle>& handle) {
-  if (!handle) return std::nullopt;
-  const Descriptor root(open(volume.MountPoint().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-  if (!root.IsOpen()) return std::nullopt;
-  const Descriptor opened = OpenByHandle(root.Get(), *handle);
-  return opened.IsOpen() ? PathOfDescriptor(opened) : std::nullopt;
+HandleAnswer AskByInode(const Volume& volume, std::uint64_t inode) {
+  const FileHandle rootHandle = ReadHandle(AT_FDCWD, volume.MountPoint().c_str());
+  const auto handle = HandleOfInode(rootHandle, volume.Root()->inode, inode);
+  return handle ? AskByHandle(volume, *handle, FindsAllByInode(volume.Type())) : HandleAnswer{};
 }
 
 // What passes over volumes have learned. Indexes of volumes that are gone go with the next new one.
@@ -98,9 +147,10 @@ FolderIndex& IndexOf(const VolumePointer& volume) {
   static std::vector<FolderIndex> indexes;
   for (FolderIndex& index : indexes) {
     const VolumePointer& known = index.OfVolume();
-    if (known->Number() == volume->Number() && AreEqual(*known->Root(), *volume->Root())) {
-      return index;
-    }
+    if (known->Number() != volume->Number() || !AreEqual(*known->Root(), *volume->Root())) continue;
+    // What was learned hangs on the places where the volume was mounted.
+    if (known->MountPoints() != volume->MountPoints()) index = FolderIndex(volume);
+    return index;
   }
   std::erase_if(indexes, [](const FolderIndex& index) {
     return !MountTable::OfThisProcess().WithNumber(index.OfVolume()->Number());
@@ -135,19 +185,41 @@ Path RememberedPath(const Volume& volume, std::uint32_t id) {
   ItemReference item{};
   item.device = volume.Root()->device;
   item.inode = id;
-  const auto* const remembered = PlaceMemory::OfThisProcess().Recall(item);
-  if (remembered == nullptr) return std::nullopt;
-  return remembered->canonical ? Path(remembered->path) : CanonicalPath(remembered->path);
+  const std::string* const remembered = PlaceMemory::OfThisProcess().Recall(item);
+  return remembered == nullptr ? std::nullopt : Path(*remembered);
+}
+
+// What can be said of an id without reading a folder.
+struct QuickAnswer {
+  std::optional<Place> place;
+  bool isGone = false;  // no item has the id, for certain
+};
+
+QuickAnswer AskAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder) {
+  if (!volume->Root() || !IsInodeNumber(id)) return {};
+  auto place = WithID(volume, id, folder, RememberedPath(*volume, id));
+  if (place) return {std::move(place), false};
+  const HandleAnswer answer = AskByInode(*volume, id);
+  place = WithID(volume, id, folder, answer.path);
+  if (place) RememberPlace(*place);
+  return {std::move(place), answer.isGone};
 }
 
 }  // namespace
 
 void RememberPlace(const ItemReference& item, std::string_view path) {
-  PlaceMemory::OfThisProcess().Remember(item, path, false);
+  PlaceMemory::OfThisProcess().Remember(item, path);
 }
 
 void RememberPlace(const Place& place) {
-  PlaceMemory::OfThisProcess().Remember(place.item, place.path, true);
+  RememberPlace(place.item, place.path);
+}
+
+std::optional<Place> PlaceAt(const std::string& path) {
+  auto reached = Reach(path);
+  const auto item = reached ? ReadItem(reached->descriptor.Get(), "") : std::nullopt;
+  if (!item) return std::nullopt;
+  return Place{std::move(reached->path), *item};
 }
 
 std::optional<std::string> RealPath(const std::string& path) {
@@ -164,45 +236,40 @@ std::string FolderOf(const std::string& path) {
 }
 
 std::optional<std::string> FindPlace(const ItemReference& item) {
-  const auto* const remembered = PlaceMemory::OfThisProcess().Recall(item);
-  const std::string former = remembered == nullptr ? "" : remembered->path;
-  if (remembered != nullptr) {
-    const bool wasCanonical = remembered->canonical;
-    if (auto place = Verified(item, former, wasCanonical)) {
-      if (!wasCanonical) RememberPlace({*place, item});
-      return place;
+  const std::string* const remembered = PlaceMemory::OfThisProcess().Recall(item);
+  const std::string former = remembered == nullptr ? "" : *remembered;
+  Path place = former.empty() ? std::nullopt : Verified(item, former);
+  if (!place) {
+    const auto volume = MountTable::OfThisProcess().OfItem(item, former);
+    if (!volume || !volume->Root()) return std::nullopt;
+    const HandleAnswer answer =
+        HasHandle(item) ? AskByHandle(*volume, item.handle, FindsAllByHandle(volume->Type()))
+                        : AskByInode(*volume, item.inode);
+    if (answer.isGone) return std::nullopt;
+    place = answer.path ? Verified(item, *answer.path) : std::nullopt;
+    if (!place) {
+      const SearchedItem wanted{NodeIDOf(item, *volume->Root()), &item, S_ISDIR(item.type)};
+      const Path found = IndexOf(volume).Find(wanted, NearestFolder(volume, former));
+      place = found ? Verified(item, *found) : std::nullopt;
     }
   }
-  const auto volume = MountTable::OfThisProcess().OfItem(item, former);
-  if (!volume || !volume->Root()) return std::nullopt;
-
-  Path path =
-      PathByHandle(*volume, item.handle.size != 0 ? item.handle : HandleOf(*volume, item.inode));
-  auto place = path ? Verified(item, *path, false) : std::nullopt;
-  if (!place) {
-    const SearchedItem wanted{NodeIDOf(item, *volume->Root()), &item, S_ISDIR(item.type)};
-    path = IndexOf(volume).Find(wanted, NearestFolder(volume, former));
-    place = path ? Verified(item, *path, false) : std::nullopt;
-  }
-  if (place) RememberPlace({*place, item});
+  if (place) RememberPlace(item, *place);
   return place;
 }
 
+std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder) {
+  return AskAtOnce(volume, id, folder).place;
+}
+
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder) {
-  if (!volume->Root()) return std::nullopt;
+  if (!CanBeNodeID(id) || !volume->Root()) return std::nullopt;
   if (id == kRootFolderID) return RootOf(volume);
 
-  std::optional<Place> place;
-  if (IsInodeNumber(id)) {
-    place = WithID(volume, id, folder, RememberedPath(*volume, id));
-    if (place) return place;
-    place = WithID(volume, id, folder, PathByHandle(*volume, HandleOf(*volume, id)));
-  }
-  if (!place) {
-    const std::string latest(PlaceMemory::OfThisProcess().Latest());
-    const std::string start = NearestFolder(volume, latest);
-    place = WithID(volume, id, folder, IndexOf(volume).Find({id, nullptr, folder}, start));
-  }
+  QuickAnswer answer = AskAtOnce(volume, id, folder);
+  if (answer.place || answer.isGone) return std::move(answer.place);
+  const std::string latest(PlaceMemory::OfThisProcess().Latest());
+  const std::string start = NearestFolder(volume, latest);
+  auto place = WithID(volume, id, folder, IndexOf(volume).Find({id, nullptr, folder}, start));
   if (place) RememberPlace(*place);
   return place;
 }

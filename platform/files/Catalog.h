@@ -19,9 +19,11 @@ namespace tallowmere::files {
 
 // Remembers that the item was found at an absolute path, for as long as there is room.
 void RememberPlace(const ItemReference& item, std::string_view path);
-
-// The same for a canonical path.
 void RememberPlace(const Place& place);
+
+// The item at an absolute path, links on the way followed, one in the last place not. None when
+// there is none.
+std::optional<Place> PlaceAt(const std::string& path);
 
 // The canonical path of a folder that a path leads to, all links followed.
 std::optional<std::string> RealPath(const std::string& path);
@@ -35,5 +37,9 @@ std::optional<std::string> FindPlace(const ItemReference& item);
 // The item with a node id on a volume; with `folder` nothing but a folder. None when there is none
 // and when it is not certain which item that is.
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder);
+
+// The same without reading a folder: none too when the item has no remembered place and cannot be
+// opened by its number.
+std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder);
 
 }  // namespace tallowmere::files

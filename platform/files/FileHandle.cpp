@@ -40,8 +40,10 @@ bool ReadHandle(int folder, const char* name, int flags, HandleBuffer& buffer) {
 FileHandle ReadHandle(int folder, const char* name) {
   HandleBuffer buffer;
   FileHandle handle{};
-  const bool isRead = ReadHandle(folder, name, 0, buffer) ||
-                      (errno == EOPNOTSUPP && ReadHandle(folder, name, kOnlyToIdentify, buffer));
+  const int flags = *name == '\0' ? AT_EMPTY_PATH : 0;
+  const bool isRead =
+      ReadHandle(folder, name, flags, buffer) ||
+      (errno == EOPNOTSUPP && ReadHandle(folder, name, flags | kOnlyToIdentify, buffer));
   if (!isRead) return handle;
   handle.type = buffer.Get()->handle_type;
   handle.size = buffer.Get()->handle_bytes;

@@ -26,7 +26,7 @@ struct FileHandle {
 };
 
 // The handle of the item itself, links not followed; none when its file system has none or there is
-// no item. `folder` as in openat(2).
+// no item. `folder` as in openat(2); with an empty name, of the open item itself.
 FileHandle ReadHandle(int folder, const char* name);
 
 // The handle of an inode with any generation, made from that of another item of its file system.
@@ -35,7 +35,8 @@ std::optional<FileHandle> HandleOfInode(const FileHandle& sibling, std::uint64_t
                                         std::uint64_t inode);
 
 // Opens an item for its path alone (O_PATH). `onVolume` is open for reading on the same file
-// system. Not open when there is no such item and where the process lacks the privilege.
+// system. Not open when there is no such item and where the process lacks the privilege; errno
+// tells, ESTALE when the file system does not find the item.
 Descriptor OpenByHandle(int onVolume, const FileHandle& handle);
 
 }  // namespace tallowmere::files

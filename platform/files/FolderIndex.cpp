@@ -6,13 +6,16 @@
 
 #include <algorithm>
 #include <array>
+#include <cerrno>
 #include <climits>
 #include <cstddef>
 #include <ctime>
 #include <limits>
 #include <utility>
 
+#include "files/FileSystems.h"
 #include "files/NodeID.h"
+#include "files/Spread.h"
 #include "foundation/PathText.h"
 
 namespace tallowmere::files {
@@ -41,10 +44,13 @@ bool IsThisOrParent(const char* name) {
   return name[0] == '.' && (name[1] == '\0' || (name[1] == '.' && name[2] == '\0'));
 }
 
-// Where an entry's number can be another than the item's own.
-bool HasUntrueEntries(const Volume& volume) {
-  return volume.Type() == "overlay" || volume.Type().starts_with("fuse") ||
-         volume.Type() == "virtiofs";
+constexpr std::uint32_t kLinksWithoutSubfolders = 2;
+
+// Containers double when they are full. These hold something for every folder of a volume.
+template <class Container>
+void ReserveFor(Container& container, std::size_t more) {
+  const std::size_t size = container.size() + more;
+  if (size > container.capacity()) container.reserve(size + size / 4);
 }
 
 std::string WithoutFolderMark(const std::string& path) {
@@ -59,7 +65,7 @@ class FolderIndex::Search {
   Search(const SearchedItem& item, const Volume& volume)
       : mItem(item),
         mRoot(*volume.Root()),
-        mUntrueEntries(HasUntrueEntries(volume)),
+        mUntrueEntries(HasUntrueEntries(volume.Type())),
         mCertain(item.reference != nullptr || IsInodeNumber(item.id)) {}
 
   const ItemReference& Root() const { return mRoot; }
@@ -108,46 +114,65 @@ class FolderIndex::Search {
   std::vector<Found> mFound;  // different items
 };
 
-FolderIndex::FolderIndex(VolumePointer volume) : mVolume(std::move(volume)) {}
+FolderIndex::FolderIndex(VolumePointer volume)
+    : mVolume(std::move(volume)), mCountsSubfolders(CountsSubfolders(mVolume->Type())) {}
 
 std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std::string& start) {
   Search search(item, *mVolume);
   ++mSearches;
-  FindKnown(search);
-  if (search.HasFound() && (search.IsCertain() || (IsWhole() && item.folder))) {
-    return search.Answer();
+  if (mUnusedNames > mNames.size() / 2) Clear();
+  try {
+    Run(search, start);
+  } catch (...) {
+    Clear();
+    throw;
   }
-  // What is known are folders. Whoever looks for a file reads them all anew.
-  if (!item.folder) Clear();
-  Walk(start, search);
-  if (item.folder && !search.HasFound()) CheckKnown(search);
+  mOpen.clear();
+  if (mWaiting.empty()) mWaiting = {};
   return search.Answer();
 }
 
-std::size_t FolderIndex::Size() const {
-  return mFolders.capacity() * sizeof(Folder) + mTable.capacity() * sizeof(mTable[0]) +
-         mNames.capacity();
+// What is known are folders. Whoever looks for a file reads them all anew.
+void FolderIndex::Run(Search& search, const std::string& start) {
+  if (!MountTable::OfThisProcess().WithNumber(mVolume->Number())) return;
+  if (search.IsCertain()) FindKnown(search);
+  if (search.IsSettled()) return;
+  if (!search.WantsFolder()) Clear();
+  if (!mIsWhole || !mWaiting.empty()) Walk(start, search);
+  if (search.WantsFolder()) CheckKnown(search);
 }
 
+std::size_t FolderIndex::Size() const {
+  std::size_t size = mFolders.capacity() * sizeof(Folder) + mTable.capacity() * sizeof(mTable[0]) +
+                     mNames.capacity() + mWaiting.capacity() * sizeof(Waiting);
+  for (const Waiting& waiting : mWaiting) size += waiting.name.capacity();
+  return size;
+}
+
+// Gives the memory back, too.
 void FolderIndex::Clear() {
-  mFolders.clear();
-  mTable.clear();
-  mNames.clear();
-  mWaiting.clear();
+  mFolders = {};
+  mTable = {};
+  mNames = {};
+  mWaiting = {};
   mOpen.clear();
   mIsWhole = false;
+  mUnusedNames = 0;
 }
 
 void FolderIndex::FindKnown(Search& search) const {
   if (mTable.empty()) return;
   const std::size_t mask = mTable.size() - 1;
-  for (std::size_t slot = search.ID() & mask; mTable[slot] != kNone; slot = (slot + 1) & mask) {
+  for (std::size_t slot = FirstSlot(search.ID(), mTable.size()); mTable[slot] != kNone;
+       slot = (slot + 1) & mask) {
     const Folder& folder = mFolders[mTable[slot]];
     if (folder.id != search.ID()) continue;
     const std::string path = PathOf(mTable[slot]);
+    if (!IsReachable(path)) continue;
     const auto status = ReadStatus(AT_FDCWD, path.c_str());
     if (!status || status->item.inode != folder.inode) continue;
-    search.Offer(status->item, AT_FDCWD, path.c_str(), [&path] { return path; });
+    search.Offer(status->item, AT_FDCWD, path.c_str(),
+                 [&path]() -> const std::string& { return path; });
   }
 }
 
@@ -183,34 +208,59 @@ void FolderIndex::VisitWaiting(std::size_t remaining, Search& search) {
 }
 
 void FolderIndex::Visit(const Waiting& waiting, Search& search) {
-  Descriptor descriptor = Open(waiting);
-  if (!descriptor.IsOpen()) return;
-  const auto status = ReadStatus(descriptor.Get(), "");
-  if (!status || !IsOfVolume(status->item, waiting)) return;
+  const std::int64_t now = Now();
+  const auto parent = WayTo(waiting);
+  if (!parent) return;
+  const char* const name = waiting.name.c_str();
+  Descriptor descriptor;
+  if (!mCountsSubfolders) descriptor = Open(*parent, waiting.name);
+  const auto status =
+      descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : ReadStatus(*parent, name);
+  if (!status || !S_ISDIR(status->item.type) || !IsOfVolume(status->item, waiting)) return;
 
   const std::uint32_t index = Learn(status->item, waiting);
-  search.Offer(status->item, descriptor.Get(), "", [&] { return PathOf(index); });
+  search.Offer(status->item, *parent, name, [&] { return PathOf(index); });
   Folder& folder = mFolders[index];
   if (folder.change == status->change) {
     folder.checked = mSearches;
     return;
   }
   folder.change = kNotRead;
+  if (search.IsSettled()) {
+    mWaiting.push_back(waiting);
+    return;
+  }
+  const bool isLeaf = mCountsSubfolders && status->links == kLinksWithoutSubfolders;
+  if (isLeaf && search.WantsFolder()) return MarkAsRead(index, status->change, now);
+
+  if (!descriptor.IsOpen()) {
+    descriptor = Open(*parent, waiting.name);
+    const bool isRefused = !descriptor.IsOpen() && errno == EACCES;
+    if (isRefused) MarkAsRead(index, status->change, now);
+    // Another folder may have come in the meantime.
+    const auto opened = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
+    if (!opened || !AreEqual(opened->item, status->item)) return;
+  }
   const std::size_t before = mWaiting.size();
-  if (search.IsSettled() || !Read(index, descriptor, search)) {
+  if (!Read(index, status->item.device, descriptor, search)) {
     mWaiting.resize(before);
     mWaiting.push_back(waiting);
     return;
   }
-  const bool mayChangeUnseen = status->change + kCoarsestTick >= Now();
-  mFolders[index].change = mayChangeUnseen ? kNotRead : status->change;
-  mFolders[index].checked = mSearches;
+  MarkAsRead(index, status->change, now);
   if (mWaiting.size() > before) KeepOpen(index, std::move(descriptor));
 }
 
-// Whether it was read to its end: not when the search was settled on the way, nor when reading
-// failed.
-bool FolderIndex::Read(std::uint32_t index, const Descriptor& descriptor, Search& search) {
+// `change` and `now` as they were before it was read.
+void FolderIndex::MarkAsRead(std::uint32_t index, std::int64_t change, std::int64_t now) {
+  const bool mayChangeUnseen = change + kCoarsestTick >= now;
+  mFolders[index].change = mayChangeUnseen ? kNotRead : change;
+  mFolders[index].checked = mSearches;
+}
+
+// Whether it was read to its end: not when the search was settled on the way.
+bool FolderIndex::Read(std::uint32_t index, std::uint64_t device, const Descriptor& descriptor,
+                       Search& search) {
   struct Entry {  // struct linux_dirent64 of getdents(2)
     std::uint64_t inode;
     std::int64_t offset;
@@ -229,12 +279,14 @@ bool FolderIndex::Read(std::uint32_t index, const Descriptor& descriptor, Search
       at += entry->size;
       if (IsThisOrParent(name)) continue;
       bool isFolder = entry->type == DT_DIR;
-      if (entry->type == DT_UNKNOWN || search.MayBe(entry->inode, search.Root().device, isFolder)) {
+      if (entry->type == DT_UNKNOWN || search.MayBe(entry->inode, device, isFolder)) {
+        const std::string path = foundation::JoinPath(PathOf(index), name);
+        if (MountTable::OfThisProcess().IsMountPoint(path)) continue;
         const auto status = ReadStatus(descriptor.Get(), name);
         if (!status || status->item.mount != mount) continue;
         isFolder = S_ISDIR(status->item.type);
         search.Offer(status->item, descriptor.Get(), name,
-                     [&] { return foundation::JoinPath(PathOf(index), name); });
+                     [&path]() -> const std::string& { return path; });
         if (search.IsSettled()) return false;
       }
       if (isFolder) mWaiting.push_back({index, name});
@@ -243,26 +295,38 @@ bool FolderIndex::Read(std::uint32_t index, const Descriptor& descriptor, Search
 }
 
 // Looks at every folder that this search has not seen: folders that have changed are read again,
-// those that have moved are found where they are now.
+// and those that have moved are found where they are now. A folder is gone when it is not there
+// even after all others have been looked at.
 void FolderIndex::CheckKnown(Search& search) {
   for (const bool last : {false, true}) {
     for (std::uint32_t index = 0; index < mFolders.size() && !search.IsSettled(); ++index) {
+      if (mFolders[index].id == 0 || mFolders[index].checked == mSearches) continue;
+      if (CheckUnchanged(index, search)) continue;
       const Folder& folder = mFolders[index];
-      if (folder.id == 0 || folder.checked == mSearches) continue;
-      if (!IsUnchanged(index)) {
-        Visit({folder.parent, std::string(NameOf(folder))}, search);
-        VisitWaiting(0, search);
-      }
+      Visit({folder.parent, std::string(NameOf(folder))}, search);
+      VisitWaiting(0, search);
       Folder& seen = mFolders[index];
-      if (last && seen.checked != mSearches && !search.IsSettled()) seen.id = 0;
+      if (!last || seen.checked == mSearches || search.IsSettled()) continue;
+      mUnusedNames += NameOf(seen).size() + 1;
+      seen.id = 0;
     }
   }
 }
 
-bool FolderIndex::IsUnchanged(std::uint32_t index) const {
-  const auto status = ReadStatus(AT_FDCWD, PathOf(index).c_str());
-  const Folder& folder = mFolders[index];
-  return status && status->item.inode == folder.inode && status->change == folder.change;
+// Whether the folder is where it is known to be, as it was when it was read. It then counts as
+// seen.
+bool FolderIndex::CheckUnchanged(std::uint32_t index, Search& search) {
+  const std::string path = PathOf(index);
+  if (!IsReachable(path)) return false;
+  const auto status = ReadStatus(AT_FDCWD, path.c_str());
+  Folder& folder = mFolders[index];
+  if (!status || status->item.inode != folder.inode || status->change != folder.change) {
+    return false;
+  }
+  folder.checked = mSearches;
+  search.Offer(status->item, AT_FDCWD, path.c_str(),
+               [&path]() -> const std::string& { return path; });
+  return true;
 }
 
 // The folder's index. One that was known may have moved.
@@ -271,10 +335,9 @@ std::uint32_t FolderIndex::Learn(const ItemReference& item, const Waiting& waiti
   std::uint32_t index = Known(item.inode, id);
   if (index == kNone) {
     index = static_cast<std::uint32_t>(mFolders.size());
+    ReserveFor(mFolders, 1);
     mFolders.push_back({item.inode, kNotRead, id, kNone, 0, item.mount, 0});
-    mFolders.back().name = static_cast<std::uint32_t>(mNames.size());
-    mNames.append(waiting.name).push_back('\0');
-    mFolders.back().parent = waiting.parent;
+    Rename(mFolders.back(), waiting);
     Insert(index);
     return index;
   }
@@ -283,12 +346,18 @@ std::uint32_t FolderIndex::Learn(const ItemReference& item, const Waiting& waiti
   const bool isFurther = waiting.parent == kNone && folder.parent != kNone;
   if (folder.mount == item.mount && isFurther) return index;
   if (folder.parent != waiting.parent || NameOf(folder) != waiting.name) {
-    folder.name = static_cast<std::uint32_t>(mNames.size());
-    mNames.append(waiting.name).push_back('\0');
-    folder.parent = waiting.parent;
+    mUnusedNames += NameOf(folder).size() + 1;
+    Rename(folder, waiting);
     folder.mount = item.mount;
   }
   return index;
+}
+
+void FolderIndex::Rename(Folder& folder, const Waiting& waiting) {
+  ReserveFor(mNames, waiting.name.size() + 1);
+  folder.name = static_cast<std::uint32_t>(mNames.size());
+  mNames.append(waiting.name).push_back('\0');
+  folder.parent = waiting.parent;
 }
 
 // Whether a folder that was come upon belongs to the walk: at a start it is on the volume, further
@@ -305,7 +374,8 @@ bool FolderIndex::IsOfVolume(const ItemReference& item, const Waiting& waiting) 
 std::uint32_t FolderIndex::Known(std::uint64_t inode, std::uint32_t id) const {
   if (mTable.empty()) return kNone;
   const std::size_t mask = mTable.size() - 1;
-  for (std::size_t slot = id & mask; mTable[slot] != kNone; slot = (slot + 1) & mask) {
+  for (std::size_t slot = FirstSlot(id, mTable.size()); mTable[slot] != kNone;
+       slot = (slot + 1) & mask) {
     const Folder& folder = mFolders[mTable[slot]];
     if (folder.id == id && folder.inode == inode) return mTable[slot];
   }
@@ -315,7 +385,7 @@ std::uint32_t FolderIndex::Known(std::uint64_t inode, std::uint32_t id) const {
 void FolderIndex::Insert(std::uint32_t index) {
   const auto put = [this](std::uint32_t entry) {
     const std::size_t mask = mTable.size() - 1;
-    std::size_t slot = mFolders[entry].id & mask;
+    std::size_t slot = FirstSlot(mFolders[entry].id, mTable.size());
     while (mTable[slot] != kNone) slot = (slot + 1) & mask;
     mTable[slot] = entry;
   };
@@ -348,29 +418,43 @@ std::string FolderIndex::PathOf(const Waiting& waiting) const {
   return foundation::JoinPath(PathOf(waiting.parent), waiting.name);
 }
 
-// Not open where something is mounted, which to open could mean to wait.
-Descriptor FolderIndex::Open(const Waiting& waiting) {
-  constexpr int kFlags = O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC;
-  ++mOpenedFolders;
-  if (waiting.parent == kNone) return Descriptor(open(waiting.name.c_str(), kFlags));
-  const Descriptor* const parent = OpenParent(waiting.parent);
-  if (parent == nullptr) return {};
-  if (mOpen.back().holdsMountPoint && MountTable::OfThisProcess().IsMountPoint(PathOf(waiting))) {
-    return {};
+// Not what lies under the mount of another file system, for which one could wait.
+bool FolderIndex::IsReachable(std::string path) const {
+  const auto& mountPoints = mVolume->MountPoints();
+  for (; path.size() > 1; path.resize(path.rfind('/'))) {
+    if (!MountTable::OfThisProcess().IsMountPoint(path)) continue;
+    return std::find(mountPoints.begin(), mountPoints.end(), path) != mountPoints.end();
   }
-  return Descriptor(openat(parent->Get(), waiting.name.c_str(), kFlags));
+  return true;
 }
 
-// Null when it cannot be opened.
-const Descriptor* FolderIndex::OpenParent(std::uint32_t index) {
-  while (!mOpen.empty() && mOpen.back().index != index) mOpen.pop_back();
-  if (mOpen.empty()) {
-    Descriptor descriptor(
-        open(PathOf(index).c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
-    if (!descriptor.IsOpen()) return nullptr;
-    KeepOpen(index, std::move(descriptor));
+// The open folder in which to look for the name, as in openat(2). None where something is mounted,
+// and where the parent cannot be opened.
+std::optional<int> FolderIndex::WayTo(const Waiting& waiting) {
+  if (waiting.parent == kNone) return AT_FDCWD;
+  if (!OpenParent(waiting.parent)) return std::nullopt;
+  const OpenFolder& parent = mOpen.back();
+  if (parent.holdsMountPoint && MountTable::OfThisProcess().IsMountPoint(PathOf(waiting))) {
+    return std::nullopt;
   }
-  return &mOpen.back().descriptor;
+  return parent.descriptor.Get();
+}
+
+Descriptor FolderIndex::Open(int parent, const std::string& name) {
+  ++mOpenedFolders;
+  return Descriptor(openat(parent, name.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+}
+
+// Makes a folder the last of the open ones. False when it cannot be opened.
+bool FolderIndex::OpenParent(std::uint32_t index) {
+  while (!mOpen.empty() && mOpen.back().index != index) mOpen.pop_back();
+  if (!mOpen.empty()) return true;
+  const std::string path = PathOf(index);
+  if (!IsReachable(path)) return false;
+  Descriptor descriptor(open(path.c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  if (!descriptor.IsOpen()) return false;
+  KeepOpen(index, std::move(descriptor));
+  return true;
 }
 
 void FolderIndex::KeepOpen(std::uint32_t index, Descriptor descriptor) {

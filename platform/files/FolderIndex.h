@@ -4,7 +4,8 @@
 // What a pass learns about folders is kept, under 64 bytes and the name for each; files are not
 // kept. A pass stops as soon as the answer is certain and goes on from there for the next question.
 // A folder that was read is read again only when its change time has moved. The index never leaves
-// its volume, waits for no server and no automounter, and passes over what it may not read.
+// its volume, waits for no server and no automounter, and passes over what it may not read. Between
+// two questions it has nothing open.
 //
 // One thread. Everything may throw std::bad_alloc, after which the index is as good as new.
 #pragma once
@@ -43,7 +44,7 @@ class FolderIndex {
   // How many folders were opened so far, for tests and benchmarks.
   std::uint64_t OpenedFolders() const { return mOpenedFolders; }
 
-  // Bytes in use for what was learned.
+  // Bytes in use for what was learned and for what is left to be visited.
   std::size_t Size() const;
 
  private:
@@ -69,14 +70,16 @@ class FolderIndex {
   };
 
   void Clear();
-  bool IsWhole() const { return mIsWhole && mWaiting.empty(); }
+  void Run(Search& search, const std::string& start);
   void FindKnown(Search& search) const;
   void Walk(const std::string& start, Search& search);
   void VisitWaiting(std::size_t remaining, Search& search);
   void Visit(const Waiting& waiting, Search& search);
-  bool Read(std::uint32_t index, const Descriptor& descriptor, Search& search);
+  bool Read(std::uint32_t index, std::uint64_t device, const Descriptor& descriptor,
+            Search& search);
+  void MarkAsRead(std::uint32_t index, std::int64_t change, std::int64_t now);
   void CheckKnown(Search& search);
-  bool IsUnchanged(std::uint32_t index) const;
+  bool CheckUnchanged(std::uint32_t index, Search& search);
 
   std::uint32_t Learn(const ItemReference& item, const Waiting& waiting);
   bool IsOfVolume(const ItemReference& item, const Waiting& waiting) const;
@@ -85,8 +88,11 @@ class FolderIndex {
   std::string_view NameOf(const Folder& folder) const { return mNames.data() + folder.name; }
   std::string PathOf(std::uint32_t index) const;
   std::string PathOf(const Waiting& waiting) const;
-  Descriptor Open(const Waiting& waiting);
-  const Descriptor* OpenParent(std::uint32_t index);
+  void Rename(Folder& folder, const Waiting& waiting);
+  bool IsReachable(std::string path) const;
+  std::optional<int> WayTo(const Waiting& waiting);
+  Descriptor Open(int parent, const std::string& name);
+  bool OpenParent(std::uint32_t index);
   void KeepOpen(std::uint32_t index, Descriptor descriptor);
 
   VolumePointer mVolume;
@@ -96,6 +102,8 @@ class FolderIndex {
   std::vector<Waiting> mWaiting;      // to be visited, the last one first
   std::vector<OpenFolder> mOpen;      // the way to the folder in hand, its last part
   bool mIsWhole = false;              // every start has been walked from
+  bool mCountsSubfolders;             // by the links of each folder
+  std::size_t mUnusedNames = 0;       // bytes in mNames, of folders that were renamed or are gone
   std::uint32_t mSearches = 0;
   std::uint64_t mOpenedFolders = 0;
 };

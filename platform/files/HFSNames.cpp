@@ -46,6 +46,19 @@ std::string CapitalHexadecimal(std::uint32_t number) {
   return text;
 }
 
+// What a short name without its extension says.
+std::optional<ShortNameParts> ReadShortStem(std::string_view stem) {
+  const std::size_t mark = stem.rfind(kMark);
+  if (mark == std::string_view::npos) return std::nullopt;
+  const std::string_view number = stem.substr(mark + 1);
+  std::uint32_t id = 0;
+  const auto [end, error] = std::from_chars(number.data(), number.data() + number.size(), id, 16);
+  if (error != std::errc{} || CapitalHexadecimal(id) != number) return std::nullopt;
+  std::size_t marks = 1;
+  while (marks < kMostMarks && mark >= marks && stem[mark - marks] == kMark) ++marks;
+  return ShortNameParts{id, marks};
+}
+
 }  // namespace
 
 std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t limit) {
@@ -62,17 +75,14 @@ std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID, std::
   return EncodeWithQuestionMarks(stem, kLongestShortName - tail.size()) + tail;
 }
 
-std::optional<ShortNameParts> ReadShortHFSName(std::string_view name) {
-  if (name.size() > kLongestShortName) return std::nullopt;
-  const std::size_t mark = name.rfind(kMark);
-  if (mark == std::string_view::npos) return std::nullopt;
-  const std::string_view number = name.substr(mark + 1, name.find('.', mark) - mark - 1);
-  std::uint32_t id = 0;
-  const auto [end, error] = std::from_chars(number.data(), number.data() + number.size(), id, 16);
-  if (error != std::errc{} || CapitalHexadecimal(id) != number) return std::nullopt;
-  std::size_t marks = 1;
-  while (marks < kMostMarks && mark >= marks && name[mark - marks] == kMark) ++marks;
-  return ShortNameParts{id, marks};
+std::vector<ShortNameParts> ReadShortHFSName(std::string_view name) {
+  std::vector<ShortNameParts> readings;
+  if (name.size() > kLongestShortName) return readings;
+  if (const auto parts = ReadShortStem(name)) readings.push_back(*parts);
+  const std::size_t dot = name.rfind('.');
+  if (dot == std::string_view::npos) return readings;
+  if (const auto parts = ReadShortStem(name.substr(0, dot))) readings.push_back(*parts);
+  return readings;
 }
 
 bool CanBeLinuxName(std::string_view name) {

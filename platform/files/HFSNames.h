@@ -10,6 +10,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace tallowmere::files {
 
@@ -28,12 +29,13 @@ std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t 
 std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID, std::size_t marks = 1);
 inline constexpr std::size_t kMostMarks = 8;
 
-// The node id and the most marks that an HFS name has if it reads as a short one.
+// The node id and the most marks that an HFS name has if it reads as a short one. It can read as
+// one in two ways, since an extension may have '#' in it.
 struct ShortNameParts {
   std::uint32_t nodeID;
   std::size_t marks;
 };
-std::optional<ShortNameParts> ReadShortHFSName(std::string_view name);
+std::vector<ShortNameParts> ReadShortHFSName(std::string_view name);
 
 // Whether an item of a Linux folder can be called so: not empty, no '/', no NUL, not "." or "..".
 bool CanBeLinuxName(std::string_view name);

@@ -1,7 +1,6 @@
 // FSMakeFSSpec: the record of an item by an HFS path.
 
 #include <CoreServices/CoreServices.h>
-#include <fcntl.h>
 #include <sys/stat.h>
 
 #include <string>
@@ -51,10 +50,10 @@ OSErr OnTheWay(OSErr error) {
 OSErr FolderAt(const std::string& path, Folder& folder) {
   const auto real = RealPath(path);
   if (!real) return OnTheWay(ErrorOfSystem());
-  const auto item = ReadItem(AT_FDCWD, real->c_str());
-  if (!item || !S_ISDIR(item->type)) return dirNFErr;
-  folder.place = {*real, *item};
-  folder.volume = MountTable::OfThisProcess().OfItem(*item, *real);
+  auto place = PlaceAt(*real);
+  if (!place || !S_ISDIR(place->item.type)) return dirNFErr;
+  folder.place = *std::move(place);
+  folder.volume = MountTable::OfThisProcess().OfItem(folder.place.item, folder.place.path);
   return folder.volume && folder.volume->Root() ? noErr : nsvErr;
 }
 

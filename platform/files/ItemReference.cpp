@@ -19,15 +19,16 @@ bool HasBirth(const ItemReference& item) {
   return item.birthNanoseconds != kNoBirth;
 }
 
-bool HasHandle(const ItemReference& item) {
-  return item.handle.size != 0;
-}
-
 // True also for a birth in the future, by a clock that is not ours.
 bool IsNewborn(const ItemReference& item) {
   timespec now{};
   clock_gettime(CLOCK_REALTIME, &now);
   return item.birthSeconds + kNewbornSeconds >= now.tv_sec;
+}
+
+// Devices without hardware, as those of overlays, have the major number 0.
+bool IsProvedByBirth(const ItemReference& item) {
+  return HasBirth(item) && major(item.device) != 0 && !IsNewborn(item);
 }
 
 }  // namespace
@@ -43,6 +44,10 @@ std::optional<ItemReference> Unpack(const FSRef* reference) {
   return item;
 }
 
+bool HasHandle(const ItemReference& item) {
+  return item.handle.size != 0;
+}
+
 bool AreEqual(const ItemReference& first, const ItemReference& second) {
   return first.device == second.device && first.inode == second.inode;
 }
@@ -51,7 +56,8 @@ std::optional<ItemStatus> ReadStatus(int folder, const char* name) {
   struct statx about {};
   const int emptyPath = *name == '\0' ? AT_EMPTY_PATH : 0;
   if (statx(folder, name, AT_SYMLINK_NOFOLLOW | AT_NO_AUTOMOUNT | emptyPath,
-            STATX_TYPE | STATX_INO | STATX_BTIME | STATX_CTIME | STATX_MNT_ID, &about) != 0) {
+            STATX_TYPE | STATX_INO | STATX_NLINK | STATX_BTIME | STATX_CTIME | STATX_MNT_ID,
+            &about) != 0) {
     return std::nullopt;
   }
   ItemReference item{};
@@ -63,7 +69,9 @@ std::optional<ItemStatus> ReadStatus(int folder, const char* name) {
   const bool hasMount = (about.stx_mask & STATX_MNT_ID) != 0;
   item.mount = hasMount ? static_cast<std::int32_t>(about.stx_mnt_id) : kNoMount;
   item.type = about.stx_mode & S_IFMT;
-  return ItemStatus{item, about.stx_ctime.tv_sec * kNanosecondsInASecond + about.stx_ctime.tv_nsec};
+  const std::int64_t change =
+      about.stx_ctime.tv_sec * kNanosecondsInASecond + about.stx_ctime.tv_nsec;
+  return ItemStatus{item, change, about.stx_nlink};
 }
 
 // The item may be replaced between the two calls. The reference is then to no item at all, unless
@@ -72,7 +80,7 @@ std::optional<ItemReference> ReadItem(int folder, const char* name) {
   auto status = ReadStatus(folder, name);
   if (!status) return std::nullopt;
   ItemReference& item = status->item;
-  if (!HasBirth(item) || IsNewborn(item)) item.handle = ReadHandle(folder, name);
+  if (!IsProvedByBirth(item)) item.handle = ReadHandle(folder, name);
   return item;
 }
 
@@ -81,9 +89,9 @@ bool IsAt(const ItemReference& item, int folder, const char* name) {
   if (!status) return false;
   const ItemReference* const found = &status->item;
   if (!AreEqual(*found, item) || found->type != item.type) return false;
+  if (HasHandle(item)) return ReadHandle(folder, name) == item.handle;
   if (found->birthSeconds != item.birthSeconds) return false;
   if (found->birthNanoseconds != item.birthNanoseconds) return false;
-  if (HasHandle(item)) return ReadHandle(folder, name) == item.handle;
   return HasBirth(item) || found->mount == item.mount;
 }
 

@@ -1,12 +1,13 @@
 // What an FSRef holds: which item of which file system, told so that another item that gets the
 // same numbers later is not taken for it.
 //
-// The proof of identity is the inode number with the time of birth. That is enough unless the item
-// was born just before it was read: file systems give a freed number away at once, and time moves
-// in ticks. A newborn item, and one without a known birth, also carries its file handle. Where
-// there is neither birth nor handle, the type and the mount have to be the same, and a new item of
-// the same type with the same number is not noticed; nor is it where a newborn has no handle and
-// the number goes round within one tick.
+// The proof of identity is the inode number with the file handle, or with the time of birth, which
+// costs no system call of its own. Birth is enough on a block device unless the item was born just
+// before it was read: file systems give a freed number away at once, and time moves in ticks. It is
+// not enough without a device: an overlay gives an item another birth when it is first renamed or
+// written to. Where there is neither birth nor handle, the type and the mount have to be the same,
+// and a new item of the same type with the same number is not noticed; nor is it where a newborn
+// has no handle and the number goes round within one tick.
 #pragma once
 
 #include <CoreServices/CoreServices.h>
@@ -30,7 +31,7 @@ struct ItemReference {
   std::uint32_t birthNanoseconds;  // kNoBirth: the file system does not tell
   std::int32_t mount;              // the id in /proc/self/mountinfo; kNoMount: not told
   std::uint32_t type;              // the S_IFMT part of the mode, never 0 for an item
-  FileHandle handle;               // of a newborn item alone
+  FileHandle handle;               // where birth is not enough
 };
 static_assert(sizeof(ItemReference) == sizeof(FSRef));
 
@@ -46,6 +47,8 @@ FSRef Pack(const ItemReference& item);
 // None for null and for what Pack does not make, all zero among it.
 std::optional<ItemReference> Unpack(const FSRef* reference);
 
+bool HasHandle(const ItemReference& item);
+
 // Whether both are to one item, by device and inode number.
 bool AreEqual(const ItemReference& first, const ItemReference& second);
 
@@ -53,10 +56,11 @@ bool AreEqual(const ItemReference& first, const ItemReference& second);
 // `folder` as in openat(2); with an empty name, the open item itself.
 std::optional<ItemReference> ReadItem(int folder, const char* name);
 
-// The item without its handle, and when it was last changed.
+// The item without its handle, when it was last changed, and how many names it has.
 struct ItemStatus {
   ItemReference item;
   std::int64_t change;  // nanoseconds since 1970
+  std::uint32_t links;
 };
 
 // As ReadItem, in one system call.

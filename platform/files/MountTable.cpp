@@ -204,6 +204,7 @@ MountTable::State MountTable::StateOf(const std::vector<Mount>& mounts, int root
   }
   for (const auto& indexes : GroupIntoVolumes(mounts, rootID, IsFolder)) {
     std::vector<Mount> own;
+    own.reserve(indexes.size());
     for (const std::size_t index : indexes) own.push_back(mounts[index]);
     const auto number = NumberOf(own.front().id, mountIDs);
     if (!number) continue;

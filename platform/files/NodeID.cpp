@@ -31,6 +31,10 @@ std::uint32_t NodeIDOf(const ItemReference& item, const ItemReference& root) {
   return NodeIDOf(item.inode, item.device, root);
 }
 
+bool CanBeNodeID(std::uint32_t id) {
+  return id == kRootFolderID || IsInodeNumber(id) || (id >= kLowestMixed && id <= kHighestMixed);
+}
+
 bool IsInodeNumber(std::uint32_t id) {
   return id >= kLowestInode && id <= kHighestInode;
 }

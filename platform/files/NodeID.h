@@ -22,6 +22,9 @@ std::uint32_t NodeIDOf(const ItemReference& item, const ItemReference& root);
 // The same for an inode number of a device, without the rest of an item.
 std::uint32_t NodeIDOf(std::uint64_t inode, std::uint64_t device, const ItemReference& root);
 
+// Whether an item of some volume can have the id.
+bool CanBeNodeID(std::uint32_t id);
+
 // Whether only one item of a volume can have the id: the one on the root's device that has it for
 // its inode number. Not so for the root folder's id, which is no inode number.
 bool IsInodeNumber(std::uint32_t id);

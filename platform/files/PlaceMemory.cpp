@@ -1,5 +1,7 @@
 #include "files/PlaceMemory.h"
 
+#include "files/Spread.h"
+
 namespace tallowmere::files {
 namespace {
 
@@ -8,9 +10,6 @@ constexpr std::size_t kLimitOfThisProcess = 1 << 20;
 
 // What the heap and the two containers add to a place and its path.
 constexpr std::size_t kOverhead = 96;
-
-// An odd number that spreads the bits of what it multiplies: 2^64 divided by the golden ratio.
-constexpr std::uint64_t kSpread = 0x9E3779B97F4A7C15;
 
 }  // namespace
 
@@ -25,16 +24,15 @@ PlaceMemory& PlaceMemory::OfThisProcess() {
 
 PlaceMemory::PlaceMemory(std::size_t limit) : mLimit(limit) {}
 
-void PlaceMemory::Remember(const ItemReference& item, std::string_view path, bool canonical) {
+void PlaceMemory::Remember(const ItemReference& item, std::string_view path) {
   const Key key{item.device, item.inode};
   const auto known = mIndex.find(key);
-  if (known != mIndex.end() && known->second->remembered.path == path) {
-    known->second->remembered.canonical |= canonical;
+  if (known != mIndex.end() && known->second->path == path) {
     mPlaces.splice(mPlaces.begin(), mPlaces, known->second);
     return;
   }
   Places fresh;
-  fresh.push_back({key, {std::string(path), canonical}});
+  fresh.push_back({key, std::string(path)});
   if (known != mIndex.end()) {
     mSize -= SizeOf(*known->second);
     mPlaces.erase(known->second);
@@ -47,19 +45,19 @@ void PlaceMemory::Remember(const ItemReference& item, std::string_view path, boo
   while (mSize > mLimit) ForgetTheOldest();
 }
 
-const PlaceMemory::Remembered* PlaceMemory::Recall(const ItemReference& item) {
+const std::string* PlaceMemory::Recall(const ItemReference& item) {
   const auto known = mIndex.find({item.device, item.inode});
   if (known == mIndex.end()) return nullptr;
   mPlaces.splice(mPlaces.begin(), mPlaces, known->second);
-  return &known->second->remembered;
+  return &known->second->path;
 }
 
 std::string_view PlaceMemory::Latest() const {
-  return mPlaces.empty() ? std::string_view() : mPlaces.front().remembered.path;
+  return mPlaces.empty() ? std::string_view() : mPlaces.front().path;
 }
 
 std::size_t PlaceMemory::SizeOf(const Place& place) {
-  return sizeof(Place) + place.remembered.path.capacity() + kOverhead;
+  return sizeof(Place) + place.path.capacity() + kOverhead;
 }
 
 void PlaceMemory::ForgetTheOldest() {

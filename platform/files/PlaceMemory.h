@@ -23,19 +23,13 @@ class PlaceMemory {
   // takes remembers none.
   explicit PlaceMemory(std::size_t limit);
 
-  // The item's place is `path` from now on, told to be `canonical` or not known to be. Forgets the
-  // places least recently used when the limit is passed. Without memory the exception leaves
-  // everything as it was.
-  void Remember(const ItemReference& item, std::string_view path, bool canonical);
-
-  struct Remembered {
-    std::string path;
-    bool canonical;
-  };
+  // The item's place is `path` from now on. Forgets the places least recently used when the limit
+  // is passed. Without memory the exception leaves everything as it was.
+  void Remember(const ItemReference& item, std::string_view path);
 
   // The item's place, which counts as a use; null when none is remembered. Valid until the next
   // Remember.
-  const Remembered* Recall(const ItemReference& item);
+  const std::string* Recall(const ItemReference& item);
 
   // The path last remembered or recalled, empty when there is none.
   std::string_view Latest() const;
@@ -54,7 +48,7 @@ class PlaceMemory {
   };
   struct Place {
     Key key;
-    Remembered remembered;
+    std::string path;
   };
   using Places = std::list<Place>;
 

@@ -1,6 +1,5 @@
 #include "files/Specs.h"
 
-#include <fcntl.h>
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -18,16 +17,11 @@ VolumePointer VolumeOfRoot(const Place& item) {
 
 OSErr HoldingFolder(const Place& item, Folder& folder) {
   if (item.path == "/") return fnfErr;
-  folder.place.path = FolderOf(item.path);
-  auto found = ReadItem(AT_FDCWD, folder.place.path.c_str());
-  if (found && !S_ISDIR(found->type)) {
-    // A link has taken the folder's place since the item's path was canonical, and leads to it.
-    folder.place.path = RealPath(folder.place.path).value_or("");
-    found = ReadItem(AT_FDCWD, folder.place.path.c_str());
-  }
+  auto found = PlaceAt(FolderOf(item.path));
   if (!found) return ErrorOfSystem();
-  folder.place.item = *found;
-  folder.volume = MountTable::OfThisProcess().OfItem(*found, folder.place.path);
+  if (!S_ISDIR(found->item.type)) return fnfErr;
+  folder.place = *std::move(found);
+  folder.volume = MountTable::OfThisProcess().OfItem(folder.place.item, folder.place.path);
   if (!folder.volume || !folder.volume->Root()) return nsvErr;
   RememberPlace(folder.place);
   return noErr;

@@ -431,6 +431,15 @@ TEST_F(ResolveAlias, OfAMissingItemZeroesTheFSRefAlone) {
   EXPECT_TRUE(IsZero(CachedFSRefOf(reference)));
 }
 
+TEST_F(ResolveAlias, OfALinkWithoutAnFSRefChangesNothing) {
+  MakeLink("link", "/target");
+  CFileRef reference = FromUrlText(("http://host" + (mFolder.Path() / "link").string()).c_str());
+  ASSERT_TRUE(reference.IsFile());
+  const CFURLRef url = UrlOf(reference);
+  EXPECT_FALSE(reference.ResolveAlias(true));
+  EXPECT_EQ(UrlOf(reference), url);
+}
+
 TEST_F(ResolveAlias, OfALinkWhoseTextHasNoSizeChangesNothing) {
   CFileRef reference("/proc/self/exe", false);
   struct stat about = {};

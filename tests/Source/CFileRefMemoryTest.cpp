@@ -14,12 +14,16 @@ namespace {
 using foundation::test::ArrayAllocations;
 using foundation::test::FailAllocationsAfter;
 using foundation::test::FailNoAllocation;
+using foundation::test::FailOneAllocationAfter;
 using foundation::test::LiveAllocations;
 using foundation::test::SizeOfLastArray;
 
-// Runs `body` with failures after `count` allocations, which may throw std::bad_alloc out of it.
-bool RunFailing(long count, const std::function<bool()>& body) {
-  FailAllocationsAfter(count);
+// How allocations fail after a number of them.
+using Failing = void (*)(long count);
+
+// Runs `body` with allocations failing, which may throw std::bad_alloc out of it.
+bool RunFailing(Failing failAfter, long count, const std::function<bool()>& body) {
+  failAfter(count);
   bool result = false;
   try {
     result = body();
@@ -31,29 +35,37 @@ bool RunFailing(long count, const std::function<bool()>& body) {
 
 class AllocationFailure : public testing::Test {
  protected:
-  // Runs `operation` on a reference that holds `mUrl`, as the comment above says. It succeeds in
-  // the end, with `expected` for its path. Returns how many of its allocations were made to fail.
-  long FailEach(const std::function<bool(CFileRef&)>& operation, const std::string& expected) {
+  using Operation = std::function<bool(CFileRef&)>;
+
+  // Runs `operation` on a reference that holds `mUrl`, as the comment above says, once with every
+  // allocation from the n-th on failing and once with the n-th alone. It succeeds in the end, with
+  // `expected` for its path. Returns how many of its allocations were made to fail.
+  long FailEach(const Operation& operation, const std::string& expected) {
     for (long n = 0;; ++n) {
-      const long liveBefore = LiveAllocations();
-      bool isDone = false;
-      {
-        CFileRef reference(mUrl.Get());
-        EXPECT_EQ(CFGetRetainCount(mUrl.Get()), 2);
-        isDone = RunFailing(n, [&] { return operation(reference); });
-        const auto path = PathOf(reference);
-        if (isDone) {
-          EXPECT_EQ(path, expected);
-        } else {
-          // Empty, or as it was with its one count.
-          EXPECT_EQ(CFGetRetainCount(mUrl.Get()), reference.IsValid() ? 2 : 1) << n;
-          EXPECT_EQ(UrlOf(reference), reference.IsValid() ? mUrl.Get() : nullptr) << n;
-        }
-      }
-      EXPECT_EQ(CFGetRetainCount(mUrl.Get()), 1) << n;
-      EXPECT_EQ(LiveAllocations(), liveBefore) << n;
-      if (isDone || n > 200) return n;
+      Fail(FailOneAllocationAfter, n, operation, expected);
+      if (Fail(FailAllocationsAfter, n, operation, expected) || n > 200) return n;
     }
+  }
+
+  bool Fail(Failing failAfter, long n, const Operation& operation, const std::string& expected) {
+    const long liveBefore = LiveAllocations();
+    bool isDone = false;
+    {
+      CFileRef reference(mUrl.Get());
+      EXPECT_EQ(CFGetRetainCount(mUrl.Get()), 2);
+      isDone = RunFailing(failAfter, n, [&] { return operation(reference); });
+      const auto path = PathOf(reference);
+      if (isDone) {
+        EXPECT_EQ(path, expected) << n;
+      } else {
+        // Empty, or as it was with its one count.
+        EXPECT_EQ(CFGetRetainCount(mUrl.Get()), reference.IsValid() ? 2 : 1) << n;
+        EXPECT_EQ(UrlOf(reference), reference.IsValid() ? mUrl.Get() : nullptr) << n;
+      }
+    }
+    EXPECT_EQ(CFGetRetainCount(mUrl.Get()), 1) << n;
+    EXPECT_EQ(LiveAllocations(), liveBefore) << n;
+    return isDone;
   }
 
   static constexpr char kPath[] = "/a folder with a name/that is rather long/a file.extension";
@@ -146,7 +158,8 @@ TEST_F(AllocationFailure, InResolvingALinkLeavesTheReferenceEmptyOrAsItWas) {
   for (long n = 0;; ++n) {
     CFileRef reference(source);
     const long liveBefore = LiveAllocations();
-    const bool isDone = RunFailing(n, [&] { return reference.ResolveAlias(false); });
+    const bool isDone =
+        RunFailing(FailAllocationsAfter, n, [&] { return reference.ResolveAlias(false); });
     if (isDone) {
       EXPECT_EQ(PathOf(reference), kPath);
     }
@@ -168,7 +181,8 @@ TEST_F(AllocationFailure, InQueriesGivesNoAnswer) {
     const long liveBefore = LiveAllocations();
     for (long n = 0;; ++n) {
       const CFileRef reference(source);
-      const bool isDone = RunFailing(n, [&] { return reference.GetPath() != nullptr; });
+      const bool isDone =
+          RunFailing(FailAllocationsAfter, n, [&] { return reference.GetPath() != nullptr; });
       if (isDone) {
         EXPECT_EQ(std::string(reference.GetPath()), path);
         EXPECT_GT(n, 2);

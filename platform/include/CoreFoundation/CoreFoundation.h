@@ -240,6 +240,8 @@ CFURLRef CFURLCreateCopyAppendingPathComponent(CFAllocatorRef allocator, CFURLRe
                                                CFStringRef component, Boolean isDirectory);
 
 // --- URLs and items ---------------------------------------------------------------------------
+//
+// One thread at a time, together with the calls of <CoreServices/CoreServices.h>.
 
 // Whether a file URL names an existing item, whose FSRef is then written. A link in the last place
 // is not followed, so a dangling link has an FSRef; links on the way are followed.

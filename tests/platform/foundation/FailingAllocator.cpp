@@ -7,6 +7,7 @@ namespace {
 
 constexpr long kNever = -1;
 long gUntilFailure = kNever;
+bool gFailsOnce = false;
 long gLive = 0;
 long gArrays = 0;
 std::size_t gLastArraySize = 0;
@@ -14,7 +15,10 @@ std::size_t gLastArraySize = 0;
 }  // namespace
 
 void* operator new(std::size_t size) {
-  if (gUntilFailure == 0) throw std::bad_alloc();
+  if (gUntilFailure == 0) {
+    if (gFailsOnce) gUntilFailure = kNever;
+    throw std::bad_alloc();
+  }
   if (gUntilFailure > 0) --gUntilFailure;
   void* const memory = std::malloc(size == 0 ? 1 : size);
   if (memory == nullptr) throw std::bad_alloc();
@@ -57,6 +61,12 @@ namespace tallowmere::foundation::test {
 
 void FailAllocationsAfter(long count) {
   gUntilFailure = count;
+  gFailsOnce = false;
+}
+
+void FailOneAllocationAfter(long count) {
+  gUntilFailure = count;
+  gFailsOnce = true;
 }
 
 void FailNoAllocation() {

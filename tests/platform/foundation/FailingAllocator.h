@@ -7,6 +7,10 @@ namespace tallowmere::foundation::test {
 
 // `count` more allocations succeed, then every one throws std::bad_alloc.
 void FailAllocationsAfter(long count);
+
+// The same, but only the first one throws.
+void FailOneAllocationAfter(long count);
+
 void FailNoAllocation();
 
 // How many allocations have not been given back.

@@ -195,14 +195,14 @@ TEST_F(AReferenceToAnItem, IsNotTakenForALinkInItsPlaceThatLeadsToIt) {
   EXPECT_EQ(PlaceOf(item), PathOf("y"));
 }
 
-TEST_F(AReferenceToAnItem, GivesAPathOfTheItemAlsoAfterALinkCameIntoTheWay) {
+TEST_F(AReferenceToAnItem, GivesTheCanonicalPathAlsoAfterALinkCameIntoTheWay) {
   mFolder.MakeFolder("a");
   mFolder.MakeFile("a/x");
   const FSRef item = ReferenceTo(PathOf("a/x"));
   ASSERT_EQ(PlaceOf(item), PathOf("a/x"));
   Move("a", "b");
   MakeLink("a", "b");
-  EXPECT_TRUE(std::filesystem::equivalent(*PlaceOf(item), PathOf("b/x")));
+  EXPECT_EQ(PlaceOf(item), PathOf("b/x"));
 }
 
 TEST_F(AReferenceToAnItem, OfTwoNamesGivesTheOneLastSeen) {
@@ -302,6 +302,14 @@ TEST_F(AReferenceOnAVolume, FindsItsItemThoughItsPlaceIsForgotten) {
     files::RememberPlace(other, "/a place with a path that is as long as usual/and a name");
   }
   EXPECT_EQ(PlaceOf(item), PathOf("volume/a/b/x"));
+}
+
+TEST_F(AReferenceOnAVolume, FindsItsItemFromTheRootWhenNoFolderOfItsPlaceIsThere) {
+  mFolder.MakeFolder("volume/a");
+  mFolder.MakeFile("volume/a/x");
+  const FSRef item = ReferenceTo(PathOf("volume/a/x"));
+  files::RememberPlace(*files::Unpack(&item), "/no such folder/x");
+  EXPECT_EQ(PlaceOf(item), PathOf("volume/a/x"));
 }
 
 // File systems give a freed inode number away at once, within one tick of the clock of births.

@@ -1,0 +1,131 @@
+#include <sys/stat.h>
+
+#include <cerrno>
+#include <iostream>
+#include <optional>
+#include <string>
+#include <system_error>
+#include <utility>
+
+#include "cli/Commands.h"
+#include "cli/ProgressBar.h"
+#include "cli/Text.h"
+#include "cli/TreeWalk.h"
+#include "files/Catalog.h"
+
+namespace tallowmere::cli {
+namespace {
+
+// Without privilege a request can take a pass over a whole volume.
+constexpr auto kDeadline = std::chrono::minutes(10);
+
+bool IsSame(const struct stat& first, const struct stat& second) {
+  return first.st_dev == second.st_dev && first.st_ino == second.st_ino;
+}
+
+bool IsAt(const std::string& path, const struct stat& item) {
+  struct stat found {};
+  return lstat(path.c_str(), &found) == 0 && IsSame(found, item);
+}
+
+// Asks one service for the record of each item and another one for the path of that record.
+class Census {
+ public:
+  Census(Client records, Client paths) : mRecords(std::move(records)), mPaths(std::move(paths)) {}
+
+  // Whether the services still answer.
+  bool Count(const std::string& path, const struct stat& item, double done) {
+    ++mItems;
+    auto trouble = TroubleWith(path, item);
+    // Whoever moves an item, or a folder above it, between the two questions spoils the answer.
+    if (trouble && IsAt(path, item)) trouble = TroubleWith(path, item);
+    if (mFailure) return false;
+    if (!trouble) {
+      ++mBack;
+    } else if (!IsAt(path, item)) {
+      ++mVanished;
+    } else {
+      Print(path, *trouble);
+    }
+    mBar.Show(done, std::to_string(mItems) + " items");
+    return true;
+  }
+
+  void LeaveOut(const std::string& path, const std::string& reason) {
+    ++mLeftOut;
+    Print(path, "left out, " + reason);
+  }
+
+  // The program's exit status.
+  int Finish() {
+    mBar.Hide();
+    if (mFailure) {
+      std::cerr << "tallowmere-cli: " << mFailure->message << '\n';
+      return 1;
+    }
+    const std::uint64_t missing = mItems - mBack - mVanished;
+    std::cout << mItems << " items, " << mBack << " came back, " << missing << " did not, "
+              << mVanished << " vanished meanwhile, " << mLeftOut << " left out\n";
+    return std::cout.flush() && missing == 0 ? 0 : 1;
+  }
+
+ private:
+  // Why the item did not come back, if so.
+  std::optional<std::string> TroubleWith(const std::string& path, const struct stat& item) {
+    const auto record = mRecords.GetFSSpec(path);
+    if (!record) return Fail(record.Failure());
+    if (!*record) return "has no record";
+    const auto back = mPaths.SetFileRefFromFSSpec(**record, false);
+    if (!back) return Fail(back.Failure());
+    if (!*back) return "its record leads nowhere";
+    if (!IsAt(**back, item)) return "came back as " + **back;
+    return std::nullopt;
+  }
+
+  std::string Fail(const Error& error) {
+    mFailure = error;
+    return error.message;
+  }
+
+  void Print(const std::string& path, const std::string& remark) {
+    mBar.Hide();
+    std::cout << Printable(path) << ": " << Printable(remark) << '\n';
+  }
+
+  Client mRecords;
+  Client mPaths;
+  std::optional<Error> mFailure;
+  ProgressBar mBar;
+  std::uint64_t mItems = 0;
+  std::uint64_t mBack = 0;
+  std::uint64_t mVanished = 0;
+  std::uint64_t mLeftOut = 0;
+};
+
+int Fail(const Error& error) {
+  std::cerr << "tallowmere-cli: " << Printable(error.message) << '\n';
+  return 1;
+}
+
+}  // namespace
+
+int TakeCensus(ClientOptions options, const std::string& folder) {
+  options.deadline = kDeadline;
+  const auto path = files::RealPath(folder);
+  if (!path) return Fail({folder + ": " + std::generic_category().message(errno)});
+  auto records = Client::Start(options);
+  if (!records) return Fail(records.Failure());
+  auto paths = Client::Start(options);
+  if (!paths) return Fail(paths.Failure());
+
+  Census census(*std::move(records), *std::move(paths));
+  const TreeVisitor visitor{
+      [&](const std::string& item, const struct stat& status, double done) {
+        return census.Count(item, status, done);
+      },
+      [&](const std::string& item, const std::string& reason) { census.LeaveOut(item, reason); }};
+  WalkTree(*path, visitor);
+  return census.Finish();
+}
+
+}  // namespace tallowmere::cli

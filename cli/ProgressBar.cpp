@@ -1,0 +1,40 @@
+#include "cli/ProgressBar.h"
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <iomanip>
+#include <iostream>
+
+namespace tallowmere::cli {
+namespace {
+
+constexpr int kWidth = 40;  // characters
+constexpr auto kPause = std::chrono::milliseconds(200);
+
+// Back to the first column, and the line erased from there (ECMA-48, "EL").
+constexpr const char* kStartAgain = "\r\x1B[K";
+
+}  // namespace
+
+ProgressBar::ProgressBar() : mIsTerminal(isatty(STDERR_FILENO) == 1) {}
+
+void ProgressBar::Show(double done, const std::string& text) {
+  if (!mIsTerminal) return;
+  const auto now = std::chrono::steady_clock::now();
+  if (now < mNext) return;
+  mNext = now + kPause;
+  mIsShown = true;
+  done = std::clamp(done, 0.0, 1.0);
+  const auto full = static_cast<std::size_t>(done * kWidth);
+  std::cerr << kStartAgain << '[' << std::string(full, '#') << std::string(kWidth - full, '.')
+            << "] " << std::setw(3) << static_cast<int>(done * 100) << " %  " << text << std::flush;
+}
+
+void ProgressBar::Hide() {
+  if (!mIsShown) return;
+  std::cerr << kStartAgain << std::flush;
+  mIsShown = false;
+}
+
+}  // namespace tallowmere::cli

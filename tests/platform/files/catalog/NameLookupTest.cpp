@@ -1,0 +1,281 @@
+#include <cerrno>
+#include <map>
+#include <set>
+#include <vector>
+
+#include "CatalogFixture.h"
+#include "files/HFSNames.h"
+#include "files/NameLookup.h"
+
+namespace tallowmere::files {
+namespace {
+
+using test::TemporaryFolder;
+
+const std::string kComposed = "caf\xC3\xA9";
+const std::string kDecomposed = "cafe\xCC\x81";
+const std::string kHFSForm = "caf\x8E";
+
+class NamesInAFolder : public testing::Test {
+ protected:
+  void SetUp() override { mInfo = InfoOf(mFolder.Path().string()); }
+
+  std::string Make(const std::string& name) const {
+    const std::string path = PathTo(name);
+    const int file = open(path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0644);
+    EXPECT_GE(file, 0) << name << ": " << std::strerror(errno);
+    close(file);
+    return path;
+  }
+  std::string PathTo(const std::string& name) const { return mFolder.Path().string() + "/" + name; }
+
+  FSSpec Record(std::string_view name) const {
+    return MakeRecord(mInfo.volume, mInfo.nodeID, name);
+  }
+  // The path of what an HFS name finds in the folder, or a result code.
+  std::string LookUp(std::string_view name) const { return ItemOf(Record(name)); }
+
+  std::string HFSName(const std::string& name) const { return NameOf(SpecOf(PathTo(name))); }
+
+  void ExpectRoundTrip(const std::string& name) const {
+    EXPECT_EQ(LookUp(HFSName(name)), PathTo(name)) << HFSName(name);
+  }
+
+  TemporaryFolder mFolder;
+  FSCatalogInfo mInfo{};
+};
+
+std::string Hexadecimal(std::uint32_t id) {
+  char text[9];
+  std::snprintf(text, sizeof text, "%X", id);
+  return text;
+}
+
+TEST_F(NamesInAFolder, APlainNameIsItsOwn) {
+  Make("a file.txt");
+  EXPECT_EQ(HFSName("a file.txt"), "a file.txt");
+  ExpectRoundTrip("a file.txt");
+}
+
+TEST_F(NamesInAFolder, ColonsAndSlashesAreExchanged) {
+  Make("a:b");
+  EXPECT_EQ(HFSName("a:b"), "a/b");
+  ExpectRoundTrip("a:b");
+}
+
+TEST_F(NamesInAFolder, CaseMatters) {
+  Make("Name");
+  EXPECT_EQ(LookUp("name"), "(-43)");
+  Make("name");
+  ExpectRoundTrip("Name");
+  ExpectRoundTrip("name");
+}
+
+TEST_F(NamesInAFolder, AnAccentedNameIsFoundInEitherForm) {
+  Make(kDecomposed);
+  EXPECT_EQ(HFSName(kDecomposed), kHFSForm);
+  ExpectRoundTrip(kDecomposed);
+}
+
+TEST_F(NamesInAFolder, ThePrecomposedNameCountsFirstAndTheOtherGetsAShortForm) {
+  Make(kComposed);
+  Make(kDecomposed);
+  EXPECT_EQ(HFSName(kComposed), kHFSForm);
+  EXPECT_EQ(HFSName(kDecomposed), kHFSForm + "#" + Hexadecimal(IDOf(PathTo(kDecomposed))));
+  ExpectRoundTrip(kComposed);
+  ExpectRoundTrip(kDecomposed);
+}
+
+TEST_F(NamesInAFolder, ANameOfMixedFormsIsFoundWhenItIsTheOnlyOne) {
+  Make(
+      "\xC3\xA9"
+      "e\xCC\x81");
+  EXPECT_EQ(LookUp("\x8E\x8E"), PathTo("\xC3\xA9"
+                                       "e\xCC\x81"));
+  EXPECT_EQ(HFSName("\xC3\xA9"
+                    "e\xCC\x81"),
+            "\x8E\x8E");
+}
+
+TEST_F(NamesInAFolder, OfTwoNamesOfMixedFormsNeitherIsFoundByTheirCommonForm) {
+  const std::string first =
+      "\xC3\xA9"
+      "e\xCC\x81";
+  const std::string second = "e\xCC\x81\xC3\xA9";
+  Make(first);
+  Make(second);
+  EXPECT_EQ(LookUp("\x8E\x8E"), "(-43)");
+  ExpectRoundTrip(first);
+  ExpectRoundTrip(second);
+}
+
+TEST_F(NamesInAFolder, AllFormsOfANameSideBySideComeBack) {
+  const std::vector<std::string> forms{"\xC3\xA9\xC3\xA9",
+                                       "e\xCC\x81"
+                                       "e\xCC\x81",
+                                       "\xC3\xA9"
+                                       "e\xCC\x81",
+                                       "e\xCC\x81\xC3\xA9"};
+  for (const std::string& name : forms) Make(name);
+  for (const std::string& name : forms) ExpectRoundTrip(name);
+}
+
+TEST_F(NamesInAFolder, EveryByteComesBackInEitherNormalForm) {
+  for (int byte = 1; byte < 256; ++byte) {
+    const auto names = SpellHFSName("x" + std::string(1, static_cast<char>(byte)));
+    for (const std::string& name : {names.precomposed, names.decomposed}) {
+      if (name.empty()) continue;
+      Make(name);
+      ExpectRoundTrip(name);
+      std::filesystem::remove(PathTo(name));
+    }
+  }
+}
+
+TEST_F(NamesInAFolder, EveryByteComesBackBesideItsOtherForm) {
+  std::vector<std::string> made;
+  for (int byte = 1; byte < 256; ++byte) {
+    const auto names = SpellHFSName("x" + std::string(1, static_cast<char>(byte)));
+    for (const std::string& name : {names.precomposed, names.decomposed}) {
+      if (!name.empty()) made.push_back(Make(name));
+    }
+  }
+  EXPECT_GT(made.size(), 254u + 40u);
+  for (const std::string& path : made) EXPECT_EQ(ItemOf(SpecOf(path)), path);
+}
+
+TEST_F(NamesInAFolder, InvalidUtf8ComesBack) {
+  for (const std::string& name :
+       std::vector<std::string>{"\xFF", "a\x80.aif", "\xC3", "\xED\xA0\x80", "\xF4\x90\x80\x80",
+                                "\xC0\xAF", "\xFF\xFE\xFD"}) {
+    Make(name);
+  }
+  for (const auto& entry : std::filesystem::directory_iterator(mFolder.Path())) {
+    EXPECT_EQ(ItemOf(SpecOf(entry.path())), entry.path());
+  }
+}
+
+TEST_F(NamesInAFolder, ControlCharactersComeBack) {
+  for (const std::string& name :
+       std::vector<std::string>{"\n", " ", "\t\r", "\x01\x7F", "\\", "*?"}) {
+    Make(name);
+    EXPECT_EQ(HFSName(name), name);
+    ExpectRoundTrip(name);
+  }
+}
+
+TEST_F(NamesInAFolder, NamesOfEveryLengthComeBack) {
+  for (std::size_t length = 1; length <= 255; ++length) Make(std::string(length, 'n'));
+  for (std::size_t length = 1; length <= 255; ++length) ExpectRoundTrip(std::string(length, 'n'));
+  EXPECT_EQ(HFSName(std::string(63, 'n')), std::string(63, 'n'));
+  EXPECT_LE(HFSName(std::string(64, 'n')).size(), 31u);
+}
+
+TEST_F(NamesInAFolder, NamesThatDifferOnlyBehindByte63ComeBack) {
+  std::set<std::string> forms;
+  for (const char* end : {"a", "b", ".aif", ".wav", "c.aif"}) Make(std::string(70, 'n') + end);
+  for (const char* end : {"a", "b", ".aif", ".wav", "c.aif"}) {
+    ExpectRoundTrip(std::string(70, 'n') + end);
+    forms.insert(HFSName(std::string(70, 'n') + end));
+  }
+  EXPECT_EQ(forms.size(), 5u);
+}
+
+TEST_F(NamesInAFolder, AnAccentedNameBeyond255BytesInUtf8IsNotFoundAndNoError) {
+  EXPECT_EQ(LookUp(std::string(63, '\x8E')), "(-43)");
+  Str255Of name(std::string(255, '\x8E'));
+  FSSpec spec{};
+  EXPECT_EQ(FSMakeFSSpec(mInfo.volume, static_cast<SInt32>(mInfo.nodeID), name.bytes, &spec),
+            bdNamErr);
+}
+
+TEST_F(NamesInAFolder, AnExtensionWithANumberSignComesBack) {
+  for (const char* name : {"\xFF.c#", "\xFF.#", "\xFF.a#B", "\xFF.#10", "\xFF#.10", "\xFF.#A#B"}) {
+    Make(name);
+    ExpectRoundTrip(name);
+  }
+}
+
+TEST_F(NamesInAFolder, ANameThatReadsAsAShortFormIsItself) {
+  for (const char* name : {"x#10", "x#10.aif", "#10", "#", "##10", "x#FFFFFFFFF", "x#1b"}) {
+    Make(name);
+    EXPECT_EQ(HFSName(name), name);
+    ExpectRoundTrip(name);
+  }
+}
+
+TEST_F(NamesInAFolder, ALiteralNameCountsBeforeTheItemWhoseShortFormItIs) {
+  const std::string longName = std::string(80, 'n') + ".aif";
+  Make(longName);
+  const std::string shortForm = HFSName(longName);
+  Make(shortForm);
+  EXPECT_EQ(LookUp(shortForm), PathTo(shortForm));
+  EXPECT_NE(HFSName(longName), shortForm);
+  ExpectRoundTrip(longName);
+  ExpectRoundTrip(shortForm);
+}
+
+TEST_F(NamesInAFolder, ARecordWithMoreMarksStillFindsItsItemWhenTheLiteralNameIsGone) {
+  const std::string longName = std::string(80, 'n') + ".aif";
+  Make(longName);
+  const std::string shortForm = HFSName(longName);
+  Make(shortForm);
+  const FSSpec record = SpecOf(PathTo(longName));
+  std::filesystem::remove(PathTo(shortForm));
+  EXPECT_EQ(ItemOf(record), PathTo(longName));
+}
+
+TEST_F(NamesInAFolder, AShortFormWithTheIDOfAnotherItemIsNotFound) {
+  const std::string longName = std::string(80, 'n');
+  Make(longName);
+  Make("other");
+  EXPECT_EQ(LookUp(ShortHFSName(longName, IDOf(PathTo("other")))), "(-43)");
+  EXPECT_EQ(LookUp(ShortHFSName(longName, IDOf(PathTo(longName)))), PathTo(longName));
+}
+
+TEST_F(NamesInAFolder, AShortFormOfAnItemThatWasReplacedIsNotFound) {
+  const std::string longName = std::string(80, 'n');
+  Make(longName);
+  const FSSpec record = SpecOf(PathTo(longName));
+  std::filesystem::rename(PathTo(longName), mFolder.Path() / "kept");
+  Make(longName);
+  EXPECT_EQ(ItemOf(record), "(-43)");
+}
+
+TEST_F(NamesInAFolder, NoItemIsCalledSo) {
+  for (const std::string& name : std::vector<std::string>{
+           std::string(), std::string("."), std::string(".."), std::string("a\0b", 3),
+           std::string("\0", 1), std::string(":"), std::string("a:b")}) {
+    EXPECT_EQ(LookUp(name), "(-43)");
+  }
+}
+
+TEST_F(NamesInAFolder, ALinkIsFoundItselfAndADanglingOneToo) {
+  ASSERT_EQ(symlink("nowhere", PathTo("link").c_str()), 0);
+  ASSERT_EQ(symlink("/", PathTo("root").c_str()), 0);
+  ExpectRoundTrip("link");
+  ExpectRoundTrip("root");
+}
+
+TEST_F(NamesInAFolder, ManyHostileNamesSideBySideComeBack) {
+  std::set<std::string> names;
+  unsigned seed = 4711;
+  const auto next = [&seed](unsigned limit) {
+    seed = seed * 1103515245 + 12345;
+    return seed / 65536 % limit;
+  };
+  const std::vector<std::string> pieces{
+      "e",  "\xCC\x81", "\xC3\xA9",     "#",  ".", ":",
+      "1A", "\xFF",     "\xE6\x97\xA5", "\n", "?", "long long long long long"};
+  while (names.size() < 500) {
+    std::string name;
+    for (unsigned count = 1 + next(8); count > 0; --count) {
+      name += pieces[next(static_cast<unsigned>(pieces.size()))];
+    }
+    if (name != "." && name != ".." && names.insert(name).second) Make(name);
+  }
+  for (const std::string& name : names) ExpectRoundTrip(name);
+}
+
+}  // namespace
+}  // namespace tallowmere::files

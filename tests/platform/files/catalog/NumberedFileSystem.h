@@ -1,0 +1,35 @@
+// A file system whose items have the inode numbers that a test gives them: the number behind the
+// last '@' of their names. Folders alone can be made and removed in it.
+#pragma once
+
+#include <sys/types.h>
+
+#include <filesystem>
+#include <string>
+
+#include "support/TemporaryFolder.h"
+
+namespace tallowmere::test {
+
+class NumberedFileSystem {
+ public:
+  // Served by a child process. REQUIRES: the test is in a mount namespace of its own.
+  NumberedFileSystem();
+  NumberedFileSystem(const NumberedFileSystem&) = delete;
+  NumberedFileSystem& operator=(const NumberedFileSystem&) = delete;
+  ~NumberedFileSystem();
+
+  bool IsMounted() const { return mIsMounted; }
+  std::filesystem::path Path() const { return mFolder.Path() / "numbered"; }
+
+  // Makes a folder or a file with that inode number. The path.
+  std::string MakeFolder(const std::string& name, unsigned long number) const;
+  std::string MakeFile(const std::string& name, unsigned long number) const;
+
+ private:
+  TemporaryFolder mFolder;
+  pid_t mServer = -1;
+  bool mIsMounted = false;
+};
+
+}  // namespace tallowmere::test

@@ -1,0 +1,35 @@
+// resolve_spec: reads one FSSpec of 70 bytes after the other from its input and answers each with a
+// line: the result code and the path of the item in hexadecimal, in a process that knows nothing of
+// where the records came from. With the argument "unprivileged" it gives up the superuser's rights
+// first.
+#include <CoreFoundation/CoreFoundation.h>
+#include <CoreServices/CoreServices.h>
+#include <grp.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstring>
+
+#include "files/Catalog.h"
+#include "files/ItemReference.h"
+
+int main(int count, char** arguments) {
+  constexpr uid_t kNobody = 65534;
+  if (count > 1 && std::strcmp(arguments[1], "unprivileged") == 0 &&
+      (setgroups(0, nullptr) != 0 || setresuid(kNobody, kNobody, kNobody) != 0)) {
+    return 1;
+  }
+  FSSpec spec;
+  while (std::fread(&spec, sizeof spec, 1, stdin) == 1) {
+    FSRef reference;
+    OSErr error = FSpMakeFSRef(&spec, &reference);
+    std::printf("%d ", error);
+    const auto item = error == noErr ? tallowmere::files::Unpack(&reference) : std::nullopt;
+    const auto path = item ? tallowmere::files::FindPlace(*item) : std::nullopt;
+    if (path) {
+      for (const char byte : *path) std::printf("%02x", static_cast<unsigned char>(byte));
+    }
+    std::printf("\n");
+    std::fflush(stdout);
+  }
+}
