@@ -86,7 +86,7 @@ TEST_F(Identity, OfAnOrdinaryFolderIsItsOwn) {
 }
 
 TEST_F(Identity, OfALinkToAFolderIsThatOfAFile) {
-  std::filesystem::create_symlink(mFolder.MakeFolder("inner"), mFolder.Path() / "link");
+  mFolder.MakeLink("link", mFolder.MakeFolder("inner"));
   const CFileRef link = RefTo(mFolder.Path() / "link");
   EXPECT_EQ(link.GetDirectoryID(), mFolderRef.GetDirectoryID());
   EXPECT_NE(link.GetNodeID(), RefTo(mFolder.Path() / "inner").GetNodeID());
