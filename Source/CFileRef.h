@@ -239,8 +239,9 @@ class CFileRef {
   // The empty FSSpec has kNoVolume, kNoFolder and a name of length 0. Where a record is an
   // argument, a name length above 63 counts as 63. `last` changes nothing.
 
-  // The record of an existing item is the File Manager's. Any other gets its folder's volume and id
-  // (the empty ones when there is no such folder) and its name, cut to 63 bytes. False, with the
+  // The record of an existing item is the File Manager's. Any other gets its name, cut to 63 bytes,
+  // and the volume and id of what stands where its folder should (the empty ones when nothing
+  // does); a file or a link there is not told from a folder. False, with the
   // record untouched, for an empty reference; false as well for an item that the catalog refuses
   // and for a path without a last component.
   bool GetFSSpec(FSSpec* spec) const;

@@ -169,6 +169,7 @@ bool ReadVolumeName(SInt16 volume, StringPtr name) {
 // --- Names ------------------------------------------------------------------------------------
 
 bool GetPascalStringFromCFString(CFStringRef name, StringPtr buffer, SInt32 bufferSize) {
+  if (bufferSize < 1) return false;
   const auto encodings = NameEncodings();
   const bool isWhole = std::any_of(encodings.begin(), encodings.end(), [&](auto encoding) {
     return CFStringGetPascalString(name, buffer, bufferSize, encoding) != 0;
@@ -177,7 +178,7 @@ bool GetPascalStringFromCFString(CFStringRef name, StringPtr buffer, SInt32 buff
     ExchangeSeparators(buffer);
   } else {
     ConvertWithLoss(name, buffer,
-                    std::min(static_cast<std::size_t>(bufferSize) - 1, kLongestPascalText));
+                    std::min(static_cast<std::size_t>(bufferSize - 1), kLongestPascalText));
   }
   return isWhole;
 }

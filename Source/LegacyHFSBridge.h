@@ -27,8 +27,8 @@ inline constexpr unsigned char kLongestSpecName = sizeof(Str63) - 1;
 // Writes a name as a Pascal string of at most `bufferSize` bytes, the length byte among them, with
 // '/' and ':' exchanged. False when no encoding has all of it or it does not fit: then as much of
 // it as fits in Mac Roman, with '?' for what that lacks and nothing exchanged; or, when not one
-// character could be converted, "(str_conversion_err)" cut to the buffer.
-// REQUIRES: `bufferSize` is at least 1.
+// character could be converted, "(str_conversion_err)" cut to the buffer. False too, and nothing is
+// written, for a size below 1.
 bool GetPascalStringFromCFString(CFStringRef name, StringPtr buffer, SInt32 bufferSize);
 
 // The name with each '/' made ':', owned by the caller. Null for null, and when no encoding has the
@@ -79,8 +79,8 @@ OSErr CFileUtilMakeFileRefFromPath(CFileRef* ref, char const* hfsFolderPath, cha
 // 511 bytes of folders are in it, the innermost ones; ":" stands for an unknown volume. Unless
 // `path` is null, writes that path there in less than `maxLength` bytes, the outer folders replaced
 // by "..." where it is too long; with `keepFolders` 0, only the volume's name is left of it.
-// REQUIRES: `path` has `maxLength` bytes, at least 6 more than the volume's name has. With too few
-// of them the call never returns.
+// REQUIRES: `path` has `maxLength` bytes, at least 6 more than the volume's name has. With fewer
+// the call never returns when the path cannot be made to fit.
 unsigned short CFileUtilMakeFullPath(CFileRef const& ref, char* path, unsigned short maxLength,
                                      unsigned char keepFolders);
 

@@ -26,7 +26,29 @@ need() {
 
 to_build=(g++ cmake ninja-build libcli11-dev)
 to_test=(libgtest-dev libgmock-dev librapidcheck-dev strace)
+# Tests on file systems that these make, and on a real HFS volume in a machine of its own.
+to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools)
+to_test+=(hfsutils qemu-system-x86 busybox-static cpio)
 to_check=(clang-format clang-tidy)
+
+# unpack_kernel FOLDER: puts Debian's kernel there, without installing it. Without one the test that
+# starts it is skipped.
+unpack_kernel() {
+  [ -d "$1" ] && return
+  local package
+  package=$(apt-cache show linux-image-amd64 2>/dev/null |
+    sed -n 's/^Depends: \(linux-image-[^ ,]*\).*/\1/p' | head -1)
+  echo "== Unpacking ${package:-no kernel: apt knows none for this machine}"
+  [ -n "$package" ] || return 0
+  mkdir -p "$1"
+  if ! (cd "$1" && apt-get download -qq "$package" && dpkg-deb --fsys-tarfile ./*.deb |
+        tar -x --wildcards './boot/vmlinuz*' '*/fs/hfs' '*/fs/nls' '*/drivers/block' '*/drivers/cdrom') \
+       >build/kernel.log 2>&1; then
+    cat build/kernel.log >&2
+    rm -rf "$1"
+  fi
+  rm -f "$1"/*.deb
+}
 
 # build PRESET: configures where that has not been done, and builds.
 build() {

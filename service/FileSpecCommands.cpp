@@ -2,6 +2,9 @@
 #include <CoreServices/CoreServices.h>
 #include <LegacyHFSBridge.h>
 
+#include <algorithm>
+#include <iterator>
+
 #include "service/Commands.h"
 #include "service/Protocol.h"
 
@@ -41,6 +44,8 @@ void GetFSSpec(Channel& channel) {
   path.reset();
   FSSpec spec;
   const bool usable = CFileUtilGetDeprecatedFSSpecThroughIPC(item, &spec);
+  // What a record holds behind its name is whatever was in memory.
+  std::fill(spec.name + 1 + spec.name[0], std::end(spec.name), 0);
 
   channel.PutFlag(usable);
   channel.PutBytes(&spec, sizeof spec);

@@ -104,9 +104,10 @@ OSErr MakeSpec(SInt16 vRefNum, SInt32 dirID, std::string_view path, FSSpec& spec
   if (dirID == static_cast<SInt32>(kParentOfRootID) && path.find(kSeparator) == path.npos) {
     const VolumePointer volume = MountTable::OfThisProcess().WithNumber(vRefNum);
     if (!volume) return nsvErr;
-    if (volume->Name() != path) return fnfErr;
+    if (path.empty()) return dirNFErr;
+    if (path.size() > kLongestSpecName) return bdNamErr;
     FillSpec(spec, volume->Number(), kParentOfRootID, path);
-    return noErr;
+    return volume->Name() == path ? noErr : fnfErr;
   }
   const Steps steps = ReadPath(path);
   Folder folder;

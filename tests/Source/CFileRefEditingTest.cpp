@@ -328,10 +328,6 @@ RC_GTEST_PROP(SetToParent, UndoesAddToPath, ()) {
 class ResolveAlias : public testing::Test {
  protected:
   CFileRef At(const char* name) const { return CFileRef((mFolder.Path() / name).c_str(), false); }
-  void MakeLink(const char* name, const std::string& target) const {
-    ASSERT_EQ(symlink(target.c_str(), (mFolder.Path() / name).c_str()), 0);
-  }
-
   const TemporaryFolder mFolder;
 };
 
@@ -347,8 +343,8 @@ TEST_F(ResolveAlias, OfAPlainItemChangesNothing) {
 }
 
 TEST_F(ResolveAlias, OfALinkNamesItsTarget) {
-  MakeLink("file link", mFolder.MakeFile("x"));
-  MakeLink("folder link", mFolder.MakeFolder("folder"));
+  mFolder.MakeLink("file link", mFolder.MakeFile("x"));
+  mFolder.MakeLink("folder link", mFolder.MakeFolder("folder"));
   CFileRef file = At("file link");
   EXPECT_TRUE(file.ResolveAlias(false));
   EXPECT_EQ(PathOf(file), mFolder.Path() / "x");
@@ -360,7 +356,7 @@ TEST_F(ResolveAlias, OfALinkNamesItsTarget) {
 }
 
 TEST_F(ResolveAlias, OfADanglingLinkNamesWhatIsNotThere) {
-  MakeLink("link", "/Applications/Tool of Tallowmere");
+  mFolder.MakeLink("link", "/Applications/Tool of Tallowmere");
   CFileRef reference = At("link");
   EXPECT_TRUE(reference.ResolveAlias(false));
   EXPECT_STREQ(reference.GetPath(), "/Applications/Tool of Tallowmere");
@@ -369,7 +365,7 @@ TEST_F(ResolveAlias, OfADanglingLinkNamesWhatIsNotThere) {
 
 TEST_F(ResolveAlias, OfARelativeLinkLooksFromTheCurrentFolder) {
   mFolder.MakeFolder("target");
-  MakeLink("link", "target");
+  mFolder.MakeLink("link", "target");
   CFileRef elsewhere = At("link");
   EXPECT_TRUE(elsewhere.ResolveAlias(false));
   EXPECT_EQ(PathOf(elsewhere), "target");
@@ -382,8 +378,8 @@ TEST_F(ResolveAlias, OfARelativeLinkLooksFromTheCurrentFolder) {
 }
 
 TEST_F(ResolveAlias, TakesOneStepOfAChain) {
-  MakeLink("second", mFolder.MakeFolder("folder"));
-  MakeLink("first", mFolder.Path() / "second");
+  mFolder.MakeLink("second", mFolder.MakeFolder("folder"));
+  mFolder.MakeLink("first", mFolder.Path() / "second");
   CFileRef reference = At("first");
   EXPECT_TRUE(reference.ResolveAlias(false));
   EXPECT_EQ(PathOf(reference), mFolder.Path() / "second");
@@ -392,7 +388,7 @@ TEST_F(ResolveAlias, TakesOneStepOfAChain) {
 
 TEST_F(ResolveAlias, ReadsTheWholeTextOfALongLink) {
   const std::string target = "/" + std::string(200, 'x') + "/" + std::string(200, 'y') + "/\xFFz";
-  MakeLink("link", target);
+  mFolder.MakeLink("link", target);
   CFileRef reference = At("link");
   EXPECT_TRUE(reference.ResolveAlias(false));
   EXPECT_EQ(std::string(reference), target);
@@ -401,14 +397,14 @@ TEST_F(ResolveAlias, ReadsTheWholeTextOfALongLink) {
 TEST_F(ResolveAlias, ExpandsATildeInTheLinksText) {
   const std::string home = HomeOfCurrentUser();
   if (home.empty()) GTEST_SKIP() << "the current user has no entry";
-  MakeLink("link", "~/x");
+  mFolder.MakeLink("link", "~/x");
   CFileRef reference = At("link");
   EXPECT_TRUE(reference.ResolveAlias(false));
   EXPECT_EQ(PathOf(reference), home + "/x");
 }
 
 TEST_F(ResolveAlias, OfALinkWhoseTextIsNoPathEmptiesTheReference) {
-  MakeLink("link", "~tallowmere no such user/x");
+  mFolder.MakeLink("link", "~tallowmere no such user/x");
   CFileRef reference = At("link");
   EXPECT_FALSE(reference.ResolveAlias(false));
   EXPECT_TRUE(IsEmpty(reference));
@@ -432,7 +428,7 @@ TEST_F(ResolveAlias, OfAMissingItemZeroesTheFSRefAlone) {
 }
 
 TEST_F(ResolveAlias, OfALinkWithoutAnFSRefChangesNothing) {
-  MakeLink("link", "/target");
+  mFolder.MakeLink("link", "/target");
   CFileRef reference = FromUrlText(("http://host" + (mFolder.Path() / "link").string()).c_str());
   ASSERT_TRUE(reference.IsFile());
   const CFURLRef url = UrlOf(reference);
@@ -452,7 +448,7 @@ TEST_F(ResolveAlias, OfALinkWhoseTextHasNoSizeChangesNothing) {
 }
 
 TEST_F(ResolveAlias, OfARelativeReferenceChangesNothing) {
-  MakeLink("link", "/target");
+  mFolder.MakeLink("link", "/target");
   const CurrentFolder current(mFolder.Path());
   CFileRef reference("link", false);
   EXPECT_FALSE(reference.ResolveAlias(true));

@@ -47,6 +47,14 @@ class AllocationFailure : public testing::Test {
     }
   }
 
+  // The same for a setter: a failed one leaves the reference empty.
+  long FailEachSetting(const Operation& setter, const std::string& expected) {
+    mMayStayAsItWas = false;
+    const long count = FailEach(setter, expected);
+    mMayStayAsItWas = true;
+    return count;
+  }
+
   bool Fail(Failing failAfter, long n, const Operation& operation, const std::string& expected) {
     const long liveBefore = LiveAllocations();
     bool isDone = false;
@@ -57,10 +65,12 @@ class AllocationFailure : public testing::Test {
       const auto path = PathOf(reference);
       if (isDone) {
         EXPECT_EQ(path, expected) << n;
+      } else if (mMayStayAsItWas && reference.IsValid()) {
+        EXPECT_EQ(UrlOf(reference), mUrl.Get()) << n;
+        EXPECT_EQ(CFGetRetainCount(mUrl.Get()), 2) << n;
       } else {
-        // Empty, or as it was with its one count.
-        EXPECT_EQ(CFGetRetainCount(mUrl.Get()), reference.IsValid() ? 2 : 1) << n;
-        EXPECT_EQ(UrlOf(reference), reference.IsValid() ? mUrl.Get() : nullptr) << n;
+        EXPECT_TRUE(IsEmpty(reference)) << n;
+        EXPECT_EQ(CFGetRetainCount(mUrl.Get()), 1) << n;
       }
     }
     EXPECT_EQ(CFGetRetainCount(mUrl.Get()), 1) << n;
@@ -68,6 +78,7 @@ class AllocationFailure : public testing::Test {
     return isDone;
   }
 
+  bool mMayStayAsItWas = true;
   static constexpr char kPath[] = "/a folder with a name/that is rather long/a file.extension";
   const CFOwned<CFURLRef> mUrl = MakeUrl("/a former folder with a name/a former file.of it", false);
   const CFOwned<CFStringRef> mFolder = MakeName("/a folder with a name/that is rather long");
@@ -80,17 +91,20 @@ TEST_F(AllocationFailure, InSettersLeavesTheReferenceEmpty) {
   const auto path = MakeName(kPath);
   const auto url = MakeUrl(kPath, true);
   const CFileRef source(kPath, true);
-  EXPECT_GT(FailEach([](CFileRef& r) { return r.Set(kPath, false); }, kPath), 3);
-  EXPECT_GT(FailEach([&](CFileRef& r) { return r.Set(path.Get(), kPathStylePOSIX, false); }, kPath),
+  EXPECT_GT(FailEachSetting([](CFileRef& r) { return r.Set(kPath, false); }, kPath), 3);
+  EXPECT_GT(FailEachSetting([&](CFileRef& r) { return r.Set(path.Get(), kPathStylePOSIX, false); },
+                            kPath),
             2);
-  EXPECT_GT(
-      FailEach([&](CFileRef& r) { return r.Set(path.Get(), kPathStyleWindows, false); }, kPath), 2);
-  EXPECT_GT(FailEach([&](CFileRef& r) { return r.Set(mFolder.Get(), mName.Get()); }, kPath), 4);
-  EXPECT_GT(FailEach([&](CFileRef& r) { return r.Set(url.Get(), false); }, kPath), 2);
-  EXPECT_GT(FailEach([&](CFileRef& r) { return r.Set(source, false); }, kPath), 2);
+  EXPECT_GT(FailEachSetting(
+                [&](CFileRef& r) { return r.Set(path.Get(), kPathStyleWindows, false); }, kPath),
+            2);
+  EXPECT_GT(FailEachSetting([&](CFileRef& r) { return r.Set(mFolder.Get(), mName.Get()); }, kPath),
+            4);
+  EXPECT_GT(FailEachSetting([&](CFileRef& r) { return r.Set(url.Get(), false); }, kPath), 2);
+  EXPECT_GT(FailEachSetting([&](CFileRef& r) { return r.Set(source, false); }, kPath), 2);
   const std::string text = "file:///a%20long%20enough/path%20to%20be%20on%20the%20heap";
-  EXPECT_GT(FailEach([&](CFileRef& r) { return r.SetFromURLString(text); },
-                     "/a long enough/path to be on the heap"),
+  EXPECT_GT(FailEachSetting([&](CFileRef& r) { return r.SetFromURLString(text); },
+                            "/a long enough/path to be on the heap"),
             1);
   EXPECT_EQ(CFGetRetainCount(url.Get()), 1);
   EXPECT_EQ(CFGetRetainCount(path.Get()), 1);
@@ -105,10 +119,29 @@ TEST_F(AllocationFailure, InCopyingNeverHappens) {
 TEST_F(AllocationFailure, InTildeExpansionLeavesTheReferenceEmpty) {
   const CFileRef home("~/x", false);
   if (!home.IsValid()) GTEST_SKIP() << "the current user has no entry";
-  const std::string long1 = "~/a name that is long enough for the heap";
-  CFileRef expected(long1.c_str(), false);
-  EXPECT_GT(FailEach([&](CFileRef& r) { return r.Set(long1.c_str(), false); }, *PathOf(expected)),
-            5);
+  const std::string path = "~/a name that is long enough for the heap";
+  CFileRef expected(path.c_str(), false);
+  EXPECT_GT(
+      FailEachSetting([&](CFileRef& r) { return r.Set(path.c_str(), false); }, *PathOf(expected)),
+      5);
+}
+
+// The name of the user is a string of its own until the user is found.
+TEST_F(AllocationFailure, InTildeExpansionWithALongUserNameLeavesTheReferenceEmpty) {
+  const std::string path = "~tallowmere_no_user_of_such_a_long_name/x";
+  CFileRef(path.c_str(), false);  // the constant strings come into being on their first use
+  for (long n = 0; n < 20; ++n) {
+    for (const Failing failAfter : {FailOneAllocationAfter, FailAllocationsAfter}) {
+      const long liveBefore = LiveAllocations();
+      {
+        CFileRef reference(mUrl.Get());
+        EXPECT_FALSE(RunFailing(failAfter, n, [&] { return reference.Set(path.c_str(), false); }));
+        EXPECT_TRUE(IsEmpty(reference)) << n;
+      }
+      EXPECT_EQ(CFGetRetainCount(mUrl.Get()), 1) << n;
+      EXPECT_EQ(LiveAllocations(), liveBefore) << n;
+    }
+  }
 }
 
 TEST_F(AllocationFailure, InEditsLeavesTheReferenceEmptyOrAsItWas) {
@@ -151,8 +184,7 @@ TEST_F(AllocationFailure, InReplacingTheExtensionLeavesTheReferenceEmptyOrAsItWa
 
 TEST_F(AllocationFailure, InResolvingALinkLeavesTheReferenceEmptyOrAsItWas) {
   const TemporaryFolder folder;
-  const std::string link = folder.Path() / "link";
-  ASSERT_EQ(symlink(kPath, link.c_str()), 0);
+  const std::string link = folder.MakeLink("link", kPath);
   const CFileRef source(link.c_str(), false);
   ASSERT_TRUE(CFileRef(source).ResolveAlias(false));  // the platform remembers the link's place
   for (long n = 0;; ++n) {

@@ -214,10 +214,6 @@ TEST(ThePathOfAReference, OnceAskedForCostsNoSystemCall) {
 class AnItem : public testing::Test {
  protected:
   CFileRef At(const char* name) const { return CFileRef((mFolder.Path() / name).c_str(), false); }
-  void MakeLink(const char* name, const std::string& target) const {
-    ASSERT_EQ(symlink(target.c_str(), (mFolder.Path() / name).c_str()), 0);
-  }
-
   const TemporaryFolder mFolder;
 };
 
@@ -248,7 +244,7 @@ TEST_F(AnItem, ThatIsAPipeIsAFile) {
 }
 
 TEST_F(AnItem, ThatIsADanglingLinkIsAFileThatDoesNotExist) {
-  MakeLink("x", "nowhere");
+  mFolder.MakeLink("x", "nowhere");
   EXPECT_FALSE(At("x").Exists());
   EXPECT_TRUE(At("x").IsFile());
   EXPECT_FALSE(At("x").IsFolder());
@@ -256,7 +252,7 @@ TEST_F(AnItem, ThatIsADanglingLinkIsAFileThatDoesNotExist) {
 }
 
 TEST_F(AnItem, ThatIsALinkToAFolderIsAFile) {
-  MakeLink("x", mFolder.MakeFolder("folder"));
+  mFolder.MakeLink("x", mFolder.MakeFolder("folder"));
   EXPECT_TRUE(At("x").Exists());
   EXPECT_TRUE(At("x").IsFile());
   EXPECT_FALSE(At("x").IsFolder());
@@ -304,7 +300,7 @@ TEST(EqualReferences, AreNotAnEmptyOneAndAnother) {
 TEST_F(AnItem, IsEqualToItselfByAnotherSpelling) {
   const auto folder = mFolder.MakeFolder("folder");
   mFolder.MakeFile("folder/x");
-  MakeLink("link", folder);
+  mFolder.MakeLink("link", folder);
   EXPECT_TRUE(At("folder/x") == At("link/x"));
   EXPECT_TRUE(At("folder/x") == At("folder/../folder/x"));
   EXPECT_FALSE(At("folder/x") != At("link/x"));
@@ -319,13 +315,13 @@ TEST_F(AnItem, IsNotEqualToAnother) {
 
 TEST_F(AnItem, IsNotEqualToALinkToIt) {
   mFolder.MakeFile("x");
-  MakeLink("link", "x");
+  mFolder.MakeLink("link", "x");
   EXPECT_FALSE(At("x") == At("link"));
 }
 
 TEST_F(AnItem, ThatIsMissingIsEqualByItsUrlAlone) {
   const auto folder = mFolder.MakeFolder("folder");
-  MakeLink("link", folder);
+  mFolder.MakeLink("link", folder);
   mFolder.MakeFile("there");
   EXPECT_TRUE(At("folder/x") == At("folder/x"));
   EXPECT_FALSE(At("folder/x") == At("link/x"));

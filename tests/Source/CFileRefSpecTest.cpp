@@ -42,6 +42,18 @@ TEST_F(SpecOfReference, AMissingFileHasItsFoldersVolumeAndId) {
             (Fields{mData->Number(), mData->Ref("Work").GetDirectoryID(), "new.txt"}));
 }
 
+TEST_F(SpecOfReference, AMissingFileBelowAFileOrALinkHasTheIdOfThat) {
+  mData->MakeFile("file");
+  std::filesystem::create_symlink(mData->MakeFolder("Work"), mData->Path("link"));
+  for (const char* const holder : {"file", "link"}) {
+    FSSpec spec = Untouched();
+    EXPECT_TRUE(mData->Ref(std::string(holder) + "/new.txt").GetFSSpec(&spec));
+    EXPECT_EQ(
+        FieldsOf(spec),
+        (Fields{mData->Number(), static_cast<SInt32>(mData->Ref(holder).GetNodeID()), "new.txt"}));
+  }
+}
+
 TEST_F(SpecOfReference, AMissingFilesNameIsInHFSForm) {
   FSSpec spec = Untouched();
   EXPECT_TRUE(mData->Ref("a:b\xC3\xA9").GetFSSpec(&spec));
@@ -188,6 +200,14 @@ TEST_F(SettingFromHFSPath, NamesAreInMacRomanWithSlashesForColons) {
   CFileRef ref;
   EXPECT_TRUE(ref.SetFromHFSPath("Data:a/b\x8E", false));
   EXPECT_EQ(PathOf(ref), mData->Path("a:b\xC3\xA9"));
+}
+
+TEST_F(SettingFromHFSPath, NamesThatTheLocalEncodingLacksAreInTheSystemsEncoding) {
+  CFileRef::mLocalEncoding = kCFStringEncodingASCII;
+  CFileRef ref;
+  ref.SetFromHFSPath("Data:\x8E", false);
+  CFileRef::mLocalEncoding = kCFStringEncodingMacRoman;
+  EXPECT_EQ(PathOf(ref), mData->Path("\xC3\xA9"));
 }
 
 TEST_F(SettingFromHFSPath, NamesAreInTheLocalEncodingFirst) {

@@ -96,6 +96,7 @@ TEST_F(SpecToReference, WithAnUnknownFolderIsTheBareName) {
     CFileRef ref("/former", false);
     EXPECT_TRUE(SetFrom(ref, Spec(mData->Number(), kUnknownFolder, "a/name of none"), search));
     EXPECT_EQ(PathOf(ref), "a:name of none");
+    EXPECT_FALSE(IsMarkedAsFolder(ref));
     EXPECT_EQ(ref.GetPath(), nullptr);
   }
 }
@@ -207,11 +208,35 @@ TEST_F(SpecDataToReference, AnExistingItemIsNamed) {
   EXPECT_EQ(PathOf(ref), mData->Path("Work/Docs"));
 }
 
+TEST_F(SpecDataToReference, AFileThatIsOnAnotherVolumeIsFoundThere) {
+  const Volume other("Other");
+  ASSERT_TRUE(other.IsMounted());
+  const std::string file = other.MakeFile("f");
+  CFileRef ref;
+  EXPECT_TRUE(CFileUtilSetFileRefFromFSSpecData(&ref, mData->Number(), 2, "f", false));
+  EXPECT_EQ(PathOf(ref), file);
+}
+
+TEST_F(SpecDataToReference, AnotherVolumesRootIsFoundByItsName) {
+  const Volume other("Other");
+  ASSERT_TRUE(other.IsMounted());
+  CFileRef ref;
+  EXPECT_TRUE(CFileUtilSetFileRefFromFSSpecData(&ref, mData->Number(), 1, "Other", false));
+  EXPECT_EQ(PathOf(ref), other.Path());
+}
+
+TEST_F(SpecDataToReference, ARootOfNoVolumeIsTheBareName) {
+  CFileRef ref;
+  EXPECT_TRUE(CFileUtilSetFileRefFromFSSpecData(&ref, mData->Number(), 1, "f", false));
+  EXPECT_EQ(PathOf(ref), "f");
+}
+
 TEST_F(SpecDataToReference, WhatHasNoRecordLeavesTheReferenceAsItWas) {
   CFileRef ref("/former", false);
-  for (const long folder : {kUnknownFolder, -1L, 1L}) {
-    EXPECT_FALSE(CFileUtilSetFileRefFromFSSpecData(&ref, mData->Number(), folder, "f:", false));
+  for (const long folder : {kUnknownFolder, -1L}) {
+    EXPECT_FALSE(CFileUtilSetFileRefFromFSSpecData(&ref, mData->Number(), folder, "f", false));
   }
+  EXPECT_FALSE(CFileUtilSetFileRefFromFSSpecData(&ref, mData->Number(), 1, "", false));
   EXPECT_FALSE(CFileUtilSetFileRefFromFSSpecData(&ref, mData->Number(), 2, ":missing:f", false));
   EXPECT_FALSE(CFileUtilSetFileRefFromFSSpecData(&ref, kUnknownVolume, 2, "f", false));
   EXPECT_FALSE(CFileUtilSetFileRefFromFSSpecData(&ref, kNoVolume, -1, "", false));
@@ -350,6 +375,15 @@ TEST_F(SpecOfPathInDir, AnEmptyFirstStringGetsNoColonBehindTheSecond) {
   const CurrentFolder current(mData->Path());
   EXPECT_EQ(MakeSpec("\0Dir:", "f", true), MissingFile());
   EXPECT_EQ(MakeSpec("\0Dir", "f", true), (Made{fnfErr, {mData->Number(), 2, "Dirf"}}));
+}
+
+TEST_F(SpecOfPathInDir, OfALengthOf255IsTakenWhole) {
+  const std::string first(124, 'a');
+  const std::string second(125, 'b');
+  mData->MakeFolder(first + "/" + second);
+  const Made made = MakeSpec(("Data:" + first).c_str(), second.c_str());
+  EXPECT_EQ(made.result, noErr);
+  EXPECT_EQ(made.spec, FieldsOf(mData->Ref(first + "/" + second)));
 }
 
 TEST_F(SpecOfPathInDir, WithoutANameIsTheFolder) {

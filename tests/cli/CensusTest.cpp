@@ -299,7 +299,7 @@ TEST(Census, TakesARelativeFolderAndALinkToOne) {
   const TemporaryFolder folder;
   folder.MakeFolder("real");
   folder.MakeFile("real/file");
-  std::filesystem::create_symlink("real", folder.Path() / "link");
+  folder.MakeLink("link", "real");
   EXPECT_EQ(CensusOf(folder.Path() / "link").text, Figures(2));
   EXPECT_EQ(CensusOf(std::filesystem::relative(folder.Path() / "real")).text, Figures(2));
 }

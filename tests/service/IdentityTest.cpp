@@ -71,6 +71,14 @@ TEST_F(Identity, TwoServicesOneAfterTheOtherGiveTheSameRecord) {
   }
 }
 
+TEST_F(Identity, TheRecordOfAMissingItemHoldsNothingBehindItsName) {
+  Service service;
+  RecordOf(service, Tree() / std::string(60, 'n'));
+  const std::string record = RecordOf(service, Tree() / "new");
+  ASSERT_EQ(record.size(), kResponseSize);
+  EXPECT_EQ(record.substr(7), "\3new" + std::string(60, '\0') + std::string(kTrailer));
+}
+
 TEST_F(Identity, TheOrderOfTheQuestionsDoesNotMatter) {
   Service forwards;
   Service backwards;

@@ -2,7 +2,10 @@
 #include <signal.h>
 #include <sys/wait.h>
 
+#include <algorithm>
+
 #include "support/ChildProgram.h"
+#include "support/TracedService.h"
 #include "support/Wire.h"
 
 namespace tallowmere::test {
@@ -107,6 +110,16 @@ TEST(Lifetime, QuitAfterSeveralRequestsEndsWithStatus0AndNoResponse) {
   EXPECT_EQ(service.ReadToEnd(), kItsResponse + kItsResponse);
   EXPECT_EQ(service.Wait(), 0);
   EXPECT_EQ(service.UnreadInput(), kAnyRequest.size());
+}
+
+TEST(Lifetime, TheParentIsLookedForAfterEveryRequestAlsoAfterOneThatFailed) {
+  const auto run = RunTraced("kill", kAnyRequest + kAnyRequest);
+  if (!run) GTEST_SKIP() << "strace cannot trace here";
+  const std::string look = "kill(" + std::to_string(getpid()) + ", 0)";
+  EXPECT_EQ(run->responses, kItsResponse + kItsResponse);
+  EXPECT_EQ(std::count_if(run->calls.begin(), run->calls.end(),
+                          [&](const std::string& call) { return call.starts_with(look); }),
+            3);
 }
 
 class UnknownCode : public testing::TestWithParam<unsigned> {};

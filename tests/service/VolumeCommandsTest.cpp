@@ -3,12 +3,12 @@
 #include <gtest/gtest.h>
 #include <sys/mount.h>
 
-#include <fstream>
 #include <optional>
 #include <sstream>
 
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
+#include "support/TracedService.h"
 #include "support/Wire.h"
 
 namespace tallowmere::test {
@@ -217,34 +217,23 @@ TEST_F(WithMounts, AVolumeThatNeverAnswersIsListedWithoutWaiting) {
   close(server);
 }
 
-// Counts what the service does with the mount table, by strace.
 TEST(VolumeCommands, AThousandRequestsParseTheMountTableOnce) {
-  const TemporaryFolder folder;
-  const std::string log = (folder.Path() / "calls").string();
-  ChildProgram service(
-      "strace", {"-E", "ASAN_OPTIONS=detect_leaks=0", "-o", log, "-e", "trace=openat,pread64",
-                 TALLOWMERE_SERVICE, std::to_string(getpid())});
   std::string requests;
   for (int i = 0; i < 500; ++i) requests += VolumeNumberRequest("none") + VolumeNameRequest(32767);
-  service.Write(requests + kQuit);
-  const std::string responses = service.ReadToEnd();
-  const std::string errors = service.ReadErrorsToEnd();
-  if (responses.empty() && errors.find("PTRACE") != std::string::npos) {
-    GTEST_SKIP() << "strace cannot trace here";
-  }
-  EXPECT_EQ(service.Wait(), 0);
-  EXPECT_THAT(responses, SizeIs(500 * (6 + 8)));
+  const auto run = RunTraced("openat,pread64", requests + kQuit);
+  if (!run) GTEST_SKIP() << "strace cannot trace here";
+  EXPECT_EQ(run->status, 0);
+  EXPECT_THAT(run->responses, SizeIs(500 * (6 + 8)));
 
-  std::ifstream calls(log);
   int opened = 0;
   int readToTheEnd = 0;
   std::optional<std::string> table;
-  for (std::string line; std::getline(calls, line);) {
-    if (line.find("/proc/self/mountinfo") != std::string::npos) {
+  for (const std::string& call : run->calls) {
+    if (call.find("/proc/self/mountinfo") != std::string::npos) {
       ++opened;
-      table = line.substr(line.rfind(' ') + 1);
+      table = call.substr(call.rfind(' ') + 1);
     }
-    if (table && line.starts_with("pread64(" + *table) && line.ends_with("= 0")) ++readToTheEnd;
+    if (table && call.starts_with("pread64(" + *table) && call.ends_with("= 0")) ++readToTheEnd;
   }
   EXPECT_EQ(opened, 1);
   EXPECT_EQ(readToTheEnd, 1);

@@ -38,6 +38,12 @@ class TemporaryFolder {
     return mPath / name;
   }
 
+  // The path of a new symbolic link in it.
+  std::filesystem::path MakeLink(std::string_view name, const std::string& target) const {
+    std::filesystem::create_symlink(target, mPath / name);
+    return mPath / name;
+  }
+
  private:
   std::filesystem::path mPath;
 };

@@ -74,7 +74,7 @@ TEST_F(APackage, IsNoFile) {
 
 TEST_F(APackage, IsNoLinkToAPackage) {
   const auto package = mFolder.MakeFolder("x.app");
-  ASSERT_EQ(symlink(package.c_str(), (mFolder.Path() / "link.app").c_str()), 0);
+  mFolder.MakeLink("link.app", package);
   EXPECT_FALSE(IsPackageHere("link.app"));
   EXPECT_FALSE(IsPackageHere("link.app/"));
 }

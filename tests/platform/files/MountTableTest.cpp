@@ -1,10 +1,13 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include <optional>
 #include <set>
 
 #include "files/MountTable.h"
+#include "support/FileSystemImage.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
 
@@ -54,6 +57,10 @@ TEST(MountTable, AMountIDBeyond16BitsGetsAFreeNegativeNumber) {
   EXPECT_EQ(numbers.size(), 5u);
   EXPECT_EQ(table.NumberAt(2), -32768);
   EXPECT_EQ(table.NumberAt(4), -32767);
+  const auto before = numbers;
+  table->Distrust();
+  for (std::size_t i = 0; i < 5; ++i) numbers.insert(table.NumberAt(i));
+  EXPECT_EQ(numbers, before);
 }
 
 TEST(MountTable, Number0IsTheVolumeOfTheRoot) {
@@ -90,6 +97,23 @@ TEST(MountTable, TheRootVolumeHasAName) {
   EXPECT_FALSE(name.empty());
   EXPECT_LE(name.size(), 63u);
   EXPECT_EQ(name.find(':'), std::string::npos);
+}
+
+// In a process whose "/" is that of an image.
+TEST(MountTable, TheRootVolumeIsCalledAsItsFileSystemIsLabelled) {
+  if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  if (!test::KernelHas("ext4")) GTEST_SKIP() << "this kernel has no ext4";
+  test::FileSystemImage image("ext4", {"mkfs.ext4", "-q", "-F", "-L", "My/Disk:1"}, 8 << 20);
+  if (!image.IsMade() || !image.Mount()) GTEST_SKIP() << "an image cannot be mounted here";
+  const pid_t child = fork();
+  if (child == 0) {
+    if (chroot(image.Path().c_str()) != 0 || chdir("/") != 0) _exit(2);
+    MountTable table;
+    _exit(table.AtIndex(0)->Name() == "My/Disk/1" ? 0 : 1);
+  }
+  int status = 0;
+  ASSERT_EQ(waitpid(child, &status, 0), child);
+  EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
 }
 
 TEST(MountTable, ARootThatIsNoMountPointIsStillTheFirstVolume) {

@@ -162,6 +162,15 @@ TEST_F(HFSPathsToRecords, AMissingFolderOnTheWayIsSaid) {
   EXPECT_TRUE(IsUntouched());
 }
 
+// In the parent that every root has there are the roots alone.
+TEST_F(HFSPathsToRecords, TheParentOfRootsHoldsNothingButTheVolumesRoot) {
+  EXPECT_EQ(From(mInfo.volume, 1, "no such volume"), "(-43)");
+  EXPECT_EQ(ParentOf(mSpec), 1U);
+  EXPECT_EQ(NameOf(mSpec), "no such volume");
+  EXPECT_EQ(From(mInfo.volume, 1, ""), "(-120)");
+  EXPECT_EQ(From(mInfo.volume, 1, std::string(64, 'x')), "(-37)");
+}
+
 TEST_F(HFSPathsToRecords, LinksToFoldersOnTheWayAreFollowed) {
   ASSERT_EQ(symlink("../..", (mTop + "/a/b/up").c_str()), 0);
   ASSERT_EQ(symlink("file", (mTop + "/a/b/link").c_str()), 0);

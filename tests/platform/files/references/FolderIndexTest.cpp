@@ -66,7 +66,7 @@ TEST_F(AFolderIndex, FindsAFolderAndItsOwnStart) {
 
 TEST_F(AFolderIndex, FindsEveryKindOfItem) {
   mFolder.MakeFolder("a");
-  ASSERT_EQ(symlink("nowhere", (mFolder.Path() / "a/link").c_str()), 0);
+  mFolder.MakeLink("a/link", "nowhere");
   ASSERT_EQ(mkfifo((mFolder.Path() / "a/pipe").c_str(), 0600), 0);
   mFolder.MakeFile("a/\xFF\n: name");
   for (const char* name : {"a/link", "a/pipe", "a/\xFF\n: name"}) ExpectFoundFrom("", name);
@@ -76,8 +76,8 @@ TEST_F(AFolderIndex, FollowsNoLinkToAFolder) {
   mFolder.MakeFolder("a");
   mFolder.MakeFolder("b");
   mFolder.MakeFile("b/x");
-  ASSERT_EQ(symlink("../b", (mFolder.Path() / "a/link").c_str()), 0);
-  ASSERT_EQ(symlink("..", (mFolder.Path() / "a/loop").c_str()), 0);
+  mFolder.MakeLink("a/link", "../b");
+  mFolder.MakeLink("a/loop", "..");
   ExpectFoundFrom("a", "b/x");
 }
 

@@ -44,9 +44,6 @@ std::optional<std::string> PlaceOf(const FSRef& item) {
 class AReferenceToAnItem : public testing::Test {
  protected:
   std::string PathOf(const std::string& name) const { return mFolder.Path() / name; }
-  void MakeLink(const std::string& name, const std::string& target) const {
-    ASSERT_EQ(symlink(target.c_str(), PathOf(name).c_str()), 0);
-  }
   void Move(const std::string& from, const std::string& to) const {
     ASSERT_EQ(rename(PathOf(from).c_str(), PathOf(to).c_str()), 0);
   }
@@ -78,14 +75,14 @@ TEST_F(AReferenceToAnItem, IsNotTakenFromWhatIsMissing) {
 }
 
 TEST_F(AReferenceToAnItem, IsToADanglingLinkItself) {
-  MakeLink("link", "nowhere");
+  mFolder.MakeLink("link", "nowhere");
   const FSRef item = ReferenceTo(PathOf("link"));
   EXPECT_EQ(PlaceOf(item), PathOf("link"));
 }
 
 TEST_F(AReferenceToAnItem, IsToALinkItselfThoughAFolderIsMeant) {
   mFolder.MakeFolder("folder");
-  MakeLink("link", "folder");
+  mFolder.MakeLink("link", "folder");
   FSRef item = {};
   ASSERT_TRUE(CFURLGetFSRef(MakeUrl(PathOf("link"), true).Get(), &item));
   EXPECT_EQ(PlaceOf(item), PathOf("link"));
@@ -96,7 +93,7 @@ TEST_F(AReferenceToAnItem, IsToALinkItselfThoughAFolderIsMeant) {
 TEST_F(AReferenceToAnItem, IsFoundThroughLinksOnTheWay) {
   mFolder.MakeFolder("folder");
   mFolder.MakeFile("folder/x");
-  MakeLink("link", "folder");
+  mFolder.MakeLink("link", "folder");
   EXPECT_EQ(PlaceOf(ReferenceTo(PathOf("link/x"))), PathOf("folder/x"));
   EXPECT_EQ(PlaceOf(ReferenceTo(PathOf("link/."))), PathOf("folder"));
   EXPECT_EQ(PlaceOf(ReferenceTo(PathOf("link/.."))), mFolder.Path());
@@ -118,7 +115,7 @@ TEST_F(AReferenceToAnItem, OfARelativeUrlIsSeenFromTheFolderOfItsMaking) {
 
 TEST_F(AReferenceToAnItem, GivesAUrlWithTheFolderMarkExactlyForAFolder) {
   mFolder.MakeFile("x");
-  MakeLink("link", "/");
+  mFolder.MakeLink("link", "/");
   for (const std::string& path : {PathOf("x"), PathOf("link"), mFolder.Path().string()}) {
     const FSRef item = ReferenceTo(path);
     const CFOwned url(CFURLCreateFromFSRef(kCFAllocatorDefault, &item));
@@ -191,7 +188,7 @@ TEST_F(AReferenceToAnItem, IsNotTakenForALinkInItsPlaceThatLeadsToIt) {
   mFolder.MakeFile("x");
   const FSRef item = ReferenceTo(PathOf("x"));
   Move("x", "y");
-  MakeLink("x", "y");
+  mFolder.MakeLink("x", "y");
   EXPECT_EQ(PlaceOf(item), PathOf("y"));
 }
 
@@ -201,7 +198,7 @@ TEST_F(AReferenceToAnItem, GivesTheCanonicalPathAlsoAfterALinkCameIntoTheWay) {
   const FSRef item = ReferenceTo(PathOf("a/x"));
   ASSERT_EQ(PlaceOf(item), PathOf("a/x"));
   Move("a", "b");
-  MakeLink("a", "b");
+  mFolder.MakeLink("a", "b");
   EXPECT_EQ(PlaceOf(item), PathOf("b/x"));
 }
 
@@ -345,7 +342,7 @@ TEST_F(AReferenceOnAVolume, ThatIsDeletedGivesNoUrlOfTheNewItemOfItsName) {
 TEST_F(AReferenceToAnItem, IsEqualToAnotherToTheSame) {
   mFolder.MakeFolder("folder");
   mFolder.MakeFile("folder/x");
-  MakeLink("link", "folder");
+  mFolder.MakeLink("link", "folder");
   const FSRef first = ReferenceTo(PathOf("folder/x"));
   const FSRef second = ReferenceTo(PathOf("link/x"));
   EXPECT_EQ(FSCompareFSRefs(&first, &second), noErr);
@@ -353,7 +350,7 @@ TEST_F(AReferenceToAnItem, IsEqualToAnotherToTheSame) {
 
 TEST_F(AReferenceToAnItem, IsNotEqualToOneToAnother) {
   mFolder.MakeFile("x");
-  MakeLink("link", "x");
+  mFolder.MakeLink("link", "x");
   const FSRef first = ReferenceTo(PathOf("x"));
   const FSRef second = ReferenceTo(PathOf("link"));
   EXPECT_EQ(FSCompareFSRefs(&first, &second), errFSRefsDifferent);

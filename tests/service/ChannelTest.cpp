@@ -1,0 +1,49 @@
+// What no parent can be made to do to a pipe at the right moment.
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/ioctl.h>
+#include <unistd.h>
+
+#include <string>
+#include <thread>
+
+#include "service/Channel.h"
+
+namespace tallowmere::service {
+namespace {
+
+// A signal ends a write that waits for room, with a part of the bytes written.
+TEST(Channel, AWriteThatIsCutShortGoesOnBehindWhatWasWritten) {
+  struct sigaction ignoring {};
+  ignoring.sa_handler = [](int) {};
+  sigaction(SIGUSR1, &ignoring, nullptr);
+  int ends[2];
+  ASSERT_EQ(pipe2(ends, O_CLOEXEC), 0);
+  const int room = fcntl(ends[1], F_SETPIPE_SZ, 4096);
+  ASSERT_GT(room, 0);
+  std::string bytes;
+  for (int i = 0; i < 3 * room; ++i) bytes.push_back(static_cast<char>(i * i >> 8));
+
+  std::thread writer([&] {
+    Channel channel(-1, ends[1]);
+    channel.PutBytes(bytes.data(), bytes.size());
+    EXPECT_FALSE(channel.Failed());
+    close(ends[1]);
+  });
+  int written = 0;
+  while (written < room) ASSERT_EQ(ioctl(ends[0], FIONREAD, &written), 0);
+  pthread_kill(writer.native_handle(), SIGUSR1);
+  std::string got(bytes.size() + 1, '\0');
+  std::size_t count = 0;
+  for (ssize_t more = 1; more > 0; count += static_cast<std::size_t>(more)) {
+    more = read(ends[0], got.data() + count, got.size() - count);
+    ASSERT_GE(more, 0);
+  }
+  writer.join();
+  close(ends[0]);
+  EXPECT_EQ(got.substr(0, count), bytes);
+}
+
+}  // namespace
+}  // namespace tallowmere::service
