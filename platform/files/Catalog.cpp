@@ -148,8 +148,10 @@ FolderIndex& IndexOf(const VolumePointer& volume) {
   for (FolderIndex& index : indexes) {
     const VolumePointer& known = index.OfVolume();
     if (known->Number() != volume->Number() || !AreEqual(*known->Root(), *volume->Root())) continue;
-    // What was learned hangs on the places where the volume was mounted.
-    if (known->MountPoints() != volume->MountPoints()) index = FolderIndex(volume);
+    // What was learned hangs on the places where the volume was mounted, and on what was hidden.
+    const bool isSeenAlike =
+        known->MountPoints() == volume->MountPoints() && known->Covers() == volume->Covers();
+    if (!isSeenAlike) index = FolderIndex(volume);
     return index;
   }
   std::erase_if(indexes, [](const FolderIndex& index) {
@@ -158,14 +160,24 @@ FolderIndex& IndexOf(const VolumePointer& volume) {
   return indexes.emplace_back(volume);
 }
 
-// The root folder where it is now. The kernel does not signal that a folder above it was renamed.
-std::optional<Place> RootOf(const VolumePointer& volume) {
+// A volume and its root folder, where they are now.
+struct SettledVolume {
+  VolumePointer volume;
+  Place root;
+};
+
+// The kernel does not signal that a folder above a mount point was renamed.
+std::optional<SettledVolume> Settle(const VolumePointer& volume) {
+  MountTable& table = MountTable::OfThisProcess();
   for (VolumePointer current = volume; current;) {
-    auto place = PlaceAt(current->MountPoint());
-    if (place && AreEqual(place->item, *volume->Root()) && IsOnVolume(volume, *place)) return place;
+    auto root = PlaceAt(current->MountPoint());
+    const bool isThere = root && current->Root() && AreEqual(root->item, *current->Root());
+    if (isThere && IsOnVolume(volume, *root)) {
+      return SettledVolume{std::move(current), *std::move(root)};
+    }
     if (current != volume) break;
-    MountTable::OfThisProcess().Distrust();
-    current = MountTable::OfThisProcess().WithNumber(volume->Number());
+    table.Distrust();
+    current = table.WithNumber(volume->Number());
   }
   return std::nullopt;
 }
@@ -189,20 +201,9 @@ Path RememberedPath(const Volume& volume, std::uint32_t id) {
   return remembered == nullptr ? std::nullopt : Path(*remembered);
 }
 
-// What can be said of an id without reading a folder.
-struct QuickAnswer {
-  std::optional<Place> place;
-  bool isGone = false;  // no item has the id, for certain
-};
-
-QuickAnswer AskAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder) {
-  if (!volume->Root() || !IsInodeNumber(id)) return {};
-  auto place = WithID(volume, id, folder, RememberedPath(*volume, id));
-  if (place) return {std::move(place), false};
-  const HandleAnswer answer = AskByInode(*volume, id);
-  place = WithID(volume, id, folder, answer.path);
-  if (place) RememberPlace(*place);
-  return {std::move(place), answer.isGone};
+std::optional<Place> AtRememberedPlace(const VolumePointer& volume, std::uint32_t id, bool folder) {
+  if (!volume->Root() || !IsInodeNumber(id)) return std::nullopt;
+  return WithID(volume, id, folder, RememberedPath(*volume, id));
 }
 
 }  // namespace
@@ -241,15 +242,18 @@ std::optional<std::string> FindPlace(const ItemReference& item) {
   Path place = former.empty() ? std::nullopt : Verified(item, former);
   if (!place) {
     const auto volume = MountTable::OfThisProcess().OfItem(item, former);
-    if (!volume || !volume->Root()) return std::nullopt;
+    const auto settled = volume ? Settle(volume) : std::nullopt;
+    if (!settled) return std::nullopt;
+    const Volume& current = *settled->volume;
     const HandleAnswer answer =
-        HasHandle(item) ? AskByHandle(*volume, item.handle, FindsAllByHandle(volume->Type()))
-                        : AskByInode(*volume, item.inode);
+        HasHandle(item) ? AskByHandle(current, item.handle, FindsAllByHandle(current.Type()))
+                        : AskByInode(current, item.inode);
     if (answer.isGone) return std::nullopt;
     place = answer.path ? Verified(item, *answer.path) : std::nullopt;
     if (!place) {
-      const SearchedItem wanted{NodeIDOf(item, *volume->Root()), &item, S_ISDIR(item.type)};
-      const Path found = IndexOf(volume).Find(wanted, NearestFolder(volume, former));
+      const SearchedItem wanted{NodeIDOf(item, *current.Root()), &item, S_ISDIR(item.type)};
+      const Path found =
+          IndexOf(settled->volume).Find(wanted, NearestFolder(settled->volume, former));
       place = found ? Verified(item, *found) : std::nullopt;
     }
   }
@@ -258,18 +262,30 @@ std::optional<std::string> FindPlace(const ItemReference& item) {
 }
 
 std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder) {
-  return AskAtOnce(volume, id, folder).place;
+  auto place = AtRememberedPlace(volume, id, folder);
+  if (place || !volume->Root() || !IsInodeNumber(id)) return place;
+  place = WithID(volume, id, folder, AskByInode(*volume, id).path);
+  if (place) RememberPlace(*place);
+  return place;
 }
 
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder) {
-  if (!CanBeNodeID(id) || !volume->Root()) return std::nullopt;
-  if (id == kRootFolderID) return RootOf(volume);
+  if (!CanBeNodeID(id)) return std::nullopt;
+  auto place = AtRememberedPlace(volume, id, folder);
+  if (place) return place;
+  const auto settled = Settle(volume);
+  if (!settled) return std::nullopt;
+  if (id == kRootFolderID) return settled->root;
 
-  QuickAnswer answer = AskAtOnce(volume, id, folder);
-  if (answer.place || answer.isGone) return std::move(answer.place);
-  const std::string latest(PlaceMemory::OfThisProcess().Latest());
-  const std::string start = NearestFolder(volume, latest);
-  auto place = WithID(volume, id, folder, IndexOf(volume).Find({id, nullptr, folder}, start));
+  const HandleAnswer answer = IsInodeNumber(id) ? AskByInode(*settled->volume, id) : HandleAnswer{};
+  if (answer.isGone) return std::nullopt;
+  place = WithID(settled->volume, id, folder, answer.path);
+  if (!place) {
+    const std::string latest(PlaceMemory::OfThisProcess().Latest());
+    const std::string start = NearestFolder(settled->volume, latest);
+    place = WithID(settled->volume, id, folder,
+                   IndexOf(settled->volume).Find({id, nullptr, folder}, start));
+  }
   if (place) RememberPlace(*place);
   return place;
 }

@@ -2,6 +2,7 @@
 
 #include <charconv>
 
+#include "files/NodeID.h"
 #include "foundation/ColonsAndSlashes.h"
 #include "foundation/FileNameText.h"
 #include "foundation/MacRoman.h"
@@ -55,6 +56,7 @@ std::optional<ShortNameParts> ReadShortStem(std::string_view stem) {
   const auto [end, error] = std::from_chars(number.data(), number.data() + number.size(), id, 16);
   if (error != std::errc{} || CapitalHexadecimal(id) != number) return std::nullopt;
   std::size_t marks = 1;
+  if (!CanBeNodeID(id)) return std::nullopt;
   while (marks < kMostMarks && mark >= marks && stem[mark - marks] == kMark) ++marks;
   return ShortNameParts{id, marks};
 }
@@ -73,6 +75,10 @@ std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID, std::
   const std::string tail = std::string(marks, kMark) + CapitalHexadecimal(nodeID) + extension;
   const std::u16string_view stem(text.data(), extension.empty() ? text.size() : text.rfind(u'.'));
   return EncodeWithQuestionMarks(stem, kLongestShortName - tail.size()) + tail;
+}
+
+bool CanBeShortForm(std::string_view name) {
+  return name.size() == kLongestShortName || name.find('?') != std::string_view::npos;
 }
 
 std::vector<ShortNameParts> ReadShortHFSName(std::string_view name) {

@@ -27,7 +27,11 @@ std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t 
 // item is really called so, the one that only stands for its name has more than one '#': `marks` of
 // them, 1 to kMostMarks.
 std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID, std::size_t marks = 1);
-inline constexpr std::size_t kMostMarks = 8;
+inline constexpr std::size_t kMostMarks = 16;
+
+// Whether a name without accents can be the short form of an item that has no plain form: those
+// have '?', or the full length because they were too long.
+bool CanBeShortForm(std::string_view name);
 
 // The node id and the most marks that an HFS name has if it reads as a short one. It can read as
 // one in two ways, since an extension may have '#' in it.

@@ -23,6 +23,7 @@ constexpr char kSeparator = ':';
 struct Steps {
   std::string_view volume;  // of a full path, else empty
   std::vector<std::string_view> names;
+  bool endsInFolder = false;  // a colon behind the last name
 };
 
 Steps ReadPath(std::string_view path) {
@@ -33,6 +34,7 @@ Steps ReadPath(std::string_view path) {
     path.remove_prefix(first);
   }
   if (path.starts_with(kSeparator)) path.remove_prefix(1);
+  steps.endsInFolder = path.ends_with(kSeparator);
   while (!path.empty()) {
     const std::size_t end = path.find(kSeparator);
     steps.names.push_back(path.substr(0, end));
@@ -116,8 +118,8 @@ OSErr MakeSpec(SInt16 vRefNum, SInt32 dirID, std::string_view path, FSSpec& spec
   for (std::size_t i = 0; i + 1 < steps.names.size(); ++i) {
     if (const OSErr error = Step(steps.names[i], folder)) return error;
   }
-  if (!steps.names.back().empty()) return SpecOfName(folder, steps.names.back(), spec);
-  const OSErr error = Step({}, folder);
+  if (!steps.endsInFolder) return SpecOfName(folder, steps.names.back(), spec);
+  const OSErr error = Step(steps.names.back(), folder);
   return error == noErr ? SpecOfPlace(folder.place, spec) : error;
 }
 

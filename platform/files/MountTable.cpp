@@ -9,11 +9,13 @@
 
 #include <algorithm>
 #include <array>
+#include <cerrno>
 #include <limits>
 #include <utility>
 
 #include "files/HFSNames.h"
 #include "files/NodeID.h"
+#include "foundation/PathText.h"
 
 namespace tallowmere::files {
 namespace {
@@ -55,6 +57,17 @@ bool IsWithin(std::string_view path, std::string_view folder) {
   return path.starts_with(folder) && (path.size() == folder.size() || path[folder.size()] == '/');
 }
 
+// What a path has behind a folder that it is within, without "/" in front; empty for the folder.
+std::string_view BehindFolder(std::string_view path, std::string_view folder) {
+  path.remove_prefix(folder == "/" ? 0 : folder.size());
+  if (path.starts_with('/')) path.remove_prefix(1);
+  return path;
+}
+
+std::string Below(const std::string& folder, std::string_view path) {
+  return path.empty() ? folder : foundation::JoinPath(folder, path);
+}
+
 std::string LabelOfRoot() {
   const Descriptor root(open("/", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   std::array<char, FSLABEL_MAX + 1> label{};
@@ -73,13 +86,30 @@ std::string LinuxNameOf(const std::string& mountPoint) {
 
 }  // namespace
 
-Volume::Volume(VolumeNumber number, const std::vector<Mount>& mounts)
-    : mNumber(number), mType(mounts.front().type) {
-  for (const Mount& mount : mounts) mMountPoints.push_back(mount.mountPoint);
+Volume::Volume(VolumeNumber number, std::vector<Mount> mounts, std::vector<std::string> covers)
+    : mNumber(number), mMounts(std::move(mounts)), mCovers(std::move(covers)) {
+  for (const Mount& mount : mMounts) mMountPoints.push_back(mount.mountPoint);
+}
+
+std::vector<std::string> Volume::PathsOf(const std::string& path, int mount) const {
+  const auto own = std::find_if(mMounts.begin(), mMounts.end(),
+                                [mount](const Mount& candidate) { return candidate.id == mount; });
+  if (own == mMounts.end() || !IsWithin(path, own->mountPoint)) return {path};
+  const std::string inside = Below(own->root, BehindFolder(path, own->mountPoint));
+  std::vector<std::string> paths;
+  for (const Mount& other : mMounts) {
+    if (!IsWithin(inside, other.root)) continue;
+    paths.push_back(Below(other.mountPoint, BehindFolder(inside, other.root)));
+  }
+  return paths;
 }
 
 const std::optional<ItemReference>& Volume::Root() const {
-  if (!mRoot) mRoot = ReadItem(AT_FDCWD, MountPoint().c_str());
+  if (mRoot) return mRoot;
+  const auto found = ReadItem(AT_FDCWD, MountPoint().c_str());
+  mIsMoved = found ? found->mount != kNoMount && found->mount != mMounts.front().id
+                   : errno == ENOENT || errno == ENOTDIR;
+  if (found && !mIsMoved) mRoot = found;
   return mRoot;
 }
 
@@ -138,7 +168,15 @@ VolumePointer MountTable::OfItem(const ItemReference& item, std::string_view pat
     return volume ? volume : OfPath(path);
   }
   Refresh();
-  const auto found = mState.byMount.find(item.mount);
+  VolumePointer volume = OfMount(item.mount);
+  if (!volume || volume->Root() || !volume->IsMoved()) return volume;
+  Distrust();
+  Refresh();
+  return OfMount(item.mount);
+}
+
+VolumePointer MountTable::OfMount(int id) const {
+  const auto found = mState.byMount.find(id);
   return found == mState.byMount.end() ? nullptr : found->second;
 }
 
@@ -196,7 +234,9 @@ void MountTable::Read() {
 MountTable::State MountTable::StateOf(const std::vector<Mount>& mounts, int rootID) {
   State state;
   std::unordered_set<int> mountIDs;
+  std::multimap<int, std::string> byParent;  // mount points
   for (const Mount& mount : mounts) {
+    byParent.emplace(mount.parent, mount.mountPoint);
     const std::size_t slash = mount.mountPoint.rfind('/');
     state.mountPoints.insert(mount.mountPoint);
     state.holders.insert(mount.mountPoint.substr(0, std::max<std::size_t>(slash, 1)));
@@ -208,7 +248,12 @@ MountTable::State MountTable::StateOf(const std::vector<Mount>& mounts, int root
     for (const std::size_t index : indexes) own.push_back(mounts[index]);
     const auto number = NumberOf(own.front().id, mountIDs);
     if (!number) continue;
-    state.volumes.push_back(std::make_shared<Volume>(*number, own));
+    std::vector<std::string> covers;
+    for (const Mount& mount : own) {
+      const auto [begin, end] = byParent.equal_range(mount.id);
+      for (auto cover = begin; cover != end; ++cover) covers.push_back(cover->second);
+    }
+    state.volumes.push_back(std::make_shared<Volume>(*number, own, std::move(covers)));
     for (const Mount& mount : own) state.byMount[mount.id] = state.volumes.back();
   }
   return state;

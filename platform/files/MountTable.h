@@ -28,23 +28,35 @@ using VolumeNumber = short;
 
 class Volume {
  public:
-  // `mounts` are the reachable mounts of one file system, the volume's place first.
-  Volume(VolumeNumber number, const std::vector<Mount>& mounts);
+  // `mounts` are the reachable mounts of one file system, the volume's place first; `covers` are
+  // the mount points of what is mounted on those.
+  Volume(VolumeNumber number, std::vector<Mount> mounts, std::vector<std::string> covers);
 
   // Below 0, unique while mounted, the same in every process: minus the mount id of its place.
   VolumeNumber Number() const { return mNumber; }
 
   // Where its root folder is, as this process sees it.
-  const std::string& MountPoint() const { return mMountPoints.front(); }
+  const std::string& MountPoint() const { return mMounts.front().mountPoint; }
 
   // Everywhere that the volume is mounted; MountPoint() is the first.
   const std::vector<std::string>& MountPoints() const { return mMountPoints; }
 
-  // The root folder, asked for when first needed; none when it cannot be read.
+  // Where something is mounted on the volume, so that what lies below is hidden there.
+  const std::vector<std::string>& Covers() const { return mCovers; }
+
+  // Everywhere that the volume shows the item with that path on one of its mounts, the first mount
+  // first, whatever else is mounted there. The path alone for another mount.
+  std::vector<std::string> PathsOf(const std::string& path, int mount) const;
+
+  // The root folder, asked for when first needed; none when it cannot be read, and when something
+  // else is found at the mount point.
   const std::optional<ItemReference>& Root() const;
 
+  // Whether the root folder was not found at the mount point, as when a folder above was renamed.
+  bool IsMoved() const { return mIsMoved; }
+
   // Of the file system: "ext4", "tmpfs", …
-  const std::string& Type() const { return mType; }
+  const std::string& Type() const { return mMounts.front().type; }
 
   // In HFS form, 1 to 63 bytes: the last component of the mount point; for "/" the label of the
   // file system, else "Root". Two volumes can have the same name.
@@ -52,11 +64,13 @@ class Volume {
 
  private:
   VolumeNumber mNumber;
+  std::vector<Mount> mMounts;
   std::vector<std::string> mMountPoints;
-  std::string mType;
+  std::vector<std::string> mCovers;
   // On demand: the label of "/" costs three system calls.
   mutable std::optional<std::string> mName;
   mutable std::optional<ItemReference> mRoot;
+  mutable bool mIsMoved = false;
 };
 
 // A volume as it was in one state of the table. It stays valid for whoever holds it.
@@ -118,6 +132,7 @@ class MountTable {
   std::optional<std::string> ReadSource();
   State StateOf(const std::vector<Mount>& mounts, int rootID);
   std::optional<VolumeNumber> NumberOf(int mountID, const std::unordered_set<int>& mountIDs);
+  VolumePointer OfMount(int id) const;
   template <class Predicate>
   VolumePointer FirstWith(Predicate predicate) const;
 

@@ -28,7 +28,61 @@ OSErr LookUp(const Folder& folder, const std::string& linuxName, Place& item) {
   return noErr;
 }
 
-// Whether a short name, read in one way, stands for an item of that id that is called `linuxName`.
+// The one entry of a folder whose HFS form is `name`.
+OSErr FindByForm(const Folder& folder, std::string_view name, Place& item) {
+  const std::unique_ptr<DIR, CloseFolder> entries(opendir(folder.place.path.c_str()));
+  if (!entries) return ErrorOfSystem();
+  std::optional<std::string> found;
+  while (const dirent* const entry = readdir(entries.get())) {
+    if (PlainHFSName(entry->d_name, kLongestStr255Name) != name) continue;
+    if (found) return fnfErr;
+    found = entry->d_name;
+  }
+  return found ? LookUp(folder, *found, item) : static_cast<OSErr>(fnfErr);
+}
+
+// The item that a name is that of, not only a stand-in.
+OSErr FindByOwnName(const Folder& folder, std::string_view name, Place& item) {
+  const SpelledNames names = SpellHFSName(name);
+  if (names.precomposed.empty()) return fnfErr;
+  OSErr result = LookUp(folder, names.precomposed, item);
+  const bool isAccented = !names.decomposed.empty();
+  if (result == fnfErr && isAccented) result = LookUp(folder, names.decomposed, item);
+  if (result == fnfErr && isAccented) result = FindByForm(folder, name, item);
+  return result;
+}
+
+// Whether an item has a name of its own that finds it in the folder.
+bool HasOwnName(const Folder& folder, std::string_view linuxName, const ItemReference& item,
+                std::size_t limit) {
+  const auto name = PlainHFSName(linuxName, limit);
+  Place found;
+  return name && FindByOwnName(folder, *name, found) == noErr && AreEqual(found.item, item);
+}
+
+// The folder at all its places on the volume, when in one of them something is mounted, so that one
+// name can be that of several items. The names of their own count in the first place, where every
+// process sees the folder alike; what cannot be seen there has short forms.
+std::vector<Folder> ViewsOf(const Folder& folder) {
+  std::vector<Folder> views;
+  const MountTable& table = MountTable::OfThisProcess();
+  const auto paths = folder.volume->PathsOf(folder.place.path, folder.place.item.mount);
+  const bool hidesSomething = std::any_of(
+      paths.begin(), paths.end(), [&](const auto& path) { return table.HoldsMountPoint(path); });
+  if (paths.size() > 1 && hidesSomething) {
+    for (const std::string& path : paths) {
+      auto place = PlaceAt(path);
+      if (!place || !AreEqual(place->item, folder.place.item)) continue;
+      views.push_back({folder.volume, *std::move(place)});
+    }
+  }
+  if (views.empty()) views.push_back(folder);
+  return views;
+}
+
+// --- Short forms ------------------------------------------------------------------------------
+
+// Whether a short form, read in one way, stands for an item that is called `linuxName`.
 bool StandsFor(const ShortNameParts& parts, std::string_view name, const char* linuxName) {
   for (std::size_t marks = 1; marks <= parts.marks; ++marks) {
     if (ShortHFSName(linuxName, parts.nodeID, marks) == name) return true;
@@ -43,72 +97,90 @@ bool MayHaveID(const Folder& folder, const dirent& entry, std::uint32_t id, bool
   return NodeIDOf(entry.d_ino, folder.place.item.device, *folder.volume->Root()) == id;
 }
 
-// The item that a short name stands for, without going through the folder. It has to be sure that
-// no entry has the name for its HFS form.
-std::optional<Place> FindByNumber(const Folder& folder, std::string_view name,
-                                  const ShortNameParts& parts) {
-  auto place = FindItemAtOnce(folder.volume, parts.nodeID, false);
-  if (!place || FolderOf(place->path) != folder.place.path) return std::nullopt;
-  const std::string linuxName(*foundation::LastComponent(place->path));
-  if (!StandsFor(parts, name, linuxName.c_str())) return std::nullopt;
-  return place;
+// One look-up of a short form.
+class ShortFormSearch {
+ public:
+  ShortFormSearch(const std::vector<Folder>& views, std::string_view name)
+      : mViews(views), mName(name), mReadings(ReadShortHFSName(name)) {}
+
+  OSErr Find(Place& item) {
+    if (mReadings.empty() || !CanStandForOne()) return fnfErr;
+    if (mReadings.size() == 1 && FindByNumber(mReadings.front(), item)) return noErr;
+    for (const Folder& view : mViews) {
+      if (const OSErr error = SearchFolder(view)) return error;
+    }
+    if (mFound.size() != 1) return fnfErr;
+    item = mFound.front();
+    return noErr;
+  }
+
+ private:
+  // Only what has no name of its own has a short form.
+  bool CanStandForOne() const {
+    return mViews.size() > 1 || CanBeShortForm(mName) || !SpellHFSName(mName).decomposed.empty();
+  }
+
+  bool IsShortFormOf(const ShortNameParts& parts, const char* linuxName,
+                     const ItemReference& item) {
+    return StandsFor(parts, mName, linuxName) &&
+           !HasOwnName(mViews.front(), linuxName, item, kLongestSpecName);
+  }
+
+  // Without going through the folder.
+  bool FindByNumber(const ShortNameParts& parts, Place& item) {
+    auto place = FindItemAtOnce(mViews.front().volume, parts.nodeID, false);
+    if (!place) return false;
+    const std::string holder = FolderOf(place->path);
+    const bool isHere = std::any_of(mViews.begin(), mViews.end(),
+                                    [&](const Folder& view) { return view.place.path == holder; });
+    const std::string linuxName(*foundation::LastComponent(place->path));
+    if (!isHere || !IsShortFormOf(parts, linuxName.c_str(), place->item)) return false;
+    item = *std::move(place);
+    return true;
+  }
+
+  OSErr SearchFolder(const Folder& view) {
+    const std::unique_ptr<DIR, CloseFolder> entries(opendir(view.place.path.c_str()));
+    if (!entries) return ErrorOfSystem();
+    const bool untrueEntries = HasUntrueEntries(view.volume->Type()) ||
+                               MountTable::OfThisProcess().HoldsMountPoint(view.place.path);
+    while (const dirent* const entry = readdir(entries.get())) {
+      for (const ShortNameParts& parts : mReadings) {
+        if (!MayHaveID(view, *entry, parts.nodeID, untrueEntries)) continue;
+        if (StandsFor(parts, mName, entry->d_name)) Offer(view, parts, entry->d_name);
+      }
+    }
+    return noErr;
+  }
+
+  void Offer(const Folder& view, const ShortNameParts& parts, const char* linuxName) {
+    Place item;
+    if (LookUp(view, linuxName, item) != noErr) return;
+    if (NodeIDOf(item.item, *view.volume->Root()) != parts.nodeID) return;
+    const bool isKnown = std::any_of(mFound.begin(), mFound.end(), [&](const Place& found) {
+      return AreEqual(found.item, item.item);
+    });
+    if (!isKnown && IsShortFormOf(parts, linuxName, item.item)) mFound.push_back(std::move(item));
+  }
+
+  const std::vector<Folder>& mViews;
+  std::string_view mName;
+  std::vector<ShortNameParts> mReadings;
+  std::vector<Place> mFound;  // different items
+};
+
+OSErr LookUpInViews(const std::vector<Folder>& views, std::string_view name, Place& item) {
+  const OSErr result = FindByOwnName(views.front(), name, item);
+  return result == fnfErr ? ShortFormSearch(views, name).Find(item) : result;
 }
 
-// Goes through the whole folder. An entry whose HFS form is the name counts before one whose short
-// form it is; two of a kind are none, unless they are names of one item.
-OSErr SearchFolder(const Folder& folder, std::string_view name, bool accented, Place& item) {
-  const auto readings = ReadShortHFSName(name);
-  if (!accented && readings.empty()) return fnfErr;
-  if (!accented && readings.size() == 1) {
-    if (auto found = FindByNumber(folder, name, readings.front())) {
-      item = *std::move(found);
-      return noErr;
-    }
-  }
-  const std::unique_ptr<DIR, CloseFolder> entries(opendir(folder.place.path.c_str()));
-  if (!entries) return ErrorOfSystem();
-  const bool untrueEntries = HasUntrueEntries(folder.volume->Type()) ||
-                             MountTable::OfThisProcess().HoldsMountPoint(folder.place.path);
-  std::string plain;
-  std::string shortened;
-  std::optional<ItemReference> shortenedItem;
-  int plainFound = 0;
-  int shortenedFound = 0;
-  while (const dirent* const entry = readdir(entries.get())) {
-    const char* const linuxName = entry->d_name;
-    if (accented && PlainHFSName(linuxName, kLongestStr255Name) == name) {
-      plain = linuxName;
-      ++plainFound;
-      continue;
-    }
-    for (const ShortNameParts& parts : readings) {
-      if (!MayHaveID(folder, *entry, parts.nodeID, untrueEntries)) continue;
-      if (!StandsFor(parts, name, linuxName)) continue;
-      const auto status = ReadStatus(dirfd(entries.get()), linuxName);
-      if (!status || NodeIDOf(status->item, *folder.volume->Root()) != parts.nodeID) continue;
-      if (shortenedItem && AreEqual(*shortenedItem, status->item)) continue;
-      shortenedItem = status->item;
-      shortened = linuxName;
-      ++shortenedFound;
-    }
-  }
-  if (plainFound == 1) return LookUp(folder, plain, item);
-  if (plainFound == 0 && shortenedFound == 1) return LookUp(folder, shortened, item);
-  return fnfErr;
-}
-
-// Whether a short name can be no other item's, so that it need not be looked up: no two items have
+// Whether a short form can be no other item's, so that it need not be looked up: no two items have
 // the id, and nothing is really called so.
-bool IsItsAlone(const Folder& folder, std::uint32_t id, std::string_view shortName) {
-  const SpelledNames names = SpellHFSName(shortName);
+bool IsItsAlone(const std::vector<Folder>& views, std::uint32_t id, std::string_view shortForm) {
+  if (views.size() > 1 || !IsInodeNumber(id)) return false;
+  const SpelledNames names = SpellHFSName(shortForm);
   Place other;
-  return IsInodeNumber(id) && names.decomposed.empty() &&
-         LookUp(folder, names.precomposed, other) == fnfErr;
-}
-
-bool IsFoundBy(const Folder& folder, const Place& item, std::string_view name) {
-  Place found;
-  return LookUpHFSName(folder, name, found) == noErr && AreEqual(found.item, item.item);
+  return names.decomposed.empty() && LookUp(views.front(), names.precomposed, other) == fnfErr;
 }
 
 }  // namespace
@@ -118,25 +190,25 @@ std::uint32_t Folder::ID() const {
 }
 
 OSErr LookUpHFSName(const Folder& folder, std::string_view name, Place& item) {
-  const SpelledNames names = SpellHFSName(name);
-  if (names.precomposed.empty()) return fnfErr;
-  OSErr result = LookUp(folder, names.precomposed, item);
-  const bool accented = !names.decomposed.empty();
-  if (result == fnfErr && accented) result = LookUp(folder, names.decomposed, item);
-  if (result == fnfErr) result = SearchFolder(folder, name, accented, item);
-  return result;
+  return LookUpInViews(ViewsOf(folder), name, item);
 }
 
 std::optional<std::string> HFSNameOf(const Folder& folder, const Place& item, std::size_t limit) {
   const std::string linuxName(*foundation::LastComponent(item.path));
+  const std::vector<Folder> views = ViewsOf(folder);
   auto plain = PlainHFSName(linuxName, limit);
-  if (plain && (SpellHFSName(*plain).precomposed == linuxName || IsFoundBy(folder, item, *plain))) {
-    return plain;
+  if (plain) {
+    const bool isUnmistakable = views.size() == 1 && SpellHFSName(*plain).precomposed == linuxName;
+    if (isUnmistakable || HasOwnName(views.front(), linuxName, item.item, limit)) return plain;
   }
   const std::uint32_t id = NodeIDOf(item.item, *folder.volume->Root());
   for (std::size_t marks = 1; marks <= kMostMarks; ++marks) {
     std::string name = ShortHFSName(linuxName, id, marks);
-    if (IsItsAlone(folder, id, name) || IsFoundBy(folder, item, name)) return name;
+    Place found;
+    if (IsItsAlone(views, id, name) ||
+        (LookUpInViews(views, name, found) == noErr && AreEqual(found.item, item.item))) {
+      return name;
+    }
   }
   return std::nullopt;
 }

@@ -15,7 +15,7 @@
 
 #include "Source/LegacyHFSBridge.h"
 #include "TestReferences.h"
-#include "support/MountNamespace.h"
+#include "support/OwnMountNamespace.h"
 #include "support/TemporaryFolder.h"
 
 namespace tallowmere::test {
@@ -112,14 +112,6 @@ class Volume {
   std::filesystem::path mRoot;
   ScopedMount mMount;
 };
-
-// Before the first look at the mounts, for a list of mounts is one of a namespace.
-class OwnMountNamespace : public testing::Environment {
- public:
-  void SetUp() override { EnterOwnMountNamespace(); }
-};
-inline testing::Environment* const kOwnMountNamespace =
-    testing::AddGlobalTestEnvironment(new OwnMountNamespace);
 
 // A test with a volume named Data.
 class DataVolumeTest : public testing::Test {

@@ -37,6 +37,12 @@ TEST(HFSNames, AShortNameKeepsTheExtensionAndAsMuchOfTheRestAsFits) {
             "A very long name tha#1B4A3F.aif");
 }
 
+TEST(HFSNames, ADotInFrontBeginsNoExtension) {
+  EXPECT_EQ(ShortHFSName(".\xE6\x97\xA5", 0x1B), ".?#1B");
+  EXPECT_EQ(ShortHFSName(".aif\xFF", 0x1B), ".aif?#1B");
+  EXPECT_EQ(ShortHFSName(".aif", 0x1B), ".aif#1B");
+}
+
 TEST(HFSNames, AShortNameHasAtMost31Bytes) {
   EXPECT_EQ(ShortHFSName(std::string(100, 'x'), 0xFFFFFFEF).size(), 31u);
   EXPECT_EQ(ShortHFSName(std::string(100, 'x') + ".12345", 0xFFFFFFEF).size(), 31u);
@@ -57,11 +63,6 @@ TEST(HFSNames, OnlyExtensionsOf1To5EncodableCharactersAreKept) {
   EXPECT_EQ(ShortHFSName("\xFF.", 16), "?.#10");
   EXPECT_EQ(ShortHFSName("x.\xFF", 16), "x.?#10");
   EXPECT_EQ(ShortHFSName("\xFF", 16), "?#10");
-}
-
-TEST(HFSNames, ADotInFrontBeginsNoExtension) {
-  EXPECT_EQ(ShortHFSName(".\xFF", 16), ".?#10");
-  EXPECT_EQ(ShortHFSName("." + std::string(70, 'x'), 16), "." + std::string(27, 'x') + "#10");
 }
 
 TEST(HFSNames, AnExtensionOfAccentedLettersCountsItsCharacters) {

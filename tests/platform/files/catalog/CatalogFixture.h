@@ -5,12 +5,14 @@
 #include <CoreServices/CoreServices.h>
 #include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sys/mount.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cstring>
+#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -19,7 +21,7 @@
 #include "files/ItemReference.h"
 #include "files/NodeID.h"
 #include "files/PascalName.h"
-#include "support/MountNamespace.h"
+#include "support/OwnMountNamespace.h"
 #include "support/TemporaryFolder.h"
 
 namespace tallowmere::files {

@@ -156,6 +156,8 @@ TEST_F(HFSPathsToRecords, ALongNameThatExistsGetsAShortRecord) {
 TEST_F(HFSPathsToRecords, AMissingFolderOnTheWayIsSaid) {
   EXPECT_EQ(From(":missing:x"), "(-120)");
   EXPECT_EQ(From(":file:x"), "(-120)");
+  EXPECT_EQ(From(":file:"), "(-120)");
+  EXPECT_EQ(From(":missing:"), "(-120)");
   EXPECT_EQ(From(":missing::file"), "(-120)");
   EXPECT_EQ(From(mInfo.volume, IDOf(mTop + "/a/top"), "x"), "(-120)");
   EXPECT_EQ(From(mInfo.volume, 0xFFFFFFFF, "x"), "(-120)");

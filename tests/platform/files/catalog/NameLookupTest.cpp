@@ -197,7 +197,8 @@ TEST_F(NamesInAFolder, AnExtensionWithANumberSignComesBack) {
 }
 
 TEST_F(NamesInAFolder, ANameThatReadsAsAShortFormIsItself) {
-  for (const char* name : {"x#10", "x#10.aif", "#10", "#", "##10", "x#FFFFFFFFF", "x#1b"}) {
+  for (const char* name :
+       {"x#10", "x#10.aif", "#10", "#", "##10", "x#FFFFFFFFF", "x#1b", "?#10", "?#010", "?#2"}) {
     Make(name);
     EXPECT_EQ(HFSName(name), name);
     ExpectRoundTrip(name);
@@ -223,6 +224,46 @@ TEST_F(NamesInAFolder, ARecordWithMoreMarksStillFindsItsItemWhenTheLiteralNameIs
   const FSSpec record = SpecOf(PathTo(longName));
   std::filesystem::remove(PathTo(shortForm));
   EXPECT_EQ(ItemOf(record), PathTo(longName));
+}
+
+// A short form stands for what has no other name: else a new file called so would seem to be there.
+TEST_F(NamesInAFolder, AnItemWithANameOfItsOwnIsNotFoundByAShortForm) {
+  for (const std::string& name : std::vector<std::string>{"report.txt", "what?", kDecomposed}) {
+    Make(name);
+    EXPECT_EQ(LookUp(ShortHFSName(name, IDOf(PathTo(name)))), "(-43)") << name;
+  }
+  // With a twin it has none.
+  const std::string shortForm = ShortHFSName(kDecomposed, IDOf(PathTo(kDecomposed)));
+  Make(kComposed);
+  EXPECT_EQ(LookUp(shortForm), PathTo(kDecomposed));
+}
+
+TEST_F(NamesInAFolder, AShortFormIsLookedUpInItsOwnFolderAlone) {
+  const std::string longName = std::string(80, 'n');
+  Make(longName);
+  const std::string shortForm = HFSName(longName);
+  const std::string other = mFolder.MakeFolder("other");
+  const FSSpec record = MakeRecord(mInfo.volume, IDOf(other), shortForm);
+  EXPECT_EQ(ItemOf(record), "(-43)");
+  chmod(mFolder.Path().c_str(), 0755);
+  EXPECT_TRUE(HoldsForNobody([&] { return ItemOf(record) == "(-43)"; }));
+}
+
+TEST_F(NamesInAFolder, HardLinksWithOneShortFormComeBackAsOneItem) {
+  const std::string first = std::string(80, 'n') + "1";
+  const std::string second = std::string(80, 'n') + "2";
+  Make(first);
+  ASSERT_EQ(link(PathTo(first).c_str(), PathTo(second).c_str()), 0);
+  ASSERT_EQ(HFSName(first), HFSName(second));
+  EXPECT_TRUE(std::filesystem::equivalent(LookUp(HFSName(first)), PathTo(first)));
+}
+
+TEST_F(NamesInAFolder, ALiteralNameForEveryNumberOfMarksButOneLeavesThatOne) {
+  const std::string name = "\xE6\x97\xA5.aif";
+  const std::uint32_t id = IDOf(Make(name));
+  for (std::size_t marks = 1; marks < kMostMarks; ++marks) Make(ShortHFSName(name, id, marks));
+  EXPECT_EQ(HFSName(name), ShortHFSName(name, id, kMostMarks));
+  ExpectRoundTrip(name);
 }
 
 TEST_F(NamesInAFolder, AShortFormWithTheIDOfAnotherItemIsNotFound) {

@@ -32,7 +32,7 @@ class AFolderIndex : public testing::Test {
   // What a new index of the item's volume finds.
   std::optional<std::string> Search(const ItemReference& item, const std::string& start) const {
     const VolumePointer volume = MountTable::OfThisProcess().OfItem(item, start);
-    EXPECT_TRUE(volume);
+    if (!volume || !volume->Root()) return "(on no volume)";
     const std::uint32_t id = NodeIDOf(item, *volume->Root());
     return FolderIndex(volume).Find({id, &item, S_ISDIR(item.type)}, start);
   }

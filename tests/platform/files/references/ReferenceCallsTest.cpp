@@ -13,7 +13,7 @@
 
 #include "files/Catalog.h"
 #include "platform/foundation/TestStrings.h"
-#include "support/MountNamespace.h"
+#include "support/OwnMountNamespace.h"
 #include "support/TemporaryFolder.h"
 
 namespace tallowmere::test {

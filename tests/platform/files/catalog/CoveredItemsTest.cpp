@@ -1,0 +1,160 @@
+// Mounts over parts of a volume, and mount points that move: what is seen at one place of a volume
+// is hidden at another.
+#include <fstream>
+
+#include "CatalogFixture.h"
+
+namespace tallowmere::files {
+namespace {
+
+using test::EnterOwnMountNamespace;
+using test::ScopedMount;
+using test::TemporaryFolder;
+
+// Nobody in particular: what the kernel may only show to the superuser is not used.
+void ExpectRoundTrip(const std::string& path) {
+  const FSSpec spec = SpecOf(path);
+  const auto comesBack = [&] {
+    std::error_code error;
+    const std::string found = ItemOf(spec);
+    return found == path ||
+           AreEqual(*ReadItem(AT_FDCWD, found.c_str()), *ReadItem(AT_FDCWD, path.c_str()));
+  };
+  EXPECT_EQ(ItemOf(spec).front(), '/')
+      << path << " is (" << spec.vRefNum << ", " << ParentOf(spec) << ", " << NameOf(spec) << ")";
+  EXPECT_TRUE(comesBack()) << path << " came back as " << ItemOf(spec);
+  EXPECT_TRUE(HoldsForNobody(comesBack)) << path;
+}
+
+class CoveredItems : public testing::Test {
+ protected:
+  void SetUp() override {
+    if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    chmod(mFolder.Path().c_str(), 0755);
+    mVolume.emplace("none", mFolder.MakeFolder("volume"), "tmpfs");
+    ASSERT_TRUE(mVolume->IsMounted());
+    mFolder.MakeFolder("volume/folder/below");
+    mFolder.MakeFile("volume/folder/below/x");
+    mFolder.MakeFile("volume/file", "covered");
+    mFolder.MakeFile("volume/\xE6\x97\xA5", "covered");
+    mFolder.MakeFile("other", "covering");
+  }
+
+  std::string PathTo(const std::string& name) const { return mFolder.Path() / name; }
+
+  void ShowAt(const std::string& name) {
+    mMounts.emplace_back(
+        std::make_unique<ScopedMount>(PathTo("volume"), mFolder.MakeFolder(name), "", MS_BIND));
+    ASSERT_TRUE(mMounts.back()->IsMounted());
+  }
+  void Cover(const std::string& name, const std::string& source = "none") {
+    mMounts.emplace_back(std::make_unique<ScopedMount>(
+        source, PathTo(name), source == "none" ? "tmpfs" : "", source == "none" ? 0 : MS_BIND));
+    ASSERT_TRUE(mMounts.back()->IsMounted());
+  }
+
+  TemporaryFolder mFolder;
+  std::optional<ScopedMount> mVolume;
+  std::vector<std::unique_ptr<ScopedMount>> mMounts;
+};
+
+TEST_F(CoveredItems, ComeBackWhereAnotherMountShowsThem) {
+  ShowAt("again");
+  Cover("volume/folder");
+  Cover("volume/file", PathTo("other"));
+  Cover("volume/\xE6\x97\xA5", PathTo("other"));
+  mFolder.MakeFile("volume/folder/new");
+  for (const char* name : {"volume", "volume/folder", "volume/folder/new", "volume/file",
+                           "volume/\xE6\x97\xA5", "again", "again/folder", "again/folder/below",
+                           "again/folder/below/x", "again/file", "again/\xE6\x97\xA5"}) {
+    ExpectRoundTrip(PathTo(name));
+  }
+}
+
+TEST_F(CoveredItems, ComeBackWhereTheFirstPlaceShowsThem) {
+  ShowAt("again");
+  Cover("again/folder");
+  Cover("again/file", PathTo("other"));
+  for (const char* name : {"volume/folder", "volume/folder/below/x", "volume/file", "again/folder",
+                           "again/file", "again/\xE6\x97\xA5"}) {
+    ExpectRoundTrip(PathTo(name));
+  }
+}
+
+TEST_F(CoveredItems, HaveARecordOfTheirOwn) {
+  ShowAt("again");
+  Cover("volume/file", PathTo("other"));
+  const FSSpec covered = SpecOf(PathTo("again/file"));
+  const FSSpec covering = SpecOf(PathTo("volume/file"));
+  EXPECT_EQ(ParentOf(covered), ParentOf(covering));
+  EXPECT_EQ(NameOf(covering), "file");
+  EXPECT_NE(NameOf(covered), "file");
+}
+
+TEST_F(CoveredItems, AreFoundAgainWhenTheCoverIsGone) {
+  const FSSpec spec = SpecOf(PathTo("volume/folder/below/x"));
+  const VolumePointer volume = MountTable::OfThisProcess().WithNumber(spec.vRefNum);
+  Cover("volume/folder");
+  EXPECT_EQ(ItemOf(spec), "(-120)");
+  mMounts.clear();
+  EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
+}
+
+// --- A mount point that moves -------------------------------------------------------------------
+
+class AVolumeThatMoves : public testing::Test {
+ protected:
+  void SetUp() override {
+    if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    mVolume.emplace("none", mFolder.MakeFolder("a/volume"), "tmpfs");
+    ASSERT_TRUE(mVolume->IsMounted());
+    // The first numbers are too low to be ids.
+    for (int i = 0; i < 20; ++i) mFolder.MakeFile("a/volume/" + std::to_string(i));
+    mFolder.MakeFolder("a/volume/folder/below");
+    mFolder.MakeFile("a/volume/folder/below/x");
+    MountTable::OfThisProcess().AtIndex(0);
+  }
+  void TearDown() override {
+    if (mIsMoved) std::filesystem::rename(PathTo("b"), PathTo("a"));
+  }
+  void Move() {
+    std::filesystem::rename(PathTo("a"), PathTo("b"));
+    mIsMoved = true;
+  }
+
+  std::string PathTo(const std::string& name) const { return mFolder.Path() / name; }
+
+  TemporaryFolder mFolder;
+  std::optional<ScopedMount> mVolume;
+  bool mIsMoved = false;
+};
+
+TEST_F(AVolumeThatMoves, GivesTheIdsThatItGaveBefore) {
+  const std::uint64_t inode = ReadItem(AT_FDCWD, PathTo("a/volume/folder/below").c_str())->inode;
+  Move();
+  const FSSpec spec = SpecOf(PathTo("b/volume/folder/below/x"));
+  EXPECT_EQ(ParentOf(spec), inode);
+  EXPECT_EQ(ItemOf(spec), PathTo("b/volume/folder/below/x"));
+}
+
+TEST_F(AVolumeThatMoves, IsNotTakenForWhatIsWhereItWas) {
+  const std::uint64_t inode = ReadItem(AT_FDCWD, PathTo("a/volume/folder/below").c_str())->inode;
+  Move();
+  mFolder.MakeFolder("a/volume/folder/below");
+  const FSSpec spec = SpecOf(PathTo("b/volume/folder/below/x"));
+  EXPECT_EQ(ParentOf(spec), inode);
+  EXPECT_EQ(ItemOf(spec), PathTo("b/volume/folder/below/x"));
+  std::filesystem::remove_all(PathTo("a"));
+}
+
+TEST_F(AVolumeThatMoves, IsSearchedWhereItIsNow) {
+  const FSSpec spec = SpecOf(PathTo("a/volume/folder/below/x"));
+  ASSERT_EQ(ItemOf(spec), PathTo("a/volume/folder/below/x"));
+  Move();
+  EXPECT_EQ(ItemOf(spec), PathTo("b/volume/folder/below/x"));
+  const FSSpec root = MakeRecord(spec.vRefNum, 2, "folder");
+  EXPECT_EQ(ItemOf(root), PathTo("b/volume/folder"));
+}
+
+}  // namespace
+}  // namespace tallowmere::files
