@@ -12,6 +12,10 @@ namespace tallowmere::service {
 void GetVolRefnumByHFSName(Channel& channel);
 void GetHFSVolumeName(Channel& channel);
 
+void MakeFullPath(Channel& channel);
+void MakeFileRefFromPath(Channel& channel);
+void AddHFSName(Channel& channel);
+
 void GetHFSName(Channel& channel);
 void GetFSSpec(Channel& channel);
 void SetFileRefFromFSSpecData(Channel& channel);

@@ -24,9 +24,12 @@ void Quit(Channel&) {
 
 constexpr auto kCommands = std::to_array<Command>({
     {protocol::kRequestQuit, Quit},
+    {protocol::kRequestMakeFullPath, MakeFullPath},
+    {protocol::kRequestMakeFileRefFromPath, MakeFileRefFromPath},
     {protocol::kRequestGetVolRefnumByHFSName, GetVolRefnumByHFSName},
     {protocol::kRequestGetHFSVolumeName, GetHFSVolumeName},
     {protocol::kRequestGetHFSName, GetHFSName},
+    {protocol::kRequestAddHFSName, AddHFSName},
     {protocol::kRequestGetFSSpec, GetFSSpec},
     {protocol::kRequestSetFileRefFromFSSpecData, SetFileRefFromFSSpecData},
     {protocol::kRequestSetFileRefFromFSSpec, SetFileRefFromFSSpec},

@@ -5,9 +5,6 @@
 namespace tallowmere::test {
 namespace {
 
-const std::string kAnyRequest = VolumeNameRequest(32767);
-const std::string kItsResponse = kNoVolumeNameResponse;
-
 TEST(Framing, ARequestCodeInTwoReadsIsServedNormally) {
   Service service;
   service.Write(kAnyRequest.substr(0, 1));
