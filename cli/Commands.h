@@ -3,6 +3,7 @@
 #pragma once
 
 #include <string>
+#include <vector>
 
 #include "client/Client.h"
 
@@ -10,6 +11,9 @@ namespace tallowmere::cli {
 
 // Prints number, name and mount point of every volume of this machine.
 int PrintVolumes(const ClientOptions& options);
+
+// Prints the record of each path, its full HFS path and the path to which the record leads.
+int PrintIdentities(const ClientOptions& options, const std::vector<std::string>& paths);
 
 // Asks one service for the record of every item of a folder, and another for the path of every
 // record. Prints each item that does not come back, each folder that is left out and the figures;

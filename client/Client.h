@@ -36,12 +36,27 @@ class Client {
  public:
   static Result<Client> Start(const ClientOptions& options = {});
 
+  // The full HFS path of the folder at a POSIX path, or of the folder that holds the file there,
+  // with a colon behind it; outer folders are "..." where it is longer than 1023 bytes. A colon
+  // for what is on no volume. A path above 65534 bytes or with a NUL is none's.
+  Result<std::string> MakeFullPath(std::string_view path);
+
+  // The POSIX path of the item with that HFS path, or none. More than 255 bytes are no HFS path.
+  Result<std::optional<std::string>> MakeFileRefFromPath(std::string_view hfsPath);
+
   // The volume reference number of the first mounted volume with that HFS name, or none.
   // A name above 255 bytes or with a NUL is no volume's.
   Result<std::optional<std::int16_t>> GetVolRefnumByHFSName(std::string_view name);
 
   // The HFS name of the volume with that number, or none. 0 asks for the volume of "/".
   Result<std::optional<std::string>> GetHFSVolumeName(std::int16_t number);
+
+  // The HFS name of the item at a POSIX path, or none for an item that does not exist.
+  Result<std::optional<std::string>> GetHFSName(std::string_view path);
+
+  // The POSIX path of the item with that HFS name in the folder at a POSIX path, or the path that
+  // it would have; none without a folder. A name above 1023 bytes or with a NUL is no item's.
+  Result<std::optional<std::string>> AddHFSName(std::string_view folder, std::string_view name);
 
   // The record of the item at a POSIX path, or none. An item that does not exist has one where its
   // folder does. A path above 65534 bytes or with a NUL has none.

@@ -50,6 +50,38 @@ TEST(CommandLine, VolumesTellsWhichOfTwoVolumesWithOneNameAnswersToIt) {
   EXPECT_THAT(text, HasSubstr("/b/Twin  (the first volume of this name answers to it)\n"));
 }
 
+TEST(CommandLine, IdentifyPrintsRecordFullPathAndWayBack) {
+  const TemporaryFolder folder;
+  const std::string file = folder.MakeFile("a:b\xC3\xA9");
+  ChildProgram cli(TALLOWMERE_CLI, {"identify", file, "/"});
+  const std::string text = cli.ReadToEnd();
+  EXPECT_EQ(cli.Wait(), 0);
+  EXPECT_THAT(text, StartsWith("vRefNum  parent id  HFS name"));
+  EXPECT_THAT(text, HasSubstr("  a/b\xC3\xA9"));
+  EXPECT_THAT(text, HasSubstr(":a/b\xC3\xA9"));
+  EXPECT_THAT(text, HasSubstr("  " + file + "\n"));
+  EXPECT_THAT(text, ContainsRegex(":  +/\n"));
+}
+
+TEST(CommandLine, IdentifyGoesOnBehindAPathWithoutARecord) {
+  const TemporaryFolder folder;
+  const std::string missing = folder.Path() / "missing/file";
+  ChildProgram cli(TALLOWMERE_CLI, {"identify", missing, folder.Path()});
+  EXPECT_THAT(cli.ReadToEnd(), HasSubstr("  " + folder.Path().string() + "\n"));
+  EXPECT_EQ(cli.ReadErrorsToEnd(),
+            "tallowmere-cli: " + missing + ": there is no such folder on any volume\n");
+  EXPECT_EQ(cli.Wait(), 1);
+}
+
+TEST(CommandLine, OutputThatCannotBeWrittenIsStatus1AndOneSentence) {
+  for (const char* const command : {"volumes", "identify /"}) {
+    ChildProgram cli("/bin/sh",
+                     {"-c", std::string("exec \"$0\" ") + command + " >/dev/full", TALLOWMERE_CLI});
+    EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the output could not be written\n");
+    EXPECT_EQ(cli.Wait(), 1);
+  }
+}
+
 TEST(CommandLine, AMissingServiceIsStatus1AndOneSentence) {
   ChildProgram cli(TALLOWMERE_CLI, {"--service", "/nonexistent/service", "volumes"});
   EXPECT_EQ(
