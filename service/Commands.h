@@ -17,4 +17,6 @@ void GetFSSpec(Channel& channel);
 void SetFileRefFromFSSpecData(Channel& channel);
 void SetFileRefFromFSSpec(Channel& channel);
 
+void GetAIFFExportSettings(Channel& channel);
+
 }  // namespace tallowmere::service
