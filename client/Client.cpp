@@ -97,6 +97,14 @@ class Client::Exchange {
     return number;
   }
 
+  std::string TakeBytes(std::size_t size) {
+    if (mClient.mFailure) return {};
+    auto bytes = mClient.mService.Receive(size, mDeadline);
+    if (bytes) return *std::move(bytes);
+    mClient.mFailure = bytes.Failure();
+    return {};
+  }
+
   // A counted string without its NUL.
   std::string TakeString() {
     std::string text = TakeBytes(Take<std::uint16_t>());
@@ -126,14 +134,6 @@ class Client::Exchange {
   }
 
  private:
-  std::string TakeBytes(std::size_t size) {
-    if (mClient.mFailure) return {};
-    auto bytes = mClient.mService.Receive(size, mDeadline);
-    if (bytes) return *std::move(bytes);
-    mClient.mFailure = bytes.Failure();
-    return {};
-  }
-
   Client& mClient;
   Deadline mDeadline;
   std::string mRequest;
@@ -195,6 +195,19 @@ Result<std::optional<std::string>> Client::SetFileRefFromFSSpec(const FileSpec& 
   const bool isSet = exchange.Take<std::uint8_t>() != 0;
   std::string path = exchange.TakeString();
   return exchange.Finish(isSet && !path.empty() ? std::optional(std::move(path)) : std::nullopt);
+}
+
+Result<ExportSettings> Client::GetAIFFExportSettings(const SoundFormat& sound) {
+  Exchange exchange(*this, protocol::kRequestGetAIFFExportSettings);
+  exchange.Put(sound.rate);
+  exchange.Put<std::uint32_t>(sound.sampleSize);
+  exchange.Put(sound.channels);
+  exchange.Put(sound.format);
+  exchange.Send();
+  ExportSettings settings{};
+  settings.result = exchange.Take<std::int16_t>();
+  settings.bytes = exchange.TakeBytes(exchange.Take<std::uint32_t>());
+  return exchange.Finish(std::move(settings));
 }
 
 }  // namespace tallowmere
