@@ -60,12 +60,12 @@ void GetAIFFExportSettings(Channel& channel) {
   const OSStatus result =
       GetAIFFExportSettingsThroughIPC(&settings, sampleRate, sampleSize, channels, dataFormat);
   const auto size = static_cast<std::uint32_t>(GetHandleSize(settings));
+  const char* const bytes = settings == nullptr ? nullptr : *settings;
 
   channel.Put(static_cast<std::int16_t>(result));
   channel.Put(size);
-  if (size == 0) return;
-  if (*settings == nullptr) channel.Fail();
-  channel.PutBytes(*settings, size);
+  if (size != 0 && bytes == nullptr) channel.Fail();
+  channel.PutBytes(bytes, size);
 }
 
 }  // namespace tallowmere::service
