@@ -22,6 +22,9 @@ std::string Bytes(Integer value) {
 inline std::string U16(unsigned value) {
   return Bytes(static_cast<std::uint16_t>(value));
 }
+inline std::string U32(std::uint32_t value) {
+  return Bytes(value);
+}
 inline std::string I16(int value) {
   return Bytes(static_cast<std::int16_t>(value));
 }
@@ -42,6 +45,13 @@ inline std::string VolumeNumberRequest(std::string_view name) {
 }
 inline std::string VolumeNameRequest(int number) {
   return U16(4) + I16(number);
+}
+
+// The format as it is read, "twos".
+inline std::string ExportSettingsRequest(std::uint32_t rate, std::uint32_t sampleSize,
+                                         std::uint8_t channels, std::string_view format) {
+  return U16(10) + U32(rate) + U32(sampleSize) + Bytes(channels) +
+         std::string(format.rbegin(), format.rend());
 }
 
 inline std::string VolumeNumberResponse(int number) {
