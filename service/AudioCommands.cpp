@@ -5,7 +5,7 @@
 
 namespace {
 
-// A block with the description of a sound, the caller's.
+// A block with the description of a sound, the caller's. A lack of memory for it ends the process.
 Handle NewSoundDescription(unsigned long sampleRate, unsigned long sampleSize,
                            unsigned char channels, unsigned long dataFormat) {
   const Handle block = NewHandleClear(sizeof(SoundDescription));

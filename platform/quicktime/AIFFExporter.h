@@ -18,9 +18,9 @@ class AIFFExporter {
 
   bool HasSound() const { return mSound.has_value(); }
 
-  // The settings for the sound, an atom container. REQUIRES: HasSound(). In it is the
-  // atom 'soun', and in that the format 'ssct' (32 bits), the rate 'ssrt' (in hertz, unsigned
-  // 16.16), the sample size 'ssss' (in bits, 16 bits) and the channels 'sscc' (16 bits).
+  // The settings for the sound, an atom container. In its root is the atom 'soun', and in that the
+  // format 'ssct' (32 bits), the rate 'ssrt' (in hertz, unsigned 16.16), the sample size 'ssss' (in
+  // bits, 16 bits) and the channels 'sscc' (16 bits). REQUIRES: HasSound().
   std::string Settings() const;
 
  private:
