@@ -13,6 +13,7 @@
 
 #include "quicktime/Handles.h"
 #include "service/AudioCommands.h"
+#include "service/Commands.h"
 #include "service/Request.h"
 #include "support/Wire.h"
 
@@ -217,6 +218,21 @@ TEST_F(AudioSteps, OfAResultOf32BitsTheLow16BitsCount) {
   EXPECT_EQ(Run(), -32765);
 }
 
+TEST_F(AudioSteps, ARequestThatIsCutAsksTheHostForNothing) {
+  const std::string fields = ExportSettingsRequest(44100u << 16, 16, 2, "twos").substr(2);
+  for (std::size_t length = 0; length < fields.size(); ++length) {
+    int ends[2];
+    ASSERT_EQ(pipe2(ends, O_CLOEXEC), 0);
+    EXPECT_EQ(write(ends[1], fields.data(), length), ssize_t(length));
+    close(ends[1]);
+    service::Channel channel(ends[0], -1);
+    service::GetAIFFExportSettings(channel);
+    close(ends[0]);
+    EXPECT_TRUE(channel.Failed()) << length;
+    EXPECT_THAT(gAsked.calls, testing::IsEmpty()) << length;
+  }
+}
+
 TEST_F(AudioSteps, WithoutAnExporterTheResponseHasTheCodeSize0AndTheTrailerAlone) {
   gScript.hasExporter = false;
   const Served served = Serve();
@@ -234,7 +250,7 @@ TEST_F(AudioSteps, ABlockIsSentByteForByte) {
 
 TEST_F(AudioSteps, ABlockBeyondThePipesCapacityIsSentWhole) {
   std::string bytes;
-  for (int i = 0; i < 300'000; ++i) bytes.push_back(static_cast<char>(i * i >> 7));
+  for (unsigned i = 0; i < 300'000; ++i) bytes.push_back(static_cast<char>(i * i >> 7));
   gScript.left = NewHandleWith(bytes);
   const Served served = Serve();
   EXPECT_TRUE(served.response == I16(0) + U32(300'000) + bytes + "MWLT");
