@@ -250,4 +250,17 @@ Result<std::optional<std::string>> Client::SetFileRefFromFSSpec(const FileSpec& 
   return exchange.TakeOptionalString();
 }
 
+Result<ExportSettings> Client::GetAIFFExportSettings(const SoundFormat& sound) {
+  Exchange exchange(*this, protocol::kRequestGetAIFFExportSettings);
+  exchange.Put(sound.rate);
+  exchange.Put<std::uint32_t>(sound.sampleSize);
+  exchange.Put(sound.channels);
+  exchange.Put(sound.format);
+  exchange.Send();
+  ExportSettings settings{};
+  settings.result = exchange.Take<std::int16_t>();
+  settings.bytes = exchange.TakeBytes(exchange.Take<std::uint32_t>());
+  return exchange.Finish(std::move(settings));
+}
+
 }  // namespace tallowmere

@@ -32,6 +32,20 @@ struct FileSpec {
   std::string name;
 };
 
+// How sound is stored.
+struct SoundFormat {
+  std::uint32_t rate;        // in hertz × 65536
+  std::uint16_t sampleSize;  // in bits
+  std::uint8_t channels;
+  std::uint32_t format;  // a four-character code, the first character in the highest byte
+};
+
+// What the exporter of AIFF files has to say to a format.
+struct ExportSettings {
+  std::int16_t result;  // the platform's result code, 0 for success; -2005: there is no exporter
+  std::string bytes;    // an atom container; empty when there are no settings
+};
+
 class Client {
  public:
   static Result<Client> Start(const ClientOptions& options = {});
@@ -67,6 +81,10 @@ class Client {
   // above 63 bytes is no record's.
   Result<std::optional<std::string>> SetFileRefFromFSSpec(const FileSpec& spec,
                                                           bool searchOtherVolumes);
+
+  // The settings for the export of such sound to AIFF files, to be stored or passed on as they are.
+  // The service keeps something of each success in memory until it ends.
+  Result<ExportSettings> GetAIFFExportSettings(const SoundFormat& sound);
 
  private:
   Client(ServiceProcess service, std::chrono::milliseconds deadline);

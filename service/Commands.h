@@ -21,4 +21,6 @@ void GetFSSpec(Channel& channel);
 void SetFileRefFromFSSpecData(Channel& channel);
 void SetFileRefFromFSSpec(Channel& channel);
 
+void GetAIFFExportSettings(Channel& channel);
+
 }  // namespace tallowmere::service

@@ -49,4 +49,7 @@ inline constexpr std::size_t kLongestSpecName = 63;
 // Stands for "no volume" where a volume reference number is expected.
 inline constexpr std::int16_t kNoVolume = 32767;
 
+// The result of kRequestGetAIFFExportSettings where there is no exporter for AIFF files.
+inline constexpr std::int16_t kNoAIFFExporter = -2005;
+
 }  // namespace tallowmere::protocol

@@ -33,6 +33,7 @@ constexpr auto kCommands = std::to_array<Command>({
     {protocol::kRequestGetFSSpec, GetFSSpec},
     {protocol::kRequestSetFileRefFromFSSpecData, SetFileRefFromFSSpecData},
     {protocol::kRequestSetFileRefFromFSSpec, SetFileRefFromFSSpec},
+    {protocol::kRequestGetAIFFExportSettings, GetAIFFExportSettings},
 });
 
 const Command* FindCommand(std::uint16_t code) {

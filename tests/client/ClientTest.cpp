@@ -8,6 +8,7 @@
 #include <filesystem>
 
 #include "client/Client.h"
+#include "support/AtomReader.h"
 #include "support/TemporaryFolder.h"
 
 namespace tallowmere {
@@ -106,6 +107,28 @@ TEST(Client, ANameThatTheServiceWouldRefuseIsNoVolumesAndTheServiceLives) {
     ASSERT_TRUE(number);
     EXPECT_FALSE(number->has_value());
   }
+  EXPECT_TRUE(client->GetHFSVolumeName(0));
+}
+
+TEST(Client, GetsTheSettingsForASound) {
+  auto client = StartClient();
+  ASSERT_TRUE(client);
+  const std::uint32_t rate = 48000u << 16;
+  const auto settings = client->GetAIFFExportSettings(
+      {.rate = rate, .sampleSize = 24, .channels = 6, .format = 0x736F7774});
+  ASSERT_TRUE(settings);
+  EXPECT_EQ(settings->result, 0);
+  EXPECT_EQ(test::ReadAtomContainer(settings->bytes), test::SettingsOf("sowt", rate, 24, 6));
+}
+
+TEST(Client, ASoundThatIsRefusedHasACodeAndNoSettingsAndTheServiceLives) {
+  auto client = StartClient();
+  ASSERT_TRUE(client);
+  const auto settings = client->GetAIFFExportSettings(
+      {.rate = 48000u << 16, .sampleSize = 16, .channels = 2, .format = 0x6D703461});
+  ASSERT_TRUE(settings);
+  EXPECT_EQ(settings->result, -206);
+  EXPECT_EQ(settings->bytes, "");
   EXPECT_TRUE(client->GetHFSVolumeName(0));
 }
 

@@ -58,7 +58,8 @@ TEST_P(CutRequest, IsNotAnsweredWhereverItIsCut) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Framing, CutRequest,
-                         testing::Values(VolumeNumberRequest("Volume"), VolumeNameRequest(-1)));
+                         testing::Values(VolumeNumberRequest("Volume"), VolumeNameRequest(-1),
+                                         ExportSettingsRequest(44100u << 16, 16, 2, "twos")));
 
 TEST(Framing, AStringWithoutItsNulInsideTheCountEndsWhereTheCountEnds) {
   Service service;

@@ -22,6 +22,9 @@ std::string Bytes(Integer value) {
 inline std::string U16(unsigned value) {
   return Bytes(static_cast<std::uint16_t>(value));
 }
+inline std::string U32(std::uint32_t value) {
+  return Bytes(value);
+}
 inline std::string I16(int value) {
   return Bytes(static_cast<std::int16_t>(value));
 }
@@ -79,6 +82,13 @@ inline std::string Record(int volume, std::int32_t folder, std::string_view name
   return record;
 }
 inline const std::string kEmptyRecord = Record(32767, -1, "");
+
+// The format as it is read, "twos".
+inline std::string ExportSettingsRequest(std::uint32_t rate, std::uint32_t sampleSize,
+                                         std::uint8_t channels, std::string_view format) {
+  return U16(10) + U32(rate) + U32(sampleSize) + Bytes(channels) +
+         std::string(format.rbegin(), format.rend());
+}
 
 inline std::string VolumeNumberResponse(int number) {
   return I16(number).append(kTrailer);
