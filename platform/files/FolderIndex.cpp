@@ -227,8 +227,7 @@ std::vector<std::string> FolderIndex::StartsFrom(const std::string& start) const
   return starts;
 }
 
-// Folders near `start` first, then the rest of the volume: what earlier walks have left, unless all
-// has to be read anyway.
+// Folders near `start` first, then those that earlier walks have left, then the rest of the volume.
 void FolderIndex::Walk(const std::string& start, Search& search) {
   std::vector<Waiting> left = std::exchange(mWaiting, {});
   for (const std::string& path : StartsFrom(start)) {
@@ -236,7 +235,7 @@ void FolderIndex::Walk(const std::string& start, Search& search) {
     VisitWaiting(search);
     if (search.IsSettled()) return PutBack(std::move(left));
   }
-  if (!search.HasToReadAll()) mWaiting = std::move(left);
+  mWaiting = std::move(left);
   VisitWaiting(search);
   if (!search.IsSettled() && search.HasSeenAll()) mIsWhole = true;
 }

@@ -11,7 +11,6 @@
 #include <chrono>
 #include <cstddef>
 #include <thread>
-#include <vector>
 
 #include "CatalogFixture.h"
 #include "files/FolderIndex.h"
@@ -517,7 +516,7 @@ TEST_F(AnIndex, DoesNotGrowWithLooksForFiles) {
     MakeFile("a/a folder of some length " + std::to_string(i) + "/x");
   }
   MakeFile("a/a folder of some length 7/c/x");
-  mIndex.emplace(mVolume);
+  LetChangesAge();
   FindAny(ID("a/a folder of some length 7/c/x"));
   Find(0x12345678);
   const std::size_t size = mIndex->Size();
@@ -660,26 +659,47 @@ TEST_F(AnIndex, FindsWhatWaitedInAFolderBelowOneThatHasMoved) {
   }
 }
 
-TEST_F(AnIndex, FindsWhatWasCoveredOnceItIsNoMore) {
-  Make("a/known/b/c");
-  Make("a/unknown/b/c");
-  MakeFile("a/known/b/x");
-  MakeFile("a/file");
-  const std::vector<std::string> names{"a/known/b/c", "a/unknown/b/c", "a/known/b/x", "a/file"};
-  std::vector<std::uint32_t> ids;
-  for (const std::string& name : names) ids.push_back(ID(name));
+TEST_F(AnIndex, FindsWhatWasCoveredWhenItsFolderWasRead) {
+  Make("a/b/c/d");
+  const std::uint32_t id = ID("a/b/c");
   LetChangesAge();
   {
-    const ScopedMount unknown("tmpfs", PathTo("a/unknown"), "tmpfs");
-    Find(0x12345678);
-    const ScopedMount known("tmpfs", PathTo("a/known"), "tmpfs");
-    const ScopedMount file("/dev/null", PathTo("a/file"), "", MS_BIND);
-    ASSERT_TRUE(unknown.IsMounted() && known.IsMounted() && file.IsMounted());
-    for (int round = 0; round < 2; ++round) {
-      for (const std::uint32_t id : ids) EXPECT_EQ(FindAny(id), "(none)");
-    }
+    const ScopedMount cover("tmpfs", PathTo("a/b"), "tmpfs");
+    ASSERT_TRUE(cover.IsMounted());
+    EXPECT_EQ(Find(0x12345678), "(none)");
+    EXPECT_EQ(FindAny(id), "(none)");
   }
-  for (std::size_t i = 0; i < names.size(); ++i) EXPECT_EQ(FindAny(ids[i]), PathTo(names[i]));
+  EXPECT_EQ(FindAny(id), PathTo("a/b/c"));
+}
+
+TEST_F(AnIndex, FindsInAFolderThatItKnowsWhatWasCoveredForAWhile) {
+  Make("a/b/c/d");
+  MakeFile("a/b/x");
+  const std::uint32_t file = ID("a/b/x");
+  LetChangesAge();
+  Find(0x12345678);
+  {
+    const ScopedMount cover("tmpfs", PathTo("a/b"), "tmpfs");
+    ASSERT_TRUE(cover.IsMounted());
+    EXPECT_EQ(FindAny(file), "(none)");
+    EXPECT_EQ(FindAny(file), "(none)");
+  }
+  EXPECT_EQ(FindAny(file), PathTo("a/b/x"));
+  ExpectFound("a/b/c/d");
+}
+
+TEST_F(AnIndex, FindsAFileThatWasCoveredForAWhile) {
+  Make("a/b");
+  MakeFile("a/x");
+  const std::uint32_t file = ID("a/x");
+  LetChangesAge();
+  {
+    const ScopedMount cover("/dev/null", PathTo("a/x"), "", MS_BIND);
+    ASSERT_TRUE(cover.IsMounted());
+    EXPECT_EQ(FindAny(file), "(none)");
+    EXPECT_EQ(FindAny(file), "(none)");
+  }
+  EXPECT_EQ(FindAny(file), PathTo("a/x"));
 }
 
 TEST_F(AnIndex, FindsAFileInAFolderThatItKnowsUnderAnotherMount) {
@@ -704,14 +724,18 @@ TEST_F(AnIndex, FindsAFileInAFolderThatItKnowsUnderAnotherMount) {
 TEST_F(AnIndex, LooksWhereverTheVolumeIsMounted) {
   Make("a/b");
   Make("c/d");
-  const ScopedMount first(PathTo("a"), mFolder.MakeFolder("first"), "", MS_BIND);
-  const ScopedMount second(PathTo("c"), mFolder.MakeFolder("second"), "", MS_BIND);
-  const std::uint32_t id = ID("c/d");
+  const std::uint32_t inFirst = ID("a/b");
+  const std::uint32_t inSecond = ID("c/d");
+  const std::string first = mFolder.MakeFolder("first");
+  const std::string second = mFolder.MakeFolder("second");
+  const ScopedMount firstMount(PathTo("a"), first, "", MS_BIND);
+  const ScopedMount secondMount(PathTo("c"), second, "", MS_BIND);
   mMount.reset();
-  UseVolumeOf(mFolder.Path() / "first");
+  UseVolumeOf(first);
   ASSERT_EQ(mVolume->MountPoints().size(), 2u);
-  EXPECT_EQ(mIndex->Find({id, nullptr, true}, mFolder.Path() / "first/b"),
-            mFolder.Path() / "second/d");
+  EXPECT_EQ(mIndex->Find({inSecond, nullptr, true}, first + "/b"), second + "/d");
+  mIndex.emplace(mVolume);
+  EXPECT_EQ(mIndex->Find({inFirst, nullptr, true}, second + "/d"), first + "/b");
 }
 
 TEST_F(AnIndex, RemembersAFolderThatCouldNotBeOpenedForAWhile) {
@@ -727,6 +751,15 @@ TEST_F(AnIndex, RemembersAFolderThatCouldNotBeOpenedForAWhile) {
   EXPECT_EQ(Find(id), PathTo("a/b/new/x"));
   ExpectFound("a/b");
   ExpectFound("a/b/c");
+}
+
+TEST_F(AnIndex, FindsWhatIsDeeperThanItHasDescriptors) {
+  Make("a/b/c/d/e/f");
+  MakeFile("a/b/c/d/e/f/x");
+  const std::uint32_t file = ID("a/b/c/d/e/f/x");
+  Find(0x12345678);
+  const FewDescriptors few(4);
+  EXPECT_EQ(FindAny(file), PathTo("a/b/c/d/e/f/x"));
 }
 
 TEST_F(AnIndex, DoesNotNoteAsMissedWhatItCouldNotSee) {
@@ -809,7 +842,7 @@ TEST_F(AnIndexOfMixedIDs, PassesOverFoldersWithoutPermission) {
 TEST_F(AnIndexOfMixedIDs, PassesOverFoldersThatHaveNoPath) {
   Descriptor folder(open(PathTo("deep").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   const std::string name(250, 'd');
-  for (int depth = 0; depth < 20; ++depth) {
+  for (int depth = 0; depth < 40; ++depth) {
     ASSERT_EQ(mkdirat(folder.Get(), name.c_str(), 0700), 0);
     ASSERT_EQ(mkdirat(folder.Get(), "side", 0700), 0);
     folder = Descriptor(openat(folder.Get(), name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
