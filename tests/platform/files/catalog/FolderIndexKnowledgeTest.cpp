@@ -648,14 +648,14 @@ TEST_F(AnIndex, DoesNotReadAgainWhatIsBelowAFolderThatHasMoved) {
 }
 
 TEST_F(AnIndex, FindsWhatWaitedInAFolderBelowOneThatHasMoved) {
-  for (int i = 0; i < 50; ++i) Make("g/p/" + std::to_string(i) + "/x");
+  for (int i = 0; i < 50; ++i) Make("r/g/p/" + std::to_string(i) + "/x");
   LetChangesAge();
-  ExpectFound("g/p/25/x");
-  Move("g", "h");
-  for (int i = 0; i < 50; ++i) Make("g/p/" + std::to_string(i) + "/y");
+  ExpectFound("r/g/p/25/x");
+  Move("r/g", "r/h");
+  for (int i = 0; i < 50; ++i) Make("r/g/p/" + std::to_string(i) + "/y");
   for (int i = 0; i < 50; ++i) {
-    ExpectFound("h/p/" + std::to_string(i) + "/x");
-    ExpectFound("g/p/" + std::to_string(i) + "/y");
+    ExpectFound("r/h/p/" + std::to_string(i) + "/x");
+    ExpectFound("r/g/p/" + std::to_string(i) + "/y");
   }
 }
 
