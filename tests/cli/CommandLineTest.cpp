@@ -73,8 +73,22 @@ TEST(CommandLine, IdentifyGoesOnBehindAPathWithoutARecord) {
   EXPECT_EQ(cli.Wait(), 1);
 }
 
+TEST(CommandLine, AiffPrintsTheSettingsAsATree) {
+  ChildProgram cli(TALLOWMERE_CLI, {"aiff", "--format", "raw ", "--rate", "22050.5", "--bits", "8",
+                                    "--channels", "1"});
+  EXPECT_EQ(cli.ReadToEnd(),
+            "sean\n  soun\n    ssct  raw \n    ssrt  22050.5\n    ssss  8\n    sscc  1\n");
+  EXPECT_EQ(cli.Wait(), 0);
+}
+
+TEST(CommandLine, AiffTellsTheResultOfASoundThatIsRefused) {
+  ChildProgram cli(TALLOWMERE_CLI, {"aiff", "--format", "mp3 "});
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the exporter refuses this sound: -206\n");
+  EXPECT_EQ(cli.Wait(), 1);
+}
+
 TEST(CommandLine, OutputThatCannotBeWrittenIsStatus1AndOneSentence) {
-  for (const char* const command : {"volumes", "identify /"}) {
+  for (const char* const command : {"volumes", "identify /", "aiff"}) {
     ChildProgram cli("/bin/sh",
                      {"-c", std::string("exec \"$0\" ") + command + " >/dev/full", TALLOWMERE_CLI});
     EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the output could not be written\n");
@@ -93,8 +107,11 @@ TEST(CommandLine, AMissingServiceIsStatus1AndOneSentence) {
 }
 
 TEST(CommandLine, WrongUsageIsStatus2) {
-  for (const std::vector<std::string>& arguments :
-       {std::vector<std::string>{}, {"nonsense"}, {"volumes", "--nonsense"}}) {
+  for (const std::vector<std::string>& arguments : {std::vector<std::string>{},
+                                                    {"nonsense"},
+                                                    {"volumes", "--nonsense"},
+                                                    {"aiff", "--format", "raw"},
+                                                    {"identify"}}) {
     ChildProgram cli(TALLOWMERE_CLI, arguments);
     EXPECT_NE(cli.ReadErrorsToEnd(), "");
     EXPECT_EQ(cli.Wait(), 2);
