@@ -8,6 +8,7 @@
 #include <utility>
 
 #include "cli/Commands.h"
+#include "cli/Output.h"
 #include "cli/ProgressBar.h"
 #include "cli/Text.h"
 #include "cli/TreeWalk.h"
@@ -59,14 +60,11 @@ class Census {
   // The program's exit status.
   int Finish() {
     mBar.Hide();
-    if (mFailure) {
-      std::cerr << "tallowmere-cli: " << mFailure->message << '\n';
-      return 1;
-    }
+    if (mFailure) return Complain(mFailure->message);
     const std::uint64_t missing = mItems - mBack - mVanished;
     std::cout << mItems << " items, " << mBack << " came back, " << missing << " did not, "
               << mVanished << " vanished meanwhile, " << mLeftOut << " left out\n";
-    return std::cout.flush() && missing == 0 ? 0 : 1;
+    return FinishOutput(missing == 0 ? 0 : kFailed);
   }
 
  private:
@@ -102,21 +100,16 @@ class Census {
   std::uint64_t mLeftOut = 0;
 };
 
-int Fail(const Error& error) {
-  std::cerr << "tallowmere-cli: " << Printable(error.message) << '\n';
-  return 1;
-}
-
 }  // namespace
 
 int TakeCensus(ClientOptions options, const std::string& folder) {
   options.deadline = kDeadline;
   const auto path = files::RealPath(folder);
-  if (!path) return Fail({folder + ": " + std::generic_category().message(errno)});
+  if (!path) return Complain(folder + ": " + std::generic_category().message(errno));
   auto records = Client::Start(options);
-  if (!records) return Fail(records.Failure());
+  if (!records) return Complain(records.Failure().message);
   auto paths = Client::Start(options);
-  if (!paths) return Fail(paths.Failure());
+  if (!paths) return Complain(paths.Failure().message);
 
   Census census(*std::move(records), *std::move(paths));
   const TreeVisitor visitor{

@@ -1,18 +1,15 @@
-#include <algorithm>
-#include <iomanip>
 #include <iostream>
-#include <string_view>
+#include <string>
 #include <vector>
 
 #include "cli/Commands.h"
+#include "cli/Output.h"
+#include "cli/Table.h"
 #include "cli/Text.h"
 #include "files/MountTable.h"
 
 namespace tallowmere::cli {
 namespace {
-
-constexpr std::string_view kNumberTitle = "vRefNum";
-constexpr std::string_view kNameTitle = "name";
 
 struct Row {
   std::int16_t number;
@@ -43,27 +40,16 @@ Result<std::vector<Row>> AskForVolumes(const ClientOptions& options) {
 
 int PrintVolumes(const ClientOptions& options) {
   const auto rows = AskForVolumes(options);
-  if (!rows) {
-    std::cerr << "tallowmere-cli: " << rows.Failure().message << '\n';
-    return 1;
-  }
-  std::size_t nameWidth = kNameTitle.size();
-  for (const Row& row : *rows) nameWidth = std::max(nameWidth, CharacterCount(row.name));
-  const auto padded = [nameWidth](std::string_view name) {
-    return std::string(name).append(nameWidth - CharacterCount(name), ' ');
-  };
-  std::cout << kNumberTitle << "  " << padded(kNameTitle) << "  mount point\n";
+  if (!rows) return Complain(rows.Failure().message);
+  Table table({{"vRefNum", Table::Align::kRight}, {"name"}, {"mount point"}});
   for (const Row& row : *rows) {
-    std::cout << std::setw(kNumberTitle.size()) << row.number << "  " << padded(row.name) << "  "
-              << row.mountPoint;
-    if (row.numberByName && *row.numberByName != row.number) {
-      std::cout << "  (the first volume of this name answers to it)";
-    }
-    std::cout << '\n';
+    const bool answers = !row.numberByName || *row.numberByName == row.number;
+    table.Add(
+        {std::to_string(row.number), row.name,
+         row.mountPoint + (answers ? "" : "  (the first volume of this name answers to it)")});
   }
-  if (std::cout.flush()) return 0;
-  std::cerr << "tallowmere-cli: the output could not be written\n";
-  return 1;
+  table.Print(std::cout);
+  return FinishOutput();
 }
 
 }  // namespace tallowmere::cli

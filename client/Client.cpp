@@ -47,6 +47,11 @@ std::string OnSearchPath() {
   return {};
 }
 
+// Whether a C string can carry the text whole.
+bool CanBeText(std::string_view text, std::size_t longest = kLongestText) {
+  return text.size() <= longest && text.find('\0') == std::string_view::npos;
+}
+
 std::string FindService() {
   std::string beside = BesideThisProgram();
   return IsProgram(beside) ? beside : OnSearchPath();
@@ -97,11 +102,29 @@ class Client::Exchange {
     return number;
   }
 
+  std::string TakeBytes(std::size_t size) {
+    if (mClient.mFailure) return {};
+    auto bytes = mClient.mService.Receive(size, mDeadline);
+    if (bytes) return *std::move(bytes);
+    mClient.mFailure = bytes.Failure();
+    return {};
+  }
+
   // A counted string without its NUL.
   std::string TakeString() {
     std::string text = TakeBytes(Take<std::uint16_t>());
     if (!text.empty()) text.pop_back();
     return text;
+  }
+
+  // The rest of a response: a flag and a string, which counts for nothing when the flag is 0 or it
+  // is empty.
+  Result<std::optional<std::string>> TakeOptionalString() {
+    return TakeOptionalString(Take<std::uint8_t>() != 0);
+  }
+  Result<std::optional<std::string>> TakeOptionalString(bool isThere) {
+    std::string text = TakeString();
+    return Finish(isThere && !text.empty() ? std::optional(std::move(text)) : std::nullopt);
   }
 
   FileSpec TakeSpec() {
@@ -126,14 +149,6 @@ class Client::Exchange {
   }
 
  private:
-  std::string TakeBytes(std::size_t size) {
-    if (mClient.mFailure) return {};
-    auto bytes = mClient.mService.Receive(size, mDeadline);
-    if (bytes) return *std::move(bytes);
-    mClient.mFailure = bytes.Failure();
-    return {};
-  }
-
   Client& mClient;
   Deadline mDeadline;
   std::string mRequest;
@@ -152,10 +167,32 @@ Result<Client> Client::Start(const ClientOptions& options) {
 Client::Client(ServiceProcess service, std::chrono::milliseconds deadline)
     : mService(std::move(service)), mDeadline(deadline) {}
 
+Result<std::string> Client::MakeFullPath(std::string_view path) {
+  if (!CanBeText(path)) return std::string(1, protocol::kSeparator);
+  // The longest buffer: a shorter one could be too short for ever.
+  constexpr std::uint16_t kSize = protocol::kLongestHFSName;
+  Exchange exchange(*this, protocol::kRequestMakeFullPath);
+  exchange.PutString(path);
+  exchange.Put(kSize);
+  exchange.PutFlag(true);
+  exchange.Send();
+  exchange.Take<std::uint16_t>();
+  const std::string buffer = exchange.TakeBytes(kSize);
+  return exchange.Finish(buffer.substr(0, buffer.find('\0')));
+}
+
+Result<std::optional<std::string>> Client::MakeFileRefFromPath(std::string_view hfsPath) {
+  if (!CanBeText(hfsPath, protocol::kLongestHFSPath)) return std::optional<std::string>{};
+  Exchange exchange(*this, protocol::kRequestMakeFileRefFromPath);
+  exchange.PutString("");
+  exchange.PutString(hfsPath);
+  exchange.PutFlag(false);
+  exchange.Send();
+  return exchange.TakeOptionalString(exchange.Take<std::int16_t>() == 0);
+}
+
 Result<std::optional<std::int16_t>> Client::GetVolRefnumByHFSName(std::string_view name) {
-  if (name.size() >= protocol::kLongestVolumeName || name.find('\0') != std::string_view::npos) {
-    return std::optional<std::int16_t>{};
-  }
+  if (!CanBeText(name, protocol::kLongestVolumeName - 1)) return std::optional<std::int16_t>{};
   Exchange exchange(*this, protocol::kRequestGetVolRefnumByHFSName);
   exchange.PutString(name);
   exchange.Send();
@@ -167,15 +204,33 @@ Result<std::optional<std::string>> Client::GetHFSVolumeName(std::int16_t number)
   Exchange exchange(*this, protocol::kRequestGetHFSVolumeName);
   exchange.Put(number);
   exchange.Send();
-  const bool found = exchange.Take<std::uint8_t>() != 0;
-  std::string name = exchange.TakeString();
-  return exchange.Finish(found ? std::optional(std::move(name)) : std::nullopt);
+  return exchange.TakeOptionalString();
+}
+
+Result<std::optional<std::string>> Client::GetHFSName(std::string_view path) {
+  if (!CanBeText(path)) return std::optional<std::string>{};
+  Exchange exchange(*this, protocol::kRequestGetHFSName);
+  exchange.PutString(path);
+  exchange.Put(static_cast<std::uint16_t>(protocol::kLongestHFSName));
+  exchange.Send();
+  return exchange.TakeOptionalString();
+}
+
+Result<std::optional<std::string>> Client::AddHFSName(std::string_view folder,
+                                                      std::string_view name) {
+  if (!CanBeText(folder) || !CanBeText(name, protocol::kLongestHFSName - 1)) {
+    return std::optional<std::string>{};
+  }
+  Exchange exchange(*this, protocol::kRequestAddHFSName);
+  exchange.PutString(folder);
+  exchange.PutString(name);
+  exchange.PutFlag(false);
+  exchange.Send();
+  return exchange.TakeOptionalString();
 }
 
 Result<std::optional<FileSpec>> Client::GetFSSpec(std::string_view path) {
-  if (path.size() > kLongestText || path.find('\0') != std::string_view::npos) {
-    return std::optional<FileSpec>{};
-  }
+  if (!CanBeText(path)) return std::optional<FileSpec>{};
   Exchange exchange(*this, protocol::kRequestGetFSSpec);
   exchange.PutString(path);
   exchange.Send();
@@ -192,9 +247,20 @@ Result<std::optional<std::string>> Client::SetFileRefFromFSSpec(const FileSpec& 
   exchange.PutFlag(searchOtherVolumes);
   exchange.PutFlag(false);  // changes nothing
   exchange.Send();
-  const bool isSet = exchange.Take<std::uint8_t>() != 0;
-  std::string path = exchange.TakeString();
-  return exchange.Finish(isSet && !path.empty() ? std::optional(std::move(path)) : std::nullopt);
+  return exchange.TakeOptionalString();
+}
+
+Result<ExportSettings> Client::GetAIFFExportSettings(const SoundFormat& sound) {
+  Exchange exchange(*this, protocol::kRequestGetAIFFExportSettings);
+  exchange.Put(sound.rate);
+  exchange.Put<std::uint32_t>(sound.sampleSize);
+  exchange.Put(sound.channels);
+  exchange.Put(sound.format);
+  exchange.Send();
+  ExportSettings settings{};
+  settings.result = exchange.Take<std::int16_t>();
+  settings.bytes = exchange.TakeBytes(exchange.Take<std::uint32_t>());
+  return exchange.Finish(std::move(settings));
 }
 
 }  // namespace tallowmere

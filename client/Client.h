@@ -32,9 +32,31 @@ struct FileSpec {
   std::string name;
 };
 
+// How sound is stored.
+struct SoundFormat {
+  std::uint32_t rate;        // in hertz × 65536
+  std::uint16_t sampleSize;  // in bits
+  std::uint8_t channels;
+  std::uint32_t format;  // a four-character code, the first character in the highest byte
+};
+
+// What the exporter of AIFF files has to say to a format.
+struct ExportSettings {
+  std::int16_t result;  // the platform's result code, 0 for success; -2005: there is no exporter
+  std::string bytes;    // an atom container; empty when there are no settings
+};
+
 class Client {
  public:
   static Result<Client> Start(const ClientOptions& options = {});
+
+  // The full HFS path of the folder at a POSIX path, or of the folder that holds the file there,
+  // with a colon behind it; outer folders are "..." where it is longer than 1023 bytes. A colon
+  // for what is on no volume. A path above 65534 bytes or with a NUL is none's.
+  Result<std::string> MakeFullPath(std::string_view path);
+
+  // The POSIX path of the item with that HFS path, or none. More than 255 bytes are no HFS path.
+  Result<std::optional<std::string>> MakeFileRefFromPath(std::string_view hfsPath);
 
   // The volume reference number of the first mounted volume with that HFS name, or none.
   // A name above 255 bytes or with a NUL is no volume's.
@@ -42,6 +64,13 @@ class Client {
 
   // The HFS name of the volume with that number, or none. 0 asks for the volume of "/".
   Result<std::optional<std::string>> GetHFSVolumeName(std::int16_t number);
+
+  // The HFS name of the item at a POSIX path, or none for an item that does not exist.
+  Result<std::optional<std::string>> GetHFSName(std::string_view path);
+
+  // The POSIX path of the item with that HFS name in the folder at a POSIX path, or the path that
+  // it would have; none without a folder. A name above 1023 bytes or with a NUL is no item's.
+  Result<std::optional<std::string>> AddHFSName(std::string_view folder, std::string_view name);
 
   // The record of the item at a POSIX path, or none. An item that does not exist has one where its
   // folder does. A path above 65534 bytes or with a NUL has none.
@@ -52,6 +81,10 @@ class Client {
   // above 63 bytes is no record's.
   Result<std::optional<std::string>> SetFileRefFromFSSpec(const FileSpec& spec,
                                                           bool searchOtherVolumes);
+
+  // The settings for the export of such sound to AIFF files, to be stored or passed on as they are.
+  // The service keeps something of each success in memory until it ends.
+  Result<ExportSettings> GetAIFFExportSettings(const SoundFormat& sound);
 
  private:
   Client(ServiceProcess service, std::chrono::milliseconds deadline);

@@ -2,7 +2,9 @@
 
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstring>
+#include <limits>
 #include <new>
 
 namespace tallowmere::service {
@@ -30,13 +32,14 @@ void Channel::TakeCounted(char* buffer, std::size_t longest) {
   buffer[length] = '\0';
 }
 
-std::unique_ptr<char[]> Channel::TakeAllocated() {
-  const std::size_t length = Take<std::uint16_t>();
-  std::unique_ptr<char[]> bytes(new (std::nothrow) char[length + 1]);
+std::unique_ptr<char[]> Channel::TakeAllocated(std::size_t nuls, std::uint16_t* announced) {
+  const auto length = Take<std::uint16_t>();
+  if (announced != nullptr) *announced = length;
+  std::unique_ptr<char[]> bytes(new (std::nothrow) char[length + nuls]);
   if (!bytes) Fail();
   TakeBytes(bytes.get(), length);
   if (mFailed) return nullptr;
-  bytes[length] = '\0';
+  std::fill_n(bytes.get() + length, nuls, '\0');
   return bytes;
 }
 
@@ -54,7 +57,8 @@ void Channel::PutBytes(const void* bytes, std::size_t size) {
 }
 
 void Channel::PutString(const char* text) {
-  const std::size_t length = text == nullptr ? 0 : std::strlen(text) + 1;
+  std::size_t length = text == nullptr ? 0 : std::strlen(text) + 1;
+  if (length > std::numeric_limits<std::uint16_t>::max()) length = 0;
   Put(static_cast<std::uint16_t>(length));
   PutBytes(text, length);
 }

@@ -37,9 +37,9 @@ class Channel {
   // REQUIRES: `buffer` holds `longest` + 1 bytes.
   void TakeCounted(char* buffer, std::size_t longest);
 
-  // Counted bytes of any length, and a NUL behind them. Null after a failure; a lack of memory is
-  // one.
-  std::unique_ptr<char[]> TakeAllocated();
+  // Counted bytes of any length, which `length` tells where it is given, and so many NULs behind
+  // them. Null after a failure; a lack of memory is one.
+  std::unique_ptr<char[]> TakeAllocated(std::size_t nuls = 1, std::uint16_t* length = nullptr);
 
   template <class Number>
   void Put(Number number) {
@@ -49,8 +49,8 @@ class Channel {
   void PutFlag(bool flag) { Put<std::uint8_t>(flag ? 1 : 0); }
   void PutBytes(const void* bytes, std::size_t size);
 
-  // The text as a counted string, its NUL inside the count; for null a count of 0. REQUIRES: below
-  // 65535 bytes.
+  // The text as a counted string, its NUL inside the count; a count of 0 for null, and for a text
+  // that is too long to be counted with its NUL, which is no path that the kernel takes.
   void PutString(const char* text);
 
  private:

@@ -12,9 +12,15 @@ namespace tallowmere::service {
 void GetVolRefnumByHFSName(Channel& channel);
 void GetHFSVolumeName(Channel& channel);
 
+void MakeFullPath(Channel& channel);
+void MakeFileRefFromPath(Channel& channel);
+void AddHFSName(Channel& channel);
+
 void GetHFSName(Channel& channel);
 void GetFSSpec(Channel& channel);
 void SetFileRefFromFSSpecData(Channel& channel);
 void SetFileRefFromFSSpec(Channel& channel);
+
+void GetAIFFExportSettings(Channel& channel);
 
 }  // namespace tallowmere::service

@@ -35,6 +35,12 @@ inline constexpr std::size_t kLongestVolumeName = 256;
 // The longest HFS name in a request, in bytes with its NUL.
 inline constexpr std::size_t kLongestHFSName = 1024;
 
+// The longest HFS path, in bytes without a NUL: its length travels on in one byte.
+inline constexpr std::size_t kLongestHFSPath = 255;
+
+// Separates the names of an HFS path.
+inline constexpr char kSeparator = ':';
+
 // An FSSpec record: the volume reference number (16 bits), the id of the holding folder (32 bits)
 // and the name, a length byte and room for 63 bytes; what lies behind the name is unspecified.
 inline constexpr std::size_t kFileSpecSize = 70;
@@ -42,5 +48,8 @@ inline constexpr std::size_t kLongestSpecName = 63;
 
 // Stands for "no volume" where a volume reference number is expected.
 inline constexpr std::int16_t kNoVolume = 32767;
+
+// The result of kRequestGetAIFFExportSettings where there is no exporter for AIFF files.
+inline constexpr std::int16_t kNoAIFFExporter = -2005;
 
 }  // namespace tallowmere::protocol

@@ -24,12 +24,16 @@ void Quit(Channel&) {
 
 constexpr auto kCommands = std::to_array<Command>({
     {protocol::kRequestQuit, Quit},
+    {protocol::kRequestMakeFullPath, MakeFullPath},
+    {protocol::kRequestMakeFileRefFromPath, MakeFileRefFromPath},
     {protocol::kRequestGetVolRefnumByHFSName, GetVolRefnumByHFSName},
     {protocol::kRequestGetHFSVolumeName, GetHFSVolumeName},
     {protocol::kRequestGetHFSName, GetHFSName},
+    {protocol::kRequestAddHFSName, AddHFSName},
     {protocol::kRequestGetFSSpec, GetFSSpec},
     {protocol::kRequestSetFileRefFromFSSpecData, SetFileRefFromFSSpecData},
     {protocol::kRequestSetFileRefFromFSSpec, SetFileRefFromFSSpec},
+    {protocol::kRequestGetAIFFExportSettings, GetAIFFExportSettings},
 });
 
 const Command* FindCommand(std::uint16_t code) {

@@ -13,8 +13,11 @@ bool IsAnyOf(std::string_view type, std::initializer_list<std::string_view> type
 }  // namespace
 
 bool HasUntrueEntries(std::string_view type) {
-  return type.starts_with("fuse") ||
-         IsAnyOf(type, {"overlay", "virtiofs", "vfat", "msdos", "exfat"});
+  return type == "overlay" || RenumbersFiles(type);
+}
+
+bool RenumbersFiles(std::string_view type) {
+  return type.starts_with("fuse") || IsAnyOf(type, {"virtiofs", "vfat", "msdos", "exfat"});
 }
 
 bool CountsSubfolders(std::string_view type) {

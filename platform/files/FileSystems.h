@@ -10,6 +10,10 @@ namespace tallowmere::files {
 // mounted.
 bool HasUntrueEntries(std::string_view type);
 
+// Whether a file can get another inode number while nothing is done to it or its folder: the
+// numbers are given as the file system meets its items.
+bool RenumbersFiles(std::string_view type);
+
 // Whether a folder has two links and one more for each folder in it, or a single one when it has
 // lost count.
 bool CountsSubfolders(std::string_view type);

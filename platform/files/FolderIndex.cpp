@@ -10,6 +10,7 @@
 #include <climits>
 #include <cstddef>
 #include <ctime>
+#include <iterator>
 #include <limits>
 #include <utility>
 
@@ -34,6 +35,9 @@ constexpr std::size_t kMostComponents = PATH_MAX / 2;
 constexpr std::size_t kMostOpenFolders = 16;
 constexpr std::size_t kSmallestTable = 64;
 
+// Of no search.
+constexpr std::uint32_t kNever = 0;
+
 std::int64_t Now() {
   timespec now{};
   clock_gettime(CLOCK_REALTIME, &now);
@@ -53,6 +57,16 @@ void ReserveFor(Container& container, std::size_t more) {
   if (size > container.capacity()) container.reserve(size + size / 4);
 }
 
+bool MeansGone(int error) {
+  return error == ENOENT || error == ENOTDIR || error == ELOOP;
+}
+
+// Whether an error hides what could be found: what is gone cannot, nor what this process may not
+// read, nor what has no path.
+bool HidesSomething(int error) {
+  return !MeansGone(error) && error != EACCES && error != ENAMETOOLONG;
+}
+
 std::string WithoutFolderMark(const std::string& path) {
   return foundation::WithFolderMark(path, false);
 }
@@ -62,8 +76,10 @@ std::string WithoutFolderMark(const std::string& path) {
 // One question on its way through the folders.
 class FolderIndex::Search {
  public:
-  Search(const SearchedItem& item, const Volume& volume)
+  // `lastSearch` for files too found no item with the id; kNever.
+  Search(const SearchedItem& item, const Volume& volume, std::uint32_t lastSearch)
       : mItem(item),
+        mLastSearch(lastSearch),
         mRoot(*volume.Root()),
         mUntrueEntries(HasUntrueEntries(volume.Type())),
         mCertain(item.reference != nullptr || IsInodeNumber(item.id)) {}
@@ -75,11 +91,23 @@ class FolderIndex::Search {
   // Whether one find settles it. Else every folder has to be seen, or two finds.
   bool IsCertain() const { return mCertain; }
   bool IsSettled() const { return mFound.size() > (mCertain ? 0 : 1); }
-  bool HasFound() const { return !mFound.empty(); }
+
+  // Whether the entries have to be looked at of a folder that a search was the first to read as it
+  // is; and whether of all folders, then.
+  bool HasToRead(std::uint32_t read) const { return !mItem.folder && read > mLastSearch; }
+  bool HasToReadAll() const { return HasToRead(kNever + 1); }
+
+  // Takes note of what could not be looked at.
+  void NoteError(int error) { mIsHidden = mIsHidden || HidesSomething(error); }
+  bool HasSeenAll() const { return !mIsHidden; }
+
+  // Whether no item with the id was in any folder that a search for files too, which came to its
+  // end, has seen.
+  bool IsMissing() const { return !mItem.folder && !mHasMet; }
 
   // The one item that was found.
   std::optional<std::string> Answer() const {
-    if (mFound.size() != 1) return std::nullopt;
+    if (mFound.size() != 1 || (!mCertain && mIsHidden)) return std::nullopt;
     return mFound.front().path;
   }
 
@@ -94,6 +122,7 @@ class FolderIndex::Search {
   template <class Path>
   void Offer(const ItemReference& item, int folder, const char* name, const Path& path) {
     if (NodeIDOf(item, mRoot) != mItem.id) return;
+    mHasMet = true;
     if (mItem.folder && !S_ISDIR(item.type)) return;
     if (mItem.reference != nullptr && !IsAt(*mItem.reference, folder, name)) return;
     const bool known = std::any_of(mFound.begin(), mFound.end(),
@@ -108,19 +137,25 @@ class FolderIndex::Search {
   };
 
   const SearchedItem& mItem;
+  std::uint32_t mLastSearch;
   const ItemReference& mRoot;
   bool mUntrueEntries;
   bool mCertain;
+  bool mHasMet = false;  // an item with the id
+  bool mIsHidden = false;
   std::vector<Found> mFound;  // different items
 };
 
 FolderIndex::FolderIndex(VolumePointer volume)
-    : mVolume(std::move(volume)), mCountsSubfolders(CountsSubfolders(mVolume->Type())) {}
+    : mVolume(std::move(volume)),
+      mCountsSubfolders(CountsSubfolders(mVolume->Type())),
+      mRenumbersFiles(RenumbersFiles(mVolume->Type())) {}
 
 std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std::string& start) {
-  Search search(item, *mVolume);
+  const bool isLast = mSearches == std::numeric_limits<std::uint32_t>::max();
+  if (mUnusedNames > mNames.size() / 2 || isLast) Clear();
   ++mSearches;
-  if (mUnusedNames > mNames.size() / 2) Clear();
+  Search search(item, *mVolume, LastSearchFor(item.id));
   try {
     Run(search, start);
   } catch (...) {
@@ -132,19 +167,19 @@ std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std
   return search.Answer();
 }
 
-// What is known are folders. Whoever looks for a file reads them all anew.
 void FolderIndex::Run(Search& search, const std::string& start) {
   if (!MountTable::OfThisProcess().WithNumber(mVolume->Number())) return;
   if (search.IsCertain()) FindKnown(search);
   if (search.IsSettled()) return;
-  if (!search.WantsFolder()) Clear();
-  if (!mIsWhole || !mWaiting.empty()) Walk(start, search);
-  if (search.WantsFolder()) CheckKnown(search);
+  if (!mIsWhole || !mWaiting.empty() || search.HasToReadAll()) Walk(start, search);
+  CheckKnown(search);
+  if (!search.IsSettled() && search.IsMissing()) NoteMissing(search.ID());
 }
 
 std::size_t FolderIndex::Size() const {
   std::size_t size = mFolders.capacity() * sizeof(Folder) + mTable.capacity() * sizeof(mTable[0]) +
-                     mNames.capacity() + mWaiting.capacity() * sizeof(Waiting);
+                     mNames.capacity() + mWaiting.capacity() * sizeof(Waiting) +
+                     mMissing.capacity() * sizeof(Missing);
   for (const Waiting& waiting : mWaiting) size += waiting.name.capacity();
   return size;
 }
@@ -155,9 +190,11 @@ void FolderIndex::Clear() {
   mTable = {};
   mNames = {};
   mWaiting = {};
+  mMissing = {};
   mOpen.clear();
   mIsWhole = false;
   mUnusedNames = 0;
+  mSearches = kNever;
 }
 
 void FolderIndex::FindKnown(Search& search) const {
@@ -168,16 +205,15 @@ void FolderIndex::FindKnown(Search& search) const {
     const Folder& folder = mFolders[mTable[slot]];
     if (folder.id != search.ID()) continue;
     const std::string path = PathOf(mTable[slot]);
-    if (!IsReachable(path)) continue;
-    const auto status = ReadStatus(AT_FDCWD, path.c_str());
-    if (!status || status->item.inode != folder.inode) continue;
+    const auto status = StatusAt(path);
+    if (!status) continue;
     search.Offer(status->item, AT_FDCWD, path.c_str(),
                  [&path]() -> const std::string& { return path; });
   }
 }
 
-// Folders near `start` first, then those that earlier walks have left, then the rest of the volume.
-void FolderIndex::Walk(const std::string& start, Search& search) {
+// `start`, the folders above it, and the volume's places.
+std::vector<std::string> FolderIndex::StartsFrom(const std::string& start) const {
   const auto& mountPoints = mVolume->MountPoints();
   const auto isMountPoint = [&](const std::string& path) {
     return std::find(mountPoints.begin(), mountPoints.end(), path) != mountPoints.end();
@@ -188,19 +224,38 @@ void FolderIndex::Walk(const std::string& start, Search& search) {
     if (path == "/" || isMountPoint(path)) break;
   }
   starts.insert(starts.end(), mountPoints.begin(), mountPoints.end());
-
-  const std::size_t left = mWaiting.size();
-  for (const std::string& path : starts) {
-    Visit({kNone, path}, search);
-    VisitWaiting(left, search);
-    if (search.IsSettled()) return;
-  }
-  VisitWaiting(0, search);
-  if (!search.IsSettled()) mIsWhole = true;
+  return starts;
 }
 
-void FolderIndex::VisitWaiting(std::size_t remaining, Search& search) {
-  while (mWaiting.size() > remaining && !search.IsSettled()) {
+// Folders near `start` first, then those that earlier walks have left, then the rest of the volume.
+void FolderIndex::Walk(const std::string& start, Search& search) {
+  std::vector<Waiting> left = std::exchange(mWaiting, {});
+  for (const std::string& path : StartsFrom(start)) {
+    Visit({kNone, path}, search);
+    VisitWaiting(search);
+    if (search.IsSettled()) return PutBack(std::move(left));
+  }
+  mWaiting = std::move(left);
+  VisitWaiting(search);
+  if (!search.IsSettled() && search.HasSeenAll()) mIsWhole = true;
+}
+
+// After a walk that stopped: what was left before still waits, and what was found in folders that
+// were read anew, once. The rest is known.
+void FolderIndex::PutBack(std::vector<Waiting> left) {
+  const auto isNews = [this](const Waiting& waiting) {
+    return waiting.parent != kNone && mFolders[waiting.parent].read == mSearches;
+  };
+  std::erase_if(left, isNews);
+  std::erase_if(mWaiting, [&](const Waiting& waiting) { return !isNews(waiting); });
+  if (left.empty()) return;
+  ReserveFor(left, mWaiting.size());
+  std::move(mWaiting.begin(), mWaiting.end(), std::back_inserter(left));
+  mWaiting = std::move(left);
+}
+
+void FolderIndex::VisitWaiting(Search& search) {
+  while (!mWaiting.empty() && !search.IsSettled()) {
     const Waiting next = std::move(mWaiting.back());
     mWaiting.pop_back();
     Visit(next, search);
@@ -208,59 +263,90 @@ void FolderIndex::VisitWaiting(std::size_t remaining, Search& search) {
 }
 
 void FolderIndex::Visit(const Waiting& waiting, Search& search) {
-  const std::int64_t now = Now();
-  const auto parent = WayTo(waiting);
-  if (!parent) return;
-  const char* const name = waiting.name.c_str();
+  const auto parent = WayTo(waiting, search);
+  if (!parent) return Distrust(waiting.parent);
   Descriptor descriptor;
   if (!mCountsSubfolders) descriptor = Open(*parent, waiting.name);
-  const auto status =
-      descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : ReadStatus(*parent, name);
-  if (!status || !S_ISDIR(status->item.type) || !IsOfVolume(status->item, waiting)) return;
+  const auto status = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "")
+                                          : ReadStatus(*parent, waiting.name.c_str());
+  if (!status) {
+    search.NoteError(errno);
+    if (HidesSomething(errno)) Distrust(waiting.parent);
+    return;
+  }
+  if (!S_ISDIR(status->item.type)) return;
+  if (!IsOfVolume(status->item, waiting)) return Distrust(waiting.parent);
+  VisitFolder(waiting, *parent, std::move(descriptor), *status, search);
+}
 
-  const std::uint32_t index = Learn(status->item, waiting);
-  search.Offer(status->item, *parent, name, [&] { return PathOf(index); });
+// `descriptor` is open, or the folder still has to be.
+void FolderIndex::VisitFolder(const Waiting& waiting, int parent, Descriptor descriptor,
+                              const ItemStatus& status, Search& search) {
+  const std::int64_t now = Now();
+  const std::uint32_t index = Learn(status.item, waiting);
+  search.Offer(status.item, parent, waiting.name.c_str(), [&] { return PathOf(index); });
   Folder& folder = mFolders[index];
-  if (folder.change == status->change) {
+  if (folder.checked == mSearches) return;
+  const bool isUnchanged = folder.change == status.change;
+  if (isUnchanged && !search.HasToRead(folder.read)) {
     folder.checked = mSearches;
     return;
   }
-  folder.change = kNotRead;
+  if (!isUnchanged) folder.change = kNotRead;
   if (search.IsSettled()) {
     mWaiting.push_back(waiting);
     return;
   }
-  const bool isLeaf = mCountsSubfolders && status->links == kLinksWithoutSubfolders;
-  if (isLeaf && search.WantsFolder()) return MarkAsRead(index, status->change, now);
+  const bool isLeaf = mCountsSubfolders && status.links == kLinksWithoutSubfolders;
+  if (isLeaf && search.WantsFolder()) return MarkAsRead(index, status.change, now);
 
-  if (!descriptor.IsOpen()) {
-    descriptor = Open(*parent, waiting.name);
-    const bool isRefused = !descriptor.IsOpen() && errno == EACCES;
-    if (isRefused) MarkAsRead(index, status->change, now);
-    // Another folder may have come in the meantime.
-    const auto opened = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
-    if (!opened || !AreEqual(opened->item, status->item)) return;
+  if (!descriptor.IsOpen() && !OpenAgain(waiting, parent, status.item, descriptor, search)) {
+    if (errno == EACCES) MarkAsRead(index, status.change, now);
+    return;
   }
   const std::size_t before = mWaiting.size();
-  if (!Read(index, status->item.device, descriptor, search)) {
+  const Reading reading = Read(index, status.item.device, descriptor, search);
+  if (reading == Reading::kStopped) {
     mWaiting.resize(before);
     mWaiting.push_back(waiting);
     return;
   }
-  MarkAsRead(index, status->change, now);
+  MarkAsRead(index, status.change, now);
+  if (reading == Reading::kPartly) Distrust(index);
   if (mWaiting.size() > before) KeepOpen(index, std::move(descriptor));
+}
+
+// Opens the folder that was seen there. When it cannot be opened, errno says why; another folder
+// may have come in the meantime.
+bool FolderIndex::OpenAgain(const Waiting& waiting, int parent, const ItemReference& item,
+                            Descriptor& descriptor, Search& search) {
+  descriptor = Open(parent, waiting.name);
+  const auto opened = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
+  if (!opened) search.NoteError(errno);
+  if (opened && !AreEqual(opened->item, item)) errno = ENOENT;
+  return opened && AreEqual(opened->item, item);
 }
 
 // `change` and `now` as they were before it was read.
 void FolderIndex::MarkAsRead(std::uint32_t index, std::int64_t change, std::int64_t now) {
+  Folder& folder = mFolders[index];
+  folder.checked = mSearches;
+  if (folder.change == change) return;
+  folder.read = mSearches;
   const bool mayChangeUnseen = change + kCoarsestTick >= now;
-  mFolders[index].change = mayChangeUnseen ? kNotRead : change;
-  mFolders[index].checked = mSearches;
+  folder.change = mayChangeUnseen ? kNotRead : change;
 }
 
-// Whether it was read to its end: not when the search was settled on the way.
-bool FolderIndex::Read(std::uint32_t index, std::uint64_t device, const Descriptor& descriptor,
-                       Search& search) {
+// Something in the folder was not seen that may be seen later though the folder does not change.
+void FolderIndex::Distrust(std::uint32_t index) {
+  if (index == kNone) return;
+  mFolders[index].change = kNotRead;
+  mFolders[index].checked = kNever;  // at another mount more of it may be seen
+}
+
+// Stops when the search is settled.
+FolderIndex::Reading FolderIndex::Read(std::uint32_t index, std::uint64_t device,
+                                       const Descriptor& descriptor, Search& search) {
   struct Entry {  // struct linux_dirent64 of getdents(2)
     std::uint64_t inode;
     std::int64_t offset;
@@ -268,30 +354,42 @@ bool FolderIndex::Read(std::uint32_t index, std::uint64_t device, const Descript
     std::uint8_t type;
     char name[1];
   };
-  const std::int32_t mount = mFolders[index].mount;
+  const bool isNew = mFolders[index].change == kNotRead || search.HasToReadAll();
+  Reading reading = Reading::kWhole;
   alignas(Entry) std::array<char, 32768> buffer;
   while (true) {
     const ssize_t got = getdents64(descriptor.Get(), buffer.data(), buffer.size());
-    if (got <= 0) return true;  // what cannot be read to its end is passed over
+    if (got < 0) search.NoteError(errno);
+    if (got <= 0) return got < 0 ? Reading::kPartly : reading;
     for (ssize_t at = 0; at < got;) {
       const auto* const entry = reinterpret_cast<const Entry*>(buffer.data() + at);
       const char* const name = buffer.data() + at + offsetof(Entry, name);
       at += entry->size;
       if (IsThisOrParent(name)) continue;
-      bool isFolder = entry->type == DT_DIR;
-      if (entry->type == DT_UNKNOWN || search.MayBe(entry->inode, device, isFolder)) {
-        const std::string path = foundation::JoinPath(PathOf(index), name);
-        if (MountTable::OfThisProcess().IsMountPoint(path)) continue;
-        const auto status = ReadStatus(descriptor.Get(), name);
-        if (!status || status->item.mount != mount) continue;
-        isFolder = S_ISDIR(status->item.type);
-        search.Offer(status->item, descriptor.Get(), name,
-                     [&path]() -> const std::string& { return path; });
-        if (search.IsSettled()) return false;
+      Kind kind = entry->type == DT_DIR ? Kind::kFolder : Kind::kOther;
+      if (entry->type == DT_UNKNOWN || search.MayBe(entry->inode, device, kind == Kind::kFolder)) {
+        kind = LookAt(index, descriptor, name, search);
+        if (search.IsSettled()) return Reading::kStopped;
       }
-      if (isFolder) mWaiting.push_back({index, name});
+      if (kind == Kind::kUnknown) reading = Reading::kPartly;
+      // What an earlier reading found is known or waits already.
+      if (kind == Kind::kFolder && isNew) mWaiting.push_back({index, name});
     }
   }
+}
+
+// Offers the item at an entry of an open folder. Unknown when something covers it and when it
+// cannot be looked at.
+FolderIndex::Kind FolderIndex::LookAt(std::uint32_t index, const Descriptor& descriptor,
+                                      const char* name, Search& search) {
+  const std::string path = foundation::JoinPath(PathOf(index), name);
+  if (MountTable::OfThisProcess().IsMountPoint(path)) return Kind::kUnknown;
+  const auto status = ReadStatus(descriptor.Get(), name);
+  if (!status) search.NoteError(errno);
+  if (!status || status->item.mount != mFolders[index].mount) return Kind::kUnknown;
+  search.Offer(status->item, descriptor.Get(), name,
+               [&path]() -> const std::string& { return path; });
+  return S_ISDIR(status->item.type) ? Kind::kFolder : Kind::kOther;
 }
 
 // Looks at every folder that this search has not seen: folders that have changed are read again,
@@ -303,30 +401,62 @@ void FolderIndex::CheckKnown(Search& search) {
       if (mFolders[index].id == 0 || mFolders[index].checked == mSearches) continue;
       if (CheckUnchanged(index, search)) continue;
       const Folder& folder = mFolders[index];
-      Visit({folder.parent, std::string(NameOf(folder))}, search);
-      VisitWaiting(0, search);
-      Folder& seen = mFolders[index];
-      if (!last || seen.checked == mSearches || search.IsSettled()) continue;
-      mUnusedNames += NameOf(seen).size() + 1;
-      seen.id = 0;
+      if (folder.parent == kNone || OpenParent(folder.parent, search)) {
+        Visit({folder.parent, std::string(NameOf(folder))}, search);
+        VisitWaiting(search);
+      }
+      const bool isSeen = mFolders[index].checked == mSearches;
+      if (last && !isSeen && !search.IsSettled()) ForgetIfGone(index);
     }
   }
 }
 
-// Whether the folder is where it is known to be, as it was when it was read. It then counts as
-// seen.
+// Whether the folder is where it is known to be, as it was when it was read, and need not be read
+// for this search. It then counts as seen.
 bool FolderIndex::CheckUnchanged(std::uint32_t index, Search& search) {
   const std::string path = PathOf(index);
-  if (!IsReachable(path)) return false;
-  const auto status = ReadStatus(AT_FDCWD, path.c_str());
+  const auto status = StatusAt(path);
   Folder& folder = mFolders[index];
   if (!status || status->item.inode != folder.inode || status->change != folder.change) {
     return false;
   }
-  folder.checked = mSearches;
   search.Offer(status->item, AT_FDCWD, path.c_str(),
                [&path]() -> const std::string& { return path; });
+  if (search.HasToRead(folder.read)) return false;
+  folder.checked = mSearches;
   return true;
+}
+
+// A folder that no search can see. One that is merely covered, or not to be looked at, may come
+// back without a change.
+void FolderIndex::ForgetIfGone(std::uint32_t index) {
+  Folder& folder = mFolders[index];
+  folder.change = kNotRead;
+  const std::string path = PathOf(index);
+  if (!path.empty()) {
+    if (!IsReachable(path)) return;
+    const auto status = ReadStatus(AT_FDCWD, path.c_str());
+    const bool isThere = status ? status->item.inode == folder.inode : !MeansGone(errno);
+    if (isThere) return;
+  }
+  mUnusedNames += NameOf(folder).size() + 1;
+  folder.id = 0;
+}
+
+// The last search for files too that found no item with the id; kNever.
+std::uint32_t FolderIndex::LastSearchFor(std::uint32_t id) const {
+  const auto noted = std::find_if(mMissing.begin(), mMissing.end(),
+                                  [id](const Missing& missing) { return missing.id == id; });
+  return noted == mMissing.end() ? kNever : noted->search;
+}
+
+// What the search did not see is kNotRead. Nothing is noted where a file can get the id without a
+// change of its folder.
+void FolderIndex::NoteMissing(std::uint32_t id) {
+  if (mRenumbersFiles) return;
+  std::erase_if(mMissing, [id](const Missing& missing) { return missing.id == id; });
+  if (mMissing.size() == kMostMissing) mMissing.erase(mMissing.begin());
+  mMissing.push_back({id, mSearches});
 }
 
 // The folder's index. One that was known may have moved.
@@ -336,7 +466,7 @@ std::uint32_t FolderIndex::Learn(const ItemReference& item, const Waiting& waiti
   if (index == kNone) {
     index = static_cast<std::uint32_t>(mFolders.size());
     ReserveFor(mFolders, 1);
-    mFolders.push_back({item.inode, kNotRead, id, kNone, 0, item.mount, 0});
+    mFolders.push_back({item.inode, kNotRead, id, kNone, 0, item.mount, kNever, kNever});
     Rename(mFolders.back(), waiting);
     Insert(index);
     return index;
@@ -348,8 +478,8 @@ std::uint32_t FolderIndex::Learn(const ItemReference& item, const Waiting& waiti
   if (folder.parent != waiting.parent || NameOf(folder) != waiting.name) {
     mUnusedNames += NameOf(folder).size() + 1;
     Rename(folder, waiting);
-    folder.mount = item.mount;
   }
+  folder.mount = item.mount;
   return index;
 }
 
@@ -418,6 +548,12 @@ std::string FolderIndex::PathOf(const Waiting& waiting) const {
   return foundation::JoinPath(PathOf(waiting.parent), waiting.name);
 }
 
+// None also where it cannot be asked for without waiting.
+std::optional<ItemStatus> FolderIndex::StatusAt(const std::string& path) const {
+  if (path.empty() || !IsReachable(path)) return std::nullopt;
+  return ReadStatus(AT_FDCWD, path.c_str());
+}
+
 // Not what lies under the mount of another file system, for which one could wait.
 bool FolderIndex::IsReachable(std::string path) const {
   const auto& mountPoints = mVolume->MountPoints();
@@ -430,9 +566,9 @@ bool FolderIndex::IsReachable(std::string path) const {
 
 // The open folder in which to look for the name, as in openat(2). None where something is mounted,
 // and where the parent cannot be opened.
-std::optional<int> FolderIndex::WayTo(const Waiting& waiting) {
+std::optional<int> FolderIndex::WayTo(const Waiting& waiting, Search& search) {
   if (waiting.parent == kNone) return AT_FDCWD;
-  if (!OpenParent(waiting.parent)) return std::nullopt;
+  if (!OpenParent(waiting.parent, search)) return std::nullopt;
   const OpenFolder& parent = mOpen.back();
   if (parent.holdsMountPoint && MountTable::OfThisProcess().IsMountPoint(PathOf(waiting))) {
     return std::nullopt;
@@ -445,14 +581,17 @@ Descriptor FolderIndex::Open(int parent, const std::string& name) {
   return Descriptor(openat(parent, name.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
 }
 
-// Makes a folder the last of the open ones. False when it cannot be opened.
-bool FolderIndex::OpenParent(std::uint32_t index) {
+// Makes a folder the last of the open ones. False when it cannot be opened, and when another is in
+// its place.
+bool FolderIndex::OpenParent(std::uint32_t index, Search& search) {
   while (!mOpen.empty() && mOpen.back().index != index) mOpen.pop_back();
   if (!mOpen.empty()) return true;
   const std::string path = PathOf(index);
-  if (!IsReachable(path)) return false;
+  if (path.empty() || !IsReachable(path)) return false;
   Descriptor descriptor(open(path.c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
-  if (!descriptor.IsOpen()) return false;
+  const auto opened = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
+  if (!opened) search.NoteError(errno);
+  if (!opened || opened->item.inode != mFolders[index].inode) return false;
   KeepOpen(index, std::move(descriptor));
   return true;
 }

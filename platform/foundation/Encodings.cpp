@@ -1,6 +1,7 @@
 #include "foundation/Encodings.h"
 
 #include <algorithm>
+#include <bit>
 #include <cstring>
 
 #include "foundation/MacRoman.h"
@@ -60,9 +61,8 @@ EncodedCharacter NextInUtf8(std::u16string_view text) {
   const auto [codePoint, units] = NextUtf16(text);
   if (IsSurrogate(codePoint)) return {units, 0, {}};
   const Utf8Sequence sequence = EncodeUtf8(codePoint);
-  EncodedCharacter character{units, sequence.length, {}};
-  std::copy_n(sequence.bytes.begin(), sequence.length, character.bytes.begin());
-  return character;
+  return {units, sequence.length,
+          std::bit_cast<std::array<std::uint8_t, std::size(sequence.bytes)>>(sequence.bytes)};
 }
 
 Decoded DecodedUtf8(std::string_view bytes) {

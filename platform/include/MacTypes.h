@@ -36,7 +36,9 @@ enum : OSErr {
   bdNamErr = -37,              // a name that cannot be
   fnfErr = -43,                // no such item
   paramErr = -50,              // an argument that cannot be
+  memFullErr = -108,           // memory is short
   dirNFErr = -120,             // no such folder
+  badFormat = -206,            // a sound format that is not supported
   errFSBadFSRef = -1401,       // a reference to no item
   errFSNotAFolder = -1407,     // a folder was needed
   errFSRefsDifferent = -1420,  // two references to different items

@@ -50,6 +50,52 @@ TEST(CommandLine, VolumesTellsWhichOfTwoVolumesWithOneNameAnswersToIt) {
   EXPECT_THAT(text, HasSubstr("/b/Twin  (the first volume of this name answers to it)\n"));
 }
 
+TEST(CommandLine, IdentifyPrintsRecordFullPathAndWayBack) {
+  const TemporaryFolder folder;
+  const std::string file = folder.MakeFile("a:b\xC3\xA9");
+  ChildProgram cli(TALLOWMERE_CLI, {"identify", file, "/"});
+  const std::string text = cli.ReadToEnd();
+  EXPECT_EQ(cli.Wait(), 0);
+  EXPECT_THAT(text, StartsWith("vRefNum  parent id  HFS name"));
+  EXPECT_THAT(text, HasSubstr("  a/b\xC3\xA9"));
+  EXPECT_THAT(text, HasSubstr(":a/b\xC3\xA9"));
+  EXPECT_THAT(text, HasSubstr("  " + file + "\n"));
+  EXPECT_THAT(text, ContainsRegex(":  +/\n"));
+}
+
+TEST(CommandLine, IdentifyGoesOnBehindAPathWithoutARecord) {
+  const TemporaryFolder folder;
+  const std::string missing = folder.Path() / "missing/file";
+  ChildProgram cli(TALLOWMERE_CLI, {"identify", missing, folder.Path()});
+  EXPECT_THAT(cli.ReadToEnd(), HasSubstr("  " + folder.Path().string() + "\n"));
+  EXPECT_EQ(cli.ReadErrorsToEnd(),
+            "tallowmere-cli: " + missing + ": there is no such folder on any volume\n");
+  EXPECT_EQ(cli.Wait(), 1);
+}
+
+TEST(CommandLine, AiffPrintsTheSettingsAsATree) {
+  ChildProgram cli(TALLOWMERE_CLI, {"aiff", "--format", "raw ", "--rate", "22050.5", "--bits", "8",
+                                    "--channels", "1"});
+  EXPECT_EQ(cli.ReadToEnd(),
+            "sean\n  soun\n    ssct  raw \n    ssrt  22050.5\n    ssss  8\n    sscc  1\n");
+  EXPECT_EQ(cli.Wait(), 0);
+}
+
+TEST(CommandLine, AiffTellsTheResultOfASoundThatIsRefused) {
+  ChildProgram cli(TALLOWMERE_CLI, {"aiff", "--format", "mp3 "});
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the exporter refuses this sound: -206\n");
+  EXPECT_EQ(cli.Wait(), 1);
+}
+
+TEST(CommandLine, OutputThatCannotBeWrittenIsStatus1AndOneSentence) {
+  for (const char* const command : {"volumes", "identify /", "aiff"}) {
+    ChildProgram cli("/bin/sh",
+                     {"-c", std::string("exec \"$0\" ") + command + " >/dev/full", TALLOWMERE_CLI});
+    EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the output could not be written\n");
+    EXPECT_EQ(cli.Wait(), 1);
+  }
+}
+
 TEST(CommandLine, AMissingServiceIsStatus1AndOneSentence) {
   ChildProgram cli(TALLOWMERE_CLI, {"--service", "/nonexistent/service", "volumes"});
   EXPECT_EQ(
@@ -61,8 +107,11 @@ TEST(CommandLine, AMissingServiceIsStatus1AndOneSentence) {
 }
 
 TEST(CommandLine, WrongUsageIsStatus2) {
-  for (const std::vector<std::string>& arguments :
-       {std::vector<std::string>{}, {"nonsense"}, {"volumes", "--nonsense"}}) {
+  for (const std::vector<std::string>& arguments : {std::vector<std::string>{},
+                                                    {"nonsense"},
+                                                    {"volumes", "--nonsense"},
+                                                    {"aiff", "--format", "raw"},
+                                                    {"identify"}}) {
     ChildProgram cli(TALLOWMERE_CLI, arguments);
     EXPECT_NE(cli.ReadErrorsToEnd(), "");
     EXPECT_EQ(cli.Wait(), 2);

@@ -8,6 +8,7 @@
 #include <filesystem>
 
 #include "client/Client.h"
+#include "support/AtomReader.h"
 #include "support/TemporaryFolder.h"
 
 namespace tallowmere {
@@ -47,6 +48,45 @@ TEST(Client, AsksForTheVolumesNamesAndNumbers) {
   EXPECT_LT(**number, 0);
 }
 
+TEST(Client, AsksForNamesAndPathsOfAFile) {
+  auto client = StartClient();
+  ASSERT_TRUE(client);
+  const TemporaryFolder folder;
+  const std::string file = folder.MakeFile("a:b");
+  const auto name = client->GetHFSName(file);
+  ASSERT_TRUE(name);
+  EXPECT_EQ(*name, "a/b");
+  const auto added = client->AddHFSName(folder.Path().string(), "a/b");
+  ASSERT_TRUE(added);
+  EXPECT_EQ(*added, file);
+  const auto fullPath = client->MakeFullPath(file);
+  ASSERT_TRUE(fullPath);
+  const auto back = client->MakeFileRefFromPath(*fullPath + "a/b");
+  ASSERT_TRUE(back);
+  EXPECT_EQ(*back, file);
+  const auto spec = client->GetFSSpec(file);
+  ASSERT_TRUE(spec && *spec);
+  const auto path = client->SetFileRefFromFSSpec(**spec, false);
+  ASSERT_TRUE(path);
+  EXPECT_EQ(*path, file);
+}
+
+TEST(Client, WhatCannotBeAskedIsNoneAndNoError) {
+  auto client = StartClient();
+  ASSERT_TRUE(client);
+  const std::string withNUL("/a\0b", 4);
+  const std::string tooLong(65535, 'x');
+  for (const std::string& path : {withNUL, tooLong}) {
+    EXPECT_EQ(*client->GetHFSName(path), std::nullopt);
+    EXPECT_EQ(*client->AddHFSName(path, "x"), std::nullopt);
+    EXPECT_EQ(*client->AddHFSName("/", path), std::nullopt);
+    EXPECT_EQ(*client->MakeFullPath(path), ":");
+    EXPECT_EQ(*client->MakeFileRefFromPath(path), std::nullopt);
+    EXPECT_FALSE(*client->GetFSSpec(path));
+  }
+  EXPECT_TRUE(*client->GetHFSVolumeName(0));
+}
+
 TEST(Client, WhatIsNotMountedIsNoneAndNoError) {
   auto client = StartClient();
   ASSERT_TRUE(client);
@@ -67,6 +107,28 @@ TEST(Client, ANameThatTheServiceWouldRefuseIsNoVolumesAndTheServiceLives) {
     ASSERT_TRUE(number);
     EXPECT_FALSE(number->has_value());
   }
+  EXPECT_TRUE(client->GetHFSVolumeName(0));
+}
+
+TEST(Client, GetsTheSettingsForASound) {
+  auto client = StartClient();
+  ASSERT_TRUE(client);
+  const std::uint32_t rate = 48000u << 16;
+  const auto settings = client->GetAIFFExportSettings(
+      {.rate = rate, .sampleSize = 24, .channels = 6, .format = 0x736F7774});
+  ASSERT_TRUE(settings);
+  EXPECT_EQ(settings->result, 0);
+  EXPECT_EQ(test::ReadAtomContainer(settings->bytes), test::SettingsOf("sowt", rate, 24, 6));
+}
+
+TEST(Client, ASoundThatIsRefusedHasACodeAndNoSettingsAndTheServiceLives) {
+  auto client = StartClient();
+  ASSERT_TRUE(client);
+  const auto settings = client->GetAIFFExportSettings(
+      {.rate = 48000u << 16, .sampleSize = 16, .channels = 2, .format = 0x6D703461});
+  ASSERT_TRUE(settings);
+  EXPECT_EQ(settings->result, -206);
+  EXPECT_EQ(settings->bytes, "");
   EXPECT_TRUE(client->GetHFSVolumeName(0));
 }
 

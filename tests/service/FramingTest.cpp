@@ -5,9 +5,6 @@
 namespace tallowmere::test {
 namespace {
 
-const std::string kAnyRequest = VolumeNameRequest(32767);
-const std::string kItsResponse = kNoVolumeNameResponse;
-
 TEST(Framing, ARequestCodeInTwoReadsIsServedNormally) {
   Service service;
   service.Write(kAnyRequest.substr(0, 1));
@@ -61,7 +58,8 @@ TEST_P(CutRequest, IsNotAnsweredWhereverItIsCut) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Framing, CutRequest,
-                         testing::Values(VolumeNumberRequest("Volume"), VolumeNameRequest(-1)));
+                         testing::Values(VolumeNumberRequest("Volume"), VolumeNameRequest(-1),
+                                         ExportSettingsRequest(44100u << 16, 16, 2, "twos")));
 
 TEST(Framing, AStringWithoutItsNulInsideTheCountEndsWhereTheCountEnds) {
   Service service;

@@ -19,9 +19,6 @@ std::string IDOfNoProcess() {
   return std::to_string(process);
 }
 
-const std::string kAnyRequest = VolumeNameRequest(32767);
-const std::string kItsResponse = kNoVolumeNameResponse;
-
 TEST(Lifetime, WithoutAnArgumentTheServiceSaysSoAndReadsNothing) {
   ChildProgram service(TALLOWMERE_SERVICE, {});
   service.Write(kAnyRequest);

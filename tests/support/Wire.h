@@ -22,6 +22,9 @@ std::string Bytes(Integer value) {
 inline std::string U16(unsigned value) {
   return Bytes(static_cast<std::uint16_t>(value));
 }
+inline std::string U32(std::uint32_t value) {
+  return Bytes(value);
+}
 inline std::string I16(int value) {
   return Bytes(static_cast<std::int16_t>(value));
 }
@@ -44,13 +47,78 @@ inline std::string VolumeNameRequest(int number) {
   return U16(4) + I16(number);
 }
 
+inline std::string Flag(unsigned value) {
+  return Bytes(static_cast<std::uint8_t>(value));
+}
+inline std::string FullPathRequest(std::string_view path, unsigned size, unsigned flag) {
+  return U16(1) + CString(path) + U16(size) + Flag(flag);
+}
+// `folder` and `name` with whatever NULs they are to have.
+inline std::string PathOfHFSPathRequest(std::string_view folder, std::string_view name,
+                                        unsigned flag) {
+  return U16(2) + Counted(folder) + Counted(name) + Flag(flag);
+}
+inline std::string HFSNameRequest(std::string_view path, unsigned longest) {
+  return U16(5) + CString(path) + U16(longest);
+}
+inline std::string AddNameRequest(std::string_view path, std::string_view name, unsigned flag) {
+  return U16(6) + CString(path) + CString(name) + Flag(flag);
+}
+inline std::string RecordRequest(std::string_view path) {
+  return U16(7) + CString(path);
+}
+inline std::string PathOfPartsRequest(int volume, std::int32_t folder, std::string_view name,
+                                      unsigned flag) {
+  return U16(8) + I16(volume) + Bytes(folder) + CString(name) + Flag(flag);
+}
+inline std::string PathOfRecordRequest(std::string_view record, unsigned search, unsigned flag) {
+  return U16(9).append(record) + Flag(search) + Flag(flag);
+}
+
+// A record of 70 bytes, zero behind the name.
+inline std::string Record(int volume, std::int32_t folder, std::string_view name) {
+  std::string record = I16(volume) + Bytes(folder) + Flag(static_cast<unsigned>(name.size()));
+  record.append(name).resize(70);
+  return record;
+}
+inline const std::string kEmptyRecord = Record(32767, -1, "");
+
+// The format as it is read, "twos".
+inline std::string ExportSettingsRequest(std::uint32_t rate, std::uint32_t sampleSize,
+                                         std::uint8_t channels, std::string_view format) {
+  return U16(10) + U32(rate) + U32(sampleSize) + Bytes(channels) +
+         std::string(format.rbegin(), format.rend());
+}
+
 inline std::string VolumeNumberResponse(int number) {
   return I16(number).append(kTrailer);
 }
 inline std::string VolumeNameResponse(std::string_view name) {
   return ("\1" + CString(name)).append(kTrailer);
 }
+inline std::string NameResponse(unsigned flag, std::string_view name) {
+  return (Flag(flag) + CString(name)).append(kTrailer);
+}
+inline std::string RecordResponse(unsigned flag, std::string_view record) {
+  return Flag(flag).append(record).append(kTrailer);
+}
+// To codes 6, 8 and 9.
+inline std::string PathResponse(std::string_view path) {
+  return (Flag(1) + CString(path)).append(kTrailer);
+}
+inline const std::string kNoPathResponse = (Flag(0) + U16(0)).append(kTrailer);
+// To code 2.
+inline std::string ResultResponse(int result, std::string_view path) {
+  return (I16(result) + CString(path)).append(kTrailer);
+}
+inline std::string ResultResponse(int result) {
+  return (I16(result) + U16(0)).append(kTrailer);
+}
 inline const std::string kNoVolumeNameResponse = std::string("\0\1\0\0MWLT", 8);
+
+// A request that any service answers, and the answer.
+inline const std::string kAnyRequest = VolumeNameRequest(32767);
+inline const std::string& kItsResponse = kNoVolumeNameResponse;
 
 // A running service whose parent is this process.
 class Service : public ChildProgram {
@@ -62,6 +130,13 @@ class Service : public ChildProgram {
   std::string Ask(std::string_view request, std::size_t responseSize) {
     Write(request);
     return Read(responseSize);
+  }
+
+  // Whether the response is this one and nothing more.
+  bool Answers(std::string_view request, const std::string& response) {
+    Write(request);
+    Write(kAnyRequest);
+    return Read(response.size()) == response && Read(kItsResponse.size()) == kItsResponse;
   }
 
   // The number of the volume with a name, by code 3.

@@ -1,0 +1,34 @@
+// Rows of text under titles, in columns as wide as their widest text.
+#pragma once
+
+#include <iosfwd>
+#include <string>
+#include <vector>
+
+namespace tallowmere::cli {
+
+class Table {
+ public:
+  enum class Align { kLeft, kRight };
+  struct Column {
+    std::string title;
+    Align align = Align::kLeft;
+  };
+
+  explicit Table(std::vector<Column> columns);
+
+  // As many texts as there are columns, fit for a terminal.
+  void Add(std::vector<std::string> row);
+
+  // Nothing is padded at the end of a line.
+  void Print(std::ostream& out) const;
+
+ private:
+  void PrintRow(std::ostream& out, const std::vector<std::string>& row) const;
+
+  std::vector<Column> mColumns;
+  std::vector<std::size_t> mWidths;  // in characters
+  std::vector<std::vector<std::string>> mRows;
+};
+
+}  // namespace tallowmere::cli

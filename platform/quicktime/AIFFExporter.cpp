@@ -1,0 +1,57 @@
+#include "quicktime/AIFFExporter.h"
+
+#include <algorithm>
+
+#include "quicktime/AtomContainer.h"
+#include "quicktime/FourCharacterCode.h"
+
+namespace tallowmere::quicktime {
+namespace {
+
+struct Format {
+  OSType code;
+  bool isCompressed;  // its name alone says how many bits there are to a sample
+};
+
+constexpr Format kFormats[] = {
+    {FourCharacterCode("NONE"), false}, {FourCharacterCode("raw "), false},
+    {FourCharacterCode("twos"), false}, {FourCharacterCode("sowt"), false},
+    {FourCharacterCode("in24"), false}, {FourCharacterCode("in32"), false},
+    {FourCharacterCode("fl32"), false}, {FourCharacterCode("fl64"), false},
+    {FourCharacterCode("ulaw"), true},  {FourCharacterCode("alaw"), true},
+    {FourCharacterCode("ima4"), true},  {FourCharacterCode("MAC3"), true},
+    {FourCharacterCode("MAC6"), true},
+};
+
+const Format* FindFormat(OSType code) {
+  const auto* const found = std::find_if(std::begin(kFormats), std::end(kFormats),
+                                         [code](const Format& row) { return row.code == code; });
+  return found == std::end(kFormats) ? nullptr : found;
+}
+
+constexpr OSType kFormatAtom = FourCharacterCode("ssct");
+constexpr OSType kRateAtom = FourCharacterCode("ssrt");
+constexpr OSType kSampleSizeAtom = FourCharacterCode("ssss");
+constexpr OSType kChannelsAtom = FourCharacterCode("sscc");
+
+}  // namespace
+
+OSErr AIFFExporter::SetSound(const SoundDescription& sound) {
+  if (sound.descSize != sizeof sound) return paramErr;
+  const Format* const format = FindFormat(sound.dataFormat);
+  if (format == nullptr) return badFormat;
+  if (sound.numChannels < 1 || sound.sampleRate == 0) return paramErr;
+  if (sound.sampleSize == 0 && !format->isCompressed) return paramErr;
+  mSound = sound;
+  return noErr;
+}
+
+std::string AIFFExporter::Settings() const {
+  return AtomContainer({Parent(
+      SoundMediaType, {Leaf(kFormatAtom, BigEndian(mSound->dataFormat)),
+                       Leaf(kRateAtom, BigEndian(mSound->sampleRate)),
+                       Leaf(kSampleSizeAtom, BigEndian(static_cast<UInt16>(mSound->sampleSize))),
+                       Leaf(kChannelsAtom, BigEndian(static_cast<UInt16>(mSound->numChannels)))})});
+}
+
+}  // namespace tallowmere::quicktime

@@ -1,0 +1,98 @@
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <limits>
+#include <string>
+
+#include "quicktime/Handles.h"
+
+namespace tallowmere::quicktime::test {
+namespace {
+
+TEST(Handles, ANewBlockIsZeroAndHasItsSize) {
+  // What was in memory before is no zeros.
+  const Handle before = NewHandleClear(36);
+  std::memset(*before, 0xFF, 36);
+  DisposeHandle(before);
+  const Handle handle = NewHandleClear(36);
+  ASSERT_NE(handle, nullptr);
+  EXPECT_EQ(std::string(*handle, 36), std::string(36, '\0'));
+  EXPECT_EQ(GetHandleSize(handle), 36);
+  DisposeHandle(handle);
+}
+
+TEST(Handles, ABlockOfNoBytesIsABlock) {
+  const auto before = LiveHandles();
+  const Handle handle = NewHandleClear(0);
+  ASSERT_NE(handle, nullptr);
+  EXPECT_EQ(GetHandleSize(handle), 0);
+  EXPECT_EQ(LiveHandles(), before + 1);
+  DisposeHandle(handle);
+}
+
+TEST(Handles, EachBlockIsItsOwn) {
+  const Handle first = NewHandleClear(4);
+  const Handle second = NewHandleClear(5);
+  std::memcpy(*first, "1234", 4);
+  std::memcpy(*second, "abcde", 5);
+  EXPECT_EQ(std::string(*first, 4), "1234");
+  EXPECT_EQ(GetHandleSize(first), 4);
+  EXPECT_EQ(GetHandleSize(second), 5);
+  DisposeHandle(first);
+  EXPECT_EQ(std::string(*second, 5), "abcde");
+  DisposeHandle(second);
+}
+
+TEST(Handles, ABlockIsAliveUntilItIsDisposedOf) {
+  const auto before = LiveHandles();
+  const Handle handle = NewHandleClear(1);
+  EXPECT_EQ(LiveHandles(), before + 1);
+  DisposeHandle(handle);
+  EXPECT_EQ(LiveHandles(), before);
+}
+
+TEST(Handles, NoBlockHasNoSizeAndIsNotDisposedOf) {
+  const auto before = LiveHandles();
+  char bytes[] = "no block";
+  char* pointer = bytes;
+  EXPECT_EQ(GetHandleSize(nullptr), 0);
+  EXPECT_EQ(GetHandleSize(&pointer), 0);
+  DisposeHandle(nullptr);
+  DisposeHandle(&pointer);
+  EXPECT_EQ(LiveHandles(), before);
+}
+
+TEST(Handles, ABlockThatIsGoneHasNoSizeAndIsNotDisposedOfAgain) {
+  const Handle handle = NewHandleClear(8);
+  DisposeHandle(handle);
+  EXPECT_EQ(GetHandleSize(handle), 0);
+  DisposeHandle(handle);
+}
+
+TEST(Handles, ThereIsNoBlockOfASizeBelow0OrBeyondAllMemory) {
+  const auto before = LiveHandles();
+  EXPECT_EQ(NewHandleClear(-1), nullptr);
+  EXPECT_EQ(NewHandleClear(std::numeric_limits<Size>::min()), nullptr);
+#ifndef __SANITIZE_ADDRESS__  // which ends the process instead
+  EXPECT_EQ(NewHandleClear(std::numeric_limits<Size>::max()), nullptr);
+#endif
+  EXPECT_EQ(LiveHandles(), before);
+}
+
+TEST(Handles, AnEmptiedPointerDoesNotKeepABlockFromBeingFreed) {
+  const Handle handle = NewHandleClear(16);
+  *handle = nullptr;
+  EXPECT_EQ(GetHandleSize(handle), 16);
+  DisposeHandle(handle);  // the leak check tells
+}
+
+TEST(Handles, ABlockIsMadeOfBytes) {
+  const std::string bytes("a\0b", 3);
+  const Handle handle = NewHandleWith(bytes);
+  ASSERT_EQ(GetHandleSize(handle), 3);
+  EXPECT_EQ(std::string(*handle, 3), bytes);
+  DisposeHandle(handle);
+}
+
+}  // namespace
+}  // namespace tallowmere::quicktime::test

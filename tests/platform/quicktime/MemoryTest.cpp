@@ -1,0 +1,92 @@
+// What is left when memory runs out at any point.
+#include <gtest/gtest.h>
+
+#include "../foundation/FailingAllocator.h"
+#include "ExporterFixture.h"
+#include "quicktime/Components.h"
+#include "quicktime/Handles.h"
+
+namespace tallowmere::quicktime::test {
+namespace {
+
+using foundation::test::FailAllocationsAfter;
+using foundation::test::FailNoAllocation;
+using foundation::test::LiveAllocations;
+
+class Memory : public WithExporter {};
+
+TEST_F(Memory, WithoutItThereIsNoBlock) {
+  DisposeHandle(NewHandleClear(1));  // the table of blocks has its first memory
+  const auto handles = LiveHandles();
+  const long allocations = LiveAllocations();
+  Handle handle = nullptr;
+  long count = 0;
+  for (; handle == nullptr; ++count) {
+    EXPECT_EQ(LiveHandles(), handles);
+    EXPECT_EQ(LiveAllocations(), allocations);
+    FailAllocationsAfter(count);
+    handle = NewHandleClear(36);
+    FailNoAllocation();
+  }
+  EXPECT_GE(count, 3);
+  EXPECT_EQ(GetHandleSize(handle), 36);
+  DisposeHandle(handle);
+}
+
+TEST_F(Memory, WithoutItNoInstanceIsOpened) {
+  ComponentDescription looking{};
+  const Component component = FindNextComponent(nullptr, &looking);
+  const auto instances = OpenInstances();
+  const long allocations = LiveAllocations();
+  ComponentInstance instance = nullptr;
+  ComponentResult result = memFullErr;
+  long count = 0;
+  for (; result != noErr; ++count) {
+    EXPECT_EQ(result, -108);
+    EXPECT_EQ(instance, nullptr);
+    EXPECT_EQ(OpenInstances(), instances);
+    EXPECT_EQ(LiveAllocations(), allocations);
+    FailAllocationsAfter(count);
+    result = OpenAComponent(component, &instance);
+    FailNoAllocation();
+  }
+  EXPECT_GE(count, 2);
+  CloseComponent(instance);
+}
+
+TEST_F(Memory, WithoutItThereAreNoSettings) {
+  ASSERT_EQ(Set(Sound("twos")), noErr);
+  const auto handles = LiveHandles();
+  const long allocations = LiveAllocations();
+  Handle settings = nullptr;
+  ComponentResult result = memFullErr;
+  long count = 0;
+  for (; result != noErr; ++count) {
+    EXPECT_EQ(result, -108);
+    EXPECT_EQ(settings, nullptr);
+    EXPECT_EQ(LiveHandles(), handles);
+    EXPECT_EQ(LiveAllocations(), allocations);
+    FailAllocationsAfter(count);
+    result = MovieExportGetSettingsAsAtomContainer(mExporter, &settings);
+    FailNoAllocation();
+  }
+  EXPECT_GE(count, 4);
+  DisposeHandle(settings);
+}
+
+TEST_F(Memory, OfClosedInstancesAndDisposedBlocksIsGivenBack) {
+  const auto once = [] {
+    ComponentDescription looking{};
+    ComponentInstance instance = nullptr;
+    ASSERT_EQ(OpenAComponent(FindNextComponent(nullptr, &looking), &instance), noErr);
+    CloseComponent(instance);
+    DisposeHandle(NewHandleClear(36));
+  };
+  once();
+  const long before = LiveAllocations();
+  for (int i = 0; i < 100; ++i) once();
+  EXPECT_EQ(LiveAllocations(), before);
+}
+
+}  // namespace
+}  // namespace tallowmere::quicktime::test
