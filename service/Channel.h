@@ -37,9 +37,9 @@ class Channel {
   // REQUIRES: `buffer` holds `longest` + 1 bytes.
   void TakeCounted(char* buffer, std::size_t longest);
 
-  // Counted bytes of any length, which `length` tells where it is given, and so many NULs behind
+  // Counted bytes of any length, told to `announced` where it is given, and so many NULs behind
   // them. Null after a failure; a lack of memory is one.
-  std::unique_ptr<char[]> TakeAllocated(std::size_t nuls = 1, std::uint16_t* length = nullptr);
+  std::unique_ptr<char[]> TakeAllocated(std::size_t nuls = 1, std::uint16_t* announced = nullptr);
 
   template <class Number>
   void Put(Number number) {
