@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <ostream>
+
 #include "support/Wire.h"
 
 namespace tallowmere::test {
@@ -89,6 +91,55 @@ TEST(Framing, AStringOfLength0IsTheEmptyString) {
   Service service;
   EXPECT_EQ(service.Ask(U16(3) + U16(0), 6), VolumeNumberResponse(32767));
 }
+
+// A request with a counted text in one of its fields.
+struct RequestWithText {
+  const char* name;
+  std::string before;
+  std::string behind;
+
+  friend std::ostream& operator<<(std::ostream& out, const RequestWithText& request) {
+    return out << request.name;
+  }
+};
+
+class TextOfARequest : public testing::TestWithParam<RequestWithText> {
+ protected:
+  static std::string ResponseTo(std::string_view text) {
+    Service service;
+    service.Write(GetParam().before + Counted(text) + GetParam().behind + kQuit);
+    const std::string response = service.ReadToEnd();
+    EXPECT_TRUE(response.ends_with(kTrailer));
+    EXPECT_EQ(service.Wait(), 0);
+    return response;
+  }
+};
+
+TEST_P(TextOfARequest, EndsWhereTheCountEndsAndAtTheFirstNul) {
+  using std::string_literals::operator""s;
+  for (const std::string& text : {"/tmp"s, "file"s, "a:b"s, "Root"s}) {
+    const std::string response = ResponseTo(text + '\0');
+    EXPECT_EQ(ResponseTo(text), response) << text;
+    EXPECT_EQ(ResponseTo(text + "\0/more\0"s), response) << text;
+  }
+}
+
+TEST_P(TextOfARequest, OfLength0IsTheEmptyString) {
+  EXPECT_EQ(ResponseTo(""), ResponseTo({"\0", 1}));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Framing, TextOfARequest,
+    testing::Values(RequestWithText{"PathOfCode1", U16(1), U16(256) + Flag(1)},
+                    RequestWithText{"FolderOfCode2", U16(2), CString("x") + Flag(0)},
+                    RequestWithText{"NameOfCode3", U16(3), ""},
+                    RequestWithText{"PathOfCode5", U16(5), U16(64)},
+                    RequestWithText{"PathOfCode6", U16(6), CString("x") + Flag(0)},
+                    RequestWithText{"NameOfCode6", U16(6) + CString("/tmp"), Flag(0)},
+                    RequestWithText{"PathOfCode7", U16(7), ""},
+                    RequestWithText{"NameOfCode8", U16(8) + I16(0) + Bytes<std::int32_t>(2),
+                                    Flag(0)}),
+    [](const auto& request) { return request.param.name; });
 
 TEST(Framing, AnEmptyStringInAResponseIsALengthOf1AndItsNul) {
   Service service;

@@ -1,6 +1,8 @@
 // The examples of docs/protocol.md, replayed byte for byte by a service that was started in "/".
 #include <gtest/gtest.h>
+#include <unistd.h>
 
+#include <algorithm>
 #include <filesystem>
 #include <fstream>
 #include <sstream>
@@ -52,19 +54,63 @@ TEST(TheProtocolPage, HasAnExampleOfEveryCode) {
   EXPECT_EQ(codes, std::string("\0\1\2\3\4\5\6\7\10\11\12", 11));
 }
 
-TEST(TheProtocolPage, SaysWhatTheServiceAnswers) {
-  const auto before = std::filesystem::current_path();
-  std::filesystem::current_path("/");
-  Service service;
-  std::filesystem::current_path(before);
-  for (const Example& example : ReadExamples()) {
-    const int code = example.request.at(0);
-    if (code == 0) continue;
-    EXPECT_TRUE(service.Answers(example.request, example.response)) << "code " << code;
+// The examples to one service, the one of code 0 last.
+class TheExamples : public testing::Test {
+ protected:
+  TheExamples() : mFormer(std::filesystem::current_path()) {
+    std::filesystem::current_path("/");
+    std::rotate(mExamples.begin(), mExamples.begin() + 1, mExamples.end());
+    for (const Example& example : mExamples) {
+      mRequests += example.request;
+      mResponses += example.response;
+    }
   }
-  service.Write(ReadExamples().at(0).request);
-  EXPECT_EQ(service.ReadToEnd(), ReadExamples().at(0).response);
+  ~TheExamples() override { std::filesystem::current_path(mFormer); }
+
+  std::filesystem::path mFormer;
+  std::vector<Example> mExamples = ReadExamples();
+  std::string mRequests;
+  std::string mResponses;
+};
+
+TEST_F(TheExamples, AreWhatTheServiceAnswers) {
+  Service service;
+  for (const Example& example : mExamples) {
+    service.Write(example.request);
+    EXPECT_EQ(service.Read(example.response.size()), example.response)
+        << "code " << int{example.request.at(0)};
+  }
+  EXPECT_EQ(service.ReadToEnd(), "");
   EXPECT_EQ(service.Wait(), 0);
+}
+
+TEST_F(TheExamples, AreAnsweredInOrderWhenWrittenAtOnce) {
+  Service service;
+  service.Write(mRequests);
+  EXPECT_EQ(service.ReadToEnd(), mResponses);
+  EXPECT_EQ(service.Wait(), 0);
+}
+
+TEST_F(TheExamples, AreAnsweredWhenTheyComeAByteAtATime) {
+  Service service;
+  for (const char byte : mRequests) {
+    service.Write({&byte, 1});
+    while (service.UnreadInput() > 0) usleep(50);
+  }
+  EXPECT_EQ(service.ReadToEnd(), mResponses);
+  EXPECT_EQ(service.Wait(), 0);
+}
+
+TEST_F(TheExamples, AreNotAnsweredWhereverTheyAreCut) {
+  for (const Example& example : mExamples) {
+    for (std::size_t length = 0; length < example.request.size(); ++length) {
+      Service service;
+      service.Write(example.request.substr(0, length));
+      service.CloseInput();
+      EXPECT_EQ(service.ReadToEnd(), "") << int{example.request.at(0)} << " at " << length;
+      EXPECT_EQ(service.Wait(), 0);
+    }
+  }
 }
 
 }  // namespace
