@@ -1,6 +1,10 @@
 #include <CFileRef.h>
 #include <LegacyHFSBridge.h>
 
+#include <algorithm>
+#include <cstring>
+#include <iterator>
+
 #include "service/Commands.h"
 #include "service/Protocol.h"
 
@@ -20,6 +24,9 @@ void MakeFullPath(Channel& channel) {
   char fullPath[protocol::kLongestHFSName] = {};
   const unsigned short length =
       CFileUtilMakeFullPath(item, size == 0 ? nullptr : fullPath, size, flag);
+
+  // Without the flag the path has been cut, and its folders are still behind the NUL.
+  std::fill(fullPath + std::strlen(fullPath), std::end(fullPath), '\0');
 
   channel.Put<std::uint16_t>(length);
   channel.PutBytes(fullPath, size);

@@ -2,6 +2,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstring>
 #include <filesystem>
 
@@ -47,6 +48,21 @@ TEST_F(FileSpecCommands, ANameHasToFitWithItsNUL) {
 
 TEST_F(FileSpecCommands, ANameOfMaximum0IsNoneAndEmpty) {
   EXPECT_TRUE(mService.Answers(HFSNameRequest(mFile, 0), NameResponse(0, "")));
+}
+
+// Every record needs the mount table.
+TEST_F(FileSpecCommands, ANameOfMaximum0LooksUpNoRecord) {
+  const auto readsTheMountTable = [](const TracedRun& run) {
+    return std::any_of(run.calls.begin(), run.calls.end(), [](const std::string& call) {
+      return call.find("mountinfo") != std::string::npos;
+    });
+  };
+  const auto without = RunTraced("openat", HFSNameRequest(mFile, 0));
+  const auto with = RunTraced("openat", HFSNameRequest(mFile, 64));
+  if (!without || !with) GTEST_SKIP() << "strace cannot trace here";
+  EXPECT_EQ(without->responses, NameResponse(0, ""));
+  EXPECT_FALSE(readsTheMountTable(*without));
+  EXPECT_TRUE(readsTheMountTable(*with));
 }
 
 TEST_F(FileSpecCommands, TheNameOfAMissingItemIsNoneAndEmpty) {

@@ -81,6 +81,34 @@ TEST_F(HFSPathCommands, WithoutTheFlagAFullPathIsShortenedToItsVolume) {
   EXPECT_EQ(path, mHFSPath.substr(0, mHFSPath.find(':')));
 }
 
+TEST_F(HFSPathCommands, WithoutTheFlagTheVolumeIsFollowedByZerosWhateverTheSize) {
+  std::string volume = mHFSPath.substr(0, mHFSPath.find(':'));
+  const auto length = static_cast<unsigned>(mHFSPath.size());
+  for (const unsigned size : {length, length + 1, 1024u}) {
+    volume.resize(size);
+    EXPECT_TRUE(mService.Answers(FullPathRequest(mWork, size, 0),
+                                 U16(length).append(volume).append(kTrailer)))
+        << size;
+  }
+}
+
+TEST_F(HFSPathCommands, AFullPathHasItsOuterFoldersReplacedAsFarAsTheSizeDemands) {
+  const auto length = static_cast<unsigned>(mHFSPath.size());
+  const std::string volume = mHFSPath.substr(0, mHFSPath.find(':') + 1);
+  std::string folders = mHFSPath.substr(volume.size());
+  // The smallest size that returns needs room for the volume, "...:" and the NUL.
+  for (unsigned size = length; size > volume.size() + 4; --size) {
+    while (volume.size() + folders.size() >= size) {
+      folders = "..." + folders.substr(folders.find(':', 4));
+    }
+    std::string buffer = volume + folders;
+    buffer.resize(size);
+    EXPECT_TRUE(mService.Answers(FullPathRequest(mWork, size, 1),
+                                 U16(length).append(buffer).append(kTrailer)))
+        << size;
+  }
+}
+
 TEST_F(HFSPathCommands, AnyFlagThatIsNot0IsSet) {
   const auto length = static_cast<unsigned>(mHFSPath.size());
   const std::string set = mService.Ask(FullPathRequest(mWork, length, 1), 2 + length + 4);
@@ -180,8 +208,10 @@ TEST_F(HFSPathCommands, ANameWithoutItsNULEndsWhereTheCountEnds) {
 
 TEST_F(HFSPathCommands, APathThatNoCountCanTellIsNone) {
   const std::string path = "/" + std::string(65000, 'x');
-  EXPECT_TRUE(mService.Answers(AddNameRequest(path, std::string(900, 'n'), 0),
-                               (Flag(1) + U16(0)).append(kTrailer)));
+  const std::string name(65534 - path.size() - 1, 'n');
+  EXPECT_TRUE(mService.Answers(AddNameRequest(path, name, 0), PathResponse(path + "/" + name)));
+  EXPECT_TRUE(
+      mService.Answers(AddNameRequest(path, name + "n", 0), (Flag(1) + U16(0)).append(kTrailer)));
 }
 
 }  // namespace
