@@ -52,9 +52,8 @@ bool PrintAtoms(std::string_view atoms, std::size_t depth) {
 }  // namespace
 
 int PrintExportSettings(const ClientOptions& options, const Sound& sound) {
-  auto client = Client::Start(options);
-  if (!client) return Complain(client.Failure().message);
-  const auto settings = client->GetAIFFExportSettings(
+  Client client(options);
+  const auto settings = client.GetAIFFExportSettings(
       {static_cast<std::uint32_t>(std::lround(sound.hertz * kFixedOne)), sound.bits,
        static_cast<std::uint8_t>(sound.channels), BigEndian(sound.format)});
   if (!settings) return Complain(settings.Failure().message);

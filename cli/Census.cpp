@@ -32,7 +32,7 @@ bool IsAt(const std::string& path, const struct stat& item) {
 // Asks one service for the record of each item and another one for the path of that record.
 class Census {
  public:
-  Census(Client records, Client paths) : mRecords(std::move(records)), mPaths(std::move(paths)) {}
+  explicit Census(const ClientOptions& options) : mRecords(options), mPaths(options) {}
 
   // Whether the services still answer.
   bool Count(const std::string& path, const struct stat& item, double done) {
@@ -106,12 +106,8 @@ int TakeCensus(ClientOptions options, const std::string& folder) {
   options.deadline = kDeadline;
   const auto path = files::RealPath(folder);
   if (!path) return Complain(folder + ": " + std::generic_category().message(errno));
-  auto records = Client::Start(options);
-  if (!records) return Complain(records.Failure().message);
-  auto paths = Client::Start(options);
-  if (!paths) return Complain(paths.Failure().message);
 
-  Census census(*std::move(records), *std::move(paths));
+  Census census(options);
   const TreeVisitor visitor{
       [&](const std::string& item, const struct stat& status, double done) {
         return census.Count(item, status, done);

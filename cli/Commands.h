@@ -2,11 +2,11 @@
 // could not be answered, with the reason on standard error.
 #pragma once
 
+#include <tallowmere/Client.h>
+
 #include <cstdint>
 #include <string>
 #include <vector>
-
-#include "client/Client.h"
 
 namespace tallowmere::cli {
 

@@ -18,7 +18,7 @@ bool IsFolder(const std::string& path) {
 }
 
 struct Identity {
-  FileSpec spec;
+  FSSpec spec;
   std::string hfsPath;
   std::optional<std::string> wayBack;  // where the record leads
 };
@@ -40,8 +40,7 @@ Result<std::optional<Identity>> Identify(Client& client, const std::string& path
 }  // namespace
 
 int PrintIdentities(const ClientOptions& options, const std::vector<std::string>& paths) {
-  auto client = Client::Start(options);
-  if (!client) return Complain(client.Failure().message);
+  Client client(options);
   Table table({{"vRefNum", Table::Align::kRight},
                {"parent id", Table::Align::kRight},
                {"HFS name"},
@@ -49,14 +48,14 @@ int PrintIdentities(const ClientOptions& options, const std::vector<std::string>
                {"way back"}});
   int status = 0;
   for (const std::string& given : paths) {
-    const auto identity = Identify(*client, std::filesystem::absolute(given));
+    const auto identity = Identify(client, std::filesystem::absolute(given));
     if (!identity) return Complain(identity.Failure().message);
     if (!*identity) {
       status = Complain(given + ": there is no such folder on any volume");
       continue;
     }
     const auto& [spec, hfsPath, wayBack] = **identity;
-    table.Add({std::to_string(spec.volume), std::to_string(spec.parentID),
+    table.Add({std::to_string(spec.vRefNum), std::to_string(spec.parID),
                Printable(Utf8OfHFSName(spec.name)), Printable(Utf8OfHFSName(hfsPath)),
                wayBack ? Printable(*wayBack) : "none"});
   }

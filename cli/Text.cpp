@@ -3,7 +3,6 @@
 #include <algorithm>
 
 #include "foundation/FileNameText.h"
-#include "foundation/MacRoman.h"
 #include "foundation/Utf16.h"
 
 namespace tallowmere::cli {
@@ -28,11 +27,6 @@ void AppendOctal(std::string_view bytes, std::string& text) {
 }
 
 }  // namespace
-
-std::string Utf8OfHFSName(std::string_view name) {
-  // No Mac Roman character is a surrogate, so there always is one.
-  return foundation::FileNameOfText(foundation::DecodeMacRoman(name)).value_or("");
-}
 
 std::string Printable(std::string_view text) {
   std::string printable;

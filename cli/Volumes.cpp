@@ -20,15 +20,14 @@ struct Row {
 
 // The mount table says which numbers there are and where; the service says what they are called.
 Result<std::vector<Row>> AskForVolumes(const ClientOptions& options) {
-  auto client = Client::Start(options);
-  if (!client) return client.Failure();
+  Client client(options);
   std::vector<Row> rows;
   files::MountTable& table = files::MountTable::OfThisProcess();
   for (std::size_t i = 0; const files::VolumePointer volume = table.AtIndex(i); ++i) {
-    const auto name = client->GetHFSVolumeName(volume->Number());
+    const auto name = client.GetHFSVolumeName(volume->Number());
     if (!name) return name.Failure();
     if (!*name) continue;  // unmounted in between
-    const auto number = client->GetVolRefnumByHFSName(**name);
+    const auto number = client.GetVolRefnumByHFSName(**name);
     if (!number) return number.Failure();
     rows.push_back({volume->Number(), Printable(Utf8OfHFSName(**name)),
                     Printable(volume->MountPoint()), *number});

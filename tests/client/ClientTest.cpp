@@ -4,10 +4,10 @@
 #include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
+#include <tallowmere/Client.h>
 
 #include <filesystem>
 
-#include "client/Client.h"
 #include "support/AtomReader.h"
 #include "support/TemporaryFolder.h"
 
@@ -18,8 +18,8 @@ using std::chrono::milliseconds;
 using test::TemporaryFolder;
 using testing::HasSubstr;
 
-Result<Client> StartClient() {
-  return Client::Start({.service = TALLOWMERE_SERVICE});
+Client StartClient() {
+  return Client({.service = TALLOWMERE_SERVICE});
 }
 
 // The path of a shell script that takes the service's place.
@@ -30,91 +30,84 @@ std::string Impostor(const TemporaryFolder& folder, const std::string& script) {
 }
 
 std::string FailureOfFirstRequest(const std::string& service) {
-  auto client = Client::Start({.service = service, .deadline = milliseconds(300)});
-  if (!client) return client.Failure().message;
-  const auto name = client->GetHFSVolumeName(0);
+  Client client({.service = service, .deadline = milliseconds(300)});
+  const auto name = client.GetHFSVolumeName(0);
   return name ? "" : name.Failure().message;
 }
 
 TEST(Client, AsksForTheVolumesNamesAndNumbers) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
-  const auto name = client->GetHFSVolumeName(0);
+  Client client = StartClient();
+  const auto name = client.GetHFSVolumeName(0);
   ASSERT_TRUE(name);
   ASSERT_TRUE(name->has_value());
-  const auto number = client->GetVolRefnumByHFSName(**name);
+  const auto number = client.GetVolRefnumByHFSName(**name);
   ASSERT_TRUE(number);
   ASSERT_TRUE(number->has_value());
   EXPECT_LT(**number, 0);
 }
 
 TEST(Client, AsksForNamesAndPathsOfAFile) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
+  Client client = StartClient();
   const TemporaryFolder folder;
   const std::string file = folder.MakeFile("a:b");
-  const auto name = client->GetHFSName(file);
+  const auto name = client.GetHFSName(file);
   ASSERT_TRUE(name);
   EXPECT_EQ(*name, "a/b");
-  const auto added = client->AddHFSName(folder.Path().string(), "a/b");
+  const auto added = client.AddHFSName(folder.Path().string(), "a/b");
   ASSERT_TRUE(added);
   EXPECT_EQ(*added, file);
-  const auto fullPath = client->MakeFullPath(file);
+  const auto fullPath = client.MakeFullPath(file);
   ASSERT_TRUE(fullPath);
-  const auto back = client->MakeFileRefFromPath(*fullPath + "a/b");
+  const auto back = client.MakeFileRefFromPath(*fullPath + "a/b");
   ASSERT_TRUE(back);
   EXPECT_EQ(*back, file);
-  const auto spec = client->GetFSSpec(file);
+  const auto spec = client.GetFSSpec(file);
   ASSERT_TRUE(spec && *spec);
-  const auto path = client->SetFileRefFromFSSpec(**spec, false);
+  const auto path = client.SetFileRefFromFSSpec(**spec, false);
   ASSERT_TRUE(path);
   EXPECT_EQ(*path, file);
 }
 
 TEST(Client, WhatCannotBeAskedIsNoneAndNoError) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
+  Client client = StartClient();
   const std::string withNUL("/a\0b", 4);
   const std::string tooLong(65535, 'x');
   for (const std::string& path : {withNUL, tooLong}) {
-    EXPECT_EQ(*client->GetHFSName(path), std::nullopt);
-    EXPECT_EQ(*client->AddHFSName(path, "x"), std::nullopt);
-    EXPECT_EQ(*client->AddHFSName("/", path), std::nullopt);
-    EXPECT_EQ(*client->MakeFullPath(path), ":");
-    EXPECT_EQ(*client->MakeFileRefFromPath(path), std::nullopt);
-    EXPECT_FALSE(*client->GetFSSpec(path));
+    EXPECT_EQ(*client.GetHFSName(path), std::nullopt);
+    EXPECT_EQ(*client.AddHFSName(path, "x"), std::nullopt);
+    EXPECT_EQ(*client.AddHFSName("/", path), std::nullopt);
+    EXPECT_EQ(*client.MakeFullPath(path), ":");
+    EXPECT_EQ(*client.MakeFileRefFromPath(path), std::nullopt);
+    EXPECT_FALSE(*client.GetFSSpec(path));
   }
-  EXPECT_TRUE(*client->GetHFSVolumeName(0));
+  EXPECT_TRUE(*client.GetHFSVolumeName(0));
 }
 
 TEST(Client, WhatIsNotMountedIsNoneAndNoError) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
-  const auto name = client->GetHFSVolumeName(32767);
+  Client client = StartClient();
+  const auto name = client.GetHFSVolumeName(32767);
   ASSERT_TRUE(name);
   EXPECT_FALSE(name->has_value());
-  const auto number = client->GetVolRefnumByHFSName("no such volume");
+  const auto number = client.GetVolRefnumByHFSName("no such volume");
   ASSERT_TRUE(number);
   EXPECT_FALSE(number->has_value());
 }
 
 TEST(Client, ANameThatTheServiceWouldRefuseIsNoVolumesAndTheServiceLives) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
+  Client client = StartClient();
   for (const std::string& name : {std::string(255, 'x'), std::string(256, 'x'),
                                   std::string(70000, 'x'), std::string(3, '\0')}) {
-    const auto number = client->GetVolRefnumByHFSName(name);
+    const auto number = client.GetVolRefnumByHFSName(name);
     ASSERT_TRUE(number);
     EXPECT_FALSE(number->has_value());
   }
-  EXPECT_TRUE(client->GetHFSVolumeName(0));
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
 }
 
 TEST(Client, GetsTheSettingsForASound) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
+  Client client = StartClient();
   const std::uint32_t rate = 48000u << 16;
-  const auto settings = client->GetAIFFExportSettings(
+  const auto settings = client.GetAIFFExportSettings(
       {.rate = rate, .sampleSize = 24, .channels = 6, .format = 0x736F7774});
   ASSERT_TRUE(settings);
   EXPECT_EQ(settings->result, 0);
@@ -122,14 +115,13 @@ TEST(Client, GetsTheSettingsForASound) {
 }
 
 TEST(Client, ASoundThatIsRefusedHasACodeAndNoSettingsAndTheServiceLives) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
-  const auto settings = client->GetAIFFExportSettings(
+  Client client = StartClient();
+  const auto settings = client.GetAIFFExportSettings(
       {.rate = 48000u << 16, .sampleSize = 16, .channels = 2, .format = 0x6D703461});
   ASSERT_TRUE(settings);
   EXPECT_EQ(settings->result, -206);
   EXPECT_EQ(settings->bytes, "");
-  EXPECT_TRUE(client->GetHFSVolumeName(0));
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
 }
 
 TEST(Client, AMissingProgramIsSaid) {
@@ -160,13 +152,15 @@ TEST(Client, AServiceThatNeverAnswersIsSaidWhenTheDeadlineHasPassed) {
             "the service did not answer in time");
 }
 
-TEST(Client, AfterAnErrorEveryRequestGivesIt) {
-  auto client = Client::Start({.service = "/bin/true"});
-  ASSERT_TRUE(client);
-  EXPECT_FALSE(client->GetHFSVolumeName(0));
-  const auto again = client->GetHFSVolumeName(0);
-  ASSERT_FALSE(again);
-  EXPECT_EQ(again.Failure().message, "the service ended before it answered");
+TEST(Client, AfterAnErrorTheNextRequestStartsAnotherService) {
+  const TemporaryFolder folder;
+  Client client({.service = Impostor(folder, "test -e ran && exec " TALLOWMERE_SERVICE " $1\n"
+                                             "touch ran; exit")});
+  std::filesystem::current_path(folder.Path());
+  const auto failed = client.GetHFSVolumeName(0);
+  ASSERT_FALSE(failed);
+  EXPECT_EQ(failed.Failure().message, "the service ended before it answered");
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
 }
 
 TEST(Client, EndsItsServiceAndLeavesNeitherProcessNorDescriptor) {
@@ -176,10 +170,9 @@ TEST(Client, EndsItsServiceAndLeavesNeitherProcessNorDescriptor) {
   };
   const auto before = openDescriptors();
   for (int i = 0; i < 20; ++i) {
-    auto client = StartClient();
-    ASSERT_TRUE(client);
-    ASSERT_TRUE(client->GetHFSVolumeName(0));
-    Client moved = *std::move(client);
+    Client client = StartClient();
+    ASSERT_TRUE(client.GetHFSVolumeName(0));
+    Client moved = std::move(client);
     ASSERT_TRUE(moved.GetHFSVolumeName(0));
   }
   EXPECT_EQ(openDescriptors(), before);
@@ -199,8 +192,8 @@ TEST(Client, TakesNoStandardDescriptorThatItsProgramHasClosed) {
   if (child == 0) {
     close(0);
     close(1);
-    auto client = StartClient();
-    const bool works = client && client->GetHFSVolumeName(0);
+    Client client = StartClient();
+    const bool works = client.GetHFSVolumeName(0).HasValue();
     // What such a program prints by mistake must not reach the service.
     const bool untouched = write(1, "x", 1) == -1 && fcntl(0, F_GETFD) == -1;
     _exit(works && untouched ? 0 : 1);
@@ -212,9 +205,11 @@ TEST(Client, TakesNoStandardDescriptorThatItsProgramHasClosed) {
 
 TEST(Client, TellsTheServiceItsOwnProcessID) {
   const TemporaryFolder folder;
-  EXPECT_EQ(FailureOfFirstRequest(
-                Impostor(folder, "test $1 = $PPID && printf '\\000\\001\\000\\000MWLT'; sleep 1")),
-            "");
+  EXPECT_EQ(
+      FailureOfFirstRequest(Impostor(
+          folder,
+          "head -c 4 >/dev/null; test $1 = $PPID && printf '\\000\\001\\000\\000MWLT'; sleep 1")),
+      "");
 }
 
 TEST(Client, LeavesAProgramThatIgnoresTheEndOfItsChildrenAlone) {
@@ -222,8 +217,8 @@ TEST(Client, LeavesAProgramThatIgnoresTheEndOfItsChildrenAlone) {
   if (child == 0) {
     signal(SIGCHLD, SIG_IGN);
     {
-      auto client = StartClient();
-      if (!client || !client->GetHFSVolumeName(0)) _exit(1);
+      Client client = StartClient();
+      if (!client.GetHFSVolumeName(0)) _exit(1);
     }
     _exit(0);
   }
