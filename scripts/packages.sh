@@ -25,7 +25,7 @@ need() {
 }
 
 to_build=(g++ cmake ninja-build libcli11-dev)
-to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf strace)
+to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf python3 strace)
 # Tests on file systems that these make, and on a real HFS volume in a machine of its own.
 to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools)
 to_test+=(hfsutils qemu-system-x86 busybox-static cpio)
