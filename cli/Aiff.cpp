@@ -1,10 +1,14 @@
+#include <cerrno>
 #include <cmath>
+#include <fstream>
 #include <iostream>
 #include <sstream>
 #include <string_view>
+#include <system_error>
 
 #include "cli/Commands.h"
 #include "cli/Output.h"
+#include "cli/Records.h"
 #include "cli/Text.h"
 
 namespace tallowmere::cli {
@@ -49,9 +53,32 @@ bool PrintAtoms(std::string_view atoms, std::size_t depth) {
   return true;
 }
 
+bool PrintContainer(std::string_view container) {
+  return container.size() >= kContainerHead && PrintAtoms(container.substr(kContainerHead), 0);
+}
+
+void PrintAsJson(const Sound& sound, std::string_view settings) {
+  Json json;
+  json["rate"] = sound.hertz;
+  json["bits"] = sound.bits;
+  json["channels"] = sound.channels;
+  Put(json, "format", sound.format);
+  json["settings"] = Hex(settings);
+  std::cout << json.dump() << '\n';
+}
+
+int Store(const std::string& bytes, const std::string& path) {
+  std::ofstream file(path, std::ios::binary);
+  if (!file) return Complain(path + ": " + std::generic_category().message(errno));
+  return file.write(bytes.data(), static_cast<std::streamsize>(bytes.size())).flush()
+             ? 0
+             : Complain(path + ": it could not be written");
+}
+
 }  // namespace
 
-int PrintExportSettings(const ClientOptions& options, const Sound& sound) {
+int PrintExportSettings(const ClientOptions& options, const Sound& sound, bool isJson,
+                        const std::string& output) {
   Client client(options);
   const auto settings = client.GetAIFFExportSettings(
       {static_cast<std::uint32_t>(std::lround(sound.hertz * kFixedOne)), sound.bits,
@@ -60,8 +87,12 @@ int PrintExportSettings(const ClientOptions& options, const Sound& sound) {
   if (settings->result != 0) {
     return Complain("the exporter refuses this sound: " + std::to_string(settings->result));
   }
-  const std::string_view container = settings->bytes;
-  if (container.size() < kContainerHead || !PrintAtoms(container.substr(kContainerHead), 0)) {
+  if (!output.empty() && output != "-") return Store(settings->bytes, output);
+  if (!output.empty()) {
+    std::cout << settings->bytes;
+  } else if (isJson) {
+    PrintAsJson(sound, settings->bytes);
+  } else if (!PrintContainer(settings->bytes)) {
     return Complain("the settings are no atom container");
   }
   return FinishOutput();

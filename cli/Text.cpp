@@ -8,6 +8,8 @@
 namespace tallowmere::cli {
 namespace {
 
+constexpr char16_t kReplacement = 0xFFFD;
+
 // C0 and C1 control characters and DEL, each of one UTF-16 unit.
 bool IsControl(char16_t unit) {
   return unit < 0x20 || (unit >= 0x7F && unit < 0xA0);
@@ -43,6 +45,14 @@ std::string Printable(std::string_view text) {
     }
   }
   return printable;
+}
+
+std::string Utf8OfAnyBytes(std::string_view bytes) {
+  std::u16string text = foundation::TextOfFileName(bytes);
+  std::replace_if(
+      text.begin(), text.end(), [](char16_t unit) { return foundation::IsEscapedByte(unit); },
+      kReplacement);
+  return foundation::FileNameOfText(text).value_or("");
 }
 
 std::size_t CharacterCount(std::string_view text) {

@@ -24,7 +24,7 @@ need() {
   fi
 }
 
-to_build=(g++ cmake ninja-build libcli11-dev)
+to_build=(g++ cmake ninja-build libcli11-dev nlohmann-json3-dev)
 to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf python3 strace)
 # Tests on file systems that these make, and on a real HFS volume in a machine of its own.
 to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools)

@@ -68,8 +68,7 @@ TEST(CommandLine, IdentifyGoesOnBehindAPathWithoutARecord) {
   const std::string missing = folder.Path() / "missing/file";
   ChildProgram cli(TALLOWMERE_CLI, {"identify", missing, folder.Path()});
   EXPECT_THAT(cli.ReadToEnd(), HasSubstr("  " + folder.Path().string() + "\n"));
-  EXPECT_EQ(cli.ReadErrorsToEnd(),
-            "tallowmere-cli: " + missing + ": there is no such folder on any volume\n");
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + missing + ": there is no such folder\n");
   EXPECT_EQ(cli.Wait(), 1);
 }
 
@@ -111,7 +110,11 @@ TEST(CommandLine, WrongUsageIsStatus2) {
                                                     {"nonsense"},
                                                     {"volumes", "--nonsense"},
                                                     {"aiff", "--format", "raw"},
-                                                    {"identify"}}) {
+                                                    {"identify"},
+                                                    {"spec"},
+                                                    {"append", "/"},
+                                                    {"--deadline", "0", "volumes"},
+                                                    {"census", "/nonexistent"}}) {
     ChildProgram cli(TALLOWMERE_CLI, arguments);
     EXPECT_NE(cli.ReadErrorsToEnd(), "");
     EXPECT_EQ(cli.Wait(), 2);
