@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <string>
+#include <thread>
 #include <utility>
 
 #include "client/AnswerReader.h"
@@ -23,6 +24,11 @@ constexpr std::size_t kPieceToSend = 4096;
 
 constexpr std::size_t kPieceToReceive = 16384;
 
+// While the service has so many questions, its answers gather for a time: to be woken for each of
+// them would cost more than the answer.
+constexpr std::size_t kManyQuestions = kMostQuestions / 2;
+constexpr std::chrono::microseconds kTimeToGather{200};
+
 Error NotInTime() {
   return {"the service did not answer in time"};
 }
@@ -39,7 +45,7 @@ void Conversation::Put(std::string_view bytes, std::unique_ptr<Question> questio
     return mPending.size() >= questions || mRequests.View().size() >= size;
   };
   if (isUnderWay(kMostQuestions, kMostBytes)) {
-    while (isUnderWay(kMostQuestions / 2, kMostBytes / 2)) Advance();
+    while (isUnderWay(kManyQuestions, kMostBytes / 2)) Advance();
   } else if (mRequests.View().size() - mSent >= kPieceToSend) {
     while (!mPending.empty() && Step()) {
     }
@@ -58,7 +64,9 @@ void Conversation::Abandon() {
 
 // Takes the conversation on by a step, however long that takes. REQUIRES: a question is pending.
 void Conversation::Advance() {
-  if (!Step()) Wait();
+  if (Step()) return;
+  if (mPending.size() >= kManyQuestions) std::this_thread::sleep_for(kTimeToGather);
+  Wait();
 }
 
 // The same without waiting; false when there is nothing to do but wait. The owner of a question is

@@ -34,16 +34,18 @@ class FolderTest(unittest.TestCase):
         os.chmod(path, 0o700)
         return path
 
-    def run_host(self, code: str, *arguments: str, **options: object) -> str:
+    def run_host(self, code: str, *arguments: str) -> str:
         """What a program of its own with that code says on standard output; it has to succeed."""
         prologue = f"import os, signal, sys\nfrom tallowmere import *\nSERVICE = {SERVICE!r}\n"
-        return self.run_python(["-c", prologue + textwrap.dedent(code), *arguments], **options)
+        return self.run_python(["-c", prologue + textwrap.dedent(code), *arguments])
 
-    def run_python(self, arguments: list[str], **options: object) -> str:
-        environment = {**os.environ, "PYTHONPATH": str(PACKAGE), **options.pop("environment", {})}
+    def run_python(
+        self, arguments: list[str], environment: dict[str, str] = {}, interpreter: str = sys.executable
+    ) -> str:
         host = subprocess.run(
-            [sys.executable, *arguments], env=environment, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
-            cwd=self.folder, text=True, timeout=60, **options,
+            [interpreter, *arguments],
+            env={**os.environ, "PYTHONPATH": str(PACKAGE), **environment},
+            cwd=self.folder, capture_output=True, text=True, timeout=60,
         )  # fmt: skip
         self.assertEqual((host.returncode, host.stderr), (0, ""))
         return host.stdout

@@ -110,6 +110,10 @@ class Bounds(BatchTest):
         lengths = [len(answer) for answer in client.batch(itertools.repeat(asked, 20000))]
         self.assertEqual(lengths, [60000] * 20000)
 
+    def test_answers_that_fill_their_pipe_while_the_requests_fill_theirs(self) -> None:
+        asked = [request.make_full_path("relative" * 12)] * 250 + [request.make_full_path("/" + "a" * 65000)]
+        self.assertEqual(list(self.client().batch(asked))[:250], [b":"] * 250)
+
     def test_requests_and_answers_of_every_size(self) -> None:
         paths = ["/" + "a" * ((number * 7919) % 65530) for number in range(1000)]
         answers = self.client().batch(request.add_hfs_name(path, "b") for path in paths)
@@ -121,6 +125,12 @@ class Bounds(BatchTest):
         next(batch)
         time.sleep(1.6)
         self.assertEqual(len([answer for answer in batch if not isinstance(answer, ServiceError)]), 599)
+
+    def test_the_deadline_is_for_each_answer_not_for_those_before(self) -> None:
+        client = self.client("time.sleep(0.1)", deadline=1.5)
+        batch = client.batch(numbers(30))
+        self.assertEqual(next(batch), b"0")
+        self.assertEqual(client.get_hfs_volume_name(99), b"99")
 
 
 class Failures(BatchTest):

@@ -3,6 +3,7 @@
 from __future__ import annotations
 
 import os
+import sys
 import unicodedata
 from pathlib import Path
 
@@ -224,6 +225,10 @@ class ExportSettings(ServiceTest):
         self.assertEqual(result, 0)
         for value in (b"in24", (22050 * 65536 + 32768).to_bytes(4, "big"), b"\x00\x18", b"\x00\x06"):
             self.assertIn(value, data)
+
+    def test_a_rate_is_rounded(self) -> None:
+        payload = request.get_aiff_export_settings(0.1, 16, 2, "twos").payload
+        self.assertEqual(payload[2:6], round(6553.6).to_bytes(4, sys.byteorder))
 
     def test_a_refusal_tells_its_reason(self) -> None:
         self.assertEqual(self.client.get_aiff_export_settings(44100, 16, 2, "mp3 "), (-206, b""))

@@ -1,5 +1,6 @@
 from __future__ import annotations
 
+import sys
 import unicodedata
 import unittest
 
@@ -67,7 +68,7 @@ class Fields(unittest.TestCase):
     def test_a_text_ends_at_its_nul(self) -> None:
         for inside in (b"ab", b"a\0b\0", b"a\0\0"):
             with self.subTest(inside), self.assertRaises(Malformed):
-                Reader(len(inside).to_bytes(2, "little") + inside).text()
+                Reader(len(inside).to_bytes(2, sys.byteorder) + inside).text()
 
     def test_there_are_only_zeros_behind_a_padded_text(self) -> None:
         self.assertEqual(Reader(b"ab\0\0").padded(4), b"ab")
@@ -90,7 +91,7 @@ class Fields(unittest.TestCase):
     def test_settings_have_a_sane_size(self) -> None:
         for size, error in ((65536, Incomplete), (65537, Malformed)):
             with self.subTest(size), self.assertRaises(error):
-                Reader(size.to_bytes(4, "little")).settings()
+                Reader(size.to_bytes(4, sys.byteorder)).settings()
 
     def test_a_trailer_ends_an_answer(self) -> None:
         Reader(b"MWLT").trailer()
