@@ -1,8 +1,6 @@
 #include "cli/Records.h"
 
-#include <algorithm>
 #include <charconv>
-#include <cstring>
 #include <limits>
 #include <nlohmann/json.hpp>
 
@@ -56,19 +54,6 @@ std::optional<std::string> ReadHex(std::string_view digits) {
   return bytes;
 }
 
-std::optional<FSSpec> ReadBytes(std::string_view digits) {
-  const auto bytes = ReadHex(digits);
-  if (!bytes) return std::nullopt;
-  FSSpec spec{};
-  const char* field = bytes->data();
-  std::memcpy(&spec.vRefNum, field, sizeof spec.vRefNum);
-  std::memcpy(&spec.parID, field += sizeof spec.vRefNum, sizeof spec.parID);
-  const auto length = static_cast<std::uint8_t>(*(field += sizeof spec.parID));
-  if (length > protocol::kLongestSpecName) return std::nullopt;
-  spec.name.assign(field + 1, length);
-  return spec;
-}
-
 }  // namespace
 
 std::string TextOfRecord(const FSSpec& spec) {
@@ -77,19 +62,15 @@ std::string TextOfRecord(const FSSpec& spec) {
 }
 
 std::string HexOfRecord(const FSSpec& spec) {
-  std::string bytes(protocol::kFileSpecSize, '\0');
-  char* field = bytes.data();
-  std::memcpy(field, &spec.vRefNum, sizeof spec.vRefNum);
-  std::memcpy(field += sizeof spec.vRefNum, &spec.parID, sizeof spec.parID);
-  *(field += sizeof spec.parID) = static_cast<char>(spec.name.size());
-  std::copy(spec.name.begin(), spec.name.end(), field + 1);
-  return Hex(bytes);
+  return Hex(EncodeFSSpec(spec));
 }
 
 std::optional<FSSpec> ReadRecord(std::string_view text) {
-  return text.size() == 2 * protocol::kFileSpecSize && text.find(kSeparator) == text.npos
-             ? ReadBytes(text)
-             : ReadText(text);
+  const bool isHex =
+      text.size() == 2 * protocol::kFileSpecSize && text.find(kSeparator) == text.npos;
+  if (!isHex) return ReadText(text);
+  const auto bytes = ReadHex(text);
+  return bytes ? DecodeFSSpec(*bytes) : std::nullopt;
 }
 
 void Put(nlohmann::ordered_json& json, const FSSpec& spec) {

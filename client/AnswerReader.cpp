@@ -42,13 +42,10 @@ std::string AnswerReader::TakeBuffer(std::size_t size) {
 }
 
 FSSpec AnswerReader::TakeSpec() {
-  FSSpec spec{};
-  spec.vRefNum = Take<std::int16_t>();
-  spec.parID = Take<std::int32_t>();
-  const auto length = Take<std::uint8_t>();
-  if (length > protocol::kLongestSpecName) Refuse();
-  spec.name = TakeBytes(protocol::kLongestSpecName).substr(0, length);
-  return spec;
+  const std::string_view bytes = TakeBytes(protocol::kFileSpecSize);
+  auto spec = DecodeFSSpec(bytes);
+  if (!spec && !bytes.empty()) Refuse();
+  return spec.value_or(FSSpec{});
 }
 
 void AnswerReader::TakeTrailer() {

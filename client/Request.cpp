@@ -53,10 +53,7 @@ class RequestWriter {
 
   // REQUIRES: the name is within its bounds.
   RequestWriter& PutSpec(const FSSpec& spec) {
-    Put(spec.vRefNum);
-    Put(spec.parID);
-    Put(static_cast<std::uint8_t>(spec.name.size()));
-    mBytes.append(spec.name).append(protocol::kLongestSpecName - spec.name.size(), '\0');
+    mBytes.append(EncodeFSSpec(spec));
     return *this;
   }
 

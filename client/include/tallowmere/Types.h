@@ -20,6 +20,15 @@ struct FSSpec {
   bool operator==(const FSSpec&) const = default;
 };
 
+// The 70 bytes of a record as the protocol has them and old programs kept them, numbers in this
+// machine's byte order: volume reference number (16 bits), parent id (32 bits), length of the name,
+// name, zeros up to 63 bytes. REQUIRES: the name has at most 63 bytes.
+std::string EncodeFSSpec(const FSSpec& spec);
+
+// The record in 70 bytes, whatever lies behind its name. None for any other number of bytes and for
+// a name that would be longer than 63.
+std::optional<FSSpec> DecodeFSSpec(std::string_view bytes);
+
 // How sound is stored.
 struct SoundFormat {
   std::uint32_t rate;        // in hertz × 65536
