@@ -141,8 +141,10 @@ TEST(Answer, ABufferWithoutANULIsMalformed) {
 }
 
 TEST(Answer, ARecordsNameOf64BytesIsMalformed) {
-  const std::string record = test::Flag(1) + test::I16(0) + test::U32(2) + test::Flag(64);
-  EXPECT_EQ(FaultOf(kSpec, record), kMalformed);
+  std::string record = test::Record(0, 2, std::string(63, 'n'));
+  EXPECT_EQ(FaultOf(kSpec, test::Flag(1) + record), "");
+  record[6] = 64;
+  EXPECT_EQ(FaultOf(kSpec, test::Flag(1) + record), kMalformed);
 }
 
 TEST(Answer, SettingsOfMoreThanAMebibyteAreMalformed) {
