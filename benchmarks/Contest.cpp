@@ -1,0 +1,54 @@
+#include "Contest.h"
+
+#include <algorithm>
+#include <ctime>
+
+namespace tallowmere::benchmark {
+namespace {
+
+// How many requests one server is asked before it is the next one's turn.
+constexpr int kTurn = 50;
+
+}  // namespace
+
+double Median(std::vector<double> values) {
+  const auto middle = values.begin() + static_cast<std::ptrdiff_t>(values.size() / 2);
+  std::nth_element(values.begin(), middle, values.end());
+  return *middle;
+}
+
+double Now() {
+  timespec now{};
+  clock_gettime(CLOCK_MONOTONIC, &now);
+  return static_cast<double>(now.tv_sec) * 1e6 + static_cast<double>(now.tv_nsec) / 1e3;
+}
+
+std::vector<Cost> Compete(const std::vector<Contestant>& contestants, int requests) {
+  const int turn = std::min(kTurn, requests);
+  struct Times {
+    std::vector<double> roundTrips;
+    std::vector<double> processor;
+  };
+  std::vector<Times> times(contestants.size());
+  for (int asked = -turn; asked < requests; asked += turn) {  // the first turn is to warm up
+    for (std::size_t i = 0; i < contestants.size(); ++i) {
+      const auto& [server, request, answerSize] = contestants[i];
+      const double usedBefore = server->ProcessorTime();
+      for (int j = 0; j < turn; ++j) {
+        const double begin = Now();
+        server->Ask(request, answerSize);
+        const double end = Now();
+        if (asked >= 0) times[i].roundTrips.push_back(end - begin);
+      }
+      const double used = server->ProcessorTime() - usedBefore;
+      if (asked >= 0) times[i].processor.push_back(used / turn);
+    }
+  }
+  std::vector<Cost> costs;
+  for (const auto& [roundTrips, processor] : times) {
+    costs.push_back({Median(roundTrips), Median(processor)});
+  }
+  return costs;
+}
+
+}  // namespace tallowmere::benchmark
