@@ -1,7 +1,8 @@
 #include "Contest.h"
 
 #include <algorithm>
-#include <ctime>
+
+#include "Measure.h"
 
 namespace tallowmere::benchmark {
 namespace {
@@ -10,18 +11,6 @@ namespace {
 constexpr int kTurn = 50;
 
 }  // namespace
-
-double Median(std::vector<double> values) {
-  const auto middle = values.begin() + static_cast<std::ptrdiff_t>(values.size() / 2);
-  std::nth_element(values.begin(), middle, values.end());
-  return *middle;
-}
-
-double Now() {
-  timespec now{};
-  clock_gettime(CLOCK_MONOTONIC, &now);
-  return static_cast<double>(now.tv_sec) * 1e6 + static_cast<double>(now.tv_nsec) / 1e3;
-}
 
 std::vector<Cost> Compete(const std::vector<Contestant>& contestants, int requests) {
   const int turn = std::min(kTurn, requests);

@@ -26,10 +26,4 @@ struct Cost {
 // some dozens of requests.
 std::vector<Cost> Compete(const std::vector<Contestant>& contestants, int requests);
 
-// The middle one; of an even number the upper one of two. REQUIRES: there is one.
-double Median(std::vector<double> values);
-
-// In microseconds, since some moment.
-double Now();
-
 }  // namespace tallowmere::benchmark

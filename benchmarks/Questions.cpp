@@ -2,9 +2,9 @@
 
 #include <unistd.h>
 
-#include <chrono>
 #include <cstring>
 #include <fstream>
+#include <iterator>
 #include <thread>
 
 #include "Server.h"
@@ -18,9 +18,6 @@ using namespace tallowmere::test;
 constexpr unsigned kRoomForAFullPath = 1024;
 constexpr unsigned kRoomForAName = 64;
 constexpr std::size_t kSettingsSize = 144;
-
-// A newborn item has to be told by more than its birth for two seconds.
-constexpr std::chrono::milliseconds kTimeToSettle{3'200};
 
 constexpr std::uint32_t kRateOfACD = 44100u << 16;
 
@@ -57,17 +54,17 @@ std::string NameOfVolume(Server& service, int number) {
 
 }  // namespace
 
-std::filesystem::path SettledFile(const std::filesystem::path& top, int components) {
-  std::filesystem::path path = top;
+std::filesystem::path SettledFile(const Settings& settings, int components) {
+  std::filesystem::path path = settings.folder;
   // The root directory counts as a component here, the file does not yet.
-  for (auto depth = std::distance(top.begin(), top.end()); depth < components; ++depth) {
+  for (auto depth = std::distance(path.begin(), path.end()); depth < components; ++depth) {
     path /= "folder " + std::to_string(depth);
   }
   std::filesystem::create_directories(path);
   path /= "a track.aif";
   if (!std::filesystem::exists(path)) {
     std::ofstream{path};
-    std::this_thread::sleep_for(kTimeToSettle);
+    std::this_thread::sleep_for(settings.settle);
   }
   return path;
 }

@@ -2,9 +2,11 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <filesystem>
 #include <string>
 
+#include "Measure.h"
 #include "service/Protocol.h"
 
 namespace tallowmere::benchmark {
@@ -21,12 +23,12 @@ struct Item {
   std::string fullPath;  // of the folder, in HFS form
 };
 
-// The path of an empty file below `top` that has so many components, or the fewest that there can
-// be, made unless it is there. It is old enough for its time of birth to tell it from others.
-std::filesystem::path SettledFile(const std::filesystem::path& top, int components);
+// The path of an empty file in the settings' folder that has so many components, or the fewest that
+// there can be; made unless it is there, and left alone until it is as any old file.
+std::filesystem::path SettledFile(const Settings& settings, int components);
 
-// Asks the service at `program` about an existing item. Ends the benchmark where its answers are
-// not those for an item with a plain name.
+// Asks the service at `program` about an existing item. Fails where its answers are not those for
+// an item with a plain name.
 Item AskAbout(const std::string& program, const std::filesystem::path& path);
 
 struct Question {

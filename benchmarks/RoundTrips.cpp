@@ -1,12 +1,12 @@
 #include <unistd.h>
 
 #include <array>
-#include <cstdio>
-#include <memory>
+#include <optional>
 
 #include "Contest.h"
 #include "FileServer.h"
 #include "Measure.h"
+#include "Questions.h"
 
 namespace tallowmere::benchmark {
 namespace {
@@ -31,28 +31,17 @@ constexpr auto kRows = std::to_array<Row>({
     {protocol::kRequestGetAIFFExportSettings, 6, 1.10, 1.3},
 });
 
-// The costs in each run, by contestant.
-class Runs {
- public:
-  explicit Runs(std::vector<std::vector<Cost>> costs) : mCosts(std::move(costs)) {}
-
-  // One over the other: the median of the runs' ratios.
-  Figure Ratio(const std::string& what, std::size_t first, std::size_t second,
-               double Cost::*kind) const {
-    std::vector<double> ratios;
-    std::vector<double> firsts;
-    std::vector<double> seconds;
-    for (const std::vector<Cost>& run : mCosts) {
-      ratios.push_back(run[first].*kind / run[second].*kind);
-      firsts.push_back(run[first].*kind);
-      seconds.push_back(run[second].*kind);
-    }
-    return {what, Median(ratios), "", {}, false, Quotient(Median(firsts), Median(seconds), "µs")};
+// One contestant over another in each run.
+Figure RatioIn(const std::vector<std::vector<Cost>>& runs, const std::string& what,
+               std::size_t first, std::size_t second, double Cost::*kind) {
+  std::vector<double> firsts;
+  std::vector<double> seconds;
+  for (const std::vector<Cost>& run : runs) {
+    firsts.push_back(run[first].*kind);
+    seconds.push_back(run[second].*kind);
   }
-
- private:
-  std::vector<std::vector<Cost>> mCosts;
-};
+  return RatioOf(what, firsts, seconds, "µs");
+}
 
 // The question of the file server that comes next to a request.
 std::optional<Question> PeerQuestion(protocol::RequestCode code, const std::string& path) {
@@ -66,13 +55,8 @@ std::optional<Question> PeerQuestion(protocol::RequestCode code, const std::stri
   }
 }
 
-Figure WithBar(Figure figure, double bar) {
-  figure.bar = bar;
-  return figure;
-}
-
 std::vector<Figure> Take(const Row& row, const Settings& settings) {
-  const Item item = AskAbout(settings.service, SettledFile(settings.folder, row.components));
+  const Item item = AskAbout(settings.service, SettledFile(settings, row.components));
   const Question question = QuestionOf(row.code, item);
   const std::string parent = std::to_string(getpid());
   Server service(settings.service, {parent});
@@ -89,25 +73,24 @@ std::vector<Figure> Take(const Row& row, const Settings& settings) {
     peer.emplace();
     contestants.push_back({&peer->Process(), peerQuestion->request, peerQuestion->answerSize});
   }
-  std::vector<std::vector<Cost>> costs;
+  std::vector<std::vector<Cost>> runs;
   for (int run = 0; run < settings.runs; ++run) {
-    costs.push_back(Compete(contestants, settings.requests));
+    runs.push_back(Compete(contestants, settings.requests));
   }
 
-  const Runs runs(std::move(costs));
   const std::string code = "code " + std::to_string(row.code);
   std::vector<Figure> figures{
-      WithBar(runs.Ratio(code + ": round trip / floor", 0, 1, &Cost::roundTrip),
-              row.barOfRoundTrip),
-      WithBar(runs.Ratio(code + ": processor time / floor", 0, 1, &Cost::processor),
-              row.barOfProcessor)};
+      AtMost(row.barOfRoundTrip,
+             RatioIn(runs, code + ": round trip / floor", 0, 1, &Cost::roundTrip)),
+      AtMost(row.barOfProcessor,
+             RatioIn(runs, code + ": processor time / floor", 0, 1, &Cost::processor))};
   if (peer) {
     const std::string name = row.code == protocol::kRequestGetFSSpec ? "LSTAT" : "REALPATH";
-    figures.push_back(runs.Ratio(code + " / SFTP " + name, 0, 2, &Cost::roundTrip));
-    figures.push_back(runs.Ratio("floor of " + code + " / SFTP " + name, 1, 2, &Cost::roundTrip));
-  } else if (peerQuestion) {
+    figures.push_back(RatioIn(runs, code + " / SFTP " + name, 0, 2, &Cost::roundTrip));
     figures.push_back(
-        {code + " / SFTP", {}, "", {}, false, "openssh-sftp-server is not installed"});
+        RatioIn(runs, "floor of " + code + " / SFTP " + name, 1, 2, &Cost::roundTrip));
+  } else if (peerQuestion) {
+    figures.push_back(Skipped(code + " / SFTP", "openssh-sftp-server is not installed"));
   }
   return figures;
 }

@@ -7,10 +7,11 @@
 #include <unistd.h>
 
 #include <array>
-#include <cstdio>
+#include <cerrno>
 #include <cstdlib>
 #include <ctime>
 #include <fstream>
+#include <system_error>
 
 namespace tallowmere::benchmark {
 namespace {
@@ -24,8 +25,7 @@ std::array<int, 2> MakePipe() {
 }  // namespace
 
 void Fail(const std::string& what) {
-  std::perror(what.c_str());
-  std::exit(EXIT_FAILURE);
+  throw std::system_error(errno, std::generic_category(), what);
 }
 
 Server::Server(const std::string& program, const std::vector<std::string>& arguments) {

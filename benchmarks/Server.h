@@ -12,15 +12,15 @@ namespace tallowmere::benchmark {
 
 class Server {
  public:
-  // Ends the benchmark, with a word, when the program cannot be started.
+  // Fails when the program cannot be started.
   Server(const std::string& program, const std::vector<std::string>& arguments);
   Server(const Server&) = delete;
   Server& operator=(const Server&) = delete;
   // Closes the pipes and waits for the end of the process.
   ~Server();
 
-  // Writes a request and reads an answer of so many bytes, which is valid until the next one. Ends
-  // the benchmark when there is none.
+  // Writes a request and reads an answer of so many bytes, which is valid until the next one. Fails
+  // when there is none.
   std::string_view Ask(std::string_view request, std::size_t answerSize);
 
   // What the process has used so far, user and system, in microseconds.
@@ -37,7 +37,7 @@ class Server {
   std::string mAnswer;
 };
 
-// Ends the benchmark, as what it needs has failed; errno tells why.
+// Throws std::system_error: what the benchmark needs has failed; errno tells why.
 [[noreturn]] void Fail(const std::string& what);
 
 }  // namespace tallowmere::benchmark

@@ -1,6 +1,5 @@
 // tallowmere_bench: takes the measures in one run and prints them as one table, in Markdown.
 
-#include <sched.h>
 #include <signal.h>
 #include <sys/utsname.h>
 
@@ -10,12 +9,15 @@
 #include <iostream>
 #include <nlohmann/json.hpp>
 
+#include "InAProcess.h"
 #include "Measure.h"
-#include "Server.h"
 #include "support/TemporaryFolder.h"
 
 namespace tallowmere::benchmark {
 namespace {
+
+// A newborn item has to be told by more than its time of birth for two seconds.
+constexpr std::chrono::milliseconds kTimeToSettle{3'200};
 
 std::string Format(const char* format, double value) {
   char text[64];
@@ -63,19 +65,6 @@ nlohmann::json JSONOf(const Figure& figure) {
   return object;
 }
 
-// This process and what it starts: on the last core that it may use, where the fewest interrupts
-// are.
-void PinToOneCore() {
-  cpu_set_t allowed;
-  sched_getaffinity(0, sizeof allowed, &allowed);
-  std::size_t core = CPU_SETSIZE - 1;
-  while (!CPU_ISSET(core, &allowed)) --core;
-  cpu_set_t one;
-  CPU_ZERO(&one);
-  CPU_SET(core, &one);
-  if (sched_setaffinity(0, sizeof one, &one) != 0) Fail("sched_setaffinity");
-}
-
 std::string MachineLine() {
   utsname system{};
   uname(&system);
@@ -86,12 +75,17 @@ std::string MachineLine() {
 }
 
 std::vector<Measure> AllMeasures() {
-  return RoundTripMeasures();
+  std::vector<Measure> all;
+  for (const auto& measures : {RoundTripMeasures(), ProcessMeasures(), NodeIDMeasures()}) {
+    all.insert(all.end(), measures.begin(), measures.end());
+  }
+  return all;
 }
 
 int Run(int argumentCount, char** arguments) {
   const std::vector<Measure> all = AllMeasures();
-  Settings settings{TALLOWMERE_SERVICE, 5, 5000, 1'000'000, {}};
+  Settings settings{TALLOWMERE_SERVICE, 5, 5000, 1'000'000, kTimeToSettle, {}};
+  bool isTrial = false;
   std::vector<std::string> chosen;
   std::string json;
 
@@ -111,7 +105,9 @@ int Run(int argumentCount, char** arguments) {
       ->capture_default_str();
   app.add_option("--service", settings.service, "The program to measure")->capture_default_str();
   app.add_option("--json", json, "A file for the same figures as JSON; \"-\" for standard output");
+  app.add_flag("--trial", isTrial, "Only see that it runs: the figures mean nothing");
   CLI11_PARSE(app, argumentCount, arguments);
+  if (isTrial) settings = {settings.service, 1, 10, 300, {}, {}};
 
   signal(SIGPIPE, SIG_IGN);
   const test::TemporaryFolder folder;
@@ -146,16 +142,13 @@ int Run(int argumentCount, char** arguments) {
 
 }  // namespace
 
-bool Figure::IsMet() const {
-  return !value || !bar || (isLeast ? *value >= *bar : *value <= *bar);
-}
-
-std::string Quotient(double first, double second, const char* unit) {
-  return Format("%.2f ÷ ", first) + Format("%.2f ", second) + unit;
-}
-
 }  // namespace tallowmere::benchmark
 
 int main(int count, char** arguments) {
-  return tallowmere::benchmark::Run(count, arguments);
+  try {
+    return tallowmere::benchmark::Run(count, arguments);
+  } catch (const std::exception& error) {
+    std::cerr << error.what() << '\n';
+    return EXIT_FAILURE;
+  }
 }
