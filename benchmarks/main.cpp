@@ -9,6 +9,7 @@
 #include <iostream>
 #include <nlohmann/json.hpp>
 
+#include "Growth.h"
 #include "InAProcess.h"
 #include "Measure.h"
 #include "support/TemporaryFolder.h"
@@ -88,6 +89,7 @@ int Run(int argumentCount, char** arguments) {
   bool isTrial = false;
   std::vector<std::string> chosen;
   std::string json;
+  std::string plots;
 
   CLI::App app("Measures the service against floors and peers and prints one table.");
   std::vector<std::string> names;
@@ -105,6 +107,8 @@ int Run(int argumentCount, char** arguments) {
       ->capture_default_str();
   app.add_option("--service", settings.service, "The program to measure")->capture_default_str();
   app.add_option("--json", json, "A file for the same figures as JSON; \"-\" for standard output");
+  app.add_option("--plots", plots, "Plot how cost grows instead, into that folder")
+      ->check(CLI::ExistingDirectory);
   app.add_flag("--trial", isTrial, "Only see that it runs: the figures mean nothing");
   CLI11_PARSE(app, argumentCount, arguments);
   if (isTrial) settings = {settings.service, 1, 10, 300, {}, {}};
@@ -113,6 +117,10 @@ int Run(int argumentCount, char** arguments) {
   const test::TemporaryFolder folder;
   settings.folder = folder.Path();
   PinToOneCore();
+  if (!plots.empty()) {
+    PlotGrowth(settings, plots);
+    return EXIT_SUCCESS;
+  }
 
   const bool printsTable = json != "-";
   if (printsTable) {
