@@ -4,6 +4,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cstdint>
+
 #include "Server.h"
 
 namespace tallowmere::benchmark {
@@ -14,6 +16,10 @@ constexpr std::size_t kFoldersInAFolder = 8;
 
 // Without a limit on how much there can be in it; what is there takes memory.
 constexpr const char* kNoLimit = "size=0,nr_inodes=0,mode=0755";
+
+// Memory's inode numbers count from 1, and the first ones are no node ids: whether an item that has
+// one is the only one with its id takes a look at the whole volume.
+constexpr std::uint64_t kReservedInodes = 16;
 
 void MakeFile(const std::filesystem::path& path) {
   const int file = open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0644);
@@ -48,6 +54,10 @@ Tree MakeTree(const std::filesystem::path& top, long entries) {
 MemoryVolume::MemoryVolume()
     : mMount("tmpfs", mFolder.Path(), test::EnterOwnMountNamespace() ? "tmpfs" : "", 0, kNoLimit) {
   chmod(mFolder.Path().c_str(), 0755);
+  for (std::uint64_t i = 0; i < kReservedInodes; ++i) {
+    MakeFile(Path() / "used up");
+    unlink((Path() / "used up").c_str());
+  }
 }
 
 const BigTree& TheBigTree(long entries) {

@@ -22,7 +22,7 @@ struct Tree {
 // to eight folders and, as nearly as can be, the same number of files.
 Tree MakeTree(const std::filesystem::path& top, long entries);
 
-// A volume in memory, which ends with its object.
+// A volume in memory, which ends with its object. Items in it have inode numbers that are node ids.
 class MemoryVolume {
  public:
   MemoryVolume();

@@ -1,9 +1,10 @@
 // The floor: what no service for these requests can do without.
 //
-// tallowmere_floor PARENT_PROCESS_ID ITEM VOLUME_NAME: reads, field by field, any request but 0,
-// writes an answer of constant content field by field, and looks for its parent, with the very
-// calls that the service makes for that. In between it makes the fewest file-system calls that an
-// answer can rest on, given a memory without cost of everything that an earlier request has told:
+// tallowmere_floor PARENT_PROCESS_ID ITEM VOLUME_NAME: reads, field by field, a request (0 and
+// unknown ones end it), writes an answer of constant content field by field, and looks for its
+// parent, with the very calls that the service makes for that. In between it makes the fewest
+// file-system calls that an answer can rest on, given a memory without cost of everything that an
+// earlier request has told:
 //
 // - One poll on the mount table where the answer depends on which volumes there are. The table is
 //   read once.

@@ -116,6 +116,13 @@ std::filesystem::path LastFolder(const files::VolumePointer& volume) {
   }
 }
 
+bool MayRunWithoutPrivilege(const std::string& program) {
+  return InAProcess([&]() -> std::vector<double> {
+           DropPrivilege();
+           return {access(program.c_str(), X_OK) == 0 ? 1.0 : 0.0};
+         })[0] == 1.0;
+}
+
 // In milliseconds: the answer about the item; in MiB: what the service has more behind it.
 std::vector<double> FindCold(const Settings& settings, const Item& item) {
   DropPrivilege();
@@ -150,6 +157,9 @@ std::vector<double> Search(const std::string& program, const std::filesystem::pa
 
 std::vector<Figure> Cold(const Settings& settings) {
   const std::string what = "node id, cold, no privilege";
+  if (!MayRunWithoutPrivilege(settings.service)) {
+    return {Skipped(what, "not everybody may run " + settings.service)};
+  }
   const BigTree& big = TheBigTree(settings.entries);
   if (!big.volume.IsMounted()) return {Skipped(what, "mounting is not permitted")};
   const auto& top = big.volume.Path();
