@@ -21,13 +21,13 @@ constexpr const char* kNoLimit = "size=0,nr_inodes=0,mode=0755";
 // one is the only one with its id takes a look at the whole volume.
 constexpr std::uint64_t kReservedInodes = 16;
 
-void MakeFile(const std::filesystem::path& path) {
+}  // namespace
+
+void MakeEmptyFile(const std::filesystem::path& path) {
   const int file = open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0644);
   if (file < 0) Fail(path);
   close(file);
 }
-
-}  // namespace
 
 Tree MakeTree(const std::filesystem::path& top, long entries) {
   const auto folders = static_cast<std::size_t>(entries * kFoldersInAHundred / 100);
@@ -45,7 +45,7 @@ Tree MakeTree(const std::filesystem::path& top, long entries) {
     const std::size_t filesByThen = files * (next + 1) / (folders + 1);
     for (std::size_t i = 0; tree.files.size() < filesByThen; ++i) {
       tree.files.push_back(folder / ("a track " + std::to_string(i) + ".aif"));
-      MakeFile(tree.files.back());
+      MakeEmptyFile(tree.files.back());
     }
   }
   return tree;
@@ -55,7 +55,7 @@ MemoryVolume::MemoryVolume()
     : mMount("tmpfs", mFolder.Path(), test::EnterOwnMountNamespace() ? "tmpfs" : "", 0, kNoLimit) {
   chmod(mFolder.Path().c_str(), 0755);
   for (std::uint64_t i = 0; i < kReservedInodes; ++i) {
-    MakeFile(Path() / "used up");
+    MakeEmptyFile(Path() / "used up");
     unlink((Path() / "used up").c_str());
   }
 }

@@ -18,6 +18,9 @@ struct Tree {
   std::vector<std::filesystem::path> files;
 };
 
+// A new file.
+void MakeEmptyFile(const std::filesystem::path& path);
+
 // So many entries below `top`, which is there: of 100 entries 11 are folders, each of which has up
 // to eight folders and, as nearly as can be, the same number of files.
 Tree MakeTree(const std::filesystem::path& top, long entries);

@@ -34,6 +34,7 @@ std::vector<Cost> Compete(const std::vector<Contestant>& contestants, int reques
     }
   }
   std::vector<Cost> costs;
+  costs.reserve(times.size());
   for (const auto& [roundTrips, processor] : times) {
     costs.push_back({Median(roundTrips), Median(processor)});
   }

@@ -1,7 +1,7 @@
 // The floor: what no service for these requests can do without.
 //
 // tallowmere_floor PARENT_PROCESS_ID ITEM VOLUME_NAME: reads, field by field, a request (0 and
-// unknown ones end it), writes an answer of constant content field by field, and looks for its
+// unknown codes end it), writes an answer of constant content field by field, and looks for its
 // parent, with the very calls that the service makes for that. In between it makes the fewest
 // file-system calls that an answer can rest on, given a memory without cost of everything that an
 // earlier request has told:
@@ -21,6 +21,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <climits>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
@@ -194,7 +195,8 @@ int main(int count, char** arguments) {
   const pid_t parent = std::atoi(arguments[1]);  // NOLINT(cert-err34-c)
   const char* const item = arguments[2];
   const char* const name = std::strrchr(item, '/') + 1;
-  char* const folder = strndup(item, static_cast<std::size_t>(name - 1 - item));
+  static char folder[PATH_MAX];
+  std::memcpy(folder, item, static_cast<std::size_t>(name - 1 - item));
   do {
     Serve(TakeU16(), item, folder, name, arguments[3]);
   } while (kill(parent, 0) == 0);

@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
-#include <fstream>
 #include <iterator>
 #include <list>
 #include <thread>
@@ -51,7 +50,7 @@ Plot Depth(const Settings& settings) {
     while (std::distance(folder.begin(), folder.end()) < depth) folder /= "d";
     std::filesystem::create_directories(folder);
     const auto path = folder / "a track.aif";
-    std::ofstream{path};
+    MakeEmptyFile(path);
     std::this_thread::sleep_for(settings.settle);
     const Item item = AskAbout(settings.service, path);
     Server service(settings.service, {OwnID()});
@@ -82,7 +81,7 @@ Plot FolderSize(const Settings& settings) {
   std::filesystem::create_directory(folder);
   long made = 0;
   for (long size = 10; size <= settings.entries; size *= 10) {
-    for (; made < size; ++made) std::ofstream{folder / ("a track " + std::to_string(made))};
+    for (; made < size; ++made) MakeEmptyFile(folder / ("a track " + std::to_string(made)));
     const Item item = AskAbout(settings.service, folder / ("a track " + std::to_string(size / 2)));
     Server service(settings.service, {OwnID()});
     const Question record = QuestionOf(protocol::kRequestGetFSSpec, item);
@@ -107,7 +106,7 @@ Plot Mounts(const Settings& settings, long most) {
       mounts.emplace_back("tmpfs", place, "tmpfs");
     }
     const auto path = folder / ("volume " + std::to_string(count - 1)) / "a track.aif";
-    std::ofstream{path};
+    MakeEmptyFile(path);
     const Item item = AskAbout(settings.service, path);
     Server service(settings.service, {OwnID()});
     AddRoundTrips(settings,

@@ -89,6 +89,7 @@ void UseAllCores() {
 
 double TimeOf(const std::vector<std::string>& command) {
   std::vector<char*> arguments;
+  arguments.reserve(command.size() + 1);
   for (const std::string& word : command) arguments.push_back(const_cast<char*>(word.c_str()));
   arguments.push_back(nullptr);
   posix_spawn_file_actions_t actions;
@@ -107,7 +108,7 @@ bool IsOnPath(const std::string& program) {
   const char* const path = std::getenv("PATH");
   std::istringstream folders(path == nullptr ? "" : path);
   for (std::string folder; std::getline(folders, folder, ':');) {
-    if (access((folder + "/" + program).c_str(), X_OK) == 0) return true;
+    if (access(folder.append("/").append(program).c_str(), X_OK) == 0) return true;
   }
   return false;
 }

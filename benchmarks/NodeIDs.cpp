@@ -172,21 +172,27 @@ std::vector<Figure> Cold(const Settings& settings) {
   std::vector<double> cold;
   std::vector<double> memory;
   std::vector<double> walks;
-  std::vector<std::pair<std::string, std::vector<double>>> peers{{"find", {}}, {"bfs", {}}};
+  struct Peer {
+    std::string program;
+    std::vector<double> times;
+  };
+  std::vector<Peer> peers{{"find", {}}, {"bfs", {}}};
   for (int run = 0; run < settings.runs; ++run) {
     const auto found = InAProcess([&] { return FindCold(settings, item); });
     cold.push_back(found[0]);
     memory.push_back(found[1]);
     walks.push_back(InAProcess([&] { return WalkCold(top, settings.entries); })[0]);
-    for (auto& [program, times] : peers) {
-      if (!IsOnPath(program)) continue;
-      times.push_back(InAProcess([&] { return Search(program, top, folder->inode); })[0]);
+    for (Peer& peer : peers) {
+      if (!IsOnPath(peer.program)) continue;
+      const auto search = [&] { return Search(peer.program, top, folder->inode); };
+      peer.times.push_back(InAProcess(search)[0]);
     }
   }
 
   std::vector<Figure> figures{AtMost(1.2, RatioOf(what + " / bare walk", cold, walks, "ms"))};
   for (const auto& [program, times] : peers) {
-    const std::string name = what + " / " + program + " -inum";
+    std::string name = what;
+    name.append(" / ").append(program).append(" -inum");
     figures.push_back(times.empty() ? Skipped(name, program + " is not installed")
                                     : AtMost(0.7, RatioOf(name, cold, times, "ms")));
   }

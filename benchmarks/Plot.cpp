@@ -25,20 +25,21 @@ constexpr std::array<const char*, 4> kColours{"#3b82c4", "#d9772b", "#3f9b57", "
 class Axis {
  public:
   Axis(double least, double most, double begin, double end)
-      : mLow(std::floor(std::log10(least))),
-        mHigh(std::max(std::ceil(std::log10(most)), mLow + 1)),
+      : mLow(static_cast<int>(std::floor(std::log10(least)))),
+        mHigh(std::max(static_cast<int>(std::ceil(std::log10(most))), mLow + 1)),
         mBegin(begin),
         mEnd(end) {}
 
-  double Low() const { return mLow; }
-  double High() const { return mHigh; }
+  // As powers of ten.
+  int Low() const { return mLow; }
+  int High() const { return mHigh; }
   double At(double value) const {
     return mBegin + (mEnd - mBegin) * (std::log10(value) - mLow) / (mHigh - mLow);
   }
 
  private:
-  double mLow;  // as powers of ten
-  double mHigh;
+  int mLow;
+  int mHigh;
   double mBegin;
   double mEnd;
 };
@@ -73,13 +74,13 @@ std::string Line(double x1, double y1, double x2, double y2) {
 
 std::string Grid(const Axis& sizes, const Axis& costs) {
   std::string svg;
-  for (double power = sizes.Low(); power <= sizes.High(); ++power) {
+  for (int power = sizes.Low(); power <= sizes.High(); ++power) {
     const double x = sizes.At(std::pow(10, power));
     svg += Line(x, kTop, x, kHeight - kBottom);
     svg += Text(x, kHeight - kBottom + kLineOfText, "text-anchor=\"middle\"",
                 Number("%.6g", std::pow(10, power)));
   }
-  for (double power = costs.Low(); power <= costs.High(); ++power) {
+  for (int power = costs.Low(); power <= costs.High(); ++power) {
     const double y = costs.At(std::pow(10, power));
     svg += Line(kLeft, y, kWidth - kRight, y);
     svg += Text(kLeft - 6, y + 4, "text-anchor=\"end\"", Number("%.6g", std::pow(10, power)));
@@ -93,8 +94,9 @@ std::string Curve(const Series& series, const char* colour, const Axis& sizes, c
   for (const auto& [size, cost] : series.points) {
     const std::string x = Pixels(sizes.At(size));
     const std::string y = Pixels(costs.At(cost));
-    path += (path.empty() ? "M" : "L") + x + " " + y;
-    marks += "<circle cx=\"" + x + "\" cy=\"" + y + "\" r=\"3\" fill=\"" + colour + "\"/>\n";
+    path.append(path.empty() ? "M" : "L").append(x).append(" ").append(y);
+    marks.append("<circle cx=\"").append(x).append("\" cy=\"").append(y);
+    marks.append("\" r=\"3\" fill=\"").append(colour).append("\"/>\n");
   }
   return "<path d=\"" + path + "\" fill=\"none\" stroke-width=\"2\" stroke=\"" + colour + "\"/>\n" +
          marks;

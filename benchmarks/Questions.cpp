@@ -3,10 +3,10 @@
 #include <unistd.h>
 
 #include <cstring>
-#include <fstream>
 #include <iterator>
 #include <thread>
 
+#include "BigTree.h"
 #include "Server.h"
 #include "support/Wire.h"
 
@@ -63,7 +63,7 @@ std::filesystem::path SettledFile(const Settings& settings, int components) {
   std::filesystem::create_directories(path);
   path /= "a track.aif";
   if (!std::filesystem::exists(path)) {
-    std::ofstream{path};
+    MakeEmptyFile(path);
     std::this_thread::sleep_for(settings.settle);
   }
   return path;

@@ -74,6 +74,7 @@ std::vector<Figure> Take(const Row& row, const Settings& settings) {
     contestants.push_back({&peer->Process(), peerQuestion->request, peerQuestion->answerSize});
   }
   std::vector<std::vector<Cost>> runs;
+  runs.reserve(static_cast<std::size_t>(settings.runs));
   for (int run = 0; run < settings.runs; ++run) {
     runs.push_back(Compete(contestants, settings.requests));
   }
@@ -99,6 +100,7 @@ std::vector<Figure> Take(const Row& row, const Settings& settings) {
 
 std::vector<Measure> RoundTripMeasures() {
   std::vector<Measure> measures;
+  measures.reserve(kRows.size());
   for (const Row& row : kRows) {
     measures.push_back({"code" + std::to_string(row.code),
                         [&row](const Settings& settings) { return Take(row, settings); }});

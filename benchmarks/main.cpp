@@ -93,6 +93,7 @@ int Run(int argumentCount, char** arguments) {
 
   CLI::App app("Measures the service against floors and peers and prints one table.");
   std::vector<std::string> names;
+  names.reserve(all.size());
   for (const Measure& measure : all) names.push_back(measure.name);
   app.add_option("--only", chosen, "A measure to take, of all of them; can be repeated")
       ->check(CLI::IsMember(names));
