@@ -42,17 +42,28 @@ Contestant AskedOf(Server& server, const Question& question) {
   return {&server, question.request, question.answerSize};
 }
 
+// An item whose path has so many components: where the settings' folder is below that, one of the
+// folders on the way to it.
+std::filesystem::path ItemAtDepth(const Settings& settings, int depth) {
+  std::filesystem::path item;
+  for (const auto& part : settings.folder) {
+    item /= part;
+    if (std::distance(item.begin(), item.end()) > depth) return item;
+  }
+  // Short names, so that a full HFS path has room for all of them.
+  while (std::distance(item.begin(), item.end()) < depth) item /= "d";
+  std::filesystem::create_directories(item);
+  item /= "a track.aif";
+  MakeEmptyFile(item);
+  std::this_thread::sleep_for(settings.settle);
+  return item;
+}
+
 Plot Depth(const Settings& settings) {
   std::vector<Series> series{
       {"code 1", {}}, {"code 7", {}}, {"code 9", {}}, {"floor of code 7", {}}};
-  std::filesystem::path folder = settings.folder / "deep";
-  for (const int depth : {4, 6, 10, 20, 50, 100, 200}) {
-    while (std::distance(folder.begin(), folder.end()) < depth) folder /= "d";
-    std::filesystem::create_directories(folder);
-    const auto path = folder / "a track.aif";
-    MakeEmptyFile(path);
-    std::this_thread::sleep_for(settings.settle);
-    const Item item = AskAbout(settings.service, path);
+  for (const int depth : {1, 2, 5, 10, 20, 50, 100, 200}) {
+    const Item item = AskAbout(settings.service, ItemAtDepth(settings, depth));
     Server service(settings.service, {OwnID()});
     Server floor(TALLOWMERE_FLOOR, {OwnID(), item.path, item.volumeName});
     const Question record = QuestionOf(protocol::kRequestGetFSSpec, item);

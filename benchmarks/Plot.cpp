@@ -14,7 +14,7 @@ namespace {
 constexpr double kWidth = 640;
 constexpr double kHeight = 360;
 constexpr double kLeft = 76;
-constexpr double kRight = 16;
+constexpr double kRight = 32;
 constexpr double kTop = 40;
 constexpr double kBottom = 52;
 constexpr double kLineOfText = 18;
@@ -78,12 +78,12 @@ std::string Grid(const Axis& sizes, const Axis& costs) {
     const double x = sizes.At(std::pow(10, power));
     svg += Line(x, kTop, x, kHeight - kBottom);
     svg += Text(x, kHeight - kBottom + kLineOfText, "text-anchor=\"middle\"",
-                Number("%.6g", std::pow(10, power)));
+                Number("%.7g", std::pow(10, power)));
   }
   for (int power = costs.Low(); power <= costs.High(); ++power) {
     const double y = costs.At(std::pow(10, power));
     svg += Line(kLeft, y, kWidth - kRight, y);
-    svg += Text(kLeft - 6, y + 4, "text-anchor=\"end\"", Number("%.6g", std::pow(10, power)));
+    svg += Text(kLeft - 6, y + 4, "text-anchor=\"end\"", Number("%.7g", std::pow(10, power)));
   }
   return svg;
 }
