@@ -26,22 +26,22 @@ int PrintVolumes(const ClientOptions& options, bool isJson);
 int PrintIdentities(const ItemsToAsk& paths);
 
 // The record of each path, as text or in hexadecimal.
-int PrintRecords(const ItemsToAsk& paths, bool asHex);
+int PrintRecords(const ItemsToAsk& items, bool asHex);
 
 // The path of each record.
-int PrintPathsOfRecords(const ItemsToAsk& records, bool searchOtherVolumes);
+int PrintPathsOfRecords(const ItemsToAsk& items, bool searchOtherVolumes);
 
 // The full HFS path of each path, as UTF-8.
-int PrintHFSPaths(const ItemsToAsk& paths);
+int PrintHFSPaths(const ItemsToAsk& items);
 
 // The path of each HFS path, given as UTF-8.
-int PrintPathsOfHFSPaths(const ItemsToAsk& hfsPaths);
+int PrintPathsOfHFSPaths(const ItemsToAsk& items);
 
 // The HFS name of each path, as UTF-8.
-int PrintNames(const ItemsToAsk& paths);
+int PrintNames(const ItemsToAsk& items);
 
 // The path of the item with each HFS name, given as UTF-8, in a folder.
-int PrintPathsOfNames(const ItemsToAsk& names, const std::string& folder);
+int PrintPathsOfNames(const ItemsToAsk& items, const std::string& folder);
 
 // A sound in the words of a person.
 struct Sound {
