@@ -2,6 +2,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <ctime>
 #include <thread>
 
 #include "client/ClientSupport.h"
@@ -19,7 +20,6 @@ using test::kNotInTime;
 using test::MessageOf;
 using test::TemporaryFolder;
 using testing::EndsWith;
-using testing::StartsWith;
 
 constexpr const char* kTakeRequest = "head -c 4 >/dev/null\n";
 
@@ -157,8 +157,16 @@ TEST(Client, AServiceThatAnswersAByteAtATimeMissesTheDeadlineToo) {
 
 TEST(Client, AServiceThatNoLongerReadsMissesTheDeadline) {
   const TemporaryFolder folder;
-  Client client({.service = Impostor(folder, "exec sleep 60 <&-"), .deadline = milliseconds(300)});
+  Client client({.service = Impostor(folder, "exec sleep 60 <&-"), .deadline = milliseconds(600)});
   EXPECT_EQ(MessageOf(client.GetHFSName(std::string(65534, 'x'))), kNotInTime);
+}
+
+TEST(Client, WaitingForAServiceThatNoLongerReadsTakesNoProcessorTime) {
+  const TemporaryFolder folder;
+  Client client({.service = Impostor(folder, "exec sleep 60 <&-"), .deadline = milliseconds(600)});
+  const std::clock_t before = std::clock();
+  EXPECT_FALSE(client.GetHFSName(std::string(65534, 'x')));
+  EXPECT_LT(std::clock() - before, CLOCKS_PER_SEC / 5);
 }
 
 TEST(Client, TheDeadlineCountsFromEachRequest) {
