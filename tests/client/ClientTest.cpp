@@ -167,7 +167,8 @@ TEST(Client, LeavesAProgramThatIgnoresTheEndOfItsChildrenAlone) {
 TEST(Client, TheServiceIsFoundOnTheSearchPath) {
   const TemporaryFolder folder;
   folder.MakeLink("tallowmere", TALLOWMERE_SERVICE);
-  const std::string before = getenv("PATH");
+  const char* const variable = getenv("PATH");
+  const std::string before = variable == nullptr ? "" : variable;
   setenv("PATH", ("/nonexistent::" + folder.Path().string()).c_str(), 1);
   Client client;
   const auto found = client.GetHFSVolumeName(0);
