@@ -97,7 +97,7 @@ OSErr SpecOfName(const Folder& folder, std::string_view name, FSSpec& spec) {
   const OSErr error = LookUpHFSName(folder, name, item);
   if (error == noErr) {
     RememberPlace(item);
-    return SpecOfPlace(item, spec);
+    return SpecOfPlace(item, folder, spec);
   }
   if (error != fnfErr) return error;
   if (name.size() > kLongestSpecName || SpellHFSName(name).precomposed.empty()) return bdNamErr;

@@ -15,6 +15,18 @@ std::optional<Place> FolderAtEndOf(const std::string& link) {
   return real ? PlaceAt(*real) : std::nullopt;
 }
 
+OSErr SpecOfRoot(const Volume& volume, FSSpec& spec) {
+  FillSpec(spec, volume.Number(), kParentOfRootID, volume.Name());
+  return noErr;
+}
+
+OSErr SpecInFolder(const Place& item, const Folder& folder, FSSpec& spec) {
+  const auto name = HFSNameOf(folder, item, kLongestSpecName);
+  if (!name) return fnfErr;
+  FillSpec(spec, folder.volume->Number(), folder.ID(), *name);
+  return noErr;
+}
+
 }  // namespace
 
 VolumePointer VolumeOf(const Place& item, const VolumePointer& known) {
@@ -42,16 +54,17 @@ OSErr HoldingFolder(const Place& item, const VolumePointer& known, Folder& folde
 
 OSErr SpecOfPlace(const Place& item, FSSpec& spec) {
   const VolumePointer volume = VolumeOf(item, nullptr);
-  if (IsRootOf(volume, item)) {
-    FillSpec(spec, volume->Number(), kParentOfRootID, volume->Name());
-    return noErr;
-  }
+  if (IsRootOf(volume, item)) return SpecOfRoot(*volume, spec);
   Folder folder;
-  if (const OSErr error = HoldingFolder(item, volume, folder)) return error;
-  const auto name = HFSNameOf(folder, item, kLongestSpecName);
-  if (!name) return fnfErr;
-  FillSpec(spec, folder.volume->Number(), folder.ID(), *name);
-  return noErr;
+  const OSErr error = HoldingFolder(item, volume, folder);
+  return error == noErr ? SpecInFolder(item, folder, spec) : error;
+}
+
+OSErr SpecOfPlace(const Place& item, const Folder& folder, FSSpec& spec) {
+  const VolumePointer volume = VolumeOf(item, folder.volume);
+  if (IsRootOf(volume, item)) return SpecOfRoot(*volume, spec);
+  RememberPlace(folder.place);
+  return SpecInFolder(item, folder, spec);
 }
 
 OSErr FolderWithID(SInt16 vRefNum, UInt32 id, Folder& folder) {

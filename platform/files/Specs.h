@@ -15,8 +15,9 @@ OSErr HoldingFolder(const Place& item, const VolumePointer& known, Folder& folde
 // The volume of an item. `known` as above. Null for an item of a kernel interface.
 VolumePointer VolumeOf(const Place& item, const VolumePointer& known);
 
-// The record of an item.
+// The record of an item; the second, of one that was found in a folder just now.
 OSErr SpecOfPlace(const Place& item, FSSpec& spec);
+OSErr SpecOfPlace(const Place& item, const Folder& folder, FSSpec& spec);
 
 // Whether the item is the root folder of that volume, which is its own or null.
 bool IsRootOf(const VolumePointer& volume, const Place& item);
