@@ -61,7 +61,7 @@ int PrintExportSettings(const ClientOptions& options, const Sound& sound, bool i
 // 1 when an item did not come back. What vanishes meanwhile does not count.
 int TakeCensus(const ClientOptions& options, bool isJson, const std::string& folder);
 
-// Starts the service and tries each request on the volume of "/".
+// Starts the service and tries each request on the volume of "/", up to the first that fails.
 int CheckService(const ClientOptions& options, bool isJson);
 
 }  // namespace tallowmere::cli

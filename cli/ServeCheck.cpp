@@ -99,7 +99,7 @@ void PrintAsJson(const Check& check, const std::string& wrong) {
   json["code"] = check.code;
   json["request"] = check.what;
   json["ok"] = wrong.empty();
-  if (!wrong.empty()) json["error"] = wrong;
+  if (!wrong.empty()) Put(json, "error", wrong);
   std::cout << json.dump() << '\n';
 }
 
@@ -112,11 +112,14 @@ int CheckService(const ClientOptions& options, bool isJson) {
   Table table({{"code", Table::Align::kRight}, {"request"}, {"result"}});
   for (const Check& check : Checks()) {
     const std::string wrong = check.run(client, found);
-    if (!wrong.empty()) status = kFailed;
     if (isJson) {
       PrintAsJson(check, wrong);
     } else {
       table.Add({std::to_string(check.code), check.what, wrong.empty() ? "ok" : wrong});
+    }
+    if (!wrong.empty()) {
+      status = kFailed;
+      break;  // what follows rests on it
     }
   }
   if (!isJson) table.Print(std::cout);

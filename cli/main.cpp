@@ -29,6 +29,19 @@ struct Arguments {
   bool searchOtherVolumes = false;
 };
 
+// Checks of numbers: empty, or what is wrong.
+std::string IsPositive(const std::string& text) {
+  double number = 0;
+  const bool isNumber = CLI::detail::lexical_cast(text, number);
+  return isNumber && number > 0 ? "" : text + " is no time above 0";
+}
+
+std::string IsRate(const std::string& text) {
+  double number = 0;
+  const bool isNumber = CLI::detail::lexical_cast(text, number);
+  return isNumber && number >= 0 && number < 65536 ? "" : text + " is no rate below 65536 hertz";
+}
+
 class CommandLine {
  public:
   CommandLine() {
@@ -38,7 +51,7 @@ class CommandLine {
                     "The service's program; without it, the one beside this program or on PATH")
         ->type_name("PATH");
     mApp.add_option("--deadline", mArguments.seconds, "How long one request may take, in seconds")
-        ->check(CLI::PositiveNumber)
+        ->check(IsPositive)
         ->capture_default_str();
     AddConversions();
     AddTheOthers();
@@ -48,7 +61,9 @@ class CommandLine {
     try {
       mApp.parse(count, arguments);
     } catch (const CLI::ParseError& error) {
-      return mApp.exit(error) == 0 ? 0 : kWrongUsage;
+      if (error.get_exit_code() == 0) return mApp.exit(error);
+      Complain(std::string(error.what()) + "; --help tells more");
+      return kWrongUsage;
     }
     const std::chrono::duration<double> deadline(mArguments.seconds);
     ClientOptions& client = mArguments.items.client;
@@ -156,9 +171,7 @@ void CommandLine::AddTheOthers() {
             return PrintExportSettings(a.items.client, a.sound, a.items.format.isJson, a.output);
           });
   AddJson(command);
-  command->add_option("--rate", a.sound.hertz, "In hertz")
-      ->check(CLI::Range(0.0, 65535.99))
-      ->capture_default_str();
+  command->add_option("--rate", a.sound.hertz, "In hertz")->check(IsRate)->capture_default_str();
   command->add_option("--bits", a.sound.bits, "In a sample")->capture_default_str();
   command->add_option("--channels", a.sound.channels, "Of the sound")
       ->check(CLI::Range(0, 255))

@@ -238,6 +238,37 @@ TEST(Client, ADeadlineOfNothingStartsNoService) {
   EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kNotInTime);
 }
 
+TEST(Client, ACopyOfThisProcessLeavesTheServiceAlone) {
+  Client client = test::StartClient();
+  ASSERT_TRUE(client.GetHFSVolumeName(0));
+  const pid_t copy = fork();
+  if (copy == 0) {
+    { const Client itsOwn = std::move(client); }
+    _exit(0);
+  }
+  waitpid(copy, nullptr, 0);
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
+}
+
+TEST(Client, ABrokenPipeSignalThatWasPendingStaysPending) {
+  sigset_t brokenPipe;
+  sigemptyset(&brokenPipe);
+  sigaddset(&brokenPipe, SIGPIPE);
+  sigset_t before;
+  pthread_sigmask(SIG_BLOCK, &brokenPipe, &before);
+  raise(SIGPIPE);
+  const TemporaryFolder folder;
+  Client client({.service = Impostor(folder, "exec sleep 60 <&-"), .deadline = milliseconds(200)});
+  EXPECT_FALSE(client.GetHFSVolumeName(0));
+  EXPECT_FALSE(client.GetHFSVolumeName(0));
+  sigset_t pending;
+  sigpending(&pending);
+  EXPECT_TRUE(sigismember(&pending, SIGPIPE));
+  const timespec atOnce{};
+  sigtimedwait(&brokenPipe, nullptr, &atOnce);
+  pthread_sigmask(SIG_SETMASK, &before, nullptr);
+}
+
 TEST(Client, AThousandRestartsLeaveNeitherProcessNorDescriptor) {
   const test::MortalService service;
   Client client({.service = service.Path()});
