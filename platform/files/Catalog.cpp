@@ -88,9 +88,7 @@ VolumePointer VolumeOf(const Place& place) {
   return MountTable::OfThisProcess().OfItem(place.item, place.path);
 }
 
-// Whether an item is on a volume that was asked for just now.
 bool IsOnVolume(const VolumePointer& volume, const Place& place) {
-  if (volume->IsMountedAs(place.item.mount)) return true;
   const VolumePointer found = VolumeOf(place);
   return found && found->Number() == volume->Number();
 }
@@ -219,11 +217,6 @@ void RememberPlace(const Place& place) {
 }
 
 std::optional<Place> PlaceAt(const std::string& path) {
-  const auto item = IsSpelledOut(path) ? ReadItem(AT_FDCWD, path.c_str()) : std::nullopt;
-  return item && item->mount != kNoMount ? Place{path, *item} : CanonicalPlaceAt(path);
-}
-
-std::optional<Place> CanonicalPlaceAt(const std::string& path) {
   auto reached = Reach(path);
   const auto item = reached ? ReadItem(reached->descriptor.Get(), "") : std::nullopt;
   if (!item) return std::nullopt;
@@ -243,17 +236,7 @@ std::string FolderOf(const std::string& path) {
   return foundation::WithFolderMark(foundation::ParentPath(path), false);
 }
 
-std::optional<Place> FindPlace(const ItemReference& item) {
-  const std::string* const remembered = PlaceMemory::OfThisProcess().Recall(item);
-  const bool isKnown = remembered != nullptr && item.mount != kNoMount &&
-                       IsSpelledOut(*remembered) && IsAt(item, AT_FDCWD, remembered->c_str());
-  if (isKnown) return Place{*remembered, item};
-  auto path = FindCanonicalPath(item);
-  if (!path) return std::nullopt;
-  return Place{*std::move(path), item};
-}
-
-std::optional<std::string> FindCanonicalPath(const ItemReference& item) {
+std::optional<std::string> FindPlace(const ItemReference& item) {
   const std::string* const remembered = PlaceMemory::OfThisProcess().Recall(item);
   const std::string former = remembered == nullptr ? "" : *remembered;
   Path place = former.empty() ? std::nullopt : Verified(item, former);

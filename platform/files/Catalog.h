@@ -22,11 +22,8 @@ void RememberPlace(const ItemReference& item, std::string_view path);
 void RememberPlace(const Place& place);
 
 // The item at an absolute path, links on the way followed, one in the last place not. None when
-// there is none. One look as a rule.
+// there is none.
 std::optional<Place> PlaceAt(const std::string& path);
-
-// The same with the canonical path.
-std::optional<Place> CanonicalPlaceAt(const std::string& path);
 
 // The canonical path of a folder that a path leads to, all links followed.
 std::optional<std::string> RealPath(const std::string& path);
@@ -34,11 +31,8 @@ std::optional<std::string> RealPath(const std::string& path);
 // The folder that holds a path, which must not be "/".
 std::string FolderOf(const std::string& path);
 
-// Where this very item is now. None when it is gone or cannot be found with certainty.
-std::optional<Place> FindPlace(const ItemReference& item);
-
-// The same, its canonical path.
-std::optional<std::string> FindCanonicalPath(const ItemReference& item);
+// The path of this very item now. None when it is gone or cannot be found with certainty.
+std::optional<std::string> FindPlace(const ItemReference& item);
 
 // The item with a node id on a volume; with `folder` nothing but a folder. None when there is none
 // and when it is not certain which item that is.

@@ -27,10 +27,10 @@ constexpr std::size_t kLongestUnicodeName = 255;
 // The volume that an item counts to: its own, or for a file that is mounted alone and so is on
 // none, that of the folder that holds it.
 VolumePointer VolumeOfItem(const Place& item) {
-  auto volume = VolumeOf(item, nullptr);
+  auto volume = MountTable::OfThisProcess().OfItem(item.item, item.path);
   if (volume && volume->Root()) return volume;
   Folder folder;
-  return HoldingFolder(item, nullptr, folder) == noErr ? folder.volume : nullptr;
+  return HoldingFolder(item, folder) == noErr ? folder.volume : nullptr;
 }
 
 OSErr FillInfo(const Place& item, FSCatalogInfoBitmap whichInfo, FSCatalogInfo& info) {
@@ -43,9 +43,9 @@ OSErr FillInfo(const Place& item, FSCatalogInfoBitmap whichInfo, FSCatalogInfo& 
 }
 
 void FillName(const Place& item, HFSUniStr255& name) {
-  const VolumePointer volume = VolumeOf(item, nullptr);
-  std::u16string text = IsRootOf(volume, item)
-                            ? DecodeMacRoman(volume->Name())
+  const VolumePointer rootOf = VolumeOfRoot(item);
+  std::u16string text = rootOf
+                            ? DecodeMacRoman(rootOf->Name())
                             : ExchangeColonsAndSlashes(TextOfFileName(*LastComponent(item.path)));
   text.resize(std::min(text.size(), kLongestUnicodeName));
   name.length = static_cast<UInt16>(text.size());
@@ -54,10 +54,9 @@ void FillName(const Place& item, HFSUniStr255& name) {
 
 OSErr FillParent(const Place& item, FSRef& parent) {
   parent = {};
-  const VolumePointer volume = VolumeOf(item, nullptr);
-  if (IsRootOf(volume, item)) return noErr;
+  if (VolumeOfRoot(item)) return noErr;
   Folder folder;
-  const OSErr error = HoldingFolder(item, volume, folder);
+  const OSErr error = HoldingFolder(item, folder);
   if (error == noErr) parent = Pack(folder.place.item);
   return error;
 }
@@ -65,9 +64,10 @@ OSErr FillParent(const Place& item, FSRef& parent) {
 // The item of a reference and where it is now.
 OSErr PlaceOfReference(const FSRef* reference, Place& place) {
   const auto item = Unpack(reference);
-  auto found = item ? FindPlace(*item) : std::nullopt;
-  if (!found) return fnfErr;
-  place = *std::move(found);
+  if (!item) return fnfErr;
+  auto path = FindPlace(*item);
+  if (!path) return fnfErr;
+  place = {*std::move(path), *item};
   return noErr;
 }
 
@@ -153,7 +153,7 @@ OSErr PBGetCatInfoSync(CInfoPBPtr paramBlock) {
     UInt32 parentID = kParentOfRootID;
     if (id != kRootFolderID) {
       Folder holder;
-      if (const OSErr error = HoldingFolder(folder.place, folder.volume, holder)) return error;
+      if (const OSErr error = HoldingFolder(folder.place, holder)) return error;
       const auto found = HFSNameOf(holder, folder.place, kLongestStr255Name);
       if (!found) return fnfErr;
       name = *found;

@@ -49,18 +49,14 @@ OSErr OnTheWay(OSErr error) {
   return error;
 }
 
-// `known` is a volume asked for just now on which it may be, or null.
-OSErr UseAsFolder(const Place& place, const VolumePointer& known, Folder& folder) {
-  if (!S_ISDIR(place.item.type)) return dirNFErr;
-  folder = {VolumeOf(place, known), place};
-  return folder.volume && folder.volume->Root() ? noErr : nsvErr;
-}
-
 OSErr FolderAt(const std::string& path, Folder& folder) {
   const auto real = RealPath(path);
   if (!real) return OnTheWay(ErrorOfSystem());
-  const auto place = PlaceAt(*real);
-  return place ? UseAsFolder(*place, nullptr, folder) : static_cast<OSErr>(dirNFErr);
+  auto place = PlaceAt(*real);
+  if (!place || !S_ISDIR(place->item.type)) return dirNFErr;
+  folder.place = *std::move(place);
+  folder.volume = MountTable::OfThisProcess().OfItem(folder.place.item, folder.place.path);
+  return folder.volume && folder.volume->Root() ? noErr : nsvErr;
 }
 
 OSErr RootOf(const VolumePointer& volume, Folder& folder) {
@@ -79,17 +75,16 @@ OSErr StartingFolder(SInt16 vRefNum, SInt32 dirID, std::string_view volumeName, 
 // Into the folder with a name, a link to it followed, or with an empty name to the folder above.
 OSErr Step(std::string_view name, Folder& folder) {
   if (name.empty()) {
-    if (IsRootOf(folder.volume, folder.place)) return dirNFErr;
+    if (VolumeOfRoot(folder.place)) return dirNFErr;
     Folder above;
-    const OSErr error = HoldingFolder(folder.place, folder.volume, above);
+    const OSErr error = HoldingFolder(folder.place, above);
     if (error == noErr) folder = above;
     return OnTheWay(error);
   }
   Place item;
   const OSErr error = LookUpHFSName(folder, name, item);
   if (error != noErr) return OnTheWay(error);
-  if (S_ISLNK(item.item.type)) return FolderAt(item.path, folder);
-  return UseAsFolder(item, folder.volume, folder);
+  return FolderAt(item.path, folder);
 }
 
 OSErr SpecOfName(const Folder& folder, std::string_view name, FSSpec& spec) {
@@ -97,7 +92,7 @@ OSErr SpecOfName(const Folder& folder, std::string_view name, FSSpec& spec) {
   const OSErr error = LookUpHFSName(folder, name, item);
   if (error == noErr) {
     RememberPlace(item);
-    return SpecOfPlace(item, folder, spec);
+    return SpecOfPlace(item, spec);
   }
   if (error != fnfErr) return error;
   if (name.size() > kLongestSpecName || SpellHFSName(name).precomposed.empty()) return bdNamErr;

@@ -35,9 +35,8 @@ struct ItemReference {
 };
 static_assert(sizeof(ItemReference) == sizeof(FSRef));
 
-// An existing item and where it is: an absolute path without ".", ".." and empty components, and
-// the item itself not followed when it is a link. Links can be on the way, unless the kernel does
-// not tell the item's mount: then, and where it says so, the path is canonical, without any.
+// An existing item and where it is: the canonical absolute path, no links on the way, and the item
+// itself not followed when it is one.
 struct Place {
   std::string path;
   ItemReference item;

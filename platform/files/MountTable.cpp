@@ -91,17 +91,9 @@ Volume::Volume(VolumeNumber number, std::vector<Mount> mounts, std::vector<std::
   for (const Mount& mount : mMounts) mMountPoints.push_back(mount.mountPoint);
 }
 
-std::vector<Mount>::const_iterator Volume::MountWithID(int id) const {
-  return std::find_if(mMounts.begin(), mMounts.end(),
-                      [id](const Mount& candidate) { return candidate.id == id; });
-}
-
-bool Volume::IsMountedAs(int mount) const {
-  return MountWithID(mount) != mMounts.end();
-}
-
 std::vector<std::string> Volume::PathsOf(const std::string& path, int mount) const {
-  const auto own = MountWithID(mount);
+  const auto own = std::find_if(mMounts.begin(), mMounts.end(),
+                                [mount](const Mount& candidate) { return candidate.id == mount; });
   if (own == mMounts.end() || !IsWithin(path, own->mountPoint)) return {path};
   const std::string inside = Below(own->root, BehindFolder(path, own->mountPoint));
   std::vector<std::string> paths;

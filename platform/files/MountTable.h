@@ -44,9 +44,6 @@ class Volume {
   // Where something is mounted on the volume, so that what lies below is hidden there.
   const std::vector<std::string>& Covers() const { return mCovers; }
 
-  // Whether that is the id of one of its mounts.
-  bool IsMountedAs(int mount) const;
-
   // Everywhere that the volume shows the item with that path on one of its mounts, the first mount
   // first, whatever else is mounted there. The path alone for another mount.
   std::vector<std::string> PathsOf(const std::string& path, int mount) const;
@@ -66,8 +63,6 @@ class Volume {
   const std::string& Name() const;
 
  private:
-  std::vector<Mount>::const_iterator MountWithID(int id) const;
-
   VolumeNumber mNumber;
   std::vector<Mount> mMounts;
   std::vector<std::string> mMountPoints;
@@ -106,8 +101,7 @@ class MountTable {
 
   // The volume that an item is on: by the mount that the kernel reports for it, where it reports
   // none by the device, else by the mount point that `path` begins with. Null for an item of a
-  // kernel interface. REQUIRES: `path` is the item's path, canonical where the kernel reports no
-  // mount.
+  // kernel interface. REQUIRES: `path` is the item's canonical path.
   VolumePointer OfItem(const ItemReference& item, std::string_view path);
 
   // The volume at or below whose MountPoint() a path lies by its spelling; of several the one with

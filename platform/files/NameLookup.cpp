@@ -62,10 +62,8 @@ bool HasOwnName(const Folder& folder, std::string_view linuxName, const ItemRefe
 
 // The folder at all its places on the volume, when in one of them something is mounted, so that one
 // name can be that of several items. The names of their own count in the first place, where every
-// process sees the folder alike; what cannot be seen there has short forms. All at canonical paths.
-std::vector<Folder> ViewsOf(const Folder& found) {
-  Folder folder = found;
-  if (auto canonical = CanonicalPlaceAt(found.place.path)) folder.place = *std::move(canonical);
+// process sees the folder alike; what cannot be seen there has short forms.
+std::vector<Folder> ViewsOf(const Folder& folder) {
   std::vector<Folder> views;
   const MountTable& table = MountTable::OfThisProcess();
   const auto paths = folder.volume->PathsOf(folder.place.path, folder.place.item.mount);
@@ -73,18 +71,13 @@ std::vector<Folder> ViewsOf(const Folder& found) {
       paths.begin(), paths.end(), [&](const auto& path) { return table.HoldsMountPoint(path); });
   if (paths.size() > 1 && hidesSomething) {
     for (const std::string& path : paths) {
-      auto place = CanonicalPlaceAt(path);
+      auto place = PlaceAt(path);
       if (!place || !AreEqual(place->item, folder.place.item)) continue;
       views.push_back({folder.volume, *std::move(place)});
     }
   }
   if (views.empty()) views.push_back(folder);
   return views;
-}
-
-// Whether that is certain without a look at the folder's places.
-bool HasOneView(const Folder& folder) {
-  return folder.volume->MountPoints().size() == 1;
 }
 
 // --- Short forms ------------------------------------------------------------------------------
@@ -107,8 +100,8 @@ bool MayHaveID(const Folder& folder, const dirent& entry, std::uint32_t id, bool
 // One look-up of a short form.
 class ShortFormSearch {
  public:
-  ShortFormSearch(std::vector<Folder> views, std::string_view name)
-      : mViews(std::move(views)), mName(name), mReadings(ReadShortHFSName(name)) {}
+  ShortFormSearch(const std::vector<Folder>& views, std::string_view name)
+      : mViews(views), mName(name), mReadings(ReadShortHFSName(name)) {}
 
   OSErr Find(Place& item) {
     if (mReadings.empty() || !CanStandForOne()) return fnfErr;
@@ -170,7 +163,7 @@ class ShortFormSearch {
     if (!isKnown && IsShortFormOf(parts, linuxName, item.item)) mFound.push_back(std::move(item));
   }
 
-  std::vector<Folder> mViews;
+  const std::vector<Folder>& mViews;
   std::string_view mName;
   std::vector<ShortNameParts> mReadings;
   std::vector<Place> mFound;  // different items
@@ -197,20 +190,17 @@ std::uint32_t Folder::ID() const {
 }
 
 OSErr LookUpHFSName(const Folder& folder, std::string_view name, Place& item) {
-  if (!HasOneView(folder)) return LookUpInViews(ViewsOf(folder), name, item);
-  const OSErr result = FindByOwnName(folder, name, item);
-  if (result != fnfErr || ReadShortHFSName(name).empty()) return result;
-  return ShortFormSearch(ViewsOf(folder), name).Find(item);
+  return LookUpInViews(ViewsOf(folder), name, item);
 }
 
 std::optional<std::string> HFSNameOf(const Folder& folder, const Place& item, std::size_t limit) {
   const std::string linuxName(*foundation::LastComponent(item.path));
-  auto plain = PlainHFSName(linuxName, limit);
-  const bool isUnmistakable = plain && SpellHFSName(*plain).precomposed == linuxName;
-  if (isUnmistakable && HasOneView(folder)) return plain;
   const std::vector<Folder> views = ViewsOf(folder);
-  if (isUnmistakable && views.size() == 1) return plain;
-  if (plain && HasOwnName(views.front(), linuxName, item.item, limit)) return plain;
+  auto plain = PlainHFSName(linuxName, limit);
+  if (plain) {
+    const bool isUnmistakable = views.size() == 1 && SpellHFSName(*plain).precomposed == linuxName;
+    if (isUnmistakable || HasOwnName(views.front(), linuxName, item.item, limit)) return plain;
+  }
   const std::uint32_t id = NodeIDOf(item.item, *folder.volume->Root());
   for (std::size_t marks = 1; marks <= kMostMarks; ++marks) {
     std::string name = ShortHFSName(linuxName, id, marks);

@@ -30,7 +30,7 @@ CFURLRef CFURLCreateFromFSRef(CFAllocatorRef, const FSRef* item) {
   return OrZero([&]() -> CFURLRef {
     const auto wanted = Unpack(item);
     if (!wanted) return nullptr;
-    const auto path = FindCanonicalPath(*wanted);
+    const auto path = FindPlace(*wanted);
     return path ? CreateUrlOfPath(*path, S_ISDIR(wanted->type)) : nullptr;
   });
 }

@@ -41,7 +41,7 @@ inline FSRef ReferenceTo(const std::string& path) {
 
 inline std::string PathOf(const FSRef& reference) {
   const auto item = Unpack(&reference);
-  const auto path = item ? FindCanonicalPath(*item) : std::nullopt;
+  const auto path = item ? FindPlace(*item) : std::nullopt;
   return path.value_or("(none)");
 }
 

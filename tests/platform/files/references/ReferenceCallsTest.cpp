@@ -243,7 +243,7 @@ TEST_F(AReferenceToAnItem, WithoutAHandleFollowsItsRename) {
   item->handle = files::FileHandle{};
   files::RememberPlace(*item, PathOf("x"));
   Move("x", "a/y");
-  EXPECT_EQ(files::FindCanonicalPath(*item), PathOf("a/y"));
+  EXPECT_EQ(files::FindPlace(*item), PathOf("a/y"));
 }
 
 // On a volume of its own, so that looking for what is gone comes to an end soon.
