@@ -82,18 +82,20 @@ def _own(pipe: IO[bytes]) -> int:
 
 
 def _write(descriptor: int, data: bytearray) -> int:
-    """Writes what there is room for. A SIGPIPE of it does not reach the program."""
-    blocked = signal.pthread_sigmask(signal.SIG_BLOCK, {signal.SIGPIPE})
+    """Writes what there is room for. A SIGPIPE of it does not reach a program that has none pending."""
+    before = signal.pthread_sigmask(signal.SIG_BLOCK, ())
     try:
+        signal.pthread_sigmask(signal.SIG_BLOCK, {signal.SIGPIPE})
+        was_pending = signal.SIGPIPE in signal.sigpending()
         return os.write(descriptor, data)
     except BlockingIOError:
         return 0
     except BrokenPipeError:
-        if signal.SIGPIPE not in blocked:
+        if not was_pending:
             signal.sigtimedwait({signal.SIGPIPE}, 0)
         return len(data)  # nobody reads it; the end of the service's output is what counts
     finally:
-        signal.pthread_sigmask(signal.SIG_SETMASK, blocked)
+        signal.pthread_sigmask(signal.SIG_SETMASK, before)
 
 
 def _find_service() -> str:
@@ -178,7 +180,8 @@ class Client:
 
         try:
             for each in requests:
-                waiting.append(self._submit(each))
+                waiting.append(_Waiting(each))
+                self._submit(waiting[-1])
                 size += len(each.payload or b"")
                 while len(waiting) >= MOST_REQUESTS_UNDER_WAY or size >= MOST_BYTES_UNDER_WAY:
                     yield first_answer()
@@ -188,13 +191,16 @@ class Client:
             for rest in waiting:  # nobody wants these answers any more
                 rest.answer = rest.request.otherwise
 
-    def _submit(self, request: Request[T]) -> _Waiting[T]:
-        waiting = _Waiting(request)
-        if request.payload is not None:
-            self._silent = self._silent or not self._pending
+    def _submit(self, waiting: _Waiting[Any]) -> None:
+        if waiting.request.payload is None:
+            return
+        self._silent = self._silent or not self._pending
+        try:
             self._pending.append(waiting)
-            self._outgoing += request.payload
-        return waiting
+            self._outgoing += waiting.request.payload
+        except BaseException:  # what waits and what is written may differ; the next service gets both anew
+            self._stop()
+            raise
 
     def _await(self, waiting: _Waiting[Any]) -> None:
         """Exchanges bytes until waiting has its answer or its error."""
