@@ -16,7 +16,6 @@ class ServiceProcess {
   static Result<ServiceProcess> Start(const std::string& path);
 
   ServiceProcess(ServiceProcess&& other) noexcept;
-  ServiceProcess& operator=(ServiceProcess&& other) noexcept;
   // Closes the pipes, which ends the service as soon as it reads, and waits for it. A service that
   // does not end by itself within a second is killed.
   ~ServiceProcess() { End(kTimeToEnd); }
