@@ -127,9 +127,9 @@ class Client:
     deadline: seconds that the service has for each answer.
 
     A request raises ServiceError when the service cannot be started, has ended, misses the deadline or answers
-    what the protocol does not know; the next request starts another one. Paths are absolute POSIX paths, and
-    answered as str (os.fsdecode). A str for an HFS name or path is sent in Mac Roman, and answers are bytes in it
-    (hfs_name_to_str). What does not exist is None.
+    what the protocol does not know; the next request starts another one. Paths are absolute POSIX paths (what is
+    answered to others is not to be relied on), and answered as str (os.fsdecode). A str for an HFS name or path is
+    sent in Mac Roman, and answers are bytes in it (hfs_name_to_str). What does not exist is None.
     """
 
     def __init__(self, service: str | os.PathLike[str] | None = None, deadline: float = 10.0) -> None:
@@ -314,7 +314,10 @@ class Client:
         return self.ask(request.add_hfs_name(folder, name))
 
     def get_fsspec(self, path: Path) -> FSSpec | None:
-        """The record of an item, also of a new one in an existing folder."""
+        """The record of an item, also of a new one in an existing folder.
+
+        The record of a new item leads nowhere when a file or a link, also one to a folder, is in front of its name.
+        """
         return self.ask(request.get_fsspec(path))
 
     def set_file_ref_from_fsspec_data(self, spec: FSSpec) -> str | None:
