@@ -1,12 +1,12 @@
 // One question to the service, ready to be sent, and how its answer reads. A value: it can be made
 // anywhere, kept, and asked more than once, by Client::Ask or in a Batch.
 //
-// POSIX paths are absolute: what is answered to others is not to be relied on. "~" or "~user" at the
-// beginning of one stands for the home folder of the service's user, or of that user.
+// POSIX paths are absolute: what is answered to others is not to be relied on. "~" or "~user" at
+// the beginning of one stands for the home folder of the service's user, or of that user.
 //
-// What the service cannot be asked (a NUL within a text other than the name of a record, a name or
-// path longer than the protocol or an HFS name can be) is not sent: such a request is answered at
-// once, with what each function says.
+// What the service cannot be asked (a NUL within a text, but for the name in SetFileRefFromFSSpec;
+// a name or path longer than the protocol or an HFS name can be) is not sent: such a request is
+// answered at once, with what each function says.
 #pragma once
 
 #include <tallowmere/Types.h>
