@@ -17,9 +17,6 @@
 namespace tallowmere::cli {
 namespace {
 
-// Without privilege a request can take a pass over a whole volume.
-constexpr auto kDeadline = std::chrono::minutes(10);
-
 bool IsSame(const struct stat& first, const struct stat& second) {
   return first.st_dev == second.st_dev && first.st_ino == second.st_ino;
 }
@@ -32,7 +29,8 @@ bool IsAt(const std::string& path, const struct stat& item) {
 // Asks one service for the record of each item and another one for the path of that record.
 class Census {
  public:
-  Census(Client records, Client paths) : mRecords(std::move(records)), mPaths(std::move(paths)) {}
+  Census(const ClientOptions& options, bool isJson)
+      : mRecords(options), mPaths(options), mIsJson(isJson) {}
 
   // Whether the services still answer.
   bool Count(const std::string& path, const struct stat& item, double done) {
@@ -62,8 +60,12 @@ class Census {
     mBar.Hide();
     if (mFailure) return Complain(mFailure->message);
     const std::uint64_t missing = mItems - mBack - mVanished;
-    std::cout << mItems << " items, " << mBack << " came back, " << missing << " did not, "
-              << mVanished << " vanished meanwhile, " << mLeftOut << " left out\n";
+    if (mIsJson) {
+      PrintFiguresAsJson(missing);
+    } else {
+      std::cout << mItems << " items, " << mBack << " came back, " << missing << " did not, "
+                << mVanished << " vanished meanwhile, " << mLeftOut << " left out\n";
+    }
     return FinishOutput(missing == 0 ? 0 : kFailed);
   }
 
@@ -87,11 +89,29 @@ class Census {
 
   void Print(const std::string& path, const std::string& remark) {
     mBar.Hide();
-    std::cout << Printable(path) << ": " << Printable(remark) << '\n';
+    if (!mIsJson) {
+      std::cout << Printable(path) << ": " << Printable(remark) << '\n';
+      return;
+    }
+    Json json;
+    Put(json, "path", path);
+    Put(json, "error", remark);
+    std::cout << json.dump() << '\n';
+  }
+
+  void PrintFiguresAsJson(std::uint64_t missing) const {
+    Json json;
+    json["items"] = mItems;
+    json["came_back"] = mBack;
+    json["missing"] = missing;
+    json["vanished"] = mVanished;
+    json["left_out"] = mLeftOut;
+    std::cout << json.dump() << '\n';
   }
 
   Client mRecords;
   Client mPaths;
+  bool mIsJson;
   std::optional<Error> mFailure;
   ProgressBar mBar;
   std::uint64_t mItems = 0;
@@ -102,16 +122,11 @@ class Census {
 
 }  // namespace
 
-int TakeCensus(ClientOptions options, const std::string& folder) {
-  options.deadline = kDeadline;
+int TakeCensus(const ClientOptions& options, bool isJson, const std::string& folder) {
   const auto path = files::RealPath(folder);
   if (!path) return Complain(folder + ": " + std::generic_category().message(errno));
-  auto records = Client::Start(options);
-  if (!records) return Complain(records.Failure().message);
-  auto paths = Client::Start(options);
-  if (!paths) return Complain(paths.Failure().message);
 
-  Census census(*std::move(records), *std::move(paths));
+  Census census(options, isJson);
   const TreeVisitor visitor{
       [&](const std::string& item, const struct stat& status, double done) {
         return census.Count(item, status, done);

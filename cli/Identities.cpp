@@ -1,24 +1,20 @@
-#include <sys/stat.h>
-
-#include <filesystem>
 #include <iostream>
 #include <utility>
 
-#include "cli/Commands.h"
+#include "cli/Conversion.h"
+#include "cli/Items.h"
 #include "cli/Output.h"
+#include "cli/Paths.h"
+#include "cli/Reasons.h"
+#include "cli/Records.h"
 #include "cli/Table.h"
 #include "cli/Text.h"
 
 namespace tallowmere::cli {
 namespace {
 
-bool IsFolder(const std::string& path) {
-  struct stat about {};
-  return lstat(path.c_str(), &about) == 0 && S_ISDIR(about.st_mode);
-}
-
 struct Identity {
-  FileSpec spec;
+  FSSpec spec;
   std::string hfsPath;
   std::optional<std::string> wayBack;  // where the record leads
 };
@@ -37,31 +33,54 @@ Result<std::optional<Identity>> Identify(Client& client, const std::string& path
   return std::optional(std::move(identity));
 }
 
+void Fill(Json& json, const Identity& identity) {
+  Put(json, identity.spec);
+  json["hfs_path"] = Utf8OfHFSName(identity.hfsPath);
+  if (identity.wayBack) {
+    Put(json, "way_back", *identity.wayBack);
+  } else {
+    json["way_back"] = nullptr;
+  }
+}
+
+std::vector<std::string> RowOf(const Identity& identity) {
+  const auto& [spec, hfsPath, wayBack] = identity;
+  return {std::to_string(spec.vRefNum), std::to_string(spec.parID),
+          Printable(Utf8OfHFSName(spec.name)), Printable(Utf8OfHFSName(hfsPath)),
+          wayBack ? Printable(*wayBack) : "none"};
+}
+
 }  // namespace
 
-int PrintIdentities(const ClientOptions& options, const std::vector<std::string>& paths) {
-  auto client = Client::Start(options);
-  if (!client) return Complain(client.Failure().message);
+int PrintIdentities(const ItemsToAsk& paths) {
+  Client client(paths.client);
+  if (const auto error = WhyItDoesNotAnswer(client)) return Complain(*error);
+  Report report(paths.format, "path");
   Table table({{"vRefNum", Table::Align::kRight},
                {"parent id", Table::Align::kRight},
                {"HFS name"},
                {"HFS path"},
                {"way back"}});
-  int status = 0;
-  for (const std::string& given : paths) {
-    const auto identity = Identify(*client, std::filesystem::absolute(given));
-    if (!identity) return Complain(identity.Failure().message);
-    if (!*identity) {
-      status = Complain(given + ": there is no such folder on any volume");
+  Items items(paths.items, paths.format.Separator());
+  while (const auto item = report.GoesOn() ? items.Next([] {}) : std::nullopt) {
+    if (item->empty()) {
+      report.Fail(*item, kEmptyItem);
       continue;
     }
-    const auto& [spec, hfsPath, wayBack] = **identity;
-    table.Add({std::to_string(spec.volume), std::to_string(spec.parentID),
-               Printable(Utf8OfHFSName(spec.name)), Printable(Utf8OfHFSName(hfsPath)),
-               wayBack ? Printable(*wayBack) : "none"});
+    const std::string path = AbsolutePath(*item);
+    const auto identity = Identify(client, path);
+    if (!identity) {
+      report.Fail(*item, identity.Failure().message);
+    } else if (!*identity) {
+      report.Fail(*item, WhyNoRecord(path));
+    } else if (paths.format.isJson) {
+      report.Answer(*item, "", [&](Json& json) { Fill(json, **identity); });
+    } else {
+      table.Add(RowOf(**identity));
+    }
   }
-  table.Print(std::cout);
-  return FinishOutput(status);
+  if (!paths.format.isJson && !table.IsEmpty()) table.Print(std::cout);
+  return report.Finish();
 }
 
 }  // namespace tallowmere::cli

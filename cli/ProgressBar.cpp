@@ -6,10 +6,13 @@
 #include <iomanip>
 #include <iostream>
 
+#include "cli/Output.h"
+
 namespace tallowmere::cli {
 namespace {
 
 constexpr int kWidth = 40;  // characters
+constexpr auto kFirstPause = std::chrono::milliseconds(500);
 constexpr auto kPause = std::chrono::milliseconds(200);
 
 // Back to the first column, and the line erased from there (ECMA-48, "EL").
@@ -17,18 +20,24 @@ constexpr const char* kStartAgain = "\r\x1B[K";
 
 }  // namespace
 
-ProgressBar::ProgressBar() : mIsTerminal(isatty(STDERR_FILENO) == 1) {}
+ProgressBar::ProgressBar()
+    : mIsTerminal(IsAbleTerminal(STDERR_FILENO)),
+      mNext(std::chrono::steady_clock::now() + kFirstPause) {}
 
-void ProgressBar::Show(double done, const std::string& text) {
+void ProgressBar::Show(std::optional<double> done, const std::string& text) {
   if (!mIsTerminal) return;
   const auto now = std::chrono::steady_clock::now();
   if (now < mNext) return;
   mNext = now + kPause;
   mIsShown = true;
-  done = std::clamp(done, 0.0, 1.0);
-  const auto full = static_cast<std::size_t>(done * kWidth);
-  std::cerr << kStartAgain << '[' << std::string(full, '#') << std::string(kWidth - full, '.')
-            << "] " << std::setw(3) << static_cast<int>(done * 100) << " %  " << text << std::flush;
+  std::cerr << kStartAgain;
+  if (done) {
+    const double part = std::clamp(*done, 0.0, 1.0);
+    const auto full = static_cast<std::size_t>(part * kWidth);
+    std::cerr << '[' << std::string(full, '#') << std::string(kWidth - full, '.') << "] "
+              << std::setw(3) << static_cast<int>(part * 100) << " %  ";
+  }
+  std::cerr << text << std::flush;
 }
 
 void ProgressBar::Hide() {

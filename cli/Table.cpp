@@ -1,9 +1,12 @@
 #include "cli/Table.h"
 
+#include <unistd.h>
+
 #include <algorithm>
 #include <ostream>
 #include <utility>
 
+#include "cli/Output.h"
 #include "cli/Text.h"
 
 namespace tallowmere::cli {
@@ -24,11 +27,11 @@ void Table::Print(std::ostream& out) const {
   std::vector<std::string> titles;
   titles.reserve(mColumns.size());
   for (const Column& column : mColumns) titles.push_back(column.title);
-  PrintRow(out, titles);
-  for (const auto& row : mRows) PrintRow(out, row);
+  out << Styled(LineOf(titles), Style::kBold, STDOUT_FILENO) << '\n';
+  for (const auto& row : mRows) out << LineOf(row) << '\n';
 }
 
-void Table::PrintRow(std::ostream& out, const std::vector<std::string>& row) const {
+std::string Table::LineOf(const std::vector<std::string>& row) const {
   std::string line;
   for (std::size_t i = 0; i < row.size(); ++i) {
     const std::string padding(mWidths[i] - CharacterCount(row[i]), ' ');
@@ -36,7 +39,7 @@ void Table::PrintRow(std::ostream& out, const std::vector<std::string>& row) con
     line += (i == 0 ? "" : "  ") + (isRight ? padding + row[i] : row[i] + padding);
   }
   line.erase(line.find_last_not_of(' ') + 1);
-  out << line << '\n';
+  return line;
 }
 
 }  // namespace tallowmere::cli

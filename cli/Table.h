@@ -20,11 +20,13 @@ class Table {
   // As many texts as there are columns, fit for a terminal.
   void Add(std::vector<std::string> row);
 
-  // Nothing is padded at the end of a line.
+  bool IsEmpty() const { return mRows.empty(); }
+
+  // Titles are bold on a terminal. Nothing is padded at the end of a line.
   void Print(std::ostream& out) const;
 
  private:
-  void PrintRow(std::ostream& out, const std::vector<std::string>& row) const;
+  std::string LineOf(const std::vector<std::string>& row) const;
 
   std::vector<Column> mColumns;
   std::vector<std::size_t> mWidths;  // in characters

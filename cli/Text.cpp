@@ -3,11 +3,12 @@
 #include <algorithm>
 
 #include "foundation/FileNameText.h"
-#include "foundation/MacRoman.h"
 #include "foundation/Utf16.h"
 
 namespace tallowmere::cli {
 namespace {
+
+constexpr char16_t kReplacement = 0xFFFD;
 
 // C0 and C1 control characters and DEL, each of one UTF-16 unit.
 bool IsControl(char16_t unit) {
@@ -29,11 +30,6 @@ void AppendOctal(std::string_view bytes, std::string& text) {
 
 }  // namespace
 
-std::string Utf8OfHFSName(std::string_view name) {
-  // No Mac Roman character is a surrogate, so there always is one.
-  return foundation::FileNameOfText(foundation::DecodeMacRoman(name)).value_or("");
-}
-
 std::string Printable(std::string_view text) {
   std::string printable;
   const std::u16string units = foundation::TextOfFileName(text);
@@ -49,6 +45,14 @@ std::string Printable(std::string_view text) {
     }
   }
   return printable;
+}
+
+std::string Utf8OfAnyBytes(std::string_view bytes) {
+  std::u16string text = foundation::TextOfFileName(bytes);
+  std::replace_if(
+      text.begin(), text.end(), [](char16_t unit) { return foundation::IsEscapedByte(unit); },
+      kReplacement);
+  return foundation::FileNameOfText(text).value_or("");
 }
 
 std::size_t CharacterCount(std::string_view text) {

@@ -17,8 +17,10 @@
 namespace tallowmere {
 namespace {
 
-constexpr std::chrono::seconds kTimeToEnd{1};
-constexpr std::chrono::milliseconds kLongestPoll{60'000};  // a later deadline takes several
+using std::chrono::milliseconds;
+using std::chrono::steady_clock;
+
+constexpr milliseconds kLongestPoll{60'000};  // a longer wait takes several
 
 std::string MessageOf(int errorNumber) {
   return std::generic_category().message(errorNumber);
@@ -103,26 +105,15 @@ class WithoutBrokenPipeSignal {
   bool mWasPending;
 };
 
-Error Ended() {
-  return {"the service ended before it answered"};
-}
-
-// For poll: at least 0, at most kLongestPoll.
-int MillisecondsUntil(Deadline deadline) {
-  const auto left =
-      std::chrono::ceil<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now());
-  return static_cast<int>(std::clamp(left, std::chrono::milliseconds(0), kLongestPoll).count());
-}
-
-// Waits until the descriptor can be read or written, or its other end is closed.
-Result<std::monostate> WaitFor(int descriptor, short events, Deadline deadline) {
-  while (true) {
-    const int left = MillisecondsUntil(deadline);
-    if (left == 0) return Error{"the service did not answer in time"};
-    pollfd awaited{descriptor, events, 0};
-    const int ready = poll(&awaited, 1, left);
-    if (ready > 0) return std::monostate{};
-    if (ready < 0 && errno != EINTR) return Error{"poll failed: " + MessageOf(errno)};
+// Waits until the watched process has ended, at most that long.
+void AwaitEnd(int watch, milliseconds patience) {
+  const auto until = steady_clock::now() + patience;
+  const auto left = [until] {
+    const auto time = std::chrono::ceil<milliseconds>(until - steady_clock::now());
+    return static_cast<int>(std::max(time, milliseconds(0)).count());
+  };
+  pollfd ended{watch, POLLIN, 0};
+  while (poll(&ended, 1, left()) < 0 && errno == EINTR) {
   }
 }
 
@@ -144,87 +135,66 @@ Result<ServiceProcess> ServiceProcess::Start(const std::string& path) {
     return Error{"the service " + path + " could not be started: " + MessageOf(error)};
   }
   int watch = static_cast<int>(syscall(SYS_pidfd_open, process, 0));
+  // A process of which there is nothing left has been waited for by somebody else in this program,
+  // who ignores the signal of a child's end, say. Its pipes tell that it has ended.
+  if (watch < 0 && errno != ESRCH) {
+    const int error = errno;
+    kill(process, SIGKILL);
+    while (waitpid(process, nullptr, 0) < 0 && errno == EINTR) {
+    }
+    return Error{"the service could not be watched: " + MessageOf(error)};
+  }
   if (watch >= 0) MoveUp(watch);
-  return ServiceProcess(process, watch, std::exchange(requests.writeEnd, -1),
+  return ServiceProcess(watch, std::exchange(requests.writeEnd, -1),
                         std::exchange(responses.readEnd, -1));
 }
 
-ServiceProcess::ServiceProcess(pid_t process, int watch, int requests, int responses)
-    : mProcess(process), mWatch(watch), mRequests(requests), mResponses(responses) {}
+ServiceProcess::ServiceProcess(int watch, int requests, int responses)
+    : mOwner(getpid()), mWatch(watch), mRequests(requests), mResponses(responses) {}
 
 ServiceProcess::ServiceProcess(ServiceProcess&& other) noexcept
-    : mProcess(std::exchange(other.mProcess, -1)),
+    : mOwner(other.mOwner),
       mWatch(std::exchange(other.mWatch, -1)),
       mRequests(std::exchange(other.mRequests, -1)),
-      mResponses(std::exchange(other.mResponses, -1)),
-      mReceived(std::move(other.mReceived)) {}
+      mResponses(std::exchange(other.mResponses, -1)) {}
 
-ServiceProcess& ServiceProcess::operator=(ServiceProcess&& other) noexcept {
-  if (this != &other) {
-    End();
-    mProcess = std::exchange(other.mProcess, -1);
-    mWatch = std::exchange(other.mWatch, -1);
-    mRequests = std::exchange(other.mRequests, -1);
-    mResponses = std::exchange(other.mResponses, -1);
-    mReceived = std::move(other.mReceived);
-  }
-  return *this;
-}
-
-ServiceProcess::~ServiceProcess() {
-  End();
-}
-
-// Without a watch the process has been waited for by somebody else in this program (who ignores the
-// signal of a child's end, say), and its id may be another's by now.
-void ServiceProcess::End() {
+// The process is known by its watch alone: its id may be another's by now.
+void ServiceProcess::End(std::chrono::milliseconds patience) {
   CloseIfOpen(mRequests);
   CloseIfOpen(mResponses);
-  if (mWatch >= 0) {
-    pollfd ended{mWatch, POLLIN, 0};
-    const auto deadline = std::chrono::steady_clock::now() + kTimeToEnd;
-    while (poll(&ended, 1, MillisecondsUntil(deadline)) < 0 && errno == EINTR) {
-    }
+  if (mWatch >= 0 && mOwner == getpid()) {
+    AwaitEnd(mWatch, patience);
     syscall(SYS_pidfd_send_signal, mWatch, SIGKILL, nullptr, 0);
-    while (waitpid(mProcess, nullptr, 0) < 0 && errno == EINTR) {
+    siginfo_t ignored;
+    while (waitid(P_PIDFD, static_cast<id_t>(mWatch), &ignored, WEXITED) < 0 && errno == EINTR) {
     }
   }
   CloseIfOpen(mWatch);
-  mProcess = -1;
 }
 
-Result<std::monostate> ServiceProcess::Send(std::string_view bytes, Deadline deadline) {
+Result<std::size_t> ServiceProcess::Write(std::string_view bytes) {
+  if (mRequests < 0) return std::size_t{0};
   const WithoutBrokenPipeSignal guard;
-  while (!bytes.empty()) {
-    const ssize_t sent = write(mRequests, bytes.data(), bytes.size());
-    if (sent >= 0) {
-      bytes.remove_prefix(static_cast<std::size_t>(sent));
-    } else if (WouldBlock(errno)) {
-      if (auto ready = WaitFor(mRequests, POLLOUT, deadline); !ready) return ready;
-    } else {
-      return errno == EPIPE ? Ended() : Error{"writing failed: " + MessageOf(errno)};
-    }
-  }
-  return std::monostate{};
+  const ssize_t sent = write(mRequests, bytes.data(), bytes.size());
+  if (sent >= 0) return static_cast<std::size_t>(sent);
+  if (errno != EPIPE && !WouldBlock(errno)) return Error{"writing failed: " + MessageOf(errno)};
+  if (errno == EPIPE) CloseIfOpen(mRequests);
+  return std::size_t{0};
 }
 
-Result<std::string> ServiceProcess::Receive(std::size_t size, Deadline deadline) {
-  while (mReceived.size() < size) {
-    std::array<char, 4096> piece;
-    const ssize_t got = read(mResponses, piece.data(), piece.size());
-    if (got > 0) {
-      mReceived.append(piece.data(), static_cast<std::size_t>(got));
-    } else if (got == 0) {
-      return Ended();
-    } else if (WouldBlock(errno)) {
-      if (auto ready = WaitFor(mResponses, POLLIN, deadline); !ready) return ready.Failure();
-    } else {
-      return Error{"reading failed: " + MessageOf(errno)};
-    }
-  }
-  std::string bytes = mReceived.substr(0, size);
-  mReceived.erase(0, size);
-  return bytes;
+Result<std::size_t> ServiceProcess::Read(char* bytes, std::size_t size) {
+  const ssize_t got = read(mResponses, bytes, size);
+  if (got > 0) return static_cast<std::size_t>(got);
+  if (got == 0) return Error{"the service ended before it answered"};
+  if (!WouldBlock(errno)) return Error{"reading failed: " + MessageOf(errno)};
+  return std::size_t{0};
+}
+
+void ServiceProcess::Wait(bool forWriting, milliseconds longest) const {
+  // poll leaves out what is negative.
+  std::array<pollfd, 2> awaited{
+      {{mResponses, POLLIN, 0}, {forWriting ? mRequests : -1, POLLOUT, 0}}};
+  poll(awaited.data(), awaited.size(), static_cast<int>(std::min(longest, kLongestPoll).count()));
 }
 
 }  // namespace tallowmere

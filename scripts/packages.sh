@@ -24,11 +24,13 @@ need() {
   fi
 }
 
-to_build=(g++ cmake ninja-build libcli11-dev)
-to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf strace)
+to_build=(g++ cmake ninja-build libcli11-dev nlohmann-json3-dev)
+to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf python3 strace)
 # Tests on file systems that these make, and on a real HFS volume in a machine of its own.
 to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools)
 to_test+=(hfsutils qemu-system-x86 busybox-static cpio)
+# Tests on the Debian packages, the manual pages and the completions.
+to_test+=(dpkg-dev file mandoc zsh fish)
 to_check=(clang-format clang-tidy)
 
 # unpack_kernel FOLDER: puts Debian's kernel there, without installing it. Without one the test that

@@ -17,6 +17,7 @@
 #include "support/ChildProgram.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
+#include "support/Wire.h"
 
 namespace tallowmere::test {
 namespace {
@@ -306,17 +307,22 @@ TEST(Census, TakesARelativeFolderAndALinkToOne) {
 
 // The path of a shell script that takes the service's place.
 std::string Impostor(const TemporaryFolder& folder, const std::string& script) {
-  const std::string path = folder.MakeFile("impostor", "#!/bin/sh\n" + script + "\n").string();
+  std::string path = folder.MakeFile("impostor", "#!/bin/sh\n" + script + "\n").string();
   chmod(path.c_str(), 0755);
   return path;
 }
 
-constexpr const char* kAnswerNoRecord = "head -c 75 /dev/zero | head -c 71; printf MWLT\n";
+constexpr const char* kAnswerNoRecord = "head -c 71 /dev/zero; printf MWLT\n";
+
+// Takes the request for the record of a path.
+std::string TakeRequest(const std::string& path) {
+  return "head -c " + std::to_string(test::RecordRequest(path).size()) + " >/dev/null\n";
+}
 
 TEST(Census, AnItemWithoutARecordIsSaidInOctalAndIsStatus1) {
   const TemporaryFolder folder;
   const std::string path = folder.MakeFolder("a\nb").string();
-  const std::string answer = kAnswerNoRecord;
+  const std::string answer = TakeRequest(path) + kAnswerNoRecord;
   const CensusResult result =
       CensusOf(path, {"--service", Impostor(folder, answer + answer + "exec cat >/dev/null")});
   EXPECT_THAT(result.text, HasSubstr("/a\\012b: has no record\n"
@@ -324,16 +330,19 @@ TEST(Census, AnItemWithoutARecordIsSaidInOctalAndIsStatus1) {
   EXPECT_EQ(result.status, 1);
 }
 
-// Answers the same path for every record.
-std::string AnswersWith(const TemporaryFolder& folder, const std::string& answer) {
+// Answers the same record for `path` whenever it is asked, and the same answer for the record.
+std::string AnswersWith(const TemporaryFolder& folder, const std::string& path,
+                        const std::string& answer) {
+  const std::string recordRequest = test::RecordRequest(path);
+  const std::string pathRequest = test::PathOfRecordRequest(test::kEmptyRecord, 0, 0);
   return Impostor(folder,
                   "if [ \"$(head -c 1)\" = \"$(printf '\\007')\" ]\n"
-                  "then answer='\\001\\377\\377\\002\\000\\000\\000\\001a%062d'\n"
-                  "else answer='" +
-                      answer +
-                      "%.0d'\n"
-                      "fi\n"
-                      "for i in 1 2; do printf \"$answer\" 0; printf MWLT; done\n"
+                  "then answer='\\001\\377\\377\\002\\000\\000\\000\\001a%062d'; size=" +
+                      std::to_string(recordRequest.size()) + "\nelse answer='" + answer +
+                      "%.0d'; size=" + std::to_string(pathRequest.size()) +
+                      "\nfi\n"
+                      "head -c $((size - 1)) >/dev/null; printf \"$answer\" 0; printf MWLT\n"
+                      "head -c $size >/dev/null; printf \"$answer\" 0; printf MWLT\n"
                       "exec cat >/dev/null");
 }
 
@@ -341,7 +350,7 @@ TEST(Census, AnItemThatComesBackAsAnotherIsSaidAndIsStatus1) {
   const TemporaryFolder folder;
   const std::string path = folder.MakeFolder("asked").string();
   const CensusResult result =
-      CensusOf(path, {"--service", AnswersWith(folder, "\\001\\002\\000/\\000")});
+      CensusOf(path, {"--service", AnswersWith(folder, path, "\\001\\002\\000/\\000")});
   EXPECT_THAT(result.text, StartsWith(path + ": came back as /\n"));
   EXPECT_EQ(result.status, 1);
 }
@@ -349,7 +358,8 @@ TEST(Census, AnItemThatComesBackAsAnotherIsSaidAndIsStatus1) {
 TEST(Census, ARecordThatLeadsNowhereIsSaidAndIsStatus1) {
   const TemporaryFolder folder;
   const std::string path = folder.MakeFolder("asked").string();
-  const CensusResult result = CensusOf(path, {"--service", AnswersWith(folder, "\\000\\000\\000")});
+  const CensusResult result =
+      CensusOf(path, {"--service", AnswersWith(folder, path, "\\000\\000\\000")});
   EXPECT_THAT(result.text, StartsWith(path + ": its record leads nowhere\n"));
   EXPECT_EQ(result.status, 1);
 }
@@ -359,7 +369,7 @@ TEST(Census, WhatVanishesMeanwhileDoesNotCount) {
   const std::string path = folder.MakeFolder("asked").string();
   const std::string victim = folder.MakeFile("asked/victim").string();
   const std::string answer = kAnswerNoRecord;
-  const std::string skip = "head -c " + std::to_string(2 + 2 + path.size() + 1) + " >/dev/null\n";
+  const std::string skip = TakeRequest(path);
   const CensusResult result = CensusOf(
       path, {"--service", Impostor(folder, skip + answer + skip + answer + "head -c 1 >" +
                                                folder.Path().string() + "/first; rm " + victim +

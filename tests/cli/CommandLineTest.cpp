@@ -68,8 +68,7 @@ TEST(CommandLine, IdentifyGoesOnBehindAPathWithoutARecord) {
   const std::string missing = folder.Path() / "missing/file";
   ChildProgram cli(TALLOWMERE_CLI, {"identify", missing, folder.Path()});
   EXPECT_THAT(cli.ReadToEnd(), HasSubstr("  " + folder.Path().string() + "\n"));
-  EXPECT_EQ(cli.ReadErrorsToEnd(),
-            "tallowmere-cli: " + missing + ": there is no such folder on any volume\n");
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + missing + ": there is no such folder\n");
   EXPECT_EQ(cli.Wait(), 1);
 }
 
@@ -83,7 +82,7 @@ TEST(CommandLine, AiffPrintsTheSettingsAsATree) {
 
 TEST(CommandLine, AiffTellsTheResultOfASoundThatIsRefused) {
   ChildProgram cli(TALLOWMERE_CLI, {"aiff", "--format", "mp3 "});
-  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the exporter refuses this sound: -206\n");
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: no AIFF file can hold this format\n");
   EXPECT_EQ(cli.Wait(), 1);
 }
 
@@ -111,9 +110,20 @@ TEST(CommandLine, WrongUsageIsStatus2) {
                                                     {"nonsense"},
                                                     {"volumes", "--nonsense"},
                                                     {"aiff", "--format", "raw"},
-                                                    {"identify"}}) {
+                                                    {"identify"},
+                                                    {"spec"},
+                                                    {"append", "/"},
+                                                    {"--deadline", "0", "volumes"},
+                                                    {"--deadline", "nan", "volumes"},
+                                                    {"aiff", "--rate", "nan"},
+                                                    {"aiff", "--rate", "65536"},
+                                                    {"aiff", "--rate", "-1"},
+                                                    {"census", "/nonexistent"}}) {
     ChildProgram cli(TALLOWMERE_CLI, arguments);
-    EXPECT_NE(cli.ReadErrorsToEnd(), "");
+    const std::string error = cli.ReadErrorsToEnd();
+    EXPECT_THAT(error, StartsWith("tallowmere-cli: "));
+    EXPECT_THAT(error, testing::EndsWith("; --help tells more\n"));
+    EXPECT_EQ(std::count(error.begin(), error.end(), '\n'), 1) << error;
     EXPECT_EQ(cli.Wait(), 2);
   }
 }

@@ -1,120 +1,65 @@
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <signal.h>
-#include <sys/stat.h>
-#include <sys/wait.h>
 
-#include <filesystem>
+#include <optional>
 
-#include "client/Client.h"
+#include "client/ClientSupport.h"
 #include "support/AtomReader.h"
-#include "support/TemporaryFolder.h"
 
 namespace tallowmere {
 namespace {
 
-using std::chrono::milliseconds;
+using test::StartClient;
 using test::TemporaryFolder;
-using testing::HasSubstr;
-
-Result<Client> StartClient() {
-  return Client::Start({.service = TALLOWMERE_SERVICE});
-}
-
-// The path of a shell script that takes the service's place.
-std::string Impostor(const TemporaryFolder& folder, const std::string& script) {
-  const std::string path = folder.MakeFile("impostor", "#!/bin/sh\n" + script + "\n").string();
-  chmod(path.c_str(), 0755);
-  return path;
-}
-
-std::string FailureOfFirstRequest(const std::string& service) {
-  auto client = Client::Start({.service = service, .deadline = milliseconds(300)});
-  if (!client) return client.Failure().message;
-  const auto name = client->GetHFSVolumeName(0);
-  return name ? "" : name.Failure().message;
-}
 
 TEST(Client, AsksForTheVolumesNamesAndNumbers) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
-  const auto name = client->GetHFSVolumeName(0);
-  ASSERT_TRUE(name);
-  ASSERT_TRUE(name->has_value());
-  const auto number = client->GetVolRefnumByHFSName(**name);
-  ASSERT_TRUE(number);
-  ASSERT_TRUE(number->has_value());
+  Client client = StartClient();
+  const auto name = client.GetHFSVolumeName(0);
+  ASSERT_TRUE(name && *name);
+  const auto number = client.GetVolRefnumByHFSName(**name);
+  ASSERT_TRUE(number && *number);
   EXPECT_LT(**number, 0);
 }
 
 TEST(Client, AsksForNamesAndPathsOfAFile) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
+  Client client = StartClient();
   const TemporaryFolder folder;
   const std::string file = folder.MakeFile("a:b");
-  const auto name = client->GetHFSName(file);
-  ASSERT_TRUE(name);
-  EXPECT_EQ(*name, "a/b");
-  const auto added = client->AddHFSName(folder.Path().string(), "a/b");
-  ASSERT_TRUE(added);
-  EXPECT_EQ(*added, file);
-  const auto fullPath = client->MakeFullPath(file);
+  EXPECT_EQ(*client.GetHFSName(file), "a/b");
+  EXPECT_EQ(*client.AddHFSName(folder.Path().string(), "a/b"), file);
+  const auto fullPath = client.MakeFullPath(file);
   ASSERT_TRUE(fullPath);
-  const auto back = client->MakeFileRefFromPath(*fullPath + "a/b");
-  ASSERT_TRUE(back);
-  EXPECT_EQ(*back, file);
-  const auto spec = client->GetFSSpec(file);
+  EXPECT_EQ(*client.MakeFileRefFromPath(*fullPath + "a/b"), file);
+  const auto spec = client.GetFSSpec(file);
   ASSERT_TRUE(spec && *spec);
-  const auto path = client->SetFileRefFromFSSpec(**spec, false);
-  ASSERT_TRUE(path);
-  EXPECT_EQ(*path, file);
-}
-
-TEST(Client, WhatCannotBeAskedIsNoneAndNoError) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
-  const std::string withNUL("/a\0b", 4);
-  const std::string tooLong(65535, 'x');
-  for (const std::string& path : {withNUL, tooLong}) {
-    EXPECT_EQ(*client->GetHFSName(path), std::nullopt);
-    EXPECT_EQ(*client->AddHFSName(path, "x"), std::nullopt);
-    EXPECT_EQ(*client->AddHFSName("/", path), std::nullopt);
-    EXPECT_EQ(*client->MakeFullPath(path), ":");
-    EXPECT_EQ(*client->MakeFileRefFromPath(path), std::nullopt);
-    EXPECT_FALSE(*client->GetFSSpec(path));
-  }
-  EXPECT_TRUE(*client->GetHFSVolumeName(0));
+  EXPECT_EQ((*spec)->name, "a/b");
+  EXPECT_EQ(*client.SetFileRefFromFSSpec(**spec, false), file);
+  EXPECT_EQ(*client.SetFileRefFromFSSpecData(**spec), file);
 }
 
 TEST(Client, WhatIsNotMountedIsNoneAndNoError) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
-  const auto name = client->GetHFSVolumeName(32767);
+  Client client = StartClient();
+  const auto name = client.GetHFSVolumeName(32767);
   ASSERT_TRUE(name);
   EXPECT_FALSE(name->has_value());
-  const auto number = client->GetVolRefnumByHFSName("no such volume");
+  const auto number = client.GetVolRefnumByHFSName("no such volume");
   ASSERT_TRUE(number);
   EXPECT_FALSE(number->has_value());
 }
 
-TEST(Client, ANameThatTheServiceWouldRefuseIsNoVolumesAndTheServiceLives) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
-  for (const std::string& name : {std::string(255, 'x'), std::string(256, 'x'),
-                                  std::string(70000, 'x'), std::string(3, '\0')}) {
-    const auto number = client->GetVolRefnumByHFSName(name);
-    ASSERT_TRUE(number);
-    EXPECT_FALSE(number->has_value());
-  }
-  EXPECT_TRUE(client->GetHFSVolumeName(0));
+TEST(Client, WhatIsMissingIsNoneAndNoError) {
+  Client client = StartClient();
+  EXPECT_EQ(*client.GetHFSName("/missing"), std::nullopt);
+  EXPECT_EQ(*client.GetFSSpec("/missing/file"), std::nullopt);
+  EXPECT_EQ(*client.MakeFileRefFromPath("no such volume:"), std::nullopt);
+  EXPECT_EQ(*client.SetFileRefFromFSSpecData({32767, 2, "x"}), std::nullopt);
 }
 
 TEST(Client, GetsTheSettingsForASound) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
+  Client client = StartClient();
   const std::uint32_t rate = 48000u << 16;
-  const auto settings = client->GetAIFFExportSettings(
+  const auto settings = client.GetAIFFExportSettings(
       {.rate = rate, .sampleSize = 24, .channels = 6, .format = 0x736F7774});
   ASSERT_TRUE(settings);
   EXPECT_EQ(settings->result, 0);
@@ -122,76 +67,59 @@ TEST(Client, GetsTheSettingsForASound) {
 }
 
 TEST(Client, ASoundThatIsRefusedHasACodeAndNoSettingsAndTheServiceLives) {
-  auto client = StartClient();
-  ASSERT_TRUE(client);
-  const auto settings = client->GetAIFFExportSettings(
+  const test::MortalService service;
+  Client client({.service = service.Path()});
+  const auto settings = client.GetAIFFExportSettings(
       {.rate = 48000u << 16, .sampleSize = 16, .channels = 2, .format = 0x6D703461});
   ASSERT_TRUE(settings);
   EXPECT_EQ(settings->result, -206);
   EXPECT_EQ(settings->bytes, "");
-  EXPECT_TRUE(client->GetHFSVolumeName(0));
-}
-
-TEST(Client, AMissingProgramIsSaid) {
-  EXPECT_THAT(FailureOfFirstRequest("/nonexistent/tallowmere"),
-              HasSubstr("/nonexistent/tallowmere could not be started: No such file"));
-}
-
-TEST(Client, AProgramThatExitsAtOnceIsSaid) {
-  EXPECT_EQ(FailureOfFirstRequest("/bin/true"), "the service ended before it answered");
-}
-
-TEST(Client, ATruncatedAnswerIsSaid) {
-  const TemporaryFolder folder;
-  EXPECT_EQ(FailureOfFirstRequest(Impostor(folder, "head -c 4 >/dev/null; printf '\\001\\005'")),
-            "the service ended before it answered");
-}
-
-TEST(Client, AnAnswerWithAnotherTrailerIsSaid) {
-  const TemporaryFolder folder;
-  EXPECT_EQ(FailureOfFirstRequest(Impostor(
-                folder, "head -c 4 >/dev/null; printf '\\000\\001\\000\\000mwlt'; sleep 2")),
-            "the service's answer does not end as the protocol says");
-}
-
-TEST(Client, AServiceThatNeverAnswersIsSaidWhenTheDeadlineHasPassed) {
-  const TemporaryFolder folder;
-  EXPECT_EQ(FailureOfFirstRequest(Impostor(folder, "exec sleep 60")),
-            "the service did not answer in time");
-}
-
-TEST(Client, AfterAnErrorEveryRequestGivesIt) {
-  auto client = Client::Start({.service = "/bin/true"});
-  ASSERT_TRUE(client);
-  EXPECT_FALSE(client->GetHFSVolumeName(0));
-  const auto again = client->GetHFSVolumeName(0);
-  ASSERT_FALSE(again);
-  EXPECT_EQ(again.Failure().message, "the service ended before it answered");
+  const pid_t process = service.Process();
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
+  EXPECT_EQ(service.Process(), process);
 }
 
 TEST(Client, EndsItsServiceAndLeavesNeitherProcessNorDescriptor) {
-  const auto openDescriptors = [] {
-    const auto folder = std::filesystem::directory_iterator("/proc/self/fd");
-    return std::distance(begin(folder), end(folder));
-  };
-  const auto before = openDescriptors();
+  const auto before = test::OpenDescriptors();
   for (int i = 0; i < 20; ++i) {
-    auto client = StartClient();
-    ASSERT_TRUE(client);
-    ASSERT_TRUE(client->GetHFSVolumeName(0));
-    Client moved = *std::move(client);
+    Client client = StartClient();
+    ASSERT_TRUE(client.GetHFSVolumeName(0));
+    Client moved = std::move(client);
+    ASSERT_TRUE(moved.GetHFSVolumeName(0));
+    moved = StartClient();
     ASSERT_TRUE(moved.GetHFSVolumeName(0));
   }
-  EXPECT_EQ(openDescriptors(), before);
-  EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);
-  EXPECT_EQ(errno, ECHILD);
+  EXPECT_EQ(test::OpenDescriptors(), before);
+  EXPECT_TRUE(test::HasNoChild());
 }
 
-TEST(Client, AServiceThatDoesNotEndByItselfIsKilled) {
+TEST(Client, WaitsForAServiceThatEndsByItself) {
   const TemporaryFolder folder;
-  EXPECT_EQ(FailureOfFirstRequest(Impostor(folder, "trap '' PIPE; exec sleep 60")),
-            "the service did not answer in time");
-  EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1);
+  {
+    Client client(
+        {.service = test::Impostor(folder, TALLOWMERE_SERVICE " $1; sleep 0.2; touch ended")});
+    ASSERT_TRUE(client.GetHFSVolumeName(0));
+  }
+  EXPECT_TRUE(exists(folder.Path() / "ended"));
+}
+
+TEST(Client, KillsAServiceThatDoesNotEndWithinASecond) {
+  const TemporaryFolder folder;
+  const auto start = std::chrono::steady_clock::now();
+  {
+    Client client(
+        {.service = test::Impostor(folder,
+                                   "head -c 4 >/dev/null; printf '\\000\\001\\000\\000MWLT'\n"
+                                   "exec sleep 60")});
+    ASSERT_TRUE(client.GetHFSVolumeName(0));
+  }
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(20));
+  EXPECT_TRUE(test::HasNoChild());
+}
+
+TEST(Client, StartsNoServiceBeforeTheFirstRequest) {
+  const Client client = StartClient();
+  EXPECT_TRUE(test::HasNoChild());
 }
 
 TEST(Client, TakesNoStandardDescriptorThatItsProgramHasClosed) {
@@ -199,8 +127,8 @@ TEST(Client, TakesNoStandardDescriptorThatItsProgramHasClosed) {
   if (child == 0) {
     close(0);
     close(1);
-    auto client = StartClient();
-    const bool works = client && client->GetHFSVolumeName(0);
+    Client client = StartClient();
+    const bool works = client.GetHFSVolumeName(0).HasValue();
     // What such a program prints by mistake must not reach the service.
     const bool untouched = write(1, "x", 1) == -1 && fcntl(0, F_GETFD) == -1;
     _exit(works && untouched ? 0 : 1);
@@ -212,9 +140,11 @@ TEST(Client, TakesNoStandardDescriptorThatItsProgramHasClosed) {
 
 TEST(Client, TellsTheServiceItsOwnProcessID) {
   const TemporaryFolder folder;
-  EXPECT_EQ(FailureOfFirstRequest(
-                Impostor(folder, "test $1 = $PPID && printf '\\000\\001\\000\\000MWLT'; sleep 1")),
-            "");
+  Client client(
+      {.service = test::Impostor(folder,
+                                 "head -c 4 >/dev/null\n"
+                                 "test $1 = $PPID && printf '\\000\\001\\000\\000MWLT'; cat")});
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
 }
 
 TEST(Client, LeavesAProgramThatIgnoresTheEndOfItsChildrenAlone) {
@@ -222,14 +152,37 @@ TEST(Client, LeavesAProgramThatIgnoresTheEndOfItsChildrenAlone) {
   if (child == 0) {
     signal(SIGCHLD, SIG_IGN);
     {
-      auto client = StartClient();
-      if (!client || !client->GetHFSVolumeName(0)) _exit(1);
+      Client client = StartClient();
+      if (!client.GetHFSVolumeName(0)) _exit(1);
     }
+    Client ended({.service = "/bin/true"});
+    if (ended.GetHFSVolumeName(0)) _exit(1);
     _exit(0);
   }
   int status = -1;
   waitpid(child, &status, 0);
   EXPECT_EQ(status, 0);
+}
+
+TEST(Client, TheServiceIsFoundOnTheSearchPath) {
+  const TemporaryFolder folder;
+  folder.MakeLink("tallowmere", TALLOWMERE_SERVICE);
+  folder.MakeFolder("earlier/tallowmere");
+  const char* const variable = getenv("PATH");
+  const std::string before = variable == nullptr ? "" : variable;
+  setenv(
+      "PATH",
+      ("/nonexistent::" + (folder.Path() / "earlier:").string() + folder.Path().string()).c_str(),
+      1);
+  Client client;
+  const auto found = client.GetHFSVolumeName(0);
+  setenv("PATH", "/nonexistent", 1);
+  Client lost;
+  const auto notFound = lost.GetHFSVolumeName(0);
+  setenv("PATH", before.c_str(), 1);
+  EXPECT_TRUE(found);
+  EXPECT_EQ(test::MessageOf(notFound),
+            "the service \"tallowmere\" is neither beside this program nor on PATH");
 }
 
 }  // namespace

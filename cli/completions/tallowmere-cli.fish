@@ -1,0 +1,37 @@
+# Completions of tallowmere-cli for fish.
+
+set -l commands volumes identify spec path hfs posix name append aiff census serve-check
+set -l no_command "not __fish_seen_subcommand_from $commands"
+complete -c tallowmere-cli -n $no_command -f
+
+complete -c tallowmere-cli -s h -l help -d 'Print help'
+complete -c tallowmere-cli -n $no_command -l version -d 'Print the version'
+complete -c tallowmere-cli -n $no_command -l service -r -F -d "The service's program"
+complete -c tallowmere-cli -n $no_command -l deadline -x -d 'Seconds that one answer may take'
+
+complete -c tallowmere-cli -n $no_command -a volumes -d 'Number, name and mount point of every volume'
+complete -c tallowmere-cli -n $no_command -a identify -d 'Record, full HFS path and the way back, as a table'
+complete -c tallowmere-cli -n $no_command -a spec -d 'Record of each path'
+complete -c tallowmere-cli -n $no_command -a path -d 'Path of each record'
+complete -c tallowmere-cli -n $no_command -a hfs -d 'Full HFS path of each path'
+complete -c tallowmere-cli -n $no_command -a posix -d 'Path of each full HFS path'
+complete -c tallowmere-cli -n $no_command -a name -d 'HFS name of each path'
+complete -c tallowmere-cli -n $no_command -a append -d 'Path of each HFS name in a folder'
+complete -c tallowmere-cli -n $no_command -a aiff -d 'Settings that export a sound to AIFF files'
+complete -c tallowmere-cli -n $no_command -a census -d 'Check that each item of a folder comes back'
+complete -c tallowmere-cli -n $no_command -a serve-check -d 'Exercise each request of the service'
+
+set -l with_items '__fish_seen_subcommand_from identify spec path hfs posix name append'
+complete -c tallowmere-cli -n $with_items -s 0 -l null -d 'Items and results end with a NUL'
+complete -c tallowmere-cli -n "__fish_seen_subcommand_from $commands" -l json -d 'One JSON object a line'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from spec' -l hex -d 'The 70 bytes as hexadecimal digits'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l other-volumes -d 'Look on the other volumes too'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from volumes aiff serve-check' -f
+
+set -l aiff '__fish_seen_subcommand_from aiff'
+complete -c tallowmere-cli -n $aiff -l rate -x -d 'In hertz'
+complete -c tallowmere-cli -n $aiff -l bits -x -d 'In a sample'
+complete -c tallowmere-cli -n $aiff -l channels -x -d 'Of the sound'
+complete -c tallowmere-cli -n $aiff -l format -x -d 'Four-character code' \
+    -a 'NONE "raw " twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6'
+complete -c tallowmere-cli -n $aiff -l output -r -F -d 'File for the settings'

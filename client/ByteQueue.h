@@ -1,0 +1,36 @@
+// Bytes that are added behind and taken in front, each moved a bounded number of times.
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+
+namespace tallowmere {
+
+class ByteQueue {
+ public:
+  std::string_view View() const { return std::string_view(mBytes).substr(mBegin); }
+
+  // After it, as many bytes can be appended without memory.
+  void Reserve(std::size_t size) { mBytes.reserve(mBytes.size() + size); }
+  void Append(std::string_view bytes) { mBytes.append(bytes); }
+
+  // Takes the first bytes away. REQUIRES: there are as many.
+  void Drop(std::size_t size) {
+    mBegin += size;
+    if (mBegin < mBytes.size() - mBegin) return;
+    mBytes.erase(0, mBegin);
+    mBegin = 0;
+  }
+
+  void Clear() {
+    mBytes.clear();
+    mBegin = 0;
+  }
+
+ private:
+  std::string mBytes;
+  std::size_t mBegin = 0;
+};
+
+}  // namespace tallowmere

@@ -1,0 +1,37 @@
+// Many requests to one client, of which several are under way at a time. Handlers are called in the
+// order of the requests, within Add and Finish.
+//
+// A request that the service does not survive gets the error; those behind it are asked again of a
+// new service. At most 256 requests or 64 KiB are under way, whichever is less, so that neither
+// memory nor the pipes fill up; a request that is larger goes alone.
+#pragma once
+
+#include <tallowmere/Client.h>
+
+#include <functional>
+#include <type_traits>
+
+namespace tallowmere {
+
+class Batch {
+ public:
+  // REQUIRES: the client outlives the batch and is used for nothing else until it has finished.
+  explicit Batch(Client& client);
+  Batch(const Batch&) = delete;
+  Batch& operator=(const Batch&) = delete;
+  // What has not been answered never is, and its handlers are not called.
+  ~Batch();
+
+  // The handler may throw: what it throws leaves Add or Finish, and the requests behind it are
+  // still asked. It must not use the batch or its client.
+  template <class T>
+  void Add(const Request<T>& request, std::type_identity_t<std::function<void(Result<T>)>> handler);
+
+  // Returns when every handler has been called.
+  void Finish();
+
+ private:
+  Conversation& mConversation;
+};
+
+}  // namespace tallowmere

@@ -1,0 +1,77 @@
+"""The service under test, programs that take its place, and what this process has open."""
+
+from __future__ import annotations
+
+import contextlib
+import os
+import signal
+import subprocess
+import sys
+import tempfile
+import textwrap
+import time
+import unittest
+from pathlib import Path
+
+PROJECT = Path(__file__).resolve().parents[2]
+PACKAGE = PROJECT / "python"
+SERVICE = os.environ.get("TALLOWMERE_SERVICE", str(PROJECT / "build/dev/bin/tallowmere"))
+
+
+class FolderTest(unittest.TestCase):
+    """A test with a temporary folder of its own, in which it can write programs."""
+
+    def setUp(self) -> None:
+        folder = tempfile.TemporaryDirectory()
+        self.addCleanup(folder.cleanup)
+        self.folder = os.path.realpath(folder.name)
+
+    def program(self, code: str) -> str:
+        """A program with that Python code, to be started in the service's place."""
+        path = os.path.join(self.folder, "stand-in")
+        with open(path, "w") as file:
+            file.write(f"#!{sys.executable} -IS\nimport os, sys, time\n{textwrap.dedent(code)}")
+        os.chmod(path, 0o700)
+        return path
+
+    def run_host(self, code: str, *arguments: str) -> str:
+        """What a program of its own with that code says on standard output; it has to succeed."""
+        prologue = f"import os, signal, sys\nfrom tallowmere import *\nSERVICE = {SERVICE!r}\n"
+        return self.run_python(["-c", prologue + textwrap.dedent(code), *arguments])
+
+    def run_python(
+        self, arguments: list[str], environment: dict[str, str] = {}, interpreter: str = sys.executable
+    ) -> str:
+        host = subprocess.run(
+            [interpreter, *arguments],
+            env={**os.environ, "PYTHONPATH": str(PACKAGE), **environment},
+            cwd=self.folder, capture_output=True, text=True, timeout=60,
+        )  # fmt: skip
+        self.assertEqual((host.returncode, host.stderr), (0, ""))
+        return host.stdout
+
+
+def children() -> list[int]:
+    """The children of this process, also those that ended and were not waited for."""
+    found = []
+    for entry in Path("/proc").glob("[0-9]*/stat"):
+        try:
+            fields = entry.read_text().rpartition(")")[2].split()
+        except OSError:
+            continue  # it ended meanwhile
+        if int(fields[1]) == os.getpid():
+            found.append(int(entry.parent.name))
+    return found
+
+
+def descriptors() -> set[str]:
+    return set(os.listdir("/proc/self/fd"))
+
+
+def kill_child(number: int = signal.SIGKILL) -> None:
+    """Sends a signal to the one child, and with SIGKILL sees it end; it is not waited for here."""
+    [child] = children()
+    os.kill(child, number)
+    with contextlib.suppress(FileNotFoundError):
+        while number == signal.SIGKILL and ") Z " not in Path(f"/proc/{child}/stat").read_text():
+            time.sleep(0.001)

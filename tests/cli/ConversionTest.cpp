@@ -1,0 +1,404 @@
+// The commands that turn items into something else, from arguments and from standard input.
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <nlohmann/json.hpp>
+#include <sstream>
+
+#include "support/ChildProgram.h"
+#include "support/TemporaryFolder.h"
+
+namespace tallowmere::test {
+namespace {
+
+using nlohmann::json;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::Not;
+
+struct Output {
+  int status;
+  std::string text;
+  std::string errors;
+};
+
+Output Cli(const std::vector<std::string>& arguments, const std::string& input = "") {
+  ChildProgram cli(TALLOWMERE_CLI, arguments);
+  cli.Write(input);
+  cli.CloseInput();
+  std::string text = cli.ReadToEnd();
+  std::string errors = cli.ReadErrorsToEnd();
+  return {cli.Wait(), std::move(text), std::move(errors)};
+}
+
+std::vector<std::string> Lines(const std::string& text) {
+  std::vector<std::string> lines;
+  std::istringstream stream(text);
+  for (std::string line; std::getline(stream, line);) lines.push_back(line);
+  return lines;
+}
+
+// The keys of an object, in their order.
+std::vector<std::string> Keys(const std::string& object) {
+  std::vector<std::string> keys;
+  const auto parsed = nlohmann::ordered_json::parse(object);
+  for (const auto& [key, value] : parsed.items()) keys.push_back(key);
+  return keys;
+}
+
+// A folder with the file "a:b" in it.
+class Conversion : public testing::Test {
+ protected:
+  Conversion() : mFile(mFolder.MakeFile("a:b")), mHere(mFolder.Path()) {}
+
+  TemporaryFolder mFolder;
+  std::string mFile;
+  std::string mHere;
+};
+
+TEST_F(Conversion, ARecordAndItsPathLeadToEachOther) {
+  for (const std::vector<std::string>& command :
+       {std::vector<std::string>{"spec", mFile}, {"spec", "--hex", mFile}}) {
+    const Output record = Cli(command);
+    EXPECT_EQ(record.status, 0);
+    const Output path = Cli({"path", "-"}, record.text);
+    EXPECT_EQ(path.text, mFile + "\n");
+    EXPECT_EQ(path.status, 0);
+  }
+}
+
+TEST_F(Conversion, ARecordIsVolumeParentAndHFSName) {
+  struct stat folder {};
+  stat(mHere.c_str(), &folder);
+  EXPECT_THAT(Cli({"spec", mFile}).text, testing::MatchesRegex("-[0-9]+:[0-9]+:a/b\n"));
+  if (folder.st_ino >= 16 && folder.st_ino <= 0x7FFFFEFF) {
+    EXPECT_THAT(Cli({"spec", mFile}).text, HasSubstr(":" + std::to_string(folder.st_ino) + ":"));
+  }
+}
+
+TEST_F(Conversion, AnHFSPathAndItsPathLeadToEachOther) {
+  const Output hfs = Cli({"hfs", mFile, mHere});
+  const auto lines = Lines(hfs.text);
+  ASSERT_EQ(lines.size(), 2u);
+  EXPECT_EQ(lines[0], lines[1] + "a/b");
+  EXPECT_EQ(lines[1].back(), ':');
+  EXPECT_EQ(Cli({"posix", "-"}, hfs.text).text, mFile + "\n" + mHere + "\n");
+}
+
+TEST_F(Conversion, ANameAndAFolderGiveThePath) {
+  EXPECT_EQ(Cli({"name", mFile}).text, "a/b\n");
+  EXPECT_EQ(Cli({"append", mHere, "a/b", "n\xC3\xA9w"}).text,
+            mFile + "\n" + mHere + "/n\xC3\xA9w\n");
+  EXPECT_EQ(Cli({"append", mHere, "-"}, "a/b\n").text, mFile + "\n");
+}
+
+TEST_F(Conversion, ARelativePathIsOneFromTheCurrentFolder) {
+  ChildProgram cli("/bin/sh",
+                   {"-c", "cd \"$1\" && exec \"$0\" name a:b ./a:b .", TALLOWMERE_CLI, mHere});
+  EXPECT_EQ(cli.ReadToEnd(), "a/b\na/b\n" + mFolder.Path().filename().string() + "\n");
+}
+
+TEST_F(Conversion, SlashesAtTheEndDoNotCount) {
+  EXPECT_EQ(Cli({"hfs", mHere + "/", mHere + "//"}).text, Cli({"hfs", mHere, mHere}).text);
+  EXPECT_EQ(Cli({"identify", mHere + "/"}).text, Cli({"identify", mHere}).text);
+  EXPECT_EQ(Cli({"name", "//"}).text, Cli({"name", "/"}).text);
+}
+
+TEST_F(Conversion, ALinkToAFolderIsAnItemOfItsFolder) {
+  const std::string link = mFolder.MakeLink("link", "/");
+  EXPECT_EQ(Cli({"hfs", link}).text, Lines(Cli({"hfs", mHere}).text)[0] + "link\n");
+}
+
+// --- Standard input -----------------------------------------------------------------------------
+
+TEST_F(Conversion, LinesOfStandardInputAreAnsweredInTheirOrder) {
+  std::string input;
+  std::string expected;
+  for (int i = 0; i < 3000; ++i) {
+    const std::string name = std::to_string(i * 7919 % 3000);
+    input += mHere + "/" + name + "\n";
+    expected += name + "\n";
+    if (i % 100 == 0) mFolder.MakeFile(name);
+  }
+  const Output output = Cli({"spec", "-"}, input);
+  std::string names;
+  for (const std::string& line : Lines(output.text)) {
+    names += line.substr(line.rfind(':') + 1) + "\n";
+  }
+  EXPECT_EQ(names, expected);
+  EXPECT_EQ(output.status, 0);
+}
+
+TEST_F(Conversion, TheLastLineMayLackItsEnd) {
+  EXPECT_EQ(Cli({"name", "-"}, mFile + "\n" + mFile).text, "a/b\na/b\n");
+  EXPECT_EQ(Cli({"name", "-"}, mFile + "\n").text, "a/b\n");
+  EXPECT_EQ(Cli({"name", "-"}, "").text, "");
+}
+
+TEST_F(Conversion, WithNullAnItemMayHoldANewline) {
+  const std::string file = mFolder.MakeFile("x\ny");
+  const Output output = Cli({"name", "--null", "-"}, file + '\0' + mFile + '\0');
+  EXPECT_EQ(output.text, std::string("x\ny\0a/b\0", 8));
+  EXPECT_EQ(output.status, 0);
+}
+
+TEST_F(Conversion, ALineIsAnsweredBeforeTheNextOneIsThere) {
+  ChildProgram cli(TALLOWMERE_CLI, {"name", "-"});
+  for (int i = 0; i < 3; ++i) {
+    cli.Write(mFile + "\n");
+    EXPECT_EQ(cli.Read(4), "a/b\n");
+  }
+  cli.CloseInput();
+  EXPECT_EQ(cli.Wait(), 0);
+}
+
+TEST_F(Conversion, AnInputThatCannotBeReadIsSaid) {
+  ChildProgram cli("/bin/sh", {"-c", "exec \"$0\" name - <\"$1\"", TALLOWMERE_CLI, mHere});
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: standard input: Is a directory\n");
+  EXPECT_EQ(cli.Wait(), 1);
+}
+
+// --- JSON ---------------------------------------------------------------------------------------
+
+TEST_F(Conversion, JsonIsOneObjectALineWithStableKeys) {
+  const std::string record = Lines(Cli({"spec", mFile}).text)[0];
+  const std::string hfsPath = Lines(Cli({"hfs", mFile}).text)[0];
+  const auto keysOf = [](const std::vector<std::string>& command) {
+    const Output output = Cli(command);
+    EXPECT_EQ(output.status, 0);
+    return Keys(Lines(output.text).at(0));
+  };
+  EXPECT_THAT(keysOf({"spec", "--json", mFile}),
+              ElementsAre("path", "volume", "parent", "name", "record"));
+  EXPECT_THAT(keysOf({"path", "--json", record}), ElementsAre("record", "path"));
+  EXPECT_THAT(keysOf({"hfs", "--json", mFile}), ElementsAre("path", "hfs_path"));
+  EXPECT_THAT(keysOf({"posix", "--json", hfsPath}), ElementsAre("hfs_path", "path"));
+  EXPECT_THAT(keysOf({"name", "--json", mFile}), ElementsAre("path", "name"));
+  EXPECT_THAT(keysOf({"append", "--json", mHere, "a/b"}), ElementsAre("name", "path"));
+  EXPECT_THAT(keysOf({"identify", "--json", mFile}),
+              ElementsAre("path", "volume", "parent", "name", "record", "hfs_path", "way_back"));
+  EXPECT_THAT(keysOf({"volumes", "--json"}),
+              ElementsAre("volume", "name", "mount_point", "answers_to_its_name"));
+  EXPECT_THAT(keysOf({"aiff", "--json"}),
+              ElementsAre("rate", "bits", "channels", "format", "settings"));
+  EXPECT_THAT(keysOf({"census", "--json", mHere}),
+              ElementsAre("items", "came_back", "missing", "vanished", "left_out"));
+  EXPECT_THAT(keysOf({"serve-check", "--json"}), ElementsAre("code", "request", "ok"));
+}
+
+TEST_F(Conversion, JsonHoldsWhatTheTextSays) {
+  const std::string text = Lines(Cli({"spec", mFile}).text)[0];
+  const std::string hex = Lines(Cli({"spec", "--hex", mFile}).text)[0];
+  const json object = json::parse(Cli({"spec", "--json", mFile}).text);
+  EXPECT_EQ(object["path"], mFile);
+  EXPECT_EQ(object["name"], "a/b");
+  EXPECT_EQ(object["record"], hex);
+  EXPECT_EQ(std::to_string(object["volume"].get<int>()) + ":" +
+                std::to_string(object["parent"].get<int>()) + ":a/b",
+            text);
+}
+
+TEST_F(Conversion, AFailedItemIsAnObjectInItsPlace) {
+  const Output output = Cli({"name", "--json", "-"}, mFile + "\n" + mHere + "/missing\n\n" + mFile);
+  const auto lines = Lines(output.text);
+  ASSERT_EQ(lines.size(), 4u);
+  EXPECT_EQ(json::parse(lines[1]),
+            json({{"path", mHere + "/missing"}, {"error", "there is no such file or folder"}}));
+  EXPECT_EQ(json::parse(lines[2]), json({{"path", ""}, {"error", "an empty text names nothing"}}));
+  EXPECT_EQ(json::parse(lines[3])["name"], "a/b");
+  EXPECT_EQ(output.errors, "");
+  EXPECT_EQ(output.status, 1);
+}
+
+TEST_F(Conversion, BytesThatAreNoUtf8AreInJsonInHexadecimalToo) {
+  const std::string file = mFolder.MakeFile("\xFFz");
+  const json object = json::parse(Cli({"identify", "--json", file}).text);
+  EXPECT_EQ(object["path"], mHere + "/\xEF\xBF\xBDz");
+  EXPECT_THAT(object["path_hex"].get<std::string>(), testing::EndsWith("2fff7a"));
+  EXPECT_THAT(object["way_back_hex"].get<std::string>(), testing::EndsWith("2fff7a"));
+  EXPECT_FALSE(json::parse(Cli({"identify", "--json", mFile}).text).contains("path_hex"));
+}
+
+// --- What goes wrong ----------------------------------------------------------------------------
+
+TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
+  const auto errorsOf = [&](const std::vector<std::string>& command) {
+    const Output output = Cli(command);
+    EXPECT_EQ(output.status, 1);
+    return output.errors;
+  };
+  const std::string prefix = "tallowmere-cli: ";
+  const std::string missing = mHere + "/missing";
+  EXPECT_EQ(errorsOf({"name", missing}), prefix + missing + ": there is no such file or folder\n");
+  EXPECT_EQ(errorsOf({"hfs", mFile + "/x"}),
+            prefix + mFile + "/x: there is no such file or folder\n");
+  EXPECT_EQ(errorsOf({"spec", missing + "/x"}), prefix + missing + "/x: there is no such folder\n");
+  for (const char* const command : {"spec", "name", "hfs"}) {
+    EXPECT_EQ(errorsOf({command, "/proc/self/status"}),
+              prefix + "/proc/self/status: it is on no volume\n");
+  }
+  EXPECT_EQ(errorsOf({"path", "1:2"}),
+            prefix +
+                "1:2: a record is volume:parent:name, the name of at most 63 Mac Roman "
+                "characters, or 140 hexadecimal digits\n");
+  EXPECT_EQ(errorsOf({"path", "99:2:x"}), prefix + "99:2:x: no volume has the number 99\n");
+  EXPECT_EQ(errorsOf({"path", "0:3:x"}),
+            prefix + "0:3:x: there is no such item, nor a folder for it\n");
+  EXPECT_EQ(errorsOf({"posix", "no such volume:x"}),
+            prefix + "no such volume:x: no volume is called \"no such volume\"\n");
+  EXPECT_EQ(errorsOf({"posix", "a name that nobody has"}),
+            prefix + "a name that nobody has: there is no such item that can be reached\n");
+  EXPECT_EQ(errorsOf({"posix", std::string(256, 'x')}),
+            prefix + std::string(256, 'x') + ": an HFS path has at most 255 bytes\n");
+  EXPECT_EQ(errorsOf({"posix", "\xE6\x97\xA5"}),
+            prefix + "\xE6\x97\xA5: it has a character that HFS names cannot have\n");
+  EXPECT_EQ(errorsOf({"append", missing, "x"}),
+            prefix + "x: there is no folder \"" + missing + "\"\n");
+  EXPECT_EQ(errorsOf({"append", "", "x"}), prefix + "x: there is no folder \"\"\n");
+  EXPECT_EQ(errorsOf({"name", mFolder.MakeLink("dangling", "nowhere")}),
+            prefix + mHere + "/dangling: the link leads nowhere\n");
+  EXPECT_EQ(errorsOf({"append", mHere, "\xE6\x97\xA5"}),
+            prefix + "\xE6\x97\xA5: it has a character that HFS names cannot have\n");
+  EXPECT_EQ(errorsOf({"append", mHere, std::string(256, 'x')}),
+            prefix + std::string(256, 'x') + ": no item can have this name\n");
+  EXPECT_EQ(errorsOf({"name", ""}), prefix + ": an empty text names nothing\n");
+  EXPECT_EQ(errorsOf({"identify", ""}), prefix + ": an empty text names nothing\n");
+
+  const Output mixed = Cli({"name", missing, mFile});
+  EXPECT_EQ(mixed.text, "a/b\n");
+  EXPECT_EQ(mixed.status, 1);
+}
+
+TEST_F(Conversion, APathThatIsTooLongIsSaid) {
+  const Output output = Cli({"spec", "--json", "/" + std::string(70000, 'x')});
+  EXPECT_EQ(json::parse(output.text)["error"], "File name too long");
+}
+
+TEST_F(Conversion, WithOtherVolumesARecordOfAnUnknownVolumeIsLookedForElsewhere) {
+  const std::string volume = Lines(Cli({"spec", mFile}).text)[0];
+  const std::string unknown = "99" + volume.substr(volume.find(':'));
+  EXPECT_EQ(Cli({"path", "--other-volumes", unknown}).text, mFile + "\n");
+  EXPECT_EQ(Cli({"path", unknown}).status, 1);
+}
+
+TEST_F(Conversion, AServiceThatCannotBeStartedIsSaidOnce) {
+  const Output output = Cli({"--service", "/nonexistent", "name", "/", "/etc", "/tmp"});
+  EXPECT_EQ(output.errors,
+            "tallowmere-cli: the service /nonexistent could not be started: No such file or "
+            "directory\n");
+  EXPECT_EQ(output.status, 1);
+}
+
+// A service that dies of a request, the first one excepted, and is whole again after that.
+TEST_F(Conversion, AServiceThatDiesOfAnItemIsSaidOfThatItemAndTheRestIsAnswered) {
+  const std::string died = mFolder.Path() / "died";
+  const std::string script = mFolder.MakeFile(
+      "mortal", "#!/bin/sh\n[ -e '" + died + "' ] && exec '" TALLOWMERE_SERVICE "' $1\ntouch '" +
+                    died + "'\nhead -c 4 >/dev/null; printf '\\1\\5\\0Root\\0MWLT'\nexit 0\n");
+  chmod(script.c_str(), 0755);
+  for (const char* const command : {"name", "hfs", "spec"}) {
+    const Output output = Cli({"--service", script, command, "--json", mFile, mHere, mFile});
+    const auto lines = Lines(output.text);
+    ASSERT_EQ(lines.size(), 3u) << command;
+    EXPECT_EQ(json::parse(lines[0])["error"], "the service ended before it answered") << command;
+    EXPECT_FALSE(json::parse(lines[1]).contains("error")) << command;
+    EXPECT_EQ(output.status, 1);
+    unlink(died.c_str());
+  }
+}
+
+TEST_F(Conversion, AReasonThatIsNoUtf8IsJsonAllTheSame) {
+  const Output output = Cli({"append", "--json", "\xFF", "x"});
+  EXPECT_EQ(json::parse(output.text)["error"], "there is no folder \"\xEF\xBF\xBD\"");
+  EXPECT_EQ(output.status, 1);
+}
+
+TEST_F(Conversion, LinksOnTheWayAreResolved) {
+  const std::string folder = mFolder.MakeFolder("real");
+  const std::string file = mFolder.MakeFile("real/file");
+  const std::string link = mFolder.MakeLink("link", "real");
+  for (const char* const command : {"hfs", "spec", "identify", "name"}) {
+    for (const std::string name : {"/file", "/../a:b", "/.", "/.."}) {
+      const std::string direct = Cli({command, folder + name}).text;
+      EXPECT_EQ(Cli({command, link + name}).text, direct) << command << name;
+      EXPECT_NE(direct, "");
+    }
+  }
+  EXPECT_EQ(Cli({"spec", link + "/new"}).text, Cli({"spec", folder + "/new"}).text);
+  EXPECT_EQ(Cli({"append", link, "file"}).text, file + "\n");
+}
+
+TEST_F(Conversion, TheShortestDeadlineIsOne) {
+  const Output output = Cli({"--deadline", "0.0005", "volumes"});
+  EXPECT_THAT(output.errors, testing::AnyOf("", HasSubstr("did not answer in time")));
+  EXPECT_EQ(Cli({"--deadline", "inf", "name", "/"}).status, 0);
+}
+
+TEST_F(Conversion, AServiceThatDoesNotAnswerIsSaidWhenTheDeadlineHasPassed) {
+  const std::string script = mFolder.MakeFile("silent", "#!/bin/sh\nexec sleep 60\n");
+  chmod(script.c_str(), 0755);
+  const Output output = Cli({"--service", script, "--deadline", "0.2", "name", "/"});
+  EXPECT_EQ(output.errors, "tallowmere-cli: the service did not answer in time\n");
+  EXPECT_EQ(output.status, 1);
+}
+
+TEST_F(Conversion, AReaderThatLeavesEndsTheProgramQuietly) {
+  ChildProgram cli(
+      "/bin/bash",
+      {"-c", "yes \"$1\" | head -200000 | \"$0\" name - | head -1; echo ${PIPESTATUS[2]}",
+       TALLOWMERE_CLI, mFile});
+  EXPECT_EQ(cli.ReadToEnd(), "a/b\n" + std::to_string(128 + SIGPIPE) + "\n");
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "");
+}
+
+TEST_F(Conversion, AFullDiskIsSaid) {
+  ChildProgram cli("/bin/sh", {"-c", "exec \"$0\" name \"$1\" >/dev/full", TALLOWMERE_CLI, mFile});
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the output could not be written\n");
+  EXPECT_EQ(cli.Wait(), 1);
+}
+
+// --- The others ---------------------------------------------------------------------------------
+
+TEST_F(Conversion, SettingsOfASoundAreStoredAsTheyAre) {
+  const std::string path = mFolder.Path() / "settings";
+  EXPECT_EQ(Cli({"aiff", "--output", path}).text, "");
+  std::ifstream file(path, std::ios::binary);
+  const std::string stored{std::istreambuf_iterator<char>(file), {}};
+  EXPECT_EQ(stored.size(), 144u);
+  EXPECT_EQ(Cli({"aiff", "--output", "-"}).text, stored);
+  EXPECT_EQ(Cli({"aiff", "--output", mHere + "/missing/file"}).errors,
+            "tallowmere-cli: " + mHere + "/missing/file: No such file or directory\n");
+  EXPECT_EQ(Cli({"aiff", "--output", "/dev/full"}).errors,
+            "tallowmere-cli: /dev/full: it could not be written\n");
+}
+
+TEST_F(Conversion, AServiceThatWorksPassesTheCheckAndAnotherDoesNot) {
+  const Output good = Cli({"serve-check"});
+  EXPECT_EQ(good.status, 0);
+  EXPECT_EQ(Lines(good.text).size(), 11u);
+  EXPECT_THAT(good.text, Not(HasSubstr("not fit")));
+  for (const char* const code :
+       {" 1 ", " 2 ", " 3 ", " 4 ", " 5 ", " 6 ", " 7 ", " 8 ", " 9 ", "10 "}) {
+    EXPECT_THAT(good.text, HasSubstr(std::string("  ") + code)) << code;
+  }
+  const Output bad = Cli({"--service", "/bin/true", "serve-check"});
+  EXPECT_EQ(bad.status, 1);
+  EXPECT_THAT(bad.text, HasSubstr("the service ended before it answered"));
+  EXPECT_EQ(Lines(bad.text).size(), 2u);
+}
+
+TEST_F(Conversion, EachCommandHasHelpWithExamples) {
+  for (const char* const command : {"spec", "path", "hfs", "posix", "name", "append", "identify",
+                                    "volumes", "aiff", "census", "serve-check"}) {
+    const Output output = Cli({command, "--help"});
+    EXPECT_EQ(output.status, 0);
+    EXPECT_THAT(output.text, HasSubstr(std::string("Examples:\n  tallowmere-cli ") + command));
+  }
+}
+
+}  // namespace
+}  // namespace tallowmere::test
