@@ -5,6 +5,7 @@
 #include <fstream>
 #include <iomanip>
 #include <iostream>
+#include <limits>
 #include <sstream>
 #include <string_view>
 #include <system_error>
@@ -92,16 +93,21 @@ int Store(const std::string& bytes, const std::string& path) {
 
 }  // namespace
 
+bool IsRate(double hertz) {
+  return hertz >= 0 && std::round(hertz * kFixedOne) <= std::numeric_limits<std::uint32_t>::max();
+}
+
+SoundFormat FormatOf(const Sound& sound) {
+  return {static_cast<std::uint32_t>(std::lround(sound.hertz * kFixedOne)), sound.bits,
+          static_cast<std::uint8_t>(sound.channels), BigEndian(sound.format)};
+}
+
 int PrintExportSettings(const ClientOptions& options, const Sound& sound, bool isJson,
                         const std::string& output) {
   Client client(options);
-  const auto settings = client.GetAIFFExportSettings(
-      {static_cast<std::uint32_t>(std::lround(sound.hertz * kFixedOne)), sound.bits,
-       static_cast<std::uint8_t>(sound.channels), BigEndian(sound.format)});
+  const auto settings = client.GetAIFFExportSettings(FormatOf(sound));
   if (!settings) return Complain(settings.Failure().message);
-  if (settings->result != 0) {
-    return Complain(WhyRefused(settings->result));
-  }
+  if (settings->result != 0) return Complain(WhyRefused(settings->result));
   if (!output.empty() && output != "-") return Store(settings->bytes, output);
   if (!output.empty()) {
     std::cout << settings->bytes;

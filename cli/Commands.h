@@ -45,11 +45,17 @@ int PrintPathsOfNames(const ItemsToAsk& items, const std::string& folder);
 
 // A sound in the words of a person.
 struct Sound {
-  double hertz = 44100;  // 0 to 65535
+  double hertz = 44100;  // IsRate
   std::uint16_t bits = 16;
   unsigned channels = 2;        // 0 to 255
   std::string format = "twos";  // four characters
 };
+
+// Whether that many hertz, as hertz × 65536, have 32 bits.
+bool IsRate(double hertz);
+
+// REQUIRES: the sound is within its ranges.
+SoundFormat FormatOf(const Sound& sound);
 
 // The settings with which such a sound is exported to AIFF files: as a tree of atoms, or as they
 // are into the file `output`, "-" for standard output.

@@ -87,7 +87,7 @@ const std::vector<Check>& Checks() {
          return !wrong.empty() || path.ends_with("/a:b") ? wrong : "the answer is no such path";
        }},
       {10, "the settings of a sound", [](Client& client, Findings&) -> std::string {
-         const auto settings = client.GetAIFFExportSettings({44100u << 16, 16, 2, 0x74776F73});
+         const auto settings = client.GetAIFFExportSettings(FormatOf({}));
          if (!settings) return settings.Failure().message;
          return settings->result == 0 ? "" : "result " + std::to_string(settings->result);
        }}};

@@ -117,6 +117,7 @@ TEST(CommandLine, WrongUsageIsStatus2) {
                                                     {"--deadline", "nan", "volumes"},
                                                     {"aiff", "--rate", "nan"},
                                                     {"aiff", "--rate", "65536"},
+                                                    {"aiff", "--rate", "65535.999999"},
                                                     {"aiff", "--rate", "-1"},
                                                     {"census", "/nonexistent"}}) {
     ChildProgram cli(TALLOWMERE_CLI, arguments);
