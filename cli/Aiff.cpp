@@ -1,7 +1,11 @@
+#include <MacTypes.h>
+
 #include <cerrno>
 #include <cmath>
 #include <fstream>
+#include <iomanip>
 #include <iostream>
+#include <limits>
 #include <sstream>
 #include <string_view>
 #include <system_error>
@@ -18,6 +22,7 @@ constexpr std::size_t kContainerHead = 12;  // ten zero bytes and a lock count
 constexpr std::size_t kAtomHead = 20;
 constexpr std::size_t kCodeLength = 4;
 constexpr double kFixedOne = 65536;
+constexpr int kDigitsOfARate = 10;  // five before the point and what 16 bits can tell
 
 std::uint32_t BigEndian(std::string_view bytes) {
   std::uint32_t number = 0;
@@ -31,7 +36,7 @@ std::string Value(std::string_view type, std::string_view data) {
   const std::uint32_t number = BigEndian(data);
   if (type != "ssrt") return std::to_string(number);
   std::ostringstream hertz;
-  hertz << number / kFixedOne;
+  hertz << std::setprecision(kDigitsOfARate) << number / kFixedOne;
   return hertz.str();
 }
 
@@ -51,6 +56,17 @@ bool PrintAtoms(std::string_view atoms, std::size_t depth) {
     atoms.remove_prefix(size);
   }
   return true;
+}
+
+std::string WhyRefused(int result) {
+  switch (result) {
+    case paramErr:
+      return "a sound has channels, a rate, and bits in a sample unless it is compressed";
+    case badFormat:
+      return "no AIFF file can hold this format";
+    default:
+      return "the exporter refuses this sound, result " + std::to_string(result);
+  }
 }
 
 bool PrintContainer(std::string_view container) {
@@ -77,16 +93,21 @@ int Store(const std::string& bytes, const std::string& path) {
 
 }  // namespace
 
+bool IsRate(double hertz) {
+  return hertz >= 0 && std::round(hertz * kFixedOne) <= std::numeric_limits<std::uint32_t>::max();
+}
+
+SoundFormat FormatOf(const Sound& sound) {
+  return {static_cast<std::uint32_t>(std::lround(sound.hertz * kFixedOne)), sound.bits,
+          static_cast<std::uint8_t>(sound.channels), BigEndian(sound.format)};
+}
+
 int PrintExportSettings(const ClientOptions& options, const Sound& sound, bool isJson,
                         const std::string& output) {
   Client client(options);
-  const auto settings = client.GetAIFFExportSettings(
-      {static_cast<std::uint32_t>(std::lround(sound.hertz * kFixedOne)), sound.bits,
-       static_cast<std::uint8_t>(sound.channels), BigEndian(sound.format)});
+  const auto settings = client.GetAIFFExportSettings(FormatOf(sound));
   if (!settings) return Complain(settings.Failure().message);
-  if (settings->result != 0) {
-    return Complain("the exporter refuses this sound: " + std::to_string(settings->result));
-  }
+  if (settings->result != 0) return Complain(WhyRefused(settings->result));
   if (!output.empty() && output != "-") return Store(settings->bytes, output);
   if (!output.empty()) {
     std::cout << settings->bytes;

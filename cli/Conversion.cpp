@@ -1,47 +1,46 @@
 #include "cli/Conversion.h"
 
-#include <unistd.h>
-
 #include <iostream>
 #include <optional>
 #include <system_error>
 
 #include "cli/Items.h"
 #include "cli/Output.h"
-#include "cli/ProgressBar.h"
 #include "cli/Reasons.h"
 
 namespace tallowmere::cli {
 
 int Convert(const ItemsToAsk& toAsk, const std::string& key, const Ask& ask) {
   Client client(toAsk.client);
+  if (const auto error = WhyItDoesNotAnswer(client)) return Complain(*error);
   Batch batch(client);
   Report report(toAsk.format, key);
   Items items(toAsk.items, toAsk.format.Separator());
-  // Where the answers can be seen they are progress enough.
-  const bool showsProgress = isatty(STDOUT_FILENO) == 0;
-  ProgressBar bar;
-  std::size_t count = 0;
+  const auto answerAll = [&] {
+    batch.Finish();
+    std::cout.flush();
+  };
   while (report.GoesOn()) {
-    if (items.WouldWait()) {
-      batch.Finish();
-      std::cout.flush();
-    }
-    const auto item = items.Next();
+    const auto item = items.Next(answerAll);
     if (!item) break;
     if (item->empty()) {
       Refuse(batch, *item, kEmptyItem, report);
     } else {
       ask(batch, *item, report);
     }
-    if (showsProgress) bar.Show(items.Done(), std::to_string(++count) + " items");
+    report.ShowProgress(items.Done());
   }
   if (report.GoesOn()) batch.Finish();
-  bar.Hide();
+  const int status = report.Finish();
   if (const int error = items.ReadError()) {
     return Complain("standard input: " + std::generic_category().message(error));
   }
-  return report.Finish();
+  return status;
+}
+
+std::optional<std::string> WhyItDoesNotAnswer(Client& client) {
+  const auto answer = client.GetHFSVolumeName(0);
+  return answer ? std::nullopt : std::optional(answer.Failure().message);
 }
 
 void Refuse(Batch& batch, const std::string& item, const std::string& reason, Report& report) {

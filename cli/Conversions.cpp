@@ -1,6 +1,3 @@
-#include <sys/stat.h>
-
-#include <filesystem>
 #include <memory>
 
 #include "cli/Commands.h"
@@ -13,6 +10,9 @@ namespace tallowmere::cli {
 namespace {
 
 constexpr const char* kPathKey = "path";
+constexpr const char* kNoRecord =
+    "a record is volume:parent:name, the name of at most 63 Mac Roman characters, or 140 "
+    "hexadecimal digits";
 constexpr const char* kNotMacRoman = "it has a character that HFS names cannot have";
 
 // The usual handler: the answer, or why there is none.
@@ -22,7 +22,7 @@ std::function<void(Result<std::optional<Value>>)> Tell(const std::string& item, 
                                                        std::function<std::string()> whyNone) {
   return [item, &report, answer = std::move(answer),
           whyNone = std::move(whyNone)](const Result<std::optional<Value>>& result) {
-    if (!result) return report.FailOfService(item, result.Failure().message);
+    if (!result) return report.Fail(item, result.Failure().message);
     if (!*result) return report.Fail(item, whyNone());
     answer(**result);
   };
@@ -60,8 +60,7 @@ int PrintPathsOfRecords(const ItemsToAsk& items, bool searchOtherVolumes) {
   return Convert(items, "record", [&](Batch& batch, const std::string& item, Report& report) {
     const auto spec = ReadRecord(item);
     if (!spec) {
-      return Refuse(batch, item, "a record is volume:parent:name or 140 hexadecimal digits",
-                    report);
+      return Refuse(batch, item, kNoRecord, report);
     }
     batch.Add(request::SetFileRefFromFSSpec(*spec, searchOtherVolumes),
               TellPath(item, report, [&, spec] { return WhyNoPath(explaining, *spec); }));
@@ -71,15 +70,15 @@ int PrintPathsOfRecords(const ItemsToAsk& items, bool searchOtherVolumes) {
 int PrintHFSPaths(const ItemsToAsk& items) {
   return Convert(items, kPathKey, [](Batch& batch, const std::string& item, Report& report) {
     const std::string path = AbsolutePath(item);
-    const auto folders = std::make_shared<std::string>();
-    batch.Add(request::MakeFullPath(path), [folders](Result<std::string> result) {
-      if (result) *folders = *std::move(result);
-    });
+    const auto folders = std::make_shared<Result<std::string>>(std::string());
+    batch.Add(request::MakeFullPath(path),
+              [folders](Result<std::string> result) { *folders = std::move(result); });
     batch.Add(request::GetHFSName(path),
               Tell<std::string>(
                   item, report,
                   [=, &report](const std::string& name) {
-                    const auto text = Utf8OfHFSName(IsFolder(path) ? *folders : *folders + name);
+                    if (!*folders) return report.Fail(item, folders->Failure().message);
+                    const auto text = Utf8OfHFSName(IsFolder(path) ? **folders : **folders + name);
                     report.Answer(item, text, [&](Json& json) { json["hfs_path"] = text; });
                   },
                   [path] { return WhyNoName(path); }));
@@ -111,12 +110,12 @@ int PrintNames(const ItemsToAsk& items) {
 }
 
 int PrintPathsOfNames(const ItemsToAsk& items, const std::string& folder) {
-  const std::string path = AbsolutePath(folder);
+  const auto path = FolderAt(folder);
   return Convert(items, "name", [&](Batch& batch, const std::string& item, Report& report) {
-    if (!IsFolder(path)) return Refuse(batch, item, "there is no folder " + folder, report);
+    if (!path) return Refuse(batch, item, "there is no folder \"" + folder + '"', report);
     const auto name = HFSNameOfUtf8(item);
     if (!name) return Refuse(batch, item, kNotMacRoman, report);
-    batch.Add(request::AddHFSName(path, *name),
+    batch.Add(request::AddHFSName(*path, *name),
               TellPath(item, report, [] { return "no item can have this name"; }));
   });
 }

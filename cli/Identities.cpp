@@ -1,7 +1,7 @@
 #include <iostream>
 #include <utility>
 
-#include "cli/Commands.h"
+#include "cli/Conversion.h"
 #include "cli/Items.h"
 #include "cli/Output.h"
 #include "cli/Paths.h"
@@ -54,6 +54,7 @@ std::vector<std::string> RowOf(const Identity& identity) {
 
 int PrintIdentities(const ItemsToAsk& paths) {
   Client client(paths.client);
+  if (const auto error = WhyItDoesNotAnswer(client)) return Complain(*error);
   Report report(paths.format, "path");
   Table table({{"vRefNum", Table::Align::kRight},
                {"parent id", Table::Align::kRight},
@@ -61,7 +62,7 @@ int PrintIdentities(const ItemsToAsk& paths) {
                {"HFS path"},
                {"way back"}});
   Items items(paths.items, paths.format.Separator());
-  while (const auto item = report.GoesOn() ? items.Next() : std::nullopt) {
+  while (const auto item = report.GoesOn() ? items.Next([] {}) : std::nullopt) {
     if (item->empty()) {
       report.Fail(*item, kEmptyItem);
       continue;
@@ -69,7 +70,7 @@ int PrintIdentities(const ItemsToAsk& paths) {
     const std::string path = AbsolutePath(*item);
     const auto identity = Identify(client, path);
     if (!identity) {
-      report.FailOfService(*item, identity.Failure().message);
+      report.Fail(*item, identity.Failure().message);
     } else if (!*identity) {
       report.Fail(*item, WhyNoRecord(path));
     } else if (paths.format.isJson) {

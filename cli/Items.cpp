@@ -19,6 +19,12 @@ std::size_t SizeOfInput() {
   return isFile ? static_cast<std::size_t>(about.st_size) : 0;
 }
 
+// Whether a read would not wait, after `milliseconds` at the latest; -1 is for ever.
+bool HasInput(int milliseconds) {
+  pollfd input{STDIN_FILENO, POLLIN, 0};
+  return poll(&input, 1, milliseconds) != 0;
+}
+
 }  // namespace
 
 Items::Items(std::vector<std::string> arguments, char separator)
@@ -28,7 +34,7 @@ Items::Items(std::vector<std::string> arguments, char separator)
   if (mFromInput) mSize = SizeOfInput();
 }
 
-std::optional<std::string> Items::Next() {
+std::optional<std::string> Items::Next(const std::function<void()>& beforeWaiting) {
   if (!mFromInput) {
     if (mNext == mArguments.size()) return std::nullopt;
     return mArguments[mNext++];
@@ -36,7 +42,7 @@ std::optional<std::string> Items::Next() {
   std::size_t end = mBuffer.find(mSeparator, mTaken);
   while (end == std::string::npos) {
     const std::size_t known = mBuffer.size() - mTaken;
-    if (!Fill()) break;
+    if (!Fill(beforeWaiting)) break;
     end = mBuffer.find(mSeparator, known);
   }
   const bool isLast = end == std::string::npos;
@@ -47,12 +53,6 @@ std::optional<std::string> Items::Next() {
   return item;
 }
 
-bool Items::WouldWait() const {
-  if (!mFromInput || mEnded || mBuffer.find(mSeparator, mTaken) != std::string::npos) return false;
-  pollfd input{STDIN_FILENO, POLLIN, 0};
-  return poll(&input, 1, 0) == 0;
-}
-
 std::optional<double> Items::Done() const {
   const std::size_t all = mFromInput ? mSize : mArguments.size();
   if (all == 0) return std::nullopt;
@@ -60,17 +60,23 @@ std::optional<double> Items::Done() const {
 }
 
 // Reads a piece behind what has not been taken; false at the end.
-bool Items::Fill() {
+bool Items::Fill(const std::function<void()>& beforeWaiting) {
   mBuffer.erase(0, std::exchange(mTaken, 0));
   std::array<char, kPiece> piece;
-  ssize_t got = 0;
-  do {
-    got = mEnded ? 0 : read(STDIN_FILENO, piece.data(), piece.size());
-  } while (got < 0 && errno == EINTR);
-  if (got < 0) mReadError = errno;
-  mEnded = got <= 0;
-  if (!mEnded) mBuffer.append(piece.data(), static_cast<std::size_t>(got));
-  return !mEnded;
+  ssize_t got = -1;
+  while (got < 0) {
+    if (!HasInput(0)) {
+      beforeWaiting();
+      HasInput(-1);
+    }
+    got = read(STDIN_FILENO, piece.data(), piece.size());
+    if (got < 0 && errno != EINTR && errno != EAGAIN) {
+      mReadError = errno;
+      return false;
+    }
+  }
+  mBuffer.append(piece.data(), static_cast<std::size_t>(got));
+  return got > 0;
 }
 
 }  // namespace tallowmere::cli

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <cstddef>
+#include <functional>
 #include <optional>
 #include <string>
 #include <vector>
@@ -14,11 +15,9 @@ class Items {
   // `separator` ends an item of standard input; the last one may lack it.
   Items(std::vector<std::string> arguments, char separator);
 
-  // The next one, or none at the end.
-  std::optional<std::string> Next();
-
-  // Whether Next would wait for whoever writes to standard input.
-  bool WouldWait() const;
+  // The next one, or none at the end. `beforeWaiting` is called before each wait for whoever writes
+  // to standard input.
+  std::optional<std::string> Next(const std::function<void()>& beforeWaiting);
 
   // How much of it lies behind, 0 to 1; none where nobody can tell.
   std::optional<double> Done() const;
@@ -27,7 +26,7 @@ class Items {
   int ReadError() const { return mReadError; }
 
  private:
-  bool Fill();
+  bool Fill(const std::function<void()>& beforeWaiting);
 
   std::vector<std::string> mArguments;
   char mSeparator;
@@ -36,7 +35,6 @@ class Items {
   std::size_t mSize = 0;   // of standard input where it is a file, in bytes
   std::string mBuffer;     // read from standard input
   std::size_t mTaken = 0;  // of the buffer
-  bool mEnded = false;
   int mReadError = 0;
 };
 

@@ -17,12 +17,15 @@ constexpr std::string_view kStyleOff = "\x1B[0m";
 
 bool WantsColour(int descriptor) {
   const char* const refused = std::getenv("NO_COLOR");
-  const char* const terminal = std::getenv("TERM");
-  return isatty(descriptor) == 1 && (refused == nullptr || *refused == '\0') &&
-         terminal != nullptr && std::string_view(terminal) != "dumb";
+  return IsAbleTerminal(descriptor) && (refused == nullptr || *refused == '\0');
 }
 
 }  // namespace
+
+bool IsAbleTerminal(int descriptor) {
+  const char* const terminal = std::getenv("TERM");
+  return isatty(descriptor) == 1 && terminal != nullptr && std::string_view(terminal) != "dumb";
+}
 
 std::string Styled(std::string_view text, Style style, int descriptor) {
   if (!WantsColour(descriptor)) return std::string(text);

@@ -11,8 +11,11 @@ inline constexpr int kWrongUsage = 2;  // nothing was asked
 
 enum class Style { kBold, kRed };
 
-// The text in that style where the descriptor is a terminal that knows colours and the user has not
-// refused them (NO_COLOR, see no-color.org); otherwise as it is.
+// Whether the descriptor is a terminal that understands more than text.
+bool IsAbleTerminal(int descriptor);
+
+// The text in that style where the descriptor is such a terminal and the user has not refused
+// colours (NO_COLOR, see no-color.org); otherwise as it is.
 std::string Styled(std::string_view text, Style style, int descriptor);
 
 // Says on standard error what went wrong, in one line. kFailed.

@@ -6,6 +6,8 @@
 #include <iomanip>
 #include <iostream>
 
+#include "cli/Output.h"
+
 namespace tallowmere::cli {
 namespace {
 
@@ -19,7 +21,7 @@ constexpr const char* kStartAgain = "\r\x1B[K";
 }  // namespace
 
 ProgressBar::ProgressBar()
-    : mIsTerminal(isatty(STDERR_FILENO) == 1),
+    : mIsTerminal(IsAbleTerminal(STDERR_FILENO)),
       mNext(std::chrono::steady_clock::now() + kFirstPause) {}
 
 void ProgressBar::Show(std::optional<double> done, const std::string& text) {

@@ -35,7 +35,9 @@ std::string WhyNoRecord(const std::string& path) {
 
 std::string WhyNoName(const std::string& path) {
   struct stat about {};
-  return lstat(path.c_str(), &about) == 0 ? kOnNoVolume : MessageOfSystem();
+  if (lstat(path.c_str(), &about) != 0) return MessageOfSystem();
+  const bool leadsNowhere = S_ISLNK(about.st_mode) && stat(path.c_str(), &about) != 0;
+  return leadsNowhere ? "the link leads nowhere" : kOnNoVolume;
 }
 
 std::string WhyNoPath(Client& client, const FSSpec& spec) {
@@ -51,7 +53,7 @@ std::string WhyNoPath(Client& client, const std::string& hfsPath) {
   if (end != 0 && end != std::string::npos && !IsMounted(client, volume)) {
     return "no volume is called \"" + Utf8OfHFSName(volume) + '"';
   }
-  return "there is no such item";
+  return "there is no such item that can be reached";
 }
 
 }  // namespace tallowmere::cli

@@ -19,8 +19,7 @@ std::optional<std::int64_t> ReadNumber(std::string_view digits) {
   return number;
 }
 
-template <class Narrow>
-bool IsIn(std::int64_t number, Narrow lowest, std::int64_t highest) {
+bool IsIn(std::int64_t number, std::int64_t lowest, std::int64_t highest) {
   return number >= lowest && number <= highest;
 }
 

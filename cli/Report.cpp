@@ -24,7 +24,6 @@ Report::Report(Format format, std::string key)
 
 void Report::Answer(std::string_view item, std::string_view text,
                     const std::function<void(Json&)>& fill) {
-  mHasAnswered = true;
   if (!mFormat.isJson) return Print(text);
   Json json;
   Put(json, mKey, item);
@@ -34,26 +33,28 @@ void Report::Answer(std::string_view item, std::string_view text,
 
 void Report::Fail(std::string_view item, std::string_view reason) {
   mStatus = kFailed;
+  mBar.Hide();
   if (!mFormat.isJson) {
     Complain(std::string(item).append(": ").append(reason));
     return;
   }
   Json json;
   Put(json, mKey, item);
-  json["error"] = reason;
+  Put(json, "error", reason);
   Print(json.dump());
 }
 
-void Report::FailOfService(std::string_view item, std::string_view reason) {
-  if (mHasAnswered) return Fail(item, reason);
-  if (!std::exchange(mIsGivenUp, true)) mStatus = Complain(reason);
+void Report::ShowProgress(std::optional<double> done) {
+  ++mItems;
+  if (!mOutputIsTerminal) mBar.Show(done, std::to_string(mItems) + " items");
 }
 
 bool Report::GoesOn() const {
-  return !mIsGivenUp && std::cout.good();
+  return std::cout.good();
 }
 
-int Report::Finish() const {
+int Report::Finish() {
+  mBar.Hide();
   return FinishOutput(mStatus);
 }
 

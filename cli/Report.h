@@ -4,8 +4,11 @@
 
 #include <functional>
 #include <nlohmann/json.hpp>
+#include <optional>
 #include <string>
 #include <string_view>
+
+#include "cli/ProgressBar.h"
 
 namespace tallowmere::cli {
 
@@ -33,14 +36,14 @@ class Report {
   // `item` has none: the reason goes to standard error, or into its JSON object.
   void Fail(std::string_view item, std::string_view reason);
 
-  // The service gave an error. Before it has ever given an answer there is no use in asking on.
-  void FailOfService(std::string_view item, std::string_view reason);
+  // Shows how far the work has come, where the answers themselves do not.
+  void ShowProgress(std::optional<double> done);
 
-  // Whether to go on: the service answers and the output can be written.
+  // Whether the output can be written.
   bool GoesOn() const;
 
   // The program's exit status when all has been printed.
-  int Finish() const;
+  int Finish();
 
  private:
   void Print(std::string_view text) const;
@@ -48,8 +51,8 @@ class Report {
   Format mFormat;
   std::string mKey;
   bool mOutputIsTerminal;
-  bool mHasAnswered = false;
-  bool mIsGivenUp = false;
+  ProgressBar mBar;
+  std::size_t mItems = 0;
   int mStatus = 0;
 };
 

@@ -87,7 +87,7 @@ const std::vector<Check>& Checks() {
          return !wrong.empty() || path.ends_with("/a:b") ? wrong : "the answer is no such path";
        }},
       {10, "the settings of a sound", [](Client& client, Findings&) -> std::string {
-         const auto settings = client.GetAIFFExportSettings({44100u << 16, 16, 2, 0x74776F73});
+         const auto settings = client.GetAIFFExportSettings(FormatOf({}));
          if (!settings) return settings.Failure().message;
          return settings->result == 0 ? "" : "result " + std::to_string(settings->result);
        }}};
@@ -99,7 +99,7 @@ void PrintAsJson(const Check& check, const std::string& wrong) {
   json["code"] = check.code;
   json["request"] = check.what;
   json["ok"] = wrong.empty();
-  if (!wrong.empty()) json["error"] = wrong;
+  if (!wrong.empty()) Put(json, "error", wrong);
   std::cout << json.dump() << '\n';
 }
 
@@ -112,11 +112,14 @@ int CheckService(const ClientOptions& options, bool isJson) {
   Table table({{"code", Table::Align::kRight}, {"request"}, {"result"}});
   for (const Check& check : Checks()) {
     const std::string wrong = check.run(client, found);
-    if (!wrong.empty()) status = kFailed;
     if (isJson) {
       PrintAsJson(check, wrong);
     } else {
       table.Add({std::to_string(check.code), check.what, wrong.empty() ? "ok" : wrong});
+    }
+    if (!wrong.empty()) {
+      status = kFailed;
+      break;  // what follows rests on it
     }
   }
   if (!isJson) table.Print(std::cout);

@@ -1,10 +1,12 @@
 // tallowmere-cli: the service's requests for people and scripts.
 
 #include <CLI/CLI.hpp>
+#include <charconv>
 #include <chrono>
 #include <exception>
 #include <functional>
 #include <iostream>
+#include <optional>
 #include <string>
 
 #include "cli/Commands.h"
@@ -19,7 +21,6 @@ constexpr double kSecondsForARequest = 600;
 
 // What the arguments say.
 struct Arguments {
-  std::string service;
   double seconds = kSecondsForARequest;
   ItemsToAsk items;
   std::string folder;
@@ -29,16 +30,35 @@ struct Arguments {
   bool searchOtherVolumes = false;
 };
 
+std::optional<double> ReadNumber(const std::string& text) {
+  double number = 0;
+  const char* const end = text.data() + text.size();
+  const auto [stop, error] = std::from_chars(text.data(), end, number);
+  if (error != std::errc() || stop != end) return std::nullopt;
+  return number;
+}
+
+// Checks of numbers: empty, or what is wrong.
+std::string CheckTime(const std::string& text) {
+  const auto seconds = ReadNumber(text);
+  return seconds && *seconds > 0 ? "" : text + " is no time above 0";
+}
+
+std::string CheckRate(const std::string& text) {
+  const auto hertz = ReadNumber(text);
+  return hertz && IsRate(*hertz) ? "" : text + " is no rate below 65536 hertz";
+}
+
 class CommandLine {
  public:
   CommandLine() {
     mApp.require_subcommand(1);
     mApp.set_version_flag("--version", TALLOWMERE_VERSION);
-    mApp.add_option("--service", mArguments.service,
+    mApp.add_option("--service", mArguments.items.client.service,
                     "The service's program; without it, the one beside this program or on PATH")
         ->type_name("PATH");
     mApp.add_option("--deadline", mArguments.seconds, "How long one request may take, in seconds")
-        ->check(CLI::PositiveNumber)
+        ->check(CheckTime)
         ->capture_default_str();
     AddConversions();
     AddTheOthers();
@@ -48,11 +68,12 @@ class CommandLine {
     try {
       mApp.parse(count, arguments);
     } catch (const CLI::ParseError& error) {
-      return mApp.exit(error) == 0 ? 0 : kWrongUsage;
+      if (error.get_exit_code() == 0) return mApp.exit(error);
+      Complain(std::string(error.what()) + "; --help tells more");
+      return kWrongUsage;
     }
     const std::chrono::duration<double> deadline(mArguments.seconds);
     ClientOptions& client = mArguments.items.client;
-    client.service = mArguments.service;
     client.deadline = deadline < std::chrono::milliseconds::max()
                           ? std::chrono::ceil<std::chrono::milliseconds>(deadline)
                           : std::chrono::milliseconds::max();
@@ -156,9 +177,7 @@ void CommandLine::AddTheOthers() {
             return PrintExportSettings(a.items.client, a.sound, a.items.format.isJson, a.output);
           });
   AddJson(command);
-  command->add_option("--rate", a.sound.hertz, "In hertz")
-      ->check(CLI::Range(0.0, 65535.99))
-      ->capture_default_str();
+  command->add_option("--rate", a.sound.hertz, "In hertz")->check(CheckRate)->capture_default_str();
   command->add_option("--bits", a.sound.bits, "In a sample")->capture_default_str();
   command->add_option("--channels", a.sound.channels, "Of the sound")
       ->check(CLI::Range(0, 255))

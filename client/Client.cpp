@@ -11,8 +11,6 @@
 namespace tallowmere {
 namespace {
 
-constexpr std::uint16_t kLongestBuffer = protocol::kLongestHFSName;
-
 // What is left of folders that have been shortened as far as they can be: "...:", or a first folder
 // that is no longer than that.
 constexpr std::size_t kShortestFolders = 4;
@@ -41,10 +39,10 @@ Result<std::string> Client::MakeFullPath(std::string_view path) {
 
 Result<std::string> Client::MakeFullPath(std::string_view path, std::uint16_t size,
                                          bool keepFolders) {
-  if (size == 0 || size > kLongestBuffer) {
+  if (size == 0 || size > request::kLongestFullPathBuffer) {
     return Error{"a full path is asked for in 1 to 1024 bytes, not in " + std::to_string(size)};
   }
-  auto whole = Ask(request::FullPathInBuffer(path, kLongestBuffer, true));
+  auto whole = Ask(request::FullPathInBuffer(path, request::kLongestFullPathBuffer, true));
   if (!whole) return whole.Failure();
   if (!CanBeShortened(*whole, size)) {
     return Error{"the full path cannot be shortened to " + std::to_string(size) + " bytes"};

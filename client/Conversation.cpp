@@ -134,7 +134,7 @@ bool Conversation::Send() {
     FailFirst(sent.Failure());
     return true;
   }
-  if (mSent == 0) mFirstSince = steady_clock::now();
+  if (mSent == 0 && *sent > 0) mFirstSince = steady_clock::now();
   mSent += *sent;
   return *sent > 0;
 }

@@ -19,9 +19,6 @@ bool CanBeText(std::string_view text, std::size_t longest = kLongestText) {
   return text.size() <= longest && text.find('\0') == std::string_view::npos;
 }
 
-// The longest buffer, which every full path fits into.
-constexpr std::uint16_t kLongestBuffer = protocol::kLongestHFSName;
-
 // The full path of what is on no volume.
 std::string NoFullPath() {
   return {protocol::kSeparator};
@@ -82,8 +79,9 @@ Request<answer::FullPath> FullPathInBuffer(std::string_view path, std::uint16_t 
 
 Request<std::string> MakeFullPath(std::string_view path) {
   if (!CanBeText(path)) return Request(NoFullPath());
-  return {FullPathBytes(path, kLongestBuffer, true),
-          [](AnswerReader& answer) { return answer::ReadFullPath(answer, kLongestBuffer).text; }};
+  return {FullPathBytes(path, kLongestFullPathBuffer, true), [](AnswerReader& answer) {
+            return answer::ReadFullPath(answer, kLongestFullPathBuffer).text;
+          }};
 }
 
 Request<std::optional<std::string>> MakeFileRefFromPath(std::string_view hfsPath) {
@@ -113,7 +111,10 @@ Request<std::optional<std::string>> GetHFSVolumeName(std::int16_t number) {
 
 Request<std::optional<std::string>> GetHFSName(std::string_view path) {
   if (!CanBeText(path)) return None<std::string>();
-  return {RequestWriter(protocol::kRequestGetHFSName).PutString(path).Put(kLongestBuffer).Bytes(),
+  return {RequestWriter(protocol::kRequestGetHFSName)
+              .PutString(path)
+              .Put<std::uint16_t>(protocol::kLongestHFSName)
+              .Bytes(),
           answer::ReadStringByFlag};
 }
 

@@ -150,10 +150,11 @@ Result<ServiceProcess> ServiceProcess::Start(const std::string& path) {
 }
 
 ServiceProcess::ServiceProcess(int watch, int requests, int responses)
-    : mWatch(watch), mRequests(requests), mResponses(responses) {}
+    : mOwner(getpid()), mWatch(watch), mRequests(requests), mResponses(responses) {}
 
 ServiceProcess::ServiceProcess(ServiceProcess&& other) noexcept
-    : mWatch(std::exchange(other.mWatch, -1)),
+    : mOwner(other.mOwner),
+      mWatch(std::exchange(other.mWatch, -1)),
       mRequests(std::exchange(other.mRequests, -1)),
       mResponses(std::exchange(other.mResponses, -1)) {}
 
@@ -161,7 +162,7 @@ ServiceProcess::ServiceProcess(ServiceProcess&& other) noexcept
 void ServiceProcess::End(std::chrono::milliseconds patience) {
   CloseIfOpen(mRequests);
   CloseIfOpen(mResponses);
-  if (mWatch >= 0) {
+  if (mWatch >= 0 && mOwner == getpid()) {
     AwaitEnd(mWatch, patience);
     syscall(SYS_pidfd_send_signal, mWatch, SIGKILL, nullptr, 0);
     siginfo_t ignored;

@@ -1,6 +1,7 @@
 // A running service: the child process and the two pipes to it.
 #pragma once
 
+#include <sys/types.h>
 #include <tallowmere/Result.h>
 
 #include <chrono>
@@ -16,9 +17,9 @@ class ServiceProcess {
   static Result<ServiceProcess> Start(const std::string& path);
 
   ServiceProcess(ServiceProcess&& other) noexcept;
-  ServiceProcess& operator=(ServiceProcess&& other) noexcept;
   // Closes the pipes, which ends the service as soon as it reads, and waits for it. A service that
-  // does not end by itself within a second is killed.
+  // does not end by itself within a second is killed. A copy of this process that fork(2) made
+  // closes its ends and leaves the service alone.
   ~ServiceProcess() { End(kTimeToEnd); }
 
   // Ends the service at once, whatever it is doing, and waits for it.
@@ -43,6 +44,7 @@ class ServiceProcess {
 
   static constexpr std::chrono::milliseconds kTimeToEnd{1000};
 
+  pid_t mOwner;    // the process that started it
   int mWatch;      // tells the process's end, and the process from a later one with its id
   int mRequests;   // written to by us, not blocking; -1 when nobody reads
   int mResponses;  // read from by us, not blocking

@@ -3,7 +3,6 @@
 
 #include <algorithm>
 #include <cstring>
-#include <iterator>
 
 #include "service/Commands.h"
 #include "service/Protocol.h"
@@ -21,12 +20,13 @@ void MakeFullPath(Channel& channel) {
   CFileRef item;
   item.Set(path.get(), false);
   path.reset();
-  char fullPath[protocol::kLongestHFSName] = {};
+  char fullPath[protocol::kLongestHFSName];
+  fullPath[0] = '\0';
   const unsigned short length =
       CFileUtilMakeFullPath(item, size == 0 ? nullptr : fullPath, size, flag);
 
-  // Without the flag the path has been cut, and its folders are still behind the NUL.
-  std::fill(fullPath + std::strlen(fullPath), std::end(fullPath), '\0');
+  // Behind the NUL is what was in memory, or without the flag the folders that were cut.
+  std::fill(fullPath + std::strlen(fullPath), fullPath + size, '\0');
 
   channel.Put<std::uint16_t>(length);
   channel.PutBytes(fullPath, size);

@@ -14,18 +14,25 @@ _tallowmere_cli() {
     [census]='--json'
     [serve-check]='--json'
   )
-  # The command is the first word that is neither an option nor the value of one.
+  # The command is the first word that is neither an option nor the value of one. In "--option=value"
+  # the "=" is a word of its own.
   local i command=
   for ((i = 1; i < COMP_CWORD; i++)); do
     case ${COMP_WORDS[i]} in
-      --service | --deadline) ((i++)) ;;
+      --service | --deadline)
+        [[ ${COMP_WORDS[i + 1]} == = ]] && ((i++))
+        ((i++))
+        ;;
+      --) [[ -n $command ]] && return ;;  # items alone are behind it
       -*) ;;
-      *) command=${COMP_WORDS[i]} && break ;;
+      *) command=${command:-${COMP_WORDS[i]}} ;;
     esac
   done
 
-  local word=${COMP_WORDS[COMP_CWORD]} words=
-  case ${COMP_WORDS[COMP_CWORD - 1]} in
+  local word=${COMP_WORDS[COMP_CWORD]} before=${COMP_WORDS[COMP_CWORD - 1]} words=
+  [[ $word == = ]] && word=
+  [[ $before == = ]] && before=${COMP_WORDS[COMP_CWORD - 2]}
+  case $before in
     --service | --output) return ;;  # a file
     --deadline | --rate | --bits | --channels) ;;
     --format) words='NONE twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6' ;;

@@ -46,7 +46,11 @@ OSErr FolderWithID(SInt16 vRefNum, UInt32 id, Folder& folder) {
   auto place = FindItem(folder.volume, id, true);
   if (!place) return dirNFErr;
   folder.place = *std::move(place);
-  return noErr;
+  // One that moved before it was first looked at was found by what the table says of it now.
+  if (!folder.volume->Root()) {
+    folder.volume = MountTable::OfThisProcess().OfItem(folder.place.item, folder.place.path);
+  }
+  return folder.volume && folder.volume->Root() ? noErr : nsvErr;
 }
 
 void FillSpec(FSSpec& spec, SInt16 vRefNum, UInt32 parID, std::string_view name) {

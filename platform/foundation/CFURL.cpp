@@ -15,6 +15,7 @@
 #include "foundation/String.h"
 #include "foundation/Url.h"
 #include "foundation/UrlParts.h"
+#include "foundation/Utf16.h"
 
 namespace {
 
@@ -66,10 +67,6 @@ Bytes DecodedLastComponent(CFURLRef url) {
 
 CFURLRef CreateUrlWithPath(CFURLRef url, std::string_view path) {
   return CreateUrl(WithPath(UrlOf(url).Text(), path), UrlOf(url).Base());
-}
-
-bool IsAscii(char16_t unit) {
-  return unit < 0x80;
 }
 
 }  // namespace

@@ -124,8 +124,9 @@ std::u16string DecomposeMacRoman(std::u16string_view text) {
   std::u16string decomposed;
   decomposed.reserve(text.size() * 2);
   for (const char16_t unit : text) {
+    const auto begin = IsAscii(unit) ? kAccentedLetters.end() : kAccentedLetters.begin();
     const auto letter =
-        std::find_if(kAccentedLetters.begin(), kAccentedLetters.end(),
+        std::find_if(begin, kAccentedLetters.end(),
                      [unit](const AccentedLetter& entry) { return entry.letter == unit; });
     if (letter == kAccentedLetters.end()) {
       decomposed.push_back(unit);

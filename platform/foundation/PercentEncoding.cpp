@@ -26,6 +26,7 @@ std::string PercentEncodePath(std::string_view bytes, bool firstSegmentIsUrlStar
 }
 
 std::string PercentDecode(std::string_view text) {
+  if (text.find('%') == text.npos) return std::string(text);
   std::string bytes;
   bytes.reserve(text.size());
   for (std::size_t i = 0; i < text.size(); ++i) {

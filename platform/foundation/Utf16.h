@@ -11,6 +11,9 @@ constexpr char16_t kFirstHighSurrogate = 0xD800;
 constexpr char16_t kFirstLowSurrogate = 0xDC00;
 constexpr char32_t kFirstSupplementary = 0x10000;
 
+constexpr bool IsAscii(char16_t unit) {
+  return unit < 0x80;
+}
 constexpr bool IsHighSurrogate(char16_t unit) {
   return unit >= kFirstHighSurrogate && unit <= 0xDBFF;
 }

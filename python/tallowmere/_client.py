@@ -82,18 +82,20 @@ def _own(pipe: IO[bytes]) -> int:
 
 
 def _write(descriptor: int, data: bytearray) -> int:
-    """Writes what there is room for. A SIGPIPE of it does not reach the program."""
-    blocked = signal.pthread_sigmask(signal.SIG_BLOCK, {signal.SIGPIPE})
+    """Writes what there is room for. A SIGPIPE of it does not reach a program that has none pending."""
+    before = signal.pthread_sigmask(signal.SIG_BLOCK, ())
     try:
+        signal.pthread_sigmask(signal.SIG_BLOCK, {signal.SIGPIPE})
+        was_pending = signal.SIGPIPE in signal.sigpending()
         return os.write(descriptor, data)
     except BlockingIOError:
         return 0
     except BrokenPipeError:
-        if signal.SIGPIPE not in blocked:
+        if not was_pending:
             signal.sigtimedwait({signal.SIGPIPE}, 0)
         return len(data)  # nobody reads it; the end of the service's output is what counts
     finally:
-        signal.pthread_sigmask(signal.SIG_SETMASK, blocked)
+        signal.pthread_sigmask(signal.SIG_SETMASK, before)
 
 
 def _find_service() -> str:
@@ -125,9 +127,9 @@ class Client:
     deadline: seconds that the service has for each answer.
 
     A request raises ServiceError when the service cannot be started, has ended, misses the deadline or answers
-    what the protocol does not know; the next request starts another one. Paths are absolute POSIX paths, and
-    answered as str (os.fsdecode). A str for an HFS name or path is sent in Mac Roman, and answers are bytes in it
-    (hfs_name_to_str). What does not exist is None.
+    what the protocol does not know; the next request starts another one. Paths are absolute POSIX paths (what is
+    answered to others is not to be relied on), and answered as str (os.fsdecode). A str for an HFS name or path is
+    sent in Mac Roman, and answers are bytes in it (hfs_name_to_str). What does not exist is None.
     """
 
     def __init__(self, service: str | os.PathLike[str] | None = None, deadline: float = 10.0) -> None:
@@ -178,7 +180,8 @@ class Client:
 
         try:
             for each in requests:
-                waiting.append(self._submit(each))
+                waiting.append(_Waiting(each))
+                self._submit(waiting[-1])
                 size += len(each.payload or b"")
                 while len(waiting) >= MOST_REQUESTS_UNDER_WAY or size >= MOST_BYTES_UNDER_WAY:
                     yield first_answer()
@@ -188,13 +191,16 @@ class Client:
             for rest in waiting:  # nobody wants these answers any more
                 rest.answer = rest.request.otherwise
 
-    def _submit(self, request: Request[T]) -> _Waiting[T]:
-        waiting = _Waiting(request)
-        if request.payload is not None:
-            self._silent = self._silent or not self._pending
+    def _submit(self, waiting: _Waiting[Any]) -> None:
+        if waiting.request.payload is None:
+            return
+        self._silent = self._silent or not self._pending
+        try:
             self._pending.append(waiting)
-            self._outgoing += request.payload
-        return waiting
+            self._outgoing += waiting.request.payload
+        except BaseException:  # what waits and what is written may differ; the next service gets both anew
+            self._stop()
+            raise
 
     def _await(self, waiting: _Waiting[Any]) -> None:
         """Exchanges bytes until waiting has its answer or its error."""
@@ -308,7 +314,10 @@ class Client:
         return self.ask(request.add_hfs_name(folder, name))
 
     def get_fsspec(self, path: Path) -> FSSpec | None:
-        """The record of an item, also of a new one in an existing folder."""
+        """The record of an item, also of a new one in an existing folder.
+
+        The record of a new item leads nowhere when a file or a link, also one to a folder, is in front of its name.
+        """
         return self.ask(request.get_fsspec(path))
 
     def set_file_ref_from_fsspec_data(self, spec: FSSpec) -> str | None:

@@ -49,6 +49,8 @@ class FSSpec:
     name: bytes
 
     def __post_init__(self) -> None:
+        if not (isinstance(self.v_ref_num, int) and isinstance(self.par_id, int) and isinstance(self.name, bytes)):
+            raise ValueError("a record holds two whole numbers and the bytes of a name")
         if not (-0x8000 <= self.v_ref_num < 0x8000 and -0x80000000 <= self.par_id < 0x80000000):
             raise ValueError("a record holds a number of 16 bits and an id of 32 bits, with a sign")
         if len(self.name) > MOST_NAME_BYTES:

@@ -1,7 +1,8 @@
 """The requests as values, for Client.ask and Client.batch. Each is what the Client's method of that name asks.
 
 A text that cannot be sent (a NUL within, too long, a str without an encoding) makes a request that is not
-sent: its answer is None, as for a thing that does not exist. A number out of its range is a ValueError.
+sent: its answer is None, as for a thing that does not exist. A number that is out of its range, or not whole where
+it has to be, is a ValueError.
 """
 
 from __future__ import annotations
@@ -66,6 +67,12 @@ def _checked(value: Number, least: int, most: int, what: str) -> Number:
     return value
 
 
+def _whole(value: int, least: int, most: int, what: str) -> int:
+    if not isinstance(value, int):
+        raise ValueError(f"{what} is no whole number: {value}")
+    return _checked(value, least, most, what)
+
+
 def _optional(code: int, decode: Callable[[Reader], T | None], *fields: bytes | None) -> Request[T | None]:
     """A request that is asked when none of its fields is None."""
     askable = [field for field in fields if field is not None]
@@ -94,6 +101,7 @@ def full_path_and_length(path: Path, size: int, keep_folders: bool) -> Request[T
     def decode(reader: Reader) -> tuple[int, bytes]:
         return reader.number(U16), reader.padded(size)
 
+    _whole(size, 1, MOST_FULL_PATH_BYTES, "a size in bytes")
     encoded = _path(path)
     payload = None if encoded is None else U16.pack(1) + text(encoded) + U16.pack(size) + U8.pack(keep_folders)
     return Request(payload, decode, (1, b":"))
@@ -130,7 +138,7 @@ def get_vol_refnum_by_hfs_name(name: HFSText) -> Request[Optional[int]]:
 
 
 def get_hfs_volume_name(number: int) -> Request[Optional[bytes]]:
-    return _optional(4, _flagged_name, I16.pack(_checked(number, -0x8000, 0x7FFF, "a volume reference number")))
+    return _optional(4, _flagged_name, I16.pack(_whole(number, -0x8000, 0x7FFF, "a volume reference number")))
 
 
 def get_hfs_name(path: Path) -> Request[Optional[bytes]]:
@@ -171,8 +179,8 @@ def get_aiff_export_settings(
     payload = (
         U16.pack(10)
         + U32.pack(round(_checked(rate * _FIXED_ONE, 0, 0xFFFFFFFF, "a rate in hertz × 65536")))
-        + U32.pack(_checked(sample_size, 0, 0xFFFF, "a sample size in bits"))
-        + U8.pack(_checked(channels, 0, 0xFF, "a number of channels"))
+        + U32.pack(_whole(sample_size, 0, 0xFFFF, "a sample size in bits"))
+        + U8.pack(_whole(channels, 0, 0xFF, "a number of channels"))
         + U32.pack(int.from_bytes(code, "big"))
     )
     return Request(payload, decode, ExportSettings(0, b""))

@@ -9,8 +9,11 @@ import signal
 import sys
 import threading
 import time
+import types
+from typing import Any
 
-from tallowmere import Client, DeadlineMissed, ProtocolError, ServiceEnded, ServiceError
+import tallowmere._client
+from tallowmere import Client, DeadlineMissed, ProtocolError, ServiceEnded, ServiceError, request
 
 from .support import SERVICE, FolderTest, children, descriptors, kill_child
 
@@ -172,6 +175,50 @@ class Nonsense(FailureTest):
         self.assert_fails(client, ProtocolError, "answered what it was not asked")
 
 
+class Refusals(FailureTest):
+    def test_a_result_that_is_an_error_has_no_path(self) -> None:
+        result = (-43).to_bytes(2, sys.byteorder, signed=True)
+        for answered, path in ((bytes(2), "/x"), (result, None)):
+            answer = answered + (3).to_bytes(2, sys.byteorder) + b"/x\0MWLT"
+            client = self.client(self.program(ANSWER.format(answer)))
+            self.assertEqual(client.make_file_ref_from_path("volume:x"), path)
+
+    def test_a_size_that_is_always_enough_takes_one_request(self) -> None:
+        answer = (7).to_bytes(2, sys.byteorder) + b"volume:".ljust(768, b"\0") + b"MWLT"
+        client = self.client(self.program(ANSWER.format(answer)))
+        self.assertEqual(client.make_full_path("/", 768), b"volume:")
+
+
+class Stop(BaseException):
+    """What an interrupt at some line of the client raises."""
+
+
+def stopped_at_line(number: int, act: Any) -> bool:
+    """Calls act and raises Stop in front of the line of the client that is executed as that one; False where it
+    has fewer."""
+    executed = 0
+
+    def trace(frame: types.FrameType, event: str, _: Any) -> Any:
+        nonlocal executed
+        if frame.f_code.co_filename != tallowmere._client.__file__:
+            return None
+        executed += event == "line"
+        if event == "line" and executed == number:
+            sys.settrace(None)
+            raise Stop
+        return trace
+
+    before = sys.gettrace()
+    sys.settrace(trace)
+    try:
+        act()
+    except Stop:
+        return True
+    finally:
+        sys.settrace(before)
+    return False
+
+
 class Lives(FailureTest):
     def test_the_service_starts_with_the_first_request_and_ends_with_the_block(self) -> None:
         with Client(SERVICE) as client:
@@ -217,6 +264,22 @@ class Lives(FailureTest):
         self.assertEqual(children(), [])
         self.assertIsNone(client.get_vol_refnum_by_hfs_name("no such volume"))
 
+    def test_an_interrupt_at_any_line_does_not_shift_the_answers(self) -> None:
+        client = self.client(deadline=10)
+        mask = signal.pthread_sigmask(signal.SIG_BLOCK, ())  # may stay as it is set for a write
+        self.addCleanup(signal.pthread_sigmask, signal.SIG_SETMASK, mask)
+
+        def ask(first: int) -> list[Any]:
+            names = [f"{number}" for number in range(first, first + 3)]
+            return list(client.batch(request.add_hfs_name("/nowhere", name) for name in names))
+
+        for line in range(1, 10000):
+            self.assert_answers(client)
+            if not stopped_at_line(line, lambda: ask(0)):
+                break
+            self.assertEqual(ask(3), ["/nowhere/3", "/nowhere/4", "/nowhere/5"], line)
+        self.assertGreater(line, 100)
+
 
 class Hosts(FolderTest):
     def test_a_default_sigpipe_does_not_end_the_host(self) -> None:
@@ -231,6 +294,24 @@ class Hosts(FolderTest):
             stand_in,
         )
         self.assertEqual(said, "The service ended with status 3 before it had answered. set() set()\n")
+
+    def test_a_host_that_blocks_sigpipe_keeps_its_own_and_gets_no_other(self) -> None:
+        stand_in = self.program("os.close(0)\ntime.sleep(0.5)\nsys.exit(3)")
+        said = self.run_host(
+            """
+            signal.signal(signal.SIGPIPE, signal.SIG_DFL)
+            signal.pthread_sigmask(signal.SIG_BLOCK, {signal.SIGPIPE})
+            for own in (False, True):
+                if own: signal.raise_signal(signal.SIGPIPE)
+                with Client(sys.argv[1]) as client:
+                    list(client.batch([request.get_hfs_name("/" + "a" * 60000)] * 2))  # more than a pipe takes
+                print(own, signal.SIGPIPE in signal.sigpending(), flush=True)
+                if own: signal.sigtimedwait({signal.SIGPIPE}, 0)
+            signal.pthread_sigmask(signal.SIG_UNBLOCK, {signal.SIGPIPE})
+            """,
+            stand_in,
+        )
+        self.assertEqual(said, "False False\nTrue True\n")
 
     def test_a_host_without_standard_descriptors(self) -> None:
         for closed in ("0", "1", "01", "12", "012"):

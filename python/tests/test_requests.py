@@ -140,12 +140,12 @@ class FullPaths(ServiceTest):
             self.client.make_full_path("relative", 1)
 
     def test_sizes_beyond_the_protocol_are_refused(self) -> None:
-        for size in (0, -1, 1025):
+        for size in (0, -1, 1025, 600.5, 1000.0):
             with self.subTest(size), self.assertRaises(ValueError):
                 self.client.make_full_path("/", size)
 
     def test_a_request_takes_only_sizes_that_are_always_enough(self) -> None:
-        for size in (767, 1025):
+        for size in (767, 1025, 1000.0):
             with self.subTest(size), self.assertRaises(ValueError):
                 request.make_full_path("/", size)
         for size in (768, 1024):
@@ -169,7 +169,7 @@ class Volumes(ServiceTest):
     def test_a_number_that_has_more_than_16_bits_is_refused(self) -> None:
         for number in (-0x8000, 0x7FFF):
             self.assertIsNone(self.client.get_hfs_volume_name(number))
-        for number in (-0x8001, 0x8000):
+        for number in (-0x8001, 0x8000, -1.0):
             with self.assertRaises(ValueError):
                 self.client.get_hfs_volume_name(number)
 
@@ -243,7 +243,7 @@ class ExportSettings(ServiceTest):
         for values in (
             (65536, 16, 2, "twos"), (-1, 16, 2, "twos"), (float("nan"), 16, 2, "twos"), (44100, 65536, 2, "twos"),
             (44100, -1, 2, "twos"), (44100, 16, 256, "twos"), (44100, 16, -1, "twos"), (44100, 16, 2, "two"),
-            (44100, 16, 2, b"twoss"),
+            (44100, 16, 2, b"twoss"), (44100, 16.5, 2, "twos"), (44100, 16, 2.0, "twos"),
         ):  # fmt: skip
             with self.subTest(values), self.assertRaises(ValueError):
                 self.client.get_aiff_export_settings(*values)

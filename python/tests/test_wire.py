@@ -48,6 +48,7 @@ class Records(unittest.TestCase):
     def test_numbers_and_names_that_do_not_fit_are_errors(self) -> None:
         for fields in (
             (0x8000, 2, b""), (-0x8001, 2, b""), (0, 0x80000000, b""), (0, -0x80000001, b""), (0, 2, b"a" * 64),
+            (0.0, 2, b"a"), (0, 1.5, b"a"), ("0", 2, b"a"), (0, None, b"a"), (0, 2, "a"), (0, 2, [97]),
         ):  # fmt: skip
             with self.subTest(fields), self.assertRaises(ValueError):
                 FSSpec(*fields)

@@ -307,7 +307,7 @@ TEST(Census, TakesARelativeFolderAndALinkToOne) {
 
 // The path of a shell script that takes the service's place.
 std::string Impostor(const TemporaryFolder& folder, const std::string& script) {
-  const std::string path = folder.MakeFile("impostor", "#!/bin/sh\n" + script + "\n").string();
+  std::string path = folder.MakeFile("impostor", "#!/bin/sh\n" + script + "\n").string();
   chmod(path.c_str(), 0755);
   return path;
 }

@@ -82,7 +82,7 @@ TEST(CommandLine, AiffPrintsTheSettingsAsATree) {
 
 TEST(CommandLine, AiffTellsTheResultOfASoundThatIsRefused) {
   ChildProgram cli(TALLOWMERE_CLI, {"aiff", "--format", "mp3 "});
-  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the exporter refuses this sound: -206\n");
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: no AIFF file can hold this format\n");
   EXPECT_EQ(cli.Wait(), 1);
 }
 
@@ -114,9 +114,17 @@ TEST(CommandLine, WrongUsageIsStatus2) {
                                                     {"spec"},
                                                     {"append", "/"},
                                                     {"--deadline", "0", "volumes"},
+                                                    {"--deadline", "nan", "volumes"},
+                                                    {"aiff", "--rate", "nan"},
+                                                    {"aiff", "--rate", "65536"},
+                                                    {"aiff", "--rate", "65535.999999"},
+                                                    {"aiff", "--rate", "-1"},
                                                     {"census", "/nonexistent"}}) {
     ChildProgram cli(TALLOWMERE_CLI, arguments);
-    EXPECT_NE(cli.ReadErrorsToEnd(), "");
+    const std::string error = cli.ReadErrorsToEnd();
+    EXPECT_THAT(error, StartsWith("tallowmere-cli: "));
+    EXPECT_THAT(error, testing::EndsWith("; --help tells more\n"));
+    EXPECT_EQ(std::count(error.begin(), error.end(), '\n'), 1) << error;
     EXPECT_EQ(cli.Wait(), 2);
   }
 }

@@ -18,6 +18,7 @@ namespace {
 using nlohmann::json;
 using testing::ElementsAre;
 using testing::HasSubstr;
+using testing::Not;
 
 struct Output {
   int status;
@@ -241,19 +242,25 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
               prefix + "/proc/self/status: it is on no volume\n");
   }
   EXPECT_EQ(errorsOf({"path", "1:2"}),
-            prefix + "1:2: a record is volume:parent:name or 140 hexadecimal digits\n");
+            prefix +
+                "1:2: a record is volume:parent:name, the name of at most 63 Mac Roman "
+                "characters, or 140 hexadecimal digits\n");
   EXPECT_EQ(errorsOf({"path", "99:2:x"}), prefix + "99:2:x: no volume has the number 99\n");
   EXPECT_EQ(errorsOf({"path", "0:3:x"}),
             prefix + "0:3:x: there is no such item, nor a folder for it\n");
   EXPECT_EQ(errorsOf({"posix", "no such volume:x"}),
             prefix + "no such volume:x: no volume is called \"no such volume\"\n");
   EXPECT_EQ(errorsOf({"posix", "a name that nobody has"}),
-            prefix + "a name that nobody has: there is no such item\n");
+            prefix + "a name that nobody has: there is no such item that can be reached\n");
   EXPECT_EQ(errorsOf({"posix", std::string(256, 'x')}),
             prefix + std::string(256, 'x') + ": an HFS path has at most 255 bytes\n");
   EXPECT_EQ(errorsOf({"posix", "\xE6\x97\xA5"}),
             prefix + "\xE6\x97\xA5: it has a character that HFS names cannot have\n");
-  EXPECT_EQ(errorsOf({"append", missing, "x"}), prefix + "x: there is no folder " + missing + "\n");
+  EXPECT_EQ(errorsOf({"append", missing, "x"}),
+            prefix + "x: there is no folder \"" + missing + "\"\n");
+  EXPECT_EQ(errorsOf({"append", "", "x"}), prefix + "x: there is no folder \"\"\n");
+  EXPECT_EQ(errorsOf({"name", mFolder.MakeLink("dangling", "nowhere")}),
+            prefix + mHere + "/dangling: the link leads nowhere\n");
   EXPECT_EQ(errorsOf({"append", mHere, "\xE6\x97\xA5"}),
             prefix + "\xE6\x97\xA5: it has a character that HFS names cannot have\n");
   EXPECT_EQ(errorsOf({"append", mHere, std::string(256, 'x')}),
@@ -264,6 +271,11 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
   const Output mixed = Cli({"name", missing, mFile});
   EXPECT_EQ(mixed.text, "a/b\n");
   EXPECT_EQ(mixed.status, 1);
+}
+
+TEST_F(Conversion, APathThatIsTooLongIsSaid) {
+  const Output output = Cli({"spec", "--json", "/" + std::string(70000, 'x')});
+  EXPECT_EQ(json::parse(output.text)["error"], "File name too long");
 }
 
 TEST_F(Conversion, WithOtherVolumesARecordOfAnUnknownVolumeIsLookedForElsewhere) {
@@ -279,6 +291,51 @@ TEST_F(Conversion, AServiceThatCannotBeStartedIsSaidOnce) {
             "tallowmere-cli: the service /nonexistent could not be started: No such file or "
             "directory\n");
   EXPECT_EQ(output.status, 1);
+}
+
+// A service that dies of a request, the first one excepted, and is whole again after that.
+TEST_F(Conversion, AServiceThatDiesOfAnItemIsSaidOfThatItemAndTheRestIsAnswered) {
+  const std::string died = mFolder.Path() / "died";
+  const std::string script = mFolder.MakeFile(
+      "mortal", "#!/bin/sh\n[ -e '" + died + "' ] && exec '" TALLOWMERE_SERVICE "' $1\ntouch '" +
+                    died + "'\nhead -c 4 >/dev/null; printf '\\1\\5\\0Root\\0MWLT'\nexit 0\n");
+  chmod(script.c_str(), 0755);
+  for (const char* const command : {"name", "hfs", "spec"}) {
+    const Output output = Cli({"--service", script, command, "--json", mFile, mHere, mFile});
+    const auto lines = Lines(output.text);
+    ASSERT_EQ(lines.size(), 3u) << command;
+    EXPECT_EQ(json::parse(lines[0])["error"], "the service ended before it answered") << command;
+    EXPECT_FALSE(json::parse(lines[1]).contains("error")) << command;
+    EXPECT_EQ(output.status, 1);
+    unlink(died.c_str());
+  }
+}
+
+TEST_F(Conversion, AReasonThatIsNoUtf8IsJsonAllTheSame) {
+  const Output output = Cli({"append", "--json", "\xFF", "x"});
+  EXPECT_EQ(json::parse(output.text)["error"], "there is no folder \"\xEF\xBF\xBD\"");
+  EXPECT_EQ(output.status, 1);
+}
+
+TEST_F(Conversion, LinksOnTheWayAreResolved) {
+  const std::string folder = mFolder.MakeFolder("real");
+  const std::string file = mFolder.MakeFile("real/file");
+  const std::string link = mFolder.MakeLink("link", "real");
+  for (const char* const command : {"hfs", "spec", "identify", "name"}) {
+    for (const std::string name : {"/file", "/../a:b", "/.", "/.."}) {
+      const std::string direct = Cli({command, folder + name}).text;
+      EXPECT_EQ(Cli({command, link + name}).text, direct) << command << name;
+      EXPECT_NE(direct, "");
+    }
+  }
+  EXPECT_EQ(Cli({"spec", link + "/new"}).text, Cli({"spec", folder + "/new"}).text);
+  EXPECT_EQ(Cli({"append", link, "file"}).text, file + "\n");
+}
+
+TEST_F(Conversion, TheShortestDeadlineIsOne) {
+  const Output output = Cli({"--deadline", "0.0005", "volumes"});
+  EXPECT_THAT(output.errors, testing::AnyOf("", HasSubstr("did not answer in time")));
+  EXPECT_EQ(Cli({"--deadline", "inf", "name", "/"}).status, 0);
 }
 
 TEST_F(Conversion, AServiceThatDoesNotAnswerIsSaidWhenTheDeadlineHasPassed) {
@@ -323,6 +380,7 @@ TEST_F(Conversion, AServiceThatWorksPassesTheCheckAndAnotherDoesNot) {
   const Output good = Cli({"serve-check"});
   EXPECT_EQ(good.status, 0);
   EXPECT_EQ(Lines(good.text).size(), 11u);
+  EXPECT_THAT(good.text, Not(HasSubstr("not fit")));
   for (const char* const code :
        {" 1 ", " 2 ", " 3 ", " 4 ", " 5 ", " 6 ", " 7 ", " 8 ", " 9 ", "10 "}) {
     EXPECT_THAT(good.text, HasSubstr(std::string("  ") + code)) << code;
@@ -330,6 +388,7 @@ TEST_F(Conversion, AServiceThatWorksPassesTheCheckAndAnotherDoesNot) {
   const Output bad = Cli({"--service", "/bin/true", "serve-check"});
   EXPECT_EQ(bad.status, 1);
   EXPECT_THAT(bad.text, HasSubstr("the service ended before it answered"));
+  EXPECT_EQ(Lines(bad.text).size(), 2u);
 }
 
 TEST_F(Conversion, EachCommandHasHelpWithExamples) {

@@ -45,6 +45,15 @@ TEST(Terminal, ControlCharactersOfAPathAreShownAndNotSent) {
   EXPECT_THAT(OnATerminal(command + " | cat"), HasSubstr("\x1B[1m"));
 }
 
+TEST(Terminal, AComplaintTakesTheProgressBarAway) {
+  const std::string output =
+      OnATerminal("(echo /; sleep 1; echo /; echo /nonexistent) | $CLI name - >/dev/null");
+  EXPECT_THAT(output, HasSubstr(" items"));
+  EXPECT_THAT(output, HasSubstr("\r\x1B[K\x1B[31mtallowmere-cli:"));
+  EXPECT_THAT(OnATerminal("export TERM=dumb; (echo /; sleep 1; echo /) | $CLI name - >/dev/null"),
+              Not(HasSubstr("\x1B[")));
+}
+
 TEST(Terminal, LongWorkHasAProgressBarAndShortWorkHasNone) {
   const std::string slowly =
       "(echo /; sleep 1; echo /; sleep 0.4; echo /) | $CLI name - >/dev/null";

@@ -283,6 +283,20 @@ TEST(Batch, TheDeadlineOfARequestCountsFromTheAnswerBeforeIt) {
   EXPECT_THAT(messages, Each(""));
 }
 
+TEST(Batch, TheDeadlineDoesNotCountBeforeARequestIsSent) {
+  const TemporaryFolder folder;
+  Client client(
+      {.service = test::Impostor(folder, "head -c 4 >/dev/null; sleep 0.3; printf '" +
+                                             std::string(kNoSuchVolume) + "'; exec cat >/dev/null"),
+       .deadline = milliseconds(1000)});
+  Batch batch(client);
+  std::string message = "not answered";
+  batch.Add(request::GetHFSVolumeName(0), [&](const auto& name) { message = MessageOf(name); });
+  std::this_thread::sleep_for(milliseconds(1100));
+  batch.Finish();
+  EXPECT_EQ(message, "");
+}
+
 TEST(Batch, AnAnswerThatCameInTimeCountsHoweverLateItIsLookedAt) {
   Client client({.service = TALLOWMERE_SERVICE, .deadline = milliseconds(1500)});
   Batch batch(client);

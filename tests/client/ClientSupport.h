@@ -32,7 +32,7 @@ inline Client StartClient() {
 
 // The path of a shell script, run in its own folder, that takes the service's place.
 inline std::string Impostor(const TemporaryFolder& folder, const std::string& script) {
-  const std::string path =
+  std::string path =
       folder
           .MakeFile("impostor", "#!/bin/sh\ncd '" + folder.Path().string() + "'\n" + script + "\n")
           .string();

@@ -167,8 +167,13 @@ TEST(Client, LeavesAProgramThatIgnoresTheEndOfItsChildrenAlone) {
 TEST(Client, TheServiceIsFoundOnTheSearchPath) {
   const TemporaryFolder folder;
   folder.MakeLink("tallowmere", TALLOWMERE_SERVICE);
-  const std::string before = getenv("PATH");
-  setenv("PATH", ("/nonexistent::" + folder.Path().string()).c_str(), 1);
+  folder.MakeFolder("earlier/tallowmere");
+  const char* const variable = getenv("PATH");
+  const std::string before = variable == nullptr ? "" : variable;
+  setenv(
+      "PATH",
+      ("/nonexistent::" + (folder.Path() / "earlier:").string() + folder.Path().string()).c_str(),
+      1);
   Client client;
   const auto found = client.GetHFSVolumeName(0);
   setenv("PATH", "/nonexistent", 1);

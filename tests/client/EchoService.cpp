@@ -2,9 +2,11 @@
 // as pipes are.
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cstdint>
 #include <cstring>
+#include <string_view>
 
 namespace {
 
@@ -13,6 +15,8 @@ constexpr std::size_t kCode = 2;
 constexpr std::size_t kFlag = 1;
 constexpr std::size_t kCount = 2;
 constexpr std::size_t kRoom = 2;
+
+constexpr std::string_view kTrailer = "MWLT";
 
 bool ReadAll(char* bytes, std::size_t size) {
   while (size > 0) {
@@ -44,8 +48,8 @@ int main() {
     char* const answer = buffer.data() + kCode - kFlag;
     if (!ReadAll(answer + kFlag + kCount, count + kRoom)) return 1;
     answer[0] = 1;
-    std::memcpy(answer + kFlag + kCount + count, "MWLT", 4);
-    if (!WriteAll(answer, kFlag + kCount + count + 4)) return 1;
+    std::copy(kTrailer.begin(), kTrailer.end(), answer + kFlag + kCount + count);
+    if (!WriteAll(answer, kFlag + kCount + count + kTrailer.size())) return 1;
   }
   return 0;
 }

@@ -2,6 +2,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <ctime>
 #include <thread>
 
 #include "client/ClientSupport.h"
@@ -19,7 +20,6 @@ using test::kNotInTime;
 using test::MessageOf;
 using test::TemporaryFolder;
 using testing::EndsWith;
-using testing::StartsWith;
 
 constexpr const char* kTakeRequest = "head -c 4 >/dev/null\n";
 
@@ -100,6 +100,18 @@ TEST(Client, AServiceThatAnswersTwiceIsSaidByTheNextRequest) {
   EXPECT_TRUE(client.GetFSSpec("/"));
 }
 
+TEST(Client, AServiceThatAnswersOnceMoreLaterIsSaidByTheNextRequest) {
+  const TemporaryFolder folder;
+  const std::string answer = "printf '\\000\\001\\000\\000MWLT'";
+  Client client({.service = ImpostorOnce(folder, kTakeRequest + answer + "; sleep 0.1; " + answer +
+                                                     "; touch answered; exec cat >/dev/null")});
+  EXPECT_TRUE(client.GetHFSVolumeName(32767));
+  while (!exists(folder.Path() / "answered")) std::this_thread::sleep_for(milliseconds(10));
+  EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)),
+            "the service answered what it had not been asked");
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
+}
+
 TEST(Client, AServiceKilledBetweenRequestsIsSaidAndStartedAgain) {
   const test::MortalService service;
   Client client({.service = service.Path()});
@@ -157,8 +169,38 @@ TEST(Client, AServiceThatAnswersAByteAtATimeMissesTheDeadlineToo) {
 
 TEST(Client, AServiceThatNoLongerReadsMissesTheDeadline) {
   const TemporaryFolder folder;
-  Client client({.service = Impostor(folder, "exec sleep 60 <&-"), .deadline = milliseconds(300)});
+  Client client({.service = Impostor(folder, "exec sleep 60 <&-"), .deadline = milliseconds(600)});
   EXPECT_EQ(MessageOf(client.GetHFSName(std::string(65534, 'x'))), kNotInTime);
+}
+
+TEST(Client, WaitingForAServiceThatNoLongerReadsTakesNoProcessorTime) {
+  const TemporaryFolder folder;
+  Client client({.service = Impostor(folder, "exec sleep 60 <&-"), .deadline = milliseconds(600)});
+  const std::clock_t before = std::clock();
+  EXPECT_FALSE(client.GetHFSName(std::string(65534, 'x')));
+  EXPECT_LT(std::clock() - before, CLOCKS_PER_SEC / 5);
+}
+
+TEST(Client, AServiceThatTakesNothingOfARequestMissesTheDeadline) {
+  const TemporaryFolder folder;
+  Client client(
+      {.service = Impostor(folder, std::string(kTakeRequest) + "printf '\\000\\001\\000\\000MWLT'\n"
+                                                               "exec <&-; sleep 60"),
+       .deadline = milliseconds(500)});
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
+  std::this_thread::sleep_for(milliseconds(100));
+  EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kNotInTime);
+}
+
+TEST(Client, TheDeadlineCountsFromARequestThatNobodyTakes) {
+  const TemporaryFolder folder;
+  Client client(
+      {.service = Impostor(folder, std::string(kTakeRequest) + "printf '\\000\\001\\000\\000MWLT'\n"
+                                                               "exec <&-; sleep 1.6"),
+       .deadline = milliseconds(1000)});
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
+  std::this_thread::sleep_for(milliseconds(1200));
+  EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kEnded);
 }
 
 TEST(Client, TheDeadlineCountsFromEachRequest) {
@@ -189,6 +231,42 @@ TEST(Client, ADeadlineOfNothingIsMissedAtOnce) {
     EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kNotInTime);
     EXPECT_TRUE(test::HasNoChild());
   }
+}
+
+TEST(Client, ADeadlineOfNothingStartsNoService) {
+  Client client({.service = "/nonexistent/tallowmere", .deadline = milliseconds(0)});
+  EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kNotInTime);
+}
+
+TEST(Client, ACopyOfThisProcessLeavesTheServiceAlone) {
+  Client client = test::StartClient();
+  ASSERT_TRUE(client.GetHFSVolumeName(0));
+  const pid_t copy = fork();
+  if (copy == 0) {
+    { const Client itsOwn = std::move(client); }
+    _exit(0);
+  }
+  waitpid(copy, nullptr, 0);
+  EXPECT_TRUE(client.GetHFSVolumeName(0));
+}
+
+TEST(Client, ABrokenPipeSignalThatWasPendingStaysPending) {
+  sigset_t brokenPipe;
+  sigemptyset(&brokenPipe);
+  sigaddset(&brokenPipe, SIGPIPE);
+  sigset_t before;
+  pthread_sigmask(SIG_BLOCK, &brokenPipe, &before);
+  raise(SIGPIPE);
+  const TemporaryFolder folder;
+  Client client({.service = Impostor(folder, "exec sleep 60 <&-"), .deadline = milliseconds(200)});
+  EXPECT_FALSE(client.GetHFSVolumeName(0));
+  EXPECT_FALSE(client.GetHFSVolumeName(0));
+  sigset_t pending;
+  sigpending(&pending);
+  EXPECT_TRUE(sigismember(&pending, SIGPIPE));
+  const timespec atOnce{};
+  sigtimedwait(&brokenPipe, nullptr, &atOnce);
+  pthread_sigmask(SIG_SETMASK, &before, nullptr);
 }
 
 TEST(Client, AThousandRestartsLeaveNeitherProcessNorDescriptor) {

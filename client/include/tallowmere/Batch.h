@@ -3,7 +3,7 @@
 //
 // A request that the service does not survive gets the error; those behind it are asked again of a
 // new service. At most 256 requests or 64 KiB are under way, whichever is less, so that neither
-// memory nor the pipes fill up.
+// memory nor the pipes fill up; a request that is larger goes alone.
 #pragma once
 
 #include <tallowmere/Client.h>

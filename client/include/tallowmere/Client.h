@@ -2,7 +2,8 @@
 //
 // The service is started with the first request. When it has died, missed a deadline or answered
 // what the protocol does not know, the request in hand gives the error and the next one starts it
-// again. A client belongs to one thread at a time, and to the process that made it.
+// again. A client belongs to one thread at a time, and to the process that made it. POSIX paths are
+// absolute, as Request.h says.
 #pragma once
 
 #include <tallowmere/Request.h>
@@ -31,6 +32,7 @@ struct ClientOptions {
 class Client {
  public:
   explicit Client(ClientOptions options = {});
+  // REQUIRES: a client that was moved from is only assigned to or destroyed.
   Client(Client&& other) noexcept;
   Client& operator=(Client&& other) noexcept;
   // Ends the service and waits for it; one that does not end within a second is killed.

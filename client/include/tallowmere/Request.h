@@ -1,9 +1,12 @@
 // One question to the service, ready to be sent, and how its answer reads. A value: it can be made
 // anywhere, kept, and asked more than once, by Client::Ask or in a Batch.
 //
-// What the service cannot be asked (a NUL within a text, a name or path longer than the protocol or
-// an HFS name can be) is not sent: such a request is answered at once, with what each function
-// says.
+// POSIX paths are absolute: what is answered to others is not to be relied on. "~" or "~user" at
+// the beginning of one stands for the home folder of the service's user, or of that user.
+//
+// What the service cannot be asked (a NUL within a text, but for the name in SetFileRefFromFSSpec;
+// a name or path longer than the protocol or an HFS name can be) is not sent: such a request is
+// answered at once, with what each function says.
 #pragma once
 
 #include <tallowmere/Types.h>
@@ -42,7 +45,8 @@ namespace request {
 
 // The full HFS path of the folder at a POSIX path, or of the folder that holds the file there, with
 // a colon behind it: never above 767 bytes, as folders beyond 511 bytes are left out, the outermost
-// first. A colon for what is on no volume, and for what cannot be asked.
+// first. The volume's name and a colon where the path of a file has a link in the place of its
+// folder. A colon for what is on no volume, and for what cannot be asked.
 Request<std::string> MakeFullPath(std::string_view path);
 
 // The POSIX path of the item with that HFS path, or none. More than 255 bytes are no HFS path.
@@ -63,8 +67,9 @@ Request<std::optional<std::string>> GetHFSName(std::string_view path);
 // A name above 255 bytes has none.
 Request<std::optional<std::string>> AddHFSName(std::string_view folder, std::string_view name);
 
-// The record of the item at a POSIX path, or none. An item that does not exist has one where its
-// folder does.
+// The record of the item at a POSIX path, or none. A new item in an existing folder has one too. So
+// has one whose path has a file or a link, also one to a folder, in the place of its folder; that
+// record leads nowhere.
 Request<std::optional<FSSpec>> GetFSSpec(std::string_view path);
 
 // The POSIX path of the item with that HFS name (or HFS path) in the folder with the id parID, or

@@ -156,5 +156,23 @@ TEST_F(AVolumeThatMoves, IsSearchedWhereItIsNow) {
   EXPECT_EQ(ItemOf(root), PathTo("b/volume/folder"));
 }
 
+TEST_F(AVolumeThatMoves, IsFoundByItsNumberWhenNobodyHasLookedAtItBefore) {
+  MountTable& table = MountTable::OfThisProcess();
+  VolumeNumber number = 0;
+  for (std::size_t i = 0; const VolumePointer volume = table.AtIndex(i); ++i) {
+    if (volume->MountPoint() == PathTo("a/volume")) number = volume->Number();
+  }
+  ASSERT_NE(number, 0);
+  const std::uint64_t inode = ReadItem(AT_FDCWD, PathTo("a/volume/folder").c_str())->inode;
+  Move();
+  FSSpec missing{};
+  EXPECT_EQ(FSMakeFSSpec(number, kRootFolderID, Str255Of("missing").bytes, &missing), fnfErr);
+  EXPECT_EQ(ParentOf(missing), kRootFolderID);
+  FSSpec below{};
+  EXPECT_EQ(FSMakeFSSpec(number, kRootFolderID, Str255Of(":folder:below").bytes, &below), noErr);
+  EXPECT_EQ(ParentOf(below), inode);
+  EXPECT_EQ(ItemOf(below), PathTo("b/volume/folder/below"));
+}
+
 }  // namespace
 }  // namespace tallowmere::files
