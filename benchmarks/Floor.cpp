@@ -13,14 +13,15 @@
 //   a path leads to an item (one look at the path, whatever its depth, which proves the folders on
 //   the way too).
 //
-// For each code it says below which those are. ITEM is the path of an existing item with a name
-// that is its HFS name, the one that the requests are about.
+// ITEM is the path of an existing item with a name that is its HFS name, the one that the requests
+// are about.
 #include <fcntl.h>
 #include <poll.h>
 #include <signal.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <array>
 #include <climits>
 #include <cstdint>
 #include <cstdlib>
@@ -32,14 +33,46 @@ namespace {
 
 using namespace tallowmere::protocol;
 
-constexpr std::size_t kExportSettingsSize = 144;
+// What is done for a request, a character each. Fields: digits are so many bytes, 'r' a record, 's'
+// a counted string; in an answer 'i' is the path of the item, 'n' its name, 'v' the volume's, 'b'
+// as many bytes as the request's last 16-bit field says, and 'e' the settings. Looks: 'i' at the
+// item, 'f' at the folder that holds it, 'p' the poll.
+struct Steps {
+  const char* fields;
+  const char* looks;
+  const char* answer;
+};
 
-char fields[1 << 16];
-char answer[1 << 16];
+constexpr auto kSteps = std::to_array<Steps>({
+    {},
+    // What kind of item is there, and is its folder the one whose names are remembered?
+    {"s21", "ifp", "2b"},
+    // Plain names are the names of Linux: the kernel walks the whole path in one look.
+    {"ss1", "pi", "2i"},
+    {"s", "p", "2"},
+    {"2", "p", "1v"},
+    // The kernel says too whether the item is a mounted root, which is called as its volume.
+    {"s2", "ip", "1n"},
+    // The item is there and so is its folder. Whether that is on a volume decides what a name is.
+    {"ss1", "ip", "1i"},
+    // There is the item, and the record has the number of its folder.
+    {"s", "ifp", "1r"},
+    // The folder with the id is where it was, and has the item; the next one too.
+    {"24s1", "pfi", "1i"},
+    {"r11", "pfi", "1i"},
+    // Asks nobody.
+    {"4414", "", "2e"},
+});
+static_assert(kSteps.size() == kLastRequestCode + 1);
+
+constexpr std::uint32_t kExportSettingsSize = 144;
+
+char taken[1 << 16];   // the last field of a request
+char answer[1 << 16];  // what answers consist of
 
 void Take(std::size_t size) {
   for (std::size_t count = 0; count < size;) {
-    const ssize_t got = read(STDIN_FILENO, fields + count, size - count);
+    const ssize_t got = read(STDIN_FILENO, taken + count, size - count);
     if (got < 1) _exit(EXIT_SUCCESS);
     count += static_cast<std::size_t>(got);
   }
@@ -48,16 +81,12 @@ void Take(std::size_t size) {
 std::uint16_t TakeU16() {
   Take(sizeof(std::uint16_t));
   std::uint16_t number;
-  std::memcpy(&number, fields, sizeof number);
+  std::memcpy(&number, taken, sizeof number);
   return number;
 }
 
-void TakeCounted() {
-  Take(TakeU16());
-}
-
-void Put(const void* bytes, std::size_t size) {
-  if (write(STDOUT_FILENO, bytes, size) != static_cast<ssize_t>(size)) _exit(EXIT_SUCCESS);
+void Put(const void* field, std::size_t size) {
+  if (write(STDOUT_FILENO, field, size) != static_cast<ssize_t>(size)) _exit(EXIT_SUCCESS);
 }
 
 void PutString(const char* text) {
@@ -76,114 +105,55 @@ void PollMountTable() {
   static int table = -1;
   if (table < 0) {
     table = open("/proc/self/mountinfo", O_RDONLY | O_CLOEXEC);
-    while (read(table, fields, sizeof fields) > 0) continue;
+    while (read(table, taken, sizeof taken) > 0) continue;
   } else {
     pollfd watched{table, POLLPRI, 0};
     poll(&watched, 1, 0);
   }
 }
 
-// `item` is that of the request, `folder` holds it and `name` is its last component.
-void Serve(std::uint16_t code, const char* item, const char* folder, const char* name,
-           const char* volume) {
-  switch (code) {
-    // The full path is that of the folder of what is there: is the item one, and is its folder the
-    // one whose names are remembered?
-    case kRequestMakeFullPath: {
-      TakeCounted();
-      const std::uint16_t size = TakeU16();
-      Take(1);
-      LookAt(item);
-      LookAt(folder);
-      PollMountTable();
-      Put(answer, sizeof(std::uint16_t));
-      Put(answer, size);
-      break;
+std::size_t SizeOf(char field) {
+  return field == 'r' ? kFileSpecSize : static_cast<std::size_t>(field - '0');
+}
+
+void TakeFields(const char* fields, std::uint16_t& last) {
+  for (; *fields != '\0'; ++fields) {
+    switch (*fields) {
+      case 's':
+        Take(TakeU16());
+        break;
+      case '2':
+        last = TakeU16();
+        break;
+      default:
+        Take(SizeOf(*fields));
     }
-    // Plain names are the names of Linux: the kernel walks the whole path in one look.
-    case kRequestMakeFileRefFromPath:
-      TakeCounted();
-      TakeCounted();
-      Take(1);
-      PollMountTable();
-      LookAt(item);
-      Put(answer, sizeof(std::int16_t));
-      PutString(item);
-      break;
-    case kRequestGetVolRefnumByHFSName:
-      TakeCounted();
-      PollMountTable();
-      Put(answer, sizeof(std::int16_t));
-      break;
-    case kRequestGetHFSVolumeName:
-      Take(sizeof(std::int16_t));
-      PollMountTable();
-      Put(answer, 1);
-      PutString(volume);
-      break;
-    // There is such an item; the kernel says too whether it is a mounted root, which is called as
-    // its volume.
-    case kRequestGetHFSName:
-      TakeCounted();
-      TakeU16();
-      LookAt(item);
-      PollMountTable();
-      Put(answer, 1);
-      PutString(name);
-      break;
-    // The item is there and so is its folder. Whether that is on a volume decides what a name is.
-    case kRequestAddHFSName:
-      TakeCounted();
-      TakeCounted();
-      Take(1);
-      LookAt(item);
-      PollMountTable();
-      Put(answer, 1);
-      PutString(item);
-      break;
-    // There is the item, and the record has the number of its folder.
-    case kRequestGetFSSpec:
-      TakeCounted();
-      LookAt(item);
-      LookAt(folder);
-      PollMountTable();
-      Put(answer, 1);
-      Put(answer, kFileSpecSize);
-      break;
-    // The folder with the id is where it was, and has the item.
-    case kRequestSetFileRefFromFSSpecData:
-      Take(sizeof(std::int16_t));
-      Take(sizeof(std::int32_t));
-      TakeCounted();
-      Take(1);
-      PollMountTable();
-      LookAt(folder);
-      LookAt(item);
-      Put(answer, 1);
-      PutString(item);
-      break;
-    case kRequestSetFileRefFromFSSpec:
-      Take(kFileSpecSize);
-      Take(1);
-      Take(1);
-      PollMountTable();
-      LookAt(folder);
-      LookAt(item);
-      Put(answer, 1);
-      PutString(item);
-      break;
-    // Asks nobody.
-    case kRequestGetAIFFExportSettings:
-      Take(sizeof(std::uint32_t));
-      Take(sizeof(std::uint32_t));
-      Take(1);
-      Take(sizeof(std::uint32_t));
-      Put(answer, sizeof(std::int16_t));
-      Put(&kExportSettingsSize, sizeof(std::uint32_t));
-      Put(answer, kExportSettingsSize);
-      break;
-    default:
-      _exit(EXIT_SUCCESS);
+  }
+}
+
+void PutAnswer(const char* fields, std::uint16_t size, const char* item, const char* name,
+               const char* volume) {
+  for (; *fields != '\0'; ++fields) {
+    switch (*fields) {
+      case 'i':
+        PutString(item);
+        break;
+      case 'n':
+        PutString(name);
+        break;
+      case 'v':
+        PutString(volume);
+        break;
+      case 'b':
+        Put(answer, size);
+        break;
+      case 'e':
+        Put(&kExportSettingsSize, sizeof kExportSettingsSize);
+        Put(answer, kExportSettingsSize);
+        break;
+      default:
+        Put(answer, SizeOf(*fields));
+    }
   }
   Put(kTrailer.data(), kTrailer.size());
 }
@@ -198,6 +168,13 @@ int main(int count, char** arguments) {
   static char folder[PATH_MAX];
   std::memcpy(folder, item, static_cast<std::size_t>(name - 1 - item));
   do {
-    Serve(TakeU16(), item, folder, name, arguments[3]);
+    const std::uint16_t code = TakeU16();
+    if (code == kRequestQuit || code > kLastRequestCode) break;
+    std::uint16_t size = 0;
+    TakeFields(kSteps[code].fields, size);
+    for (const char* look = kSteps[code].looks; *look != '\0'; ++look) {
+      *look == 'p' ? PollMountTable() : LookAt(*look == 'i' ? item : folder);
+    }
+    PutAnswer(kSteps[code].answer, size, item, name, arguments[3]);
   } while (kill(parent, 0) == 0);
 }
