@@ -15,11 +15,7 @@ namespace {
 
 using namespace tallowmere::test;
 
-constexpr unsigned kRoomForAFullPath = 1024;
-constexpr unsigned kRoomForAName = 64;
 constexpr std::size_t kSettingsSize = 144;
-
-constexpr std::uint32_t kRateOfACD = 44100u << 16;
 
 // The answer to one question of a service of its own, its trailer looked for and taken off.
 std::string AnswerTo(Server& service, const Question& question) {
@@ -27,10 +23,6 @@ std::string AnswerTo(Server& service, const Question& question) {
   if (!answer.ends_with(kTrailer)) Fail("an answer of an unexpected size");
   answer.resize(answer.size() - kTrailer.size());
   return answer;
-}
-
-Question Framed(std::string request, std::size_t fieldsSize) {
-  return {std::move(request), fieldsSize + kTrailer.size()};
 }
 
 std::size_t SizeOfString(const std::string& text) {
@@ -50,6 +42,33 @@ std::string NameOfVolume(Server& service, int number) {
   const std::string size(service.Ask(VolumeNameRequest(number), head));
   const std::size_t length = NumberAt<std::uint16_t>(size, 1);
   return std::string(service.Ask({}, length + kTrailer.size()).substr(0, length - 1));
+}
+
+// Of the fields of an answer, in bytes.
+std::size_t SizeOfAnswer(protocol::RequestCode code, const Item& item) {
+  switch (code) {
+    case protocol::kRequestQuit:
+      break;
+    case protocol::kRequestMakeFullPath:
+      return sizeof(std::uint16_t) + kRoomForAFullPath;
+    case protocol::kRequestMakeFileRefFromPath:
+      return sizeof(std::int16_t) + SizeOfString(item.path);
+    case protocol::kRequestGetVolRefnumByHFSName:
+      return sizeof(std::int16_t);
+    case protocol::kRequestGetHFSVolumeName:
+      return 1 + SizeOfString(item.volumeName);
+    case protocol::kRequestGetHFSName:
+      return 1 + SizeOfString(item.name);
+    case protocol::kRequestGetFSSpec:
+      return 1 + protocol::kFileSpecSize;
+    case protocol::kRequestAddHFSName:
+    case protocol::kRequestSetFileRefFromFSSpecData:
+    case protocol::kRequestSetFileRefFromFSSpec:
+      return 1 + SizeOfString(item.path);
+    case protocol::kRequestGetAIFFExportSettings:
+      return sizeof(std::int16_t) + sizeof(std::uint32_t) + kSettingsSize;
+  }
+  Fail("no such request");
 }
 
 }  // namespace
@@ -90,35 +109,7 @@ Item AskAbout(const std::string& program, const std::filesystem::path& path) {
 }
 
 Question QuestionOf(protocol::RequestCode code, const Item& item) {
-  switch (code) {
-    case protocol::kRequestQuit:
-      break;
-    case protocol::kRequestMakeFullPath:
-      return Framed(FullPathRequest(item.path, kRoomForAFullPath, 1),
-                    sizeof(std::uint16_t) + kRoomForAFullPath);
-    case protocol::kRequestMakeFileRefFromPath:
-      return Framed(PathOfHFSPathRequest(item.fullPath + '\0', item.name + '\0', 0),
-                    sizeof(std::int16_t) + SizeOfString(item.path));
-    case protocol::kRequestGetVolRefnumByHFSName:
-      return Framed(VolumeNumberRequest(item.volumeName), sizeof(std::int16_t));
-    case protocol::kRequestGetHFSVolumeName:
-      return Framed(VolumeNameRequest(item.volume), 1 + SizeOfString(item.volumeName));
-    case protocol::kRequestGetHFSName:
-      return Framed(HFSNameRequest(item.path, kRoomForAName), 1 + SizeOfString(item.name));
-    case protocol::kRequestAddHFSName:
-      return Framed(AddNameRequest(item.folder, item.name, 0), 1 + SizeOfString(item.path));
-    case protocol::kRequestGetFSSpec:
-      return Framed(RecordRequest(item.path), 1 + protocol::kFileSpecSize);
-    case protocol::kRequestSetFileRefFromFSSpecData:
-      return Framed(PathOfPartsRequest(item.volume, item.folderID, item.name, 0),
-                    1 + SizeOfString(item.path));
-    case protocol::kRequestSetFileRefFromFSSpec:
-      return Framed(PathOfRecordRequest(item.record, 0, 0), 1 + SizeOfString(item.path));
-    case protocol::kRequestGetAIFFExportSettings:
-      return Framed(ExportSettingsRequest(kRateOfACD, 16, 2, "twos"),
-                    sizeof(std::int16_t) + sizeof(std::uint32_t) + kSettingsSize);
-  }
-  Fail("no such request");
+  return {RequestAbout(item, code), SizeOfAnswer(code, item) + kTrailer.size()};
 }
 
 }  // namespace tallowmere::benchmark

@@ -2,26 +2,16 @@
 #pragma once
 
 #include <cstddef>
-#include <cstdint>
 #include <filesystem>
 #include <string>
 
 #include "Measure.h"
 #include "service/Protocol.h"
+#include "support/EveryRequest.h"
 
 namespace tallowmere::benchmark {
 
-// As the service under measurement knows it.
-struct Item {
-  std::string path;
-  std::string folder;  // that holds it
-  std::string name;    // which is its HFS name too
-  std::string record;  // 70 bytes
-  int volume;
-  std::int32_t folderID;
-  std::string volumeName;
-  std::string fullPath;  // of the folder, in HFS form
-};
+using test::Item;
 
 // The path of an empty file in the settings' folder that has so many components, or the fewest that
 // there can be; made unless it is there, and left alone until it is as any old file.

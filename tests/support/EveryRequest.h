@@ -1,6 +1,7 @@
 // One request of every code about one item, for counting what each of them takes.
 #pragma once
 
+#include <cstdint>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
@@ -14,46 +15,67 @@
 
 namespace tallowmere::test {
 
+// An existing item as the service knows it.
+struct Item {
+  std::string path;
+  std::string folder;  // that holds it
+  std::string name;    // which is its HFS name too
+  std::string record;  // 70 bytes
+  std::int16_t volume;
+  std::int32_t folderID;
+  std::string volumeName;
+  std::string fullPath;  // of the folder, in HFS form
+};
+
+// What the requests ask for: bytes for a full path, bytes of a name, a rate in hertz × 65536.
+inline constexpr unsigned kRoomForAFullPath = 1024;
+inline constexpr unsigned kRoomForAName = 64;
+inline constexpr std::uint32_t kRateOfACD = 44100u << 16;
+
+// The request with a code from 1, made of the fields of the item that it is about; the others need
+// not be known.
+inline std::string RequestAbout(const Item& item, unsigned code) {
+  const std::vector<std::string> requests{
+      FullPathRequest(item.path, kRoomForAFullPath, 1),
+      PathOfHFSPathRequest(item.fullPath + '\0', item.name + '\0', 0),
+      VolumeNumberRequest(item.volumeName),
+      VolumeNameRequest(item.volume),
+      HFSNameRequest(item.path, kRoomForAName),
+      AddNameRequest(item.folder, item.name, 0),
+      RecordRequest(item.path),
+      PathOfPartsRequest(item.volume, item.folderID, item.name, 0),
+      PathOfRecordRequest(item.record, 0, 0),
+      ExportSettingsRequest(kRateOfACD, 16, 2, "twos"),
+  };
+  return requests.at(code - 1);
+}
+
 // The number of components of the item's path: some requests cost by it.
 inline constexpr int kComponents = 6;
 
 class EveryRequest {
  public:
-  EveryRequest() : mFile(MakeFile(mFolder.Path())) {
-    if (mFile.empty()) return;
+  EveryRequest() {
+    mItem.path = MakeFile(mFolder.Path());
+    if (!IsMade()) return;
+    mItem.name = std::filesystem::path(mItem.path).filename();
+    mItem.folder = std::filesystem::path(mItem.path).parent_path();
     Service service;
-    mRecord = service.Ask(RecordRequest(mFile), 75).substr(1, 70);
-    std::memcpy(&mVolume, mRecord.data(), sizeof mVolume);
-    std::memcpy(&mParent, mRecord.data() + sizeof mVolume, sizeof mParent);
-    mVolumeName = service.NameOf(mVolume);
-    const std::string answer = service.Ask(FullPathRequest(mFile, 1024, 1), 2 + 1024 + 4);
-    mFullPath = answer.c_str() + 2;
+    mItem.record = service.Ask(Of(7), 75).substr(1, 70);
+    std::memcpy(&mItem.volume, mItem.record.data(), sizeof mItem.volume);
+    std::memcpy(&mItem.folderID, mItem.record.data() + sizeof mItem.volume, sizeof mItem.folderID);
+    mItem.volumeName = service.NameOf(mItem.volume);
+    const std::string answer = service.Ask(Of(1), 2 + kRoomForAFullPath + 4);
+    mItem.fullPath = answer.c_str() + 2;
   }
 
   // Not where the folder for temporary files is too deep.
-  bool IsMade() const { return !mFile.empty(); }
+  bool IsMade() const { return !mItem.path.empty(); }
 
-  const std::string& Path() const { return mFile; }
-  const std::string& VolumeName() const { return mVolumeName; }
+  const std::string& Path() const { return mItem.path; }
+  const std::string& VolumeName() const { return mItem.volumeName; }
 
-  // The request with a code from 1.
-  std::string Of(unsigned code) const {
-    const std::string name = mFile.substr(mFile.rfind('/') + 1);
-    const std::string folder = mFile.substr(0, mFile.rfind('/'));
-    const std::vector<std::string> requests{
-        FullPathRequest(mFile, 1024, 1),
-        PathOfHFSPathRequest(mFullPath + '\0', name + '\0', 0),
-        VolumeNumberRequest(mVolumeName),
-        VolumeNameRequest(mVolume),
-        HFSNameRequest(mFile, 64),
-        AddNameRequest(folder, name, 0),
-        RecordRequest(mFile),
-        PathOfPartsRequest(mVolume, mParent, name, 0),
-        PathOfRecordRequest(mRecord, 0, 0),
-        ExportSettingsRequest(44100u << 16, 16, 2, "twos"),
-    };
-    return requests.at(code - 1);
-  }
+  std::string Of(unsigned code) const { return RequestAbout(mItem, code); }
 
  private:
   // "/" counts as one element of a path here, so that the folder has as many as the file is to
@@ -67,12 +89,7 @@ class EveryRequest {
   }
 
   TemporaryFolder mFolder;
-  std::string mFile;
-  std::string mRecord;
-  std::int16_t mVolume = 0;
-  std::int32_t mParent = 0;
-  std::string mVolumeName;
-  std::string mFullPath;
+  Item mItem{};
 };
 
 }  // namespace tallowmere::test
