@@ -185,7 +185,7 @@ TEST(Client, AServiceThatTakesNothingOfARequestMissesTheDeadline) {
   const TemporaryFolder folder;
   Client client(
       {.service = Impostor(folder, std::string(kTakeRequest) + "printf '\\000\\001\\000\\000MWLT'\n"
-                                                               "exec <&-; sleep 60"),
+                                                               "exec sleep 60 <&-"),
        .deadline = milliseconds(500)});
   EXPECT_TRUE(client.GetHFSVolumeName(0));
   std::this_thread::sleep_for(milliseconds(100));
