@@ -15,6 +15,7 @@
 
 #include "Measure.h"
 #include "Server.h"
+#include "support/ArgumentVector.h"
 
 namespace tallowmere::benchmark {
 namespace {
@@ -88,10 +89,7 @@ void UseAllCores() {
 }
 
 double TimeOf(const std::vector<std::string>& command) {
-  std::vector<char*> arguments;
-  arguments.reserve(command.size() + 1);
-  for (const std::string& word : command) arguments.push_back(const_cast<char*>(word.c_str()));
-  arguments.push_back(nullptr);
+  const auto arguments = test::ArgumentVector(command);
   posix_spawn_file_actions_t actions;
   posix_spawn_file_actions_init(&actions);
   posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);

@@ -13,6 +13,8 @@
 #include <fstream>
 #include <system_error>
 
+#include "support/ArgumentVector.h"
+
 namespace tallowmere::benchmark {
 namespace {
 
@@ -31,11 +33,9 @@ void Fail(const std::string& what) {
 Server::Server(const std::string& program, const std::vector<std::string>& arguments) {
   const auto requests = MakePipe();
   const auto answers = MakePipe();
-  std::vector<char*> vector{const_cast<char*>(program.c_str())};
-  for (const std::string& argument : arguments) {
-    vector.push_back(const_cast<char*>(argument.c_str()));
-  }
-  vector.push_back(nullptr);
+  std::vector<std::string> command{program};
+  command.insert(command.end(), arguments.begin(), arguments.end());
+  const auto vector = test::ArgumentVector(command);
 
   posix_spawn_file_actions_t pipes;
   posix_spawn_file_actions_init(&pipes);

@@ -12,6 +12,8 @@
 #include <limits>
 #include <utility>
 
+#include "support/ArgumentVector.h"
+
 namespace tallowmere::test {
 namespace {
 
@@ -48,11 +50,9 @@ ChildProgram::ChildProgram(const std::string& path, const std::vector<std::strin
   const auto input = MakePipe();
   const auto output = MakePipe();
   const auto errors = MakePipe();
-  std::vector<char*> vector{const_cast<char*>(path.c_str())};
-  for (const std::string& argument : arguments) {
-    vector.push_back(const_cast<char*>(argument.c_str()));
-  }
-  vector.push_back(nullptr);
+  std::vector<std::string> command{path};
+  command.insert(command.end(), arguments.begin(), arguments.end());
+  const auto vector = ArgumentVector(command);
 
   mProcess = fork();
   if (mProcess < 0) std::abort();

@@ -8,6 +8,8 @@
 #include <fstream>
 #include <utility>
 
+#include "support/ArgumentVector.h"
+
 namespace tallowmere::test {
 
 bool RunTool(const std::vector<std::string>& command) {
@@ -17,9 +19,7 @@ bool RunTool(const std::vector<std::string>& command) {
     for (const int standard : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
       dup2(nothing, standard);
     }
-    std::vector<char*> arguments;
-    for (const std::string& word : command) arguments.push_back(const_cast<char*>(word.c_str()));
-    arguments.push_back(nullptr);
+    const auto arguments = ArgumentVector(command);
     // The tools of file systems are not on every user's path.
     setenv("PATH", "/usr/sbin:/sbin:/usr/bin:/bin", 1);
     execvp(arguments[0], arguments.data());
