@@ -10,7 +10,6 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <iostream>
 #include <memory>
 #include <new>
 #include <string_view>
@@ -543,14 +542,6 @@ bool CFileRef::PathContains(CFileRef const& other) const {
   }
   if (!EqualIgnoringCase(path, otherPath, length)) return false;
   return length == otherLength || otherPath[length] == '/';
-}
-
-void CFileRef::Trace() const {
-  if (!IsValid()) {
-    std::cout << "(invalid)";
-    return;
-  }
-  std::cout << GetPath() << (Exists() ? " (state: existing)" : " (state: not existing)");
 }
 
 bool CFileRef::IsExistingPackage() const {
