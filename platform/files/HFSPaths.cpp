@@ -49,14 +49,19 @@ OSErr OnTheWay(OSErr error) {
   return error;
 }
 
+// `near` as for VolumeOf.
+OSErr UseAsFolder(Place place, const VolumePointer& near, Folder& folder) {
+  if (!S_ISDIR(place.item.type)) return dirNFErr;
+  folder.volume = VolumeOf(place, near);
+  folder.place = std::move(place);
+  return folder.volume && folder.volume->Root() ? noErr : nsvErr;
+}
+
 OSErr FolderAt(const std::string& path, Folder& folder) {
   const auto real = RealPath(path);
   if (!real) return OnTheWay(ErrorOfSystem());
   auto place = PlaceAt(*real);
-  if (!place || !S_ISDIR(place->item.type)) return dirNFErr;
-  folder.place = *std::move(place);
-  folder.volume = MountTable::OfThisProcess().OfItem(folder.place.item, folder.place.path);
-  return folder.volume && folder.volume->Root() ? noErr : nsvErr;
+  return place ? UseAsFolder(*std::move(place), nullptr, folder) : static_cast<OSErr>(dirNFErr);
 }
 
 OSErr RootOf(const VolumePointer& volume, Folder& folder) {
@@ -75,16 +80,17 @@ OSErr StartingFolder(SInt16 vRefNum, SInt32 dirID, std::string_view volumeName, 
 // Into the folder with a name, a link to it followed, or with an empty name to the folder above.
 OSErr Step(std::string_view name, Folder& folder) {
   if (name.empty()) {
-    if (VolumeOfRoot(folder.place)) return dirNFErr;
+    if (IsRootOf(folder.volume, folder.place)) return dirNFErr;
     Folder above;
-    const OSErr error = HoldingFolder(folder.place, above);
+    const OSErr error = HoldingFolder(folder.place, folder.volume, above);
     if (error == noErr) folder = above;
     return OnTheWay(error);
   }
   Place item;
   const OSErr error = LookUpHFSName(folder, name, item);
   if (error != noErr) return OnTheWay(error);
-  return FolderAt(item.path, folder);
+  if (S_ISLNK(item.item.type)) return FolderAt(item.path, folder);
+  return UseAsFolder(std::move(item), folder.volume, folder);
 }
 
 OSErr SpecOfName(const Folder& folder, std::string_view name, FSSpec& spec) {
@@ -92,7 +98,8 @@ OSErr SpecOfName(const Folder& folder, std::string_view name, FSSpec& spec) {
   const OSErr error = LookUpHFSName(folder, name, item);
   if (error == noErr) {
     RememberPlace(item);
-    return SpecOfPlace(item, spec);
+    RememberPlace(folder.place);
+    return SpecInFolder(folder, item, spec);
   }
   if (error != fnfErr) return error;
   if (name.size() > kLongestSpecName || SpellHFSName(name).precomposed.empty()) return bdNamErr;
