@@ -31,6 +31,8 @@ to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools)
 to_test+=(hfsutils qemu-system-x86 busybox-static cpio)
 # Tests on the Debian packages, the manual pages and the completions.
 to_test+=(dpkg-dev file mandoc zsh fish)
+# What the benchmarks compare with, and their pieces in one process.
+to_measure=(libbenchmark-dev openssh-sftp-server bfs e2fsprogs)
 to_check=(clang-format clang-tidy)
 
 # unpack_kernel FOLDER: puts Debian's kernel there, without installing it. Without one the test that

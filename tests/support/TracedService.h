@@ -18,4 +18,15 @@ struct TracedRun {
 // `calls` names the system calls, separated by commas. None where strace cannot trace.
 std::optional<TracedRun> RunTraced(const std::string& calls, const std::string& requests);
 
+// The same with another program that serves requests, and its arguments behind the parent's id.
+std::optional<TracedRun> RunTraced(const std::string& calls, const std::string& requests,
+                                   const std::string& program,
+                                   const std::vector<std::string>& arguments);
+
+// Whether a line is a call by that name.
+bool IsCall(const std::string& line, const std::string& name);
+
+// The calls between the last two looks for the parent. REQUIRES: there were two.
+std::vector<std::string> CallsOfLastRequest(const TracedRun& run);
+
 }  // namespace tallowmere::test

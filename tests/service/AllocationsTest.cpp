@@ -1,0 +1,84 @@
+// How many blocks of memory each request takes, once an earlier one has been about the same item.
+// The request step runs in this program, whose own operator new counts.
+#include <fcntl.h>
+#include <gtest/gtest.h>
+
+#include <array>
+#include <cstdlib>
+
+#include "CountedAllocations.h"
+#include "service/Request.h"
+#include "support/EveryRequest.h"
+
+namespace tallowmere::test {
+namespace {
+
+struct Allocations {
+  unsigned code;
+  int most;
+};
+
+std::ostream& operator<<(std::ostream& out, const Allocations& row) {
+  return out << "code " << row.code;
+}
+
+// A standard stream that is the end of a pipe for a time.
+class Redirected {
+ public:
+  Redirected(int stream, int end) : mStream(stream), mSaved(dup(stream)) { dup2(end, stream); }
+  Redirected(const Redirected&) = delete;
+  Redirected& operator=(const Redirected&) = delete;
+  ~Redirected() {
+    dup2(mSaved, mStream);
+    close(mSaved);
+  }
+
+ private:
+  int mStream;
+  int mSaved;
+};
+
+// Has a request served here, and gives how many blocks that took.
+int Serve(const std::string& request) {
+  std::array<int, 2> requests{};
+  std::array<int, 2> responses{};
+  if (pipe(requests.data()) != 0 || pipe(responses.data()) != 0) std::abort();
+  int taken = 0;
+  {
+    const Redirected input(STDIN_FILENO, requests[0]);
+    const Redirected output(STDOUT_FILENO, responses[1]);
+    EXPECT_EQ(write(requests[1], request.data(), request.size()),
+              static_cast<ssize_t>(request.size()));
+    const int before = CountedAllocations();
+    EXPECT_EQ(service::ServeOneRequest(), noErr);
+    taken = CountedAllocations() - before;
+  }
+  for (const int end : {requests[0], requests[1], responses[0], responses[1]}) close(end);
+  return taken;
+}
+
+class OfARequest : public testing::TestWithParam<Allocations> {};
+
+TEST_P(OfARequest, AreNoMoreThanThese) {
+  const EveryRequest requests;
+  if (!requests.IsMade()) GTEST_SKIP() << "the folder for temporary files is too deep";
+  Serve(requests.Of(7));
+  Serve(requests.Of(GetParam().code));
+  EXPECT_LE(Serve(requests.Of(GetParam().code)), GetParam().most);
+}
+
+INSTANTIATE_TEST_SUITE_P(Allocations, OfARequest,
+                         testing::ValuesIn(std::to_array<Allocations>({{1, 110},
+                                                                       {2, 112},
+                                                                       {3, 0},
+                                                                       {4, 0},
+                                                                       {5, 40},
+                                                                       {6, 92},
+                                                                       {7, 30},
+                                                                       {8, 59},
+                                                                       {9, 31},
+                                                                       {10, 27}})),
+                         [](const auto& row) { return "Code" + std::to_string(row.param.code); });
+
+}  // namespace
+}  // namespace tallowmere::test

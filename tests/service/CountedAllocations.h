@@ -1,0 +1,9 @@
+// In a program that links this, operator new counts.
+#pragma once
+
+namespace tallowmere::test {
+
+// How many blocks have been taken since the program began.
+int CountedAllocations();
+
+}  // namespace tallowmere::test

@@ -1,0 +1,64 @@
+// How many system calls each request takes, once an earlier one has been about the same item.
+#include <gtest/gtest.h>
+
+#include <array>
+#include <ostream>
+#include <string>
+
+#include "support/EveryRequest.h"
+#include "support/TracedService.h"
+
+namespace tallowmere::test {
+namespace {
+
+struct Calls {
+  unsigned code;
+  int reads;        // one for each part of a field
+  int writes;       // the same, and one for the trailer
+  int mostOfFiles;  // all others but kill: on a new item, which takes a handle to be told
+};
+
+std::ostream& operator<<(std::ostream& out, const Calls& calls) {
+  return out << "code " << calls.code;
+}
+
+class SystemCalls : public testing::TestWithParam<Calls> {};
+
+TEST_P(SystemCalls, AreNoMoreThanThese) {
+  const auto [code, reads, writes, mostOfFiles] = GetParam();
+  const EveryRequest requests;
+  if (!requests.IsMade()) GTEST_SKIP() << "the folder for temporary files is too deep";
+  const std::string request = requests.Of(code);
+  const auto run = RunTraced("%file,%desc,kill", requests.Of(7) + request + request + kQuit);
+  if (!run) GTEST_SKIP() << "strace cannot trace here";
+  ASSERT_EQ(run->status, 0);
+
+  int read = 0;
+  int written = 0;
+  int ofFiles = 0;
+  for (const std::string& call : CallsOfLastRequest(*run)) {
+    if (IsCall(call, "mmap")) continue;  // of memory
+    ++(IsCall(call, "read") ? read : IsCall(call, "write") ? written : ofFiles);
+  }
+  EXPECT_EQ(read, reads);
+  EXPECT_EQ(written, writes);
+  EXPECT_LE(ofFiles, mostOfFiles);
+}
+
+INSTANTIATE_TEST_SUITE_P(OfEachCode, SystemCalls,
+                         testing::ValuesIn(std::to_array<Calls>({{1, 5, 3, 69},
+                                                                 {2, 6, 4, 74},
+                                                                 {3, 3, 2, 1},
+                                                                 {4, 2, 4, 1},
+                                                                 {5, 4, 4, 13},
+                                                                 {6, 6, 4, 41},
+                                                                 {7, 3, 3, 12},
+                                                                 {8, 6, 4, 26},
+                                                                 {9, 4, 4, 12},
+                                                                 {10, 5, 4, 0}})),
+                         [](const auto& calls) {
+                           return "Code" + std::to_string(calls.param.code);
+                         });
+
+}  // namespace
+}  // namespace tallowmere::test
