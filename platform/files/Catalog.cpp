@@ -191,7 +191,11 @@ std::optional<Place> WithID(const VolumePointer& volume, std::uint32_t id, bool 
 std::optional<Place> AtPlaceOf(const ItemReference& item) {
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
   if (known == nullptr) return std::nullopt;
-  if (!known->isCanonical) return PlaceAt(known->path);
+  if (!known->isCanonical) {
+    auto place = PlaceAt(known->path);
+    if (place && AreEqual(place->item, item)) RememberPlace(*place);
+    return place;
+  }
   const auto status = ReadStatus(AT_FDCWD, known->path.c_str());
   if (!status) return std::nullopt;
   return Place{known->path, status->item};
@@ -204,6 +208,12 @@ std::optional<Place> AtRememberedPlace(const VolumePointer& volume, std::uint32_
   item.device = volume->Root()->device;
   item.inode = id;
   return WithID(volume, id, folder, AtPlaceOf(item));
+}
+
+// Whether that is the canonical path at which the item was last seen.
+bool IsRememberedAt(const ItemReference& item, std::string_view path) {
+  const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
+  return known != nullptr && known->isCanonical && known->path == path;
 }
 
 }  // namespace
@@ -223,15 +233,18 @@ std::optional<Place> PlaceAt(const std::string& path) {
   return Place{std::move(reached->path), status->item};
 }
 
+std::optional<Place> RememberedPlaceAt(const std::string& path) {
+  const auto found = ReadStatus(AT_FDCWD, path.c_str());
+  if (!found || !IsRememberedAt(found->item, path)) return std::nullopt;
+  return Place{path, found->item};
+}
+
 // A path that leads through a link of /proc can spell another folder than the one it is in.
 std::optional<Place> HolderOf(const std::string& path) {
   std::string folder = FolderOf(path);
   const auto found = ReadStatus(AT_FDCWD, foundation::WithFolderMark(folder, true).c_str());
   if (!found) return std::nullopt;
-  const auto* const known = PlaceMemory::OfThisProcess().Recall(found->item);
-  if (known != nullptr && known->isCanonical && known->path == folder) {
-    return Place{std::move(folder), found->item};
-  }
+  if (IsRememberedAt(found->item, folder)) return Place{std::move(folder), found->item};
   auto place = PlaceAt(folder);
   if (place && S_ISLNK(place->item.type)) {
     const auto real = RealPath(folder);
@@ -262,14 +275,17 @@ std::string FolderOf(const std::string& path) {
 std::optional<std::string> FindPath(const ItemReference& item) {
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
   // Where the kernel does not tell the mount, only the canonical path tells the volume.
-  const bool isOneLookEnough = known != nullptr && item.mount != kNoMount &&
-                               (known->isCanonical || IsSpelledOut(known->path));
-  if (isOneLookEnough && IsAt(item, AT_FDCWD, known->path.c_str())) return known->path;
+  const bool isGoodEnough = known != nullptr && !known->isCanonical && item.mount != kNoMount &&
+                            IsSpelledOut(known->path);
+  if (isGoodEnough && IsAt(item, AT_FDCWD, known->path.c_str())) return known->path;
   return FindCanonicalPath(item);
 }
 
 std::optional<std::string> FindCanonicalPath(const ItemReference& item) {
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
+  if (known != nullptr && known->isCanonical && IsAt(item, AT_FDCWD, known->path.c_str())) {
+    return known->path;
+  }
   const std::string former = known == nullptr ? "" : known->path;
   Path place = former.empty() ? std::nullopt : Verified(item, former);
   if (!place) {

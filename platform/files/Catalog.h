@@ -27,6 +27,9 @@ void RememberSighting(const ItemReference& item, std::string_view path);
 // there is none.
 std::optional<Place> PlaceAt(const std::string& path);
 
+// The same, if it was remembered there and the path has no link in the last place. One look.
+std::optional<Place> RememberedPlaceAt(const std::string& path);
+
 // The folder in which the kernel finds the last component of an absolute path other than "/". None,
 // and errno tells, when there is none or no path leads to it.
 std::optional<Place> HolderOf(const std::string& path);
