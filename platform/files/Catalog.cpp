@@ -275,17 +275,14 @@ std::string FolderOf(const std::string& path) {
 std::optional<std::string> FindPath(const ItemReference& item) {
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
   // Where the kernel does not tell the mount, only the canonical path tells the volume.
-  const bool isGoodEnough = known != nullptr && !known->isCanonical && item.mount != kNoMount &&
-                            IsSpelledOut(known->path);
-  if (isGoodEnough && IsAt(item, AT_FDCWD, known->path.c_str())) return known->path;
+  const bool isOneLookEnough = known != nullptr && item.mount != kNoMount &&
+                               (known->isCanonical || IsSpelledOut(known->path));
+  if (isOneLookEnough && IsAt(item, AT_FDCWD, known->path.c_str())) return known->path;
   return FindCanonicalPath(item);
 }
 
 std::optional<std::string> FindCanonicalPath(const ItemReference& item) {
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
-  if (known != nullptr && known->isCanonical && IsAt(item, AT_FDCWD, known->path.c_str())) {
-    return known->path;
-  }
   const std::string former = known == nullptr ? "" : known->path;
   Path place = former.empty() ? std::nullopt : Verified(item, former);
   if (!place) {

@@ -83,14 +83,23 @@ OSErr PlaceOfReference(const FSRef* reference, Place& place) {
 
 OSErr FSGetCatalogInfo(const FSRef* ref, FSCatalogInfoBitmap whichInfo, FSCatalogInfo* catalogInfo,
                        HFSUniStr255* outName, FSSpec* fsSpec, FSRef* parentRef) {
-  return OrError([&]() -> OSErr {
-    Place item;
-    OSErr error = PlaceOfReference(ref, item);
-    if (error == noErr && catalogInfo != nullptr) error = FillInfo(item, whichInfo, *catalogInfo);
+  const auto describe = [&](const Place& item) -> OSErr {
+    OSErr error = noErr;
+    if (catalogInfo != nullptr) error = FillInfo(item, whichInfo, *catalogInfo);
     if (error == noErr && outName != nullptr) FillName(item, *outName);
     if (error == noErr && fsSpec != nullptr) error = SpecOfPlace(item, *fsSpec);
     if (error == noErr && parentRef != nullptr) error = FillParent(item, *parentRef);
     return error;
+  };
+  return OrError([&]() -> OSErr {
+    Place item;
+    OSErr error = PlaceOfReference(ref, item);
+    if (error == noErr) error = describe(item);
+    if (error == noErr || item.path.empty()) return error;
+    // A link of /proc can lead to an item of which only other paths tell where it is.
+    auto path = FindCanonicalPath(item.item);
+    if (!path || *path == item.path) return error;
+    return describe({*std::move(path), item.item});
   });
 }
 

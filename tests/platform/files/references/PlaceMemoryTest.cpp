@@ -55,6 +55,17 @@ TEST(PlaceMemory, KeepsTheLastPlaceOfAnItem) {
   EXPECT_EQ(memory.Size(), size);
 }
 
+TEST(PlaceMemory, KeepsAPathCanonicalThatIsSeenAgain) {
+  PlaceMemory memory(kPlenty);
+  memory.Remember(Item(1, 1), "/a", false);
+  EXPECT_FALSE(memory.Recall(Item(1, 1))->isCanonical);
+  memory.Remember(Item(1, 1), "/a", true);
+  memory.Remember(Item(1, 1), "/a", false);
+  EXPECT_TRUE(memory.Recall(Item(1, 1))->isCanonical);
+  memory.Remember(Item(1, 1), "/link/a", false);
+  EXPECT_FALSE(memory.Recall(Item(1, 1))->isCanonical);
+}
+
 TEST(PlaceMemory, ForgetsTheLeastRecentlyUsedFirst) {
   PlaceMemory memory(3 * SizeOfOnePlace());
   memory.Remember(Item(1, 1), "/a", true);
