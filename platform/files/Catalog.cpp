@@ -84,29 +84,24 @@ Path Verified(const ItemReference& item, const std::string& path) {
   return std::move(reached->path);
 }
 
-VolumePointer VolumeOf(const Place& place) {
-  return MountTable::OfThisProcess().OfItem(place.item, place.path);
-}
-
+// `volume` is as the table has it now.
 bool IsOnVolume(const VolumePointer& volume, const Place& place) {
-  const VolumePointer found = VolumeOf(place);
+  if (volume->IsMountedAs(place.item.mount)) return true;
+  const VolumePointer found = MountTable::OfThisProcess().OfItem(place.item, place.path);
   return found && found->Number() == volume->Number();
 }
 
 // The nearest folder to a former place of an item that is still there and on the volume; else the
-// volume's root folder. What seems to be on another volume is not looked at: that one may not
-// answer.
+// volume's root folder. What is on another volume, by the spelling or behind a link, is not looked
+// at: that one may not answer.
 std::string NearestFolder(const VolumePointer& volume, const std::string& formerPlace) {
   const VolumePointer former = MountTable::OfThisProcess().OfPath(formerPlace);
-  if (!former || former->Number() != volume->Number()) return volume->MountPoint();
-  for (std::string path = formerPlace; !path.empty() && path != "/";) {
+  const bool isNear = former && former->Number() == volume->Number() && IsSpelledOut(formerPlace);
+  for (std::string path = formerPlace; isNear && path != "/";) {
     path = FolderOf(path);
-    // Above a component "." or ".." the spelling leads nowhere.
-    const auto name = *foundation::LastComponent(path);
-    if (name == "." || name == "..") break;
-    const auto real = RealPath(path);
-    const auto place = real ? PlaceAt(*real) : std::nullopt;
-    if (place && IsOnVolume(volume, *place)) return *real;
+    const Descriptor descriptor = OpenWithoutLinks(path);
+    const auto folder = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
+    if (folder && IsOnVolume(volume, {path, folder->item})) return path;
   }
   return volume->MountPoint();
 }
@@ -170,10 +165,11 @@ struct SettledVolume {
 std::optional<SettledVolume> Settle(const VolumePointer& volume) {
   MountTable& table = MountTable::OfThisProcess();
   for (VolumePointer current = volume; current;) {
-    auto root = PlaceAt(current->MountPoint());
+    const auto root = ReadStatus(AT_FDCWD, current->MountPoint().c_str());
     const bool isThere = root && current->Root() && AreEqual(root->item, *current->Root());
-    if (isThere && IsOnVolume(volume, *root)) {
-      return SettledVolume{std::move(current), *std::move(root)};
+    if (Place place{current->MountPoint(), isThere ? root->item : ItemReference{}};
+        isThere && IsOnVolume(volume, place)) {
+      return SettledVolume{std::move(current), std::move(place)};
     }
     if (current != volume) break;
     table.Distrust();
@@ -182,45 +178,85 @@ std::optional<SettledVolume> Settle(const VolumePointer& volume) {
   return std::nullopt;
 }
 
-// The item at the path if it is the one with the id.
+// The place if its item is the one with the id.
 std::optional<Place> WithID(const VolumePointer& volume, std::uint32_t id, bool folder,
-                            const Path& path) {
-  auto place = path ? PlaceAt(*path) : std::nullopt;
+                            std::optional<Place> place) {
   if (!place || NodeIDOf(place->item, *volume->Root()) != id) return std::nullopt;
   if (folder && !S_ISDIR(place->item.type)) return std::nullopt;
   if (!IsOnVolume(volume, *place)) return std::nullopt;
   return place;
 }
 
-// An item that can be told by its inode number is remembered by it.
-Path RememberedPath(const Volume& volume, std::uint32_t id) {
-  ItemReference item{};
-  item.device = volume.Root()->device;
-  item.inode = id;
-  const std::string* const remembered = PlaceMemory::OfThisProcess().Recall(item);
-  return remembered == nullptr ? std::nullopt : Path(*remembered);
+// What is now where an item was last seen.
+std::optional<Place> AtPlaceOf(const ItemReference& item) {
+  const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
+  if (known == nullptr) return std::nullopt;
+  if (!known->isCanonical) {
+    auto place = PlaceAt(known->path);
+    if (place && AreEqual(place->item, item)) RememberPlace(*place);
+    return place;
+  }
+  const auto status = ReadStatus(AT_FDCWD, known->path.c_str());
+  if (!status) return std::nullopt;
+  return Place{known->path, status->item};
 }
 
+// An item that can be told by its inode number is remembered by it.
 std::optional<Place> AtRememberedPlace(const VolumePointer& volume, std::uint32_t id, bool folder) {
   if (!volume->Root() || !IsInodeNumber(id)) return std::nullopt;
-  return WithID(volume, id, folder, RememberedPath(*volume, id));
+  ItemReference item{};
+  item.device = volume->Root()->device;
+  item.inode = id;
+  return WithID(volume, id, folder, AtPlaceOf(item));
+}
+
+// Whether that is the canonical path at which the item was last seen.
+bool IsRememberedAt(const ItemReference& item, std::string_view path) {
+  const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
+  return known != nullptr && known->isCanonical && known->path == path;
 }
 
 }  // namespace
 
-void RememberPlace(const ItemReference& item, std::string_view path) {
-  PlaceMemory::OfThisProcess().Remember(item, path);
+void RememberPlace(const Place& place) {
+  PlaceMemory::OfThisProcess().Remember(place.item, place.path, true);
 }
 
-void RememberPlace(const Place& place) {
-  RememberPlace(place.item, place.path);
+void RememberSighting(const ItemReference& item, std::string_view path) {
+  PlaceMemory::OfThisProcess().Remember(item, path, false);
 }
 
 std::optional<Place> PlaceAt(const std::string& path) {
   auto reached = Reach(path);
-  const auto item = reached ? ReadItem(reached->descriptor.Get(), "") : std::nullopt;
-  if (!item) return std::nullopt;
-  return Place{std::move(reached->path), *item};
+  const auto status = reached ? ReadStatus(reached->descriptor.Get(), "") : std::nullopt;
+  if (!status) return std::nullopt;
+  return Place{std::move(reached->path), status->item};
+}
+
+std::optional<Place> RememberedPlaceAt(const std::string& path) {
+  const auto found = ReadStatus(AT_FDCWD, path.c_str());
+  if (!found || !IsRememberedAt(found->item, path)) return std::nullopt;
+  return Place{path, found->item};
+}
+
+// A path that leads through a link of /proc can spell another folder than the one it is in.
+std::optional<Place> HolderOf(const std::string& path) {
+  std::string folder = FolderOf(path);
+  const auto found = ReadStatus(AT_FDCWD, foundation::WithFolderMark(folder, true).c_str());
+  if (!found) return std::nullopt;
+  if (IsRememberedAt(found->item, folder)) return Place{std::move(folder), found->item};
+  auto place = PlaceAt(folder);
+  if (place && S_ISLNK(place->item.type)) {
+    const auto real = RealPath(folder);
+    place = real ? PlaceAt(*real) : std::nullopt;
+  }
+  if (!place) return std::nullopt;
+  if (!AreEqual(place->item, found->item) || place->item.mount != found->item.mount) {
+    errno = ENOENT;
+    return std::nullopt;
+  }
+  RememberPlace(*place);
+  return place;
 }
 
 std::optional<std::string> RealPath(const std::string& path) {
@@ -236,9 +272,18 @@ std::string FolderOf(const std::string& path) {
   return foundation::WithFolderMark(foundation::ParentPath(path), false);
 }
 
-std::optional<std::string> FindPlace(const ItemReference& item) {
-  const std::string* const remembered = PlaceMemory::OfThisProcess().Recall(item);
-  const std::string former = remembered == nullptr ? "" : *remembered;
+std::optional<std::string> FindPath(const ItemReference& item) {
+  const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
+  // Where the kernel does not tell the mount, only the canonical path tells the volume.
+  const bool isOneLookEnough = known != nullptr && item.mount != kNoMount &&
+                               (known->isCanonical || IsSpelledOut(known->path));
+  if (isOneLookEnough && IsAt(item, AT_FDCWD, known->path.c_str())) return known->path;
+  return FindCanonicalPath(item);
+}
+
+std::optional<std::string> FindCanonicalPath(const ItemReference& item) {
+  const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
+  const std::string former = known == nullptr ? "" : known->path;
   Path place = former.empty() ? std::nullopt : Verified(item, former);
   if (!place) {
     const auto volume = MountTable::OfThisProcess().OfItem(item, former);
@@ -257,14 +302,15 @@ std::optional<std::string> FindPlace(const ItemReference& item) {
       place = found ? Verified(item, *found) : std::nullopt;
     }
   }
-  if (place) RememberPlace(item, *place);
+  if (place) RememberPlace({*place, item});
   return place;
 }
 
 std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder) {
   auto place = AtRememberedPlace(volume, id, folder);
   if (place || !volume->Root() || !IsInodeNumber(id)) return place;
-  place = WithID(volume, id, folder, AskByInode(*volume, id).path);
+  const Path path = AskByInode(*volume, id).path;
+  if (path) place = WithID(volume, id, folder, PlaceAt(*path));
   if (place) RememberPlace(*place);
   return place;
 }
@@ -279,12 +325,12 @@ std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, boo
 
   const HandleAnswer answer = IsInodeNumber(id) ? AskByInode(*settled->volume, id) : HandleAnswer{};
   if (answer.isGone) return std::nullopt;
-  place = WithID(settled->volume, id, folder, answer.path);
+  if (answer.path) place = WithID(settled->volume, id, folder, PlaceAt(*answer.path));
   if (!place) {
     const std::string latest(PlaceMemory::OfThisProcess().Latest());
     const std::string start = NearestFolder(settled->volume, latest);
-    place = WithID(settled->volume, id, folder,
-                   IndexOf(settled->volume).Find({id, nullptr, folder}, start));
+    const Path path = IndexOf(settled->volume).Find({id, nullptr, folder}, start);
+    if (path) place = WithID(settled->volume, id, folder, PlaceAt(*path));
   }
   if (place) RememberPlace(*place);
   return place;

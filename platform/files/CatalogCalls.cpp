@@ -27,10 +27,18 @@ constexpr std::size_t kLongestUnicodeName = 255;
 // The volume that an item counts to: its own, or for a file that is mounted alone and so is on
 // none, that of the folder that holds it.
 VolumePointer VolumeOfItem(const Place& item) {
-  auto volume = MountTable::OfThisProcess().OfItem(item.item, item.path);
+  auto volume = VolumeOf(item, nullptr);
   if (volume && volume->Root()) return volume;
   Folder folder;
-  return HoldingFolder(item, folder) == noErr ? folder.volume : nullptr;
+  return HoldingFolder(item, nullptr, folder) == noErr ? folder.volume : nullptr;
+}
+
+OSErr GiveReference(const Place& place, FSRef* reference) {
+  ItemReference item = place.item;
+  ReadProof(item, AT_FDCWD, place.path.c_str());
+  RememberPlace(place);
+  *reference = Pack(item);
+  return noErr;
 }
 
 OSErr FillInfo(const Place& item, FSCatalogInfoBitmap whichInfo, FSCatalogInfo& info) {
@@ -43,9 +51,9 @@ OSErr FillInfo(const Place& item, FSCatalogInfoBitmap whichInfo, FSCatalogInfo& 
 }
 
 void FillName(const Place& item, HFSUniStr255& name) {
-  const VolumePointer rootOf = VolumeOfRoot(item);
-  std::u16string text = rootOf
-                            ? DecodeMacRoman(rootOf->Name())
+  const VolumePointer volume = VolumeOf(item, nullptr);
+  std::u16string text = IsRootOf(volume, item)
+                            ? DecodeMacRoman(volume->Name())
                             : ExchangeColonsAndSlashes(TextOfFileName(*LastComponent(item.path)));
   text.resize(std::min(text.size(), kLongestUnicodeName));
   name.length = static_cast<UInt16>(text.size());
@@ -54,26 +62,20 @@ void FillName(const Place& item, HFSUniStr255& name) {
 
 OSErr FillParent(const Place& item, FSRef& parent) {
   parent = {};
-  if (VolumeOfRoot(item)) return noErr;
+  const VolumePointer volume = VolumeOf(item, nullptr);
+  if (IsRootOf(volume, item)) return noErr;
   Folder folder;
-  const OSErr error = HoldingFolder(item, folder);
-  if (error == noErr) parent = Pack(folder.place.item);
-  return error;
+  const OSErr error = HoldingFolder(item, volume, folder);
+  return error == noErr ? GiveReference(folder.place, &parent) : error;
 }
 
-// The item of a reference and where it is now.
+// The item of a reference and where it is now, by a path that need not be canonical.
 OSErr PlaceOfReference(const FSRef* reference, Place& place) {
   const auto item = Unpack(reference);
   if (!item) return fnfErr;
-  auto path = FindPlace(*item);
+  auto path = FindPath(*item);
   if (!path) return fnfErr;
   place = {*std::move(path), *item};
-  return noErr;
-}
-
-OSErr GiveReference(const Place& place, FSRef* reference) {
-  RememberPlace(place);
-  *reference = Pack(place.item);
   return noErr;
 }
 
@@ -81,14 +83,23 @@ OSErr GiveReference(const Place& place, FSRef* reference) {
 
 OSErr FSGetCatalogInfo(const FSRef* ref, FSCatalogInfoBitmap whichInfo, FSCatalogInfo* catalogInfo,
                        HFSUniStr255* outName, FSSpec* fsSpec, FSRef* parentRef) {
-  return OrError([&]() -> OSErr {
-    Place item;
-    OSErr error = PlaceOfReference(ref, item);
-    if (error == noErr && catalogInfo != nullptr) error = FillInfo(item, whichInfo, *catalogInfo);
+  const auto describe = [&](const Place& item) -> OSErr {
+    OSErr error = noErr;
+    if (catalogInfo != nullptr) error = FillInfo(item, whichInfo, *catalogInfo);
     if (error == noErr && outName != nullptr) FillName(item, *outName);
     if (error == noErr && fsSpec != nullptr) error = SpecOfPlace(item, *fsSpec);
     if (error == noErr && parentRef != nullptr) error = FillParent(item, *parentRef);
     return error;
+  };
+  return OrError([&]() -> OSErr {
+    Place item;
+    OSErr error = PlaceOfReference(ref, item);
+    if (error == noErr) error = describe(item);
+    if (error == noErr || item.path.empty()) return error;
+    // A link of /proc can lead to an item of which only other paths tell where it is.
+    auto path = FindCanonicalPath(item.item);
+    if (!path || *path == item.path) return error;
+    return describe({*std::move(path), item.item});
   });
 }
 
@@ -112,11 +123,12 @@ OSErr FSMakeFSRefUnicode(const FSRef* parentRef, UniCharCount nameLength, const 
     const auto linuxName =
         FileNameOfText(ExchangeColonsAndSlashes(std::u16string(name, name + nameLength)));
     if (!linuxName || !CanBeLinuxName(*linuxName)) return fnfErr;
-    Place item{JoinPath(parent.path, *linuxName), {}};
-    const auto found = ReadItem(AT_FDCWD, item.path.c_str());
-    if (!found) return ErrorOfSystem();
-    item.item = *found;
-    return GiveReference(item, newRef);
+    const std::string path = JoinPath(parent.path, *linuxName);
+    const auto item = ReadItem(AT_FDCWD, path.c_str());
+    if (!item) return ErrorOfSystem();
+    RememberSighting(*item, path);
+    *newRef = Pack(*item);
+    return noErr;
   });
 }
 
@@ -153,7 +165,7 @@ OSErr PBGetCatInfoSync(CInfoPBPtr paramBlock) {
     UInt32 parentID = kParentOfRootID;
     if (id != kRootFolderID) {
       Folder holder;
-      if (const OSErr error = HoldingFolder(folder.place, holder)) return error;
+      if (const OSErr error = HoldingFolder(folder.place, folder.volume, holder)) return error;
       const auto found = HFSNameOf(holder, folder.place, kLongestStr255Name);
       if (!found) return fnfErr;
       name = *found;

@@ -1,11 +1,13 @@
 #include "files/HFSNames.h"
 
+#include <algorithm>
 #include <charconv>
 
 #include "files/NodeID.h"
 #include "foundation/ColonsAndSlashes.h"
 #include "foundation/FileNameText.h"
 #include "foundation/MacRoman.h"
+#include "foundation/Utf16.h"
 
 namespace tallowmere::files {
 namespace {
@@ -13,6 +15,13 @@ namespace {
 constexpr char kMark = '#';
 constexpr std::size_t kLongestShortName = 31;
 constexpr std::size_t kLongestKeptExtension = 5;  // without its dot
+
+// ASCII names, as most are, have the same letters in every form.
+bool IsAsciiName(std::string_view name) {
+  return std::all_of(name.begin(), name.end(), [](char letter) {
+    return foundation::IsAscii(static_cast<unsigned char>(letter));
+  });
+}
 
 std::u16string ExchangedText(std::string_view linuxName) {
   return foundation::ExchangeColonsAndSlashes(foundation::TextOfFileName(linuxName));
@@ -64,7 +73,8 @@ std::optional<ShortNameParts> ReadShortStem(std::string_view stem) {
 }  // namespace
 
 std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t limit) {
-  auto name = foundation::EncodeMacRoman(ExchangedText(linuxName));
+  auto name = IsAsciiName(linuxName) ? foundation::ExchangeColonsAndSlashes(std::string(linuxName))
+                                     : foundation::EncodeMacRoman(ExchangedText(linuxName));
   if (name && name->size() > limit) return std::nullopt;
   return name;
 }
@@ -98,10 +108,14 @@ bool CanBeLinuxName(std::string_view name) {
 }
 
 SpelledNames SpellHFSName(std::string_view name) {
+  SpelledNames names;
+  if (IsAsciiName(name)) {
+    names.precomposed = foundation::ExchangeColonsAndSlashes(std::string(name));
+    return CanBeLinuxName(names.precomposed) ? names : SpelledNames();
+  }
   const std::u16string text =
       foundation::ExchangeColonsAndSlashes(foundation::DecodeMacRoman(name));
   const std::u16string decomposed = foundation::DecomposeMacRoman(text);
-  SpelledNames names;
   names.precomposed = foundation::FileNameOfText(text).value_or("");
   if (!CanBeLinuxName(names.precomposed)) return {};
   if (decomposed != text) names.decomposed = foundation::FileNameOfText(decomposed).value_or("");

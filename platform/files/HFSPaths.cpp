@@ -11,19 +11,22 @@
 #include "files/PascalName.h"
 #include "files/Specs.h"
 #include "foundation/NoThrow.h"
+#include "foundation/PathText.h"
 
 using namespace tallowmere::files;
+using tallowmere::foundation::JoinPath;
 using tallowmere::foundation::OrError;
 
 namespace {
 
 constexpr char kSeparator = ':';
 
-// A path as steps from a folder: each a name, or empty for a climb to the folder above.
+// A path as steps from a folder to the folders on its way: each a name, or empty for a climb to the
+// folder above.
 struct Steps {
   std::string_view volume;  // of a full path, else empty
-  std::vector<std::string_view> names;
-  bool endsInFolder = false;  // a colon behind the last name
+  std::vector<std::string_view> folders;
+  std::string_view item;  // empty when the path ends in a folder, with a colon behind its name
 };
 
 Steps ReadPath(std::string_view path) {
@@ -34,12 +37,11 @@ Steps ReadPath(std::string_view path) {
     path.remove_prefix(first);
   }
   if (path.starts_with(kSeparator)) path.remove_prefix(1);
-  steps.endsInFolder = path.ends_with(kSeparator);
-  while (!path.empty()) {
-    const std::size_t end = path.find(kSeparator);
-    steps.names.push_back(path.substr(0, end));
-    path.remove_prefix(end == std::string_view::npos ? path.size() : end + 1);
+  for (std::size_t end; (end = path.find(kSeparator)) != std::string_view::npos;) {
+    steps.folders.push_back(path.substr(0, end));
+    path.remove_prefix(end + 1);
   }
+  steps.item = path;
   return steps;
 }
 
@@ -49,14 +51,19 @@ OSErr OnTheWay(OSErr error) {
   return error;
 }
 
+// `near` as for VolumeOf.
+OSErr UseAsFolder(Place place, const VolumePointer& near, Folder& folder) {
+  if (!S_ISDIR(place.item.type)) return dirNFErr;
+  folder.volume = VolumeOf(place, near);
+  folder.place = std::move(place);
+  return folder.volume && folder.volume->Root() ? noErr : nsvErr;
+}
+
 OSErr FolderAt(const std::string& path, Folder& folder) {
   const auto real = RealPath(path);
   if (!real) return OnTheWay(ErrorOfSystem());
   auto place = PlaceAt(*real);
-  if (!place || !S_ISDIR(place->item.type)) return dirNFErr;
-  folder.place = *std::move(place);
-  folder.volume = MountTable::OfThisProcess().OfItem(folder.place.item, folder.place.path);
-  return folder.volume && folder.volume->Root() ? noErr : nsvErr;
+  return place ? UseAsFolder(*std::move(place), nullptr, folder) : static_cast<OSErr>(dirNFErr);
 }
 
 OSErr RootOf(const VolumePointer& volume, Folder& folder) {
@@ -75,16 +82,47 @@ OSErr StartingFolder(SInt16 vRefNum, SInt32 dirID, std::string_view volumeName, 
 // Into the folder with a name, a link to it followed, or with an empty name to the folder above.
 OSErr Step(std::string_view name, Folder& folder) {
   if (name.empty()) {
-    if (VolumeOfRoot(folder.place)) return dirNFErr;
+    if (IsRootOf(folder.volume, folder.place)) return dirNFErr;
     Folder above;
-    const OSErr error = HoldingFolder(folder.place, above);
+    const OSErr error = HoldingFolder(folder.place, folder.volume, above);
     if (error == noErr) folder = above;
     return OnTheWay(error);
   }
   Place item;
   const OSErr error = LookUpHFSName(folder, name, item);
   if (error != noErr) return OnTheWay(error);
-  return FolderAt(item.path, folder);
+  if (S_ISLNK(item.item.type)) return FolderAt(item.path, folder);
+  return UseAsFolder(std::move(item), folder.volume, folder);
+}
+
+// The folder that steps from a volume's root lead to, when one look tells it: what has their names
+// in Linux is on the very mount of the root, and was reached there before without links. Not on a
+// volume with several mounts, where a name can be that of an item which one of them hides.
+bool FindFolderAtOnce(const Steps& steps, Folder& folder) {
+  if (steps.volume.empty() || steps.folders.empty()) return false;
+  folder.volume = MountTable::OfThisProcess().WithName(steps.volume);
+  if (!folder.volume || !folder.volume->Root() || folder.volume->MountPoints().size() > 1)
+    return false;
+  std::string path = folder.volume->MountPoint();
+  for (const std::string_view name : steps.folders) {
+    const std::string linuxName = SpellHFSName(name).precomposed;
+    if (linuxName.empty()) return false;
+    path = JoinPath(path, linuxName);
+  }
+  auto found = RememberedPlaceAt(path);
+  if (!found || !S_ISDIR(found->item.type)) return false;
+  folder.place = *std::move(found);
+  return folder.place.item.mount != kNoMount && folder.volume->IsMountedAs(folder.place.item.mount);
+}
+
+OSErr FindFolder(SInt16 vRefNum, SInt32 dirID, const Steps& steps, Folder& folder) {
+  if (FindFolderAtOnce(steps, folder)) return noErr;
+  OSErr error = StartingFolder(vRefNum, dirID, steps.volume, folder);
+  for (const std::string_view name : steps.folders) {
+    if (error != noErr) break;
+    error = Step(name, folder);
+  }
+  return error;
 }
 
 OSErr SpecOfName(const Folder& folder, std::string_view name, FSSpec& spec) {
@@ -92,7 +130,8 @@ OSErr SpecOfName(const Folder& folder, std::string_view name, FSSpec& spec) {
   const OSErr error = LookUpHFSName(folder, name, item);
   if (error == noErr) {
     RememberPlace(item);
-    return SpecOfPlace(item, spec);
+    RememberPlace(folder.place);
+    return SpecInFolder(folder, item, spec);
   }
   if (error != fnfErr) return error;
   if (name.size() > kLongestSpecName || SpellHFSName(name).precomposed.empty()) return bdNamErr;
@@ -113,14 +152,9 @@ OSErr MakeSpec(SInt16 vRefNum, SInt32 dirID, std::string_view path, FSSpec& spec
   }
   const Steps steps = ReadPath(path);
   Folder folder;
-  if (const OSErr error = StartingFolder(vRefNum, dirID, steps.volume, folder)) return error;
-  if (steps.names.empty()) return SpecOfPlace(folder.place, spec);
-  for (std::size_t i = 0; i + 1 < steps.names.size(); ++i) {
-    if (const OSErr error = Step(steps.names[i], folder)) return error;
-  }
-  if (!steps.endsInFolder) return SpecOfName(folder, steps.names.back(), spec);
-  const OSErr error = Step(steps.names.back(), folder);
-  return error == noErr ? SpecOfPlace(folder.place, spec) : error;
+  if (const OSErr error = FindFolder(vRefNum, dirID, steps, folder)) return error;
+  return steps.item.empty() ? SpecOfPlace(folder.place, spec)
+                            : SpecOfName(folder, steps.item, spec);
 }
 
 }  // namespace

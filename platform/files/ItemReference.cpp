@@ -74,14 +74,17 @@ std::optional<ItemStatus> ReadStatus(int folder, const char* name) {
   return ItemStatus{item, change, about.stx_nlink};
 }
 
-// The item may be replaced between the two calls. The reference is then to no item at all, unless
-// number and birth are the new one's as well.
 std::optional<ItemReference> ReadItem(int folder, const char* name) {
   auto status = ReadStatus(folder, name);
   if (!status) return std::nullopt;
-  ItemReference& item = status->item;
+  ReadProof(status->item, folder, name);
+  return status->item;
+}
+
+// The item may have been replaced since it was read. The reference is then to no item at all,
+// unless number and birth are the new one's as well.
+void ReadProof(ItemReference& item, int folder, const char* name) {
   if (!IsProvedByBirth(item)) item.handle = ReadHandle(folder, name);
-  return item;
 }
 
 bool IsAt(const ItemReference& item, int folder, const char* name) {

@@ -35,8 +35,10 @@ struct ItemReference {
 };
 static_assert(sizeof(ItemReference) == sizeof(FSRef));
 
-// An existing item and where it is: the canonical absolute path, no links on the way, and the item
-// itself not followed when it is one.
+// An existing item and where it is: its absolute path without ".", ".." and empty components, the
+// item itself not followed when it is a link. Where nothing else is said the path is canonical, as
+// it was when the item was first reached there; a folder on the way can have become a link since,
+// which leads to the same item. The item need not have its handle.
 struct Place {
   std::string path;
   ItemReference item;
@@ -53,8 +55,12 @@ bool HasHandle(const ItemReference& item);
 bool AreEqual(const ItemReference& first, const ItemReference& second);
 
 // The item itself, links not followed and nothing mounted on the way; none when there is none.
-// `folder` as in openat(2); with an empty name, the open item itself.
+// `folder` as in openat(2); with an empty name, the open item itself. With "/" at the end of the
+// name the folder to which it leads, links followed.
 std::optional<ItemReference> ReadItem(int folder, const char* name);
+
+// Gives an item that was just read as ItemStatus the handle that ReadItem would have read.
+void ReadProof(ItemReference& item, int folder, const char* name);
 
 // The item without its handle, when it was last changed, and how many names it has.
 struct ItemStatus {

@@ -68,6 +68,12 @@ std::string Below(const std::string& folder, std::string_view path) {
   return path.empty() ? folder : foundation::JoinPath(folder, path);
 }
 
+template <class Map>
+VolumePointer ValueOf(const Map& volumes, const typename Map::key_type& key) {
+  const auto found = volumes.find(key);
+  return found == volumes.end() ? nullptr : found->second;
+}
+
 std::string LabelOfRoot() {
   const Descriptor root(open("/", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   std::array<char, FSLABEL_MAX + 1> label{};
@@ -91,9 +97,17 @@ Volume::Volume(VolumeNumber number, std::vector<Mount> mounts, std::vector<std::
   for (const Mount& mount : mMounts) mMountPoints.push_back(mount.mountPoint);
 }
 
+std::vector<Mount>::const_iterator Volume::MountWithID(int id) const {
+  return std::find_if(mMounts.begin(), mMounts.end(),
+                      [id](const Mount& candidate) { return candidate.id == id; });
+}
+
+bool Volume::IsMountedAs(int mount) const {
+  return MountWithID(mount) != mMounts.end();
+}
+
 std::vector<std::string> Volume::PathsOf(const std::string& path, int mount) const {
-  const auto own = std::find_if(mMounts.begin(), mMounts.end(),
-                                [mount](const Mount& candidate) { return candidate.id == mount; });
+  const auto own = MountWithID(mount);
   if (own == mMounts.end() || !IsWithin(path, own->mountPoint)) return {path};
   const std::string inside = Below(own->root, BehindFolder(path, own->mountPoint));
   std::vector<std::string> paths;
@@ -151,21 +165,27 @@ VolumePointer MountTable::AtIndex(std::size_t index) {
 VolumePointer MountTable::WithNumber(VolumeNumber number) {
   Refresh();
   if (number == 0) return mState.volumes.front();
-  return FirstWith([number](const Volume& volume) { return volume.Number() == number; });
+  return ValueOf(mState.byNumber, number);
 }
 
 VolumePointer MountTable::WithName(std::string_view name) {
   Refresh();
-  return FirstWith([name](const Volume& volume) { return volume.Name() == name; });
+  if (mState.byName.empty()) {
+    decltype(mState.byName) byName;
+    for (const VolumePointer& volume : mState.volumes) byName.emplace(volume->Name(), volume);
+    mState.byName = std::move(byName);
+  }
+  return ValueOf(mState.byName, name);
 }
 
 VolumePointer MountTable::OfItem(const ItemReference& item, std::string_view path) {
   if (item.mount == kNoMount) {
     Refresh();
-    auto volume = FirstWith([&item](const Volume& candidate) {
-      return candidate.Root() && candidate.Root()->device == item.device;
+    const auto& volumes = mState.volumes;
+    const auto found = std::find_if(volumes.begin(), volumes.end(), [&item](const auto& volume) {
+      return volume->Root() && volume->Root()->device == item.device;
     });
-    return volume ? volume : OfPath(path);
+    return found != volumes.end() ? *found : OfPath(path);
   }
   Refresh();
   VolumePointer volume = OfMount(item.mount);
@@ -176,8 +196,7 @@ VolumePointer MountTable::OfItem(const ItemReference& item, std::string_view pat
 }
 
 VolumePointer MountTable::OfMount(int id) const {
-  const auto found = mState.byMount.find(id);
-  return found == mState.byMount.end() ? nullptr : found->second;
+  return ValueOf(mState.byMount, id);
 }
 
 VolumePointer MountTable::OfPath(std::string_view path) {
@@ -188,13 +207,6 @@ VolumePointer MountTable::OfPath(std::string_view path) {
     if (!longest || volume->MountPoint().size() > longest->MountPoint().size()) longest = volume;
   }
   return longest;
-}
-
-template <class Predicate>
-VolumePointer MountTable::FirstWith(Predicate predicate) const {
-  const auto found = std::find_if(mState.volumes.begin(), mState.volumes.end(),
-                                  [&](const VolumePointer& volume) { return predicate(*volume); });
-  return found == mState.volumes.end() ? nullptr : *found;
 }
 
 void MountTable::Refresh() {
@@ -253,8 +265,10 @@ MountTable::State MountTable::StateOf(const std::vector<Mount>& mounts, int root
       const auto [begin, end] = byParent.equal_range(mount.id);
       for (auto cover = begin; cover != end; ++cover) covers.push_back(cover->second);
     }
-    state.volumes.push_back(std::make_shared<Volume>(*number, own, std::move(covers)));
-    for (const Mount& mount : own) state.byMount[mount.id] = state.volumes.back();
+    auto volume = std::make_shared<Volume>(*number, own, std::move(covers));
+    for (const Mount& mount : own) state.byMount[mount.id] = volume;
+    state.byNumber[*number] = volume;
+    state.volumes.push_back(std::move(volume));
   }
   return state;
 }

@@ -44,6 +44,9 @@ class Volume {
   // Where something is mounted on the volume, so that what lies below is hidden there.
   const std::vector<std::string>& Covers() const { return mCovers; }
 
+  // Whether that is the id of one of its mounts.
+  bool IsMountedAs(int mount) const;
+
   // Everywhere that the volume shows the item with that path on one of its mounts, the first mount
   // first, whatever else is mounted there. The path alone for another mount.
   std::vector<std::string> PathsOf(const std::string& path, int mount) const;
@@ -63,6 +66,8 @@ class Volume {
   const std::string& Name() const;
 
  private:
+  std::vector<Mount>::const_iterator MountWithID(int id) const;
+
   VolumeNumber mNumber;
   std::vector<Mount> mMounts;
   std::vector<std::string> mMountPoints;
@@ -122,8 +127,11 @@ class MountTable {
   struct State {
     std::vector<VolumePointer> volumes;
     std::unordered_map<int, VolumePointer> byMount;  // by mount id
-    std::unordered_set<std::string> mountPoints;     // of every line of the table
-    std::unordered_set<std::string> holders;         // the folders that hold those
+    std::unordered_map<VolumeNumber, VolumePointer> byNumber;
+    // The first with each name. Empty until a name is asked for.
+    std::unordered_map<std::string_view, VolumePointer> byName;
+    std::unordered_set<std::string> mountPoints;  // of every line of the table
+    std::unordered_set<std::string> holders;      // the folders that hold those
   };
 
   void Refresh();
@@ -133,8 +141,6 @@ class MountTable {
   State StateOf(const std::vector<Mount>& mounts, int rootID);
   std::optional<VolumeNumber> NumberOf(int mountID, const std::unordered_set<int>& mountIDs);
   VolumePointer OfMount(int id) const;
-  template <class Predicate>
-  VolumePointer FirstWith(Predicate predicate) const;
 
   std::string mSource;
   Mount (*mReadRoot)();

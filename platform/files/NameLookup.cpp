@@ -22,9 +22,9 @@ struct CloseFolder {
 
 OSErr LookUp(const Folder& folder, const std::string& linuxName, Place& item) {
   std::string path = foundation::JoinPath(folder.place.path, linuxName);
-  const auto found = ReadItem(AT_FDCWD, path.c_str());
+  const auto found = ReadStatus(AT_FDCWD, path.c_str());
   if (!found) return ErrorOfSystem();
-  item = {std::move(path), *found};
+  item = {std::move(path), found->item};
   return noErr;
 }
 
@@ -80,6 +80,11 @@ std::vector<Folder> ViewsOf(const Folder& folder) {
   return views;
 }
 
+// Whether that is certain without a look at the folder's places.
+bool HasOneView(const Folder& folder) {
+  return folder.volume->MountPoints().size() == 1;
+}
+
 // --- Short forms ------------------------------------------------------------------------------
 
 // Whether a short form, read in one way, stands for an item that is called `linuxName`.
@@ -130,9 +135,12 @@ class ShortFormSearch {
   bool FindByNumber(const ShortNameParts& parts, Place& item) {
     auto place = FindItemAtOnce(mViews.front().volume, parts.nodeID, false);
     if (!place) return false;
-    const std::string holder = FolderOf(place->path);
-    const bool isHere = std::any_of(mViews.begin(), mViews.end(),
-                                    [&](const Folder& view) { return view.place.path == holder; });
+    const auto holder = HolderOf(place->path);
+    const bool isHere =
+        holder && std::any_of(mViews.begin(), mViews.end(), [&](const Folder& view) {
+          return AreEqual(view.place.item, holder->item) &&
+                 view.place.item.mount == holder->item.mount;
+        });
     const std::string linuxName(*foundation::LastComponent(place->path));
     if (!isHere || !IsShortFormOf(parts, linuxName.c_str(), place->item)) return false;
     item = *std::move(place);
@@ -190,17 +198,21 @@ std::uint32_t Folder::ID() const {
 }
 
 OSErr LookUpHFSName(const Folder& folder, std::string_view name, Place& item) {
-  return LookUpInViews(ViewsOf(folder), name, item);
+  if (!HasOneView(folder)) return LookUpInViews(ViewsOf(folder), name, item);
+  const OSErr result = FindByOwnName(folder, name, item);
+  if (result != fnfErr || ReadShortHFSName(name).empty()) return result;
+  const std::vector<Folder> views{folder};
+  return ShortFormSearch(views, name).Find(item);
 }
 
 std::optional<std::string> HFSNameOf(const Folder& folder, const Place& item, std::size_t limit) {
   const std::string linuxName(*foundation::LastComponent(item.path));
-  const std::vector<Folder> views = ViewsOf(folder);
   auto plain = PlainHFSName(linuxName, limit);
-  if (plain) {
-    const bool isUnmistakable = views.size() == 1 && SpellHFSName(*plain).precomposed == linuxName;
-    if (isUnmistakable || HasOwnName(views.front(), linuxName, item.item, limit)) return plain;
-  }
+  const bool isUnmistakable = plain && SpellHFSName(*plain).precomposed == linuxName;
+  if (isUnmistakable && HasOneView(folder)) return plain;
+  const std::vector<Folder> views = ViewsOf(folder);
+  if (isUnmistakable && views.size() == 1) return plain;
+  if (plain && HasOwnName(views.front(), linuxName, item.item, limit)) return plain;
   const std::uint32_t id = NodeIDOf(item.item, *folder.volume->Root());
   for (std::size_t marks = 1; marks <= kMostMarks; ++marks) {
     std::string name = ShortHFSName(linuxName, id, marks);

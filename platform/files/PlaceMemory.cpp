@@ -24,15 +24,16 @@ PlaceMemory& PlaceMemory::OfThisProcess() {
 
 PlaceMemory::PlaceMemory(std::size_t limit) : mLimit(limit) {}
 
-void PlaceMemory::Remember(const ItemReference& item, std::string_view path) {
+void PlaceMemory::Remember(const ItemReference& item, std::string_view path, bool isCanonical) {
   const Key key{item.device, item.inode};
   const auto known = mIndex.find(key);
-  if (known != mIndex.end() && known->second->path == path) {
+  if (known != mIndex.end() && known->second->known.path == path) {
+    known->second->known.isCanonical |= isCanonical;
     mPlaces.splice(mPlaces.begin(), mPlaces, known->second);
     return;
   }
   Places fresh;
-  fresh.push_back({key, std::string(path)});
+  fresh.push_back({key, {std::string(path), isCanonical}});
   if (known != mIndex.end()) {
     mSize -= SizeOf(*known->second);
     mPlaces.erase(known->second);
@@ -45,19 +46,19 @@ void PlaceMemory::Remember(const ItemReference& item, std::string_view path) {
   while (mSize > mLimit) ForgetTheOldest();
 }
 
-const std::string* PlaceMemory::Recall(const ItemReference& item) {
+const PlaceMemory::Known* PlaceMemory::Recall(const ItemReference& item) {
   const auto known = mIndex.find({item.device, item.inode});
   if (known == mIndex.end()) return nullptr;
   mPlaces.splice(mPlaces.begin(), mPlaces, known->second);
-  return &known->second->path;
+  return &known->second->known;
 }
 
 std::string_view PlaceMemory::Latest() const {
-  return mPlaces.empty() ? std::string_view() : mPlaces.front().path;
+  return mPlaces.empty() ? std::string_view() : mPlaces.front().known.path;
 }
 
 std::size_t PlaceMemory::SizeOf(const Place& place) {
-  return sizeof(Place) + place.path.capacity() + kOverhead;
+  return sizeof(Place) + place.known.path.capacity() + kOverhead;
 }
 
 void PlaceMemory::ForgetTheOldest() {

@@ -20,7 +20,7 @@ Boolean CFURLGetFSRef(CFURLRef url, FSRef* item) {
     if (!path) return false;
     const auto found = ReadItem(AT_FDCWD, path->c_str());
     if (!found) return false;
-    RememberPlace(*found, *path);
+    RememberSighting(*found, *path);
     *item = Pack(*found);
     return true;
   });
@@ -30,7 +30,7 @@ CFURLRef CFURLCreateFromFSRef(CFAllocatorRef, const FSRef* item) {
   return OrZero([&]() -> CFURLRef {
     const auto wanted = Unpack(item);
     if (!wanted) return nullptr;
-    const auto path = FindPlace(*wanted);
+    const auto path = FindCanonicalPath(*wanted);
     return path ? CreateUrlOfPath(*path, S_ISDIR(wanted->type)) : nullptr;
   });
 }

@@ -6,37 +6,63 @@
 
 #include "files/HFSNames.h"
 #include "files/NodeID.h"
+#include "foundation/PathText.h"
 
 namespace tallowmere::files {
 
-VolumePointer VolumeOfRoot(const Place& item) {
-  auto volume = MountTable::OfThisProcess().OfItem(item.item, item.path);
-  const bool isRoot = volume && volume->Root() && AreEqual(*volume->Root(), item.item);
-  return isRoot ? volume : nullptr;
+using foundation::JoinPath;
+using foundation::LastComponent;
+
+namespace {
+
+void FillSpecOfRoot(FSSpec& spec, const Volume& volume) {
+  FillSpec(spec, volume.Number(), kParentOfRootID, volume.Name());
 }
 
-OSErr HoldingFolder(const Place& item, Folder& folder) {
-  if (item.path == "/") return fnfErr;
-  auto found = PlaceAt(FolderOf(item.path));
-  if (!found) return ErrorOfSystem();
-  if (!S_ISDIR(found->item.type)) return fnfErr;
-  folder.place = *std::move(found);
-  folder.volume = MountTable::OfThisProcess().OfItem(folder.place.item, folder.place.path);
-  if (!folder.volume || !folder.volume->Root()) return nsvErr;
-  RememberPlace(folder.place);
-  return noErr;
-}
-
-OSErr SpecOfPlace(const Place& item, FSSpec& spec) {
-  if (const VolumePointer volume = VolumeOfRoot(item)) {
-    FillSpec(spec, volume->Number(), kParentOfRootID, volume->Name());
-    return noErr;
-  }
-  Folder folder;
-  if (const OSErr error = HoldingFolder(item, folder)) return error;
+// `item` is not its volume's root folder.
+OSErr FillSpecInFolder(FSSpec& spec, const Folder& folder, const Place& item) {
   const auto name = HFSNameOf(folder, item, kLongestSpecName);
   if (!name) return fnfErr;
   FillSpec(spec, folder.volume->Number(), folder.ID(), *name);
+  return noErr;
+}
+
+}  // namespace
+
+VolumePointer VolumeOf(const Place& item, const VolumePointer& near) {
+  if (near && near->Root() && near->IsMountedAs(item.item.mount)) return near;
+  return MountTable::OfThisProcess().OfItem(item.item, item.path);
+}
+
+bool IsRootOf(const VolumePointer& volume, const Place& item) {
+  return volume && volume->Root() && AreEqual(*volume->Root(), item.item);
+}
+
+OSErr HoldingFolder(const Place& item, const VolumePointer& near, Folder& folder) {
+  if (item.path == "/") return fnfErr;
+  auto found = HolderOf(item.path);
+  if (!found) return ErrorOfSystem();
+  folder.place = *std::move(found);
+  folder.volume = VolumeOf(folder.place, near);
+  return folder.volume && folder.volume->Root() ? noErr : nsvErr;
+}
+
+OSErr SpecOfPlace(const Place& item, FSSpec& spec) {
+  const VolumePointer volume = VolumeOf(item, nullptr);
+  if (IsRootOf(volume, item)) {
+    FillSpecOfRoot(spec, *volume);
+    return noErr;
+  }
+  Folder folder;
+  if (const OSErr error = HoldingFolder(item, volume, folder)) return error;
+  RememberPlace({JoinPath(folder.place.path, *LastComponent(item.path)), item.item});
+  return FillSpecInFolder(spec, folder, item);
+}
+
+OSErr SpecInFolder(const Folder& folder, const Place& item, FSSpec& spec) {
+  const VolumePointer volume = VolumeOf(item, folder.volume);
+  if (!IsRootOf(volume, item)) return FillSpecInFolder(spec, folder, item);
+  FillSpecOfRoot(spec, *volume);
   return noErr;
 }
 

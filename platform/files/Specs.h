@@ -8,16 +8,22 @@
 
 namespace tallowmere::files {
 
-// The folder that holds an item, with its volume. nsvErr when that folder is on no volume; fnfErr
-// for
-// "/", which nothing holds.
-OSErr HoldingFolder(const Place& item, Folder& folder);
+// The volume of an item that was just found; null for one of a kernel interface. `near` is a volume
+// as the table has it now, the item's as a rule, or null.
+VolumePointer VolumeOf(const Place& item, const VolumePointer& near);
 
-// The record of an item.
+// Whether an item is the root folder of its volume, which can be null.
+bool IsRootOf(const VolumePointer& volume, const Place& item);
+
+// The folder that holds an item, with its volume, `near` as above. The item's path need not be
+// canonical. nsvErr when that folder is on no volume; fnfErr for "/", which nothing holds.
+OSErr HoldingFolder(const Place& item, const VolumePointer& near, Folder& folder);
+
+// The record of an item, whose path need not be canonical.
 OSErr SpecOfPlace(const Place& item, FSSpec& spec);
 
-// Whether the item is the root folder of its volume, which is then given.
-VolumePointer VolumeOfRoot(const Place& item);
+// The record of an item of a folder, or of a volume that is mounted there.
+OSErr SpecInFolder(const Folder& folder, const Place& item, FSSpec& spec);
 
 // The existing folder with an id on a volume. nsvErr, dirNFErr.
 OSErr FolderWithID(SInt16 vRefNum, UInt32 id, Folder& folder);

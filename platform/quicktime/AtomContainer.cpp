@@ -12,7 +12,9 @@ constexpr std::size_t kReservedBeforeLockCount = 10;
 constexpr UInt16 kLockCount = 0;
 
 std::string Atom(OSType type, std::size_t childCount, std::string_view content) {
-  std::string atom = BigEndian(static_cast<UInt32>(kHeaderSize + content.size()));
+  std::string atom;
+  atom.reserve(kHeaderSize + content.size());
+  atom += BigEndian(static_cast<UInt32>(kHeaderSize + content.size()));
   atom += BigEndian(type);
   atom += BigEndian(kAtomID);
   atom += BigEndian(UInt16{0});
@@ -28,7 +30,8 @@ std::string BigEndian(UInt16 number) {
 }
 
 std::string BigEndian(UInt32 number) {
-  return BigEndian(static_cast<UInt16>(number >> 16)) + BigEndian(static_cast<UInt16>(number));
+  return {static_cast<char>(number >> 24), static_cast<char>(number >> 16),
+          static_cast<char>(number >> 8), static_cast<char>(number)};
 }
 
 std::string Leaf(OSType type, std::string_view data) {

@@ -25,7 +25,7 @@ int main(int count, char** arguments) {
     OSErr error = FSpMakeFSRef(&spec, &reference);
     std::printf("%d ", error);
     const auto item = error == noErr ? tallowmere::files::Unpack(&reference) : std::nullopt;
-    const auto path = item ? tallowmere::files::FindPlace(*item) : std::nullopt;
+    const auto path = item ? tallowmere::files::FindCanonicalPath(*item) : std::nullopt;
     if (path) {
       for (const char byte : *path) std::printf("%02x", static_cast<unsigned char>(byte));
     }

@@ -35,13 +35,13 @@ inline FSRef ReferenceTo(const std::string& path) {
   const auto item = ReadItem(AT_FDCWD, path.c_str());
   EXPECT_TRUE(item) << path;
   if (!item) return {};
-  RememberPlace(*item, path);
+  RememberSighting(*item, path);
   return Pack(*item);
 }
 
 inline std::string PathOf(const FSRef& reference) {
   const auto item = Unpack(&reference);
-  const auto path = item ? FindPlace(*item) : std::nullopt;
+  const auto path = item ? FindCanonicalPath(*item) : std::nullopt;
   return path.value_or("(none)");
 }
 

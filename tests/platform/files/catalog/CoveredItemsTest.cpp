@@ -100,6 +100,79 @@ TEST_F(CoveredItems, AreFoundAgainWhenTheCoverIsGone) {
   EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
 }
 
+// A process that was in a folder before it was covered still shows it.
+class CoveredItemsInTheCurrentFolder : public CoveredItems {
+ protected:
+  void SetUp() override {
+    CoveredItems::SetUp();
+    if (IsSkipped()) return;
+    mFormer = std::filesystem::current_path();
+    std::filesystem::current_path(PathTo("volume/folder/below"));
+  }
+  void TearDown() override {
+    if (!mFormer.empty()) std::filesystem::current_path(mFormer);
+  }
+  static OSErr MakeSpec(const std::string& path, FSSpec& spec) {
+    const FSRef reference = ReferenceTo(path);
+    return FSGetCatalogInfo(&reference, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr);
+  }
+
+  std::filesystem::path mFormer;
+};
+
+TEST_F(CoveredItemsInTheCurrentFolder, HaveNoRecordWhereNothingShowsTheirFolder) {
+  Cover("volume/folder");
+  mFolder.MakeFolder("volume/folder/below");
+  mFolder.MakeFile("volume/folder/below/x", "covering");
+  FSSpec spec{};
+  EXPECT_EQ(MakeSpec("/proc/self/cwd/x", spec), fnfErr);
+  ExpectRoundTrip(PathTo("volume/folder/below/x"));
+}
+
+TEST_F(CoveredItemsInTheCurrentFolder, HaveTheirRecordWhereAnotherMountShowsTheirFolder) {
+  ShowAt("again");
+  Cover("volume/folder");
+  mFolder.MakeFolder("volume/folder/below");
+  mFolder.MakeFile("volume/folder/below/x", "covering");
+  FSSpec spec{};
+  ASSERT_EQ(MakeSpec("/proc/self/cwd/x", spec), noErr);
+  EXPECT_EQ(ItemOf(spec), PathTo("again/folder/below/x"));
+}
+
+// --- A link on the way --------------------------------------------------------------------------
+
+// In a folder that may be searched and not read, so that only memory can tell where an item is.
+class ItemsBehindALink : public testing::Test {
+ protected:
+  void SetUp() override {
+    mFolder.MakeFolder("real/closed/folder");
+    mFolder.MakeFile("real/closed/folder/x");
+    mFolder.MakeFile("real/closed/" + mLongName);
+    chmod((mFolder.Path() / "real/closed").c_str(), 0711);
+    chmod(mFolder.Path().c_str(), 0777);
+    std::filesystem::create_directory_symlink("real", Link());
+  }
+  std::string Link() const { return mFolder.Path() / "link"; }
+
+  const std::string mLongName = std::string(80, 'n');
+  TemporaryFolder mFolder;
+};
+
+TEST_F(ItemsBehindALink, ComeBackByTheirShortForm) {
+  EXPECT_TRUE(HoldsForNobody([&] {
+    return ItemOf(SpecOf(Link() + "/closed/" + mLongName)) ==
+           mFolder.Path() / "real/closed" / mLongName;
+  }));
+}
+
+TEST_F(ItemsBehindALink, ComeBackWhenTheLinkIsGone) {
+  EXPECT_TRUE(HoldsForNobody([&] {
+    const FSSpec spec = SpecOf(Link() + "/closed/folder/x");
+    std::filesystem::remove(Link());
+    return ItemOf(spec) == mFolder.Path() / "real/closed/folder/x";
+  }));
+}
+
 // --- A mount point that moves -------------------------------------------------------------------
 
 class AVolumeThatMoves : public testing::Test {

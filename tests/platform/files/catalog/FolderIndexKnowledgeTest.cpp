@@ -909,5 +909,13 @@ TEST_F(AnIndexBesideADeadMount, IsNotAskedThereWhenTheLastItemWasThere) {
   EXPECT_EQ(FindItem(mVolume, 0x12345678, true), std::nullopt);
 }
 
+TEST_F(AnIndexBesideADeadMount, IsNotAskedThereWhenALinkOnTheLastItemsWayLeadsThere) {
+  std::filesystem::create_directory_symlink(PathTo("a/dead"), PathTo("a/link"));
+  RememberPlace({PathTo("a/link/below/deeper"), ItemAt("a/dead/below/deeper")});
+  Kill();
+  if (IsSkipped()) return;
+  EXPECT_EQ(FindItem(mVolume, 0x12345678, true), std::nullopt);
+}
+
 }  // namespace
 }  // namespace tallowmere::files

@@ -187,6 +187,34 @@ TEST_F(HFSPathsToRecords, LinksToFoldersOnTheWayAreFollowed) {
   EXPECT_EQ(From(":up::a"), From(Full(mTop).substr(0, Full(mTop).rfind(':')) + ":a"));
 }
 
+TEST_F(HFSPathsToRecords, AFullPathLeadsToTheFoldersThatAreThereNow) {
+  const std::string path = Full(mTop + "/a/b/file");
+  EXPECT_EQ(From(path), "a/b/file");
+  EXPECT_EQ(From(path), "a/b/file");
+  std::filesystem::rename(mTop + "/a", mTop + "/old");
+  EXPECT_EQ(From(path), "(-120)");
+  mFolder.MakeFolder("other/b");
+  mFolder.MakeFile("other/b/file");
+  ASSERT_EQ(symlink("other", (mTop + "/a").c_str()), 0);
+  EXPECT_EQ(From(path), "other/b/file");
+  EXPECT_EQ(From(path), "other/b/file");
+  std::filesystem::remove(mTop + "/a");
+  ASSERT_EQ(symlink("old", (mTop + "/a").c_str()), 0);
+  EXPECT_EQ(From(path), "old/b/file");
+  EXPECT_EQ(From(Full(mTop + "/a/b/")), "old/b");
+}
+
+TEST_F(HFSPathsToRecords, AFullPathLeadsIntoWhatIsMountedOnItsWayNow) {
+  const std::string path = Full(mTop + "/a/b/file");
+  EXPECT_EQ(From(path), "a/b/file");
+  const ScopedMount mounted("none", mTop + "/a/b", "tmpfs");
+  if (!mounted.IsMounted()) GTEST_SKIP() << "mounting is not permitted here";
+  EXPECT_EQ(From(path), "(-43)");
+  mFolder.MakeFile("a/b/file");
+  EXPECT_EQ(From(path), "a/b/file");
+  EXPECT_NE(mSpec.vRefNum, mInfo.volume);
+}
+
 TEST_F(HFSPathsToRecords, NamesExchangeSlashesAndColons) {
   mFolder.MakeFile("a/b/x:y");
   EXPECT_EQ(From("x/y"), "a/b/x:y");

@@ -241,9 +241,9 @@ TEST_F(AReferenceToAnItem, WithoutAHandleFollowsItsRename) {
   auto item = files::ReadItem(AT_FDCWD, PathOf("x").c_str());
   ASSERT_TRUE(item);
   item->handle = files::FileHandle{};
-  files::RememberPlace(*item, PathOf("x"));
+  files::RememberSighting(*item, PathOf("x"));
   Move("x", "a/y");
-  EXPECT_EQ(files::FindPlace(*item), PathOf("a/y"));
+  EXPECT_EQ(files::FindCanonicalPath(*item), PathOf("a/y"));
 }
 
 // On a volume of its own, so that looking for what is gone comes to an end soon.
@@ -296,7 +296,7 @@ TEST_F(AReferenceOnAVolume, FindsItsItemThoughItsPlaceIsForgotten) {
   const FSRef item = ReferenceTo(PathOf("volume/a/b/x"));
   files::ItemReference other{};
   for (other.inode = 0; other.inode < 50000; ++other.inode) {
-    files::RememberPlace(other, "/a place with a path that is as long as usual/and a name");
+    files::RememberSighting(other, "/a place with a path that is as long as usual/and a name");
   }
   EXPECT_EQ(PlaceOf(item), PathOf("volume/a/b/x"));
 }
@@ -305,7 +305,7 @@ TEST_F(AReferenceOnAVolume, FindsItsItemFromTheRootWhenNoFolderOfItsPlaceIsThere
   mFolder.MakeFolder("volume/a");
   mFolder.MakeFile("volume/a/x");
   const FSRef item = ReferenceTo(PathOf("volume/a/x"));
-  files::RememberPlace(*files::Unpack(&item), "/no such folder/x");
+  files::RememberSighting(*files::Unpack(&item), "/no such folder/x");
   EXPECT_EQ(PlaceOf(item), PathOf("volume/a/x"));
 }
 
