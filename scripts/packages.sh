@@ -32,6 +32,7 @@ to_test+=(hfsutils qemu-system-x86 busybox-static cpio)
 # Tests on the Debian packages, the manual pages and the completions.
 to_test+=(dpkg-dev file mandoc zsh fish)
 to_check=(clang-format clang-tidy)
+to_fuzz=(clang libclang-rt-dev)
 
 # unpack_kernel FOLDER: puts Debian's kernel there, without installing it. Without one the test that
 # starts it is skipped.
