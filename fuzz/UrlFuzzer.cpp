@@ -93,6 +93,7 @@ void CheckUrl(std::string_view text) {
 
 // Any bytes have a percent-encoded text, and a URL as an absolute path.
 void CheckBytes(std::string_view bytes) {
+  Check(foundation::PercentDecode(bytes).size() <= bytes.size());
   for (const bool isStart : {false, true}) {
     Check(foundation::PercentDecode(foundation::PercentEncodePath(bytes, isStart)) == bytes);
   }
