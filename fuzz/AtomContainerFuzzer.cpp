@@ -1,0 +1,97 @@
+// Atom containers: any bytes as a container, and the exporter's settings for any sound.
+#include <algorithm>
+#include <cstring>
+#include <string>
+
+#include "cli/AtomText.h"
+#include "fuzz/Check.h"
+#include "quicktime/AIFFExporter.h"
+#include "quicktime/AtomContainer.h"
+#include "quicktime/FourCharacterCode.h"
+#include "support/AtomReader.h"
+
+namespace tallowmere::fuzz {
+namespace {
+
+// Any bytes are read to the end or refused. What the strict reader takes the lenient one shows, a
+// line for each atom, unless it is too deep.
+std::size_t CountAtoms(const test::Atom& atom) {
+  std::size_t count = 1;
+  for (const test::Atom& child : atom.children) count += CountAtoms(child);
+  return count;
+}
+
+std::size_t DepthOf(const test::Atom& atom) {
+  std::size_t deepest = 0;
+  for (const test::Atom& child : atom.children) deepest = std::max(deepest, DepthOf(child));
+  return deepest + 1;
+}
+
+void CheckReading(std::string_view container) {
+  const auto text = cli::TextOfAtoms(container);
+  const auto root = test::ReadAtomContainer(container);
+  if (!root) return;
+  constexpr std::size_t kDeepestShown = 16;
+  Check(text.has_value() == (DepthOf(*root) <= kDeepestShown));
+  if (!text) return;
+  const auto lines = std::count(text->begin(), text->end(), '\n');
+  Check(static_cast<std::size_t>(lines) == CountAtoms(*root));
+}
+
+// The settings for a sound that is taken hold that sound, and nothing less than all of them is a
+// container.
+void CheckExport(const SoundDescription& sound, std::size_t cut) {
+  quicktime::AIFFExporter exporter;
+  const OSErr result = exporter.SetSound(sound);
+  Check(result == noErr || result == paramErr || result == badFormat);
+  Check(exporter.HasSound() == (result == noErr));
+  if (result != noErr) return;
+  const std::string settings = exporter.Settings();
+  const auto root = test::ReadAtomContainer(settings);
+  Check(root == test::SettingsOf(quicktime::BigEndian(sound.dataFormat), sound.sampleRate,
+                                 static_cast<UInt16>(sound.sampleSize),
+                                 static_cast<UInt16>(sound.numChannels)));
+  CheckReading(settings);
+  const std::string_view beginning = std::string_view(settings).substr(0, cut % settings.size());
+  Check(!test::ReadAtomContainer(beginning));
+}
+
+// A tree of three atoms with any data is read as it was written.
+void CheckWriting(std::string_view data) {
+  constexpr OSType kLeaf = quicktime::FourCharacterCode("leaf");
+  constexpr OSType kFolder = quicktime::FourCharacterCode("fold");
+  const std::string_view first = data.substr(0, data.size() / 2);
+  const std::string_view second = data.substr(first.size());
+  const std::string container =
+      quicktime::AtomContainer({quicktime::Leaf(kLeaf, first),
+                                quicktime::Parent(kFolder, {quicktime::Leaf(kLeaf, second)})});
+  const test::Atom firstLeaf{"leaf", 1, {}, std::string(first)};
+  const test::Atom secondLeaf{"leaf", 1, {}, std::string(second)};
+  const test::Atom folder{"fold", 1, {secondLeaf}, ""};
+  Check(test::ReadAtomContainer(container) == test::Atom{"sean", 1, {firstLeaf, folder}, ""});
+}
+
+}  // namespace
+}  // namespace tallowmere::fuzz
+
+// What the rest is, and then that: a container, the fields of a sound, or data for atoms.
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+  using namespace tallowmere::fuzz;
+  Input input(data, size);
+  switch (input.TakeByte() % 3) {
+    case 0:
+      CheckReading(input.Rest());
+      break;
+    case 1: {
+      const std::size_t cut = input.TakeByte();
+      SoundDescription sound = {};
+      const std::string_view fields = input.Rest();
+      std::memcpy(&sound, fields.data(), std::min(fields.size(), sizeof sound));
+      CheckExport(sound, cut);
+      break;
+    }
+    default:
+      CheckWriting(input.Rest());
+  }
+  return 0;
+}

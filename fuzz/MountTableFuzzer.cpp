@@ -1,0 +1,90 @@
+// The kernel's table of mounts: any text, read and grouped into volumes.
+#include <sys/sysmacros.h>
+
+#include <algorithm>
+#include <string>
+#include <vector>
+
+#include "files/MountInfo.h"
+#include "fuzz/Check.h"
+
+namespace tallowmere::fuzz {
+namespace {
+
+using files::Mount;
+
+// As the kernel escapes a field.
+void AppendEscaped(std::string& line, std::string_view field) {
+  for (const char c : field) {
+    if (std::string_view(" \t\n\\#").find(c) == std::string_view::npos) {
+      line.push_back(c);
+      continue;
+    }
+    const auto byte = static_cast<unsigned char>(c);
+    line.push_back('\\');
+    for (const int shift : {6, 3, 0}) line.push_back(static_cast<char>('0' + (byte >> shift & 7)));
+  }
+  line.push_back(' ');
+}
+
+void AppendLine(std::string& table, const Mount& mount) {
+  table += std::to_string(mount.id) + ' ' + std::to_string(mount.parent) + ' ' +
+           std::to_string(major(mount.device)) + ':' + std::to_string(minor(mount.device)) + ' ';
+  AppendEscaped(table, mount.root);
+  AppendEscaped(table, mount.mountPoint);
+  table += "rw shared:1 - ";
+  AppendEscaped(table, mount.type);
+  table += "none rw\n";
+}
+
+bool IsSame(const Mount& a, const Mount& b) {
+  return a.id == b.id && a.parent == b.parent && a.device == b.device && a.root == b.root &&
+         a.mountPoint == b.mountPoint && a.type == b.type;
+}
+
+void CheckMounts(const std::vector<Mount>& mounts) {
+  std::string table;
+  for (const Mount& mount : mounts) {
+    Check(mount.mountPoint.starts_with('/') && !mount.root.empty() && !mount.type.empty());
+    AppendLine(table, mount);
+  }
+  const std::vector<Mount> again = files::ParseMountInfo(table);
+  Check(std::equal(mounts.begin(), mounts.end(), again.begin(), again.end(), IsSame));
+}
+
+void CheckVolumes(const std::vector<Mount>& mounts, std::size_t root) {
+  const int rootID = mounts[root].id;
+  const auto isFolder = [](const Mount& mount) { return !mount.mountPoint.ends_with('f'); };
+  const auto volumes = files::GroupIntoVolumes(mounts, rootID, isFolder);
+
+  std::vector<bool> isTaken(mounts.size());
+  std::size_t lastPlace = 0;
+  for (std::size_t v = 0; v < volumes.size(); ++v) {
+    Check(!volumes[v].empty());
+    const std::size_t place = volumes[v].front();
+    const bool isRoot = mounts[place].id == rootID;
+    Check(!isRoot || v == 0 || mounts[volumes[0].front()].id == rootID);
+    Check(isRoot || v == 0 || place > lastPlace || mounts[lastPlace].id == rootID);
+    lastPlace = place;
+    for (const std::size_t index : volumes[v]) {
+      Check(index < mounts.size() && !isTaken[index]);
+      isTaken[index] = true;
+      Check(mounts[index].device == mounts[place].device);
+      Check(files::HoldsFiles(mounts[index].type) || mounts[index].id == rootID);
+    }
+  }
+}
+
+}  // namespace
+}  // namespace tallowmere::fuzz
+
+// Which mount the process's root is in, and then the table.
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+  using namespace tallowmere::fuzz;
+  Input input(data, size);
+  const std::size_t root = input.TakeByte();
+  const auto mounts = tallowmere::files::ParseMountInfo(input.Rest());
+  CheckMounts(mounts);
+  if (!mounts.empty()) CheckVolumes(mounts, root % mounts.size());
+  return 0;
+}

@@ -1,0 +1,51 @@
+#include <gtest/gtest.h>
+
+#include "cli/AtomText.h"
+#include "quicktime/AtomContainer.h"
+#include "quicktime/FourCharacterCode.h"
+
+namespace tallowmere::cli {
+namespace {
+
+using quicktime::FourCharacterCode;
+
+// A leaf within so many atoms, in a container.
+std::string Nested(std::size_t atoms) {
+  std::string atom = quicktime::Leaf(FourCharacterCode("leaf"), "\1");
+  for (std::size_t i = 0; i < atoms; ++i) {
+    atom = quicktime::Parent(FourCharacterCode("fold"), {atom});
+  }
+  return std::string(12, '\0') + atom;
+}
+
+TEST(AtomText, IndentsAtomsByThoseAroundThem) {
+  EXPECT_EQ(TextOfAtoms(Nested(2)), "fold\n  fold\n    leaf  1\n");
+}
+
+TEST(AtomText, OfAnythingThatIsCutOffIsNone) {
+  const std::string whole = Nested(1);
+  for (std::size_t size = 13; size < whole.size(); ++size) {
+    EXPECT_EQ(TextOfAtoms(std::string_view(whole).substr(0, size)), std::nullopt) << size;
+  }
+}
+
+TEST(AtomText, OfSixteenAtomsWithinEachOtherIsThereAndOfMoreIsNone) {
+  EXPECT_NE(TextOfAtoms(Nested(15)), std::nullopt);
+  EXPECT_EQ(TextOfAtoms(Nested(16)), std::nullopt);
+}
+
+// As deep as an answer can be: that took more stack than a process has.
+TEST(AtomText, OfAtomsAsDeepAsAnAnswerIsLongIsNone) {
+  constexpr std::size_t kAtomHead = 20;
+  constexpr std::size_t kLongestSettings = 1 << 20;
+  std::string container(12, '\0');
+  for (std::size_t size = kLongestSettings - kLongestSettings % kAtomHead; size > 0;
+       size -= kAtomHead) {
+    container += quicktime::BigEndian(static_cast<UInt32>(size)) + "fold" + std::string(6, '\0') +
+                 quicktime::BigEndian(UInt16{1}) + std::string(4, '\0');
+  }
+  EXPECT_EQ(TextOfAtoms(container), std::nullopt);
+}
+
+}  // namespace
+}  // namespace tallowmere::cli
