@@ -69,6 +69,7 @@ class Volume {
   std::vector<std::string> mCovers;
   // On demand: the label of "/" costs three system calls.
   mutable std::optional<std::string> mName;
+  mutable bool mIsNameKnown = false;
   mutable std::optional<ItemReference> mRoot;
   mutable bool mIsMoved = false;
 };

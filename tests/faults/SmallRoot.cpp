@@ -7,12 +7,13 @@
 
 #include <cstdint>
 #include <cstdlib>
-#include <system_error>
+#include <fstream>
 
 namespace tallowmere::test {
 namespace {
 
-constexpr std::uintmax_t kImageSize = 8 << 20;
+// In bytes.
+constexpr std::uintmax_t kImageSize = 64 << 20;
 
 std::vector<std::string> LoadedLibraries() {
   std::vector<std::string> libraries;
@@ -30,26 +31,34 @@ std::vector<std::string> LoadedLibraries() {
 }  // namespace
 
 SmallRoot::SmallRoot(const std::vector<std::string>& files)
-    : mRoot("tallowmere", mFolder.Path().string(), "tmpfs") {
-  if (!mRoot.IsMounted()) return;
+    : mImage("ext4", {"mkfs.ext4", "-q", "-F", "-L", kLabel}, kImageSize) {
+  if (mImage.IsMade() && mImage.Mount()) {
+    mTop = mImage.Path();
+  } else {
+    mTop = mFolder.Path();
+    mRoot.emplace("tallowmere", mTop.string(), "tmpfs");
+    if (!mRoot->IsMounted()) return;
+  }
+  Furnish(files);
+  mProc.emplace("/proc", Outside("/proc").string(), nullptr, MS_BIND);
+  mDisk.emplace("tallowmere", Outside(kDisk).string(), "tmpfs");
+  mFormerRoot = open("/", O_PATH | O_DIRECTORY | O_CLOEXEC);
+  mIsEntered = mProc->IsMounted() && mDisk->IsMounted() && mFormerRoot >= 0 &&
+               chroot(mTop.c_str()) == 0 && chdir("/") == 0;
+}
+
+void SmallRoot::Furnish(const std::vector<std::string>& files) {
   std::vector<std::string> all = LoadedLibraries();
   all.insert(all.end(), files.begin(), files.end());
   for (const std::string& file : all) {
     std::filesystem::create_directories(Outside(file).parent_path());
     std::filesystem::copy_file(file, Outside(file));
   }
-  for (const char* const folder : {"/proc", "/tmp", kDisk, kImage}) {
+  for (const char* const folder : {"/proc", "/tmp", "/etc", kDisk, kHome}) {
     std::filesystem::create_directories(Outside(folder));
   }
-  mProc.emplace("/proc", Outside("/proc").string(), nullptr, MS_BIND);
-  mDisk.emplace("tallowmere", Outside(kDisk).string(), "tmpfs");
-  mImage.emplace("ext4", std::vector<std::string>{"mkfs.ext4", "-q", "-F"}, kImageSize);
-  if (mImage->IsMade() && mImage->Mount()) {
-    mImagePlace.emplace(mImage->Path().string(), Outside(kImage).string(), nullptr, MS_BIND);
-  }
-  mFormerRoot = open("/", O_PATH | O_DIRECTORY | O_CLOEXEC);
-  mIsEntered = mProc->IsMounted() && mDisk->IsMounted() && mFormerRoot >= 0 &&
-               chroot(mFolder.Path().c_str()) == 0 && chdir("/") == 0;
+  std::ofstream(Outside("/etc/passwd"))
+      << "user:x:" << getuid() << ":" << getgid() << "::" << kHome << ":/bin/sh\n";
 }
 
 SmallRoot::~SmallRoot() {

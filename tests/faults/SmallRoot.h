@@ -15,32 +15,34 @@ namespace tallowmere::test {
 
 class SmallRoot {
  public:
-  // With these programs and libraries at their places, the libraries of this process, /proc, a
-  // volume in memory at kDisk and, where one can be mounted, an ext4 volume at kImage. The process
-  // stays outside where that is not permitted. REQUIRES: it is in a mount namespace of its own.
+  // With these programs and libraries at their places, the libraries of this process, /proc, a home
+  // folder kHome for its user, and a volume in memory at kDisk. It is an ext4 volume called kLabel
+  // where one can be mounted, else one in memory. The process stays outside where all that is not
+  // permitted. REQUIRES: it is in a mount namespace of its own.
   explicit SmallRoot(const std::vector<std::string>& files);
   SmallRoot(const SmallRoot&) = delete;
   SmallRoot& operator=(const SmallRoot&) = delete;
   ~SmallRoot();  // the process is back
 
   static constexpr char kDisk[] = "/Disk";
-  static constexpr char kImage[] = "/Image";
+  static constexpr char kHome[] = "/Home";
+  static constexpr char kLabel[] = "System";
 
   bool IsEntered() const { return mIsEntered; }
-  bool HasImage() const { return mImagePlace && mImagePlace->IsMounted(); }
+  bool IsImage() const { return !mRoot; }
 
  private:
-  // The place that a path inside has outside.
-  std::filesystem::path Outside(const std::string& path) const {
-    return mFolder.Path() / path.substr(1);
-  }
+  void Furnish(const std::vector<std::string>& files);
+
+  // Where a path inside is outside.
+  std::filesystem::path Outside(const std::string& path) const { return mTop / path.substr(1); }
 
   TemporaryFolder mFolder;
-  ScopedMount mRoot;
+  FileSystemImage mImage;
+  std::optional<ScopedMount> mRoot;  // in memory
+  std::filesystem::path mTop;
   std::optional<ScopedMount> mProc;
   std::optional<ScopedMount> mDisk;
-  std::optional<FileSystemImage> mImage;
-  std::optional<ScopedMount> mImagePlace;
   int mFormerRoot = -1;
   bool mIsEntered = false;
 };

@@ -16,7 +16,18 @@ constexpr int kNoVolume = 32767;
 constexpr int kNoFolder = -1;
 constexpr int kParentOfRoots = 1;
 constexpr int kRootFolder = 2;
+// The name of the volume of "/" for whoever may not read that folder.
+const std::string kUnknownLabel = "Root";
+
 constexpr int kNoMemory = -108;
+
+// An HFS name without other letters than those of ASCII and this one.
+std::string InUtf8(std::string name) {
+  for (std::size_t at = 0; (at = name.find('\x8E', at)) != std::string::npos;) {
+    name.replace(at, 1, "\u00E9");
+  }
+  return name;
+}
 
 std::string WithTrailer(std::string fields) {
   return fields.append(kTrailer);
@@ -53,7 +64,7 @@ Subject::Subject(std::filesystem::path path, std::string created, std::string lo
   const std::string answer =
       service.Ask(FullPathRequest(mPath.string(), kPathRoom, 1), 2 + kPathRoom + kTrailer.size());
   mFullPath = answer.c_str() + 2;
-  if (mCreated.empty()) mCreated = mName;
+  if (mCreated.empty()) mCreated = InUtf8(mName);
   if (mLossy.empty()) mLossy = mName;
 }
 
@@ -67,7 +78,8 @@ Question Subject::Ask(unsigned code) const {
     case 3:
       return {VolumeNumberRequest(mVolumeName), {VolumeNumberResponse(kNoVolume)}};
     case 4:
-      return {VolumeNameRequest(mVolume), {kNoVolumeNameResponse}};
+      return {VolumeNameRequest(mVolume),
+              {kNoVolumeNameResponse, VolumeNameResponse(kUnknownLabel)}};
     case 5:
       return {HFSNameRequest(path, kNameRoom), {NameResponse(0, "")}};
     case 6:
@@ -93,6 +105,8 @@ std::string Subject::NewItem() const {
 Answers Subject::FullPaths() const {
   Answers answers;
   AddShortened(mFullPath, answers);
+  const bool isOnTop = mVolume == mVolumeAbove;
+  if (isOnTop) AddShortened(kUnknownLabel + mFullPath.substr(mFullPath.find(':')), answers);
   const std::size_t colon = mFullPath.rfind(':', mFullPath.size() - 2);
   const bool isBelow = colon != std::string::npos && std::filesystem::is_directory(mPath);
   if (isBelow) AddShortened(mFullPath.substr(0, colon + 1), answers);
