@@ -12,6 +12,7 @@
 #include <cstring>
 #include <memory>
 #include <new>
+#include <optional>
 #include <string_view>
 
 #include "CFOwned.h"
@@ -702,13 +703,19 @@ bool CFileRef::FollowLink() {
 
 // --- Volume and folder ------------------------------------------------------------------------
 
-// The climb goes to the top, not just to the nearest folder that exists.
+// The climb goes to the top, not just to the nearest folder that exists. A folder that cannot be
+// looked at could be the top, and what is above it on another volume.
 short CFileRef::GetVolumeRefNumber() const {
   if (!IsValid()) return kNoVolume;
   FSRef item = {};
   if (CFURLGetFSRef(mURL, &item)) return VolumeOf(item);
   CFileRef root(*this);
-  while (root.ClimbToExisting() && !root.IsRoot()) root.SetToParent();
+  while (root.ClimbToExisting()) {
+    const std::optional<bool> isRoot = root.ReadIsRoot();
+    if (!isRoot) return kNoVolume;
+    if (*isRoot) break;
+    root.SetToParent();
+  }
   return root.IsValid() && CFURLGetFSRef(root.mURL, &item) ? VolumeOf(item) : kNoVolume;
 }
 
@@ -738,12 +745,16 @@ unsigned long CFileRef::GetNodeID() const {
 }
 
 bool CFileRef::IsRoot() const {
+  return ReadIsRoot().value_or(false);
+}
+
+std::optional<bool> CFileRef::ReadIsRoot() const {
   struct stat about = {};
-  if (!ReadStatus(GetPath(), &about)) return false;
+  if (!ReadStatus(GetPath(), &about)) return std::nullopt;
   CFileRef folder(*this);
   folder.SetToParent();
   struct stat aboutFolder = {};
-  if (!ReadStatus(folder.GetPath(), &aboutFolder)) return false;
+  if (!ReadStatus(folder.GetPath(), &aboutFolder)) return std::nullopt;
   return about.st_dev != aboutFolder.st_dev || about.st_ino == aboutFolder.st_ino;
 }
 
@@ -768,6 +779,9 @@ bool CFileRef::GetFSSpec(FSSpec* spec) const {
   if (UpdateInternalFSRef()) {
     return FSGetCatalogInfo(&mFSRef, kFSCatInfoNone, nullptr, nullptr, spec, nullptr) == noErr;
   }
+  // What is there all the same is no new item: its record can have another name, or another folder.
+  mode_t mode = 0;
+  if (ReadMode(GetPath(), &mode)) return false;
   CFileRef folder(*this);
   folder.SetToParent();
   FSCatalogInfo about = {};

@@ -15,6 +15,7 @@
 #include <CoreFoundation/CoreFoundation.h>
 #include <CoreServices/CoreServices.h>
 
+#include <optional>
 #include <string>
 
 // How a path is written. Every value but the first two means Windows.
@@ -272,6 +273,7 @@ class CFileRef {
   bool Hold(CFURLRef url);  // takes the URL over, into an empty reference; whether it is one
   bool HoldPathOf(CFURLRef url, bool isDirectory);
   bool FollowLink();
+  std::optional<bool> ReadIsRoot() const;  // none when it cannot be looked at
   bool ClimbToExisting();  // to the item itself if that exists; false, and empty, to none
 
   CFURLRef mURL;           // one reference of ours; null when empty

@@ -232,9 +232,9 @@ bool CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC(CFileRef* ref, FSSpec con
     ref->Invalidate();
     return false;
   }
-  // The reference names what is meant, even when that has no URL.
+  // The reference names what is meant, even when that has no URL; never the folder.
   if (hasFolder) {
-    ref->AddToPath(name.Get(), false);
+    if (!ref->AddToPath(name.Get(), false)) ref->Invalidate();
   } else {
     ref->Set(name.Get(), kPathStylePOSIX, false);
   }

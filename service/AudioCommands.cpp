@@ -5,10 +5,11 @@
 
 namespace {
 
-// A block with the description of a sound, the caller's. A lack of memory for it ends the process.
+// A block with the description of a sound, the caller's; null without memory for it.
 Handle NewSoundDescription(unsigned long sampleRate, unsigned long sampleSize,
                            unsigned char channels, unsigned long dataFormat) {
   const Handle block = NewHandleClear(sizeof(SoundDescription));
+  if (block == nullptr) return nullptr;
   auto* const description = reinterpret_cast<SoundDescription*>(*block);
   description->descSize = sizeof(SoundDescription);
   description->dataFormat = static_cast<OSType>(dataFormat);
@@ -34,6 +35,10 @@ OSStatus GetAIFFExportSettingsThroughIPC(char*** settings, unsigned long sampleR
   if (result != noErr) return result;
 
   const Handle description = NewSoundDescription(sampleRate, sampleSize, channels, dataFormat);
+  if (description == nullptr) {
+    CloseComponent(exporter);
+    return memFullErr;
+  }
   // Movie export answers in 32 bits; what travels has 16.
   result = static_cast<OSErr>(MovieExportSetSampleDescription(
       exporter, reinterpret_cast<SampleDescriptionHandle>(description), SoundMediaType));

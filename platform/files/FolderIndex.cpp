@@ -271,8 +271,7 @@ void FolderIndex::Visit(const Waiting& waiting, Search& search) {
                                           : ReadStatus(*parent, waiting.name.c_str());
   if (!status) {
     search.NoteError(errno);
-    if (HidesSomething(errno)) Distrust(waiting.parent);
-    return;
+    return Distrust(waiting.parent);
   }
   if (!S_ISDIR(status->item.type)) return;
   if (!IsOfVolume(status->item, waiting)) return Distrust(waiting.parent);
@@ -301,7 +300,7 @@ void FolderIndex::VisitFolder(const Waiting& waiting, int parent, Descriptor des
   if (isLeaf && search.WantsFolder()) return MarkAsRead(index, status.change, now);
 
   if (!descriptor.IsOpen() && !OpenAgain(waiting, parent, status.item, descriptor, search)) {
-    if (errno == EACCES) MarkAsRead(index, status.change, now);
+    if (errno == EACCES) MarkAsClosed(index);
     return;
   }
   const std::size_t before = mWaiting.size();
@@ -335,6 +334,13 @@ void FolderIndex::MarkAsRead(std::uint32_t index, std::int64_t change, std::int6
   folder.read = mSearches;
   const bool mayChangeUnseen = change + kCoarsestTick >= now;
   folder.change = mayChangeUnseen ? kNotRead : change;
+}
+
+// The folder may not be read now. Another server, or a new ticket, can let it be read without a
+// change.
+void FolderIndex::MarkAsClosed(std::uint32_t index) {
+  mFolders[index].change = kNotRead;
+  mFolders[index].checked = mSearches;
 }
 
 // Something in the folder was not seen that may be seen later though the folder does not change.

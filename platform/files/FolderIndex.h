@@ -4,7 +4,8 @@
 // What a pass learns about folders is kept, under 64 bytes and the name for each; files are not
 // kept. A pass stops as soon as the answer is certain and goes on from there for the next question.
 // A folder that was read is read again only when its change time has moved, when something is
-// mounted in it, or when a file is looked for: whoever looks for a file reads every folder once. An
+// mounted in it, when it could not be read, or when a file is looked for: whoever looks for a file
+// reads every folder once. An
 // id that no item had is noted, and the next question for it reads only what has changed since. The
 // index never leaves its volume, waits for no server and no automounter, and passes over what it
 // may not read. Between two questions it has nothing open.
@@ -98,6 +99,7 @@ class FolderIndex {
                Search& search);
   Kind LookAt(std::uint32_t index, const Descriptor& descriptor, const char* name, Search& search);
   void MarkAsRead(std::uint32_t index, std::int64_t change, std::int64_t now);
+  void MarkAsClosed(std::uint32_t index);
   void Distrust(std::uint32_t index);
   void CheckKnown(Search& search);
   bool CheckUnchanged(std::uint32_t index, Search& search);

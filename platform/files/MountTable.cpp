@@ -11,6 +11,7 @@
 #include <array>
 #include <cerrno>
 #include <limits>
+#include <system_error>
 #include <utility>
 
 #include "files/HFSNames.h"
@@ -74,20 +75,31 @@ VolumePointer ValueOf(const Map& volumes, const typename Map::key_type& key) {
   return found == volumes.end() ? nullptr : found->second;
 }
 
-std::string LabelOfRoot() {
+// Empty for a file system that has none; none for a user who may not read "/" now. Throws
+// std::system_error when it cannot be read for another reason.
+std::optional<std::string> LabelOfRoot() {
   const Descriptor root(open("/", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   std::array<char, FSLABEL_MAX + 1> label{};
-  if (!root.IsOpen() || ioctl(root.Get(), FS_IOC_GETFSLABEL, label.data()) != 0) return {};
-  return label.data();
+  if (root.IsOpen() && ioctl(root.Get(), FS_IOC_GETFSLABEL, label.data()) == 0) {
+    return label.data();
+  }
+  const bool canHaveNone = root.IsOpen() && (errno == ENOTTY || errno == EOPNOTSUPP ||
+                                             errno == EINVAL || errno == ENOSYS);
+  if (canHaveNone) return "";
+  if (errno != EACCES) throw std::system_error(errno, std::generic_category());
+  return std::nullopt;
 }
 
-std::string LinuxNameOf(const std::string& mountPoint) {
+// `isKnown` is false for a name that has to do for now.
+std::string LinuxNameOf(const std::string& mountPoint, bool& isKnown) {
+  isKnown = true;
   if (mountPoint != "/") return mountPoint.substr(mountPoint.rfind('/') + 1);
-  std::string label = LabelOfRoot();
-  if (label.empty()) return kUnlabelledRoot;
+  std::optional<std::string> label = LabelOfRoot();
+  isKnown = label.has_value();
+  if (!label || label->empty()) return kUnlabelledRoot;
   // A label may hold what no name of an item can.
-  std::replace(label.begin(), label.end(), '/', ':');
-  return label;
+  std::replace(label->begin(), label->end(), '/', ':');
+  return *std::move(label);
 }
 
 }  // namespace
@@ -128,8 +140,8 @@ const std::optional<ItemReference>& Volume::Root() const {
 }
 
 const std::string& Volume::Name() const {
-  if (!mName) {
-    const std::string name = LinuxNameOf(MountPoint());
+  if (!mName || !mIsNameKnown) {
+    const std::string name = LinuxNameOf(MountPoint(), mIsNameKnown);
     auto plain = PlainHFSName(name, kLongestSpecName);
     mName = plain ? *std::move(plain) : ShortHFSName(name, kRootFolderID);
   }
@@ -170,12 +182,10 @@ VolumePointer MountTable::WithNumber(VolumeNumber number) {
 
 VolumePointer MountTable::WithName(std::string_view name) {
   Refresh();
-  if (mState.byName.empty()) {
-    decltype(mState.byName) byName;
-    for (const VolumePointer& volume : mState.volumes) byName.emplace(volume->Name(), volume);
-    mState.byName = std::move(byName);
-  }
-  return ValueOf(mState.byName, name);
+  const auto& volumes = mState.volumes;
+  const auto found = std::find_if(volumes.begin(), volumes.end(),
+                                  [name](const auto& volume) { return volume->Name() == name; });
+  return found == volumes.end() ? nullptr : *found;
 }
 
 VolumePointer MountTable::OfItem(const ItemReference& item, std::string_view path) {

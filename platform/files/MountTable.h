@@ -74,6 +74,7 @@ class Volume {
   std::vector<std::string> mCovers;
   // On demand: the label of "/" costs three system calls.
   mutable std::optional<std::string> mName;
+  mutable bool mIsNameKnown = false;
   mutable std::optional<ItemReference> mRoot;
   mutable bool mIsMoved = false;
 };
@@ -128,8 +129,6 @@ class MountTable {
     std::vector<VolumePointer> volumes;
     std::unordered_map<int, VolumePointer> byMount;  // by mount id
     std::unordered_map<VolumeNumber, VolumePointer> byNumber;
-    // The first with each name. Empty until a name is asked for.
-    std::unordered_map<std::string_view, VolumePointer> byName;
     std::unordered_set<std::string> mountPoints;  // of every line of the table
     std::unordered_set<std::string> holders;      // the folders that hold those
   };

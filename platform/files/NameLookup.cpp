@@ -20,6 +20,12 @@ struct CloseFolder {
   void operator()(DIR* folder) const { closedir(folder); }
 };
 
+// The next entry; null with errno 0 at the end, and with another one on an error.
+const dirent* NextEntry(DIR* folder) {
+  errno = 0;
+  return readdir(folder);
+}
+
 OSErr LookUp(const Folder& folder, const std::string& linuxName, Place& item) {
   std::string path = foundation::JoinPath(folder.place.path, linuxName);
   const auto found = ReadStatus(AT_FDCWD, path.c_str());
@@ -33,11 +39,12 @@ OSErr FindByForm(const Folder& folder, std::string_view name, Place& item) {
   const std::unique_ptr<DIR, CloseFolder> entries(opendir(folder.place.path.c_str()));
   if (!entries) return ErrorOfSystem();
   std::optional<std::string> found;
-  while (const dirent* const entry = readdir(entries.get())) {
+  while (const dirent* const entry = NextEntry(entries.get())) {
     if (PlainHFSName(entry->d_name, kLongestStr255Name) != name) continue;
     if (found) return fnfErr;
     found = entry->d_name;
   }
+  if (errno != 0) return ErrorOfSystem();
   return found ? LookUp(folder, *found, item) : static_cast<OSErr>(fnfErr);
 }
 
@@ -114,6 +121,7 @@ class ShortFormSearch {
     for (const Folder& view : mViews) {
       if (const OSErr error = SearchFolder(view)) return error;
     }
+    if (mIsHidden) return ioErr;
     if (mFound.size() != 1) return fnfErr;
     item = mFound.front();
     return noErr;
@@ -152,18 +160,21 @@ class ShortFormSearch {
     if (!entries) return ErrorOfSystem();
     const bool untrueEntries = HasUntrueEntries(view.volume->Type()) ||
                                MountTable::OfThisProcess().HoldsMountPoint(view.place.path);
-    while (const dirent* const entry = readdir(entries.get())) {
+    while (const dirent* const entry = NextEntry(entries.get())) {
       for (const ShortNameParts& parts : mReadings) {
         if (!MayHaveID(view, *entry, parts.nodeID, untrueEntries)) continue;
         if (StandsFor(parts, mName, entry->d_name)) Offer(view, parts, entry->d_name);
       }
     }
-    return noErr;
+    return errno == 0 ? static_cast<OSErr>(noErr) : ErrorOfSystem();
   }
 
   void Offer(const Folder& view, const ShortNameParts& parts, const char* linuxName) {
     Place item;
-    if (LookUp(view, linuxName, item) != noErr) return;
+    if (LookUp(view, linuxName, item) != noErr) {
+      mIsHidden = mIsHidden || errno != ENOENT;
+      return;
+    }
     if (NodeIDOf(item.item, *view.volume->Root()) != parts.nodeID) return;
     const bool isKnown = std::any_of(mFound.begin(), mFound.end(), [&](const Place& found) {
       return AreEqual(found.item, item.item);
@@ -175,6 +186,7 @@ class ShortFormSearch {
   std::string_view mName;
   std::vector<ShortNameParts> mReadings;
   std::vector<Place> mFound;  // different items
+  bool mIsHidden = false;     // whether an entry that could be the item cannot be looked at
 };
 
 OSErr LookUpInViews(const std::vector<Folder>& views, std::string_view name, Place& item) {
@@ -216,11 +228,12 @@ std::optional<std::string> HFSNameOf(const Folder& folder, const Place& item, st
   const std::uint32_t id = NodeIDOf(item.item, *folder.volume->Root());
   for (std::size_t marks = 1; marks <= kMostMarks; ++marks) {
     std::string name = ShortHFSName(linuxName, id, marks);
+    if (IsItsAlone(views, id, name)) return name;
     Place found;
-    if (IsItsAlone(views, id, name) ||
-        (LookUpInViews(views, name, found) == noErr && AreEqual(found.item, item.item))) {
-      return name;
-    }
+    const OSErr result = LookUpInViews(views, name, found);
+    if (result == noErr && AreEqual(found.item, item.item)) return name;
+    // Another short form would be one for now.
+    if (result != noErr && result != fnfErr) return std::nullopt;
   }
   return std::nullopt;
 }

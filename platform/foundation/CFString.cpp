@@ -5,6 +5,7 @@
 #include <cstring>
 #include <exception>
 #include <limits>
+#include <new>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -101,11 +102,18 @@ CFIndex CFStringGetMaximumSizeForEncoding(CFIndex length, CFStringEncoding encod
 
 // --- Making -----------------------------------------------------------------------------------
 
-CFStringRef __CFStringMakeConstantString(const char* utf8) {
-  const CFStringRef constant = OrZero([&] { return CreateDecoded(utf8, kCFStringEncodingUTF8); });
-  if (constant == nullptr) std::terminate();
-  // A constant is never given back.
-  return constant;  // NOLINT(clang-analyzer-osx.cocoa.RetainCount)
+// A string holds a text this short in itself.
+CFStringRef __CFStringMakeConstantString(const char* utf8, unsigned char* room) {
+  static_assert(sizeof(String) <= __kCFConstantStringSize && alignof(String) <= alignof(void*));
+  std::optional<std::u16string> text;
+  try {
+    text = FindEncoding(kCFStringEncodingUTF8)->decode(utf8);
+  } catch (const std::bad_alloc&) {
+    std::terminate();
+  }
+  if (!text) std::terminate();
+  const Object* const object = new (room) String(*std::move(text));
+  return reinterpret_cast<CFStringRef>(object);
 }
 
 CFStringRef CFStringCreateWithCharacters(CFAllocatorRef, const UniChar* characters,

@@ -30,6 +30,12 @@ std::array<int, 2> MakePipe() {
   return ends;
 }
 
+std::size_t UnreadOf(int pipe) {
+  int unread = 0;
+  if (ioctl(pipe, FIONREAD, &unread) != 0) std::abort();
+  return static_cast<std::size_t>(unread);
+}
+
 std::string ReadUpTo(int descriptor, std::size_t size) {
   std::string bytes;
   while (bytes.size() < size) {
@@ -106,9 +112,10 @@ std::string ChildProgram::ReadErrorsToEnd() {
 }
 
 std::size_t ChildProgram::UnreadInput() const {
-  int unread = 0;
-  if (ioctl(mInputReader, FIONREAD, &unread) != 0) std::abort();
-  return static_cast<std::size_t>(unread);
+  return UnreadOf(mInputReader);
+}
+std::size_t ChildProgram::UnreadOutput() const {
+  return UnreadOf(mOutput);
 }
 
 int ChildProgram::Wait() {

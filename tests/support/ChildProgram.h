@@ -37,6 +37,9 @@ class ChildProgram {
   // How many of the bytes written to it it has not read yet.
   std::size_t UnreadInput() const;
 
+  // How many bytes of its standard output are there to be read now.
+  std::size_t UnreadOutput() const;
+
   // Waits for its end, at most ten seconds: its exit status, minus the signal that ended it, or
   // -1000 when it still runs.
   int Wait();

@@ -82,13 +82,16 @@ CFIndex CFStringGetMaximumSizeForEncoding(CFIndex length, CFStringEncoding encod
 // A string is a sequence of UTF-16 units. Unpaired surrogates are kept.
 
 // The string of a constant, made on its first use and never ended. REQUIRES: a literal of UTF-8
-// text. A process without memory for its constants ends.
-#define CFSTR(literal)                                                                \
-  ([]() -> CFStringRef {                                                              \
-    static const CFStringRef sConstant = __CFStringMakeConstantString("" literal ""); \
-    return sConstant;                                                                 \
+// text. One of up to 7 UTF-16 units needs no memory; a process without memory for a longer one
+// ends.
+#define CFSTR(literal)                                                                       \
+  ([]() -> CFStringRef {                                                                     \
+    alignas(void*) static unsigned char sRoom[__kCFConstantStringSize];                      \
+    static const CFStringRef sConstant = __CFStringMakeConstantString("" literal "", sRoom); \
+    return sConstant;                                                                        \
   }())
-CFStringRef __CFStringMakeConstantString(const char* utf8);
+enum { __kCFConstantStringSize = 48 };  // bytes
+CFStringRef __CFStringMakeConstantString(const char* utf8, unsigned char* room);
 
 // The string of `length` UTF-16 units.
 CFStringRef CFStringCreateWithCharacters(CFAllocatorRef allocator, const UniChar* characters,

@@ -1,0 +1,342 @@
+// Every request with every system call and every allocation of the service failing in turn, each
+// call with each error that it can have: what is answered is right or says that it is not known, or
+// the service ends as the protocol tells; the same question is answered rightly right after, and
+// nothing is left behind.
+#include <gtest/gtest.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <filesystem>
+#include <fstream>
+#include <iostream>
+#include <memory>
+#include <optional>
+#include <string>
+#include <thread>
+#include <utility>
+#include <vector>
+
+#include "faults/FaultyService.h"
+#include "faults/PlausibleFaults.h"
+#include "faults/SmallRoot.h"
+#include "faults/Subject.h"
+#include "support/OwnMountNamespace.h"
+#include "support/Wire.h"
+
+namespace tallowmere::test {
+namespace {
+
+// Enough to see what is wrong with a request.
+constexpr int kMostFindings = 6;
+
+// Of the times that file systems keep, and some more.
+constexpr std::chrono::milliseconds kCoarsestTick(2200);
+
+class InjectedFaults : public testing::Environment {
+ public:
+  void TearDown() override {
+    testing::Test::RecordProperty("faults", std::to_string(count));
+    std::cout << "Faults injected: " << count << "\n";
+  }
+
+  static inline unsigned long count = 0;
+};
+testing::Environment* const kInjectedFaults = testing::AddGlobalTestEnvironment(new InjectedFaults);
+
+std::vector<Fault> FaultsIn(const Effort& effort) {
+  std::vector<Fault> faults;
+  for (std::uint32_t i = 0; i < effort.calls.size(); ++i) {
+    for (const std::int32_t effect : PlausibleEffects(effort.calls[i])) {
+      faults.push_back({Fault::Kind::kCall, i + 1, effect});
+    }
+  }
+  for (std::uint32_t i = 0; i < effort.allocations; ++i) {
+    faults.push_back({Fault::Kind::kAllocation, i + 1, 0});
+  }
+  return faults;
+}
+
+// Whether a service may end so.
+bool IsDocumentedEnd(const Fault& fault, const Outcome& outcome, const Answers& answers) {
+  if (outcome.status != 0) return false;
+  if (fault.kind == Fault::Kind::kAllocation) return outcome.response.empty();
+  const bool isWhole = answers.contains(outcome.response);
+  switch (outcome.failedCall.number) {
+    case SYS_read:
+      // What is read behind the answer is the next request's code.
+      return outcome.failedCall.first == STDIN_FILENO && (isWhole || outcome.response.empty());
+    case SYS_write:
+      return outcome.failedCall.first == STDOUT_FILENO && BeginsOneOf(answers, outcome.response);
+    case SYS_kill:
+      return isWhole;
+    default:
+      return false;
+  }
+}
+
+std::string Readable(const std::string& response) {
+  return testing::PrintToString(response.substr(0, response.find_last_not_of('\0') + 1));
+}
+
+// One question, asked while something fails.
+class Trial {
+ public:
+  explicit Trial(Question question)
+      : mRequest(std::move(question.request)), mAnswers(std::move(question.honest)) {
+    FaultyService service;
+    mRight = service.Ask(mRequest).response;
+    mAnswers.insert(mRight);
+    mWhenNew = FaultsIn(service.EffortSoFar());
+  }
+
+  // A new service for each fault.
+  void FailNewServices(bool withAllocations) {
+    for (const Fault& fault : mWhenNew) {
+      if (!withAllocations && fault.kind == Fault::Kind::kAllocation) continue;
+      FaultyService service(fault);
+      if (Survives(service, fault)) AskAgain(service, fault);
+      if (mFindings >= kMostFindings) break;
+    }
+  }
+
+  // One service that has answered the question before, as long as it lives.
+  void FailAnOldService() {
+    auto service = OldService();
+    const Holdings known = service->Holds();
+    service->Arm({});
+    service->Ask(mRequest);
+    const std::vector<Fault> faults = FaultsIn(service->EffortSoFar());
+    mKept = service->Holds().allocations - known.allocations;
+    for (const Fault& fault : faults) {
+      bool survives = false;
+      // What a service learns when it has to look for something, it keeps.
+      bool isLevel = FailOnce(*service, fault, survives) || !survives;
+      if (!isLevel) isLevel = FailOnce(*service, fault, survives) || !survives;
+      if (!isLevel) Report(fault, "leaves something behind");
+      if (!survives) service = OldService();
+      if (mFindings >= kMostFindings) break;
+    }
+  }
+
+ private:
+  std::unique_ptr<FaultyService> OldService() const {
+    auto service = std::make_unique<FaultyService>();
+    service->Ask(mRequest);
+    service->Ask(mRequest);
+    return service;
+  }
+
+  // Whether it holds as much afterwards as before, but for what the right answers make it keep.
+  bool FailOnce(FaultyService& service, const Fault& fault, bool& survives) {
+    const Holdings before = service.Holds();
+    service.Arm(fault);
+    survives = Survives(service, fault);
+    if (!survives) return false;
+    AskAgain(service, fault);
+    const Holdings after = service.Holds();
+    // What the answers keep, one that is not right as much at the most.
+    const std::int64_t grown = after.allocations - before.allocations - mKept;
+    const bool isLevel = mIsRight ? grown == mKept : grown >= 0 && grown <= mKept;
+    return isLevel && after.descriptors == before.descriptors;
+  }
+
+  // False when it has ended.
+  bool Survives(FaultyService& service, const Fault& fault) {
+    const Outcome outcome = service.Ask(mRequest);
+    if (outcome.hasFailed) ++InjectedFaults::count;
+    mIsRight = outcome.response == mRight;
+    const bool isFine = outcome.status ? IsDocumentedEnd(fault, outcome, mAnswers)
+                                       : mAnswers.contains(outcome.response);
+    if (!isFine) {
+      const std::string end =
+          outcome.status ? "status " + std::to_string(*outcome.status) + " and " : "";
+      Report(fault, CallText(fault, outcome) + "gives " + end + Readable(outcome.response) +
+                        ", not " + Readable(mRight));
+    }
+    return !outcome.status;
+  }
+
+  static std::string CallText(const Fault& fault, const Outcome& outcome) {
+    if (fault.kind != Fault::Kind::kCall) return {};
+    return "(number " + std::to_string(outcome.failedCall.number) + ") ";
+  }
+
+  void AskAgain(FaultyService& service, const Fault& fault) {
+    service.Arm({});
+    const Outcome outcome = service.Ask(mRequest);
+    if (!outcome.status && outcome.response == mRight) return;
+    Report(fault,
+           "has the next answer " + Readable(outcome.response) + ", not " + Readable(mRight));
+  }
+
+  void Report(const Fault& fault, const std::string& finding) {
+    ++mFindings;
+    ADD_FAILURE() << fault.Text() << " " << finding;
+  }
+
+  std::string mRequest;
+  Answers mAnswers;
+  std::string mRight;
+  std::vector<Fault> mWhenNew;
+  std::int64_t mKept = 0;  // allocations that stay for each right answer
+  bool mIsRight = false;   // the last one while something failed
+  int mFindings = 0;
+};
+
+// --- What is asked about ----------------------------------------------------------------------
+
+std::string LongName() {
+  return std::string(100, 'l') + ".aif";
+}
+
+// Two items whose HFS names would be the same bytes, far from each other in their folder: neither
+// is found by them.
+constexpr char kOneOfTwins[] = "/Disk/twins/e\u0301t\u00E9";
+
+// The path of an item, made when it is not there.
+std::filesystem::path Make(const std::string& path) {
+  std::filesystem::create_directories(std::filesystem::path(path).parent_path());
+  std::ofstream{path, std::ios::app};
+  return path;
+}
+
+// A small root with something on its volumes.
+class Tree {
+ public:
+  Tree() : mRoot({TALLOWMERE_SERVICE, TALLOWMERE_FAULT_LIBRARY}) {
+    if (!mRoot.IsEntered()) return;
+    // The first inodes are too low for ids.
+    Make("/Disk/early/a track.aif");
+    for (int i = 0; i < 20; ++i) Make("/Disk/fill/" + std::to_string(i) + "/file");
+    Make("/Disk/folder/inner/a track.aif");
+    Make(SmallRoot::kHome + std::string("/a track.aif"));
+    Make(kOneOfTwins);
+    for (int i = 100; i < 230; ++i)
+      Make("/Disk/twins/" + std::to_string(i) + std::string(250, 'f'));
+    Make("/Disk/twins/\u00E9te\u0301");
+  }
+
+  // Until what has been made is old enough for a service to believe its times of change.
+  void Settle() const { std::this_thread::sleep_until(mMade + kCoarsestTick); }
+
+  bool IsMade() const { return mRoot.IsEntered(); }
+  bool IsOnImage() const { return mRoot.IsImage(); }
+
+ private:
+  SmallRoot mRoot;
+  std::chrono::steady_clock::time_point mMade = std::chrono::steady_clock::now();
+};
+
+struct Item {
+  const char* name;  // of the test
+  Subject (*make)();
+  std::vector<unsigned> codes;         // asked of an old service
+  std::vector<unsigned> codesWhenNew;  // and of new ones, which is slower
+  // Without memory for its first look at the users the C library itself ends the process.
+  bool asksForUsers = false;
+};
+
+const std::vector<unsigned> kCodesOfPaths{1, 2, 5, 6, 7, 8, 9};
+
+// Longer than what a reference has on its stack.
+std::string DeepPath() {
+  std::string path;
+  for (int i = 0; i < 6; ++i) path += std::string(200, 'd') + "/";
+  return path + "a track.aif";
+}
+
+const std::vector<Item> kItems{
+    {"Plain",
+     [] { return Subject(Make("/Disk/folder/inner/a track.aif")); },
+     {1, 2, 3, 4, 5, 6, 7, 8, 9, 10},
+     {1, 2, 3, 4, 5, 6, 7, 8, 9, 10}},
+    {"SharedID", [] { return Subject(Make("/Disk/early/a track.aif")); }, {1, 2, 8, 9}, {8, 9}},
+    {"LongName",
+     [] { return Subject(Make("/Disk/folder/" + LongName()), "", LongName().substr(0, 63)); },
+     kCodesOfPaths,
+     {8}},
+    {"NotInMacRoman",
+     [] { return Subject(Make("/Disk/folder/日本.aif"), "", "??.aif"); },
+     kCodesOfPaths,
+     {9}},
+    // The first accent is a mark of its own, the second one is not.
+    {"Accented",
+     [] { return Subject(Make("/Disk/folder/e\u0301t\u00E9"), "\u00E9t\u00E9"); },
+     kCodesOfPaths,
+     {8, 9}},
+    {"Missing",
+     [] {
+       Make("/Disk/folder/something else");
+       return Subject("/Disk/folder/missing.aif");
+     },
+     {1, 5, 6, 7, 8, 9},
+     {7, 8, 9}},
+    {"Folder", [] { return Subject("/Disk/folder/inner"); }, kCodesOfPaths, {1, 7, 9}},
+    {"OnExt4",
+     [] { return Subject(Make("/folder/inner/a track.aif")); },
+     {1, 2, 3, 4, 5, 6, 7, 8, 9},
+     {1, 2, 3, 4, 8, 9}},
+    {"Twin", [] { return Subject(kOneOfTwins, "", "\x8Et\x8E"); }, {7, 9}, {}},
+    {"MissingBesideTwins",
+     [] { return Subject("/Disk/twins/\u00E9t\u00E9", "\u00E9t\u00E9"); },
+     {9},
+     {9}},
+    {"InTheHomeFolder", [] { return Subject("~/a track.aif"); }, {1, 5, 7}, {7}, true},
+    {"Deep", [] { return Subject(Make("/Disk/" + DeepPath())); }, {5, 7, 9}, {7}},
+    {"RootOfAVolume", [] { return Subject("/Disk"); }, {1, 2, 5, 7, 8, 9}, {7, 9}},
+};
+
+struct Case {
+  const Item* item;
+  unsigned code;
+};
+
+std::vector<Case> Cases(std::vector<unsigned> Item::*codes) {
+  std::vector<Case> cases;
+  for (const Item& item : kItems) {
+    for (const unsigned code : item.*codes) cases.push_back({&item, code});
+  }
+  return cases;
+}
+
+std::string NameOf(const testing::TestParamInfo<Case>& about) {
+  return about.param.item->name + ("Code" + std::to_string(about.param.code));
+}
+
+class Faults : public testing::TestWithParam<Case> {
+ protected:
+  static void SetUpTestSuite() { tree = std::make_unique<Tree>(); }
+  static void TearDownTestSuite() { tree.reset(); }
+
+  void SetUp() override {
+    if (!FaultyService::IsPossible()) GTEST_SKIP() << "no filter of system calls is permitted";
+    if (!tree->IsMade()) GTEST_SKIP() << "no mount and no root of its own is permitted";
+    const bool isOnImage = std::string(GetParam().item->name).starts_with("OnExt4");
+    if (isOnImage && !tree->IsOnImage()) GTEST_SKIP() << "no image can be mounted";
+  }
+
+  static Trial MakeTrial() { return Trial(GetParam().item->make().Ask(GetParam().code)); }
+
+  static inline std::unique_ptr<Tree> tree;
+};
+
+class FaultsOfNewServices : public Faults {};
+class FaultsOfOldServices : public Faults {};
+
+TEST_P(FaultsOfNewServices, AreAnsweredHonestlyAndNotRemembered) {
+  tree->Settle();
+  MakeTrial().FailNewServices(!GetParam().item->asksForUsers);
+}
+
+TEST_P(FaultsOfOldServices, AreAnsweredHonestlyAndLeaveNothing) {
+  MakeTrial().FailAnOldService();
+}
+
+INSTANTIATE_TEST_SUITE_P(Requests, FaultsOfNewServices,
+                         testing::ValuesIn(Cases(&Item::codesWhenNew)), NameOf);
+INSTANTIATE_TEST_SUITE_P(Requests, FaultsOfOldServices, testing::ValuesIn(Cases(&Item::codes)),
+                         NameOf);
+
+}  // namespace
+}  // namespace tallowmere::test
