@@ -95,13 +95,16 @@ bool IsOnVolume(const VolumePointer& volume, const Place& place) {
 // volume's root folder. What is on another volume, by the spelling or behind a link, is not looked
 // at: that one may not answer.
 std::string NearestFolder(const VolumePointer& volume, const std::string& formerPlace) {
-  const VolumePointer former = MountTable::OfThisProcess().OfPath(formerPlace);
+  MountTable& table = MountTable::OfThisProcess();
+  const VolumePointer former = table.OfPath(formerPlace);
   const bool isNear = former && former->Number() == volume->Number() && IsSpelledOut(formerPlace);
   for (std::string path = formerPlace; isNear && path != "/";) {
     path = FolderOf(path);
+    if (!table.IsReachable(*former, path)) continue;
     const Descriptor descriptor = OpenWithoutLinks(path);
     const auto folder = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
-    if (folder && IsOnVolume(volume, {path, folder->item})) return path;
+    const bool isFolder = folder && S_ISDIR(folder->item.type);
+    if (isFolder && IsOnVolume(volume, {path, folder->item})) return path;
   }
   return volume->MountPoint();
 }
@@ -187,18 +190,19 @@ std::optional<Place> WithID(const VolumePointer& volume, std::uint32_t id, bool 
   return place;
 }
 
-// What is now where an item was last seen.
+// What is now where an item was last seen. Where the kernel does not tell the mount, only the
+// canonical path tells the volume.
 std::optional<Place> AtPlaceOf(const ItemReference& item) {
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
   if (known == nullptr) return std::nullopt;
-  if (!known->isCanonical) {
-    auto place = PlaceAt(known->path);
-    if (place && AreEqual(place->item, item)) RememberPlace(*place);
-    return place;
+  if (known->isCanonical) {
+    const auto status = ReadStatus(AT_FDCWD, known->path.c_str());
+    if (!status) return std::nullopt;
+    if (status->item.mount != kNoMount) return Place{known->path, status->item};
   }
-  const auto status = ReadStatus(AT_FDCWD, known->path.c_str());
-  if (!status) return std::nullopt;
-  return Place{known->path, status->item};
+  auto place = PlaceAt(known->path);
+  if (place && AreEqual(place->item, item)) RememberPlace(*place);
+  return place;
 }
 
 // An item that can be told by its inode number is remembered by it.
@@ -210,8 +214,10 @@ std::optional<Place> AtRememberedPlace(const VolumePointer& volume, std::uint32_
   return WithID(volume, id, folder, AtPlaceOf(item));
 }
 
-// Whether that is the canonical path at which the item was last seen.
+// Whether that is the canonical path at which the item was last seen. Not where the kernel does not
+// tell the mount: the volume is told by the canonical path of now.
 bool IsRememberedAt(const ItemReference& item, std::string_view path) {
+  if (item.mount == kNoMount) return false;
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
   return known != nullptr && known->isCanonical && known->path == path;
 }

@@ -3,6 +3,7 @@
 #include <fstream>
 
 #include "CatalogFixture.h"
+#include "files/HFSNames.h"
 
 namespace tallowmere::files {
 namespace {
@@ -171,6 +172,42 @@ TEST_F(ItemsBehindALink, ComeBackWhenTheLinkIsGone) {
     std::filesystem::remove(Link());
     return ItemOf(spec) == mFolder.Path() / "real/closed/folder/x";
   }));
+}
+
+// The way to a folder is not the one on which it was first reached, though it is spelled alike.
+class CoveredItemsOnAWayThatIsALinkNow : public CoveredItems {
+ protected:
+  void SetUp() override {
+    CoveredItems::SetUp();
+    if (IsSkipped()) return;
+    // The first numbers are too low to be ids.
+    for (int i = 0; i < 20; ++i) mFolder.MakeFile("volume/" + std::to_string(i));
+    mFolder.MakeFolder("volume/way/folder");
+    mFolder.MakeFile("volume/way/folder/x");
+    mFolder.MakeFile("volume/way/folder/\xE6\x97\xA5");
+    mFolder.MakeFile("volume/source");
+    mSpec = SpecOf(PathTo("volume/way/folder/x"));
+    std::filesystem::rename(PathTo("volume/way"), PathTo("volume/moved"));
+    std::filesystem::create_directory_symlink("moved", PathTo("volume/way"));
+  }
+
+  FSSpec mSpec{};
+};
+
+TEST_F(CoveredItemsOnAWayThatIsALinkNow, LeaveTheirShortFormToWhatCoversThem) {
+  Cover("volume/moved/folder/\xE6\x97\xA5", PathTo("volume/source"));
+  const FSSpec covering = SpecOf(PathTo("volume/way/folder/\xE6\x97\xA5"));
+  EXPECT_EQ(ItemOf(SpecOf(PathTo("volume/source"))), PathTo("volume/source"));
+  EXPECT_EQ(ItemOf(covering), PathTo("volume/moved/folder/\xE6\x97\xA5"));
+}
+
+TEST_F(CoveredItemsOnAWayThatIsALinkNow, ComeBackWhereAnotherMountShowsThem) {
+  ShowAt("again");
+  const auto covered = ReadItem(AT_FDCWD, PathTo("volume/moved/folder/x").c_str());
+  Cover("volume/moved/folder/x", PathTo("other"));
+  const auto id = static_cast<std::uint32_t>(covered->inode);
+  const FSSpec spec = MakeRecord(mSpec.vRefNum, ParentOf(mSpec), ShortHFSName("x", id));
+  EXPECT_EQ(ItemOf(spec), PathTo("again/moved/folder/x"));
 }
 
 // --- A mount point that moves -------------------------------------------------------------------
