@@ -50,13 +50,27 @@ bool IsSpelledOut(std::string_view path) {
 
 constexpr std::uint64_t kForItsPathAlone = O_PATH | O_NOFOLLOW | O_CLOEXEC;
 
-// Not open when a link is on the way.
+// As OpenWithoutLinks, folder by folder: an open link has nothing in it.
+Descriptor OpenStepByStep(std::string_view path) {
+  Descriptor item(open("/", kForItsPathAlone));
+  while (item.IsOpen() && path.size() > 1) {
+    path.remove_prefix(1);
+    const std::string name(path.substr(0, path.find('/')));
+    item = Descriptor(openat(item.Get(), name.c_str(), kForItsPathAlone));
+    path.remove_prefix(name.size());
+  }
+  return item;
+}
+
+// Not open when a link is on the way. REQUIRES: the path is spelled out.
 Descriptor OpenWithoutLinks(const std::string& path) {
   open_how how{};
   how.flags = kForItsPathAlone;
   how.resolve = RESOLVE_NO_SYMLINKS;
-  return Descriptor(
-      static_cast<int>(syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how)));
+  Descriptor item(static_cast<int>(syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how)));
+  // Before Linux 5.6 there is no such call, and some sandboxes forbid it.
+  const bool isCallMissing = !item.IsOpen() && (errno == ENOSYS || errno == EPERM);
+  return isCallMissing ? OpenStepByStep(path) : std::move(item);
 }
 
 // An item held while it is looked at, and the canonical path by which it was reached.

@@ -1,6 +1,14 @@
 // Mounts over parts of a volume, and mount points that move: what is seen at one place of a volume
 // is hidden at another.
+#include <linux/filter.h>
+#include <linux/seccomp.h>
+#include <sys/prctl.h>
+#include <sys/syscall.h>
+
+#include <cerrno>
+#include <cstddef>
 #include <fstream>
+#include <iterator>
 
 #include "CatalogFixture.h"
 #include "files/HFSNames.h"
@@ -208,6 +216,41 @@ TEST_F(CoveredItemsOnAWayThatIsALinkNow, ComeBackWhereAnotherMountShowsThem) {
   const auto id = static_cast<std::uint32_t>(covered->inode);
   const FSSpec spec = MakeRecord(mSpec.vRefNum, ParentOf(mSpec), ShortHFSName("x", id));
   EXPECT_EQ(ItemOf(spec), PathTo("again/moved/folder/x"));
+}
+
+// --- A kernel without openat2 -------------------------------------------------------------------
+
+// Makes openat2 what it is to an older kernel, for the rest of the process.
+bool TakeOpenat2Away() {
+  sock_filter steps[] = {
+      BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
+      BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_openat2, 0, 1),
+      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | ENOSYS),
+      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
+  };
+  const sock_fprog filter{static_cast<unsigned short>(std::size(steps)), steps};
+  return prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0 &&
+         prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &filter) == 0;
+}
+
+class ItemsInAClosedFolder : public CoveredItems {};
+
+TEST_F(ItemsInAClosedFolder, AreFoundNearTheLastOneWithoutOpenat2) {
+  // The first numbers are too low to be ids.
+  for (int i = 0; i < 20; ++i) mFolder.MakeFile("volume/" + std::to_string(i));
+  mFolder.MakeFolder("volume/closed/open");
+  mFolder.MakeFile("volume/closed/open/x");
+  mFolder.MakeFile("volume/closed/open/y");
+  chmod(PathTo("volume/closed").c_str(), 0711);
+  const auto wanted = ReadItem(AT_FDCWD, PathTo("volume/closed/open/y").c_str());
+  EXPECT_TRUE(HoldsForNobody([&] {
+    if (!TakeOpenat2Away()) return false;
+    const FSSpec last = SpecOf(PathTo("volume/closed/open/x"));
+    FSRef found{};
+    const auto id = static_cast<std::uint32_t>(wanted->inode);
+    return FSResolveNodeID(last.vRefNum, id, &found) == noErr &&
+           PathOf(found) == PathTo("volume/closed/open/y");
+  }));
 }
 
 // --- A mount point that moves -------------------------------------------------------------------
