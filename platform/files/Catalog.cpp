@@ -50,13 +50,27 @@ bool IsSpelledOut(std::string_view path) {
 
 constexpr std::uint64_t kForItsPathAlone = O_PATH | O_NOFOLLOW | O_CLOEXEC;
 
-// Not open when a link is on the way.
+// As OpenWithoutLinks, folder by folder: an open link has nothing in it.
+Descriptor OpenStepByStep(std::string_view path) {
+  Descriptor item(open("/", kForItsPathAlone));
+  while (item.IsOpen() && path.size() > 1) {
+    path.remove_prefix(1);
+    const std::string name(path.substr(0, path.find('/')));
+    item = Descriptor(openat(item.Get(), name.c_str(), kForItsPathAlone));
+    path.remove_prefix(name.size());
+  }
+  return item;
+}
+
+// Not open when a link is on the way. REQUIRES: the path is spelled out.
 Descriptor OpenWithoutLinks(const std::string& path) {
   open_how how{};
   how.flags = kForItsPathAlone;
   how.resolve = RESOLVE_NO_SYMLINKS;
-  return Descriptor(
-      static_cast<int>(syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how)));
+  Descriptor item(static_cast<int>(syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how)));
+  // Before Linux 5.6 there is no such call, and some sandboxes forbid it.
+  const bool isCallMissing = !item.IsOpen() && (errno == ENOSYS || errno == EPERM);
+  return isCallMissing ? OpenStepByStep(path) : std::move(item);
 }
 
 // An item held while it is looked at, and the canonical path by which it was reached.
@@ -95,13 +109,16 @@ bool IsOnVolume(const VolumePointer& volume, const Place& place) {
 // volume's root folder. What is on another volume, by the spelling or behind a link, is not looked
 // at: that one may not answer.
 std::string NearestFolder(const VolumePointer& volume, const std::string& formerPlace) {
-  const VolumePointer former = MountTable::OfThisProcess().OfPath(formerPlace);
+  MountTable& table = MountTable::OfThisProcess();
+  const VolumePointer former = table.OfPath(formerPlace);
   const bool isNear = former && former->Number() == volume->Number() && IsSpelledOut(formerPlace);
   for (std::string path = formerPlace; isNear && path != "/";) {
     path = FolderOf(path);
+    if (!table.IsReachable(*former, path)) continue;
     const Descriptor descriptor = OpenWithoutLinks(path);
     const auto folder = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
-    if (folder && IsOnVolume(volume, {path, folder->item})) return path;
+    const bool isFolder = folder && S_ISDIR(folder->item.type);
+    if (isFolder && IsOnVolume(volume, {path, folder->item})) return path;
   }
   return volume->MountPoint();
 }
@@ -187,18 +204,19 @@ std::optional<Place> WithID(const VolumePointer& volume, std::uint32_t id, bool 
   return place;
 }
 
-// What is now where an item was last seen.
+// What is now where an item was last seen. Where the kernel does not tell the mount, only the
+// canonical path tells the volume.
 std::optional<Place> AtPlaceOf(const ItemReference& item) {
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
   if (known == nullptr) return std::nullopt;
-  if (!known->isCanonical) {
-    auto place = PlaceAt(known->path);
-    if (place && AreEqual(place->item, item)) RememberPlace(*place);
-    return place;
+  if (known->isCanonical) {
+    const auto status = ReadStatus(AT_FDCWD, known->path.c_str());
+    if (!status) return std::nullopt;
+    if (status->item.mount != kNoMount) return Place{known->path, status->item};
   }
-  const auto status = ReadStatus(AT_FDCWD, known->path.c_str());
-  if (!status) return std::nullopt;
-  return Place{known->path, status->item};
+  auto place = PlaceAt(known->path);
+  if (place && AreEqual(place->item, item)) RememberPlace(*place);
+  return place;
 }
 
 // An item that can be told by its inode number is remembered by it.
@@ -210,8 +228,10 @@ std::optional<Place> AtRememberedPlace(const VolumePointer& volume, std::uint32_
   return WithID(volume, id, folder, AtPlaceOf(item));
 }
 
-// Whether that is the canonical path at which the item was last seen.
+// Whether that is the canonical path at which the item was last seen. Not where the kernel does not
+// tell the mount: the volume is told by the canonical path of now.
 bool IsRememberedAt(const ItemReference& item, std::string_view path) {
+  if (item.mount == kNoMount) return false;
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
   return known != nullptr && known->isCanonical && known->path == path;
 }

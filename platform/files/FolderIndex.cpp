@@ -440,7 +440,7 @@ void FolderIndex::ForgetIfGone(std::uint32_t index) {
   folder.change = kNotRead;
   const std::string path = PathOf(index);
   if (!path.empty()) {
-    if (!IsReachable(path)) return;
+    if (!MountTable::OfThisProcess().IsReachable(*mVolume, path)) return;
     const auto status = ReadStatus(AT_FDCWD, path.c_str());
     const bool isThere = status ? status->item.inode == folder.inode : !MeansGone(errno);
     if (isThere) return;
@@ -556,18 +556,8 @@ std::string FolderIndex::PathOf(const Waiting& waiting) const {
 
 // None also where it cannot be asked for without waiting.
 std::optional<ItemStatus> FolderIndex::StatusAt(const std::string& path) const {
-  if (path.empty() || !IsReachable(path)) return std::nullopt;
+  if (path.empty() || !MountTable::OfThisProcess().IsReachable(*mVolume, path)) return std::nullopt;
   return ReadStatus(AT_FDCWD, path.c_str());
-}
-
-// Not what lies under the mount of another file system, for which one could wait.
-bool FolderIndex::IsReachable(std::string path) const {
-  const auto& mountPoints = mVolume->MountPoints();
-  for (; path.size() > 1; path.resize(path.rfind('/'))) {
-    if (!MountTable::OfThisProcess().IsMountPoint(path)) continue;
-    return std::find(mountPoints.begin(), mountPoints.end(), path) != mountPoints.end();
-  }
-  return true;
 }
 
 // The open folder in which to look for the name, as in openat(2). None where something is mounted,
@@ -593,7 +583,7 @@ bool FolderIndex::OpenParent(std::uint32_t index, Search& search) {
   while (!mOpen.empty() && mOpen.back().index != index) mOpen.pop_back();
   if (!mOpen.empty()) return true;
   const std::string path = PathOf(index);
-  if (path.empty() || !IsReachable(path)) return false;
+  if (path.empty() || !MountTable::OfThisProcess().IsReachable(*mVolume, path)) return false;
   Descriptor descriptor(open(path.c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
   const auto opened = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
   if (!opened) search.NoteError(errno);

@@ -116,7 +116,6 @@ class FolderIndex {
   std::string PathOf(const Waiting& waiting) const;
   std::optional<ItemStatus> StatusAt(const std::string& path) const;
   void Rename(Folder& folder, const Waiting& waiting);
-  bool IsReachable(std::string path) const;
   std::optional<int> WayTo(const Waiting& waiting, Search& search);
   Descriptor Open(int parent, const std::string& name);
   bool OpenParent(std::uint32_t index, Search& search);

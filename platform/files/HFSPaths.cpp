@@ -112,7 +112,7 @@ bool FindFolderAtOnce(const Steps& steps, Folder& folder) {
   auto found = RememberedPlaceAt(path);
   if (!found || !S_ISDIR(found->item.type)) return false;
   folder.place = *std::move(found);
-  return folder.place.item.mount != kNoMount && folder.volume->IsMountedAs(folder.place.item.mount);
+  return folder.volume->IsMountedAs(folder.place.item.mount);
 }
 
 OSErr FindFolder(SInt16 vRefNum, SInt32 dirID, const Steps& steps, Folder& folder) {

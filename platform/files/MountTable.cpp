@@ -219,6 +219,14 @@ VolumePointer MountTable::OfPath(std::string_view path) {
   return longest;
 }
 
+bool MountTable::IsReachable(const Volume& volume, std::string path) const {
+  const auto& own = volume.MountPoints();
+  for (; path.size() > 1; path.resize(path.rfind('/'))) {
+    if (IsMountPoint(path)) return std::find(own.begin(), own.end(), path) != own.end();
+  }
+  return true;
+}
+
 void MountTable::Refresh() {
   if (!mIsCurrent || HasChanged()) Read();
 }

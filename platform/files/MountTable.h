@@ -119,6 +119,11 @@ class MountTable {
   bool IsMountPoint(const std::string& path) const { return mState.mountPoints.contains(path); }
   bool HoldsMountPoint(const std::string& path) const { return mState.holders.contains(path); }
 
+  // Whether the nearest mount above a path, or at it, is not another volume's, for which one could
+  // wait: by the spelling and in the state last looked at. REQUIRES: one place of the volume is
+  // above the path.
+  bool IsReachable(const Volume& volume, std::string path) const;
+
   // Makes the next question read the table whatever the kernel has signalled: a place was found not
   // to be where the table says, as the kernel does not signal that a mount point was renamed.
   void Distrust() { mIsCurrent = false; }

@@ -67,10 +67,26 @@ bool HasOwnName(const Folder& folder, std::string_view linuxName, const ItemRefe
   return name && FindByOwnName(folder, *name, found) == noErr && AreEqual(found.item, item);
 }
 
+// Whether the volume shows each of its folders at one place, known without a look there.
+bool HasOneView(const Folder& folder) {
+  return folder.volume->MountPoints().size() == 1;
+}
+
+// The folder by the path by which the table of mounts knows it: links can have come on its way
+// since it was reached.
+Folder ByCanonicalPath(const Folder& folder) {
+  auto place = PlaceAt(folder.place.path);
+  const bool isStillThere = place && AreEqual(place->item, folder.place.item) &&
+                            place->item.mount == folder.place.item.mount;
+  return isStillThere ? Folder{folder.volume, *std::move(place)} : folder;
+}
+
 // The folder at all its places on the volume, when in one of them something is mounted, so that one
 // name can be that of several items. The names of their own count in the first place, where every
 // process sees the folder alike; what cannot be seen there has short forms.
-std::vector<Folder> ViewsOf(const Folder& folder) {
+std::vector<Folder> ViewsOf(const Folder& reached) {
+  if (HasOneView(reached)) return {reached};
+  const Folder folder = ByCanonicalPath(reached);
   std::vector<Folder> views;
   const MountTable& table = MountTable::OfThisProcess();
   const auto paths = folder.volume->PathsOf(folder.place.path, folder.place.item.mount);
@@ -85,11 +101,6 @@ std::vector<Folder> ViewsOf(const Folder& folder) {
   }
   if (views.empty()) views.push_back(folder);
   return views;
-}
-
-// Whether that is certain without a look at the folder's places.
-bool HasOneView(const Folder& folder) {
-  return folder.volume->MountPoints().size() == 1;
 }
 
 // --- Short forms ------------------------------------------------------------------------------
@@ -158,8 +169,9 @@ class ShortFormSearch {
   OSErr SearchFolder(const Folder& view) {
     const std::unique_ptr<DIR, CloseFolder> entries(opendir(view.place.path.c_str()));
     if (!entries) return ErrorOfSystem();
-    const bool untrueEntries = HasUntrueEntries(view.volume->Type()) ||
-                               MountTable::OfThisProcess().HoldsMountPoint(view.place.path);
+    const std::string path = ByCanonicalPath(view).place.path;
+    const bool untrueEntries =
+        HasUntrueEntries(view.volume->Type()) || MountTable::OfThisProcess().HoldsMountPoint(path);
     while (const dirent* const entry = NextEntry(entries.get())) {
       for (const ShortNameParts& parts : mReadings) {
         if (!MayHaveID(view, *entry, parts.nodeID, untrueEntries)) continue;

@@ -1,8 +1,17 @@
 // Mounts over parts of a volume, and mount points that move: what is seen at one place of a volume
 // is hidden at another.
+#include <linux/filter.h>
+#include <linux/seccomp.h>
+#include <sys/prctl.h>
+#include <sys/syscall.h>
+
+#include <cerrno>
+#include <cstddef>
 #include <fstream>
+#include <iterator>
 
 #include "CatalogFixture.h"
+#include "files/HFSNames.h"
 
 namespace tallowmere::files {
 namespace {
@@ -170,6 +179,77 @@ TEST_F(ItemsBehindALink, ComeBackWhenTheLinkIsGone) {
     const FSSpec spec = SpecOf(Link() + "/closed/folder/x");
     std::filesystem::remove(Link());
     return ItemOf(spec) == mFolder.Path() / "real/closed/folder/x";
+  }));
+}
+
+// The way to a folder is not the one on which it was first reached, though it is spelled alike.
+class CoveredItemsOnAWayThatIsALinkNow : public CoveredItems {
+ protected:
+  void SetUp() override {
+    CoveredItems::SetUp();
+    if (IsSkipped()) return;
+    // The first numbers are too low to be ids.
+    for (int i = 0; i < 20; ++i) mFolder.MakeFile("volume/" + std::to_string(i));
+    mFolder.MakeFolder("volume/way/folder");
+    mFolder.MakeFile("volume/way/folder/x");
+    mFolder.MakeFile("volume/way/folder/\xE6\x97\xA5");
+    mFolder.MakeFile("volume/source");
+    mSpec = SpecOf(PathTo("volume/way/folder/x"));
+    std::filesystem::rename(PathTo("volume/way"), PathTo("volume/moved"));
+    std::filesystem::create_directory_symlink("moved", PathTo("volume/way"));
+  }
+
+  FSSpec mSpec{};
+};
+
+TEST_F(CoveredItemsOnAWayThatIsALinkNow, LeaveTheirShortFormToWhatCoversThem) {
+  Cover("volume/moved/folder/\xE6\x97\xA5", PathTo("volume/source"));
+  const FSSpec covering = SpecOf(PathTo("volume/way/folder/\xE6\x97\xA5"));
+  EXPECT_EQ(ItemOf(SpecOf(PathTo("volume/source"))), PathTo("volume/source"));
+  EXPECT_EQ(ItemOf(covering), PathTo("volume/moved/folder/\xE6\x97\xA5"));
+}
+
+TEST_F(CoveredItemsOnAWayThatIsALinkNow, ComeBackWhereAnotherMountShowsThem) {
+  ShowAt("again");
+  const auto covered = ReadItem(AT_FDCWD, PathTo("volume/moved/folder/x").c_str());
+  Cover("volume/moved/folder/x", PathTo("other"));
+  const auto id = static_cast<std::uint32_t>(covered->inode);
+  const FSSpec spec = MakeRecord(mSpec.vRefNum, ParentOf(mSpec), ShortHFSName("x", id));
+  EXPECT_EQ(ItemOf(spec), PathTo("again/moved/folder/x"));
+}
+
+// --- A kernel without openat2 -------------------------------------------------------------------
+
+// Makes openat2 what it is to an older kernel, for the rest of the process.
+bool TakeOpenat2Away() {
+  sock_filter steps[] = {
+      BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
+      BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_openat2, 0, 1),
+      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | ENOSYS),
+      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
+  };
+  const sock_fprog filter{static_cast<unsigned short>(std::size(steps)), steps};
+  return prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0 &&
+         prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &filter) == 0;
+}
+
+class ItemsInAClosedFolder : public CoveredItems {};
+
+TEST_F(ItemsInAClosedFolder, AreFoundNearTheLastOneWithoutOpenat2) {
+  // The first numbers are too low to be ids.
+  for (int i = 0; i < 20; ++i) mFolder.MakeFile("volume/" + std::to_string(i));
+  mFolder.MakeFolder("volume/closed/open");
+  mFolder.MakeFile("volume/closed/open/x");
+  mFolder.MakeFile("volume/closed/open/y");
+  chmod(PathTo("volume/closed").c_str(), 0711);
+  const auto wanted = ReadItem(AT_FDCWD, PathTo("volume/closed/open/y").c_str());
+  EXPECT_TRUE(HoldsForNobody([&] {
+    if (!TakeOpenat2Away()) return false;
+    const FSSpec last = SpecOf(PathTo("volume/closed/open/x"));
+    FSRef found{};
+    const auto id = static_cast<std::uint32_t>(wanted->inode);
+    return FSResolveNodeID(last.vRefNum, id, &found) == noErr &&
+           PathOf(found) == PathTo("volume/closed/open/y");
   }));
 }
 

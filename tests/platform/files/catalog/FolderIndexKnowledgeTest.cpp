@@ -917,5 +917,15 @@ TEST_F(AnIndexBesideADeadMount, IsNotAskedThereWhenALinkOnTheLastItemsWayLeadsTh
   EXPECT_EQ(FindItem(mVolume, 0x12345678, true), std::nullopt);
 }
 
+TEST_F(AnIndexBesideADeadMount, IsNotAskedThereWhenTheLastItemWasAtItsSecondPlace) {
+  RememberPlace({PathTo("a/dead/below/deeper"), ItemAt("a/dead/below/deeper")});
+  const DeadMount dead(mFolder.MakeFolder("first"));
+  if (!dead.IsMounted()) GTEST_SKIP() << "no FUSE here";
+  alarm(20);
+  const ScopedMount second(mFolder.Path() / "first", PathTo("a/dead"), "", MS_BIND);
+  ASSERT_TRUE(second.IsMounted());
+  EXPECT_EQ(FindItem(mVolume, 0x12345678, true), std::nullopt);
+}
+
 }  // namespace
 }  // namespace tallowmere::files
