@@ -68,16 +68,16 @@ TEST_P(OfARequest, AreNoMoreThanThese) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Allocations, OfARequest,
-                         testing::ValuesIn(std::to_array<Allocations>({{1, 130},
-                                                                       {2, 120},
+                         testing::ValuesIn(std::to_array<Allocations>({{1, 95},
+                                                                       {2, 55},
                                                                        {3, 0},
                                                                        {4, 0},
-                                                                       {5, 46},
-                                                                       {6, 101},
-                                                                       {7, 33},
-                                                                       {8, 63},
-                                                                       {9, 34},
-                                                                       {10, 27}})),
+                                                                       {5, 38},
+                                                                       {6, 65},
+                                                                       {7, 25},
+                                                                       {8, 29},
+                                                                       {9, 25},
+                                                                       {10, 25}})),
                          [](const auto& row) { return "Code" + std::to_string(row.param.code); });
 
 }  // namespace
