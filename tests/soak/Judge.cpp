@@ -61,7 +61,8 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
     states.push_back(&mHistory.At(version));
   }
   const Truth inSteps = Answers(Graph(states), mPlace, request);
-  return inSteps.responses.contains(response) ? Verdict::kMoved : Verdict::kWrong;
+  if (inSteps.responses.contains(response)) return Verdict::kMoved;
+  return inSteps.nowhere.contains(response) ? Verdict::kNowhere : Verdict::kWrong;
 }
 
 std::string Judge::Report(const Request& request, const std::string& response,

@@ -13,6 +13,7 @@ enum class Verdict {
   kExact,        // true in one of the states
   kMoved,        // each of its steps was true in one of them: what was asked for was moved
   kHonestError,  // none, or not to be told, and what was asked for changed
+  kNowhere,      // leads to no item in any of the states, and what was asked for changed
   kWrong,
 };
 

@@ -54,9 +54,9 @@ std::string Hexadecimal(std::uint64_t number) {
 
 std::string ShortForm(const Entry& entry) {
   const std::string name = NameAt(entry.name).hfsName;
-  const std::size_t dot = name.rfind('.');
+  const std::size_t dot = std::min(name.rfind('.'), name.size());
   const std::string tail = "#" + Hexadecimal(entry.inode) + name.substr(dot);
-  return name.substr(0, kLongestShortForm - tail.size()) + tail;
+  return name.substr(0, std::min(dot, kLongestShortForm - tail.size())) + tail;
 }
 
 bool HasShortForm(NameIndex name) {
@@ -85,6 +85,17 @@ std::string TextOfPath(const Path& path, const Place& place) {
 
 // The flag without a path: there is a name, and no folder.
 const std::string kNoPathWithName = (Flag(1) + U16(0)).append(kTrailer);
+
+std::string FullPathResponse(std::string path) {
+  const std::string length = U16(static_cast<unsigned>(path.size()));
+  path.resize(kRoomForAFullPath);
+  return length + path.append(kTrailer);
+}
+
+// The name that the record of a new item has.
+std::string NameOfNew(NameIndex name) {
+  return std::string(NameAt(name).hfsName).substr(0, kLongestRecordName);
+}
 
 struct Item {
   Node node;
@@ -317,6 +328,68 @@ class Evaluation {
     return 0;
   }
 
+  // --- Answers that lead nowhere
+
+  // Names that an item can have been given, whatever it is called at last.
+  std::set<std::string> NamesGiven(const std::vector<Item>& items) const {
+    std::set<std::string> names;
+    for (const Item& item : items) {
+      for (const Entry* const entry : EntriesOf(item)) {
+        names.insert(RecordName(*entry));
+        names.insert(ShortForm(*entry));
+      }
+    }
+    return names;
+  }
+
+  bool IsNamed(Node folder, std::string_view hfsName) const {
+    return std::any_of(mGraph.Entries().begin(), mGraph.Entries().end(), [&](const Entry& entry) {
+      return entry.folder == folder &&
+             (hfsName == NameAt(entry.name).hfsName || hfsName == RecordName(entry));
+    });
+  }
+
+  // The records of the items in those folders that have no such items.
+  void NoteRecordsOfNothing(const Outcome& outcome, std::vector<Node> folders) {
+    if (mGraph.IsOfOneState()) return;
+    for (const Item& item : outcome.items) {
+      for (const Entry* const entry : EntriesOf(item)) folders.push_back(entry->folder);
+    }
+    for (const std::string& name : NamesGiven(outcome.items)) {
+      for (const Node folder : folders) {
+        if (IsNamed(folder, name)) continue;
+        mTruth.nowhere.insert(NameResponse(1, name));
+        for (const Volume& volume : VolumesOf(folder)) {
+          const auto id = static_cast<std::int32_t>(IDOf(folder));
+          mTruth.nowhere.insert(RecordResponse(1, Record(volume.number, id, name)));
+        }
+      }
+    }
+  }
+
+  // The paths of new items in the folder, called like those that are or were there.
+  void NotePathsOfNothing(Node folder, const Outcome& outcome) {
+    if (mGraph.IsOfOneState()) return;
+    for (const std::string& name : NamesGiven(outcome.items)) {
+      const std::string newName = NewName(name);
+      const bool isThere = std::any_of(
+          mGraph.Entries().begin(), mGraph.Entries().end(), [&](const Entry& entry) {
+            return entry.folder == folder && newName == NameAt(entry.name).linuxName;
+          });
+      if (isThere) continue;
+      for (const FolderPlace& place : PlacesOf(folder)) {
+        const std::string path = place.path + "/" + newName;
+        mTruth.nowhere.insert(mRequest.code == 2 ? ResultResponse(0, path) : PathResponse(path));
+      }
+    }
+  }
+
+  std::vector<Node> FoldersAbove(const Path& path) {
+    if (path.count == 1) return {kMainRoot};
+    bool always = true;
+    return FoldersAt(At(path.Parent()), always);
+  }
+
   // --- Requests
 
   struct Named {
@@ -346,13 +419,12 @@ class Evaluation {
 
   void RecordOfItem() {
     const Outcome outcome = At(mRequest.path);
+    NoteRecordsOfNothing(outcome, FoldersAbove(mRequest.path));
     for (const Item& item : outcome.items) {
       for (const Named& named : RecordsOf(item)) Say(RecordResponse(1, named.record));
     }
     if (!outcome.canMiss) return;
-    const std::string name =
-        std::string(NameAt(mRequest.path.names[mRequest.path.count - 1]).hfsName)
-            .substr(0, kLongestRecordName);
+    const std::string name = NameOfNew(mRequest.path.names[mRequest.path.count - 1]);
     const Path parent = mRequest.path.Parent();
     if (parent.count == 0)
       return Say(RecordResponse(1, Record(mGraph.Main().number, kRootID, name)));
@@ -370,6 +442,7 @@ class Evaluation {
 
   void HFSName() {
     const Outcome outcome = At(mRequest.path);
+    NoteRecordsOfNothing(outcome, FoldersAbove(mRequest.path));
     if (outcome.canMiss) Say(kNoVolumeNameResponse);
     for (const Item& item : outcome.items) {
       auto leads = std::pair<bool, bool>{true, false};
@@ -380,11 +453,7 @@ class Evaluation {
     }
   }
 
-  void SayFullPath(const std::string& path) {
-    std::string padded = path;
-    padded.resize(kRoomForAFullPath);
-    Say((U16(static_cast<unsigned>(path.size())) + padded).append(kTrailer));
-  }
+  void SayFullPath(const std::string& path) { Say(FullPathResponse(path)); }
   void SayFolder(Node folder) {
     for (const FolderPlace& place : PlacesOf(folder)) SayFullPath(place.hfsPath);
   }
@@ -451,6 +520,7 @@ class Evaluation {
     if (!always) Say(ResultResponse(kNoFolder));
     for (const Node folder : folders) {
       const Outcome outcome = LookUp(folder, path.names[i]);
+      NotePathsOfNothing(folder, outcome);
       if (outcome.canMiss)
         Say(ResultResponse(HasShortForm(path.names[i]) ? kImpossibleName : kNoItem));
       for (const Item& item : outcome.items) {
@@ -484,6 +554,7 @@ class Evaluation {
         continue;
       }
       const Outcome inside = LookUpHFS(folder.node, mRequest.hfsName);
+      NotePathsOfNothing(folder.node, inside);
       if (inside.canMiss) Say(PathResponse(path + "/" + NewName(mRequest.hfsName)));
       for (const Item& item : inside.items) {
         for (const std::string& found : PathsOf(item)) Say(PathResponse(found));
@@ -531,6 +602,7 @@ class Evaluation {
     bool always = false;
     for (const Node folder : FoldersWithID(volume, mRequest.folder)) {
       const Outcome outcome = LookUpHFS(folder, mRequest.hfsName);
+      NotePathsOfNothing(folder, outcome);
       always = !outcome.canMiss;
       for (const Item& item : outcome.items) {
         for (const std::string& path : PathsOf(item)) Say(PathResponse(path));
@@ -658,19 +730,25 @@ Truth Answers(const Graph& graph, const Place& place, const Request& request) {
 
 std::set<std::string> HonestErrors(const Place& place, const Request& request) {
   switch (request.code) {
+    case 1:
+      return {FullPathResponse(":"), FullPathResponse(place.name + ":"),
+              FullPathResponse(std::string(NameAt(kVolumePlace).hfsName) + ":")};
     case 2:
-      return {ResultResponse(kNoItem), ResultResponse(kNoFolder), ResultResponse(kNoVolume)};
+      return {ResultResponse(kNoItem), ResultResponse(kNoFolder), ResultResponse(kNoVolume),
+              ResultResponse(0)};
     case 5:
       return {kNoVolumeNameResponse};
     case 6:
       return {kNoPathResponse};
-    case 7:
-      return {RecordResponse(0, kEmptyRecord)};
+    case 7: {
+      const NameIndex last = request.path.names[request.path.count - 1];
+      return {RecordResponse(0, kEmptyRecord),
+              RecordResponse(0, Record(kUnknownVolume, -1, NameOfNew(last)))};
+    }
     case 8:
     case 9:
       return {kNoPathResponse, kNoPathWithName};
     default:
-      static_cast<void>(place);
       return {};
   }
 }

@@ -135,6 +135,7 @@ class Graph {
 
 struct Truth {
   std::set<std::string> responses;
+  std::set<std::string> nowhere;  // for several states: those that lead to no item in any of them
   std::string trace;  // of the items that were met: differs when any of them is another
 };
 

@@ -45,7 +45,7 @@ constexpr int kSkipped = 77;
 using tallowmere::test::kRateOfACD;
 constexpr unsigned kExport = 10;
 constexpr unsigned kCodes = 11;
-constexpr std::size_t kMostReports = 5;
+constexpr std::size_t kMostReports = 25;
 constexpr int kProgressLines = 20;
 
 struct Options {
@@ -250,7 +250,7 @@ class Asker {
 // --- The run ----------------------------------------------------------------------------------
 
 struct Counts {
-  std::array<std::array<std::uint64_t, 4>, kCodes> ofVerdict{};
+  std::array<std::array<std::uint64_t, 5>, kCodes> ofVerdict{};
   std::uint64_t asked = 0;
   std::uint64_t wrong = 0;
   std::uint64_t states = 0;  // judged by, in all
@@ -373,12 +373,13 @@ class Run {
   std::uint64_t Exports() const { return mCounts.ofVerdict[kExport][0]; }
 
   void Summarise() {
-    std::printf("\ncode       exact       moved  honest error       wrong\n");
+    std::printf("\ncode       exact       moved  honest error     nowhere       wrong\n");
     for (unsigned code = 1; code < kCodes; ++code) {
       const auto& of = mCounts.ofVerdict[code];
-      std::printf("%4u%12llu%12llu%14llu%12llu\n", code, static_cast<unsigned long long>(of[0]),
+      std::printf("%4u%12llu%12llu%14llu%12llu%12llu\n", code, static_cast<unsigned long long>(of[0]),
                   static_cast<unsigned long long>(of[1]), static_cast<unsigned long long>(of[2]),
-                  static_cast<unsigned long long>(of[3]));
+                  static_cast<unsigned long long>(of[3]),
+                  static_cast<unsigned long long>(of[4]));
     }
     std::printf("\n%.1f states to a question on average\n",
                 static_cast<double>(mCounts.states) / static_cast<double>(mCounts.asked));
