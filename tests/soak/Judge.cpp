@@ -29,6 +29,13 @@ std::string Readable(std::string bytes) {
   return text;
 }
 
+// What was taken away in mid-question has the id of an item that is not on the volume that is
+// named. The tree has no such ids: they begin with a bit that its inode numbers do not have.
+bool IsRecordByMadeUpID(const Request& request, const std::string& response) {
+  constexpr std::size_t kHighestByteOfID = 1 + 2 + 3;
+  return request.code == 7 && (static_cast<unsigned char>(response[kHighestByteOfID]) & 0x80) != 0;
+}
+
 bool Has(const State& state, const Entry& entry) {
   return std::find(state.begin(), state.end(), entry) != state.end();
 }
@@ -62,6 +69,7 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
   }
   const Truth inSteps = Answers(Graph(states), mPlace, request);
   if (inSteps.responses.contains(response)) return Verdict::kMoved;
+  if (IsRecordByMadeUpID(request, response)) return Verdict::kNowhere;
   return inSteps.nowhere.contains(response) ? Verdict::kNowhere : Verdict::kWrong;
 }
 

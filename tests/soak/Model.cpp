@@ -92,6 +92,10 @@ std::string FullPathResponse(std::string path) {
   return length + path.append(kTrailer);
 }
 
+NameIndex LastNameOf(const Path& path) {
+  return path.names.at(path.count - 1);
+}
+
 // The name that the record of a new item has.
 std::string NameOfNew(NameIndex name) {
   return std::string(NameAt(name).hfsName).substr(0, kLongestRecordName);
@@ -367,13 +371,25 @@ class Evaluation {
     }
   }
 
+  bool IsAskedFor(NameIndex name) const {
+    return mRequest.code == 2 ? name == LastNameOf(mRequest.path)
+                              : mRequest.hfsName == NameAt(name).hfsName;
+  }
+
   // The paths of new items in the folder, called like those that are or were there.
   void NotePathsOfNothing(Node folder, const Outcome& outcome) {
     if (mGraph.IsOfOneState()) return;
-    for (const std::string& name : NamesGiven(outcome.items)) {
+    auto names = NamesGiven(outcome.items);
+    for (const Entry& entry : mGraph.Entries()) {
+      if (!IsAskedFor(entry.name)) continue;
+      names.insert(RecordName(entry));
+      names.insert(ShortForm(entry));
+    }
+    names.insert(mRequest.code == 2 ? NameAt(LastNameOf(mRequest.path)).hfsName : mRequest.hfsName);
+    for (const std::string& name : names) {
       const std::string newName = NewName(name);
-      const bool isThere = std::any_of(
-          mGraph.Entries().begin(), mGraph.Entries().end(), [&](const Entry& entry) {
+      const bool isThere =
+          std::any_of(mGraph.Entries().begin(), mGraph.Entries().end(), [&](const Entry& entry) {
             return entry.folder == folder && newName == NameAt(entry.name).linuxName;
           });
       if (isThere) continue;
@@ -381,6 +397,8 @@ class Evaluation {
         const std::string path = place.path + "/" + newName;
         mTruth.nowhere.insert(mRequest.code == 2 ? ResultResponse(0, path) : PathResponse(path));
       }
+      if (mRequest.code != 6) continue;
+      mTruth.nowhere.insert(PathResponse(TextOfPath(mRequest.path, mPlace) + "/" + newName));
     }
   }
 
@@ -424,7 +442,7 @@ class Evaluation {
       for (const Named& named : RecordsOf(item)) Say(RecordResponse(1, named.record));
     }
     if (!outcome.canMiss) return;
-    const std::string name = NameOfNew(mRequest.path.names[mRequest.path.count - 1]);
+    const std::string name = NameOfNew(LastNameOf(mRequest.path));
     const Path parent = mRequest.path.Parent();
     if (parent.count == 0)
       return Say(RecordResponse(1, Record(mGraph.Main().number, kRootID, name)));
@@ -599,6 +617,10 @@ class Evaluation {
 
   // Whether the item was found for certain on the volume.
   bool SayItemsOn(const Volume& volume) {
+    if (mRequest.folder == kParentOfRoots) {
+      SayRoot(volume);
+      return mRequest.hfsName == VolumeName(volume);
+    }
     bool always = false;
     for (const Node folder : FoldersWithID(volume, mRequest.folder)) {
       const Outcome outcome = LookUpHFS(folder, mRequest.hfsName);
@@ -639,9 +661,7 @@ class Evaluation {
       if (mRequest.code == 9) SayMissing({kNoNode, mRequest.volume});
     }
     for (const Volume& volume : volumes) {
-      if (mRequest.folder == kParentOfRoots) {
-        SayRoot(volume);
-      } else if (!SayItemsOn(volume)) {
+      if (!SayItemsOn(volume)) {
         const bool hasFolder = !FoldersWithID(volume, mRequest.folder).empty();
         if (mRequest.code == 8 && (!hasFolder || !isWhole || !mGraph.IsOfOneState())) {
           Say(kNoPathResponse);
@@ -652,7 +672,8 @@ class Evaluation {
   }
 
   void SayRoot(const Volume& volume) {
-    if (mRequest.hfsName != VolumeName(volume)) return Say("?");
+    Note(volume.root);
+    if (mRequest.hfsName != VolumeName(volume)) return;
     for (const FolderPlace& place : PlacesOf(volume.root)) Say(PathResponse(place.path));
   }
 
@@ -735,15 +756,14 @@ std::set<std::string> HonestErrors(const Place& place, const Request& request) {
               FullPathResponse(std::string(NameAt(kVolumePlace).hfsName) + ":")};
     case 2:
       return {ResultResponse(kNoItem), ResultResponse(kNoFolder), ResultResponse(kNoVolume),
-              ResultResponse(0)};
+              ResultResponse(kImpossibleName), ResultResponse(0)};
     case 5:
-      return {kNoVolumeNameResponse};
+      return {kNoVolumeNameResponse, NameResponse(1, NameOfNew(LastNameOf(request.path)))};
     case 6:
       return {kNoPathResponse};
     case 7: {
-      const NameIndex last = request.path.names[request.path.count - 1];
-      return {RecordResponse(0, kEmptyRecord),
-              RecordResponse(0, Record(kUnknownVolume, -1, NameOfNew(last)))};
+      const std::string name = NameOfNew(LastNameOf(request.path));
+      return {RecordResponse(0, kEmptyRecord), RecordResponse(0, Record(kUnknownVolume, -1, name))};
     }
     case 8:
     case 9:

@@ -376,9 +376,9 @@ class Run {
     std::printf("\ncode       exact       moved  honest error     nowhere       wrong\n");
     for (unsigned code = 1; code < kCodes; ++code) {
       const auto& of = mCounts.ofVerdict[code];
-      std::printf("%4u%12llu%12llu%14llu%12llu%12llu\n", code, static_cast<unsigned long long>(of[0]),
-                  static_cast<unsigned long long>(of[1]), static_cast<unsigned long long>(of[2]),
-                  static_cast<unsigned long long>(of[3]),
+      std::printf("%4u%12llu%12llu%14llu%12llu%12llu\n", code,
+                  static_cast<unsigned long long>(of[0]), static_cast<unsigned long long>(of[1]),
+                  static_cast<unsigned long long>(of[2]), static_cast<unsigned long long>(of[3]),
                   static_cast<unsigned long long>(of[4]));
     }
     std::printf("\n%.1f states to a question on average\n",
@@ -413,8 +413,8 @@ int RunIn(const std::string& place, FileSystemImage* image, Options options) {
   const std::string folder = "/soaked";
   std::filesystem::create_directory(place + folder);
   if (image != nullptr) {
-    if (!image->Mount() || mount(image->Path().c_str(), (place + folder).c_str(), nullptr, MS_BIND,
-                                 nullptr) != 0) {
+    if (!image->Mount() ||
+        mount(image->Path().c_str(), (place + folder).c_str(), nullptr, MS_BIND, nullptr) != 0) {
       std::printf("ext4 cannot be mounted here\n");
       return kSkipped;
     }
