@@ -3,7 +3,9 @@
 // docs/reliability.md tells how it judges.
 
 #include <dirent.h>
+#include <fcntl.h>
 #include <sys/mount.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -24,13 +26,12 @@
 #include "Churner.h"
 #include "Judge.h"
 #include "Model.h"
-#include "SmallRoot.h"
 #include "support/AtomReader.h"
 #include "support/ChildProgram.h"
 #include "support/EveryRequest.h"
 #include "support/FileSystemImage.h"
 #include "support/MountNamespace.h"
-#include "support/TemporaryFolder.h"
+#include "support/SmallRoot.h"
 #include "support/Wire.h"
 
 namespace tallowmere::soak {
@@ -403,33 +404,41 @@ class Run {
   std::uint64_t mExports = 0;
 };
 
-// In a root folder of its own below `place`. An image has been made by then.
-int RunIn(const std::string& place, FileSystemImage* image, Options options) {
-  if (!EnterOwnMountNamespace() || !MakeSmallRoot(place, options.service)) {
+constexpr const char* kFolder = "/soaked";
+
+// Whether the main volume is mounted, in a root folder of its own.
+bool IsPrepared(FileSystemImage* image, const std::string& service) {
+  if (!EnterOwnMountNamespace()) return false;
+  if (image == nullptr) {
+    if (!EnterSmallRoot({service})) return false;
+    std::filesystem::create_directory(kFolder);
+    return mount("none", kFolder, "tmpfs", 0, "") == 0;
+  }
+  // A mount of the old root folder, which is taken along.
+  if (!image->Mount()) return false;
+  const int tree = static_cast<int>(
+      syscall(SYS_open_tree, AT_FDCWD, image->Path().c_str(), OPEN_TREE_CLONE | OPEN_TREE_CLOEXEC));
+  if (tree < 0 || !EnterSmallRoot({service})) return false;
+  std::filesystem::create_directory(kFolder);
+  const bool isMoved =
+      syscall(SYS_move_mount, tree, "", AT_FDCWD, kFolder, MOVE_MOUNT_F_EMPTY_PATH) == 0;
+  close(tree);
+  return isMoved;
+}
+
+int RunIn(FileSystemImage* image, const Options& options) {
+  if (!IsPrepared(image, options.service)) {
     std::printf("mounting is not permitted here\n");
     return kSkipped;
   }
-  options.service = kProgramInSmallRoot;
-  const std::string folder = "/soaked";
-  std::filesystem::create_directory(place + folder);
-  if (image != nullptr) {
-    if (!image->Mount() ||
-        mount(image->Path().c_str(), (place + folder).c_str(), nullptr, MS_BIND, nullptr) != 0) {
-      std::printf("ext4 cannot be mounted here\n");
-      return kSkipped;
-    }
-  } else if (mount("none", (place + folder).c_str(), "tmpfs", 0, "") != 0) {
-    return kSkipped;
-  }
-  if (!EnterSmallRoot(place)) throw std::runtime_error("no root folder of its own");
   std::printf("seed %llu, on %s\n", static_cast<unsigned long long>(options.seed),
               options.on.c_str());
   std::fflush(stdout);
-  return Run(options, folder).Everything() ? 0 : 1;
+  return Run(options, kFolder).Everything() ? 0 : 1;
 }
 
-int Main(const Options& options) {
-  const TemporaryFolder temporary;
+int Main(Options options) {
+  options.service = std::filesystem::absolute(options.service);
   std::optional<FileSystemImage> image;
   if (options.on == "ext4") {
     constexpr std::uintmax_t kImageSize = 64 << 20;
@@ -439,13 +448,12 @@ int Main(const Options& options) {
       return kSkipped;
     }
   }
-  const std::string place = temporary.MakeFolder("root");
-  // The one who removes the temporary folders keeps the machine's root folder.
+  // Who removes the image afterwards keeps the machine's root folder.
   const pid_t child = fork();
   if (child == 0) {
     int status = 1;
     try {
-      status = RunIn(place, image ? &*image : nullptr, options);
+      status = RunIn(image ? &*image : nullptr, options);
     } catch (const std::exception& error) {
       std::printf("tallowmere_soak: %s\n", error.what());
     }
