@@ -68,7 +68,10 @@ std::string NewName(std::string_view hfsName) {
   for (const Name& name : kNames) {
     if (name.hfsName == hfsName) return name.newName;
   }
-  return std::string(hfsName);  // a short form
+  std::string name(hfsName);  // a short form, with the one accent that there is
+  const std::size_t accented = name.find('\x8E');
+  if (accented != std::string::npos) name.replace(accented, 1, "\xC3\xA9");
+  return name;
 }
 
 bool IsVolumePlace(const Entry& entry) {
@@ -760,7 +763,7 @@ std::set<std::string> HonestErrors(const Place& place, const Request& request) {
     case 5:
       return {kNoVolumeNameResponse, NameResponse(1, NameOfNew(LastNameOf(request.path)))};
     case 6:
-      return {kNoPathResponse};
+      return {kNoPathResponse, kNoPathWithName};
     case 7: {
       const std::string name = NameOfNew(LastNameOf(request.path));
       return {RecordResponse(0, kEmptyRecord), RecordResponse(0, Record(kUnknownVolume, -1, name))};

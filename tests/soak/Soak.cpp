@@ -46,7 +46,7 @@ constexpr int kSkipped = 77;
 using tallowmere::test::kRateOfACD;
 constexpr unsigned kExport = 10;
 constexpr unsigned kCodes = 11;
-constexpr std::size_t kMostReports = 25;
+constexpr std::size_t kMostReports = 20;
 constexpr int kProgressLines = 20;
 
 struct Options {
