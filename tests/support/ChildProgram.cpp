@@ -7,6 +7,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cstdlib>
 #include <limits>
@@ -18,6 +19,7 @@ namespace tallowmere::test {
 namespace {
 
 constexpr int kPatience = 10'000;  // milliseconds
+constexpr std::size_t kPipeSize = 65'536;
 constexpr int kStillRuns = -1000;
 
 void Close(int& descriptor) {
@@ -106,6 +108,14 @@ std::string ChildProgram::Read(std::size_t size) {
 }
 std::string ChildProgram::ReadToEnd() {
   return ReadUpTo(mOutput, std::numeric_limits<std::size_t>::max());
+}
+std::string ChildProgram::ReadSome() {
+  std::string bytes(kPipeSize, '\0');
+  pollfd awaited{mOutput, POLLIN, 0};
+  if (poll(&awaited, 1, kPatience) != 1) return {};
+  const ssize_t got = read(mOutput, bytes.data(), bytes.size());
+  bytes.resize(static_cast<std::size_t>(std::max<ssize_t>(got, 0)));
+  return bytes;
 }
 std::string ChildProgram::ReadErrorsToEnd() {
   return ReadUpTo(mErrors, std::numeric_limits<std::size_t>::max());

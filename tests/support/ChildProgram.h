@@ -32,6 +32,10 @@ class ChildProgram {
   // seconds.
   std::string Read(std::size_t size);
   std::string ReadToEnd();
+
+  // What has come of its standard output, at least a byte: nothing at its end, or when nothing
+  // comes for ten seconds.
+  std::string ReadSome();
   std::string ReadErrorsToEnd();
 
   // How many of the bytes written to it it has not read yet.

@@ -1,0 +1,104 @@
+// Whoever changes the tree while the service is asked, and the history of what it has been like.
+#pragma once
+
+#include <atomic>
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <random>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "Model.h"
+
+namespace tallowmere::soak {
+
+// The states of the tree in their order. One thread writes, others read; the latest kKept are kept.
+class History {
+ public:
+  using Version = std::uint64_t;
+  static constexpr Version kKept = 1 << 14;
+
+  explicit History(const State& first);
+
+  // The state that is certainly reached; later ones may be too.
+  Version Reached() const { return mReached.load(std::memory_order_seq_cst); }
+  // The last state that may be reached.
+  Version Begun() const { return mBegun.load(std::memory_order_seq_cst); }
+  // Valid until kKept more have begun.
+  const State& At(Version version) const { return mStates[version % kKept]; }
+
+  // For the writer: the next state begins; what is not known of it before it is reached is written
+  // into it until then.
+  State& Begin(const State& next);
+  void Reach();
+
+ private:
+  std::vector<State> mStates;
+  std::atomic<Version> mBegun{0};
+  std::atomic<Version> mReached{0};
+};
+
+// The tree in a folder that is a volume's root, and a thread that changes it.
+class Churner {
+ public:
+  // REQUIRES: a file system of its own is mounted at `folder`, and the process is in a mount
+  // namespace of its own.
+  Churner(std::string folder, std::uint64_t seed, unsigned pause);
+  Churner(const Churner&) = delete;
+  Churner& operator=(const Churner&) = delete;
+  ~Churner();  // stops
+
+  void Start();
+  void Stop();
+
+  const History& Changes() const { return mHistory; }
+  const std::vector<std::uint64_t>& CountOfEachKind() const { return mCounts; }
+  static const std::vector<const char*>& Kinds();
+
+ private:
+  State FirstState();
+  void Run();
+  bool ChangeSomething(std::size_t kind);
+  void Change(const State& next, const std::function<int()>& call);
+  void Make(const State& next, const std::string& path, const std::function<int()>& call);
+
+  const State& Now() const { return mHistory.At(mHistory.Reached()); }
+  const Entry& EntryOf(Node folder) const;
+  bool IsOnOther(Node folder) const;
+  std::string PathOf(Node folder) const;
+  std::string PathOf(Node folder, NameIndex name) const;
+  std::size_t Below(std::size_t end) { return mRandom() % end; }
+  const Entry* AnyEntry(const std::function<bool(const Entry&)>& isWanted);
+  NameIndex AnyFileName();
+  bool HasRoom() const { return Now().count + 8 < Now().entries.size(); }
+
+  bool MakeFile();
+  bool RemoveFile();
+  bool MoveFile();
+  bool LinkFile();
+  bool MakeInnerLink();
+  bool MoveFolder();
+  bool ExchangeFolders();
+  bool ReplaceFolderByLink();
+  bool MakeOuterLink();
+  bool RemoveLink();
+  bool MoveSubfolder();
+  bool MakeFolder();
+  bool RemoveFolder();
+  bool MountOrUnmount();
+  bool Mount();
+  bool Unmount();
+
+  std::string mFolder;
+  std::mt19937_64 mRandom;
+  unsigned mPause;
+  Node mNextNode = kMainRoot + 1;
+  History mHistory;
+  std::vector<std::uint64_t> mCounts;
+  std::atomic<bool> mIsToStop{false};
+  std::thread mThread;
+};
+
+}  // namespace tallowmere::soak

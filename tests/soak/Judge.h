@@ -1,0 +1,40 @@
+// Whether an answer was true at some moment between question and answer.
+#pragma once
+
+#include <map>
+#include <string>
+
+#include "Churner.h"
+#include "Model.h"
+
+namespace tallowmere::soak {
+
+enum class Verdict {
+  kExact,        // true in one of the states
+  kMoved,        // each of its steps was true in one of them: what was asked for was moved
+  kHonestError,  // none, or not to be told, and what was asked for changed
+  kNowhere,      // leads to no item in any of the states, and what was asked for changed
+  kWrong,
+};
+
+class Judge {
+ public:
+  Judge(const History& history, Place place) : mHistory(history), mPlace(std::move(place)) {}
+
+  // REQUIRES: all states from the first to the last one are reached and kept.
+  Verdict Of(const Request& request, const std::string& response, History::Version first,
+             History::Version last);
+
+  // What is known of a request and its answer, for a report.
+  std::string Report(const Request& request, const std::string& response, History::Version first,
+                     History::Version last);
+
+ private:
+  const Graph& GraphOf(History::Version version);
+
+  const History& mHistory;
+  Place mPlace;
+  std::map<History::Version, Graph> mGraphs;  // of the latest states asked for
+};
+
+}  // namespace tallowmere::soak

@@ -1,0 +1,62 @@
+// stop_at_calls SOCKET PROGRAM ARGUMENTS…: becomes the program, which then stops at every system
+// call but those of waiting, memory and the two pipes until whoever holds the descriptor that comes
+// out of the socket lets it go on. Exit status 2 where that is not permitted.
+#include <linux/filter.h>
+#include <linux/seccomp.h>
+#include <sys/prctl.h>
+#include <sys/socket.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include <array>
+#include <cstddef>
+#include <cstdlib>
+#include <cstring>
+#include <vector>
+
+namespace {
+
+constexpr std::array kGoingOn{SYS_sendmsg, SYS_execve, SYS_exit_group, SYS_brk,
+                              SYS_mmap,    SYS_munmap, SYS_mprotect,   SYS_madvise,
+                              SYS_futex,   SYS_read,   SYS_write,      SYS_rt_sigreturn};
+
+int Listener() {
+  std::vector<sock_filter> filter;
+  filter.push_back(BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)));
+  for (const long call : kGoingOn) {
+    filter.push_back(BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, static_cast<unsigned>(call), 0, 1));
+    filter.push_back(BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW));
+  }
+  filter.push_back(BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_USER_NOTIF));
+  const sock_fprog program{static_cast<unsigned short>(filter.size()), filter.data()};
+  if (prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) != 0) return -1;
+  return static_cast<int>(
+      syscall(SYS_seccomp, SECCOMP_SET_MODE_FILTER, SECCOMP_FILTER_FLAG_NEW_LISTENER, &program));
+}
+
+bool Send(int socket, int descriptor) {
+  char byte = 0;
+  iovec data{&byte, 1};
+  alignas(cmsghdr) std::array<char, CMSG_SPACE(sizeof descriptor)> control{};
+  msghdr message{};
+  message.msg_iov = &data;
+  message.msg_iovlen = 1;
+  message.msg_control = control.data();
+  message.msg_controllen = control.size();
+  cmsghdr* const header = CMSG_FIRSTHDR(&message);
+  header->cmsg_level = SOL_SOCKET;
+  header->cmsg_type = SCM_RIGHTS;
+  header->cmsg_len = CMSG_LEN(sizeof descriptor);
+  std::memcpy(CMSG_DATA(header), &descriptor, sizeof descriptor);
+  return sendmsg(socket, &message, 0) == 1;
+}
+
+}  // namespace
+
+int main(int count, char** arguments) {
+  if (count < 3) return 1;
+  const int listener = Listener();
+  if (listener < 0 || !Send(std::atoi(arguments[1]), listener)) return 2;
+  execv(arguments[2], arguments + 2);
+  return 1;
+}

@@ -1,0 +1,89 @@
+#include "support/StoppedService.h"
+
+#include <linux/seccomp.h>
+#include <poll.h>
+#include <sys/ioctl.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <array>
+#include <cstdlib>
+#include <cstring>
+#include <utility>
+
+namespace tallowmere::test {
+namespace {
+
+// The descriptor that comes out of a socket; -1 when none does.
+int Receive(int socket) {
+  char byte = 0;
+  iovec data{&byte, 1};
+  int descriptor = -1;
+  alignas(cmsghdr) std::array<char, CMSG_SPACE(sizeof descriptor)> control{};
+  msghdr message{};
+  message.msg_iov = &data;
+  message.msg_iovlen = 1;
+  message.msg_control = control.data();
+  message.msg_controllen = control.size();
+  if (recvmsg(socket, &message, MSG_CMSG_CLOEXEC) != 1) return -1;
+  const cmsghdr* const header = CMSG_FIRSTHDR(&message);
+  if (header == nullptr || header->cmsg_type != SCM_RIGHTS) return -1;
+  std::memcpy(&descriptor, CMSG_DATA(header), sizeof descriptor);
+  return descriptor;
+}
+
+}  // namespace
+
+StoppedService::StoppedService(const std::string& program) {
+  std::array<int, 2> ends{};
+  if (socketpair(AF_UNIX, SOCK_STREAM, 0, ends.data()) != 0) std::abort();
+  mSocket = ends[0];
+  mProgram = std::make_unique<ChildProgram>(
+      TALLOWMERE_STOP_AT_CALLS,
+      std::vector<std::string>{std::to_string(ends[1]), program, std::to_string(getpid())});
+  close(ends[1]);
+  mListener = Receive(mSocket);
+  if (mListener >= 0) mSupervisor = std::thread([this] { Supervise(); });
+}
+
+StoppedService::~StoppedService() {
+  mProgram.reset();
+  if (mSupervisor.joinable()) mSupervisor.join();
+  if (mListener >= 0) close(mListener);
+  close(mSocket);
+}
+
+void StoppedService::ChangeAt(int call, std::function<void()> change) {
+  const std::lock_guard lock(mMutex);
+  mCallsToGo = call;
+  mChange = std::move(change);
+  mHasChanged = false;
+}
+
+bool StoppedService::HasChanged() {
+  const std::lock_guard lock(mMutex);
+  mChange = nullptr;
+  return mHasChanged;
+}
+
+// Until the service is gone.
+void StoppedService::Supervise() {
+  pollfd awaited{mListener, POLLIN, 0};
+  while (poll(&awaited, 1, -1) == 1 && (awaited.revents & POLLIN) != 0) {
+    seccomp_notif stopped{};
+    if (ioctl(mListener, SECCOMP_IOCTL_NOTIF_RECV, &stopped) != 0) continue;
+    {
+      const std::lock_guard lock(mMutex);
+      if (mChange && mCallsToGo-- == 0) {
+        std::exchange(mChange, nullptr)();
+        mHasChanged = true;
+      }
+    }
+    seccomp_notif_resp goOn{};
+    goOn.id = stopped.id;
+    goOn.flags = SECCOMP_USER_NOTIF_FLAG_CONTINUE;
+    ioctl(mListener, SECCOMP_IOCTL_NOTIF_SEND, &goOn);
+  }
+}
+
+}  // namespace tallowmere::test
