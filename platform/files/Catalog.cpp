@@ -219,13 +219,18 @@ std::optional<Place> AtPlaceOf(const ItemReference& item) {
   return place;
 }
 
-// An item that can be told by its inode number is remembered by it.
-std::optional<Place> AtRememberedPlace(const VolumePointer& volume, std::uint32_t id, bool folder) {
-  if (!volume->Root() || !IsInodeNumber(id)) return std::nullopt;
+// An item that can be told by its inode number, as far as that tells it.
+ItemReference ItemWithID(const Volume& volume, std::uint32_t id) {
   ItemReference item{};
-  item.device = volume->Root()->device;
+  item.device = volume.Root()->device;
   item.inode = id;
-  return WithID(volume, id, folder, AtPlaceOf(item));
+  return item;
+}
+
+// An item that can be told by its inode number is remembered by it.
+std::optional<Place> AtRememberedPlace(const VolumePointer& volume, std::uint32_t id) {
+  if (!volume->Root() || !IsInodeNumber(id)) return std::nullopt;
+  return WithID(volume, id, false, AtPlaceOf(ItemWithID(*volume, id)));
 }
 
 // Whether that is the canonical path at which the item was last seen. Not where the kernel does not
@@ -234,6 +239,26 @@ bool IsRememberedAt(const ItemReference& item, std::string_view path) {
   if (item.mount == kNoMount) return false;
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
   return known != nullptr && known->isCanonical && known->path == path;
+}
+
+// Whether both are one item on one mount; errno tells ENOENT when not.
+bool IsSame(const ItemReference& first, const ItemReference& second) {
+  if (AreEqual(first, second) && first.mount == second.mount) return true;
+  errno = ENOENT;
+  return false;
+}
+
+// What is at the end of a path, links followed. No automounter is asked at its end.
+std::optional<OpenFolder> OpenAt(const std::string& path) {
+  Descriptor descriptor(open(path.c_str(), O_PATH | O_CLOEXEC));
+  const auto status = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
+  if (!status) return std::nullopt;
+  if (!S_ISDIR(status->item.type)) {
+    errno = ENOTDIR;
+    return std::nullopt;
+  }
+  return OpenFolder{{path, status->item},
+                    std::make_shared<const Descriptor>(std::move(descriptor))};
 }
 
 }  // namespace
@@ -253,30 +278,36 @@ std::optional<Place> PlaceAt(const std::string& path) {
   return Place{std::move(reached->path), status->item};
 }
 
-std::optional<Place> RememberedPlaceAt(const std::string& path) {
-  const auto found = ReadStatus(AT_FDCWD, path.c_str());
-  if (!found || !IsRememberedAt(found->item, path)) return std::nullopt;
-  return Place{path, found->item};
+bool Holds(const OpenFolder& folder, const ItemReference& item, std::string_view name) {
+  return IsAt(item, folder.descriptor->Get(), std::string(name).c_str());
+}
+
+std::optional<OpenFolder> Open(const Place& folder) {
+  auto found = OpenAt(folder.path);
+  if (!found || !IsSame(found->place.item, folder.item)) return std::nullopt;
+  return found;
+}
+
+std::optional<OpenFolder> OpenRemembered(const std::string& path) {
+  auto found = OpenAt(path);
+  if (!found || !IsRememberedAt(found->place.item, path)) return std::nullopt;
+  return found;
 }
 
 // A path that leads through a link of /proc can spell another folder than the one it is in.
-std::optional<Place> HolderOf(const std::string& path) {
-  std::string folder = FolderOf(path);
-  const auto found = ReadStatus(AT_FDCWD, foundation::WithFolderMark(folder, true).c_str());
-  if (!found) return std::nullopt;
-  if (IsRememberedAt(found->item, folder)) return Place{std::move(folder), found->item};
+std::optional<OpenFolder> OpenHolderOf(const std::string& path) {
+  const std::string folder = FolderOf(path);
+  auto found = OpenAt(folder);
+  if (!found || IsRememberedAt(found->place.item, folder)) return found;
   auto place = PlaceAt(folder);
   if (place && S_ISLNK(place->item.type)) {
     const auto real = RealPath(folder);
     place = real ? PlaceAt(*real) : std::nullopt;
   }
-  if (!place) return std::nullopt;
-  if (!AreEqual(place->item, found->item) || place->item.mount != found->item.mount) {
-    errno = ENOENT;
-    return std::nullopt;
-  }
+  if (!place || !IsSame(place->item, found->place.item)) return std::nullopt;
   RememberPlace(*place);
-  return place;
+  found->place = *std::move(place);
+  return found;
 }
 
 std::optional<std::string> RealPath(const std::string& path) {
@@ -292,13 +323,20 @@ std::string FolderOf(const std::string& path) {
   return foundation::WithFolderMark(foundation::ParentPath(path), false);
 }
 
-std::optional<std::string> FindPath(const ItemReference& item) {
+// Where the kernel does not tell the mount, only the canonical path tells the volume.
+std::optional<std::string> LastPathOf(const ItemReference& item) {
   const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
-  // Where the kernel does not tell the mount, only the canonical path tells the volume.
-  const bool isOneLookEnough = known != nullptr && item.mount != kNoMount &&
-                               (known->isCanonical || IsSpelledOut(known->path));
-  if (isOneLookEnough && IsAt(item, AT_FDCWD, known->path.c_str())) return known->path;
-  return FindCanonicalPath(item);
+  const bool isGoodEnough = known != nullptr && item.mount != kNoMount &&
+                            (known->isCanonical || IsSpelledOut(known->path));
+  if (!isGoodEnough) return std::nullopt;
+  return known->path;
+}
+
+std::optional<std::string> LastPathOf(const Volume& volume, std::uint32_t id) {
+  if (!volume.Root() || !IsInodeNumber(id)) return std::nullopt;
+  ItemReference item = ItemWithID(volume, id);
+  item.mount = volume.Root()->mount;
+  return LastPathOf(item);
 }
 
 std::optional<std::string> FindCanonicalPath(const ItemReference& item) {
@@ -326,26 +364,28 @@ std::optional<std::string> FindCanonicalPath(const ItemReference& item) {
   return place;
 }
 
-std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder) {
-  auto place = AtRememberedPlace(volume, id, folder);
+std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id) {
+  auto place = AtRememberedPlace(volume, id);
   if (place || !volume->Root() || !IsInodeNumber(id)) return place;
   const Path path = AskByInode(*volume, id).path;
-  if (path) place = WithID(volume, id, folder, PlaceAt(*path));
+  if (path) place = WithID(volume, id, false, PlaceAt(*path));
   if (place) RememberPlace(*place);
   return place;
 }
 
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder) {
   if (!CanBeNodeID(id)) return std::nullopt;
-  auto place = AtRememberedPlace(volume, id, folder);
-  if (place) return place;
+  auto place = AtRememberedPlace(volume, id);
+  if (place) return folder && !S_ISDIR(place->item.type) ? std::nullopt : place;
   const auto settled = Settle(volume);
   if (!settled) return std::nullopt;
   if (id == kRootFolderID) return settled->root;
 
   const HandleAnswer answer = IsInodeNumber(id) ? AskByInode(*settled->volume, id) : HandleAnswer{};
   if (answer.isGone) return std::nullopt;
-  if (answer.path) place = WithID(settled->volume, id, folder, PlaceAt(*answer.path));
+  if (answer.path) place = WithID(settled->volume, id, false, PlaceAt(*answer.path));
+  // Nothing but this item can have the id.
+  if (place && folder && !S_ISDIR(place->item.type)) return std::nullopt;
   if (!place) {
     const std::string latest(PlaceMemory::OfThisProcess().Latest());
     const std::string start = NearestFolder(settled->volume, latest);
@@ -354,6 +394,16 @@ std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, boo
   }
   if (place) RememberPlace(*place);
   return place;
+}
+
+std::optional<OpenFolder> OpenWithID(const VolumePointer& volume, std::uint32_t id) {
+  const auto last = LastPathOf(*volume, id);
+  auto found = last ? OpenRemembered(*last) : std::nullopt;
+  if (found && WithID(volume, id, true, found->place)) return found;
+  const auto place = FindItem(volume, id, true);
+  if (place) return Open(*place);
+  errno = ENOENT;
+  return std::nullopt;
 }
 
 }  // namespace tallowmere::files

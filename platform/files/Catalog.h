@@ -8,10 +8,12 @@
 #include <CoreServices/CoreServices.h>
 
 #include <cstdint>
+#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
 
+#include "files/Descriptor.h"
 #include "files/ItemReference.h"
 #include "files/MountTable.h"
 
@@ -27,12 +29,25 @@ void RememberSighting(const ItemReference& item, std::string_view path);
 // there is none.
 std::optional<Place> PlaceAt(const std::string& path);
 
-// The same, if it was remembered there and the path has no link in the last place. One look.
-std::optional<Place> RememberedPlaceAt(const std::string& path);
+// A folder, held for its path alone (O_PATH): its names are looked up in this very folder, whatever
+// is at its place by then.
+struct OpenFolder {
+  Place place;
+  std::shared_ptr<const Descriptor> descriptor;
+};
+
+// Whether that very item is in the folder now, under that name.
+bool Holds(const OpenFolder& folder, const ItemReference& item, std::string_view name);
+
+// The folder that was just found at a place. None, and errno tells, when it is not there now.
+std::optional<OpenFolder> Open(const Place& folder);
+
+// The folder at an absolute path, if it was remembered there.
+std::optional<OpenFolder> OpenRemembered(const std::string& path);
 
 // The folder in which the kernel finds the last component of an absolute path other than "/". None,
 // and errno tells, when there is none or no path leads to it.
-std::optional<Place> HolderOf(const std::string& path);
+std::optional<OpenFolder> OpenHolderOf(const std::string& path);
 
 // The canonical path of a folder that a path leads to, all links followed.
 std::optional<std::string> RealPath(const std::string& path);
@@ -40,19 +55,25 @@ std::optional<std::string> RealPath(const std::string& path);
 // The folder that holds a path, which must not be "/".
 std::string FolderOf(const std::string& path);
 
-// A path of this very item now, with links on the way perhaps, but without ".", ".." and empty
-// components. None when it is gone or cannot be found with certainty.
-std::optional<std::string> FindPath(const ItemReference& item);
+// The path at which an item was last seen, with links on the way perhaps, but without ".", ".." and
+// empty components. None when it is not remembered. Nothing is looked at.
+std::optional<std::string> LastPathOf(const ItemReference& item);
 
-// The same, its canonical path.
+// The same of the item with a node id on a volume.
+std::optional<std::string> LastPathOf(const Volume& volume, std::uint32_t id);
+
+// The canonical path of this very item now. None when it is gone or cannot be found with certainty.
 std::optional<std::string> FindCanonicalPath(const ItemReference& item);
 
 // The item with a node id on a volume; with `folder` nothing but a folder. None when there is none
 // and when it is not certain which item that is.
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder);
 
-// The same without reading a folder: none too when the item has no remembered place and cannot be
-// opened by its number.
-std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id, bool folder);
+// The folder with a node id on a volume. None, and errno tells, when there is none.
+std::optional<OpenFolder> OpenWithID(const VolumePointer& volume, std::uint32_t id);
+
+// An item as FindItem gives it, without reading a folder: none too when the item has no remembered
+// place and cannot be opened by its number.
+std::optional<Place> FindItemAtOnce(const VolumePointer& volume, std::uint32_t id);
 
 }  // namespace tallowmere::files

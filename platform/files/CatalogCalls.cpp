@@ -69,37 +69,65 @@ OSErr FillParent(const Place& item, FSRef& parent) {
   return error == noErr ? GiveReference(folder.place, &parent) : error;
 }
 
-// The item of a reference and where it is now, by a path that need not be canonical.
-OSErr PlaceOfReference(const FSRef* reference, Place& place) {
-  const auto item = Unpack(reference);
-  if (!item) return fnfErr;
-  auto path = FindPath(*item);
-  if (!path) return fnfErr;
-  place = {*std::move(path), *item};
-  return noErr;
+// What was asked of an item, where one is told.
+struct Description {
+  FSCatalogInfoBitmap whichInfo;
+  FSCatalogInfo* info;
+  HFSUniStr255* name;
+  FSSpec* spec;
+  FSRef* parent;
+};
+
+// The path need not be canonical. fnfErr when the item is not there.
+OSErr Describe(const Place& item, const Description& wanted) {
+  // A record alone is made of what its folder holds.
+  const bool isLookedAtLater =
+      wanted.spec != nullptr && wanted.info == nullptr && wanted.name == nullptr;
+  if (!isLookedAtLater && !IsAt(item.item, AT_FDCWD, item.path.c_str())) return fnfErr;
+  OSErr error = noErr;
+  if (wanted.info != nullptr) error = FillInfo(item, wanted.whichInfo, *wanted.info);
+  if (error == noErr && wanted.name != nullptr) FillName(item, *wanted.name);
+  if (error == noErr && wanted.spec != nullptr) error = SpecOfPlace(item, *wanted.spec);
+  if (error == noErr && wanted.parent != nullptr) error = FillParent(item, *wanted.parent);
+  return error;
+}
+
+// The folder with an id that is not its volume's root, seen in the folder that holds it.
+OSErr FindInHolder(const VolumePointer& volume, UInt32 id, const std::string& path, Place& folder,
+                   Folder& holder) {
+  if (const OSErr error = HoldingFolder({path, {}}, volume, holder)) return error;
+  const std::string name(*LastComponent(path));
+  const auto found = ReadStatus(holder.descriptor->Get(), name.c_str());
+  if (!found || !S_ISDIR(found->item.type)) return fnfErr;
+  folder = {JoinPath(holder.place.path, name), found->item};
+  const VolumePointer own = VolumeOf(folder, volume);
+  const bool isIt = own && own->Root() && own->Number() == volume->Number() &&
+                    NodeIDOf(folder.item, *own->Root()) == id;
+  return isIt ? noErr : fnfErr;
+}
+
+OSErr FindInHolder(const VolumePointer& volume, UInt32 id, Place& folder, Folder& holder) {
+  const auto last = LastPathOf(*volume, id);
+  if (last && FindInHolder(volume, id, *last, folder, holder) == noErr) return noErr;
+  const auto found = FindItem(volume, id, true);
+  return found ? FindInHolder(volume, id, found->path, folder, holder)
+               : static_cast<OSErr>(dirNFErr);
 }
 
 }  // namespace
 
 OSErr FSGetCatalogInfo(const FSRef* ref, FSCatalogInfoBitmap whichInfo, FSCatalogInfo* catalogInfo,
                        HFSUniStr255* outName, FSSpec* fsSpec, FSRef* parentRef) {
-  const auto describe = [&](const Place& item) -> OSErr {
-    OSErr error = noErr;
-    if (catalogInfo != nullptr) error = FillInfo(item, whichInfo, *catalogInfo);
-    if (error == noErr && outName != nullptr) FillName(item, *outName);
-    if (error == noErr && fsSpec != nullptr) error = SpecOfPlace(item, *fsSpec);
-    if (error == noErr && parentRef != nullptr) error = FillParent(item, *parentRef);
-    return error;
-  };
+  const Description wanted{whichInfo, catalogInfo, outName, fsSpec, parentRef};
   return OrError([&]() -> OSErr {
-    Place item;
-    OSErr error = PlaceOfReference(ref, item);
-    if (error == noErr) error = describe(item);
-    if (error == noErr || item.path.empty()) return error;
-    // A link of /proc can lead to an item of which only other paths tell where it is.
-    auto path = FindCanonicalPath(item.item);
-    if (!path || *path == item.path) return error;
-    return describe({*std::move(path), item.item});
+    const auto item = Unpack(ref);
+    if (!item) return fnfErr;
+    const auto last = LastPathOf(*item);
+    const OSErr error = last ? Describe({*last, *item}, wanted) : static_cast<OSErr>(fnfErr);
+    if (error == noErr) return noErr;
+    // It has moved; or a link of /proc led to it, and only other paths tell where it is.
+    const auto path = FindCanonicalPath(*item);
+    return path && path != last ? Describe({*path, *item}, wanted) : error;
   });
 }
 
@@ -116,15 +144,19 @@ OSErr FSResolveNodeID(SInt16 volume, UInt32 nodeID, FSRef* outRef) {
 OSErr FSMakeFSRefUnicode(const FSRef* parentRef, UniCharCount nameLength, const UniChar* name,
                          TextEncoding, FSRef* newRef) {
   return OrError([&]() -> OSErr {
-    Place parent;
-    if (const OSErr error = PlaceOfReference(parentRef, parent)) return error;
-    if (!S_ISDIR(parent.item.type)) return errFSNotAFolder;
+    const auto parent = Unpack(parentRef);
+    const auto parentPath = parent ? FindCanonicalPath(*parent) : std::nullopt;
+    if (!parentPath) return fnfErr;
+    if (!S_ISDIR(parent->type)) return errFSNotAFolder;
     if (nameLength > kLongestUnicodeName) return fnfErr;
     const auto linuxName =
         FileNameOfText(ExchangeColonsAndSlashes(std::u16string(name, name + nameLength)));
     if (!linuxName || !CanBeLinuxName(*linuxName)) return fnfErr;
-    const std::string path = JoinPath(parent.path, *linuxName);
-    const auto item = ReadItem(AT_FDCWD, path.c_str());
+    const std::string path = JoinPath(*parentPath, *linuxName);
+    const auto folder = OpenHolderOf(path);
+    const bool isThere = folder && Holds(*folder, *parent, "");
+    if (!isThere) return fnfErr;
+    const auto item = ReadItem(folder->descriptor->Get(), linuxName->c_str());
     if (!item) return ErrorOfSystem();
     RememberSighting(*item, path);
     *newRef = Pack(*item);
@@ -157,20 +189,24 @@ OSErr PBGetCatInfoSync(CInfoPBPtr paramBlock) {
   return OrError([&]() -> OSErr {
     DirInfo& block = paramBlock->dirInfo;
     if (block.ioFDirIndex != -1) return paramErr;
-    Folder folder;
     const auto id = static_cast<UInt32>(block.ioDrDirID);
-    if (const OSErr error = FolderWithID(block.ioVRefNum, id, folder)) return error;
-
-    std::string name = folder.volume->Name();
+    std::string name;
     UInt32 parentID = kParentOfRootID;
-    if (id != kRootFolderID) {
+    if (id == kRootFolderID) {
+      Folder root;
+      if (const OSErr error = FolderWithID(block.ioVRefNum, id, root)) return error;
+      name = root.volume->Name();
+    } else {
+      const VolumePointer volume = MountTable::OfThisProcess().WithNumber(block.ioVRefNum);
+      if (!volume) return nsvErr;
+      Place folder;
       Folder holder;
-      if (const OSErr error = HoldingFolder(folder.place, folder.volume, holder)) return error;
-      const auto found = HFSNameOf(holder, folder.place, kLongestStr255Name);
+      if (const OSErr error = FindInHolder(volume, id, folder, holder)) return error;
+      const auto found = HFSNameOf(holder, folder, kLongestStr255Name);
       if (!found) return fnfErr;
       name = *found;
       // A folder that hangs in another volume is the top of what can be climbed on this one.
-      const bool sameVolume = holder.volume->Number() == folder.volume->Number();
+      const bool sameVolume = holder.volume->Number() == volume->Number();
       if (sameVolume) parentID = holder.ID();
     }
     if (block.ioNamePtr != nullptr) CopyToPascal(name, block.ioNamePtr);

@@ -23,6 +23,7 @@ class Descriptor {
 
   int Get() const { return mDescriptor; }
   bool IsOpen() const { return mDescriptor >= 0; }
+  int Release() { return std::exchange(mDescriptor, -1); }  // to who closes it from now on
   void Close() {
     if (mDescriptor >= 0) ::close(std::exchange(mDescriptor, -1));
   }

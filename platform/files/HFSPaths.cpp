@@ -52,18 +52,18 @@ OSErr OnTheWay(OSErr error) {
 }
 
 // `near` as for VolumeOf.
-OSErr UseAsFolder(Place place, const VolumePointer& near, Folder& folder) {
-  if (!S_ISDIR(place.item.type)) return dirNFErr;
-  folder.volume = VolumeOf(place, near);
-  folder.place = std::move(place);
+OSErr UseAsFolder(const Place& place, const VolumePointer& near, Folder& folder) {
+  auto found = S_ISDIR(place.item.type) ? Open(place) : std::nullopt;
+  if (!found) return dirNFErr;
+  folder = {*std::move(found), VolumeOf(place, near)};
   return folder.volume && folder.volume->Root() ? noErr : nsvErr;
 }
 
 OSErr FolderAt(const std::string& path, Folder& folder) {
   const auto real = RealPath(path);
   if (!real) return OnTheWay(ErrorOfSystem());
-  auto place = PlaceAt(*real);
-  return place ? UseAsFolder(*std::move(place), nullptr, folder) : static_cast<OSErr>(dirNFErr);
+  const auto place = PlaceAt(*real);
+  return place ? UseAsFolder(*place, nullptr, folder) : static_cast<OSErr>(dirNFErr);
 }
 
 OSErr RootOf(const VolumePointer& volume, Folder& folder) {
@@ -92,7 +92,7 @@ OSErr Step(std::string_view name, Folder& folder) {
   const OSErr error = LookUpHFSName(folder, name, item);
   if (error != noErr) return OnTheWay(error);
   if (S_ISLNK(item.item.type)) return FolderAt(item.path, folder);
-  return UseAsFolder(std::move(item), folder.volume, folder);
+  return UseAsFolder(item, folder.volume, folder);
 }
 
 // The folder that steps from a volume's root lead to, when one look tells it: what has their names
@@ -109,9 +109,9 @@ bool FindFolderAtOnce(const Steps& steps, Folder& folder) {
     if (linuxName.empty()) return false;
     path = JoinPath(path, linuxName);
   }
-  auto found = RememberedPlaceAt(path);
-  if (!found || !S_ISDIR(found->item.type)) return false;
-  folder.place = *std::move(found);
+  auto found = OpenRemembered(path);
+  if (!found) return false;
+  folder = {*std::move(found), folder.volume};
   return folder.volume->IsMountedAs(folder.place.item.mount);
 }
 

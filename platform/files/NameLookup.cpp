@@ -20,6 +20,17 @@ struct CloseFolder {
   void operator()(DIR* folder) const { closedir(folder); }
 };
 
+using Entries = std::unique_ptr<DIR, CloseFolder>;
+
+// Null, and errno tells, when the folder cannot be read.
+Entries EntriesOf(const OpenFolder& folder) {
+  Descriptor descriptor(openat(folder.descriptor->Get(), ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  if (!descriptor.IsOpen()) return nullptr;
+  Entries entries(fdopendir(descriptor.Get()));
+  if (entries) descriptor.Release();
+  return entries;
+}
+
 // The next entry; null with errno 0 at the end, and with another one on an error.
 const dirent* NextEntry(DIR* folder) {
   errno = 0;
@@ -27,16 +38,15 @@ const dirent* NextEntry(DIR* folder) {
 }
 
 OSErr LookUp(const Folder& folder, const std::string& linuxName, Place& item) {
-  std::string path = foundation::JoinPath(folder.place.path, linuxName);
-  const auto found = ReadStatus(AT_FDCWD, path.c_str());
+  const auto found = ReadStatus(folder.descriptor->Get(), linuxName.c_str());
   if (!found) return ErrorOfSystem();
-  item = {std::move(path), found->item};
+  item = {foundation::JoinPath(folder.place.path, linuxName), found->item};
   return noErr;
 }
 
 // The one entry of a folder whose HFS form is `name`.
 OSErr FindByForm(const Folder& folder, std::string_view name, Place& item) {
-  const std::unique_ptr<DIR, CloseFolder> entries(opendir(folder.place.path.c_str()));
+  const Entries entries = EntriesOf(folder);
   if (!entries) return ErrorOfSystem();
   std::optional<std::string> found;
   while (const dirent* const entry = NextEntry(entries.get())) {
@@ -78,7 +88,7 @@ Folder ByCanonicalPath(const Folder& folder) {
   auto place = PlaceAt(folder.place.path);
   const bool isStillThere = place && AreEqual(place->item, folder.place.item) &&
                             place->item.mount == folder.place.item.mount;
-  return isStillThere ? Folder{folder.volume, *std::move(place)} : folder;
+  return isStillThere ? Folder{{*std::move(place), folder.descriptor}, folder.volume} : folder;
 }
 
 // The folder at all its places on the volume, when in one of them something is mounted, so that one
@@ -94,9 +104,9 @@ std::vector<Folder> ViewsOf(const Folder& reached) {
       paths.begin(), paths.end(), [&](const auto& path) { return table.HoldsMountPoint(path); });
   if (paths.size() > 1 && hidesSomething) {
     for (const std::string& path : paths) {
-      auto place = PlaceAt(path);
+      const auto place = PlaceAt(path);
       if (!place || !AreEqual(place->item, folder.place.item)) continue;
-      views.push_back({folder.volume, *std::move(place)});
+      if (auto view = Open(*place)) views.push_back({*std::move(view), folder.volume});
     }
   }
   if (views.empty()) views.push_back(folder);
@@ -152,22 +162,17 @@ class ShortFormSearch {
 
   // Without going through the folder.
   bool FindByNumber(const ShortNameParts& parts, Place& item) {
-    auto place = FindItemAtOnce(mViews.front().volume, parts.nodeID, false);
+    const auto place = FindItemAtOnce(mViews.front().volume, parts.nodeID);
     if (!place) return false;
-    const auto holder = HolderOf(place->path);
-    const bool isHere =
-        holder && std::any_of(mViews.begin(), mViews.end(), [&](const Folder& view) {
-          return AreEqual(view.place.item, holder->item) &&
-                 view.place.item.mount == holder->item.mount;
-        });
     const std::string linuxName(*foundation::LastComponent(place->path));
-    if (!isHere || !IsShortFormOf(parts, linuxName.c_str(), place->item)) return false;
-    item = *std::move(place);
-    return true;
+    const bool isHere = std::any_of(mViews.begin(), mViews.end(), [&](const Folder& view) {
+      return LookUp(view, linuxName, item) == noErr && AreEqual(item.item, place->item);
+    });
+    return isHere && IsShortFormOf(parts, linuxName.c_str(), item.item);
   }
 
   OSErr SearchFolder(const Folder& view) {
-    const std::unique_ptr<DIR, CloseFolder> entries(opendir(view.place.path.c_str()));
+    const Entries entries = EntriesOf(view);
     if (!entries) return ErrorOfSystem();
     const std::string path = ByCanonicalPath(view).place.path;
     const bool untrueEntries =

@@ -10,6 +10,7 @@
 #include <string>
 #include <string_view>
 
+#include "files/Catalog.h"
 #include "files/ItemReference.h"
 #include "files/MountTable.h"
 
@@ -17,9 +18,8 @@ namespace tallowmere::files {
 
 // A folder in which names are looked up. REQUIRES of who makes one: it is a folder, and its volume
 // has a root.
-struct Folder {
+struct Folder : OpenFolder {
   VolumePointer volume;
-  Place place;
 
   std::uint32_t ID() const;
 };

@@ -1,6 +1,6 @@
 #include "files/Specs.h"
 
-#include <sys/stat.h>
+#include <fcntl.h>
 
 #include <algorithm>
 
@@ -40,9 +40,9 @@ bool IsRootOf(const VolumePointer& volume, const Place& item) {
 
 OSErr HoldingFolder(const Place& item, const VolumePointer& near, Folder& folder) {
   if (item.path == "/") return fnfErr;
-  auto found = HolderOf(item.path);
+  auto found = OpenHolderOf(item.path);
   if (!found) return ErrorOfSystem();
-  folder.place = *std::move(found);
+  folder = {*std::move(found), nullptr};
   folder.volume = VolumeOf(folder.place, near);
   return folder.volume && folder.volume->Root() ? noErr : nsvErr;
 }
@@ -50,12 +50,15 @@ OSErr HoldingFolder(const Place& item, const VolumePointer& near, Folder& folder
 OSErr SpecOfPlace(const Place& item, FSSpec& spec) {
   const VolumePointer volume = VolumeOf(item, nullptr);
   if (IsRootOf(volume, item)) {
+    if (!IsAt(item.item, AT_FDCWD, item.path.c_str())) return fnfErr;
     FillSpecOfRoot(spec, *volume);
     return noErr;
   }
   Folder folder;
   if (const OSErr error = HoldingFolder(item, volume, folder)) return error;
-  RememberPlace({JoinPath(folder.place.path, *LastComponent(item.path)), item.item});
+  const std::string_view name = *LastComponent(item.path);
+  if (!Holds(folder, item.item, name)) return fnfErr;
+  RememberPlace({JoinPath(folder.place.path, name), item.item});
   return FillSpecInFolder(spec, folder, item);
 }
 
@@ -69,9 +72,9 @@ OSErr SpecInFolder(const Folder& folder, const Place& item, FSSpec& spec) {
 OSErr FolderWithID(SInt16 vRefNum, UInt32 id, Folder& folder) {
   folder.volume = MountTable::OfThisProcess().WithNumber(vRefNum);
   if (!folder.volume) return nsvErr;
-  auto place = FindItem(folder.volume, id, true);
-  if (!place) return dirNFErr;
-  folder.place = *std::move(place);
+  auto found = OpenWithID(folder.volume, id);
+  if (!found) return dirNFErr;
+  folder = {*std::move(found), folder.volume};
   // One that moved before it was first looked at was found by what the table says of it now.
   if (!folder.volume->Root()) {
     folder.volume = MountTable::OfThisProcess().OfItem(folder.place.item, folder.place.path);

@@ -19,7 +19,8 @@ bool IsRootOf(const VolumePointer& volume, const Place& item);
 // canonical. nsvErr when that folder is on no volume; fnfErr for "/", which nothing holds.
 OSErr HoldingFolder(const Place& item, const VolumePointer& near, Folder& folder);
 
-// The record of an item, whose path need not be canonical.
+// The record of the item that was last seen at a place, whose path need not be canonical. fnfErr
+// when it is not there.
 OSErr SpecOfPlace(const Place& item, FSSpec& spec);
 
 // The record of an item of a folder, or of a volume that is mounted there.
