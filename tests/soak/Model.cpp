@@ -582,6 +582,9 @@ class Evaluation {
       }
     }
     if (!canBeNoFolder) return;
+    if (!mGraph.IsOfOneState()) {
+      mTruth.nowhere.insert(PathResponse(path + "/" + NewName(mRequest.hfsName)));
+    }
     const bool isUTF8 = mRequest.hfsName.find('\x8E') == std::string::npos;
     Say(isUTF8 ? PathResponse(path + "/" + mRequest.hfsName)
                : (Flag(0) + CString(path)).append(kTrailer));
