@@ -177,7 +177,7 @@ class Evaluation {
   Outcome LookUpHFS(Node folder, std::string_view hfsName) {
     Outcome outcome;
     bool isKnown = false;
-    for (NameIndex name = 0; name < kNames.size(); ++name) {
+    for (NameIndex name = 0; name < kEndOfFiles; ++name) {
       if (hfsName != kNames[name].hfsName) continue;
       outcome = LookUp(folder, name);
       isKnown = true;
@@ -212,7 +212,7 @@ class Evaluation {
   }
 
   Outcome TargetOf(const Entry& link) {
-    const Outcome target = LookUp(kMainRoot, link.target);
+    Outcome target = LookUp(kMainRoot, link.target);
     if (link.innerTarget == kNoName) return target;
     Outcome inner;
     bool always = true;
@@ -582,6 +582,9 @@ class Evaluation {
       }
     }
     if (!canBeNoFolder) return;
+    if (!mGraph.IsOfOneState()) {
+      mTruth.nowhere.insert(PathResponse(path + "/" + NewName(mRequest.hfsName)));
+    }
     const bool isUTF8 = mRequest.hfsName.find('\x8E') == std::string::npos;
     Say(isUTF8 ? PathResponse(path + "/" + mRequest.hfsName)
                : (Flag(0) + CString(path)).append(kTrailer));
