@@ -56,10 +56,14 @@ bool AreEqual(const ItemReference& first, const ItemReference& second);
 // `folder` as in openat(2); with an empty name, the open item itself.
 std::optional<ItemReference> ReadItem(int folder, const char* name);
 
+// A time in nanoseconds since 1970. Beyond the years 1677 to 2262 the number wraps, so that other
+// times still have other numbers.
+std::int64_t Nanoseconds(std::int64_t seconds, std::int64_t nanoseconds);
+
 // The item without its handle, when it was last changed, and how many names it has.
 struct ItemStatus {
   ItemReference item;
-  std::int64_t change;  // nanoseconds since 1970
+  std::int64_t change;  // as Nanoseconds
   std::uint32_t links;
 };
 

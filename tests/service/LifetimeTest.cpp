@@ -14,6 +14,7 @@
 #include <optional>
 #include <utility>
 
+#include "service/RightAnswers.h"
 #include "support/ChildProgram.h"
 #include "support/DeadMount.h"
 #include "support/EveryRequest.h"
@@ -156,9 +157,6 @@ TEST(Lifetime, AResponseThatNobodyReadsEndsTheServiceWithStatus0WhereTheSignalIs
 // --- A parent that is killed --------------------------------------------------------------------
 
 constexpr int kStillRuns = -1000;
-
-// An id that two items could have: to answer for it all folders are read.
-constexpr auto kSharedID = static_cast<std::int32_t>(0x80001234);
 
 // A process that starts a service and is killed. It alone holds the other ends of the service's
 // pipes. The service is this process's child when its parent is gone.

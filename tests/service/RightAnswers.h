@@ -14,6 +14,12 @@
 
 namespace tallowmere::test {
 
+// To code 9, about what cannot be found.
+inline const std::string kNoItemResponse = (Flag(1) + U16(0)).append(kTrailer);
+
+// An id that two items could have, and none has: all folders of its volume are read.
+constexpr auto kSharedID = static_cast<std::int32_t>(0x80001234);
+
 // The command that starts a program in a shell, once a line of the shell has succeeded there.
 inline std::vector<std::string> After(const std::string& line,
                                       std::vector<std::string> command = {}) {

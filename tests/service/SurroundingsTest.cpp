@@ -126,6 +126,8 @@ TEST_P(ClockSetTo, DoesNotHideWhatHasChangedSinceAPass) {
   const std::string record = learns.Ask(RecordRequest(item), 75).substr(1, 70);
 
   Service service(Command());
+  const std::string none = Record(service.NumberOf("Volume"), kSharedID, "none");
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(none, 0, 0), kNoItemResponse));
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(item)));
   std::filesystem::rename(before, after);
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0),
