@@ -21,12 +21,6 @@ namespace {
 
 using std::filesystem::path;
 
-#ifdef __SANITIZE_ADDRESS__
-constexpr bool kTakesTerabytes = true;  // of address space, for its shadow
-#else
-constexpr bool kTakesTerabytes = false;
-#endif
-
 const std::string kFewDescriptors = "ulimit -n 64";
 const std::string kLittleMemory = "ulimit -v 65536";  // KiB
 
@@ -112,20 +106,20 @@ TEST_F(LimitsOfAPass, SixtyFourDescriptorsAreEnoughForAWideVolume) {
 // --- Memory -------------------------------------------------------------------------------------
 
 TEST_F(Limits, SixtyFourMegabytesAreEnoughForEveryRequest) {
-  if (kTakesTerabytes) GTEST_SKIP() << "the sanitizer takes more";
+  if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
   Service service(After(kLittleMemory));
   ExpectRightAnswers(service, mItem);
 }
 
 TEST_F(LimitsOfAPass, SixtyFourMegabytesAreEnoughForAHundredThousandFolders) {
-  if (kTakesTerabytes) GTEST_SKIP() << "the sanitizer takes more";
+  if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
   const std::string record = RecordOnALargeVolume();
   Service service(After(kLittleMemory + " && " + kFewDescriptors));
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
 }
 
 TEST_F(LimitsOfAPass, WithoutMemoryThePassIsAnErrorAndTheNextOneIsRight) {
-  if (kTakesTerabytes) GTEST_SKIP() << "the sanitizer takes more";
+  if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
   const std::string record = RecordOnALargeVolume();
   Service service;
   ASSERT_TRUE(service.Answers(kAnyRequest, kItsResponse));

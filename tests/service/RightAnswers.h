@@ -14,6 +14,12 @@
 
 namespace tallowmere::test {
 
+#ifdef __SANITIZE_ADDRESS__
+constexpr bool kIsSanitized = true;
+#else
+constexpr bool kIsSanitized = false;
+#endif
+
 // To code 9, about what cannot be found.
 inline const std::string kNoItemResponse = (Flag(1) + U16(0)).append(kTrailer);
 
