@@ -9,15 +9,22 @@
 
 namespace {
 
+time_t Number(const char* variable) {
+  const char* const text = std::getenv(variable);
+  return text == nullptr ? 0 : std::atoll(text);
+}
+
 time_t NextTime() {
-  static time_t now = std::atoll(std::getenv("TALLOWMERE_CLOCK"));
-  static const time_t step = std::atoll(std::getenv("TALLOWMERE_CLOCK_STEP"));
+  static time_t now = Number("TALLOWMERE_CLOCK");
+  static const time_t step = Number("TALLOWMERE_CLOCK_STEP");
   const time_t shown = now;
   now += step;
   return shown;
 }
 
 }  // namespace
+
+// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name): theirs are reserved.
 
 extern "C" int clock_gettime(clockid_t clock, timespec* shown) noexcept {
   if (clock != CLOCK_REALTIME && clock != CLOCK_REALTIME_COARSE) {
@@ -39,3 +46,5 @@ extern "C" time_t time(time_t* shown) noexcept {
   if (shown != nullptr) *shown = now;
   return now;
 }
+
+// NOLINTEND(readability-inconsistent-declaration-parameter-name)
