@@ -27,7 +27,7 @@ constexpr std::int64_t kNotRead = std::numeric_limits<std::int64_t>::min();
 
 // A change this recent may be followed by another with the same time: file systems count in ticks,
 // of two seconds at the coarsest.
-constexpr std::int64_t kCoarsestTick = 2'000'000'000;
+constexpr std::uint64_t kCoarsestTick = 2'000'000'000;
 
 // The most components that a path can have: a "/" and one byte each.
 constexpr std::size_t kMostComponents = PATH_MAX / 2;
@@ -41,7 +41,7 @@ constexpr std::uint32_t kNever = 0;
 std::int64_t Now() {
   timespec now{};
   clock_gettime(CLOCK_REALTIME, &now);
-  return now.tv_sec * 1'000'000'000 + now.tv_nsec;
+  return Nanoseconds(now.tv_sec, now.tv_nsec);
 }
 
 bool IsThisOrParent(const char* name) {
@@ -332,7 +332,8 @@ void FolderIndex::MarkAsRead(std::uint32_t index, std::int64_t change, std::int6
   folder.checked = mSearches;
   if (folder.change == change) return;
   folder.read = mSearches;
-  const bool mayChangeUnseen = change + kCoarsestTick >= now;
+  const std::uint64_t age = static_cast<std::uint64_t>(now) - static_cast<std::uint64_t>(change);
+  const bool mayChangeUnseen = now <= change || age <= kCoarsestTick;
   folder.change = mayChangeUnseen ? kNotRead : change;
 }
 

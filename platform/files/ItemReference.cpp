@@ -13,8 +13,6 @@ namespace {
 // Longer than the coarsest tick of a stored time of birth, one second.
 constexpr std::int64_t kNewbornSeconds = 2;
 
-constexpr std::int64_t kNanosecondsInASecond = 1'000'000'000;
-
 bool HasBirth(const ItemReference& item) {
   return item.birthNanoseconds != kNoBirth;
 }
@@ -52,6 +50,12 @@ bool AreEqual(const ItemReference& first, const ItemReference& second) {
   return first.device == second.device && first.inode == second.inode;
 }
 
+std::int64_t Nanoseconds(std::int64_t seconds, std::int64_t nanoseconds) {
+  constexpr std::uint64_t kInASecond = 1'000'000'000;
+  return static_cast<std::int64_t>(static_cast<std::uint64_t>(seconds) * kInASecond +
+                                   static_cast<std::uint64_t>(nanoseconds));
+}
+
 std::optional<ItemStatus> ReadStatus(int folder, const char* name) {
   struct statx about {};
   const int emptyPath = *name == '\0' ? AT_EMPTY_PATH : 0;
@@ -69,9 +73,8 @@ std::optional<ItemStatus> ReadStatus(int folder, const char* name) {
   const bool hasMount = (about.stx_mask & STATX_MNT_ID) != 0;
   item.mount = hasMount ? static_cast<std::int32_t>(about.stx_mnt_id) : kNoMount;
   item.type = about.stx_mode & S_IFMT;
-  const std::int64_t change =
-      about.stx_ctime.tv_sec * kNanosecondsInASecond + about.stx_ctime.tv_nsec;
-  return ItemStatus{item, change, about.stx_nlink};
+  return ItemStatus{item, Nanoseconds(about.stx_ctime.tv_sec, about.stx_ctime.tv_nsec),
+                    about.stx_nlink};
 }
 
 std::optional<ItemReference> ReadItem(int folder, const char* name) {

@@ -62,10 +62,14 @@ std::optional<ItemReference> ReadItem(int folder, const char* name);
 // Gives an item that was just read as ItemStatus the handle that ReadItem would have read.
 void ReadProof(ItemReference& item, int folder, const char* name);
 
+// A time in nanoseconds since 1970. Beyond the years 1677 to 2262 the number wraps, so that other
+// times still have other numbers.
+std::int64_t Nanoseconds(std::int64_t seconds, std::int64_t nanoseconds);
+
 // The item without its handle, when it was last changed, and how many names it has.
 struct ItemStatus {
   ItemReference item;
-  std::int64_t change;  // nanoseconds since 1970
+  std::int64_t change;  // as Nanoseconds
   std::uint32_t links;
 };
 

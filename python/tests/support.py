@@ -2,7 +2,6 @@
 
 from __future__ import annotations
 
-import contextlib
 import os
 import signal
 import subprocess
@@ -64,6 +63,14 @@ def children() -> list[int]:
     return found
 
 
+def has_ended(process: int) -> bool:
+    """Whether a process is no more, or has only not been waited for."""
+    try:
+        return ") Z " in Path(f"/proc/{process}/stat").read_text()
+    except OSError:
+        return True
+
+
 def descriptors() -> set[str]:
     return set(os.listdir("/proc/self/fd"))
 
@@ -72,6 +79,5 @@ def kill_child(number: int = signal.SIGKILL) -> None:
     """Sends a signal to the one child, and with SIGKILL sees it end; it is not waited for here."""
     [child] = children()
     os.kill(child, number)
-    with contextlib.suppress(FileNotFoundError):
-        while number == signal.SIGKILL and ") Z " not in Path(f"/proc/{child}/stat").read_text():
-            time.sleep(0.001)
+    while number == signal.SIGKILL and not has_ended(child):
+        time.sleep(0.001)

@@ -6,6 +6,7 @@ from __future__ import annotations
 import gc
 import os
 import signal
+import subprocess
 import sys
 import threading
 import time
@@ -15,7 +16,7 @@ from typing import Any
 import tallowmere._client
 from tallowmere import Client, DeadlineMissed, ProtocolError, ServiceEnded, ServiceError, request
 
-from .support import SERVICE, FolderTest, children, descriptors, kill_child
+from .support import PACKAGE, SERVICE, FolderTest, children, descriptors, has_ended, kill_child
 
 # A stand-in says what its test writes here when the first request arrives.
 ANSWER = "os.read(0, 65536)\nos.write(1, {!r})\n"
@@ -358,6 +359,30 @@ class Hosts(FolderTest):
             """
         )
         self.assertFalse(os.path.exists(f"/proc/{int(said)}"))
+
+    def test_a_host_that_is_killed_takes_its_services_with_it(self) -> None:
+        code = f"""if True:
+            import subprocess, time
+            from tallowmere import Client
+            clients = [Client({SERVICE!r}) for _ in range(2)]
+            for client in clients: client.get_hfs_volume_name(0)
+            # A child that outlives the host and has all that a child inherits.
+            child = subprocess.Popen(["sleep", "60"], stdout=subprocess.DEVNULL, close_fds=False)
+            print(child.pid, *[client._process._child.pid for client in clients], flush=True)
+            time.sleep(60)
+            """
+        environment = {**os.environ, "PYTHONPATH": str(PACKAGE)}
+        with subprocess.Popen([sys.executable, "-c", code], env=environment, stdout=subprocess.PIPE, text=True) as host:
+            assert host.stdout
+            child, *services = [int(word) for word in host.stdout.readline().split()]
+            self.addCleanup(os.kill, child, signal.SIGKILL)
+            host.kill()
+        self.assertEqual(len(services), 2)
+        for service in services:
+            deadline = time.monotonic() + 10
+            while not has_ended(service) and time.monotonic() < deadline:
+                time.sleep(0.001)
+            self.assertTrue(has_ended(service))
 
     def test_the_service_is_found_beside_the_script_then_on_path(self) -> None:
         script = os.path.join(self.folder, "script.py")

@@ -1,7 +1,9 @@
 // What a client does about a service that fails it.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/prctl.h>
 
+#include <array>
 #include <ctime>
 #include <thread>
 
@@ -289,6 +291,61 @@ TEST(Client, AThousandProgramsThatEndAtOnceLeaveNeitherProcessNorDescriptor) {
   for (int i = 0; i < 1000; ++i) ASSERT_EQ(MessageOf(client.GetHFSVolumeName(0)), kEnded);
   EXPECT_EQ(test::OpenDescriptors(), before);
   EXPECT_TRUE(test::HasNoChild());
+}
+
+TEST(Client, OneThatTakesTheNameOfAnotherEndsTheOthersService) {
+  Client client = test::StartClient();
+  ASSERT_TRUE(client.GetHFSVolumeName(0));
+  client = test::StartClient();
+  EXPECT_TRUE(test::HasNoChild());
+  ASSERT_TRUE(client.GetHFSVolumeName(0));
+  const Client itsHeir = std::move(client);
+  EXPECT_FALSE(test::HasNoChild());
+}
+
+// A host with two clients, and with a child that outlives it and has what a child inherits.
+TEST(Client, AHostThatIsKilledTakesItsServicesWithIt) {
+  prctl(PR_SET_CHILD_SUBREAPER, 1);
+  std::array<int, 2> ready{};
+  ASSERT_EQ(pipe(ready.data()), 0);
+  const pid_t host = fork();
+  if (host == 0) {
+    Client first = test::StartClient();
+    Client second = test::StartClient();
+    const bool live = first.GetHFSVolumeName(0) && second.GetHFSVolumeName(0);
+    const pid_t child = live ? fork() : -1;
+    if (child == 0) {
+      execlp("sleep", "sleep", "60", nullptr);
+      _exit(1);
+    }
+    if (write(ready[1], &child, sizeof child) != sizeof child) _exit(1);
+    pause();
+  }
+  pid_t child = -1;
+  ASSERT_EQ(read(ready[0], &child, sizeof child), static_cast<ssize_t>(sizeof child));
+  ASSERT_GT(child, 0);
+  kill(host, SIGKILL);
+  ASSERT_EQ(waitpid(host, nullptr, 0), host);
+
+  const auto deadline = steady_clock::now() + milliseconds(10'000);
+  int ended = 0;
+  while (ended < 2 && steady_clock::now() < deadline) {
+    int status = -1;
+    const pid_t service = waitpid(-1, &status, WNOHANG);
+    if (service > 0) {
+      ++ended;
+      EXPECT_NE(service, child);
+      EXPECT_EQ(status, 0);
+    }
+    std::this_thread::sleep_for(milliseconds(1));
+  }
+  EXPECT_EQ(ended, 2);
+  kill(child, SIGKILL);
+  while (waitpid(-1, nullptr, 0) > 0) {
+  }
+  prctl(PR_SET_CHILD_SUBREAPER, 0);
+  close(ready[0]);
+  close(ready[1]);
 }
 
 }  // namespace

@@ -1,11 +1,10 @@
-#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/mount.h>
 
 #include <optional>
-#include <sstream>
 
+#include "support/DeadMount.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
 #include "support/TracedService.h"
@@ -201,20 +200,13 @@ TEST_F(WithMounts, WithoutProcThereIsOneVolume) {
   EXPECT_EQ(service.NumberOf("Other"), 32767);
 }
 
-// A file system whose server never answers: whoever asks it for anything waits for ever.
 TEST_F(WithMounts, AVolumeThatNeverAnswersIsListedWithoutWaiting) {
-  const int server = open("/dev/fuse", O_RDWR | O_CLOEXEC);
-  if (server < 0) GTEST_SKIP() << "/dev/fuse cannot be opened here";
-  std::ostringstream options;
-  options << "fd=" << server << ",rootmode=40000,user_id=0,group_id=0";
-  std::optional<ScopedMount> dead;
-  dead.emplace("dead", Folder("Dead"), "fuse", MS_NODEV | MS_NOSUID, options.str());
-  if (!dead->IsMounted()) GTEST_SKIP() << "no FUSE mounts here";
+  const DeadMount dead(Folder("Dead"));
+  if (!dead.IsMounted()) GTEST_SKIP() << "no FUSE mounts here";
   const ScopedMount alive("none", Folder("Alive"), "tmpfs");
   Service service;
   EXPECT_LT(service.NumberOf("Dead"), 0);
   EXPECT_LT(service.NumberOf("Alive"), 0);
-  close(server);
 }
 
 TEST(VolumeCommands, AThousandRequestsParseTheMountTableOnce) {

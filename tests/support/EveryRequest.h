@@ -50,6 +50,43 @@ inline std::string RequestAbout(const Item& item, unsigned code) {
   return requests.at(code - 1);
 }
 
+// The right answer to it. REQUIRES: the item is a file; the code is not 10, whose answer is not
+// about the item.
+inline std::string AnswerAbout(const Item& item, unsigned code) {
+  std::string fullPath = item.fullPath;
+  fullPath.resize(kRoomForAFullPath);
+  const std::vector<std::string> answers{
+      (U16(static_cast<unsigned>(item.fullPath.size())) + fullPath).append(kTrailer),
+      ResultResponse(0, item.path),
+      VolumeNumberResponse(item.volume),
+      VolumeNameResponse(item.volumeName),
+      NameResponse(1, item.name),
+      PathResponse(item.path),
+      RecordResponse(1, item.record),
+      PathResponse(item.path),
+      PathResponse(item.path),
+  };
+  return answers.at(code - 1);
+}
+
+// What a service knows of the item at a path, whose name is its HFS name too; the record is empty
+// when it has none.
+inline Item LearnItem(Service& service, const std::string& path) {
+  Item item{};
+  item.path = path;
+  item.name = std::filesystem::path(path).filename();
+  item.folder = std::filesystem::path(path).parent_path();
+  const std::string answer = service.Ask(RequestAbout(item, 7), 75);
+  if (answer.size() != 75 || answer[0] != 1) return item;
+  item.record = answer.substr(1, 70);
+  std::memcpy(&item.volume, item.record.data(), sizeof item.volume);
+  std::memcpy(&item.folderID, item.record.data() + sizeof item.volume, sizeof item.folderID);
+  item.volumeName = service.NameOf(item.volume);
+  const std::string fullPath = service.Ask(RequestAbout(item, 1), 2 + kRoomForAFullPath + 4);
+  if (fullPath.size() > 2) item.fullPath = fullPath.c_str() + 2;
+  return item;
+}
+
 // The number of components of the item's path: some requests cost by it.
 inline constexpr int kComponents = 6;
 
@@ -58,15 +95,8 @@ class EveryRequest {
   EveryRequest() {
     mItem.path = MakeFile(mFolder.Path());
     if (!IsMade()) return;
-    mItem.name = std::filesystem::path(mItem.path).filename();
-    mItem.folder = std::filesystem::path(mItem.path).parent_path();
     Service service;
-    mItem.record = service.Ask(Of(7), 75).substr(1, 70);
-    std::memcpy(&mItem.volume, mItem.record.data(), sizeof mItem.volume);
-    std::memcpy(&mItem.folderID, mItem.record.data() + sizeof mItem.volume, sizeof mItem.folderID);
-    mItem.volumeName = service.NameOf(mItem.volume);
-    const std::string answer = service.Ask(Of(1), 2 + kRoomForAFullPath + 4);
-    mItem.fullPath = answer.c_str() + 2;
+    mItem = LearnItem(service, mItem.path);
   }
 
   // Not where the folder for temporary files is too deep.

@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "support/ChildProgram.h"
 
@@ -127,6 +128,12 @@ class Service : public ChildProgram {
                    BrokenPipe brokenPipe = BrokenPipe::kEnds)
       : ChildProgram(TALLOWMERE_SERVICE, {parent}, brokenPipe) {}
 
+  // Started by a command, which gets the service's program and its argument as its own last words:
+  // {"setpriv", "--clear-groups"}. The argument stands for the service's own process group, which
+  // lives as long as it does.
+  explicit Service(const std::vector<std::string>& command)
+      : ChildProgram(command.front(), WithService(command)) {}
+
   std::string Ask(std::string_view request, std::size_t responseSize) {
     Write(request);
     return Read(responseSize);
@@ -154,6 +161,13 @@ class Service : public ChildProgram {
     const std::size_t length = static_cast<unsigned char>(head[1]);
     const std::string rest = Read(length + kTrailer.size());
     return rest.substr(0, rest.size() - kTrailer.size() - 1);
+  }
+
+ private:
+  static std::vector<std::string> WithService(const std::vector<std::string>& command) {
+    std::vector<std::string> arguments(command.begin() + 1, command.end());
+    arguments.insert(arguments.end(), {TALLOWMERE_SERVICE, "0"});
+    return arguments;
   }
 };
 

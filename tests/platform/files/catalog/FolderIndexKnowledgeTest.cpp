@@ -14,10 +14,12 @@
 
 #include "CatalogFixture.h"
 #include "files/FolderIndex.h"
+#include "support/DeadMount.h"
 
 namespace tallowmere::files {
 namespace {
 
+using test::DeadMount;
 using test::EnterOwnMountNamespace;
 using test::ScopedMount;
 using test::TemporaryFolder;
@@ -82,27 +84,6 @@ class NamelessFile {
 
  private:
   Descriptor mFile;
-};
-
-// A file system that nobody answers for.
-class DeadMount {
- public:
-  explicit DeadMount(const std::string& place) : mDevice(open("/dev/fuse", O_RDWR | O_CLOEXEC)) {
-    const std::string options =
-        "fd=" + std::to_string(mDevice) + ",rootmode=40000,user_id=0,group_id=0";
-    mMount.emplace("dead", place, "fuse", 0, options);
-  }
-  DeadMount(const DeadMount&) = delete;
-  DeadMount& operator=(const DeadMount&) = delete;
-  ~DeadMount() {
-    mMount.reset();
-    if (mDevice >= 0) close(mDevice);
-  }
-  bool IsMounted() const { return mDevice >= 0 && mMount->IsMounted(); }
-
- private:
-  int mDevice;
-  std::optional<ScopedMount> mMount;
 };
 
 class AnIndex : public testing::Test {

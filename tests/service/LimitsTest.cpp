@@ -1,0 +1,229 @@
+// Every request has its right answer where the system gives little and permits little.
+#include <gtest/gtest.h>
+#include <sys/mount.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <fstream>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "service/RightAnswers.h"
+#include "support/DeadMount.h"
+#include "support/FileSystemImage.h"
+#include "support/MountNamespace.h"
+#include "support/TemporaryFolder.h"
+
+namespace tallowmere::test {
+namespace {
+
+using std::filesystem::path;
+
+const std::string kFewDescriptors = "ulimit -n 64";
+const std::string kLittleMemory = "ulimit -v 65536";  // KiB
+
+const std::vector<std::string> kAsNobody{"setpriv", "--reuid=65534", "--regid=65534",
+                                         "--clear-groups"};
+
+// A folder with an item in it that everyone may see.
+class Limits : public testing::Test {
+ protected:
+  Limits() {
+    std::filesystem::permissions(mFolder.Path(), std::filesystem::perms(0755));
+    mItem = MakeItem(mFolder.Path() / "folder");
+  }
+
+  static std::string MakeItem(const path& folder) {
+    std::filesystem::create_directories(folder);
+    std::ofstream(folder / "a track.aif").put('x');
+    return folder / "a track.aif";
+  }
+
+  TemporaryFolder mFolder;
+  std::string mItem;
+};
+
+// The same with a volume in memory, whose items are found by nothing but a pass over it.
+class LimitsOfAPass : public Limits {
+ protected:
+  void SetUp() override {
+    if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    mMount.emplace("tmpfs", mFolder.MakeFolder("Volume"), "tmpfs");
+    ASSERT_TRUE(mMount->IsMounted());
+    // The first items have numbers that two items could have: a folder that is closed to a user
+    // then leaves open which it is.
+    for (int i = 0; i < 20; ++i) std::filesystem::remove(MakeItem(Volume()));
+  }
+
+  path Volume() const { return mFolder.Path() / "Volume"; }
+
+  // The record of the item in the folder that is made last of very many: 1000 folders of 100.
+  std::string RecordOnALargeVolume() {
+    for (int i = 0; i < 100'000; ++i) {
+      const path folder = Volume() / std::to_string(i / 100);
+      if (i % 100 == 0) std::filesystem::create_directory(folder);
+      std::filesystem::create_directory(folder / std::to_string(i));
+    }
+    return RecordOf(Volume() / "999/99999/folder");
+  }
+
+  // Of a new item, asked of a service that another one does not hear of.
+  std::string RecordOf(const path& folder) {
+    mItem = MakeItem(folder);
+    Service service;
+    return service.Ask(RecordRequest(mItem), 75).substr(1, 70);
+  }
+
+  std::optional<ScopedMount> mMount;
+};
+
+// --- Descriptors --------------------------------------------------------------------------------
+
+TEST_F(Limits, SixtyFourDescriptorsAreEnoughForEveryRequest) {
+  Service service(After(kFewDescriptors));
+  for (int i = 0; i < 10; ++i) ExpectRightAnswers(service, mItem);
+}
+
+TEST_F(LimitsOfAPass, SixtyFourDescriptorsAreEnoughForADeepVolume) {
+  path folder = Volume();
+  for (int depth = 0; depth < 1500; ++depth) {
+    std::filesystem::create_directory(folder /= "d");
+  }
+  const std::string record = RecordOf(folder);
+  Service service(After(kFewDescriptors));
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
+}
+
+TEST_F(LimitsOfAPass, SixtyFourDescriptorsAreEnoughForAWideVolume) {
+  for (int i = 0; i < 3000; ++i) std::filesystem::create_directory(Volume() / std::to_string(i));
+  const std::string record = RecordOf(Volume() / "1500/folder");
+  Service service(After(kFewDescriptors));
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
+}
+
+// --- Memory -------------------------------------------------------------------------------------
+
+TEST_F(Limits, SixtyFourMegabytesAreEnoughForEveryRequest) {
+  if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
+  Service service(After(kLittleMemory));
+  ExpectRightAnswers(service, mItem);
+}
+
+TEST_F(LimitsOfAPass, SixtyFourMegabytesAreEnoughForAHundredThousandFolders) {
+  if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
+  const std::string record = RecordOnALargeVolume();
+  Service service(After(kLittleMemory + " && " + kFewDescriptors));
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
+}
+
+TEST_F(LimitsOfAPass, WithoutMemoryThePassIsAnErrorAndTheNextOneIsRight) {
+  if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
+  const std::string record = RecordOnALargeVolume();
+  Service service;
+  ASSERT_TRUE(service.Answers(kAnyRequest, kItsResponse));
+  std::size_t pages = 0;
+  std::ifstream("/proc/" + std::to_string(service.Process()) + "/statm") >> pages;
+  const rlim_t inUse = pages * static_cast<rlim_t>(sysconf(_SC_PAGESIZE));
+  const rlimit nothingMore{inUse, RLIM_INFINITY};
+  rlimit before{};
+  ASSERT_EQ(prlimit(service.Process(), RLIMIT_AS, &nothingMore, &before), 0);
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), kNoItemResponse));
+  ASSERT_EQ(prlimit(service.Process(), RLIMIT_AS, &before, nullptr), 0);
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
+}
+
+// --- Permissions --------------------------------------------------------------------------------
+
+TEST_F(Limits, NothingHasToBeWritable) {
+  const std::vector<std::string> command = After(
+      "for place in $(cut -d ' ' -f 5 /proc/self/mountinfo); do"
+      " mount -o remount,bind,ro \"$place\" 2>/dev/null; done; ! touch '" +
+          mFolder.Path().string() + "/new' 2>/dev/null",
+      {"unshare", "--mount", "--propagation", "private"});
+  if (!IsPermitted(command)) GTEST_SKIP() << "mounting is not permitted here";
+  Service service(command);
+  ExpectRightAnswers(service, mItem);
+}
+
+TEST_F(Limits, NoPrivilegeIsNeeded) {
+  if (!IsPermitted(kAsNobody)) GTEST_SKIP() << "one cannot become another user here";
+  Service service(kAsNobody);
+  ExpectRightAnswers(service, mItem);
+}
+
+TEST_F(LimitsOfAPass, NoPrivilegeIsNeededToFindAnItemByItsRecord) {
+  if (!IsPermitted(kAsNobody)) GTEST_SKIP() << "one cannot become another user here";
+  const std::string record = RecordOf(Volume() / "a/b/c");
+  Service service(kAsNobody);
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
+}
+
+// Its user may not look into the folder that holds the item's.
+class UnreadableFolder : public LimitsOfAPass {
+ protected:
+  void SetUp() override {
+    LimitsOfAPass::SetUp();
+    if (IsSkipped()) return;
+    if (!IsPermitted(kAsNobody)) GTEST_SKIP() << "one cannot become another user here";
+    mItem = MakeItem(Volume() / "closed/folder");
+    Service privileged;
+    mKnown = LearnItem(privileged, mItem);
+    Allow(0);
+  }
+  void Allow(mode_t mode) const { ASSERT_EQ(chmod((Volume() / "closed").c_str(), mode), 0); }
+
+  Item mKnown;
+};
+
+TEST_F(UnreadableFolder, IsAnErrorToWhomeverItIsClosedAndNoLongerOnceItIsOpen) {
+  constexpr int kRefused = -5000;
+  Service service(kAsNobody);
+  const std::string nearestVolume = mKnown.volumeName + ":";
+  std::string buffer = nearestVolume;
+  buffer.resize(kRoomForAFullPath);
+  const auto size = static_cast<unsigned>(nearestVolume.size());
+  EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 1), (U16(size) + buffer).append(kTrailer)));
+  EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 2), ResultResponse(kRefused)));
+  EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 5), NameResponse(0, "")));
+  EXPECT_TRUE(
+      service.Answers(RequestAbout(mKnown, 7), RecordResponse(0, Record(32767, -1, mKnown.name))));
+  EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 8), kNoPathResponse));
+  EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 9), kNoItemResponse));
+  // What takes no look at the item.
+  for (const unsigned code : {3u, 4u, 6u}) {
+    EXPECT_TRUE(service.Answers(RequestAbout(mKnown, code), AnswerAbout(mKnown, code))) << code;
+  }
+  Allow(0755);
+  ExpectRightAnswers(service, mItem);
+}
+
+TEST_F(UnreadableFolder, ThatMayBeSearchedIsNoHindranceToWhomHasThePath) {
+  Allow(0711);
+  Service service(kAsNobody);
+  ExpectRightAnswers(service, mItem);
+}
+
+TEST_F(UnreadableFolder, HidesWhatIsInItFromAPass) {
+  Allow(0711);
+  Service service(kAsNobody);
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(mKnown.record, 0, 0), kNoItemResponse));
+}
+
+// --- A volume that never answers ----------------------------------------------------------------
+
+TEST_F(LimitsOfAPass, AVolumeThatNeverAnswersKeepsNoRequestAboutAnotherWaiting) {
+  const DeadMount first(mFolder.MakeFolder("Dead"));
+  const DeadMount second(mFolder.MakeFolder("Volume/a/Dead"));
+  if (!second.IsMounted()) GTEST_SKIP() << "no FUSE mounts here";
+  const std::string record = RecordOf(Volume() / "a/b/c");
+  Service service;
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
+  ExpectRightAnswers(service, mItem);
+  EXPECT_LT(service.NumberOf("Dead"), 0);
+  EXPECT_EQ(service.NameOf(service.NumberOf("Dead")), "Dead");
+}
+
+}  // namespace
+}  // namespace tallowmere::test

@@ -1,0 +1,29 @@
+// A file system whose server never answers: whoever asks it for anything waits.
+#pragma once
+
+#include <optional>
+#include <string>
+
+#include "support/MountNamespace.h"
+
+namespace tallowmere::test {
+
+class DeadMount {
+ public:
+  explicit DeadMount(const std::string& place);
+  DeadMount(const DeadMount&) = delete;
+  DeadMount& operator=(const DeadMount&) = delete;
+  ~DeadMount();
+
+  // Not without FUSE and the right to mount.
+  bool IsMounted() const { return mServer >= 0 && mMount->IsMounted(); }
+
+  // The server ends: whoever waits gets an error.
+  void End();
+
+ private:
+  int mServer;
+  std::optional<ScopedMount> mMount;
+};
+
+}  // namespace tallowmere::test
