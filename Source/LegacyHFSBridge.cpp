@@ -140,6 +140,27 @@ class FolderPart {
   std::size_t mStart = kLongestFolderPart;
 };
 
+// A folder as the catalog knows it, of one moment: something can be mounted there between two
+// questions, and the id would then be looked up on the wrong volume.
+struct FolderNumbers {
+  SInt16 volume;
+  SInt32 id;
+};
+
+// Of the item if it is a folder, else of the folder that holds it, kNoFolder when that is none.
+FolderNumbers NumbersOfFolder(CFileRef const& ref) {
+  CFileRef folder(ref);
+  if (!folder.IsFolder()) folder.SetToParent();
+  FSCatalogInfo about = {};
+  if (folder.IsFolder()) {
+    FSRef const& item = folder;
+    const OSErr result = FSGetCatalogInfo(&item, kFSCatInfoVolume | kFSCatInfoNodeID, &about,
+                                          nullptr, nullptr, nullptr);
+    if (result == noErr) return {about.volume, static_cast<SInt32>(about.nodeID)};
+  }
+  return {ref.GetVolumeRefNumber(), kNoFolder};
+}
+
 // The folders from the one with this id up to the volume's root, which is not among them.
 FolderPart FoldersAbove(SInt16 volume, SInt32 folder) {
   FolderPart folders;
@@ -262,8 +283,7 @@ bool CFileUtilAddHFSName(CFileRef* ref, char const* name, bool flag) {
   Str255 pascalName;
   c2pstrcpy(pascalName, name);
   FSSpec spec = {};
-  const SInt16 volume = ref->GetVolumeRefNumber();
-  const auto folder = static_cast<SInt32>(ref->GetNodeID());
+  const auto [volume, folder] = NumbersOfFolder(*ref);
   if (FSMakeFSSpec(volume, folder, pascalName, &spec) == noErr) {
     *ref = CFileRef(spec, false, false);
     return ref->IsValid();
@@ -290,8 +310,7 @@ OSErr CFileUtilMakeFileRefFromPath(CFileRef* ref, char const* hfsFolderPath, cha
 
 unsigned short CFileUtilMakeFullPath(CFileRef const& ref, char* path, unsigned short maxLength,
                                      unsigned char keepFolders) {
-  const auto folder = static_cast<SInt32>(ref.GetDirectoryID());
-  const SInt16 volume = ref.GetVolumeRefNumber();
+  const auto [volume, folder] = NumbersOfFolder(ref);
   FolderPart folders;
   if (folder != kNoFolder) folders = FoldersAbove(volume, folder);
 

@@ -68,15 +68,15 @@ TEST_P(OfARequest, AreNoMoreThanThese) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Allocations, OfARequest,
-                         testing::ValuesIn(std::to_array<Allocations>({{1, 95},
-                                                                       {2, 55},
+                         testing::ValuesIn(std::to_array<Allocations>({{1, 110},
+                                                                       {2, 60},
                                                                        {3, 0},
                                                                        {4, 0},
-                                                                       {5, 38},
-                                                                       {6, 65},
-                                                                       {7, 25},
-                                                                       {8, 29},
-                                                                       {9, 25},
+                                                                       {5, 39},
+                                                                       {6, 82},
+                                                                       {7, 26},
+                                                                       {8, 35},
+                                                                       {9, 28},
                                                                        {10, 25}})),
                          [](const auto& row) { return "Code" + std::to_string(row.param.code); });
 

@@ -46,15 +46,15 @@ TEST_P(SystemCalls, AreNoMoreThanThese) {
 }
 
 INSTANTIATE_TEST_SUITE_P(OfEachCode, SystemCalls,
-                         testing::ValuesIn(std::to_array<Calls>({{1, 5, 3, 28},
-                                                                 {2, 6, 4, 11},
+                         testing::ValuesIn(std::to_array<Calls>({{1, 5, 3, 33},
+                                                                 {2, 6, 4, 15},
                                                                  {3, 3, 2, 1},
                                                                  {4, 2, 4, 1},
-                                                                 {5, 4, 4, 7},
-                                                                 {6, 6, 4, 22},
-                                                                 {7, 3, 3, 6},
-                                                                 {8, 6, 4, 11},
-                                                                 {9, 4, 4, 8},
+                                                                 {5, 4, 4, 9},
+                                                                 {6, 6, 4, 23},
+                                                                 {7, 3, 3, 8},
+                                                                 {8, 6, 4, 15},
+                                                                 {9, 4, 4, 10},
                                                                  {10, 5, 4, 0}})),
                          [](const auto& calls) {
                            return "Code" + std::to_string(calls.param.code);

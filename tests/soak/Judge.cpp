@@ -40,6 +40,12 @@ bool Has(const State& state, const Entry& entry) {
   return std::find(state.begin(), state.end(), entry) != state.end();
 }
 
+// The volume of a folder was unmounted before its name was asked for.
+bool IsFullPathWithoutVolume(const Request& request, const std::string& response) {
+  constexpr std::size_t kTextStart = sizeof(std::uint16_t);
+  return request.code == 1 && response.size() > kTextStart && response[kTextStart] == ':';
+}
+
 }  // namespace
 
 const Graph& Judge::GraphOf(History::Version version) {
@@ -70,6 +76,7 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
   const Truth inSteps = Answers(Graph(states), mPlace, request);
   if (inSteps.responses.contains(response)) return Verdict::kMoved;
   if (IsRecordByMadeUpID(request, response)) return Verdict::kNowhere;
+  if (IsFullPathWithoutVolume(request, response)) return Verdict::kNowhere;
   return inSteps.nowhere.contains(response) ? Verdict::kNowhere : Verdict::kWrong;
 }
 
