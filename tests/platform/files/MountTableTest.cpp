@@ -1,3 +1,4 @@
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/wait.h>
@@ -153,6 +154,35 @@ TEST(MountTable, ATableThatCannotBeReadIsAsGoodAsNone) {
   MountTable table(folder.Path().string());  // a folder opens, but has no text
   EXPECT_EQ(table.AtIndex(0)->MountPoint(), "/");
   EXPECT_EQ(table.AtIndex(1), nullptr);
+}
+
+TEST(MountTable, AnItemWhoseMountIsNotToldIsOnTheVolumeOfItsDevice) {
+  MountTable table;
+  auto root = ReadItem(AT_FDCWD, "/");
+  ASSERT_TRUE(root);
+  root->mount = kNoMount;
+  EXPECT_EQ(table.OfItem(*root, "/nonexistent"), table.WithNumber(0));
+}
+
+TEST(MountTable, AnItemWithNeitherMountNorDeviceOfTheTableIsOnTheVolumeThatItsPathIsWithin) {
+  RecordedTable table(Line(27, "/") + Line(31, "/mnt/a") +
+                      "32 31 0:32 / /mnt/a/b rw - tmpfs none rw\n");
+  ItemReference item{};
+  item.mount = kNoMount;
+  EXPECT_EQ(table->OfItem(item, "/mnt/a/b/file"), table->AtIndex(2));
+  EXPECT_EQ(table->OfItem(item, "/mnt/a/bc"), table->AtIndex(1));
+  EXPECT_EQ(table->OfItem(item, "/mnt"), table->AtIndex(0));
+}
+
+TEST(MountTable, AMountForWhichNoNumberIsLeftIsNoVolume) {
+  constexpr int kNumbers = 32768;
+  std::string text = Line(27, "/");
+  for (int id = 1; id <= kNumbers; ++id) {
+    if (id != 27) text += Line(id, "/mnt/" + std::to_string(id));
+  }
+  RecordedTable table(text + Line(kNumbers + 1, "/mnt/late"));
+  EXPECT_EQ(table->OfPath("/mnt/32768")->Number(), -32768);
+  EXPECT_EQ(table->OfPath("/mnt/late"), table->WithNumber(0));
 }
 
 TEST(MountTable, AWalkSeesOneStateWhileVolumesComeAndGo) {
