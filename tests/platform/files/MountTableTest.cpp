@@ -134,6 +134,27 @@ TEST(MountTable, WhereTheKernelTellsNoMountIDsTheLowestMountAtTheRootIsTheRoot) 
   EXPECT_EQ(table.AtIndex(2), nullptr);
 }
 
+TEST(MountTable, WhereTheKernelTellsNoMountIDsAMountCanBeItsOwnParent) {
+  const TemporaryFolder folder;
+  const std::string text = Line(41, "/mnt") + "27 27 0:27 / / rw - rootfs none rw\n";
+  MountTable table(folder.MakeFile("mountinfo", text).string(),
+                   [] { return Mount{0, 0, 27, "", "/", ""}; });
+  EXPECT_EQ(table.AtIndex(0)->Number(), -27);
+}
+
+TEST(MountTable, WhereTheKernelTellsNoMountIDsAndTheTableHasNoRootThereIsOneStill) {
+  const TemporaryFolder folder;
+  MountTable table(folder.MakeFile("mountinfo", Line(41, "/mnt")).string(),
+                   [] { return Mount{0, 0, 27, "", "/", ""}; });
+  EXPECT_EQ(table.AtIndex(0)->MountPoint(), "/");
+  EXPECT_EQ(table.AtIndex(1)->MountPoint(), "/mnt");
+}
+
+TEST(MountTable, AnInnerFolderMountedWhereNothingCanBeSeenIsNoVolume) {
+  RecordedTable table(Line(27, "/") + "31 27 0:31 /inner /nonexistent/place rw - tmpfs none rw\n");
+  EXPECT_EQ(table->AtIndex(1), nullptr);
+}
+
 TEST(MountTable, WithoutATableThereIsTheVolumeThatTheRootIsOn) {
   MountTable table("/nonexistent/mountinfo", [] { return Mount{27, 0, 27, "", "/", ""}; });
   ASSERT_NE(table.AtIndex(0), nullptr);

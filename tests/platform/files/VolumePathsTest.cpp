@@ -23,6 +23,7 @@ TEST(VolumePaths, APathIsOnTheVolumeWhoseMountPointItBeginsWith) {
   EXPECT_EQ(volume->name, u"caf\u00E9 of tallowmere");
   EXPECT_EQ(volume->mountPointLength, place.size());
   EXPECT_EQ(MountPointOfVolume(volume->name), place);
+  EXPECT_EQ(MountPointOfVolume(u"cafe\u0301 of tallowmere"), std::nullopt);
 }
 
 TEST(VolumePaths, OfTwoVolumesWithOneNameOnlyTheFirstIsCalledSo) {
