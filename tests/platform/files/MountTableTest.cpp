@@ -117,6 +117,23 @@ TEST(MountTable, TheRootVolumeIsCalledAsItsFileSystemIsLabelled) {
   EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
 }
 
+// The same with memory for a root.
+TEST(MountTable, TheRootVolumeOfAFileSystemWithoutLabelsIsCalledRoot) {
+  if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  const test::ScopedMount root("none", folder.Path().string(), "tmpfs");
+  ASSERT_TRUE(root.IsMounted());
+  const pid_t child = fork();
+  if (child == 0) {
+    if (chroot(folder.Path().c_str()) != 0 || chdir("/") != 0) _exit(2);
+    MountTable table;
+    _exit(table.AtIndex(0)->Name() == "Root" ? 0 : 1);
+  }
+  int status = 0;
+  ASSERT_EQ(waitpid(child, &status, 0), child);
+  EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
+}
+
 TEST(MountTable, ARootThatIsNoMountPointIsStillTheFirstVolume) {
   RecordedTable table(Line(31, "/mnt/a"));
   EXPECT_EQ(table->AtIndex(0)->MountPoint(), "/");
