@@ -147,18 +147,22 @@ struct FolderNumbers {
   SInt32 id;
 };
 
-// Of the item if it is a folder, else of the folder that holds it, kNoFolder when that is none.
-FolderNumbers NumbersOfFolder(CFileRef const& ref) {
-  CFileRef folder(ref);
-  if (!folder.IsFolder()) folder.SetToParent();
+// The id is kNoFolder for what is not there.
+FolderNumbers NumbersOf(CFileRef const& folder) {
+  FSRef const& item = folder;
   FSCatalogInfo about = {};
-  if (folder.IsFolder()) {
-    FSRef const& item = folder;
-    const OSErr result = FSGetCatalogInfo(&item, kFSCatInfoVolume | kFSCatInfoNodeID, &about,
-                                          nullptr, nullptr, nullptr);
-    if (result == noErr) return {about.volume, static_cast<SInt32>(about.nodeID)};
-  }
-  return {ref.GetVolumeRefNumber(), kNoFolder};
+  const OSErr result = FSGetCatalogInfo(&item, kFSCatInfoVolume | kFSCatInfoNodeID, &about, nullptr,
+                                        nullptr, nullptr);
+  if (result == noErr) return {about.volume, static_cast<SInt32>(about.nodeID)};
+  return {folder.GetVolumeRefNumber(), kNoFolder};
+}
+
+// Of the item if it is a folder, else of the folder that holds it.
+FolderNumbers NumbersOfFolderOf(CFileRef const& ref) {
+  if (ref.IsFolder()) return NumbersOf(ref);
+  CFileRef folder(ref);
+  folder.SetToParent();
+  return folder.IsFolder() ? NumbersOf(folder) : FolderNumbers{ref.GetVolumeRefNumber(), kNoFolder};
 }
 
 // The folders from the one with this id up to the volume's root, which is not among them.
@@ -283,7 +287,7 @@ bool CFileUtilAddHFSName(CFileRef* ref, char const* name, bool flag) {
   Str255 pascalName;
   c2pstrcpy(pascalName, name);
   FSSpec spec = {};
-  const auto [volume, folder] = NumbersOfFolder(*ref);
+  const auto [volume, folder] = NumbersOf(*ref);
   if (FSMakeFSSpec(volume, folder, pascalName, &spec) == noErr) {
     *ref = CFileRef(spec, false, false);
     return ref->IsValid();
@@ -310,7 +314,7 @@ OSErr CFileUtilMakeFileRefFromPath(CFileRef* ref, char const* hfsFolderPath, cha
 
 unsigned short CFileUtilMakeFullPath(CFileRef const& ref, char* path, unsigned short maxLength,
                                      unsigned char keepFolders) {
-  const auto [volume, folder] = NumbersOfFolder(ref);
+  const auto [volume, folder] = NumbersOfFolderOf(ref);
   FolderPart folders;
   if (folder != kNoFolder) folders = FoldersAbove(volume, folder);
 

@@ -35,6 +35,7 @@ to_test+=(dpkg-dev file mandoc zsh fish)
 to_measure=(libbenchmark-dev openssh-sftp-server bfs e2fsprogs)
 to_check=(clang-format clang-tidy)
 to_fuzz=(clang libclang-rt-dev)
+to_cover=(clang libclang-rt-dev llvm)
 
 # unpack_kernel FOLDER: puts Debian's kernel there, without installing it. Without one the test that
 # starts it is skipped.

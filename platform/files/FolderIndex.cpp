@@ -84,7 +84,6 @@ class FolderIndex::Search {
         mUntrueEntries(HasUntrueEntries(volume.Type())),
         mCertain(item.reference != nullptr || IsInodeNumber(item.id)) {}
 
-  const ItemReference& Root() const { return mRoot; }
   std::uint32_t ID() const { return mItem.id; }
   bool WantsFolder() const { return mItem.folder; }
 

@@ -129,10 +129,10 @@ class Ways {
     return IsOnTheWay(index) && !mByPlace.contains({mMounts[index].id, mMounts[index].mountPoint});
   }
 
-  // Whether a server has to answer on the way to the mount or at its end.
+  // Whether a server has to answer on the way to the mount or at its end. REQUIRES: the mount is
+  // reachable; the way to one that is not need not have an end.
   bool NeedsServer(std::size_t index) const {
-    for (std::size_t steps = 0; steps <= mMounts.size(); ++steps) {
-      if (NeedsAServer(mMounts[index].type)) return true;
+    while (!NeedsAServer(mMounts[index].type)) {
       const auto parent = mByID.find(mMounts[index].parent);
       if (IsRoot(index) || parent == mByID.end()) return false;
       index = parent->second;

@@ -110,6 +110,13 @@ TEST_F(AllocationFailure, InSettersLeavesTheReferenceEmpty) {
   EXPECT_EQ(CFGetRetainCount(path.Get()), 1);
 }
 
+TEST_F(AllocationFailure, InSettingFromAnHFSPathLeavesTheReferenceEmpty) {
+  const auto set = [](CFileRef& r) {
+    return r.SetFromHFSPath("Data:a folder with a long name:a file with a long name", false);
+  };
+  EXPECT_GT(FailEachSetting(set, "/mnt/data/a folder with a long name/a file with a long name"), 3);
+}
+
 TEST_F(AllocationFailure, InCopyingNeverHappens) {
   const CFileRef source(kPath, false);
   EXPECT_EQ(FailEach([&](CFileRef& r) { return (r = source).IsValid(); }, kPath), 0);

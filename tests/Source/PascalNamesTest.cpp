@@ -55,6 +55,16 @@ TEST(PascalNames, TheEmptyNameHasLengthZero) {
   EXPECT_EQ(Convert(u"", 1), (Converted{true, ""}));
 }
 
+TEST(PascalNames, ABufferWithoutRoomForALengthStaysAsItIs) {
+  const auto name = MakeString(u"name");
+  for (const SInt32 size : {0, -1}) {
+    unsigned char buffer[] = {7, 'f'};
+    EXPECT_FALSE(GetPascalStringFromCFString(name.Get(), buffer, size));
+    EXPECT_EQ(buffer[0], 7);
+    EXPECT_EQ(buffer[1], 'f');
+  }
+}
+
 TEST(PascalNames, WhatNoEncodingHasBecomesAQuestionMarkAndNothingIsExchanged) {
   EXPECT_EQ(Convert(u"a/b:\u65E5c"), (Converted{false, "a/b:?c"}));
 }

@@ -58,6 +58,10 @@ TEST(MountInfo, EscapesAreUndone) {
 TEST(MountInfo, ABackslashThatBeginsNoEscapeStaysAsItIs) {
   EXPECT_EQ(ParseMountInfo("2 1 0:5 / /a\\04 rw - tmpfs none rw\n").at(0).mountPoint, "/a\\04");
   EXPECT_EQ(ParseMountInfo("2 1 0:5 / /a\\89z rw - tmpfs none rw\n").at(0).mountPoint, "/a\\89z");
+  for (const std::string place : {"/a\\/040", "/a\\0/40", "/a\\04/0", "/a\\080", "/a\\048"}) {
+    const auto mounts = ParseMountInfo("2 1 0:5 / " + place + " rw - tmpfs none rw\n");
+    EXPECT_EQ(mounts.at(0).mountPoint, place);
+  }
 }
 
 TEST(MountInfo, MalformedLinesArePassedOverAndTheRestIsKept) {

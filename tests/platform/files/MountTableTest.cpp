@@ -1,3 +1,4 @@
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/wait.h>
@@ -116,6 +117,23 @@ TEST(MountTable, TheRootVolumeIsCalledAsItsFileSystemIsLabelled) {
   EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
 }
 
+// The same with memory for a root.
+TEST(MountTable, TheRootVolumeOfAFileSystemWithoutLabelsIsCalledRoot) {
+  if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  const test::ScopedMount root("none", folder.Path().string(), "tmpfs");
+  ASSERT_TRUE(root.IsMounted());
+  const pid_t child = fork();
+  if (child == 0) {
+    if (chroot(folder.Path().c_str()) != 0 || chdir("/") != 0) _exit(2);
+    MountTable table;
+    _exit(table.AtIndex(0)->Name() == "Root" ? 0 : 1);
+  }
+  int status = 0;
+  ASSERT_EQ(waitpid(child, &status, 0), child);
+  EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
+}
+
 TEST(MountTable, ARootThatIsNoMountPointIsStillTheFirstVolume) {
   RecordedTable table(Line(31, "/mnt/a"));
   EXPECT_EQ(table->AtIndex(0)->MountPoint(), "/");
@@ -131,6 +149,27 @@ TEST(MountTable, WhereTheKernelTellsNoMountIDsTheLowestMountAtTheRootIsTheRoot) 
   EXPECT_EQ(table.AtIndex(0)->Number(), -27);
   EXPECT_EQ(table.AtIndex(1)->Number(), -41);
   EXPECT_EQ(table.AtIndex(2), nullptr);
+}
+
+TEST(MountTable, WhereTheKernelTellsNoMountIDsAMountCanBeItsOwnParent) {
+  const TemporaryFolder folder;
+  const std::string text = Line(41, "/mnt") + "27 27 0:27 / / rw - rootfs none rw\n";
+  MountTable table(folder.MakeFile("mountinfo", text).string(),
+                   [] { return Mount{0, 0, 27, "", "/", ""}; });
+  EXPECT_EQ(table.AtIndex(0)->Number(), -27);
+}
+
+TEST(MountTable, WhereTheKernelTellsNoMountIDsAndTheTableHasNoRootThereIsOneStill) {
+  const TemporaryFolder folder;
+  MountTable table(folder.MakeFile("mountinfo", Line(41, "/mnt")).string(),
+                   [] { return Mount{0, 0, 27, "", "/", ""}; });
+  EXPECT_EQ(table.AtIndex(0)->MountPoint(), "/");
+  EXPECT_EQ(table.AtIndex(1)->MountPoint(), "/mnt");
+}
+
+TEST(MountTable, AnInnerFolderMountedWhereNothingCanBeSeenIsNoVolume) {
+  RecordedTable table(Line(27, "/") + "31 27 0:31 /inner /nonexistent/place rw - tmpfs none rw\n");
+  EXPECT_EQ(table->AtIndex(1), nullptr);
 }
 
 TEST(MountTable, WithoutATableThereIsTheVolumeThatTheRootIsOn) {
@@ -153,6 +192,35 @@ TEST(MountTable, ATableThatCannotBeReadIsAsGoodAsNone) {
   MountTable table(folder.Path().string());  // a folder opens, but has no text
   EXPECT_EQ(table.AtIndex(0)->MountPoint(), "/");
   EXPECT_EQ(table.AtIndex(1), nullptr);
+}
+
+TEST(MountTable, AnItemWhoseMountIsNotToldIsOnTheVolumeOfItsDevice) {
+  MountTable table;
+  auto root = ReadItem(AT_FDCWD, "/");
+  ASSERT_TRUE(root);
+  root->mount = kNoMount;
+  EXPECT_EQ(table.OfItem(*root, "/nonexistent"), table.WithNumber(0));
+}
+
+TEST(MountTable, AnItemWithNeitherMountNorDeviceOfTheTableIsOnTheVolumeThatItsPathIsWithin) {
+  RecordedTable table(Line(27, "/") + Line(31, "/mnt/a") +
+                      "32 31 0:32 / /mnt/a/b rw - tmpfs none rw\n");
+  ItemReference item{};
+  item.mount = kNoMount;
+  EXPECT_EQ(table->OfItem(item, "/mnt/a/b/file"), table->AtIndex(2));
+  EXPECT_EQ(table->OfItem(item, "/mnt/a/bc"), table->AtIndex(1));
+  EXPECT_EQ(table->OfItem(item, "/mnt"), table->AtIndex(0));
+}
+
+TEST(MountTable, AMountForWhichNoNumberIsLeftIsNoVolume) {
+  constexpr int kNumbers = 32768;
+  std::string text = Line(27, "/");
+  for (int id = 1; id <= kNumbers; ++id) {
+    if (id != 27) text += Line(id, "/mnt/" + std::to_string(id));
+  }
+  RecordedTable table(text + Line(kNumbers + 1, "/mnt/late"));
+  EXPECT_EQ(table->OfPath("/mnt/32768")->Number(), -32768);
+  EXPECT_EQ(table->OfPath("/mnt/late"), table->WithNumber(0));
 }
 
 TEST(MountTable, AWalkSeesOneStateWhileVolumesComeAndGo) {

@@ -61,5 +61,11 @@ TEST(FileNameText, UnpairedSurrogatesThatStandForNoByteHaveNoName) {
   EXPECT_EQ(FileNameOfText(u"\xDD00"), std::nullopt);
 }
 
+TEST(FileNameText, OnlyALowSurrogateCompletesAHighOne) {
+  EXPECT_EQ(FileNameOfText(u"\xD800\xE000"), std::nullopt);
+  EXPECT_EQ(FileNameOfText(u"\xD800\xD800"), std::nullopt);
+  EXPECT_EQ(FileNameOfText(u"\xD800\xDFFF"), "\xF0\x90\x8F\xBF");
+}
+
 }  // namespace
 }  // namespace tallowmere::foundation

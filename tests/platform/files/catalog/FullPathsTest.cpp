@@ -187,6 +187,18 @@ TEST_F(HFSPathsToRecords, LinksToFoldersOnTheWayAreFollowed) {
   EXPECT_EQ(From(":up::a"), From(Full(mTop).substr(0, Full(mTop).rfind(':')) + ":a"));
 }
 
+TEST_F(HFSPathsToRecords, ALinkOnTheWayThatLeadsNowhereIsAMissingFolder) {
+  mFolder.MakeLink("a/b/link", "nowhere");
+  EXPECT_EQ(From(":link:x"), "(-120)");
+  EXPECT_TRUE(IsUntouched());
+}
+
+TEST_F(HFSPathsToRecords, AKnownFileOnTheWayOfAFullPathIsAMissingFolder) {
+  EXPECT_EQ(From(0, 0, Full(mTop + "/a/b/file")), "a/b/file");  // from now on its place is known
+  EXPECT_EQ(From(0, 0, Full(mTop + "/a/b/file/x")), "(-120)");
+  EXPECT_TRUE(IsUntouched());
+}
+
 TEST_F(HFSPathsToRecords, AFullPathLeadsToTheFoldersThatAreThereNow) {
   const std::string path = Full(mTop + "/a/b/file");
   EXPECT_EQ(From(path), "a/b/file");

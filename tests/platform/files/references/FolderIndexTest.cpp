@@ -72,6 +72,14 @@ TEST_F(AFolderIndex, FindsEveryKindOfItem) {
   for (const char* name : {"a/link", "a/pipe", "a/\xFF\n: name"}) ExpectFoundFrom("", name);
 }
 
+TEST_F(AFolderIndex, FindsWhatIsInFoldersWhoseNamesBeginWithDots) {
+  for (const std::string folder : {".a", "..a", "..."}) {
+    mFolder.MakeFolder(folder);
+    mFolder.MakeFile(folder + "/x");
+    ExpectFoundFrom("", folder + "/x");
+  }
+}
+
 TEST_F(AFolderIndex, FollowsNoLinkToAFolder) {
   mFolder.MakeFolder("a");
   mFolder.MakeFolder("b");
