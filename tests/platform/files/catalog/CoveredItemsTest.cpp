@@ -109,6 +109,20 @@ TEST_F(CoveredItems, AreFoundAgainWhenTheCoverIsGone) {
   EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
 }
 
+TEST_F(CoveredItems, AreNotWhatAFullPathLeadsToWhereverTheyWereSeen) {
+  mFolder.MakeFolder("volume/second");
+  Cover("volume/second", PathTo("volume/folder"));
+  Cover("volume/folder/below");
+  const FSSpec covered = SpecOf(PathTo("volume/second/below/x"));
+  FSSpec spec{};
+  const Str255Of path("volume:second:below:x");
+  EXPECT_EQ(FSMakeFSSpec(0, 0, path.bytes, &spec), fnfErr);
+  EXPECT_NE(spec.vRefNum, covered.vRefNum);
+  mFolder.MakeFile("volume/folder/below/x", "covering");
+  EXPECT_EQ(FSMakeFSSpec(0, 0, path.bytes, &spec), noErr);
+  EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
+}
+
 // A process that was in a folder before it was covered still shows it.
 class CoveredItemsInTheCurrentFolder : public CoveredItems {
  protected:
@@ -146,6 +160,15 @@ TEST_F(CoveredItemsInTheCurrentFolder, HaveTheirRecordWhereAnotherMountShowsThei
   FSSpec spec{};
   ASSERT_EQ(MakeSpec("/proc/self/cwd/x", spec), noErr);
   EXPECT_EQ(ItemOf(spec), PathTo("again/folder/below/x"));
+}
+
+// The folder is at its path again, under a mount that does not show what was mounted in it.
+TEST_F(CoveredItemsInTheCurrentFolder, HaveNoRecordWhereTheirVolumeIsMountedOverItself) {
+  Cover("volume/folder/below/x", PathTo("other"));
+  Cover("volume", PathTo("volume"));
+  FSSpec spec{};
+  EXPECT_EQ(MakeSpec("/proc/self/cwd/x", spec), fnfErr);
+  ExpectRoundTrip(PathTo("volume/folder/below/x"));
 }
 
 // --- A link on the way --------------------------------------------------------------------------
