@@ -1,8 +1,5 @@
 // From id to place: what was remembered is verified, and nothing but the item itself is an answer.
-#include <sched.h>
 #include <sys/mount.h>
-
-#include <fstream>
 
 #include "CatalogFixture.h"
 #include "support/FileSystemImage.h"
@@ -94,51 +91,6 @@ TEST_F(TheCatalog, SearchesANewVolumeThatHasTheNumberOfAFormerOne) {
   other.Unmount();
   if (Volume()->Number() != number) GTEST_SKIP() << "another mount has the number";
   EXPECT_EQ(searchFor(path), path);
-}
-
-// --- Rights in a user namespace alone -----------------------------------------------------------
-
-bool EnterOwnUserNamespace() {
-  const std::string user = "0 " + std::to_string(geteuid()) + " 1";
-  const std::string group = "0 " + std::to_string(getegid()) + " 1";
-  if (unshare(CLONE_NEWUSER | CLONE_NEWNS) != 0) return false;
-  std::ofstream("/proc/self/setgroups") << "deny";
-  return (std::ofstream("/proc/self/uid_map") << user).flush() &&
-         (std::ofstream("/proc/self/gid_map") << group).flush();
-}
-
-// Whether an item that has moved is found on a volume of which the first of two mounts shows
-// another folder. In a new process: the list of mounts is of one namespace.
-bool IsFoundOnTheSecondMount() {
-  const TemporaryFolder folder;
-  chmod(folder.Path().c_str(), 0755);
-  const auto pathTo = [&](const char* name) { return std::string(folder.Path() / name); };
-  ScopedMount volume("tmpfs", folder.MakeFolder("volume"), "tmpfs");
-  folder.MakeFolder("volume/first");
-  folder.MakeFolder("volume/second");
-  folder.MakeFile("volume/second/x");
-  const ScopedMount first(pathTo("volume/first"), folder.MakeFolder("first"), "", MS_BIND);
-  const ScopedMount second(pathTo("volume/second"), folder.MakeFolder("second"), "", MS_BIND);
-  volume.Unmount();
-  const pid_t child = fork();
-  if (child == 0) {
-    if (!EnterOwnUserNamespace()) _exit(1);
-    const FSRef reference = ReferenceTo(pathTo("second/x"));
-    std::filesystem::rename(pathTo("second/x"), pathTo("second/moved"));
-    _exit(PathOf(reference) == pathTo("second/moved") ? 0 : 1);
-  }
-  int status = 0;
-  return waitpid(child, &status, 0) == child && status == 0;
-}
-
-TEST(AVolumeInAUserNamespaceDeathTest, IsSearchedForWhatItsFirstMountDoesNotShow) {
-  const pid_t child = fork();
-  if (child == 0) _exit(EnterOwnUserNamespace() ? 0 : 1);
-  int status = 0;
-  ASSERT_EQ(waitpid(child, &status, 0), child);
-  if (status != 0) GTEST_SKIP() << "user namespaces are not permitted here";
-  GTEST_FLAG_SET(death_test_style, "threadsafe");
-  EXPECT_EXIT(_exit(IsFoundOnTheSecondMount() ? 0 : 1), testing::ExitedWithCode(0), "");
 }
 
 // A file system that gives the number of a deleted item to the next one.

@@ -241,14 +241,14 @@ TEST_F(CoveredItemsOnAWayThatIsALinkNow, ComeBackWhereAnotherMountShowsThem) {
   EXPECT_EQ(ItemOf(spec), PathTo("again/moved/folder/x"));
 }
 
-// --- A kernel without openat2 -------------------------------------------------------------------
+// --- Kernels that answer otherwise --------------------------------------------------------------
 
-// Makes openat2 what it is to an older kernel, for the rest of the process.
-bool TakeOpenat2Away() {
+// Lets a system call fail so for the rest of the process.
+bool LetFail(std::uint32_t call, std::uint32_t error) {
   sock_filter steps[] = {
       BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
-      BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_openat2, 0, 1),
-      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | ENOSYS),
+      BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, call, 0, 1),
+      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | error),
       BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
   };
   const sock_fprog filter{static_cast<unsigned short>(std::size(steps)), steps};
@@ -267,12 +267,27 @@ TEST_F(ItemsInAClosedFolder, AreFoundNearTheLastOneWithoutOpenat2) {
   chmod(PathTo("volume/closed").c_str(), 0711);
   const auto wanted = ReadItem(AT_FDCWD, PathTo("volume/closed/open/y").c_str());
   EXPECT_TRUE(HoldsForNobody([&] {
-    if (!TakeOpenat2Away()) return false;
+    if (!LetFail(SYS_openat2, ENOSYS)) return false;
     const FSSpec last = SpecOf(PathTo("volume/closed/open/x"));
     FSRef found{};
     const auto id = static_cast<std::uint32_t>(wanted->inode);
     return FSResolveNodeID(last.vRefNum, id, &found) == noErr &&
            PathOf(found) == PathTo("volume/closed/open/y");
+  }));
+}
+
+// Who has the right to open by handle in a user namespace alone is told that what is not below the
+// mount that was asked is gone.
+class ItemsOnTwoMounts : public CoveredItems {};
+
+TEST_F(ItemsOnTwoMounts, AreSearchedThoughOneMountSaysThatTheyAreGone) {
+  ShowAt("again");
+  const FSRef reference = ReferenceTo(PathTo("again/folder/below/x"));
+  ASSERT_TRUE(HasHandle(*Unpack(&reference)));
+  std::filesystem::rename(PathTo("volume/folder/below/x"), PathTo("volume/folder/moved"));
+  EXPECT_TRUE(HoldsForNobody([&] {
+    return LetFail(SYS_open_by_handle_at, ESTALE) &&
+           PathOf(reference) == PathTo("volume/folder/moved");
   }));
 }
 
