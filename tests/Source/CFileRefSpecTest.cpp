@@ -83,6 +83,15 @@ TEST_F(SpecOfReference, AMissingFileInAMissingFolderHasItsNameAlone) {
   EXPECT_TRUE(IsZero(CachedFSRefOf(missing)));
 }
 
+TEST_F(SpecOfReference, WhatIsThereButNotByAFileURLHasNone) {
+  for (const std::string& path : {mData->MakeFile("file"), mData->MakeFolder("folder")}) {
+    CFileRef item;
+    ASSERT_TRUE(item.SetFromURLString("http://elsewhere" + path));
+    FSSpec spec = Untouched();
+    EXPECT_FALSE(item.GetFSSpec(&spec)) << path;
+  }
+}
+
 TEST_F(SpecOfReference, ARootIsItsVolumesNameInFolder1) {
   FSSpec spec = Untouched();
   EXPECT_TRUE(mData->Ref().GetFSSpec(&spec));

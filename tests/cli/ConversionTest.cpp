@@ -80,6 +80,28 @@ TEST_F(Conversion, ARecordIsVolumeParentAndHFSName) {
   }
 }
 
+TEST_F(Conversion, AColumnOfATableIsAsWideAsItsLongestTextHasCharacters) {
+  const std::string name = "caf\xC3\xA9 \xC3\xA0 la cr\xC3\xA8me";
+  const std::string file = mFolder.MakeFile(name);
+  const std::string hfsPath = Lines(Cli({"hfs", file}).text).at(0);
+  EXPECT_THAT(Cli({"identify", file, mFile}).text, HasSubstr(" " + name + "  " + hfsPath));
+}
+
+TEST_F(Conversion, AnItemMayEndWhereAPieceOfTheInputDoes) {
+  constexpr std::size_t kPiece = 65536;
+  std::string input;
+  std::string names;
+  while (input.size() + 2 * mFile.size() < kPiece) {
+    input += mFile + "\n";
+    names += "a/b\n";
+  }
+  input += mHere + std::string(kPiece - input.size() - mHere.size() - 3, '/') + "a:b";
+  ASSERT_EQ(input.size(), kPiece);
+  const std::string file = mFolder.MakeFile("items", input + "\n" + mFile + "\n");
+  ChildProgram shell("/bin/sh", {"-c", "exec \"$0\" name - <\"$1\"", TALLOWMERE_CLI, file});
+  EXPECT_EQ(shell.ReadToEnd(), names + "a/b\na/b\n");
+}
+
 TEST_F(Conversion, AnHFSPathAndItsPathLeadToEachOther) {
   const Output hfs = Cli({"hfs", mFile, mHere});
   const auto lines = Lines(hfs.text);

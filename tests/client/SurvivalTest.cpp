@@ -114,6 +114,16 @@ TEST(Client, AServiceThatAnswersOnceMoreLaterIsSaidByTheNextRequest) {
   EXPECT_TRUE(client.GetHFSVolumeName(0));
 }
 
+TEST(Client, AnAnswerToARequestThatIsNotYetWholeIsSaid) {
+  const TemporaryFolder folder;
+  const std::string service =
+      Impostor(folder, "sleep 0.2; printf '\\001\\002\\000x\\000MWLT'; exec sleep 60");
+  Client client({.service = service});
+  // More than a pipe holds.
+  EXPECT_EQ(MessageOf(client.GetHFSName(std::string(65534, 'x'))),
+            "the service answered what it had not been asked");
+}
+
 TEST(Client, AServiceKilledBetweenRequestsIsSaidAndStartedAgain) {
   const test::MortalService service;
   Client client({.service = service.Path()});

@@ -24,7 +24,7 @@ std::string Line(int id, const std::string& place) {
   return number + parent + "0:" + number + " / " + place + " rw - tmpfs none rw\n";
 }
 
-// A table that never changes, from a recorded text.
+// A table of a recorded text, which changes when it is told to.
 class RecordedTable {
  public:
   explicit RecordedTable(const std::string& text)
@@ -33,6 +33,10 @@ class RecordedTable {
 
   MountTable* operator->() { return &mTable; }
   VolumeNumber NumberAt(std::size_t index) { return mTable.AtIndex(index)->Number(); }
+  void Become(const std::string& text) {
+    mFolder.MakeFile("mountinfo", text);
+    mTable.Distrust();
+  }
 
  private:
   TemporaryFolder mFolder;
@@ -62,6 +66,16 @@ TEST(MountTable, AMountIDBeyond16BitsGetsAFreeNegativeNumber) {
   table->Distrust();
   for (std::size_t i = 0; i < 5; ++i) numbers.insert(table.NumberAt(i));
   EXPECT_EQ(numbers, before);
+}
+
+TEST(MountTable, ANumberThatIsTakenIsNotThatOfALaterMountWithThatID) {
+  const std::string before = Line(27, "/") + Line(70000, "/mnt/a");
+  RecordedTable table(before);
+  const VolumeNumber taken = table.NumberAt(1);
+  table.Become(before + Line(-taken, "/mnt/b"));
+  EXPECT_EQ(table.NumberAt(1), taken);
+  EXPECT_NE(table.NumberAt(2), taken);
+  EXPECT_EQ(table->WithNumber(taken)->MountPoint(), "/mnt/a");
 }
 
 TEST(MountTable, Number0IsTheVolumeOfTheRoot) {

@@ -71,6 +71,28 @@ TEST_F(TheCatalog, KnowsTheVolumeWhereItIsMountedNow) {
   EXPECT_EQ(place->path, elsewhere + "/a/b/c");
 }
 
+TEST_F(TheCatalog, SearchesANewVolumeThatHasTheNumberOfAFormerOne) {
+  // The first numbers are too low to be ids.
+  const auto fill = [&](const std::string& folder) {
+    for (int i = 0; i < 20; ++i) mFolder.MakeFolder(folder + "/" + std::to_string(i));
+    return mFolder.MakeFolder(folder + "/a/b");
+  };
+  const auto searchFor = [&](const std::string& path) {
+    return Find(static_cast<std::uint32_t>(ReadItem(AT_FDCWD, path.c_str())->inode));
+  };
+  const std::string path = fill("volume");
+  EXPECT_EQ(searchFor(path), path);
+  const VolumeNumber number = Volume()->Number();
+
+  ScopedMount other("tmpfs", mFolder.MakeFolder("other"), "tmpfs");
+  fill("other");
+  mMount->Unmount();
+  mMount.emplace(mFolder.Path() / "other", mFolder.Path() / "volume", "", MS_BIND);
+  other.Unmount();
+  if (Volume()->Number() != number) GTEST_SKIP() << "another mount has the number";
+  EXPECT_EQ(searchFor(path), path);
+}
+
 // A file system that gives the number of a deleted item to the next one.
 class NumbersThatAreTakenAgain : public testing::Test {
  protected:

@@ -109,6 +109,20 @@ TEST_F(CoveredItems, AreFoundAgainWhenTheCoverIsGone) {
   EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
 }
 
+TEST_F(CoveredItems, AreNotWhatAFullPathLeadsToWhereverTheyWereSeen) {
+  mFolder.MakeFolder("volume/second");
+  Cover("volume/second", PathTo("volume/folder"));
+  Cover("volume/folder/below");
+  const FSSpec covered = SpecOf(PathTo("volume/second/below/x"));
+  FSSpec spec{};
+  const Str255Of path("volume:second:below:x");
+  EXPECT_EQ(FSMakeFSSpec(0, 0, path.bytes, &spec), fnfErr);
+  EXPECT_NE(spec.vRefNum, covered.vRefNum);
+  mFolder.MakeFile("volume/folder/below/x", "covering");
+  EXPECT_EQ(FSMakeFSSpec(0, 0, path.bytes, &spec), noErr);
+  EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
+}
+
 // A process that was in a folder before it was covered still shows it.
 class CoveredItemsInTheCurrentFolder : public CoveredItems {
  protected:
@@ -146,6 +160,15 @@ TEST_F(CoveredItemsInTheCurrentFolder, HaveTheirRecordWhereAnotherMountShowsThei
   FSSpec spec{};
   ASSERT_EQ(MakeSpec("/proc/self/cwd/x", spec), noErr);
   EXPECT_EQ(ItemOf(spec), PathTo("again/folder/below/x"));
+}
+
+// The folder is at its path again, under a mount that does not show what was mounted in it.
+TEST_F(CoveredItemsInTheCurrentFolder, HaveNoRecordWhereTheirVolumeIsMountedOverItself) {
+  Cover("volume/folder/below/x", PathTo("other"));
+  Cover("volume", PathTo("volume"));
+  FSSpec spec{};
+  EXPECT_EQ(MakeSpec("/proc/self/cwd/x", spec), fnfErr);
+  ExpectRoundTrip(PathTo("volume/folder/below/x"));
 }
 
 // --- A link on the way --------------------------------------------------------------------------
@@ -218,14 +241,14 @@ TEST_F(CoveredItemsOnAWayThatIsALinkNow, ComeBackWhereAnotherMountShowsThem) {
   EXPECT_EQ(ItemOf(spec), PathTo("again/moved/folder/x"));
 }
 
-// --- A kernel without openat2 -------------------------------------------------------------------
+// --- Kernels that answer otherwise --------------------------------------------------------------
 
-// Makes openat2 what it is to an older kernel, for the rest of the process.
-bool TakeOpenat2Away() {
+// Lets a system call fail so for the rest of the process.
+bool LetFail(std::uint32_t call, std::uint32_t error) {
   sock_filter steps[] = {
       BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
-      BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_openat2, 0, 1),
-      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | ENOSYS),
+      BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, call, 0, 1),
+      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | error),
       BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
   };
   const sock_fprog filter{static_cast<unsigned short>(std::size(steps)), steps};
@@ -244,12 +267,27 @@ TEST_F(ItemsInAClosedFolder, AreFoundNearTheLastOneWithoutOpenat2) {
   chmod(PathTo("volume/closed").c_str(), 0711);
   const auto wanted = ReadItem(AT_FDCWD, PathTo("volume/closed/open/y").c_str());
   EXPECT_TRUE(HoldsForNobody([&] {
-    if (!TakeOpenat2Away()) return false;
+    if (!LetFail(SYS_openat2, ENOSYS)) return false;
     const FSSpec last = SpecOf(PathTo("volume/closed/open/x"));
     FSRef found{};
     const auto id = static_cast<std::uint32_t>(wanted->inode);
     return FSResolveNodeID(last.vRefNum, id, &found) == noErr &&
            PathOf(found) == PathTo("volume/closed/open/y");
+  }));
+}
+
+// Who has the right to open by handle in a user namespace alone is told that what is not below the
+// mount that was asked is gone.
+class ItemsOnTwoMounts : public CoveredItems {};
+
+TEST_F(ItemsOnTwoMounts, AreSearchedThoughOneMountSaysThatTheyAreGone) {
+  ShowAt("again");
+  const FSRef reference = ReferenceTo(PathTo("again/folder/below/x"));
+  ASSERT_TRUE(HasHandle(*Unpack(&reference)));
+  std::filesystem::rename(PathTo("volume/folder/below/x"), PathTo("volume/folder/moved"));
+  EXPECT_TRUE(HoldsForNobody([&] {
+    return LetFail(SYS_open_by_handle_at, ESTALE) &&
+           PathOf(reference) == PathTo("volume/folder/moved");
   }));
 }
 

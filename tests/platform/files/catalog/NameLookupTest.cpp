@@ -1,10 +1,13 @@
 #include <cerrno>
+#include <climits>
 #include <map>
 #include <set>
 #include <vector>
 
 #include "CatalogFixture.h"
+#include "files/Descriptor.h"
 #include "files/HFSNames.h"
+#include "files/MountTable.h"
 #include "files/NameLookup.h"
 
 namespace tallowmere::files {
@@ -281,6 +284,26 @@ TEST_F(NamesInAFolder, AShortFormOfAnItemThatWasReplacedIsNotFound) {
   std::filesystem::rename(PathTo(longName), mFolder.Path() / "kept");
   Make(longName);
   EXPECT_EQ(ItemOf(record), "(-43)");
+}
+
+TEST_F(NamesInAFolder, AShortFormOfWhatCannotBeLookedAtIsNotTakenForANewName) {
+  constexpr std::size_t kLongestPath = PATH_MAX - 1;
+  const std::string longName(80, 'n');
+  // The folder's path leaves room for the short form alone.
+  const std::size_t length = kLongestPath - longName.size();
+  std::string path = mFolder.Path();
+  while (path.size() + 202 < length) path += "/" + std::string(200, 'f');
+  path += "/" + std::string(length - path.size() - 1, 'f');
+  std::filesystem::create_directories(path);
+  const Descriptor folder(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  const Descriptor file(
+      openat(folder.Get(), longName.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0644));
+  const auto item = ReadItem(file.Get(), "");
+  ASSERT_TRUE(item);
+  const VolumePointer volume = MountTable::OfThisProcess().WithNumber(mInfo.volume);
+  const std::string shortForm = ShortHFSName(longName, NodeIDOf(*item, *volume->Root()));
+  EXPECT_EQ(ItemOf(MakeRecord(mInfo.volume, IDOf(path), shortForm)), "(-36)");
+  unlinkat(folder.Get(), longName.c_str(), 0);
 }
 
 TEST_F(NamesInAFolder, NoItemIsCalledSo) {

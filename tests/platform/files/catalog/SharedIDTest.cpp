@@ -84,6 +84,18 @@ TEST_F(ASharedID, IsNotedWhenTheSecondItemComesLater) {
   EXPECT_EQ(Find(), second);
 }
 
+TEST_F(ASharedID, OfTwoItemsWithOneShortFormGivesNeitherARecord) {
+  const std::string name(70, 'n');
+  const std::string first = mNumbered->MakeFolder(name + "1", mFirst);
+  const std::string second = mNumbered->MakeFolder(name + "2", mSecond);
+  for (const std::string& path : {first, second}) {
+    const FSRef reference = ReferenceTo(path);
+    FSSpec spec{};
+    EXPECT_EQ(FSGetCatalogInfo(&reference, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr),
+              fnfErr);
+  }
+}
+
 TEST_F(ASharedID, DoesNotMakeAnItemOfAnotherNumberTheOneOfAReference) {
   const std::string first = mNumbered->MakeFolder("first", mFirst);
   mNumbered->MakeFolder("second", mSecond);
