@@ -157,12 +157,15 @@ FolderNumbers NumbersOf(CFileRef const& folder) {
   return {folder.GetVolumeRefNumber(), kNoFolder};
 }
 
-// Of the item if it is a folder, else of the folder that holds it.
+// Of the item if it is a folder, else of the folder that holds it if that is on the same volume.
 FolderNumbers NumbersOfFolderOf(CFileRef const& ref) {
   if (ref.IsFolder()) return NumbersOf(ref);
   CFileRef folder(ref);
   folder.SetToParent();
-  return folder.IsFolder() ? NumbersOf(folder) : FolderNumbers{ref.GetVolumeRefNumber(), kNoFolder};
+  FolderNumbers numbers = {kNoVolume, kNoFolder};
+  if (folder.IsFolder()) numbers = NumbersOf(folder);
+  const SInt16 volume = ref.GetVolumeRefNumber();
+  return numbers.volume == volume ? numbers : FolderNumbers{volume, kNoFolder};
 }
 
 // The folders from the one with this id up to the volume's root, which is not among them.

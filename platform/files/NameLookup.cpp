@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <climits>
 #include <memory>
 
 #include "files/Catalog.h"
@@ -38,9 +39,15 @@ const dirent* NextEntry(DIR* folder) {
 }
 
 OSErr LookUp(const Folder& folder, const std::string& linuxName, Place& item) {
+  std::string path = foundation::JoinPath(folder.place.path, linuxName);
+  // Nobody could be told where the item is.
+  if (path.size() >= PATH_MAX) {
+    errno = ENAMETOOLONG;
+    return ErrorOfSystem();
+  }
   const auto found = ReadStatus(folder.descriptor->Get(), linuxName.c_str());
   if (!found) return ErrorOfSystem();
-  item = {foundation::JoinPath(folder.place.path, linuxName), found->item};
+  item = {std::move(path), found->item};
   return noErr;
 }
 
