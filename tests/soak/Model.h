@@ -136,7 +136,7 @@ class Graph {
 struct Truth {
   std::set<std::string> responses;
   std::set<std::string> nowhere;  // for several states: those that lead to no item in any of them
-  std::string trace;  // of the items that were met: differs when any of them is another
+  std::string trace;              // of the items that were met: differs when any of them is another
 };
 
 // What is to be answered while the tree is like that: one response for one state. For several,
