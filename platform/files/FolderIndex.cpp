@@ -478,9 +478,11 @@ std::uint32_t FolderIndex::Learn(const ItemReference& item, const Waiting& waiti
     return index;
   }
   Folder& folder = mFolders[index];
-  // A folder under its parent is told by one step, which follows when the parent moves.
-  const bool isFurther = waiting.parent == kNone && folder.parent != kNone;
-  if (folder.mount == item.mount && isFurther) return index;
+  // A folder under its parent is told by one step, which follows when the parent moves; unless it
+  // has moved itself.
+  const bool isKnownThere =
+      waiting.parent == kNone && folder.parent != kNone && PathOf(index) == waiting.name;
+  if (folder.mount == item.mount && isKnownThere) return index;
   if (folder.parent != waiting.parent || NameOf(folder) != waiting.name) {
     mUnusedNames += NameOf(folder).size() + 1;
     Rename(folder, waiting);

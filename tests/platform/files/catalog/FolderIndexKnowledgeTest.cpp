@@ -174,6 +174,15 @@ TEST_F(AnIndex, AnswersTheNextQuestionFromWhatItLearned) {
   }
 }
 
+TEST_F(AnIndex, TellsTheNewPlaceOfAFolderAtWhichItStarts) {
+  for (const char* name : {"a/moved/below", "b"}) Make(name);
+  EXPECT_EQ(Find(IDOfWhatIsGone()), "(none)");
+  Move("a/moved", "b/moved");
+  EXPECT_EQ(FindAny(ID("b/moved"), "b/moved"), PathTo("b/moved"));
+  Move("b/moved", "a/moved");
+  EXPECT_EQ(FindAny(ID("a/moved/below"), "a/moved"), PathTo("a/moved/below"));
+}
+
 TEST_F(AnIndex, KeepsWhatItKnowsWhenAFolderIsGone) {
   for (const char* name : {"a/b/c", "a/d/e", "f/g/h"}) Make(name);
   const std::uint32_t gone = IDOfWhatIsGone();
