@@ -52,14 +52,14 @@ TEST(Request, ARecordIsAskedForByPath) {
 
 TEST(Request, VolumeFolderAndNameAreSentInThisOrder) {
   EXPECT_EQ(SentDuring([](Client& client) {
-              EXPECT_TRUE(client.SetFileRefFromFSSpecData({-3, -559038737, "x"}));
+              EXPECT_TRUE(client.SetFileRefFromFSSpecData({-3, -11, "x"}));
             }),
-            test::PathOfPartsRequest(-3, -559038737, "x", 0));
+            test::PathOfPartsRequest(-3, -11, "x", 0));
 }
 
 TEST(Request, ARecordIsSentWithTheWishToSearchOtherVolumes) {
-  const FSSpec spec{-3, -559038737, "x"};
-  const std::string record = test::Record(-3, -559038737, "x");
+  const FSSpec spec{-3, -11, "x"};
+  const std::string record = test::Record(-3, -11, "x");
   EXPECT_EQ(SentDuring([&](Client& client) {
               EXPECT_TRUE(client.SetFileRefFromFSSpec(spec, true));
               EXPECT_TRUE(client.SetFileRefFromFSSpec(spec, false));
