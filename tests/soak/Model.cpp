@@ -395,13 +395,17 @@ class Evaluation {
           std::any_of(mGraph.Entries().begin(), mGraph.Entries().end(), [&](const Entry& entry) {
             return entry.folder == folder && newName == NameAt(entry.name).linuxName;
           });
+      const std::string asAsked = TextOfPath(mRequest.path, mPlace) + "/" + newName;
+      // The item itself, by the path that was given: the folder could not be told at one step.
+      if (isThere && mRequest.code == 6 && name == mRequest.hfsName) {
+        mTruth.responses.insert(PathResponse(asAsked));
+      }
       if (isThere) continue;
       for (const FolderPlace& place : PlacesOf(folder)) {
         const std::string path = place.path + "/" + newName;
         mTruth.nowhere.insert(mRequest.code == 2 ? ResultResponse(0, path) : PathResponse(path));
       }
-      if (mRequest.code != 6) continue;
-      mTruth.nowhere.insert(PathResponse(TextOfPath(mRequest.path, mPlace) + "/" + newName));
+      if (mRequest.code == 6) mTruth.nowhere.insert(PathResponse(asAsked));
     }
   }
 
