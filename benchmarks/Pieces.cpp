@@ -56,7 +56,7 @@ void RememberAPlace(State& state) {
   files::ItemReference item{};
   for ([[maybe_unused]] auto _ : state) {
     item.inode = (item.inode + 1) % (2 * places);
-    memory.Remember(item, "/home/ann/Music/1994/Mixes", true);
+    memory.Remember(item, "/home/ann/Music/1994/Mixes");
   }
 }
 BENCHMARK(RememberAPlace)->Arg(10)->Arg(1000)->Arg(100'000);

@@ -172,6 +172,21 @@ FolderIndex& IndexOf(const VolumePointer& volume) {
   return indexes.emplace_back(volume);
 }
 
+// How often what a pass has found may be gone, or elsewhere, when it is looked at again.
+constexpr int kMostPasses = 3;
+
+// What `check` makes of the path to an item that a pass finds; none when it finds none.
+template <class Check>
+auto FindByPass(const VolumePointer& volume, const SearchedItem& item, const std::string& near,
+                const Check& check) -> decltype(check(near)) {
+  for (int pass = 0; pass < kMostPasses; ++pass) {
+    const Path path = IndexOf(volume).Find(item, NearestFolder(volume, near));
+    if (!path) return std::nullopt;
+    if (auto found = check(*path)) return found;
+  }
+  return std::nullopt;
+}
+
 // A volume and its root folder, where they are now.
 struct SettledVolume {
   VolumePointer volume;
@@ -184,8 +199,8 @@ std::optional<SettledVolume> Settle(const VolumePointer& volume) {
   for (VolumePointer current = volume; current;) {
     const auto root = ReadStatus(AT_FDCWD, current->MountPoint().c_str());
     const bool isThere = root && current->Root() && AreEqual(root->item, *current->Root());
-    if (Place place{current->MountPoint(), isThere ? root->item : ItemReference{}};
-        isThere && IsOnVolume(volume, place)) {
+    Place place{current->MountPoint(), isThere ? root->item : ItemReference{}};
+    if (isThere && IsOnVolume(volume, place)) {
       return SettledVolume{std::move(current), std::move(place)};
     }
     if (current != volume) break;
@@ -204,17 +219,10 @@ std::optional<Place> WithID(const VolumePointer& volume, std::uint32_t id, bool 
   return place;
 }
 
-// What is now where an item was last seen. Where the kernel does not tell the mount, only the
-// canonical path tells the volume.
+// What is now where an item was last seen.
 std::optional<Place> AtPlaceOf(const ItemReference& item) {
-  const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
-  if (known == nullptr) return std::nullopt;
-  if (known->isCanonical) {
-    const auto status = ReadStatus(AT_FDCWD, known->path.c_str());
-    if (!status) return std::nullopt;
-    if (status->item.mount != kNoMount) return Place{known->path, status->item};
-  }
-  auto place = PlaceAt(known->path);
+  const std::string* const path = PlaceMemory::OfThisProcess().Recall(item);
+  auto place = path != nullptr ? PlaceAt(*path) : std::nullopt;
   if (place && AreEqual(place->item, item)) RememberPlace(*place);
   return place;
 }
@@ -233,14 +241,6 @@ std::optional<Place> AtRememberedPlace(const VolumePointer& volume, std::uint32_
   return WithID(volume, id, false, AtPlaceOf(ItemWithID(*volume, id)));
 }
 
-// Whether that is the canonical path at which the item was last seen. Not where the kernel does not
-// tell the mount: the volume is told by the canonical path of now.
-bool IsRememberedAt(const ItemReference& item, std::string_view path) {
-  if (item.mount == kNoMount) return false;
-  const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
-  return known != nullptr && known->isCanonical && known->path == path;
-}
-
 // Whether both are one item on one mount; errno tells ENOENT when not.
 bool IsSame(const ItemReference& first, const ItemReference& second) {
   if (AreEqual(first, second) && first.mount == second.mount) return true;
@@ -248,9 +248,8 @@ bool IsSame(const ItemReference& first, const ItemReference& second) {
   return false;
 }
 
-// What is at the end of a path, links followed. No automounter is asked at its end.
-std::optional<OpenFolder> OpenAt(const std::string& path) {
-  Descriptor descriptor(open(path.c_str(), O_PATH | O_CLOEXEC));
+// None, and errno tells, when it is not open or no folder.
+std::optional<OpenFolder> AsFolder(const std::string& path, Descriptor descriptor) {
   const auto status = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
   if (!status) return std::nullopt;
   if (!S_ISDIR(status->item.type)) {
@@ -261,14 +260,15 @@ std::optional<OpenFolder> OpenAt(const std::string& path) {
                     std::make_shared<const Descriptor>(std::move(descriptor))};
 }
 
+// The folder at the end of a path, links followed. No automounter is asked at its end.
+std::optional<OpenFolder> Follow(const std::string& path) {
+  return AsFolder(path, Descriptor(open(path.c_str(), O_PATH | O_CLOEXEC)));
+}
+
 }  // namespace
 
 void RememberPlace(const Place& place) {
-  PlaceMemory::OfThisProcess().Remember(place.item, place.path, true);
-}
-
-void RememberSighting(const ItemReference& item, std::string_view path) {
-  PlaceMemory::OfThisProcess().Remember(item, path, false);
+  PlaceMemory::OfThisProcess().Remember(place.item, place.path);
 }
 
 std::optional<Place> PlaceAt(const std::string& path) {
@@ -283,30 +283,28 @@ bool Holds(const OpenFolder& folder, const ItemReference& item, std::string_view
 }
 
 std::optional<OpenFolder> Open(const Place& folder) {
-  auto found = OpenAt(folder.path);
+  auto found = Follow(folder.path);
   if (!found || !IsSame(found->place.item, folder.item)) return std::nullopt;
   return found;
 }
 
-std::optional<OpenFolder> OpenRemembered(const std::string& path) {
-  auto found = OpenAt(path);
-  if (!found || !IsRememberedAt(found->place.item, path)) return std::nullopt;
-  return found;
+std::optional<OpenFolder> OpenFolderAt(const std::string& path) {
+  if (IsSpelledOut(path)) return AsFolder(path, OpenWithoutLinks(path));
+  errno = ELOOP;
+  return std::nullopt;
 }
 
-// A path that leads through a link of /proc can spell another folder than the one it is in.
 std::optional<OpenFolder> OpenHolderOf(const std::string& path) {
   const std::string folder = FolderOf(path);
-  auto found = OpenAt(folder);
-  if (!found || IsRememberedAt(found->place.item, folder)) return found;
-  auto place = PlaceAt(folder);
-  if (place && S_ISLNK(place->item.type)) {
-    const auto real = RealPath(folder);
-    place = real ? PlaceAt(*real) : std::nullopt;
+  auto found = OpenFolderAt(folder);
+  if (!found && (errno == ELOOP || errno == ENOTDIR)) {
+    const auto followed = Follow(folder);
+    const auto real = followed ? RealPath(folder) : std::nullopt;
+    found = real ? OpenFolderAt(*real) : std::nullopt;
+    // A path that leads through a link of /proc can spell another folder than the one it is in.
+    if (found && !IsSame(found->place.item, followed->place.item)) return std::nullopt;
   }
-  if (!place || !IsSame(place->item, found->place.item)) return std::nullopt;
-  RememberPlace(*place);
-  found->place = *std::move(place);
+  if (found) RememberPlace(found->place);
   return found;
 }
 
@@ -325,11 +323,10 @@ std::string FolderOf(const std::string& path) {
 
 // Where the kernel does not tell the mount, only the canonical path tells the volume.
 std::optional<std::string> LastPathOf(const ItemReference& item) {
-  const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
-  const bool isGoodEnough = known != nullptr && item.mount != kNoMount &&
-                            (known->isCanonical || IsSpelledOut(known->path));
+  const std::string* const path = PlaceMemory::OfThisProcess().Recall(item);
+  const bool isGoodEnough = path != nullptr && item.mount != kNoMount && IsSpelledOut(*path);
   if (!isGoodEnough) return std::nullopt;
-  return known->path;
+  return *path;
 }
 
 std::optional<std::string> LastPathOf(const Volume& volume, std::uint32_t id) {
@@ -340,8 +337,8 @@ std::optional<std::string> LastPathOf(const Volume& volume, std::uint32_t id) {
 }
 
 std::optional<std::string> FindCanonicalPath(const ItemReference& item) {
-  const auto* const known = PlaceMemory::OfThisProcess().Recall(item);
-  const std::string former = known == nullptr ? "" : known->path;
+  const std::string* const known = PlaceMemory::OfThisProcess().Recall(item);
+  const std::string former = known == nullptr ? "" : *known;
   Path place = former.empty() ? std::nullopt : Verified(item, former);
   if (!place) {
     const auto volume = MountTable::OfThisProcess().OfItem(item, former);
@@ -355,9 +352,8 @@ std::optional<std::string> FindCanonicalPath(const ItemReference& item) {
     place = answer.path ? Verified(item, *answer.path) : std::nullopt;
     if (!place) {
       const SearchedItem wanted{NodeIDOf(item, *current.Root()), &item, S_ISDIR(item.type)};
-      const Path found =
-          IndexOf(settled->volume).Find(wanted, NearestFolder(settled->volume, former));
-      place = found ? Verified(item, *found) : std::nullopt;
+      place = FindByPass(settled->volume, wanted, former,
+                         [&](const std::string& path) { return Verified(item, path); });
     }
   }
   if (place) RememberPlace({*place, item});
@@ -388,9 +384,10 @@ std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, boo
   if (place && folder && !S_ISDIR(place->item.type)) return std::nullopt;
   if (!place) {
     const std::string latest(PlaceMemory::OfThisProcess().Latest());
-    const std::string start = NearestFolder(settled->volume, latest);
-    const Path path = IndexOf(settled->volume).Find({id, nullptr, folder}, start);
-    if (path) place = WithID(settled->volume, id, folder, PlaceAt(*path));
+    place =
+        FindByPass(settled->volume, {id, nullptr, folder}, latest, [&](const std::string& path) {
+          return WithID(settled->volume, id, folder, PlaceAt(path));
+        });
   }
   if (place) RememberPlace(*place);
   return place;
@@ -398,7 +395,7 @@ std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, boo
 
 std::optional<OpenFolder> OpenWithID(const VolumePointer& volume, std::uint32_t id) {
   const auto last = LastPathOf(*volume, id);
-  auto found = last ? OpenRemembered(*last) : std::nullopt;
+  auto found = last ? OpenFolderAt(*last) : std::nullopt;
   if (found && WithID(volume, id, true, found->place)) return found;
   const auto place = FindItem(volume, id, true);
   if (place) return Open(*place);

@@ -1,8 +1,10 @@
 // Where is an item: by the reference that was taken of it, or by its node id on a volume.
 //
-// A remembered place first, verified with one look; then, where the process may, by the file
-// system's own handle; then by a pass over the volume's folders. Everything may throw
-// std::bad_alloc.
+// A remembered place first, verified; then, where the process may, by the file system's own handle;
+// then by a pass over the volume's folders. Everything may throw std::bad_alloc.
+//
+// What was canonical can have links on its way by now, and they can go again in mid-question though
+// the item stays where it is. So a path that was not just found is walked without links.
 #pragma once
 
 #include <CoreServices/CoreServices.h>
@@ -19,11 +21,9 @@
 
 namespace tallowmere::files {
 
-// Remembers where the item was found, for as long as there is room.
+// Remembers where the item was found, for as long as there is room. The path is absolute and need
+// not be canonical.
 void RememberPlace(const Place& place);
-
-// The same of an absolute path that need not be canonical.
-void RememberSighting(const ItemReference& item, std::string_view path);
 
 // The item at an absolute path, links on the way followed, one in the last place not. None when
 // there is none.
@@ -42,8 +42,9 @@ bool Holds(const OpenFolder& folder, const ItemReference& item, std::string_view
 // The folder that was just found at a place. None, and errno tells, when it is not there now.
 std::optional<OpenFolder> Open(const Place& folder);
 
-// The folder at an absolute path, if it was remembered there.
-std::optional<OpenFolder> OpenRemembered(const std::string& path);
+// The folder at an absolute path. None, and errno tells, when there is none, and when a link is on
+// the way: ELOOP or ENOTDIR, as for a file.
+std::optional<OpenFolder> OpenFolderAt(const std::string& path);
 
 // The folder in which the kernel finds the last component of an absolute path other than "/". None,
 // and errno tells, when there is none or no path leads to it.

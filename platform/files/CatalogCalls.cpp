@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <string>
+#include <utility>
 
 #include "files/HFSNames.h"
 #include "files/NodeID.h"
@@ -152,13 +153,13 @@ OSErr FSMakeFSRefUnicode(const FSRef* parentRef, UniCharCount nameLength, const 
     const auto linuxName =
         FileNameOfText(ExchangeColonsAndSlashes(std::u16string(name, name + nameLength)));
     if (!linuxName || !CanBeLinuxName(*linuxName)) return fnfErr;
-    const std::string path = JoinPath(*parentPath, *linuxName);
+    std::string path = JoinPath(*parentPath, *linuxName);
     const auto folder = OpenHolderOf(path);
     const bool isThere = folder && Holds(*folder, *parent, "");
     if (!isThere) return fnfErr;
     const auto item = ReadItem(folder->descriptor->Get(), linuxName->c_str());
     if (!item) return ErrorOfSystem();
-    RememberSighting(*item, path);
+    RememberPlace({std::move(path), *item});
     *newRef = Pack(*item);
     return noErr;
   });

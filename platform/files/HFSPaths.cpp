@@ -96,20 +96,20 @@ OSErr Step(std::string_view name, Folder& folder) {
 }
 
 // The folder that steps from a volume's root lead to, when one look tells it: what has their names
-// in Linux is on the very mount of the root, and was reached there before without links. Not on a
-// volume with several mounts, where a name can be that of an item which one of them hides.
+// in Linux is on the very mount of the root, without a link on the way. Not on a volume with
+// several mounts, where a name can be that of an item which one of them hides.
 bool FindFolderAtOnce(const Steps& steps, Folder& folder) {
   if (steps.volume.empty() || steps.folders.empty()) return false;
   folder.volume = MountTable::OfThisProcess().WithName(steps.volume);
-  if (!folder.volume || !folder.volume->Root() || folder.volume->MountPoints().size() > 1)
-    return false;
+  if (!folder.volume || !folder.volume->Root()) return false;
+  if (folder.volume->MountPoints().size() > 1) return false;
   std::string path = folder.volume->MountPoint();
   for (const std::string_view name : steps.folders) {
     const std::string linuxName = SpellHFSName(name).precomposed;
     if (linuxName.empty()) return false;
     path = JoinPath(path, linuxName);
   }
-  auto found = OpenRemembered(path);
+  auto found = OpenFolderAt(path);
   if (!found) return false;
   folder = {*std::move(found), folder.volume};
   return folder.volume->IsMountedAs(folder.place.item.mount);

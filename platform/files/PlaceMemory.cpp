@@ -24,16 +24,15 @@ PlaceMemory& PlaceMemory::OfThisProcess() {
 
 PlaceMemory::PlaceMemory(std::size_t limit) : mLimit(limit) {}
 
-void PlaceMemory::Remember(const ItemReference& item, std::string_view path, bool isCanonical) {
+void PlaceMemory::Remember(const ItemReference& item, std::string_view path) {
   const Key key{item.device, item.inode};
   const auto known = mIndex.find(key);
-  if (known != mIndex.end() && known->second->known.path == path) {
-    known->second->known.isCanonical |= isCanonical;
+  if (known != mIndex.end() && known->second->path == path) {
     mPlaces.splice(mPlaces.begin(), mPlaces, known->second);
     return;
   }
   Places fresh;
-  fresh.push_back({key, {std::string(path), isCanonical}});
+  fresh.push_back({key, std::string(path)});
   if (known != mIndex.end()) {
     mSize -= SizeOf(*known->second);
     mPlaces.erase(known->second);
@@ -46,19 +45,19 @@ void PlaceMemory::Remember(const ItemReference& item, std::string_view path, boo
   while (mSize > mLimit) ForgetTheOldest();
 }
 
-const PlaceMemory::Known* PlaceMemory::Recall(const ItemReference& item) {
+const std::string* PlaceMemory::Recall(const ItemReference& item) {
   const auto known = mIndex.find({item.device, item.inode});
   if (known == mIndex.end()) return nullptr;
   mPlaces.splice(mPlaces.begin(), mPlaces, known->second);
-  return &known->second->known;
+  return &known->second->path;
 }
 
 std::string_view PlaceMemory::Latest() const {
-  return mPlaces.empty() ? std::string_view() : mPlaces.front().known.path;
+  return mPlaces.empty() ? std::string_view() : mPlaces.front().path;
 }
 
 std::size_t PlaceMemory::SizeOf(const Place& place) {
-  return sizeof(Place) + place.known.path.capacity() + kOverhead;
+  return sizeof(Place) + place.path.capacity() + kOverhead;
 }
 
 void PlaceMemory::ForgetTheOldest() {

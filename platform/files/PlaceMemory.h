@@ -17,25 +17,19 @@ namespace tallowmere::files {
 
 class PlaceMemory {
  public:
-  struct Known {
-    std::string path;
-    bool isCanonical;  // had no links on the way when it was remembered
-  };
-
   static PlaceMemory& OfThisProcess();
 
   // `limit` is in bytes, for everything remembered; about 200 a place. A limit below what one place
   // takes remembers none.
   explicit PlaceMemory(std::size_t limit);
 
-  // The item's place is `path` from now on. A path that was once said to be canonical stays so for
-  // the item. Forgets the places least recently used when the limit is passed. Without memory the
-  // exception leaves everything as it was.
-  void Remember(const ItemReference& item, std::string_view path, bool isCanonical);
+  // The item's place is `path` from now on. Forgets the places least recently used when the limit
+  // is passed. Without memory the exception leaves everything as it was.
+  void Remember(const ItemReference& item, std::string_view path);
 
   // The item's place, which counts as a use; null when none is remembered. Valid until the next
   // Remember.
-  const Known* Recall(const ItemReference& item);
+  const std::string* Recall(const ItemReference& item);
 
   // The path last remembered or recalled, empty when there is none.
   std::string_view Latest() const;
@@ -54,7 +48,7 @@ class PlaceMemory {
   };
   struct Place {
     Key key;
-    Known known;
+    std::string path;
   };
   using Places = std::list<Place>;
 

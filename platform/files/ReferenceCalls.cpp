@@ -2,6 +2,8 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include <utility>
+
 #include "files/Catalog.h"
 #include "files/ItemReference.h"
 #include "foundation/NoThrow.h"
@@ -16,11 +18,11 @@ using tallowmere::foundation::OrZero;
 // itself.
 Boolean CFURLGetFSRef(CFURLRef url, FSRef* item) {
   return OrZero([&]() -> Boolean {
-    const auto path = AbsolutePathOfUrl(url);
+    auto path = AbsolutePathOfUrl(url);
     if (!path) return false;
     const auto found = ReadItem(AT_FDCWD, path->c_str());
     if (!found) return false;
-    RememberSighting(*found, *path);
+    RememberPlace({*std::move(path), *found});
     *item = Pack(*found);
     return true;
   });

@@ -1,6 +1,6 @@
 // What is asked about changes in mid-question: at each system call that an answer takes, in turn.
 // The answer is then the one from before or the one from after, or says that there is none, or
-// leads nowhere; it never leads to another item.
+// leads nowhere; it never leads to another item. A change to something else changes no answer.
 //
 // TALLOWMERE_SERVICE_TO_RACE in the environment names another service to be tried.
 #include <fcntl.h>
@@ -29,6 +29,10 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr std::size_t kRecordResponseSize = 75;
+
+constexpr const char* kName = "item.aif";
+constexpr const char* kLongName =
+    "an item with a name of more than the sixty-three bytes that there is room for.aif";
 
 std::string ServiceToRace() {
   const char* const other = getenv("TALLOWMERE_SERVICE_TO_RACE");
@@ -83,10 +87,24 @@ std::string FullPathIn(const std::string& response) {
   return response.c_str() + 2;
 }
 
+// What a service knows of the item at a path, which may be a new one.
+Item ItemAt(ChildProgram& service, const fs::path& path) {
+  Item item{};
+  item.path = path;
+  item.folder = path.parent_path();
+  item.record = Answer(service, 7, RecordRequest(item.path))
+                    .substr(1, kRecordResponseSize - 1 - kTrailer.size());
+  item.name = std::string(item.record.data() + 7, static_cast<unsigned char>(item.record[6]));
+  std::memcpy(&item.volume, item.record.data(), sizeof item.volume);
+  std::memcpy(&item.folderID, item.record.data() + sizeof item.volume, sizeof item.folderID);
+  item.fullPath = FullPathIn(Answer(service, 1, FullPathRequest(item.path, kRoomForAFullPath, 1)));
+  return item;
+}
+
 // --- Races ------------------------------------------------------------------------------------
 
 enum class Race { kFolderBecomesLink, kItemIsReplaced, kFolderIsCovered };
-enum class Knowledge { kNone, kOfTheItem };
+enum class Knowledge { kNone, kOfTheItem, kOfAPass };
 
 const char* NameOf(Race race) {
   switch (race) {
@@ -108,16 +126,7 @@ class Tree {
       mFolder.MakeFolder(folder);
       std::ofstream(mFolder.Path() / folder / mName) << folder;
     }
-    const std::string path = Path().string();
-    const std::string record =
-        Answer(before, 7, RecordRequest(path)).substr(1, kRecordResponseSize - 1 - kTrailer.size());
-    mItem.path = path;
-    mItem.folder = Path().parent_path();
-    mItem.record = record;
-    mItem.name = std::string(record.data() + 7, static_cast<unsigned char>(record[6]));
-    std::memcpy(&mItem.volume, record.data(), sizeof mItem.volume);
-    std::memcpy(&mItem.folderID, record.data() + sizeof mItem.volume, sizeof mItem.folderID);
-    mItem.fullPath = FullPathIn(Answer(before, 1, FullPathRequest(path, kRoomForAFullPath, 1)));
+    mItem = ItemAt(before, Path());
   }
   ~Tree() { umount2((Top() / "folder").c_str(), MNT_DETACH); }
   Tree(const Tree&) = delete;
@@ -204,13 +213,17 @@ class Truth {
   std::set<Identity> mItems;
 };
 
-class Races : public testing::TestWithParam<std::tuple<Race, unsigned, Knowledge, const char*>> {
+class InSmallRoot : public testing::Test {
  protected:
   void SetUp() override {
     static const bool isThere = EnterSmallRoot({ServiceToRace(), TALLOWMERE_STOP_AT_CALLS});
     if (!isThere) GTEST_SKIP() << "mounting is not permitted here";
   }
 };
+
+class Races
+    : public InSmallRoot,
+      public testing::WithParamInterface<std::tuple<Race, unsigned, Knowledge, const char*>> {};
 
 TEST_P(Races, ChangeNoAnswerIntoThatOfAnotherItem) {
   const auto [race, code, knowledge, name] = GetParam();
@@ -248,16 +261,86 @@ std::string NameOfCase(const testing::TestParamInfo<Races::ParamType>& info) {
          (std::strlen(name) > 63 ? "LongName" : "");
 }
 
+INSTANTIATE_TEST_SUITE_P(AtEachCall, Races,
+                         testing::Combine(testing::Values(Race::kFolderBecomesLink,
+                                                          Race::kItemIsReplaced,
+                                                          Race::kFolderIsCovered),
+                                          testing::Values(1u, 2u, 5u, 7u, 8u, 9u),
+                                          testing::Values(Knowledge::kNone, Knowledge::kOfTheItem),
+                                          testing::Values(kName, kLongName)),
+                         NameOfCase);
+
+// --- Changes to something else ----------------------------------------------------------------
+
+struct Names {
+  const char* item;
+  const char* asked;  // the same, or that of a new item
+};
+
+class RacesBesideTheItem
+    : public InSmallRoot,
+      public testing::WithParamInterface<std::tuple<unsigned, Knowledge, Names>> {};
+
+// A pass over the volume, for a folder that is not there.
+void PassOver(ChildProgram& service, Item item) {
+  constexpr std::int32_t kNoSuchFolder = 0x7FFFFFF;
+  item.folderID = kNoSuchFolder;
+  Answer(service, 8, RequestAbout(item, 8));
+}
+
+// The service knows an item where it was before a folder on its way moved and left a link: from
+// the item's own record, or from a pass since which it has not been asked about it. The link then
+// goes, in mid-question, and another name of the item could be told in place of its own.
+TEST_P(RacesBesideTheItem, ALinkToItsFolderGoesAndNoAnswerChanges) {
+  const auto [code, knowledge, names] = GetParam();
+  bool isChanged = true;
+  int call = 0;
+  for (; isChanged; ++call) {
+    const TemporaryFolder top;
+    const fs::path folder = top.MakeFolder("folder");
+    const fs::path first = top.MakeFolder("first");
+    const fs::path moved = top.Path() / "moved";
+    top.MakeFolder("first/inner");
+    std::ofstream(first / "inner" / names.item) << "item";
+    fs::create_hard_link(first / "inner" / names.item, top.Path() / "another name.aif");
+    StoppedService service(ServiceToRace());
+    if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
+    const Item known = ItemAt(service.Streams(), first / "inner" / names.item);
+    fs::rename(first / "inner", folder / "inner");
+    if (knowledge == Knowledge::kOfTheItem) {
+      Answer(service.Streams(), 9, RequestAbout(known, 9));
+    } else {
+      PassOver(service.Streams(), known);
+    }
+    fs::rename(folder, moved);
+    fs::create_symlink(moved, folder);
+
+    Bystander bystander;
+    const std::string request =
+        RequestAbout(ItemAt(bystander, moved / "inner" / names.asked), code);
+    const std::string expected = Answer(bystander, code, request);
+    service.ChangeAt(call, [&] { fs::remove(folder); });
+    EXPECT_EQ(Answer(service.Streams(), code, request), expected) << "changed at call " << call;
+    isChanged = service.HasChanged();
+    EXPECT_EQ(Answer(bystander, code, request), expected) << "asked of another one afterwards";
+  }
+  EXPECT_GT(call, 1);
+}
+
+std::string NameOfCaseBeside(const testing::TestParamInfo<RacesBesideTheItem::ParamType>& info) {
+  const auto [code, knowledge, names] = info.param;
+  return "Code" + std::to_string(code) +
+         (knowledge == Knowledge::kOfTheItem ? "Remembered" : "KnownByAPass") +
+         (names.item == kLongName ? "LongName" : "") + (names.item == names.asked ? "" : "NewItem");
+}
+
 INSTANTIATE_TEST_SUITE_P(
-    AtEachCall, Races,
-    testing::Combine(testing::Values(Race::kFolderBecomesLink, Race::kItemIsReplaced,
-                                     Race::kFolderIsCovered),
-                     testing::Values(1u, 2u, 5u, 7u, 8u, 9u),
-                     testing::Values(Knowledge::kNone, Knowledge::kOfTheItem),
-                     testing::Values("item.aif",
-                                     "an item with a name of more than the sixty-three bytes that "
-                                     "there is room for.aif")),
-    NameOfCase);
+    AtEachCall, RacesBesideTheItem,
+    testing::Combine(testing::Values(1u, 2u, 5u, 6u, 7u, 8u, 9u),
+                     testing::Values(Knowledge::kOfTheItem, Knowledge::kOfAPass),
+                     testing::Values(Names{kName, kName}, Names{kLongName, kLongName},
+                                     Names{kName, "new.aif"})),
+    NameOfCaseBeside);
 
 }  // namespace
 }  // namespace tallowmere::test

@@ -235,15 +235,19 @@ bool Churner::MakeFile() {
   return true;
 }
 
-bool Churner::RemoveFile() {
-  if (Now().count < 40 && Below(3) != 0) return false;
-  const Entry* const entry = AnyEntry([](const Entry& e) { return e.kind == Kind::kFile; });
+bool Churner::RemoveAny(Kind kind) {
+  const Entry* const entry = AnyEntry([kind](const Entry& e) { return e.kind == kind; });
   if (entry == nullptr) return false;
   const std::string path = PathOf(entry->folder, entry->name);
   State next = Now();
   Remove(next, *entry);
   Change(next, [&] { return unlink(path.c_str()); });
   return true;
+}
+
+bool Churner::RemoveFile() {
+  if (Now().count < 40 && Below(3) != 0) return false;
+  return RemoveAny(Kind::kFile);
 }
 
 // A rename between two names of one item does nothing.
@@ -389,13 +393,7 @@ bool Churner::MakeOuterLink() {
 }
 
 bool Churner::RemoveLink() {
-  const Entry* const entry = AnyEntry([](const Entry& e) { return e.kind == Kind::kLink; });
-  if (entry == nullptr) return false;
-  const std::string path = PathOf(entry->folder, entry->name);
-  State next = Now();
-  Remove(next, *entry);
-  Change(next, [&] { return unlink(path.c_str()); });
-  return true;
+  return RemoveAny(Kind::kLink);
 }
 
 bool Churner::MoveSubfolder() {

@@ -75,6 +75,7 @@ class Churner {
   bool HasRoom() const { return Now().count + 8 < Now().entries.size(); }
 
   bool MakeFile();
+  bool RemoveAny(Kind kind);
   bool RemoveFile();
   bool MoveFile();
   bool LinkFile();

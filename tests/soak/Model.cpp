@@ -480,7 +480,22 @@ class Evaluation {
 
   void SayFullPath(const std::string& path) { Say(FullPathResponse(path)); }
   void SayFolder(Node folder) {
-    for (const FolderPlace& place : PlacesOf(folder)) SayFullPath(place.hfsPath);
+    for (const FolderPlace& place : PlacesOf(folder)) {
+      SayFullPath(place.hfsPath);
+      NoteCutPaths(place.hfsPath);
+    }
+  }
+
+  // The climb from a folder ends at one that is being moved, and what is above that is left out.
+  void NoteCutPaths(const std::string& hfsPath) {
+    if (mGraph.IsOfOneState()) return;
+    const std::size_t volumeEnd = hfsPath.find(':') + 1;
+    for (std::size_t at = hfsPath.find(':', volumeEnd); at < hfsPath.size() - 1;
+         at = hfsPath.find(':', at + 1)) {
+      const std::string rest = hfsPath.substr(at + 1);
+      if (IsNamed(kMainRoot, rest.substr(0, rest.find(':')))) continue;
+      mTruth.nowhere.insert(FullPathResponse(hfsPath.substr(0, volumeEnd) + rest));
+    }
   }
 
   void FullPath() {

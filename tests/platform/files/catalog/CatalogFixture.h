@@ -35,7 +35,7 @@ inline FSRef ReferenceTo(const std::string& path) {
   const auto item = ReadItem(AT_FDCWD, path.c_str());
   EXPECT_TRUE(item) << path;
   if (!item) return {};
-  RememberSighting(*item, path);
+  RememberPlace({path, *item});
   return Pack(*item);
 }
 

@@ -18,22 +18,22 @@ ItemReference Item(std::uint64_t device, std::uint64_t inode) {
   return item;
 }
 
-std::string PathOf(const PlaceMemory::Known* place) {
-  return place == nullptr ? "(null)" : place->path;
+std::string PathOf(const std::string* place) {
+  return place == nullptr ? "(null)" : *place;
 }
 
 // Bytes that one place with a short path takes.
 std::size_t SizeOfOnePlace() {
   PlaceMemory memory(kPlenty);
-  memory.Remember(Item(1, 1), "/a", true);
+  memory.Remember(Item(1, 1), "/a");
   return memory.Size();
 }
 
 TEST(PlaceMemory, RecallsWhatItWasTold) {
   PlaceMemory memory(kPlenty);
-  memory.Remember(Item(1, 1), "/a", true);
-  memory.Remember(Item(1, 2), "/b", true);
-  memory.Remember(Item(2, 1), "/c", true);
+  memory.Remember(Item(1, 1), "/a");
+  memory.Remember(Item(1, 2), "/b");
+  memory.Remember(Item(2, 1), "/c");
   EXPECT_EQ(PathOf(memory.Recall(Item(1, 1))), "/a");
   EXPECT_EQ(PathOf(memory.Recall(Item(1, 2))), "/b");
   EXPECT_EQ(PathOf(memory.Recall(Item(2, 1))), "/c");
@@ -41,39 +41,28 @@ TEST(PlaceMemory, RecallsWhatItWasTold) {
 
 TEST(PlaceMemory, KnowsNothingElse) {
   PlaceMemory memory(kPlenty);
-  memory.Remember(Item(1, 1), "/a", true);
+  memory.Remember(Item(1, 1), "/a");
   EXPECT_EQ(memory.Recall(Item(1, 3)), nullptr);
 }
 
 TEST(PlaceMemory, KeepsTheLastPlaceOfAnItem) {
   PlaceMemory memory(kPlenty);
-  memory.Remember(Item(1, 1), "/a", true);
+  memory.Remember(Item(1, 1), "/a");
   const std::size_t size = memory.Size();
-  memory.Remember(Item(1, 1), "/b", true);
-  memory.Remember(Item(1, 1), "/b", true);
+  memory.Remember(Item(1, 1), "/b");
+  memory.Remember(Item(1, 1), "/b");
   EXPECT_EQ(PathOf(memory.Recall(Item(1, 1))), "/b");
   EXPECT_EQ(memory.Size(), size);
 }
 
-TEST(PlaceMemory, KeepsAPathCanonicalThatIsSeenAgain) {
-  PlaceMemory memory(kPlenty);
-  memory.Remember(Item(1, 1), "/a", false);
-  EXPECT_FALSE(memory.Recall(Item(1, 1))->isCanonical);
-  memory.Remember(Item(1, 1), "/a", true);
-  memory.Remember(Item(1, 1), "/a", false);
-  EXPECT_TRUE(memory.Recall(Item(1, 1))->isCanonical);
-  memory.Remember(Item(1, 1), "/link/a", false);
-  EXPECT_FALSE(memory.Recall(Item(1, 1))->isCanonical);
-}
-
 TEST(PlaceMemory, ForgetsTheLeastRecentlyUsedFirst) {
   PlaceMemory memory(3 * SizeOfOnePlace());
-  memory.Remember(Item(1, 1), "/a", true);
-  memory.Remember(Item(1, 2), "/b", true);
-  memory.Remember(Item(1, 3), "/c", true);
+  memory.Remember(Item(1, 1), "/a");
+  memory.Remember(Item(1, 2), "/b");
+  memory.Remember(Item(1, 3), "/c");
   memory.Recall(Item(1, 1));
-  memory.Remember(Item(1, 2), "/b", true);
-  memory.Remember(Item(1, 4), "/d", true);
+  memory.Remember(Item(1, 2), "/b");
+  memory.Remember(Item(1, 4), "/d");
   EXPECT_EQ(memory.Recall(Item(1, 3)), nullptr);
   EXPECT_EQ(PathOf(memory.Recall(Item(1, 1))), "/a");
   EXPECT_EQ(PathOf(memory.Recall(Item(1, 2))), "/b");
@@ -82,9 +71,9 @@ TEST(PlaceMemory, ForgetsTheLeastRecentlyUsedFirst) {
 
 TEST(PlaceMemory, ForgetsAsMuchAsALongPathTakes) {
   PlaceMemory memory(20 * SizeOfOnePlace());
-  for (std::uint64_t inode = 0; inode < 20; ++inode) memory.Remember(Item(1, inode), "/a", true);
+  for (std::uint64_t inode = 0; inode < 20; ++inode) memory.Remember(Item(1, inode), "/a");
   const std::string path(10 * SizeOfOnePlace(), 'x');
-  memory.Remember(Item(2, 1), path, true);
+  memory.Remember(Item(2, 1), path);
   EXPECT_EQ(PathOf(memory.Recall(Item(2, 1))), path);
   EXPECT_EQ(memory.Recall(Item(1, 9)), nullptr);
   EXPECT_EQ(PathOf(memory.Recall(Item(1, 19))), "/a");
@@ -92,7 +81,7 @@ TEST(PlaceMemory, ForgetsAsMuchAsALongPathTakes) {
 
 TEST(PlaceMemory, WithoutRoomRemembersNothing) {
   PlaceMemory memory(SizeOfOnePlace() - 1);
-  memory.Remember(Item(1, 1), "/a", true);
+  memory.Remember(Item(1, 1), "/a");
   EXPECT_EQ(memory.Recall(Item(1, 1)), nullptr);
   EXPECT_EQ(memory.Size(), 0U);
 }
@@ -100,7 +89,7 @@ TEST(PlaceMemory, WithoutRoomRemembersNothing) {
 TEST(PlaceMemory, StaysBoundedAfterAMillionItems) {
   PlaceMemory memory(kPlenty);
   for (std::uint64_t inode = 0; inode < 1000000; ++inode) {
-    memory.Remember(Item(1, inode), "/a folder/with/a file of some name", true);
+    memory.Remember(Item(1, inode), "/a folder/with/a file of some name");
     ASSERT_LE(memory.Size(), kPlenty);
   }
   EXPECT_GT(memory.Size(), kPlenty / 2);
@@ -119,13 +108,13 @@ RC_GTEST_PROP(PlaceMemory, NeverRecallsAWrongPlace, ()) {
       memory.Recall(Item(1, inode));
     } else {
       told[inode] = "/" + std::string(length, 'x');
-      memory.Remember(Item(1, inode), told[inode], true);
+      memory.Remember(Item(1, inode), told[inode]);
     }
     RC_ASSERT(memory.Size() <= 10 * SizeOfOnePlace());
   }
   for (std::uint64_t inode = 0; inode < 20; ++inode) {
-    const PlaceMemory::Known* const place = memory.Recall(Item(1, inode));
-    if (place != nullptr) RC_ASSERT(place->path == told.at(inode));
+    const std::string* const place = memory.Recall(Item(1, inode));
+    if (place != nullptr) RC_ASSERT(*place == told.at(inode));
   }
 }
 

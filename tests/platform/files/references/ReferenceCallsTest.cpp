@@ -241,7 +241,7 @@ TEST_F(AReferenceToAnItem, WithoutAHandleFollowsItsRename) {
   auto item = files::ReadItem(AT_FDCWD, PathOf("x").c_str());
   ASSERT_TRUE(item);
   item->handle = files::FileHandle{};
-  files::RememberSighting(*item, PathOf("x"));
+  files::RememberPlace({PathOf("x"), *item});
   Move("x", "a/y");
   EXPECT_EQ(files::FindCanonicalPath(*item), PathOf("a/y"));
 }
@@ -296,7 +296,7 @@ TEST_F(AReferenceOnAVolume, FindsItsItemThoughItsPlaceIsForgotten) {
   const FSRef item = ReferenceTo(PathOf("volume/a/b/x"));
   files::ItemReference other{};
   for (other.inode = 0; other.inode < 50000; ++other.inode) {
-    files::RememberSighting(other, "/a place with a path that is as long as usual/and a name");
+    files::RememberPlace({"/a place with a path that is as long as usual/and a name", other});
   }
   EXPECT_EQ(PlaceOf(item), PathOf("volume/a/b/x"));
 }
@@ -305,7 +305,7 @@ TEST_F(AReferenceOnAVolume, FindsItsItemFromTheRootWhenNoFolderOfItsPlaceIsThere
   mFolder.MakeFolder("volume/a");
   mFolder.MakeFile("volume/a/x");
   const FSRef item = ReferenceTo(PathOf("volume/a/x"));
-  files::RememberSighting(*files::Unpack(&item), "/no such folder/x");
+  files::RememberPlace({"/no such folder/x", *files::Unpack(&item)});
   EXPECT_EQ(PlaceOf(item), PathOf("volume/a/x"));
 }
 
