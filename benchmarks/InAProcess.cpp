@@ -16,6 +16,7 @@
 #include "Measure.h"
 #include "Server.h"
 #include "support/ArgumentVector.h"
+#include "support/Pipe.h"
 
 namespace tallowmere::benchmark {
 namespace {
@@ -44,8 +45,7 @@ bool WaitForSuccess(pid_t process) {
 }  // namespace
 
 std::vector<double> InAProcess(const std::function<std::vector<double>()>& measure) {
-  std::array<int, 2> ends{};
-  if (pipe2(ends.data(), O_CLOEXEC) != 0) Fail("pipe");
+  const auto ends = test::MakePipe();
   const pid_t child = fork();
   if (child < 0) Fail("fork");
   if (child == 0) {

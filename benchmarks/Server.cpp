@@ -1,38 +1,26 @@
 #include "Server.h"
 
-#include <fcntl.h>
 #include <signal.h>
 #include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <array>
 #include <cerrno>
-#include <cstdlib>
 #include <ctime>
 #include <fstream>
 #include <system_error>
 
 #include "support/ArgumentVector.h"
+#include "support/Pipe.h"
 
 namespace tallowmere::benchmark {
-namespace {
-
-std::array<int, 2> MakePipe() {
-  std::array<int, 2> ends{};
-  if (pipe2(ends.data(), O_CLOEXEC) != 0) Fail("pipe");
-  return ends;
-}
-
-}  // namespace
-
 void Fail(const std::string& what) {
   throw std::system_error(errno, std::generic_category(), what);
 }
 
 Server::Server(const std::string& program, const std::vector<std::string>& arguments) {
-  const auto requests = MakePipe();
-  const auto answers = MakePipe();
+  const auto requests = test::MakePipe();
+  const auto answers = test::MakePipe();
   std::vector<std::string> command{program};
   command.insert(command.end(), arguments.begin(), arguments.end());
   const auto vector = test::ArgumentVector(command);

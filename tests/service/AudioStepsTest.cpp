@@ -1,7 +1,6 @@
 // The steps of a request for export settings, one by one, with a host whose components can be
 // missing, fail or leave anything behind. Its memory handles are the platform's.
 #include <QuickTime/QuickTime.h>
-#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/wait.h>
@@ -15,6 +14,7 @@
 #include "service/AudioCommands.h"
 #include "service/Commands.h"
 #include "service/Request.h"
+#include "support/Pipe.h"
 #include "support/Wire.h"
 
 namespace {
@@ -120,9 +120,8 @@ class AudioSteps : public testing::Test {
 
   // One request served by a process of its own, on pipes in the place of its standard streams.
   static Served Serve() {
-    int requests[2];
-    int responses[2];
-    if (pipe2(requests, O_CLOEXEC) != 0 || pipe2(responses, O_CLOEXEC) != 0) abort();
+    const auto requests = MakePipe();
+    const auto responses = MakePipe();
     const std::string request = ExportSettingsRequest(44100u << 16, 16, 2, "twos");
     EXPECT_EQ(write(requests[1], request.data(), request.size()), ssize_t(request.size()));
     const pid_t child = fork();
@@ -221,8 +220,7 @@ TEST_F(AudioSteps, OfAResultOf32BitsTheLow16BitsCount) {
 TEST_F(AudioSteps, ARequestThatIsCutAsksTheHostForNothing) {
   const std::string fields = ExportSettingsRequest(44100u << 16, 16, 2, "twos").substr(2);
   for (std::size_t length = 0; length < fields.size(); ++length) {
-    int ends[2];
-    ASSERT_EQ(pipe2(ends, O_CLOEXEC), 0);
+    const auto ends = MakePipe();
     EXPECT_EQ(write(ends[1], fields.data(), length), ssize_t(length));
     close(ends[1]);
     service::Channel channel(ends[0], -1);

@@ -19,6 +19,7 @@
 #include "support/DeadMount.h"
 #include "support/EveryRequest.h"
 #include "support/MountNamespace.h"
+#include "support/Pipe.h"
 #include "support/TemporaryFolder.h"
 #include "support/TracedService.h"
 #include "support/Wire.h"
@@ -164,10 +165,8 @@ class MortalParent {
  public:
   explicit MortalParent(ChildProgram::BrokenPipe brokenPipe = ChildProgram::BrokenPipe::kEnds) {
     prctl(PR_SET_CHILD_SUBREAPER, 1);
-    std::array<int, 2> toParent{};
-    std::array<int, 2> toTest{};
-    if (pipe2(toParent.data(), O_CLOEXEC) != 0 || pipe2(toTest.data(), O_CLOEXEC) != 0)
-      std::abort();
+    const auto toParent = MakePipe();
+    const auto toTest = MakePipe();
     mProcess = fork();
     if (mProcess == 0) {
       close(toParent[1]);

@@ -1,6 +1,5 @@
 #include "support/ChildProgram.h"
 
-#include <fcntl.h>
 #include <poll.h>
 #include <signal.h>
 #include <sys/ioctl.h>
@@ -14,6 +13,7 @@
 #include <utility>
 
 #include "support/ArgumentVector.h"
+#include "support/Pipe.h"
 
 namespace tallowmere::test {
 namespace {
@@ -24,12 +24,6 @@ constexpr int kStillRuns = -1000;
 
 void Close(int& descriptor) {
   if (descriptor >= 0) close(std::exchange(descriptor, -1));
-}
-
-std::array<int, 2> MakePipe() {
-  std::array<int, 2> ends{};
-  if (pipe2(ends.data(), O_CLOEXEC) != 0) std::abort();
-  return ends;
 }
 
 std::size_t UnreadOf(int pipe) {

@@ -14,6 +14,8 @@
 #include <cstring>
 #include <vector>
 
+#include "support/DescriptorMessage.h"
+
 namespace {
 
 constexpr std::array kGoingOn{SYS_sendmsg, SYS_execve, SYS_exit_group, SYS_brk,
@@ -35,20 +37,13 @@ int Listener() {
 }
 
 bool Send(int socket, int descriptor) {
-  char byte = 0;
-  iovec data{&byte, 1};
-  alignas(cmsghdr) std::array<char, CMSG_SPACE(sizeof descriptor)> control{};
-  msghdr message{};
-  message.msg_iov = &data;
-  message.msg_iovlen = 1;
-  message.msg_control = control.data();
-  message.msg_controllen = control.size();
-  cmsghdr* const header = CMSG_FIRSTHDR(&message);
+  tallowmere::test::DescriptorMessage sent;
+  cmsghdr* const header = CMSG_FIRSTHDR(&sent.message);
   header->cmsg_level = SOL_SOCKET;
   header->cmsg_type = SCM_RIGHTS;
   header->cmsg_len = CMSG_LEN(sizeof descriptor);
   std::memcpy(CMSG_DATA(header), &descriptor, sizeof descriptor);
-  return sendmsg(socket, &message, 0) == 1;
+  return sendmsg(socket, &sent.message, 0) == 1;
 }
 
 }  // namespace

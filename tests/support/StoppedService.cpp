@@ -11,23 +11,18 @@
 #include <cstring>
 #include <utility>
 
+#include "support/DescriptorMessage.h"
+
 namespace tallowmere::test {
 namespace {
 
 // The descriptor that comes out of a socket; -1 when none does.
 int Receive(int socket) {
-  char byte = 0;
-  iovec data{&byte, 1};
-  int descriptor = -1;
-  alignas(cmsghdr) std::array<char, CMSG_SPACE(sizeof descriptor)> control{};
-  msghdr message{};
-  message.msg_iov = &data;
-  message.msg_iovlen = 1;
-  message.msg_control = control.data();
-  message.msg_controllen = control.size();
-  if (recvmsg(socket, &message, MSG_CMSG_CLOEXEC) != 1) return -1;
-  const cmsghdr* const header = CMSG_FIRSTHDR(&message);
+  DescriptorMessage received;
+  if (recvmsg(socket, &received.message, MSG_CMSG_CLOEXEC) != 1) return -1;
+  const cmsghdr* const header = CMSG_FIRSTHDR(&received.message);
   if (header == nullptr || header->cmsg_type != SCM_RIGHTS) return -1;
+  int descriptor = -1;
   std::memcpy(&descriptor, CMSG_DATA(header), sizeof descriptor);
   return descriptor;
 }
