@@ -23,15 +23,23 @@ std::string_view AtTheEndOfABlock(std::string_view bytes) {
   return {begin, bytes.size()};
 }
 
-// Whether the text stands where the answer has its string, with its NUL and its count.
-void CheckString(std::string_view answer, std::size_t at, const std::optional<std::string>& text) {
+// The number of two bytes at a place, the low one first.
+std::uint16_t NumberAt(std::string_view bytes, std::size_t at) {
+  const auto low = static_cast<unsigned char>(bytes[at]);
+  const auto high = static_cast<unsigned char>(bytes[at + 1]);
+  return static_cast<std::uint16_t>(low | high << 8);
+}
+
+// Whether the text stands where the answer has its string, with its NUL and its count. None is
+// given when there is to be none, and for an empty one.
+void CheckString(std::string_view answer, std::size_t at, bool isThere,
+                 const std::optional<std::string>& text) {
+  const std::uint16_t count = NumberAt(answer, at);
+  Check(text.has_value() == (isThere && count > 1));
   if (!text) return;
-  const std::string_view counted = answer.substr(at);
-  const auto count =
-      static_cast<unsigned char>(counted[0]) + 256u * static_cast<unsigned char>(counted[1]);
   Check(!text->empty() && count == text->size() + 1);
   Check(text->find('\0') == std::string::npos);
-  Check(counted.substr(2, count) == std::string_view(text->c_str(), text->size() + 1));
+  Check(answer.substr(at + 2, count) == std::string_view(text->c_str(), text->size() + 1));
 }
 
 // Reads an answer of a kind and compares what it gives with the bytes.
@@ -46,30 +54,34 @@ void ReadAndCompare(AnswerReader& answer, std::string_view bytes, unsigned kind,
       const auto path = answer::ReadFullPath(answer, size);
       if (!isWhole()) return;
       Check(answer.Size() == sizeof path.wholeLength + size + protocol::kTrailer.size());
+      Check(path.wholeLength == NumberAt(bytes, 0));
       Check(path.text.size() < size && bytes.substr(2, path.text.size()) == path.text);
-      Check(bytes[2 + path.text.size()] == '\0');
+      Check(bytes.find('\0', 2) == 2 + path.text.size());
       return;
     }
     case kPathByResult: {
       const auto path = answer::ReadPathByResult(answer);
-      if (isWhole()) CheckString(bytes, sizeof(std::int16_t), path);
+      if (isWhole()) CheckString(bytes, sizeof(std::int16_t), NumberAt(bytes, 0) == 0, path);
       return;
     }
     case kStringByFlag: {
       const auto text = answer::ReadStringByFlag(answer);
-      if (!isWhole()) return;
-      Check(bytes[0] == 1 || !text);
-      CheckString(bytes, 1, text);
+      if (isWhole()) CheckString(bytes, 1, bytes[0] == 1, text);
       return;
     }
     case kVolumeNumber: {
       const auto number = answer::ReadVolumeNumber(answer);
-      if (isWhole()) Check(number != protocol::kNoVolume);
+      if (!isWhole()) return;
+      const auto told = static_cast<std::int16_t>(NumberAt(bytes, 0));
+      Check(number.has_value() == (told != protocol::kNoVolume));
+      Check(!number || *number == told);
       return;
     }
     case kSpec: {
       const auto spec = answer::ReadSpec(answer);
-      if (!isWhole() || !spec) return;
+      if (!isWhole()) return;
+      Check(spec.has_value() == (bytes[0] == 1));
+      if (!spec) return;
       Check(spec->name.size() <= protocol::kLongestSpecName);
       const std::string record = EncodeFSSpec(*spec);
       Check(DecodeFSSpec(record) == spec);
@@ -80,6 +92,7 @@ void ReadAndCompare(AnswerReader& answer, std::string_view bytes, unsigned kind,
     default: {
       const auto settings = answer::ReadExportSettings(answer);
       if (!isWhole()) return;
+      Check(settings.result == static_cast<std::int16_t>(NumberAt(bytes, 0)));
       Check(answer.Size() == 6 + settings.bytes.size() + protocol::kTrailer.size());
       Check(bytes.substr(6, settings.bytes.size()) == settings.bytes);
     }

@@ -42,14 +42,26 @@ bool IsSame(const Mount& a, const Mount& b) {
          a.mountPoint == b.mountPoint && a.type == b.type;
 }
 
-void CheckMounts(const std::vector<Mount>& mounts) {
+// Whether the mounts are all read from their lines.
+void CheckLinesOf(const std::vector<Mount>& mounts) {
   std::string table;
-  for (const Mount& mount : mounts) {
-    Check(mount.mountPoint.starts_with('/') && !mount.root.empty() && !mount.type.empty());
-    AppendLine(table, mount);
-  }
+  for (const Mount& mount : mounts) AppendLine(table, mount);
   const std::vector<Mount> again = files::ParseMountInfo(table);
   Check(std::equal(mounts.begin(), mounts.end(), again.begin(), again.end(), IsSame));
+}
+
+void CheckMounts(const std::vector<Mount>& mounts) {
+  for (const Mount& mount : mounts) {
+    Check(mount.mountPoint.starts_with('/') && !mount.root.empty() && !mount.type.empty());
+  }
+  CheckLinesOf(mounts);
+}
+
+// Whether two mounts are read whose places have the text, which the kernel could tell.
+void CheckMountsAt(std::string_view text) {
+  const std::string path = "/" + std::string(text.substr(0, text.find('\0')));
+  CheckLinesOf(
+      {{1, 2, makedev(8, 1), path, path, "ext4"}, {3, 1, makedev(0, 44), "/", path, "tmpfs"}});
 }
 
 void CheckVolumes(const std::vector<Mount>& mounts, std::size_t root) {
@@ -83,8 +95,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   using namespace tallowmere::fuzz;
   Input input(data, size);
   const std::size_t root = input.TakeByte();
-  const auto mounts = tallowmere::files::ParseMountInfo(input.Rest());
+  const std::string_view text = input.Rest();
+  const auto mounts = tallowmere::files::ParseMountInfo(text);
   CheckMounts(mounts);
+  CheckMountsAt(text);
   if (!mounts.empty()) CheckVolumes(mounts, root % mounts.size());
   return 0;
 }

@@ -28,9 +28,10 @@ using Path = std::optional<std::string>;
 
 // Links on the way followed, one in the last place not.
 Path CanonicalPath(const std::string& path) {
-  const std::string name(*foundation::LastComponent(path));
+  const std::string_view name = *foundation::LastComponent(path);
   if (name == "/" || name == "." || name == "..") return RealPath(path);
-  const auto folder = RealPath(foundation::ParentPath(path));
+  const auto length = static_cast<std::size_t>(name.data() - path.data());
+  const auto folder = RealPath(path.substr(0, length));
   if (!folder) return std::nullopt;
   return foundation::JoinPath(*folder, name);
 }
@@ -52,6 +53,10 @@ constexpr std::uint64_t kForItsPathAlone = O_PATH | O_NOFOLLOW | O_CLOEXEC;
 
 // As OpenWithoutLinks, folder by folder: an open link has nothing in it.
 Descriptor OpenStepByStep(std::string_view path) {
+  if (path.size() >= PATH_MAX) {
+    errno = ENAMETOOLONG;
+    return Descriptor();
+  }
   Descriptor item(open("/", kForItsPathAlone));
   while (item.IsOpen() && path.size() > 1) {
     path.remove_prefix(1);
@@ -86,7 +91,7 @@ std::optional<ReachedItem> Reach(const std::string& path) {
   }
   const Path canonical = CanonicalPath(path);
   if (!canonical) return std::nullopt;
-  Descriptor descriptor(open(canonical->c_str(), kForItsPathAlone));
+  Descriptor descriptor = OpenWithoutLinks(*canonical);
   if (!descriptor.IsOpen()) return std::nullopt;
   return ReachedItem{*canonical, std::move(descriptor)};
 }
@@ -113,7 +118,7 @@ std::string NearestFolder(const VolumePointer& volume, const std::string& former
   const VolumePointer former = table.OfPath(formerPlace);
   const bool isNear = former && former->Number() == volume->Number() && IsSpelledOut(formerPlace);
   for (std::string path = formerPlace; isNear && path != "/";) {
-    path = FolderOf(path);
+    path = foundation::FolderOf(path);
     if (!table.IsReachable(*former, path)) continue;
     const Descriptor descriptor = OpenWithoutLinks(path);
     const auto folder = descriptor.IsOpen() ? ReadStatus(descriptor.Get(), "") : std::nullopt;
@@ -175,7 +180,8 @@ FolderIndex& IndexOf(const VolumePointer& volume) {
 // How often what a pass has found may be gone, or elsewhere, when it is looked at again.
 constexpr int kMostPasses = 3;
 
-// What `check` makes of the path to an item that a pass finds; none when it finds none.
+// What `check` makes of the path to an item that a pass finds; none when it finds none. The folders
+// near a former place, of this item or another, are looked through first.
 template <class Check>
 auto FindByPass(const VolumePointer& volume, const SearchedItem& item, const std::string& near,
                 const Check& check) -> decltype(check(near)) {
@@ -193,11 +199,13 @@ struct SettledVolume {
   Place root;
 };
 
-// The kernel does not signal that a folder above a mount point was renamed.
+// The kernel does not signal that a folder above a mount point was renamed, which can have left a
+// link.
 std::optional<SettledVolume> Settle(const VolumePointer& volume) {
   MountTable& table = MountTable::OfThisProcess();
   for (VolumePointer current = volume; current;) {
-    const auto root = ReadStatus(AT_FDCWD, current->MountPoint().c_str());
+    const Descriptor held = OpenWithoutLinks(current->MountPoint());
+    const auto root = held.IsOpen() ? ReadStatus(held.Get(), "") : std::nullopt;
     const bool isThere = root && current->Root() && AreEqual(root->item, *current->Root());
     Place place{current->MountPoint(), isThere ? root->item : ItemReference{}};
     if (isThere && IsOnVolume(volume, place)) {
@@ -260,9 +268,19 @@ std::optional<OpenFolder> AsFolder(const std::string& path, Descriptor descripto
                     std::make_shared<const Descriptor>(std::move(descriptor))};
 }
 
-// The folder at the end of a path, links followed. No automounter is asked at its end.
-std::optional<OpenFolder> Follow(const std::string& path) {
-  return AsFolder(path, Descriptor(open(path.c_str(), O_PATH | O_CLOEXEC)));
+// The folder at the end of a path, as in openat(2), links followed. No automounter is asked at its
+// end.
+std::optional<OpenFolder> Follow(int from, const std::string& path) {
+  return AsFolder(path, Descriptor(openat(from, path.c_str(), O_PATH | O_CLOEXEC)));
+}
+
+// A folder that was found by following an absolute path, at its canonical path. A path that leads
+// through a link of /proc can spell another folder than the one it is in.
+std::optional<OpenFolder> AtRealPath(const OpenFolder& found, const std::string& path) {
+  const auto real = RealPath(path);
+  auto folder = real ? OpenFolderAt(*real) : std::nullopt;
+  if (folder && !IsSame(folder->place.item, found.place.item)) return std::nullopt;
+  return folder;
 }
 
 }  // namespace
@@ -283,7 +301,7 @@ bool Holds(const OpenFolder& folder, const ItemReference& item, std::string_view
 }
 
 std::optional<OpenFolder> Open(const Place& folder) {
-  auto found = Follow(folder.path);
+  auto found = Follow(AT_FDCWD, folder.path);
   if (!found || !IsSame(found->place.item, folder.item)) return std::nullopt;
   return found;
 }
@@ -295,17 +313,25 @@ std::optional<OpenFolder> OpenFolderAt(const std::string& path) {
 }
 
 std::optional<OpenFolder> OpenHolderOf(const std::string& path) {
-  const std::string folder = FolderOf(path);
+  const std::string folder = foundation::FolderOf(path);
   auto found = OpenFolderAt(folder);
   if (!found && (errno == ELOOP || errno == ENOTDIR)) {
-    const auto followed = Follow(folder);
-    const auto real = followed ? RealPath(folder) : std::nullopt;
-    found = real ? OpenFolderAt(*real) : std::nullopt;
-    // A path that leads through a link of /proc can spell another folder than the one it is in.
-    if (found && !IsSame(found->place.item, followed->place.item)) return std::nullopt;
+    const auto followed = Follow(AT_FDCWD, folder);
+    if (followed) found = AtRealPath(*followed, folder);
   }
   if (found) RememberPlace(found->place);
   return found;
+}
+
+Spot SpotOf(const Place& item, const OpenFolder& folder) {
+  std::string name(*foundation::LastComponent(item.path));
+  const bool isInFolder = item.path == foundation::JoinPath(folder.place.path, name);
+  return isInFolder ? Spot{folder.descriptor->Get(), std::move(name)} : Spot{AT_FDCWD, item.path};
+}
+
+std::optional<OpenFolder> OpenBehindLink(const Spot& link, const std::string& path) {
+  const auto found = Follow(link.folder, link.name);
+  return found ? AtRealPath(*found, path) : std::nullopt;
 }
 
 std::optional<std::string> RealPath(const std::string& path) {
@@ -315,10 +341,6 @@ std::optional<std::string> RealPath(const std::string& path) {
   const std::unique_ptr<char, Free> real(realpath(path.c_str(), nullptr));
   if (!real) return std::nullopt;
   return std::string(real.get());
-}
-
-std::string FolderOf(const std::string& path) {
-  return foundation::WithFolderMark(foundation::ParentPath(path), false);
 }
 
 // Where the kernel does not tell the mount, only the canonical path tells the volume.
@@ -398,9 +420,7 @@ std::optional<OpenFolder> OpenWithID(const VolumePointer& volume, std::uint32_t 
   auto found = last ? OpenFolderAt(*last) : std::nullopt;
   if (found && WithID(volume, id, true, found->place)) return found;
   const auto place = FindItem(volume, id, true);
-  if (place) return Open(*place);
-  errno = ENOENT;
-  return std::nullopt;
+  return place ? Open(*place) : std::nullopt;
 }
 
 }  // namespace tallowmere::files

@@ -50,11 +50,22 @@ std::optional<OpenFolder> OpenFolderAt(const std::string& path);
 // and errno tells, when there is none or no path leads to it.
 std::optional<OpenFolder> OpenHolderOf(const std::string& path);
 
-// The canonical path of a folder that a path leads to, all links followed.
-std::optional<std::string> RealPath(const std::string& path);
+// Where to look for an item, as in openat(2).
+struct Spot {
+  int folder;
+  std::string name;
+};
 
-// The folder that holds a path, which must not be "/".
-std::string FolderOf(const std::string& path);
+// The spot of an item that was found by way of an open folder: in this very folder, unless another
+// mount shows it. Valid as long as the folder.
+Spot SpotOf(const Place& item, const OpenFolder& folder);
+
+// The folder to which the link at a spot leads, which is at `path` as well. None, and errno tells,
+// as above.
+std::optional<OpenFolder> OpenBehindLink(const Spot& link, const std::string& path);
+
+// The canonical path of what a path leads to, all links followed. None, and errno tells.
+std::optional<std::string> RealPath(const std::string& path);
 
 // The path at which an item was last seen, with links on the way perhaps, but without ".", ".." and
 // empty components. None when it is not remembered. Nothing is looked at.
@@ -70,7 +81,7 @@ std::optional<std::string> FindCanonicalPath(const ItemReference& item);
 // and when it is not certain which item that is.
 std::optional<Place> FindItem(const VolumePointer& volume, std::uint32_t id, bool folder);
 
-// The folder with a node id on a volume. None, and errno tells, when there is none.
+// The folder with a node id on a volume. None when there is none, as FindItem says.
 std::optional<OpenFolder> OpenWithID(const VolumePointer& volume, std::uint32_t id);
 
 // An item as FindItem gives it, without reading a folder: none too when the item has no remembered

@@ -34,12 +34,16 @@ VolumePointer VolumeOfItem(const Place& item) {
   return HoldingFolder(item, nullptr, folder) == noErr ? folder.volume : nullptr;
 }
 
-OSErr GiveReference(const Place& place, FSRef* reference) {
+OSErr GiveReference(const Place& place, const Spot& spot, FSRef* reference) {
   ItemReference item = place.item;
-  ReadProof(item, AT_FDCWD, place.path.c_str());
+  ReadProof(item, spot.folder, spot.name.c_str());
   RememberPlace(place);
   *reference = Pack(item);
   return noErr;
+}
+
+OSErr GiveReference(const Place& place, FSRef* reference) {
+  return GiveReference(place, {AT_FDCWD, place.path}, reference);
 }
 
 OSErr FillInfo(const Place& item, FSCatalogInfoBitmap whichInfo, FSCatalogInfo& info) {
@@ -66,8 +70,9 @@ OSErr FillParent(const Place& item, FSRef& parent) {
   const VolumePointer volume = VolumeOf(item, nullptr);
   if (IsRootOf(volume, item)) return noErr;
   Folder folder;
-  const OSErr error = HoldingFolder(item, volume, folder);
-  return error == noErr ? GiveReference(folder.place, &parent) : error;
+  if (const OSErr error = HoldingFolder(item, volume, folder)) return error;
+  if (!Holds(folder, item.item, *LastComponent(item.path))) return fnfErr;
+  return GiveReference(folder.place, {folder.descriptor->Get(), ""}, &parent);
 }
 
 // What was asked of an item, where one is told.
@@ -93,26 +98,46 @@ OSErr Describe(const Place& item, const Description& wanted) {
   return error;
 }
 
-// The folder with an id that is not its volume's root, seen in the folder that holds it.
-OSErr FindInHolder(const VolumePointer& volume, UInt32 id, const std::string& path, Place& folder,
-                   Folder& holder) {
-  if (const OSErr error = HoldingFolder({path, {}}, volume, holder)) return error;
+// Sees the folder with an id, not its volume's root, in the folder that holds it by a path.
+OSErr SeeInHolder(const VolumePointer& volume, UInt32 id, const std::string& path, Place& folder,
+                  Folder& holder) {
+  if (const OSErr error = HoldingFolder({path, {}}, volume, holder)) return OnTheWay(error);
   const std::string name(*LastComponent(path));
   const auto found = ReadStatus(holder.descriptor->Get(), name.c_str());
-  if (!found || !S_ISDIR(found->item.type)) return fnfErr;
+  if (!found || !S_ISDIR(found->item.type)) return dirNFErr;
   folder = {JoinPath(holder.place.path, name), found->item};
   const VolumePointer own = VolumeOf(folder, volume);
   const bool isIt = own && own->Root() && own->Number() == volume->Number() &&
                     NodeIDOf(folder.item, *own->Root()) == id;
-  return isIt ? noErr : fnfErr;
+  return isIt ? noErr : dirNFErr;
 }
 
+// Of the places of a folder one where its own volume holds it, if there is one: a part of a volume
+// can be mounted by itself.
+void PreferItsVolume(const VolumePointer& volume, UInt32 id, Place& folder, Folder& holder) {
+  if (holder.volume->Number() == volume->Number()) return;
+  for (const std::string& path : volume->PathsOf(folder.path, folder.item.mount)) {
+    Place other;
+    Folder otherHolder;
+    if (SeeInHolder(volume, id, path, other, otherHolder) != noErr) continue;
+    if (otherHolder.volume->Number() != volume->Number()) continue;
+    folder = std::move(other);
+    holder = std::move(otherHolder);
+    return;
+  }
+}
+
+// The folder with an id that is not its volume's root, and the folder that holds it.
 OSErr FindInHolder(const VolumePointer& volume, UInt32 id, Place& folder, Folder& holder) {
   const auto last = LastPathOf(*volume, id);
-  if (last && FindInHolder(volume, id, *last, folder, holder) == noErr) return noErr;
-  const auto found = FindItem(volume, id, true);
-  return found ? FindInHolder(volume, id, found->path, folder, holder)
-               : static_cast<OSErr>(dirNFErr);
+  const bool isThere = last && SeeInHolder(volume, id, *last, folder, holder) == noErr;
+  if (!isThere) {
+    const auto found = FindItem(volume, id, true);
+    if (!found) return dirNFErr;
+    if (const OSErr error = SeeInHolder(volume, id, found->path, folder, holder)) return error;
+  }
+  PreferItsVolume(volume, id, folder, holder);
+  return noErr;
 }
 
 }  // namespace
@@ -182,7 +207,7 @@ OSErr FSpMakeFSRef(const FSSpec* spec, FSRef* newRef) {
     if (const OSErr error = FolderWithID(spec->vRefNum, id, folder)) return error;
     Place item;
     if (const OSErr error = LookUpHFSName(folder, name, item)) return error;
-    return GiveReference(item, newRef);
+    return GiveReference(item, SpotOf(item, folder), newRef);
   });
 }
 

@@ -57,18 +57,10 @@ void ReserveFor(Container& container, std::size_t more) {
   if (size > container.capacity()) container.reserve(size + size / 4);
 }
 
-bool MeansGone(int error) {
-  return error == ENOENT || error == ENOTDIR || error == ELOOP;
-}
-
 // Whether an error hides what could be found: what is gone cannot, nor what this process may not
 // read, nor what has no path.
 bool HidesSomething(int error) {
   return !MeansGone(error) && error != EACCES && error != ENAMETOOLONG;
-}
-
-std::string WithoutFolderMark(const std::string& path) {
-  return foundation::WithFolderMark(path, false);
 }
 
 }  // namespace
@@ -218,7 +210,7 @@ std::vector<std::string> FolderIndex::StartsFrom(const std::string& start) const
     return std::find(mountPoints.begin(), mountPoints.end(), path) != mountPoints.end();
   };
   std::vector<std::string> starts;
-  for (std::string path = start;; path = WithoutFolderMark(foundation::ParentPath(path))) {
+  for (std::string path = start;; path = foundation::FolderOf(path)) {
     starts.push_back(path);
     if (path == "/" || isMountPoint(path)) break;
   }

@@ -5,10 +5,9 @@
 // kept. A pass stops as soon as the answer is certain and goes on from there for the next question.
 // A folder that was read is read again only when its change time has moved, when something is
 // mounted in it, when it could not be read, or when a file is looked for: whoever looks for a file
-// reads every folder once. An
-// id that no item had is noted, and the next question for it reads only what has changed since. The
-// index never leaves its volume, waits for no server and no automounter, and passes over what it
-// may not read. Between two questions it has nothing open.
+// reads every folder once. An id that no item had is noted, and the next question for it reads only
+// what has changed since. The index never leaves its volume, waits for no server and no
+// automounter, and passes over what it may not read. Between two questions it has nothing open.
 //
 // One thread. Everything may throw std::bad_alloc, after which the index is as good as new.
 #pragma once

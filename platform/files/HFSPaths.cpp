@@ -15,6 +15,7 @@
 
 using namespace tallowmere::files;
 using tallowmere::foundation::JoinPath;
+using tallowmere::foundation::LastComponent;
 using tallowmere::foundation::OrError;
 
 namespace {
@@ -45,25 +46,17 @@ Steps ReadPath(std::string_view path) {
   return steps;
 }
 
-// On the way a missing item is a missing folder.
-OSErr OnTheWay(OSErr error) {
-  if (error == fnfErr) return dirNFErr;
-  return error;
-}
-
-// `near` as for VolumeOf.
-OSErr UseAsFolder(const Place& place, const VolumePointer& near, Folder& folder) {
-  auto found = S_ISDIR(place.item.type) ? Open(place) : std::nullopt;
-  if (!found) return dirNFErr;
-  folder = {*std::move(found), VolumeOf(place, near)};
+// A folder that was looked for, if it was found; else errno tells. `near` as for VolumeOf.
+OSErr Use(std::optional<OpenFolder> found, const VolumePointer& near, Folder& folder) {
+  if (!found) return OnTheWay(ErrorOfSystem());
+  folder = {*std::move(found), nullptr};
+  folder.volume = VolumeOf(folder.place, near);
   return folder.volume && folder.volume->Root() ? noErr : nsvErr;
 }
 
-OSErr FolderAt(const std::string& path, Folder& folder) {
-  const auto real = RealPath(path);
-  if (!real) return OnTheWay(ErrorOfSystem());
-  const auto place = PlaceAt(*real);
-  return place ? UseAsFolder(*place, nullptr, folder) : static_cast<OSErr>(dirNFErr);
+OSErr CurrentFolder(Folder& folder) {
+  const auto path = RealPath(".");
+  return Use(path ? OpenFolderAt(*path) : std::nullopt, nullptr, folder);
 }
 
 OSErr RootOf(const VolumePointer& volume, Folder& folder) {
@@ -74,7 +67,7 @@ OSErr RootOf(const VolumePointer& volume, Folder& folder) {
 OSErr StartingFolder(SInt16 vRefNum, SInt32 dirID, std::string_view volumeName, Folder& folder) {
   MountTable& table = MountTable::OfThisProcess();
   if (!volumeName.empty()) return RootOf(table.WithName(volumeName), folder);
-  if (vRefNum == 0 && dirID == 0) return FolderAt(".", folder);
+  if (vRefNum == 0 && dirID == 0) return CurrentFolder(folder);
   if (dirID == 0) return RootOf(table.WithNumber(vRefNum), folder);
   return FolderWithID(vRefNum, static_cast<UInt32>(dirID), folder);
 }
@@ -85,14 +78,17 @@ OSErr Step(std::string_view name, Folder& folder) {
     if (IsRootOf(folder.volume, folder.place)) return dirNFErr;
     Folder above;
     const OSErr error = HoldingFolder(folder.place, folder.volume, above);
-    if (error == noErr) folder = above;
-    return OnTheWay(error);
+    if (error != noErr) return OnTheWay(error);
+    if (!Holds(above, folder.place.item, *LastComponent(folder.place.path))) return dirNFErr;
+    folder = std::move(above);
+    return noErr;
   }
   Place item;
   const OSErr error = LookUpHFSName(folder, name, item);
   if (error != noErr) return OnTheWay(error);
-  if (S_ISLNK(item.item.type)) return FolderAt(item.path, folder);
-  return UseAsFolder(item, folder.volume, folder);
+  const bool isLink = S_ISLNK(item.item.type);
+  return Use(isLink ? OpenBehindLink(SpotOf(item, folder), item.path) : Open(item), folder.volume,
+             folder);
 }
 
 // The folder that steps from a volume's root lead to, when one look tells it: what has their names

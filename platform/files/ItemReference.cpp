@@ -42,6 +42,10 @@ std::optional<ItemReference> Unpack(const FSRef* reference) {
   return item;
 }
 
+bool MeansGone(int error) {
+  return error == ENOENT || error == ENOTDIR || error == ELOOP;
+}
+
 bool HasHandle(const ItemReference& item) {
   return item.handle.size != 0;
 }

@@ -76,6 +76,9 @@ struct ItemStatus {
 // As ReadItem, in one system call.
 std::optional<ItemStatus> ReadStatus(int folder, const char* name);
 
+// Whether a system error says that nothing is there: none that only hides it.
+bool MeansGone(int error);
+
 // Whether this very item is there now, on whichever mount.
 bool IsAt(const ItemReference& item, int folder, const char* name);
 

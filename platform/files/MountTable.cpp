@@ -267,9 +267,8 @@ MountTable::State MountTable::StateOf(const std::vector<Mount>& mounts, int root
   std::multimap<int, std::string> byParent;  // mount points
   for (const Mount& mount : mounts) {
     byParent.emplace(mount.parent, mount.mountPoint);
-    const std::size_t slash = mount.mountPoint.rfind('/');
     state.mountPoints.insert(mount.mountPoint);
-    state.holders.insert(mount.mountPoint.substr(0, std::max<std::size_t>(slash, 1)));
+    state.holders.insert(foundation::FolderOf(mount.mountPoint));
     mountIDs.insert(mount.id);
   }
   for (const auto& indexes : GroupIntoVolumes(mounts, rootID, IsFolder)) {

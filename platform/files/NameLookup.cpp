@@ -263,17 +263,8 @@ std::optional<std::string> HFSNameOf(const Folder& folder, const Place& item, st
 }
 
 OSErr ErrorOfSystem() {
-  switch (errno) {
-    case ENOENT:
-    case ENOTDIR:
-    case ENAMETOOLONG:
-      return fnfErr;
-    case EACCES:
-    case EPERM:
-      return afpAccessDenied;
-    default:
-      return ioErr;
-  }
+  if (MeansGone(errno) || errno == ENAMETOOLONG) return fnfErr;
+  return errno == EACCES || errno == EPERM ? afpAccessDenied : ioErr;
 }
 
 }  // namespace tallowmere::files

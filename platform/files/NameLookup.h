@@ -26,8 +26,8 @@ struct Folder : OpenFolder {
 
 // The item with an HFS name in a folder, in this order: the precomposed name; the decomposed one;
 // the one entry whose HFS form is the same; the entry without a name of its own whose short form it
-// is. fnfErr when there is
-// none, or no single one; else the error of the look (afpAccessDenied, ioErr).
+// is. fnfErr when there is none, or no single one; else the error of the look (afpAccessDenied,
+// ioErr).
 OSErr LookUpHFSName(const Folder& folder, std::string_view name, Place& item);
 
 // The HFS name of an item of a folder, at most `limit` bytes: by it LookUpHFSName finds this very

@@ -38,6 +38,11 @@ bool IsRootOf(const VolumePointer& volume, const Place& item) {
   return volume && volume->Root() && AreEqual(*volume->Root(), item.item);
 }
 
+OSErr OnTheWay(OSErr error) {
+  if (error == fnfErr) return dirNFErr;
+  return error;
+}
+
 OSErr HoldingFolder(const Place& item, const VolumePointer& near, Folder& folder) {
   if (item.path == "/") return fnfErr;
   auto found = OpenHolderOf(item.path);

@@ -15,6 +15,9 @@ VolumePointer VolumeOf(const Place& item, const VolumePointer& near);
 // Whether an item is the root folder of its volume, which can be null.
 bool IsRootOf(const VolumePointer& volume, const Place& item);
 
+// The result code for a folder with that of an item: one that is missing is a missing folder.
+OSErr OnTheWay(OSErr error);
+
 // The folder that holds an item, with its volume, `near` as above. The item's path need not be
 // canonical. nsvErr when that folder is on no volume; fnfErr for "/", which nothing holds.
 OSErr HoldingFolder(const Place& item, const VolumePointer& near, Folder& folder);

@@ -1,5 +1,7 @@
 #include "foundation/PathText.h"
 
+#include <algorithm>
+
 #include "foundation/PercentEncoding.h"
 
 namespace tallowmere::foundation {
@@ -12,7 +14,8 @@ std::string_view WithoutTrailingSlashes(std::string_view path) {
 
 constexpr std::string_view kLongestDotDot = "%2E%2E";
 
-// Whether a component is "." or "..", which "%2E" spells too (RFC 3986, section 2.3).
+// Whether a component of a URL's path is "." or "..", which "%2E" spells too (RFC 3986, section
+// 2.3).
 bool IsDotOrDotDot(std::string_view component) {
   if (component.size() > kLongestDotDot.size()) return false;
   const std::string bytes = PercentDecode(component);
@@ -45,6 +48,10 @@ std::string ParentPath(std::string_view path) {
   if (IsDotOrDotDot(trimmed.substr(lastStart))) return WithFolderMark(path, true) + "../";
   if (lastStart == 0) return "./";
   return std::string(trimmed.substr(0, lastStart));
+}
+
+std::string FolderOf(std::string_view path) {
+  return std::string(path.substr(0, std::max<std::size_t>(path.rfind('/'), 1)));
 }
 
 std::string JoinPath(std::string_view path, std::string_view component) {

@@ -1,7 +1,7 @@
 // Components, extension and folder mark of a path with "/" between its components.
 //
-// Every function takes a path as Linux spells it or percent-encoded as in a URL, and answers in the
-// same form.
+// A path is as Linux spells it or percent-encoded as in a URL, but for HasFolderMark and
+// ParentPath, for which "%2E" is ".", and FolderOf, for which it is a name.
 #pragma once
 
 #include <optional>
@@ -17,12 +17,16 @@ std::string WithFolderMark(std::string_view path, bool folder);
 // The last component without the folder mark: "/a/b/" → "b", "/" → "/". None for an empty path.
 std::optional<std::string_view> LastComponent(std::string_view path);
 
-// Whether the path ends in "/" or its last component is "." or "..".
+// Whether the path of a URL ends in "/" or its last component is "." or "..".
 bool HasFolderMark(std::string_view path);
 
-// The containing folder, with the folder mark: "/a/b/" → "/a/", "/" → "/", "a" → "./",
-// "a/.." → "a/../../". REQUIRES: the path is not empty.
+// The containing folder of a URL's path, with the folder mark: "/a/b/" → "/a/", "/" → "/",
+// "a" → "./", "a/.." → "a/../../". REQUIRES: the path is not empty.
 std::string ParentPath(std::string_view path);
+
+// The path of the folder that holds an item of Linux, without the folder mark: "/a/b" → "/a",
+// "/a" → "/". REQUIRES: the path is absolute and not "/", without a folder mark.
+std::string FolderOf(std::string_view path);
 
 // The path and a component with a "/" between them, unless the path is empty or ends in one.
 std::string JoinPath(std::string_view path, std::string_view component);

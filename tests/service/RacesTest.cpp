@@ -18,6 +18,7 @@
 #include <tuple>
 
 #include "support/EveryRequest.h"
+#include "support/MountNamespace.h"
 #include "support/SmallRoot.h"
 #include "support/StoppedService.h"
 #include "support/TemporaryFolder.h"
@@ -270,6 +271,62 @@ INSTANTIATE_TEST_SUITE_P(AtEachCall, Races,
                                           testing::Values(kName, kLongName)),
                          NameOfCase);
 
+// --- Names with a way -------------------------------------------------------------------------
+
+// What a name leads to by way of another folder than the one that was asked: "first" is exchanged
+// with "second" in mid-question.
+struct Way {
+  const char* text;      // what Tests are called
+  const char* asked;     // the folder whose number is in the question
+  const char* name;      // and the name, as an HFS path
+  const char* expected;  // empty when there is no such item
+};
+
+class RacesOnAWay : public InSmallRoot, public testing::WithParamInterface<Way> {};
+
+TEST_P(RacesOnAWay, LeadIntoNoFolderThatWasNeverOnIt) {
+  const Way& way = GetParam();
+  bool isChanged = true;
+  int call = 0;
+  for (; isChanged; ++call) {
+    const TemporaryFolder top;
+    for (const char* const folder :
+         {"targets/1", "targets/2", "first/inner", "second/other", "second/inner"}) {
+      std::ofstream(top.MakeFolder(folder) / kName) << folder;
+    }
+    fs::create_symlink(top.Path() / "targets/1", top.Path() / "first/link");
+    fs::create_symlink(top.Path() / "targets/2", top.Path() / "second/link");
+    StoppedService service(ServiceToRace());
+    if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
+    const Item asked = ItemAt(service.Streams(), top.Path() / way.asked / kName);
+    const auto expected =
+        *way.expected == '\0' ? std::nullopt : IdentityOf(top.Path() / way.expected);
+
+    service.ChangeAt(call, [&] {
+      ASSERT_EQ(renameat2(AT_FDCWD, (top.Path() / "first").c_str(), AT_FDCWD,
+                          (top.Path() / "second").c_str(), RENAME_EXCHANGE),
+                0);
+    });
+    const std::string response =
+        Answer(service.Streams(), 8, PathOfPartsRequest(asked.volume, asked.folderID, way.name, 0));
+    isChanged = service.HasChanged();
+    const auto found = IdentityOf(PathIn(8, response));
+    EXPECT_TRUE(!found || found == expected)
+        << "changed at call " << call << ": " << PathIn(8, response);
+  }
+  EXPECT_GT(call, 1);
+}
+
+std::string NameOfWay(const testing::TestParamInfo<Way>& info) {
+  return info.param.text;
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    AtEachCall, RacesOnAWay,
+    testing::Values(Way{"ThroughALink", "first", ":link:item.aif", "targets/1/item.aif"},
+                    Way{"ThroughTheFolderAbove", "first/inner", "::other:item.aif", ""}),
+    NameOfWay);
+
 // --- Changes to something else ----------------------------------------------------------------
 
 struct Names {
@@ -323,6 +380,44 @@ TEST_P(RacesBesideTheItem, ALinkToItsFolderGoesAndNoAnswerChanges) {
     EXPECT_EQ(Answer(service.Streams(), code, request), expected) << "changed at call " << call;
     isChanged = service.HasChanged();
     EXPECT_EQ(Answer(bystander, code, request), expected) << "asked of another one afterwards";
+  }
+  EXPECT_GT(call, 1);
+}
+
+// The volume is where the table of mounts has never been said to show it.
+TEST_P(RacesBesideTheItem, ALinkToItsVolumeGoesAndNoAnswerChanges) {
+  const auto [code, knowledge, names] = GetParam();
+  bool isChanged = true;
+  int call = 0;
+  for (; isChanged; ++call) {
+    const TemporaryFolder top;
+    const fs::path folder = top.MakeFolder("folder");
+    const fs::path moved = top.Path() / "moved";
+    const fs::path inner = top.MakeFolder("folder/volume");
+    const ScopedMount volume("none", inner, "tmpfs");
+    ASSERT_TRUE(volume.IsMounted());
+    for (int i = 0; i < 20; ++i) fs::remove(top.MakeFile("folder/volume/first"));
+    top.MakeFolder("folder/volume/inner");
+    std::ofstream(inner / "inner" / names.item) << "item";
+    StoppedService service(ServiceToRace());
+    if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
+    const Item known = ItemAt(service.Streams(), inner / "inner" / names.item);
+    if (knowledge == Knowledge::kOfAPass) PassOver(service.Streams(), known);
+    fs::rename(folder, moved);
+    fs::create_symlink(moved, folder);
+
+    Bystander bystander;
+    const Item asked = ItemAt(bystander, moved / "volume/inner" / names.asked);
+    if (knowledge == Knowledge::kOfTheItem) {
+      Answer(service.Streams(), 7, RecordRequest((moved / "volume/inner").string()));
+    }
+    const std::string request = RequestAbout(asked, code);
+    const std::string expected = Answer(bystander, code, request);
+    service.ChangeAt(call, [&] { fs::remove(folder); });
+    EXPECT_EQ(Answer(service.Streams(), code, request), expected) << "changed at call " << call;
+    isChanged = service.HasChanged();
+    fs::remove(folder);
+    fs::rename(moved, folder);  // for the unmounting
   }
   EXPECT_GT(call, 1);
 }

@@ -28,6 +28,13 @@ TEST(PathText, ParentKeepsDoubledSlashes) {
   EXPECT_EQ(ParentPath("//"), "/");
 }
 
+TEST(PathText, TheFolderOfAnItemIsWhatStandsBeforeItsName) {
+  EXPECT_EQ(FolderOf("/a/b"), "/a");
+  EXPECT_EQ(FolderOf("/a"), "/");
+  EXPECT_EQ(FolderOf("/a/%2E"), "/a");
+  EXPECT_EQ(FolderOf("/%2e%2E"), "/");
+}
+
 TEST(PathText, JoinNeedsNoSlashAtTheStart) {
   EXPECT_EQ(JoinPath("", "a"), "a");
   EXPECT_EQ(JoinPath("/", "a"), "/a");

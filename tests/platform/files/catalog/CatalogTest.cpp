@@ -49,6 +49,16 @@ TEST_F(TheCatalog, FindsARememberedItemWhereItIsNow) {
   EXPECT_EQ(Find(id), mFolder.Path() / "volume/d/c");
 }
 
+TEST_F(TheCatalog, FindsWhatMovesInAFolderWhoseNameIsTheFolderAboveInAUrl) {
+  for (int i = 0; i < 20; ++i) Make("filler/" + std::to_string(i));
+  const std::uint32_t id = IDOf(Make("a/%2E%2E/b"));
+  const std::filesystem::path volume = mFolder.Path() / "volume";
+  std::filesystem::rename(volume / "a/%2E%2E/b", volume / "a/%2E%2E/c");
+  EXPECT_EQ(Find(id), volume / "a/%2E%2E/c");
+  std::filesystem::rename(volume / "a/%2E%2E", volume / "a/%2e");
+  EXPECT_EQ(Find(id), volume / "a/%2e/c");
+}
+
 TEST_F(TheCatalog, DoesNotTakeAFileForAFolder) {
   for (int i = 0; i < 20; ++i) Make("filler/" + std::to_string(i));
   const std::string file = mFolder.MakeFile("volume/file");

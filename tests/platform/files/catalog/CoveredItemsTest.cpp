@@ -123,6 +123,33 @@ TEST_F(CoveredItems, AreNotWhatAFullPathLeadsToWhereverTheyWereSeen) {
   EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
 }
 
+// At the place where its mount hangs another volume's folder may have the same name.
+TEST_F(CoveredItems, OfAPartThatIsMountedByItselfTheVolumesOwnFolderIsTold) {
+  mFolder.MakeFolder("volume/part");
+  mFolder.MakeFolder("part");
+  Cover("part", PathTo("volume/folder"));
+  const FSSpec inside = SpecOf(PathTo("part/below"));
+  Str255 name;
+  CInfoPBRec block{};
+  block.dirInfo = {name, inside.vRefNum, -1, inside.parID, 0};
+  ASSERT_EQ(PBGetCatInfoSync(&block), noErr);
+  EXPECT_EQ(TextOfPascal(name), "folder");
+  EXPECT_EQ(static_cast<std::uint32_t>(block.dirInfo.ioDrParID), 2U);
+}
+
+TEST_F(CoveredItems, APartThatNothingElseShowsIsTheTopOfWhatCanBeClimbed) {
+  mFolder.MakeFolder("part");
+  Cover("part", PathTo("volume/folder"));
+  Cover("volume");
+  const FSSpec inside = SpecOf(PathTo("part/below"));
+  Str255 name;
+  CInfoPBRec block{};
+  block.dirInfo = {name, inside.vRefNum, -1, inside.parID, 0};
+  ASSERT_EQ(PBGetCatInfoSync(&block), noErr);
+  EXPECT_EQ(static_cast<std::uint32_t>(block.dirInfo.ioDrParID),
+            inside.parID == 2 ? 1U : kParentOfRootID);
+}
+
 // A process that was in a folder before it was covered still shows it.
 class CoveredItemsInTheCurrentFolder : public CoveredItems {
  protected:

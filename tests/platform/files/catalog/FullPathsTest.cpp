@@ -193,6 +193,13 @@ TEST_F(HFSPathsToRecords, ALinkOnTheWayThatLeadsNowhereIsAMissingFolder) {
   EXPECT_TRUE(IsUntouched());
 }
 
+TEST_F(HFSPathsToRecords, LinksOnTheWayThatGoInACircleAreAMissingFolder) {
+  mFolder.MakeLink("a/b/link", "link");
+  EXPECT_EQ(From(":link:x"), "(-120)");
+  EXPECT_EQ(From(0, 0, Full(mTop + "/a/b/link/x")), "(-120)");
+  EXPECT_TRUE(IsUntouched());
+}
+
 TEST_F(HFSPathsToRecords, AKnownFileOnTheWayOfAFullPathIsAMissingFolder) {
   EXPECT_EQ(From(0, 0, Full(mTop + "/a/b/file")), "a/b/file");  // from now on its place is known
   EXPECT_EQ(From(0, 0, Full(mTop + "/a/b/file/x")), "(-120)");

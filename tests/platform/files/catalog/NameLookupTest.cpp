@@ -314,6 +314,13 @@ TEST_F(NamesInAFolder, NoItemIsCalledSo) {
   }
 }
 
+TEST_F(NamesInAFolder, WhatIsADotInAUrlIsANameLikeOthers) {
+  for (const char* const name : {"%2E", "%2e%2E", ".%2e", "%2E.", "%2F", "a%2Fb", "%", "%00"}) {
+    Make(name);
+    ExpectRoundTrip(name);
+  }
+}
+
 TEST_F(NamesInAFolder, ALinkIsFoundItselfAndADanglingOneToo) {
   ASSERT_EQ(symlink("nowhere", PathTo("link").c_str()), 0);
   ASSERT_EQ(symlink("/", PathTo("root").c_str()), 0);
@@ -328,9 +335,19 @@ TEST_F(NamesInAFolder, ManyHostileNamesSideBySideComeBack) {
     seed = seed * 1103515245 + 12345;
     return seed / 65536 % limit;
   };
-  const std::vector<std::string> pieces{
-      "e",  "\xCC\x81", "\xC3\xA9",     "#",  ".", ":",
-      "1A", "\xFF",     "\xE6\x97\xA5", "\n", "?", "long long long long long"};
+  const std::vector<std::string> pieces{"e",
+                                        "\xCC\x81",
+                                        "\xC3\xA9",
+                                        "#",
+                                        ".",
+                                        ":",
+                                        "%2E",
+                                        "1A",
+                                        "\xFF",
+                                        "\xE6\x97\xA5",
+                                        "\n",
+                                        "?",
+                                        "long long long long long"};
   while (names.size() < 500) {
     std::string name;
     for (unsigned count = 1 + next(8); count > 0; --count) {
