@@ -104,8 +104,23 @@ Item ItemAt(ChildProgram& service, const fs::path& path) {
 
 // --- Races ------------------------------------------------------------------------------------
 
+void Exchange(const fs::path& first, const fs::path& second) {
+  ASSERT_EQ(renameat2(AT_FDCWD, first.c_str(), AT_FDCWD, second.c_str(), RENAME_EXCHANGE), 0);
+}
+
 enum class Race { kFolderBecomesLink, kItemIsReplaced, kFolderIsCovered };
 enum class Knowledge { kNone, kOfTheItem, kOfAPass };
+
+const char* NameOf(Knowledge knowledge) {
+  switch (knowledge) {
+    case Knowledge::kNone:
+      return "AtFirst";
+    case Knowledge::kOfTheItem:
+      return "Remembered";
+    default:
+      return "KnownByAPass";
+  }
+}
 
 const char* NameOf(Race race) {
   switch (race) {
@@ -145,11 +160,10 @@ class Tree {
         fs::create_symlink(Top() / "other", folder);
         break;
       case Race::kItemIsReplaced:
-        renameat2(AT_FDCWD, Path().c_str(), AT_FDCWD, (Top() / "other/inner" / mName).c_str(),
-                  RENAME_EXCHANGE);
+        Exchange(Path(), Top() / "other/inner" / mName);
         break;
       case Race::kFolderIsCovered:
-        mount("none", folder.c_str(), "tmpfs", 0, "");
+        ASSERT_EQ(mount("none", folder.c_str(), "tmpfs", 0, ""), 0);
         fs::create_directory(folder / "inner");
         std::ofstream(Path()) << "covering";
     }
@@ -257,16 +271,15 @@ TEST_P(Races, ChangeNoAnswerIntoThatOfAnotherItem) {
 
 std::string NameOfCase(const testing::TestParamInfo<Races::ParamType>& info) {
   const auto [race, code, knowledge, name] = info.param;
-  return std::string(NameOf(race)) + "Code" + std::to_string(code) +
-         (knowledge == Knowledge::kNone ? "AtFirst" : "Remembered") +
-         (std::strlen(name) > 63 ? "LongName" : "");
+  return std::string(NameOf(race)) + "Code" + std::to_string(code) + NameOf(knowledge) +
+         (name == kLongName ? "LongName" : "");
 }
 
 INSTANTIATE_TEST_SUITE_P(AtEachCall, Races,
                          testing::Combine(testing::Values(Race::kFolderBecomesLink,
                                                           Race::kItemIsReplaced,
                                                           Race::kFolderIsCovered),
-                                          testing::Values(1u, 2u, 5u, 7u, 8u, 9u),
+                                          testing::Values(1u, 2u, 5u, 6u, 7u, 8u, 9u),
                                           testing::Values(Knowledge::kNone, Knowledge::kOfTheItem),
                                           testing::Values(kName, kLongName)),
                          NameOfCase);
@@ -276,7 +289,7 @@ INSTANTIATE_TEST_SUITE_P(AtEachCall, Races,
 // What a name leads to by way of another folder than the one that was asked: "first" is exchanged
 // with "second" in mid-question.
 struct Way {
-  const char* text;      // what Tests are called
+  const char* text;      // for the test's name
   const char* asked;     // the folder whose number is in the question
   const char* name;      // and the name, as an HFS path
   const char* expected;  // empty when there is no such item
@@ -302,11 +315,7 @@ TEST_P(RacesOnAWay, LeadIntoNoFolderThatWasNeverOnIt) {
     const auto expected =
         *way.expected == '\0' ? std::nullopt : IdentityOf(top.Path() / way.expected);
 
-    service.ChangeAt(call, [&] {
-      ASSERT_EQ(renameat2(AT_FDCWD, (top.Path() / "first").c_str(), AT_FDCWD,
-                          (top.Path() / "second").c_str(), RENAME_EXCHANGE),
-                0);
-    });
+    service.ChangeAt(call, [&] { Exchange(top.Path() / "first", top.Path() / "second"); });
     const std::string response =
         Answer(service.Streams(), 8, PathOfPartsRequest(asked.volume, asked.folderID, way.name, 0));
     isChanged = service.HasChanged();
@@ -424,8 +433,7 @@ TEST_P(RacesBesideTheItem, ALinkToItsVolumeGoesAndNoAnswerChanges) {
 
 std::string NameOfCaseBeside(const testing::TestParamInfo<RacesBesideTheItem::ParamType>& info) {
   const auto [code, knowledge, names] = info.param;
-  return "Code" + std::to_string(code) +
-         (knowledge == Knowledge::kOfTheItem ? "Remembered" : "KnownByAPass") +
+  return "Code" + std::to_string(code) + NameOf(knowledge) +
          (names.item == kLongName ? "LongName" : "") + (names.item == names.asked ? "" : "NewItem");
 }
 
