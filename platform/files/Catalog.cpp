@@ -268,10 +268,13 @@ std::optional<OpenFolder> AsFolder(const std::string& path, Descriptor descripto
                     std::make_shared<const Descriptor>(std::move(descriptor))};
 }
 
-// The folder at the end of a path, as in openat(2), links followed. No automounter is asked at its
-// end.
-std::optional<OpenFolder> Follow(int from, const std::string& path) {
-  return AsFolder(path, Descriptor(openat(from, path.c_str(), O_PATH | O_CLOEXEC)));
+// The folder at the end of a path, links followed. No automounter is asked at its end.
+std::optional<OpenFolder> Follow(const Spot& end, const std::string& path) {
+  return AsFolder(path, Descriptor(openat(end.folder, end.name, O_PATH | O_CLOEXEC)));
+}
+
+std::optional<OpenFolder> Follow(const std::string& path) {
+  return Follow({AT_FDCWD, path.c_str()}, path);
 }
 
 // A folder that was found by following an absolute path, at its canonical path. A path that leads
@@ -301,7 +304,7 @@ bool Holds(const OpenFolder& folder, const ItemReference& item, std::string_view
 }
 
 std::optional<OpenFolder> Open(const Place& folder) {
-  auto found = Follow(AT_FDCWD, folder.path);
+  auto found = Follow(folder.path);
   if (!found || !IsSame(found->place.item, folder.item)) return std::nullopt;
   return found;
 }
@@ -316,7 +319,7 @@ std::optional<OpenFolder> OpenHolderOf(const std::string& path) {
   const std::string folder = foundation::FolderOf(path);
   auto found = OpenFolderAt(folder);
   if (!found && (errno == ELOOP || errno == ENOTDIR)) {
-    const auto followed = Follow(AT_FDCWD, folder);
+    const auto followed = Follow(folder);
     if (followed) found = AtRealPath(*followed, folder);
   }
   if (found) RememberPlace(found->place);
@@ -324,13 +327,16 @@ std::optional<OpenFolder> OpenHolderOf(const std::string& path) {
 }
 
 Spot SpotOf(const Place& item, const OpenFolder& folder) {
-  std::string name(*foundation::LastComponent(item.path));
-  const bool isInFolder = item.path == foundation::JoinPath(folder.place.path, name);
-  return isInFolder ? Spot{folder.descriptor->Get(), std::move(name)} : Spot{AT_FDCWD, item.path};
+  const std::string_view name = *foundation::LastComponent(item.path);
+  std::string_view holder(item.path.data(), item.path.size() - name.size());
+  if (holder != "/") holder.remove_suffix(1);
+  const bool isInFolder = holder == folder.place.path;
+  return isInFolder ? Spot{folder.descriptor->Get(), name.data()}
+                    : Spot{AT_FDCWD, item.path.c_str()};
 }
 
 std::optional<OpenFolder> OpenBehindLink(const Spot& link, const std::string& path) {
-  const auto found = Follow(link.folder, link.name);
+  const auto found = Follow(link, path);
   return found ? AtRealPath(*found, path) : std::nullopt;
 }
 

@@ -53,11 +53,11 @@ std::optional<OpenFolder> OpenHolderOf(const std::string& path);
 // Where to look for an item, as in openat(2).
 struct Spot {
   int folder;
-  std::string name;
+  const char* name;
 };
 
 // The spot of an item that was found by way of an open folder: in this very folder, unless another
-// mount shows it. Valid as long as the folder.
+// mount shows it. Valid as long as both.
 Spot SpotOf(const Place& item, const OpenFolder& folder);
 
 // The folder to which the link at a spot leads, which is at `path` as well. None, and errno tells,

@@ -36,14 +36,14 @@ VolumePointer VolumeOfItem(const Place& item) {
 
 OSErr GiveReference(const Place& place, const Spot& spot, FSRef* reference) {
   ItemReference item = place.item;
-  ReadProof(item, spot.folder, spot.name.c_str());
+  ReadProof(item, spot.folder, spot.name);
   RememberPlace(place);
   *reference = Pack(item);
   return noErr;
 }
 
 OSErr GiveReference(const Place& place, FSRef* reference) {
-  return GiveReference(place, {AT_FDCWD, place.path}, reference);
+  return GiveReference(place, {AT_FDCWD, place.path.c_str()}, reference);
 }
 
 OSErr FillInfo(const Place& item, FSCatalogInfoBitmap whichInfo, FSCatalogInfo& info) {
