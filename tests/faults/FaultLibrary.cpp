@@ -176,6 +176,7 @@ __attribute__((constructor)) void Begin() {
 
 bool HasToFail() {
   if (++gPage->allocations != gPage->failingAllocation) return false;
+  gPage->callsBefore = gPage->calls.load();
   gPage->failed = 1;
   errno = ENOMEM;
   return true;

@@ -40,8 +40,9 @@ struct FaultPage {
   std::atomic<std::uint32_t> allocations;
   std::atomic<std::uint32_t> rests;  // how often the service began to wait for a request; a futex
   std::atomic<std::int64_t> liveAllocations;
-  std::atomic<std::uint32_t> failed;  // whether the one to fail has
-  SeenCall failedCall;                // which call that was
+  std::atomic<std::uint32_t> failed;       // whether the one to fail has
+  SeenCall failedCall;                     // which call that was
+  std::atomic<std::uint32_t> callsBefore;  // how many calls were before an allocation that failed
   SeenCall seen[kMostCalls];
 };
 

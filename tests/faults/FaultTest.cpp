@@ -7,6 +7,7 @@
 #include <unistd.h>
 
 #include <chrono>
+#include <cstdint>
 #include <filesystem>
 #include <fstream>
 #include <iostream>
@@ -19,8 +20,8 @@
 
 #include "faults/FaultyService.h"
 #include "faults/PlausibleFaults.h"
-#include "faults/SmallRoot.h"
 #include "faults/Subject.h"
+#include "faults/TwoVolumeRoot.h"
 #include "support/OwnMountNamespace.h"
 #include "support/Wire.h"
 
@@ -38,6 +39,8 @@ class InjectedFaults : public testing::Environment {
   void TearDown() override {
     testing::Test::RecordProperty("faults", std::to_string(count));
     std::cout << "Faults injected: " << count << "\n";
+    const bool haveTestsRun = testing::UnitTest::GetInstance()->successful_test_count() > 0;
+    EXPECT_TRUE(count > 0 || !haveTestsRun) << "nothing was made to fail";
   }
 
   static inline unsigned long count = 0;
@@ -57,61 +60,92 @@ std::vector<Fault> FaultsIn(const Effort& effort) {
   return faults;
 }
 
-// Whether a service may end so.
-bool IsDocumentedEnd(const Fault& fault, const Outcome& outcome, const Answers& answers) {
+bool IsReadOfInput(const SeenCall& call) {
+  return call.number == SYS_read && call.first == STDIN_FILENO;
+}
+
+// Whether an allocation behind so many calls is for a field of the request: it follows the read of
+// the field's length, and the field is read next.
+bool IsForField(std::size_t callsBefore, const std::vector<SeenCall>& calls) {
+  if (callsBefore == 0 || callsBefore >= calls.size()) return false;
+  const SeenCall& length = calls[callsBefore - 1];
+  return IsReadOfInput(length) && length.size == sizeof(std::uint16_t) &&
+         IsReadOfInput(calls[callsBefore]);
+}
+
+// Whether a service may end so, which makes these calls when nothing fails, up to the one that
+// waits for the next request.
+bool IsDocumentedEnd(const Fault& fault, const Outcome& outcome, const std::vector<SeenCall>& calls,
+                     const std::string& right) {
   if (outcome.status != 0) return false;
-  if (fault.kind == Fault::Kind::kAllocation) return outcome.response.empty();
-  const bool isWhole = answers.contains(outcome.response);
+  const std::string& response = outcome.response;
+  if (fault.kind == Fault::Kind::kAllocation) {
+    return response.empty() && IsForField(outcome.callsBefore, calls);
+  }
   switch (outcome.failedCall.number) {
-    case SYS_read:
-      // What is read behind the answer is the next request's code.
-      return outcome.failedCall.first == STDIN_FILENO && (isWhole || outcome.response.empty());
+    case SYS_read: {
+      // No bytes are the end of the input.
+      const bool hasEnded = fault.effect >= kWithoutBytes;
+      const bool isWait = fault.number == calls.size();
+      return IsReadOfInput(outcome.failedCall) && hasEnded && response == (isWait ? right : "");
+    }
     case SYS_write:
-      return outcome.failedCall.first == STDOUT_FILENO && BeginsOneOf(answers, outcome.response);
+      return outcome.failedCall.first == STDOUT_FILENO && fault.effect > kWithoutBytes &&
+             right.starts_with(response) && response != right;
     case SYS_kill:
-      return isWhole;
+      return response == right;
     default:
       return false;
   }
 }
 
-std::string Readable(const std::string& response) {
+// Without the trailer, and the zeros in front of it.
+std::string Readable(std::string response) {
+  if (response.ends_with(kTrailer)) response.resize(response.size() - kTrailer.size());
   return testing::PrintToString(response.substr(0, response.find_last_not_of('\0') + 1));
 }
 
 // What leaves memory behind once may have been learned; what does so again is a leak.
 constexpr int kMostAttempts = 2;
 
+// How often a new service is asked once it has answered rightly after a fault.
+constexpr int kMoreAnswers = 3;
+
 // One question, asked while something fails.
 class Trial {
  public:
   explicit Trial(Question question)
-      : mRequest(std::move(question.request)), mAnswers(std::move(question.honest)) {
-    FaultyService service;
-    mRight = service.Ask(mRequest).response;
+      : mRequest(std::move(question.request)),
+        mRight(std::move(question.right)),
+        mAnswers(std::move(question.honest)) {
     mAnswers.insert(mRight);
-    mWhenNew = FaultsIn(service.EffortSoFar());
   }
 
   // A new service for each fault.
   void FailNewServices(bool withAllocations) {
-    for (const Fault& fault : mWhenNew) {
+    FaultyService sound;
+    if (!IsAnswered(sound)) return;
+    mEffort = sound.EffortSoFar();
+    const Holdings once = sound.Holds();
+    mDescriptors = once.descriptors;
+    if (!IsAnswered(sound)) return;
+    mKept = sound.Holds().allocations - once.allocations;
+    for (const Fault& fault : FaultsIn(mEffort)) {
       if (!withAllocations && fault.kind == Fault::Kind::kAllocation) continue;
-      FaultyService service(fault);
-      if (Survives(service, fault)) AskAgain(service, fault);
+      FailANewService(fault);
       if (mFindings >= kMostFindings) break;
     }
   }
 
-  // One service that has answered the question before, as long as it lives.
+  // One service that has answered the question before, as long as it lives and is as it was.
   void FailAnOldService() {
     auto service = OldService();
     const Holdings known = service->Holds();
     service->Arm({});
-    service->Ask(mRequest);
-    const std::vector<Fault> faults = FaultsIn(service->EffortSoFar());
+    if (!IsAnswered(*service)) return;
+    mEffort = service->EffortSoFar();
     mKept = service->Holds().allocations - known.allocations;
-    for (const Fault& fault : faults) {
+    for (const Fault& fault : FaultsIn(mEffort)) {
       bool survives = false;
       // What a service learns when it has to look for something, it keeps.
       bool isLevel = false;
@@ -119,17 +153,47 @@ class Trial {
         isLevel = FailOnce(*service, fault, survives) || !survives;
       }
       if (!isLevel) Report(fault, "leaves something behind");
-      if (!survives) service = OldService();
+      if (!survives || !TakesAsMuch(*service)) service = OldService();
       if (mFindings >= kMostFindings) break;
     }
   }
 
  private:
+  // Without a fault. Else nothing would be tried.
+  bool IsAnswered(FaultyService& service) {
+    const std::string response = service.Ask(mRequest).response;
+    EXPECT_TRUE(response == mRight && !mRight.empty())
+        << Readable(response) << ", not " << Readable(mRight);
+    return !testing::Test::HasFailure();
+  }
+
   std::unique_ptr<FaultyService> OldService() const {
     auto service = std::make_unique<FaultyService>();
     service->Ask(mRequest);
     service->Ask(mRequest);
     return service;
+  }
+
+  // Whether the last answer took what the first one took: only then is the next fault reached.
+  bool TakesAsMuch(const FaultyService& service) const {
+    const Effort effort = service.EffortSoFar();
+    return effort.calls.size() == mEffort.calls.size() && effort.allocations == mEffort.allocations;
+  }
+
+  // What the fault made it learn in other ways than without it, it keeps: a path that it came by,
+  // folders that are still to be read. But only once: then it takes no more for each answer than
+  // one to which nothing has happened.
+  void FailANewService(const Fault& fault) {
+    FaultyService service(fault);
+    if (!Survives(service, fault)) return;
+    AskAgain(service, fault);
+    const std::int64_t learned = service.Holds().allocations;
+    for (int i = 0; i < kMoreAnswers; ++i) AskAgain(service, fault);
+    const Holdings after = service.Holds();
+    if (after.descriptors != mDescriptors) Report(fault, "leaves a descriptor open");
+    if (after.allocations != learned + kMoreAnswers * mKept) {
+      Report(fault, "makes every answer leave something behind");
+    }
   }
 
   // Whether it holds as much memory afterwards as before, but for what the right answers make it
@@ -150,9 +214,13 @@ class Trial {
   // False when it has ended.
   bool Survives(FaultyService& service, const Fault& fault) {
     const Outcome outcome = service.Ask(mRequest);
-    if (outcome.hasFailed) ++InjectedFaults::count;
+    if (outcome.hasFailed) {
+      ++InjectedFaults::count;
+    } else {
+      Report(fault, "is never reached");
+    }
     mIsRight = outcome.response == mRight;
-    const bool isFine = outcome.status ? IsDocumentedEnd(fault, outcome, mAnswers)
+    const bool isFine = outcome.status ? IsDocumentedEnd(fault, outcome, mEffort.calls, mRight)
                                        : mAnswers.contains(outcome.response);
     if (!isFine) {
       const std::string end =
@@ -182,11 +250,12 @@ class Trial {
   }
 
   std::string mRequest;
-  Answers mAnswers;
   std::string mRight;
-  std::vector<Fault> mWhenNew;
-  std::int64_t mKept = 0;  // allocations that stay for each right answer
-  bool mIsRight = false;   // the last one while something failed
+  Answers mAnswers;
+  Effort mEffort{};              // for the right answer, in the state in which things fail
+  std::int64_t mKept = 0;        // allocations that stay for each right answer
+  std::size_t mDescriptors = 0;  // of a new service to which nothing has happened
+  bool mIsRight = false;         // the last one while something failed
   int mFindings = 0;
 };
 
@@ -200,43 +269,21 @@ std::string LongName() {
 // is found by them.
 constexpr char kOneOfTwins[] = "/Disk/twins/e\u0301t\u00E9";
 
-// The path of an item, made when it is not there.
-std::filesystem::path Make(const std::string& path) {
+void Make(const std::string& path) {
   std::filesystem::create_directories(std::filesystem::path(path).parent_path());
   std::ofstream{path, std::ios::app};
-  return path;
 }
 
-// A small root with something on its volumes.
-class Tree {
- public:
-  Tree() : mRoot({TALLOWMERE_SERVICE, TALLOWMERE_FAULT_LIBRARY}) {
-    if (!mRoot.IsEntered()) return;
-    // The first inodes are too low for ids.
-    Make("/Disk/early/a track.aif");
-    for (int i = 0; i < 20; ++i) Make("/Disk/fill/" + std::to_string(i) + "/file");
-    Make("/Disk/folder/inner/a track.aif");
-    Make(SmallRoot::kHome + std::string("/a track.aif"));
-    Make(kOneOfTwins);
-    for (int i = 100; i < 230; ++i)
-      Make("/Disk/twins/" + std::to_string(i) + std::string(250, 'f'));
-    Make("/Disk/twins/\u00E9te\u0301");
-  }
-
-  // Until what has been made is old enough for a service to believe its times of change.
-  void Settle() const { std::this_thread::sleep_until(mMade + kCoarsestTick); }
-
-  bool IsMade() const { return mRoot.IsEntered(); }
-  bool IsOnImage() const { return mRoot.IsImage(); }
-
- private:
-  SmallRoot mRoot;
-  std::chrono::steady_clock::time_point mMade = std::chrono::steady_clock::now();
-};
+// Longer than what a reference has on its stack.
+std::string DeepPath() {
+  std::string path = "/Disk/";
+  for (int i = 0; i < 6; ++i) path += std::string(200, 'd') + "/";
+  return path + "a track.aif";
+}
 
 struct Item {
   const char* name;  // of the test
-  Subject (*make)();
+  Subject (*learn)();
   std::vector<unsigned> codes;         // asked of an old service
   std::vector<unsigned> codesWhenNew;  // and of new ones, which is slower
   // Without memory for its first look at the users the C library itself ends the process.
@@ -245,42 +292,29 @@ struct Item {
 
 const std::vector<unsigned> kCodesOfPaths{1, 2, 5, 6, 7, 8, 9};
 
-// Longer than what a reference has on its stack.
-std::string DeepPath() {
-  std::string path;
-  for (int i = 0; i < 6; ++i) path += std::string(200, 'd') + "/";
-  return path + "a track.aif";
-}
-
 const std::vector<Item> kItems{
     {"Plain",
-     [] { return Subject(Make("/Disk/folder/inner/a track.aif")); },
+     [] { return Subject("/Disk/folder/inner/a track.aif"); },
      {1, 2, 3, 4, 5, 6, 7, 8, 9, 10},
      {1, 2, 3, 4, 5, 6, 7, 8, 9, 10}},
-    {"SharedID", [] { return Subject(Make("/Disk/early/a track.aif")); }, {1, 2, 8, 9}, {8, 9}},
+    {"SharedID", [] { return Subject("/Disk/early/a track.aif"); }, {1, 2, 8, 9}, {8, 9}},
     {"LongName",
-     [] { return Subject(Make("/Disk/folder/" + LongName()), "", LongName().substr(0, 63)); },
+     [] { return Subject("/Disk/folder/" + LongName(), "", LongName().substr(0, 63)); },
      kCodesOfPaths,
      {8}},
     {"NotInMacRoman",
-     [] { return Subject(Make("/Disk/folder/日本.aif"), "", "??.aif"); },
+     [] { return Subject("/Disk/folder/日本.aif", "", "??.aif"); },
      kCodesOfPaths,
      {9}},
     // The first accent is a mark of its own, the second one is not.
     {"Accented",
-     [] { return Subject(Make("/Disk/folder/e\u0301t\u00E9"), "\u00E9t\u00E9"); },
+     [] { return Subject("/Disk/folder/e\u0301t\u00E9", "\u00E9t\u00E9"); },
      kCodesOfPaths,
      {8, 9}},
-    {"Missing",
-     [] {
-       Make("/Disk/folder/something else");
-       return Subject("/Disk/folder/missing.aif");
-     },
-     {1, 5, 6, 7, 8, 9},
-     {7, 8, 9}},
+    {"Missing", [] { return Subject("/Disk/folder/missing.aif"); }, {1, 5, 6, 7, 8, 9}, {7, 8, 9}},
     {"Folder", [] { return Subject("/Disk/folder/inner"); }, kCodesOfPaths, {1, 7, 9}},
     {"OnExt4",
-     [] { return Subject(Make("/folder/inner/a track.aif")); },
+     [] { return Subject("/folder/inner/a track.aif"); },
      {1, 2, 3, 4, 5, 6, 7, 8, 9},
      {1, 2, 3, 4, 8, 9}},
     {"Twin", [] { return Subject(kOneOfTwins, "", "\x8Et\x8E"); }, {7, 9}, {}},
@@ -289,8 +323,41 @@ const std::vector<Item> kItems{
      {9},
      {9}},
     {"InTheHomeFolder", [] { return Subject("~/a track.aif"); }, {1, 5, 7}, {7}, true},
-    {"Deep", [] { return Subject(Make("/Disk/" + DeepPath())); }, {5, 7, 9}, {7}},
+    {"Deep", [] { return Subject(DeepPath()); }, {5, 7, 9}, {7}},
     {"RootOfAVolume", [] { return Subject("/Disk"); }, {1, 2, 5, 7, 8, 9}, {7, 9}},
+};
+
+// A small root with all the items on its volumes, made before the first question: a service looks
+// more often at what has just changed.
+class Tree {
+ public:
+  Tree() : mRoot({TALLOWMERE_SERVICE, TALLOWMERE_FAULT_LIBRARY}) {
+    if (!mRoot.IsEntered()) return;
+    // The first inodes are too low for ids.
+    Make("/Disk/early/a track.aif");
+    for (int i = 0; i < 20; ++i) Make("/Disk/fill/" + std::to_string(i) + "/file");
+    for (const char* const name :
+         {"something else", "inner/a track.aif", "日本.aif", "e\u0301t\u00E9"}) {
+      Make(std::string("/Disk/folder/") + name);
+    }
+    Make("/Disk/folder/" + LongName());
+    Make(DeepPath());
+    Make("/folder/inner/a track.aif");
+    Make(TwoVolumeRoot::kHome + std::string("/a track.aif"));
+    Make(kOneOfTwins);
+    for (int i = 100; i < 230; ++i) {
+      Make("/Disk/twins/" + std::to_string(i) + std::string(250, 'f'));
+    }
+    Make("/Disk/twins/\u00E9te\u0301");
+    // Until a service believes the times of change.
+    std::this_thread::sleep_for(kCoarsestTick);
+  }
+
+  bool IsMade() const { return mRoot.IsEntered(); }
+  bool IsOnImage() const { return mRoot.IsImage(); }
+
+ private:
+  TwoVolumeRoot mRoot;
 };
 
 struct Case {
@@ -322,7 +389,7 @@ class Faults : public testing::TestWithParam<Case> {
     if (isOnImage && !tree->IsOnImage()) GTEST_SKIP() << "no image can be mounted";
   }
 
-  static Trial MakeTrial() { return Trial(GetParam().item->make().Ask(GetParam().code)); }
+  static Trial MakeTrial() { return Trial(GetParam().item->learn().Ask(GetParam().code)); }
 
   static inline std::unique_ptr<Tree> tree;
 };
@@ -331,7 +398,6 @@ class FaultsOfNewServices : public Faults {};
 class FaultsOfOldServices : public Faults {};
 
 TEST_P(FaultsOfNewServices, AreAnsweredHonestlyAndNotRemembered) {
-  tree->Settle();
   MakeTrial().FailNewServices(!GetParam().item->asksForUsers);
 }
 

@@ -122,6 +122,7 @@ Outcome FaultyService::Ask(std::string_view request) {
   outcome.response = mProgram->Read(mProgram->UnreadOutput());
   outcome.hasFailed = Page().failed != 0;
   outcome.failedCall = Page().failedCall;
+  outcome.callsBefore = Page().callsBefore;
   return outcome;
 }
 

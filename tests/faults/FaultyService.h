@@ -26,11 +26,12 @@ struct Fault {
 
 // What a service did with a request.
 struct Outcome {
-  std::string response;  // all that it sent
-  bool hasFailed;        // the call or the allocation that was to fail
-  SeenCall failedCall;   // which call that was
-  std::optional<int>
-      status;  // with which it ended, as ChildProgram::Wait() has it; none if it lives
+  std::string response;       // all that it sent
+  bool hasFailed;             // the call or the allocation that was to fail
+  SeenCall failedCall;        // which call that was
+  std::uint32_t callsBefore;  // of an allocation that failed
+  // With which it ended, as ChildProgram::Wait() has it; none if it lives.
+  std::optional<int> status;
 };
 
 // What it takes: calls, the one that waits for the next request among them, and allocations.

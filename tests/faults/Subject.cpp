@@ -1,25 +1,25 @@
 #include "faults/Subject.h"
 
+#include <gtest/gtest.h>
+
 #include <algorithm>
 #include <cstring>
-#include <string_view>
 #include <utility>
 
+#include "faults/TwoVolumeRoot.h"
+#include "support/AtomReader.h"
+#include "support/EveryRequest.h"
 #include "support/Wire.h"
 
 namespace tallowmere::test {
 namespace {
 
-constexpr unsigned kPathRoom = 1024;
-constexpr unsigned kNameRoom = 64;
 constexpr int kNoVolume = 32767;
 constexpr int kNoFolder = -1;
 constexpr int kParentOfRoots = 1;
 constexpr int kRootFolder = 2;
-// The name of the volume of "/" for whoever may not read that folder.
+// The name of the volume of "/" for whoever may not read that folder, and of one without a label.
 const std::string kUnknownLabel = "Root";
-
-constexpr int kNoMemory = -108;
 
 // An HFS name without other letters than those of ASCII and this one.
 std::string InUtf8(std::string name) {
@@ -33,26 +33,47 @@ std::string WithTrailer(std::string fields) {
   return fields.append(kTrailer);
 }
 
-std::string FullPathResponse(std::string path) {
-  const auto length = static_cast<unsigned>(path.size());
-  path.resize(kPathRoom);
-  return WithTrailer(U16(length) + path);
-}
-
 // An error on the way up leaves out the folders further up, and a volume can be without its name.
 void AddShortened(const std::string& fullPath, Answers& answers) {
   const std::size_t end = fullPath.find(':') + 1;
   for (std::size_t from = end; from != 0; from = fullPath.find(':', from) + 1) {
     const std::string folders = fullPath.substr(from);
-    answers.insert(FullPathResponse(fullPath.substr(0, end) + folders));
-    answers.insert(FullPathResponse(":" + folders));
+    answers.insert(FullPathResponse(fullPath.substr(0, end) + folders, kRoomForAFullPath));
+    answers.insert(FullPathResponse(":" + folders, kRoomForAFullPath));
   }
+}
+
+// The settings for a sound as the exporter has them, which are no matter of the item. Empty when
+// they are not those of the sound.
+std::string Settings(const std::string& request, const Atom& settings) {
+  Service service;
+  std::string head = service.Ask(request, sizeof(std::int16_t) + sizeof(std::uint32_t));
+  head.resize(sizeof(std::int16_t) + sizeof(std::uint32_t));
+  std::uint32_t size = 0;
+  std::memcpy(&size, head.data() + sizeof(std::int16_t), sizeof size);
+  const std::string container = service.Read(size);
+  return ReadAtomContainer(container) == settings ? WithTrailer(head + container) : "";
+}
+
+// A path that begins in the home folder, spelled out.
+std::filesystem::path SpelledOut(const std::string& path) {
+  return path.starts_with("~/") ? TwoVolumeRoot::kHome + path.substr(1) : path;
 }
 
 }  // namespace
 
-Subject::Subject(std::filesystem::path path, std::string created, std::string lossy)
-    : mPath(std::move(path)), mCreated(std::move(created)), mLossy(std::move(lossy)) {
+Subject::Subject(std::string path, std::string created, std::string lossy)
+    : mSpelling(std::move(path)),
+      mPath(SpelledOut(mSpelling)),
+      mCreated(std::move(created)),
+      mLossy(std::move(lossy)) {
+  Learn();
+  LearnFullPaths();
+  if (mCreated.empty()) mCreated = InUtf8(mName);
+  if (mLossy.empty()) mLossy = mName;
+}
+
+void Subject::Learn() {
   Service service;
   mRecord = service.Ask(RecordRequest(mPath.string()), 1 + 70 + kTrailer.size()).substr(1, 70);
   std::memcpy(&mVolume, mRecord.data(), sizeof mVolume);
@@ -61,39 +82,72 @@ Subject::Subject(std::filesystem::path path, std::string created, std::string lo
   std::memcpy(&mVolumeAbove, above.data() + 1, sizeof mVolumeAbove);
   mName = mRecord.substr(7, static_cast<unsigned char>(mRecord[6]));
   mVolumeName = service.NameOf(mVolume);
-  const std::string answer =
-      service.Ask(FullPathRequest(mPath.string(), kPathRoom, 1), 2 + kPathRoom + kTrailer.size());
-  mFullPath = answer.c_str() + 2;
-  if (mCreated.empty()) mCreated = InUtf8(mName);
-  if (mLossy.empty()) mLossy = mName;
+  EXPECT_TRUE(service.Answers(PathOfRecordRequest(mRecord, 0, 0), PathResponse(mPath.string())))
+      << "the record leads elsewhere than to " << mPath;
+}
+
+// By the path alone: the names of the folders that full paths are asked about are HFS names too.
+void Subject::LearnFullPaths() {
+  const std::string top = IsOnDisk() ? TwoVolumeRoot::kDisk : "/";
+  const std::string label = IsOnDisk() ? top.substr(1) : TwoVolumeRoot::kLabel;
+  EXPECT_TRUE(mVolumeName == label || (!IsOnDisk() && mVolumeName == kUnknownLabel));
+  const auto inHFSForm = [&](const std::filesystem::path& folder) {
+    std::string names = folder.lexically_relative(top).string() + "/";
+    std::replace(names.begin(), names.end(), '/', ':');
+    return mVolumeName + ":" + (folder == top ? "" : names);
+  };
+  mFullPathOfFolder = mPath == top ? "" : inHFSForm(mPath.parent_path());
+  mFullPath = std::filesystem::is_directory(mPath) ? inHFSForm(mPath) : mFullPathOfFolder;
+}
+
+bool Subject::IsOnDisk() const {
+  return mPath.string().starts_with(TwoVolumeRoot::kDisk);
 }
 
 Question Subject::Ask(unsigned code) const {
-  const std::string path = mPath.string();
+  const bool isThere = std::filesystem::exists(mPath);
+  const std::string answer = PathResponse(mPath.string());
   switch (code) {
     case 1:
-      return {FullPathRequest(path, kPathRoom, 1), FullPaths()};
+      return {FullPathRequest(mSpelling, kRoomForAFullPath, 1),
+              FullPathResponse(mFullPath, kRoomForAFullPath), FullPaths()};
     case 2:
-      return {PathOfHFSPathRequest(mFullPath + '\0', mName + '\0', 0), PathsOfHFSPath()};
+      return AskForPathOfHFSPath();
     case 3:
-      return {VolumeNumberRequest(mVolumeName), {VolumeNumberResponse(kNoVolume)}};
+      return {VolumeNumberRequest(mVolumeName),
+              VolumeNumberResponse(mVolume),
+              {VolumeNumberResponse(kNoVolume)}};
     case 4:
       return {VolumeNameRequest(mVolume),
+              VolumeNameResponse(mVolumeName),
               {kNoVolumeNameResponse, VolumeNameResponse(kUnknownLabel)}};
     case 5:
-      return {HFSNameRequest(path, kNameRoom), {NameResponse(0, "")}};
+      return {HFSNameRequest(mSpelling, kRoomForAName),
+              isThere ? NameResponse(1, mName) : NameResponse(0, ""),
+              {NameResponse(0, "")}};
     case 6:
-      return {AddNameRequest(Folder(), mName, 0), PathsOfFolderAndName()};
+      return {AddNameRequest(Folder(), mName, 0), answer, PathsOfFolderAndName()};
     case 7:
-      return {RecordRequest(path), Records()};
+      return {RecordRequest(mSpelling), RecordResponse(1, mRecord), Records()};
     case 8:
-      return {PathOfPartsRequest(mVolume, mParent, mName, 0), Paths()};
+      return {PathOfPartsRequest(mVolume, mParent, mName, 0), answer, Paths()};
     case 9:
-      return {PathOfRecordRequest(mRecord, 0, 0), Paths()};
+      return {PathOfRecordRequest(mRecord, 0, 0), answer, Paths()};
     default:
-      return {ExportSettingsRequest(44100U << 16, 16, 2, "twos"),
-              {WithTrailer(I16(kNoMemory) + U32(0))}};
+      const std::string request = ExportSettingsRequest(kRateOfACD, 16, 2, "twos");
+      return {request,
+              Settings(request, SettingsOf("twos", kRateOfACD, 16, 2)),
+              {WithTrailer(I16(kResultNoMemory) + U32(0))}};
   }
+}
+
+// A volume has no folder that holds it, and is asked for without a name.
+Question Subject::AskForPathOfHFSPath() const {
+  const bool isRoot = mFullPathOfFolder.empty();
+  const std::string folder = isRoot ? mFullPath : mFullPathOfFolder;
+  const std::string name = isRoot ? "" : mName + '\0';
+  return {PathOfHFSPathRequest(folder + '\0', name, 0), ResultResponse(0, mPath.string()),
+          PathsOfHFSPath()};
 }
 
 // Where a new item with the same HFS name would be.
@@ -115,7 +169,10 @@ Answers Subject::FullPaths() const {
 
 Answers Subject::PathsOfHFSPath() const {
   Answers answers{ResultResponse(0), ResultResponse(0, NewItem())};
-  for (const int error : {-43, -120, -35, -5000, -36}) answers.insert(ResultResponse(error));
+  for (const int result :
+       {kResultNoItem, kResultNoFolder, kResultNoVolume, kResultNotPermitted, kResultSystemError}) {
+    answers.insert(ResultResponse(result));
+  }
   return answers;
 }
 
@@ -126,7 +183,7 @@ Answers Subject::PathsOfFolderAndName() const {
 }
 
 Answers Subject::Paths() const {
-  return {kNoPathResponse, WithTrailer(Flag(1) + U16(0)), PathResponse(NewItem())};
+  return {kNoPathResponse, kNoItemResponse, PathResponse(NewItem())};
 }
 
 // The root of a volume that is not known to be one is an item of the folder that holds it.
@@ -137,12 +194,6 @@ Answers Subject::Records() const {
   const bool isRoot = mParent == kParentOfRoots;
   if (isRoot) answers.insert(RecordResponse(1, Record(mVolumeAbove, kRootFolder, mName)));
   return answers;
-}
-
-bool BeginsOneOf(const Answers& answers, const std::string& response) {
-  return std::any_of(answers.begin(), answers.end(), [&](const std::string& answer) {
-    return response.size() < answer.size() && answer.starts_with(response);
-  });
 }
 
 }  // namespace tallowmere::test

@@ -12,19 +12,26 @@ using Answers = std::set<std::string>;
 
 struct Question {
   std::string request;
-  Answers honest;  // what may be answered beside the right answer
+  std::string right;  // the answer when nothing fails: a success, and about that very item
+  Answers honest;     // what may be answered else
 };
 
 class Subject {
  public:
-  // `created` is what an item is called that is made by the HFS name of this one, `lossy` the HFS
-  // name that is told of something that is not there. Where they are empty, both are the HFS name.
-  explicit Subject(std::filesystem::path path, std::string created = "", std::string lossy = "");
+  // The path may begin with "~/". What a service says of the item that all requests are made of,
+  // its record and its volume, is checked against the path. `created` is what an item is called
+  // that is made by the HFS name of this one, `lossy` the HFS name that is told of something that
+  // is not there. Where they are empty, both are the HFS name.
+  explicit Subject(std::string path, std::string created = "", std::string lossy = "");
 
   // The request with a code from 1 to 10.
   Question Ask(unsigned code) const;
 
  private:
+  void Learn();
+  void LearnFullPaths();
+  bool IsOnDisk() const;
+  Question AskForPathOfHFSPath() const;
   std::string Folder() const { return mPath.parent_path().string(); }
   std::string NewItem() const;
   Answers FullPaths() const;
@@ -33,6 +40,7 @@ class Subject {
   Answers Paths() const;
   Answers Records() const;
 
+  std::string mSpelling;  // of the path, in requests
   std::filesystem::path mPath;
   std::string mCreated;
   std::string mLossy;
@@ -43,9 +51,7 @@ class Subject {
   std::int16_t mVolumeAbove = 0;  // that of "/"
   std::string mVolumeName;
   std::string mFullPath;
+  std::string mFullPathOfFolder;  // that holds it
 };
-
-// Whether a response is the beginning of one of the answers, without its end.
-bool BeginsOneOf(const Answers& answers, const std::string& response);
 
 }  // namespace tallowmere::test

@@ -142,8 +142,7 @@ TEST_F(FileSpecCommands, TheRecordOfAnotherVolumeIsLookedForOnAllIfSoWished) {
     EXPECT_TRUE(mService.Answers(PathOfRecordRequest(elsewhere, search, 0), PathResponse(mFile)));
   }
   // No path comes of the bare name.
-  EXPECT_TRUE(
-      mService.Answers(PathOfRecordRequest(elsewhere, 0, 0), (Flag(1) + U16(0)).append(kTrailer)));
+  EXPECT_TRUE(mService.Answers(PathOfRecordRequest(elsewhere, 0, 0), kNoItemResponse));
 }
 
 TEST_F(FileSpecCommands, TheEmptyRecordGivesNoPath) {

@@ -144,12 +144,12 @@ TEST_F(HFSPathCommands, AnHFSPathAndANameGiveThePathOfTheItem) {
 }
 
 TEST_F(HFSPathCommands, AFolderThatDoesNotExistIsAResultAndNoPath) {
-  EXPECT_TRUE(
-      mService.Answers(PathOfHFSPathRequest(mHFSPath + "no:\0"s, "f\0"s, 0), ResultResponse(-120)));
-  EXPECT_TRUE(
-      mService.Answers(PathOfHFSPathRequest("no such volume:\0"s, "f\0"s, 0), ResultResponse(-35)));
+  EXPECT_TRUE(mService.Answers(PathOfHFSPathRequest(mHFSPath + "no:\0"s, "f\0"s, 0),
+                               ResultResponse(kResultNoFolder)));
+  EXPECT_TRUE(mService.Answers(PathOfHFSPathRequest("no such volume:\0"s, "f\0"s, 0),
+                               ResultResponse(kResultNoVolume)));
   EXPECT_TRUE(mService.Answers(PathOfHFSPathRequest(mHFSPath + '\0', "missing\0"s, 0),
-                               ResultResponse(-43)));
+                               ResultResponse(kResultNoItem)));
 }
 
 TEST_F(HFSPathCommands, WithTheFlagTheFolderIsTwoStrings) {
@@ -159,15 +159,16 @@ TEST_F(HFSPathCommands, WithTheFlagTheFolderIsTwoStrings) {
                                  ResultResponse(0, mWork + "/f")))
         << flag;
   }
-  EXPECT_TRUE(
-      mService.Answers(PathOfHFSPathRequest(parent + "\0Work\0"s, "f\0"s, 0), ResultResponse(-43)));
+  EXPECT_TRUE(mService.Answers(PathOfHFSPathRequest(parent + "\0Work\0"s, "f\0"s, 0),
+                               ResultResponse(kResultNoItem)));
 }
 
 TEST_F(HFSPathCommands, AFolderWithoutItsNULEndsWhereTheCountEnds) {
   EXPECT_TRUE(
       mService.Answers(PathOfHFSPathRequest(mHFSPath, "f", 0), ResultResponse(0, mWork + "/f")));
   // The second string is empty: its NUL follows the first one's. Two colons climb.
-  EXPECT_TRUE(mService.Answers(PathOfHFSPathRequest(mHFSPath, "f", 1), ResultResponse(-43)));
+  EXPECT_TRUE(
+      mService.Answers(PathOfHFSPathRequest(mHFSPath, "f", 1), ResultResponse(kResultNoItem)));
 }
 
 TEST_F(HFSPathCommands, WithoutFolderAndNameThereIsTheCurrentFolder) {

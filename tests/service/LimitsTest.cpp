@@ -179,14 +179,13 @@ class UnreadableFolder : public LimitsOfAPass {
 };
 
 TEST_F(UnreadableFolder, IsAnErrorToWhomeverItIsClosedAndNoLongerOnceItIsOpen) {
-  constexpr int kRefused = -5000;
   Service service(kAsNobody);
   const std::string nearestVolume = mKnown.volumeName + ":";
   std::string buffer = nearestVolume;
   buffer.resize(kRoomForAFullPath);
   const auto size = static_cast<unsigned>(nearestVolume.size());
   EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 1), (U16(size) + buffer).append(kTrailer)));
-  EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 2), ResultResponse(kRefused)));
+  EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 2), ResultResponse(kResultNotPermitted)));
   EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 5), NameResponse(0, "")));
   EXPECT_TRUE(
       service.Answers(RequestAbout(mKnown, 7), RecordResponse(0, Record(32767, -1, mKnown.name))));

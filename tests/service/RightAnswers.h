@@ -20,9 +20,6 @@ constexpr bool kIsSanitized = true;
 constexpr bool kIsSanitized = false;
 #endif
 
-// To code 9, about what cannot be found.
-inline const std::string kNoItemResponse = (Flag(1) + U16(0)).append(kTrailer);
-
 // An id that two items could have, and none has: all folders of its volume are read.
 constexpr auto kSharedID = static_cast<std::int32_t>(0x80001234);
 

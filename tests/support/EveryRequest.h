@@ -53,10 +53,8 @@ inline std::string RequestAbout(const Item& item, unsigned code) {
 // The right answer to it. REQUIRES: the item is a file; the code is not 10, whose answer is not
 // about the item.
 inline std::string AnswerAbout(const Item& item, unsigned code) {
-  std::string fullPath = item.fullPath;
-  fullPath.resize(kRoomForAFullPath);
   const std::vector<std::string> answers{
-      (U16(static_cast<unsigned>(item.fullPath.size())) + fullPath).append(kTrailer),
+      FullPathResponse(item.fullPath, kRoomForAFullPath),
       ResultResponse(0, item.path),
       VolumeNumberResponse(item.volume),
       VolumeNameResponse(item.volumeName),

@@ -2,6 +2,8 @@
 
 #include <sched.h>
 #include <sys/mount.h>
+#include <sys/syscall.h>
+#include <unistd.h>
 
 namespace tallowmere::test {
 
@@ -9,6 +11,12 @@ bool EnterOwnMountNamespace() {
   static const bool entered =
       unshare(CLONE_NEWNS) == 0 && mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0;
   return entered;
+}
+
+// The former root goes on top of the new one at the same place, and away from there.
+bool MakeRootOfMounts(const std::string& folder) {
+  return chdir(folder.c_str()) == 0 && syscall(SYS_pivot_root, ".", ".") == 0 &&
+         umount2(".", MNT_DETACH) == 0 && chdir("/") == 0;
 }
 
 ScopedMount::ScopedMount(const std::string& source, const std::string& place, const char* type,

@@ -10,6 +10,10 @@ namespace tallowmere::test {
 // program that continues afterwards stays in it.
 bool EnterOwnMountNamespace();
 
+// Makes a folder, at which something is mounted, the root of this mount namespace and leaves
+// nothing of the former root in it. False with errno when it cannot.
+bool MakeRootOfMounts(const std::string& folder);
+
 // A mount that ends with its object.
 class ScopedMount {
  public:

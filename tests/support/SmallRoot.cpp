@@ -1,8 +1,6 @@
 #include "support/SmallRoot.h"
 
 #include <sys/mount.h>
-#include <sys/syscall.h>
-#include <unistd.h>
 
 #include <cstdio>
 #include <filesystem>
@@ -48,19 +46,22 @@ bool IsMounted(const char* type, const std::string& place) {
 
 }  // namespace
 
+void CopyPrograms(const std::vector<std::string>& programs, const fs::path& root) {
+  for (const std::string& file : FilesOf(programs)) {
+    const fs::path copy = root.string() + file;
+    fs::create_directories(copy.parent_path());
+    fs::copy_file(file, copy);
+  }
+}
+
 bool EnterSmallRoot(const std::vector<std::string>& programs) {
   if (!EnterOwnMountNamespace()) return false;
-  const auto files = FilesOf(programs);
   const fs::path temporary = fs::temp_directory_path();
   if (!IsMounted("tmpfs", kPlace)) return false;
-  for (const std::string& file : files) {
-    fs::create_directories(fs::path(kPlace + file).parent_path());
-    fs::copy_file(file, kPlace + file);
-  }
+  CopyPrograms(programs, kPlace);
   fs::create_directories(kPlace + temporary.string());
   fs::create_directory(kPlace + "/proc");
-  return IsMounted("proc", kPlace + "/proc") && chdir(kPlace.c_str()) == 0 &&
-         syscall(SYS_pivot_root, ".", ".") == 0 && umount2(".", MNT_DETACH) == 0 && chdir("/") == 0;
+  return IsMounted("proc", kPlace + "/proc") && MakeRootOfMounts(kPlace);
 }
 
 }  // namespace tallowmere::test

@@ -108,6 +108,23 @@ inline std::string PathResponse(std::string_view path) {
   return (Flag(1) + CString(path)).append(kTrailer);
 }
 inline const std::string kNoPathResponse = (Flag(0) + U16(0)).append(kTrailer);
+// To code 9, about what cannot be found.
+inline const std::string kNoItemResponse = (Flag(1) + U16(0)).append(kTrailer);
+// To code 1, about a full path with less than `room` bytes.
+inline std::string FullPathResponse(std::string fullPath, unsigned room) {
+  const auto length = static_cast<unsigned>(fullPath.size());
+  fullPath.resize(room);
+  return U16(length).append(fullPath).append(kTrailer);
+}
+
+// Of code 2, but for the last one, which is of code 10.
+inline constexpr int kResultNoItem = -43;
+inline constexpr int kResultNoFolder = -120;
+inline constexpr int kResultNoVolume = -35;
+inline constexpr int kResultNotPermitted = -5000;
+inline constexpr int kResultSystemError = -36;
+inline constexpr int kResultNoMemory = -108;
+
 // To code 2.
 inline std::string ResultResponse(int result, std::string_view path) {
   return (I16(result) + CString(path)).append(kTrailer);

@@ -1,5 +1,6 @@
-// A root folder of its own for this process and what it starts, with nothing on it but what a
-// service needs: so that the machine's volumes are no part of what is tested.
+// A root folder with two volumes and nothing on them but what a service needs, which the process
+// leaves again: so that the machine's volumes are no part of what is tested, and its files can be
+// removed afterwards.
 #pragma once
 
 #include <filesystem>
@@ -13,16 +14,16 @@
 
 namespace tallowmere::test {
 
-class SmallRoot {
+class TwoVolumeRoot {
  public:
-  // With these programs and libraries at their places, the libraries of this process, /proc, a home
-  // folder kHome for its user, and a volume in memory at kDisk. It is an ext4 volume called kLabel
-  // where one can be mounted, else one in memory. The process stays outside where all that is not
-  // permitted. REQUIRES: it is in a mount namespace of its own.
-  explicit SmallRoot(const std::vector<std::string>& files);
-  SmallRoot(const SmallRoot&) = delete;
-  SmallRoot& operator=(const SmallRoot&) = delete;
-  ~SmallRoot();  // the process is back
+  // With these programs and libraries at their places, all that they need, /proc, a home folder
+  // kHome for this process's user, and a volume in memory at kDisk. It is an ext4 volume called
+  // kLabel where one can be mounted, else one in memory. The process stays outside where all that
+  // is not permitted. REQUIRES: it is in a mount namespace of its own.
+  explicit TwoVolumeRoot(const std::vector<std::string>& files);
+  TwoVolumeRoot(const TwoVolumeRoot&) = delete;
+  TwoVolumeRoot& operator=(const TwoVolumeRoot&) = delete;
+  ~TwoVolumeRoot();  // the process is back
 
   static constexpr char kDisk[] = "/Disk";
   static constexpr char kHome[] = "/Home";
