@@ -5,6 +5,8 @@
 #include <cstdio>
 #include <vector>
 
+#include "Answers.h"
+
 namespace tallowmere::soak {
 namespace {
 
@@ -82,7 +84,7 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
 
 std::string Judge::Report(const Request& request, const std::string& response,
                           History::Version first, History::Version last) {
-  std::string text = "request   " + TextOf(request, mPlace) + "\nbytes     " +
+  std::string text = "request   " + TextOf(request) + "\nbytes     " +
                      Readable(BytesOf(request, mPlace)) + "\nresponse  " + Readable(response) +
                      "\n";
   for (History::Version version = first; version <= last; ++version) {

@@ -4,8 +4,9 @@
 #include <map>
 #include <string>
 
-#include "Churner.h"
-#include "Model.h"
+#include "Graph.h"
+#include "History.h"
+#include "Requests.h"
 
 namespace tallowmere::soak {
 

@@ -25,7 +25,7 @@
 
 #include "Churner.h"
 #include "Judge.h"
-#include "Model.h"
+#include "Requests.h"
 #include "support/AtomReader.h"
 #include "support/ChildProgram.h"
 #include "support/EveryRequest.h"
@@ -197,7 +197,7 @@ class Asker {
     const NameIndex name = AnyInnerName();
     const std::string whole = NameAt(name).hfsName;
     const bool isWhole = code != 9 && Below(2) == 0;
-    if (isWhole || whole.size() <= 63) return whole;
+    if (isWhole || whole.size() <= kLongestRecordName) return whole;
     // A short form, of an item that there is.
     const std::size_t start = Below(state.count);
     for (std::size_t i = 0; i < state.count; ++i) {
