@@ -64,6 +64,7 @@ class Evaluation : private Walk {
         PathOfRecord();
         break;
     }
+    if (!mGraph.IsOfOneState()) mTruth.honestErrors = HonestErrors();
     mTruth.trace = std::move(mTrace);
     return std::move(mTruth);
   }
@@ -120,10 +121,6 @@ class Evaluation : private Walk {
     return entries;
   }
 
-  std::string VolumeName(const Volume& volume) const {
-    return volume.root == kMainRoot ? mPlace.name : NameAt(kVolumePlace).hfsName;
-  }
-
   // --- Answers that lead nowhere
 
   // Names that an item can have been given, whatever it is called at last.
@@ -152,6 +149,11 @@ class Evaluation : private Walk {
       for (const Entry* const entry : EntriesOf(item)) folders.push_back(entry->folder);
     }
     for (const std::string& name : NamesGiven(outcome.items)) {
+      mTruth.byMadeUpID.insert(RecordResponse(1, Record(mGraph.Main().number, 0, name)));
+      for (const Volume& other : mGraph.Others()) {
+        if (other.root != kNoNode)
+          mTruth.byMadeUpID.insert(RecordResponse(1, Record(other.number, 0, name)));
+      }
       for (const Node folder : folders) {
         if (IsNamed(folder, name)) continue;
         mTruth.nowhere.insert(NameResponse(1, name));
@@ -202,6 +204,38 @@ class Evaluation : private Walk {
     if (path.count == 1) return {kMainRoot};
     bool always = true;
     return FoldersAt(At(path.Parent().Names()), always);
+  }
+
+  // The path leads onto the other volume, which came or went.
+  bool CanLoseVolume() const { return mMeetsOther && mGraph.Others().size() > 1; }
+
+  std::set<std::string> HonestErrors() const {
+    const std::string nameOfNew = NameOfNew(mRequest.path.count == 0 ? 0 : mRequest.path.Last());
+    std::set<std::string> errors;
+    switch (mRequest.code) {
+      case 1:
+        // A colon is no volume and no folder: the item went before it was asked for its volume.
+        errors = {FullPathResponse(":"), FullPathResponse(mPlace.name + ":")};
+        if (mMeetsOther)
+          errors.insert(FullPathResponse(std::string(NameAt(kVolumePlace).hfsName) + ":"));
+        return errors;
+      case 2:
+        // The result is that of the look-up. Where the item went before it was asked for its path,
+        // there is none, and nothing is told in its place.
+        return {ResultResponse(0), ResultResponse(kNoItem), ResultResponse(kNoFolder),
+                ResultResponse(kNoVolume), ResultResponse(kImpossibleName)};
+      case 5:
+        return {kNoVolumeNameResponse, NameResponse(1, nameOfNew)};
+      case 7:
+        return {RecordResponse(0, kEmptyRecord),
+                RecordResponse(0, Record(kUnknownVolume, -1, nameOfNew))};
+      case 6:
+      case 8:
+      case 9:
+        return {kNoPathResponse, kNoPathWithName};
+      default:
+        return errors;
+    }
   }
 
   // --- Requests
@@ -275,15 +309,16 @@ class Evaluation : private Walk {
     }
   }
 
-  // The climb from a folder ends at one that is being moved, and what is above that is left out.
+  // The climb from a folder ends at one that is being moved, and what is above that is left out. A
+  // volume that is unmounted before it is asked for its name has none.
   void NoteCutPaths(const std::string& hfsPath) {
     if (mGraph.IsOfOneState()) return;
     const std::size_t volumeEnd = hfsPath.find(':') + 1;
+    if (CanLoseVolume()) mTruth.nowhere.insert(FullPathResponse(hfsPath.substr(volumeEnd - 1)));
     for (std::size_t at = hfsPath.find(':', volumeEnd); at < hfsPath.size() - 1;
          at = hfsPath.find(':', at + 1)) {
-      const std::string rest = hfsPath.substr(at + 1);
-      if (IsNamed(kMainRoot, rest.substr(0, rest.find(':')))) continue;
-      mTruth.nowhere.insert(FullPathResponse(hfsPath.substr(0, volumeEnd) + rest));
+      mTruth.nowhere.insert(
+          FullPathResponse(hfsPath.substr(0, volumeEnd) + hfsPath.substr(at + 1)));
     }
   }
 
@@ -315,12 +350,12 @@ class Evaluation : private Walk {
   void NearestVolume(const Outcome& outcome) {
     for (const Item& item : outcome.items) {
       for (const Volume& volume : VolumesOf(item.entry->folder))
-        SayFullPath(VolumeName(volume) + ":");
+        SayFullPath(VolumeName(volume, mPlace) + ":");
     }
     if (!outcome.canMiss) return;
     for (const Volume& other : mGraph.Others()) {
       const bool isBelow = mRequest.path.names[0] == kVolumePlace && other.root != kNoNode;
-      SayFullPath(VolumeName(isBelow ? other : mGraph.Main()) + ":");
+      SayFullPath(VolumeName(isBelow ? other : mGraph.Main(), mPlace) + ":");
     }
   }
 
@@ -412,7 +447,7 @@ class Evaluation : private Walk {
   bool SayItemsOn(const Volume& volume) {
     if (mRequest.folder == kParentOfRoots) {
       SayRoot(volume);
-      return mRequest.hfsName == VolumeName(volume);
+      return mRequest.hfsName == VolumeName(volume, mPlace);
     }
     bool always = false;
     for (const Node folder : FoldersWithID(volume, mRequest.folder)) {
@@ -466,7 +501,7 @@ class Evaluation : private Walk {
 
   void SayRoot(const Volume& volume) {
     Note(volume.root);
-    if (mRequest.hfsName != VolumeName(volume)) return;
+    if (mRequest.hfsName != VolumeName(volume, mPlace)) return;
     for (const FolderPlace& place : PlacesOf(volume.root)) Say(PathResponse(place.path));
   }
 
@@ -479,30 +514,6 @@ class Evaluation : private Walk {
 
 Truth Answers(const Graph& graph, const Place& place, const Request& request) {
   return Evaluation(graph, place, request).Run();
-}
-
-std::set<std::string> HonestErrors(const Place& place, const Request& request) {
-  switch (request.code) {
-    case 1:
-      return {FullPathResponse(":"), FullPathResponse(place.name + ":"),
-              FullPathResponse(std::string(NameAt(kVolumePlace).hfsName) + ":")};
-    case 2:
-      return {ResultResponse(kNoItem), ResultResponse(kNoFolder), ResultResponse(kNoVolume),
-              ResultResponse(kImpossibleName), ResultResponse(0)};
-    case 5:
-      return {kNoVolumeNameResponse, NameResponse(1, NameOfNew(request.path.Last()))};
-    case 6:
-      return {kNoPathResponse, kNoPathWithName};
-    case 7: {
-      const std::string name = NameOfNew(request.path.Last());
-      return {RecordResponse(0, kEmptyRecord), RecordResponse(0, Record(kUnknownVolume, -1, name))};
-    }
-    case 8:
-    case 9:
-      return {kNoPathResponse, kNoPathWithName};
-    default:
-      return {};
-  }
 }
 
 }  // namespace tallowmere::soak

@@ -55,6 +55,7 @@ Outcome Walk::LookUp(Node folder, NameIndex name) {
     for (const Volume& other : mGraph.Others()) {
       Note(other.root);
       const bool isMounted = other.root != kNoNode;
+      mMeetsOther |= isMounted;
       outcome.items.push_back({isMounted ? other.root : entry->node, entry, isMounted});
     }
   }

@@ -62,7 +62,7 @@ class Walk {
   Outcome LookUp(Node folder, NameIndex name);
   Outcome LookUpHFS(Node folder, std::string_view hfsName);
 
-  // A link in the last place is not followed. REQUIRES: there is a name.
+  // A link in the last place is not followed. Nothing without a name.
   Outcome At(std::span<const NameIndex> names);
 
   // The folders that an item is or leads to. False in `always` when it can be none.
@@ -81,7 +81,8 @@ class Walk {
   static void Merge(const Outcome& more, Outcome& outcome);
 
   const Graph& mGraph;
-  std::string mTrace;  // of the items that were met: differs when any of them is another
+  bool mMeetsOther = false;  // the root folder of the other volume has been met
+  std::string mTrace;        // of the items that were met: differs when any of them is another
 
  private:
   Outcome TargetOf(const Entry& link);

@@ -13,6 +13,10 @@ Path Path::Parent() const {
   return parent;
 }
 
+std::string VolumeName(const Volume& volume, const Place& place) {
+  return volume.root == kMainRoot ? place.name : NameAt(kVolumePlace).hfsName;
+}
+
 std::string TextOf(const Path& path, const Place& place) {
   std::string text = place.path;
   for (std::size_t i = 0; i < path.count; ++i) {

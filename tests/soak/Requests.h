@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <span>
 #include <string>
+#include <string_view>
 
 #include "Model.h"
 
@@ -36,6 +37,11 @@ struct Place {
   std::string path;
   std::string name;
 };
+
+std::string VolumeName(const Volume& volume, const Place& place);
+
+// What stands for the folders that a full path (code 1) has no room for.
+inline constexpr std::string_view kAnyFolders = "...";
 
 // The path on Linux.
 std::string TextOf(const Path& path, const Place& place);
