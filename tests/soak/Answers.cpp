@@ -21,12 +21,6 @@ constexpr int kImpossibleName = -37;
 // The flag without a path: there is a name, and no folder.
 const std::string kNoPathWithName = (Flag(1) + U16(0)).append(kTrailer);
 
-std::string FullPathResponse(std::string path) {
-  const std::string length = U16(static_cast<unsigned>(path.size()));
-  path.resize(kRoomForAFullPath);
-  return length + path.append(kTrailer);
-}
-
 // The name that the record of a new item has.
 std::string NameOfNew(NameIndex name) {
   return std::string(NameAt(name).hfsName).substr(0, kLongestRecordName);
@@ -205,6 +199,25 @@ class Evaluation : private Walk {
     bool always = true;
     return FoldersAt(At(path.Parent().Names()), always);
   }
+
+  // --- Full paths
+
+  std::string FullPathResponse(const std::string& path) const {
+    std::string text = mRequest.room == 0 ? "" : Shortened(path);
+    text.resize(mRequest.room);
+    return U16(static_cast<unsigned>(path.size())) + text.append(kTrailer);
+  }
+
+  // Without the outermost folder each path of this tree has room.
+  std::string Shortened(const std::string& path) const {
+    const std::size_t volumeEnd = path.find(':');
+    if (!mRequest.flag) return path.substr(0, volumeEnd);
+    if (path.size() < mRequest.room) return path;
+    const std::size_t folderEnd = path.find(':', volumeEnd + 1);
+    return path.substr(0, volumeEnd + 1).append(kAnyFolders).append(path, folderEnd);
+  }
+
+  // --- Errors
 
   // The path leads onto the other volume, which came or went.
   bool CanLoseVolume() const { return mMeetsOther && mGraph.Others().size() > 1; }

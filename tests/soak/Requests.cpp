@@ -29,14 +29,15 @@ std::string BytesOf(const Request& request, const Place& place) {
   const std::string path = TextOf(request.path, place);
   switch (request.code) {
     case 1:
-      return FullPathRequest(path, kRoomForAFullPath, 1);
+      return FullPathRequest(path, request.room, request.flag);
     case 2: {
       std::string folder = request.byOther ? "" : place.name + ":";
       std::size_t i = 0;
       for (; i + 1 < request.path.count; ++i)
         folder += std::string(NameAt(request.path.names[i]).hfsName) + ":";
-      return PathOfHFSPathRequest(folder + '\0',
-                                  std::string(NameAt(request.path.names[i]).hfsName) + '\0', 0);
+      if (request.flag) folder[folder.find(':')] = '\0';
+      return PathOfHFSPathRequest(
+          folder + '\0', std::string(NameAt(request.path.names[i]).hfsName) + '\0', request.flag);
     }
     case 3:
       return VolumeNumberRequest(NameAt(kVolumePlace).hfsName);
@@ -45,16 +46,16 @@ std::string BytesOf(const Request& request, const Place& place) {
     case 5:
       return HFSNameRequest(path, kRoomForAName);
     case 6:
-      return AddNameRequest(path, request.hfsName, 0);
+      return AddNameRequest(path, request.hfsName, request.flag);
     case 7:
       return RecordRequest(path);
     case 8:
       return PathOfPartsRequest(request.volume, static_cast<std::int32_t>(request.folder),
-                                request.hfsName, 0);
+                                request.hfsName, request.flag);
     case 9:
       return PathOfRecordRequest(
           Record(request.volume, static_cast<std::int32_t>(request.folder), request.hfsName),
-          request.search, 0);
+          request.search, request.flag);
     default:
       return ExportSettingsRequest(kRateOfACD, 16, 2, "twos");
   }
@@ -67,7 +68,8 @@ std::string TextOf(const Request& request) {
   text += " volume " + std::to_string(request.volume) + " folder " +
           std::to_string(request.folder) + " name '" + request.hfsName + "'" +
           (request.search ? " search" : "") +
-          (request.byOther ? " by the other volume's name" : "");
+          (request.byOther ? " by the other volume's name" : "") + " room " +
+          std::to_string(request.room) + (request.flag ? " flag" : "");
   return text;
 }
 

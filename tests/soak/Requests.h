@@ -22,14 +22,21 @@ struct Path {
   bool operator==(const Path&) const = default;
 };
 
+// The most bytes that a full path may be asked to have, with its NUL.
+inline constexpr std::uint16_t kMostRoom = 1024;
+// The least that is safe for this tree beside none: the longest name of a volume and six more.
+inline constexpr std::uint16_t kLeastRoom = 17;
+
 struct Request {
   unsigned code;
   Path path;       // of codes 1, 2, 5, 6, 7
   int volume = 0;  // of codes 4, 8, 9
   std::uint32_t folder = 0;
-  std::string hfsName;   // of codes 6, 8, 9
-  bool search = false;   // of code 9
-  bool byOther = false;  // of code 2: the first name is the other volume's
+  std::string hfsName;             // of codes 6, 8, 9
+  bool search = false;             // of code 9
+  bool byOther = false;            // of code 2: the first name is the other volume's
+  std::uint16_t room = kMostRoom;  // of code 1: none, or from kLeastRoom on
+  bool flag = false;               // the last one of codes 1, 2, 6, 8, 9
 };
 
 // Where the main volume is mounted and what it is called.
