@@ -82,7 +82,7 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
   }
   const Truth inSteps = Answers(Graph(states), mPlace, request);
   if (inSteps.honestErrors.contains(response)) return Verdict::kHonestError;
-  switch (DestinationOf(request, response, first, last)) {
+  switch (DestinationOf(states, request, response)) {
     case Destination::kMeant:
       return inSteps.responses.contains(response) ? Verdict::kMoved : Verdict::kWrong;
     case Destination::kNone:
@@ -97,13 +97,13 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
   return Verdict::kWrong;
 }
 
-// What could be meant in a state is what the answer that is exact there leads to.
-Judge::Destination Judge::DestinationOf(const Request& request, const std::string& response,
-                                        History::Version first, History::Version last) {
+// What is meant in a state is what the answer that is exact there leads to.
+Judge::Destination Judge::DestinationOf(const std::vector<const State*>& states,
+                                        const Request& request, const std::string& response) const {
   std::set<Node> reached;
-  std::set<Node> meant;
-  for (History::Version version = first; version <= last; ++version) {
-    const Graph& graph = GraphOf(version);
+  std::set<Node> meant = LedToInPassing(states, request);
+  for (const State* const state : states) {
+    const Graph graph({state});
     reached.merge(LeadsTo(graph, mPlace, request.code, response));
     for (const std::string& exact : Answers(graph, mPlace, request).responses)
       meant.merge(LeadsTo(graph, mPlace, request.code, exact));

@@ -3,6 +3,7 @@
 
 #include <map>
 #include <string>
+#include <vector>
 
 #include "Graph.h"
 #include "History.h"
@@ -35,8 +36,8 @@ class Judge {
   // The items, in all the states, to which an answer leads.
   enum class Destination { kNone, kMeant, kAnother };
 
-  Destination DestinationOf(const Request& request, const std::string& response,
-                            History::Version first, History::Version last);
+  Destination DestinationOf(const std::vector<const State*>& states, const Request& request,
+                            const std::string& response) const;
   const Graph& GraphOf(History::Version version);
 
   const History& mHistory;

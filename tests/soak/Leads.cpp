@@ -2,6 +2,7 @@
 
 #include <cstring>
 #include <optional>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -115,7 +116,48 @@ class Resolution : private Walk {
   const Place& mPlace;
 };
 
+// Each name in the state in which the one before was looked up, or in a later one.
+void Follow(std::span<const State* const> states, Node folder, const std::vector<NameIndex>& names,
+            std::set<Node>& reached) {
+  if (names.empty()) {
+    reached.insert(folder);
+    return;
+  }
+  for (; !states.empty(); states = states.subspan(1)) {
+    const State& state = *states.front();
+    const Entry* const entry = state.Find(folder, names.front());
+    if (entry == nullptr) continue;
+    std::vector<NameIndex> rest(names.begin() + 1, names.end());
+    if (entry->kind == Kind::kLink && !rest.empty()) {
+      if (entry->innerTarget != kNoName) rest.insert(rest.begin(), entry->innerTarget);
+      rest.insert(rest.begin(), entry->target);
+      Follow(states, kMainRoot, rest, reached);
+    } else {
+      const bool isCovered = IsVolumePlace(*entry) && state.other.root != kNoNode;
+      Follow(states, isCovered ? state.other.root : entry->node, rest, reached);
+    }
+  }
+}
+
 }  // namespace
+
+std::set<Node> LedToInPassing(const std::vector<const State*>& states, const Request& request) {
+  if (request.path.count == 0) return {};
+  const auto given = request.path.Names();
+  std::vector<NameIndex> names(given.begin(), given.end());
+  std::set<Node> reached;
+  if (request.code == 1) Follow(states, kMainRoot, {names.begin(), names.end() - 1}, reached);
+  if (request.code != 6) {
+    Follow(states, kMainRoot, names, reached);
+    return reached;
+  }
+  names.push_back(0);
+  for (NameIndex name = 0; name < kEndOfFiles; ++name) {
+    names.back() = name;
+    if (request.hfsName == NameAt(name).hfsName) Follow(states, kMainRoot, names, reached);
+  }
+  return reached;
+}
 
 std::set<Node> LeadsTo(const Graph& graph, const Place& place, unsigned code,
                        std::string_view response) {

@@ -4,6 +4,7 @@
 
 #include <set>
 #include <string_view>
+#include <vector>
 
 #include "Graph.h"
 #include "Requests.h"
@@ -14,5 +15,11 @@ namespace tallowmere::soak {
 // one only where "..." stands for any folder. REQUIRES: the graph is of one state.
 std::set<Node> LeadsTo(const Graph& graph, const Place& place, unsigned code,
                        std::string_view response);
+
+// The items that the request's path leads to when the tree passes through the states while its
+// names are looked up, one after the other: no look-up of several names, the kernel's own included,
+// is of one moment. Of code 1 also the folder in front of the last name, by which what is not there
+// is told. None for codes without a path.
+std::set<Node> LedToInPassing(const std::vector<const State*>& states, const Request& request);
 
 }  // namespace tallowmere::soak
