@@ -136,18 +136,28 @@ class Evaluation : private Walk {
     });
   }
 
+  void NoteRecordsByMadeUpID(const std::set<std::string>& names) {
+    std::vector<Volume> volumes{mGraph.Main()};
+    for (const Volume& other : mGraph.Others()) {
+      if (other.root != kNoNode) volumes.push_back(other);
+    }
+    for (const std::string& name : names) {
+      for (const Volume& volume : volumes)
+        mTruth.byMadeUpID.insert(RecordResponse(1, Record(volume.number, 0, name)));
+    }
+  }
+
   // The records of the items in those folders that have no such items.
   void NoteRecordsOfNothing(const Outcome& outcome, std::vector<Node> folders) {
     if (mGraph.IsOfOneState()) return;
     for (const Item& item : outcome.items) {
       for (const Entry* const entry : EntriesOf(item)) folders.push_back(entry->folder);
     }
-    for (const std::string& name : NamesGiven(outcome.items)) {
-      mTruth.byMadeUpID.insert(RecordResponse(1, Record(mGraph.Main().number, 0, name)));
-      for (const Volume& other : mGraph.Others()) {
-        if (other.root != kNoNode)
-          mTruth.byMadeUpID.insert(RecordResponse(1, Record(other.number, 0, name)));
-      }
+    const auto names = NamesGiven(outcome.items);
+    NoteRecordsByMadeUpID(names);
+    // What was missing at the first look is a new item by the name that is asked for.
+    if (outcome.canMiss) NoteRecordsByMadeUpID({NameOfNew(mRequest.path.Last())});
+    for (const std::string& name : names) {
       for (const Node folder : folders) {
         if (IsNamed(folder, name)) continue;
         mTruth.nowhere.insert(NameResponse(1, name));
