@@ -203,7 +203,7 @@ class Asker {
 
   std::string AnyHFSName(const State& state, unsigned code) {
     const NameIndex name = AnyInnerName();
-    const std::string whole = NameAt(name).hfsName;
+    std::string whole = NameAt(name).hfsName;
     const bool isWhole = code != 9 && Below(2) == 0;
     if (isWhole || whole.size() <= kLongestRecordName) return whole;
     // A short form, of an item that there is.
