@@ -2,8 +2,14 @@
 
 #include <algorithm>
 #include <cctype>
+#include <cstdint>
 #include <cstdio>
+#include <cstring>
+#include <set>
 #include <vector>
+
+#include "Answers.h"
+#include "Leads.h"
 
 namespace tallowmere::soak {
 namespace {
@@ -29,21 +35,23 @@ std::string Readable(std::string bytes) {
   return text;
 }
 
-// What was taken away in mid-question has the id of an item that is not on the volume that is
-// named. The tree has no such ids: they begin with a bit that its inode numbers do not have.
-bool IsRecordByMadeUpID(const Request& request, const std::string& response) {
-  constexpr std::size_t kHighestByteOfID = 1 + 2 + 3;
-  return request.code == 7 && (static_cast<unsigned char>(response[kHighestByteOfID]) & 0x80) != 0;
+// The record with 0 for an id that the service makes up: what was taken away in mid-question has
+// the id of an item that is not on the volume that is named. The tree has no such ids. Empty where
+// the record has none.
+std::string WithoutMadeUpID(std::string response) {
+  constexpr std::size_t kIDStart = sizeof(std::uint8_t) + sizeof(std::int16_t);
+  constexpr std::uint32_t kFirstMadeUpID = 0x80000000;
+  constexpr std::uint32_t kLastMadeUpID = 0xFFFFFFEF;
+  std::uint32_t id = 0;
+  if (response.size() < kIDStart + sizeof id) return {};
+  std::memcpy(&id, response.data() + kIDStart, sizeof id);
+  if (id < kFirstMadeUpID || id > kLastMadeUpID) return {};
+  std::memset(response.data() + kIDStart, 0, sizeof id);
+  return response;
 }
 
 bool Has(const State& state, const Entry& entry) {
   return std::find(state.begin(), state.end(), entry) != state.end();
-}
-
-// The volume of a folder was unmounted before its name was asked for.
-bool IsFullPathWithoutVolume(const Request& request, const std::string& response) {
-  constexpr std::size_t kTextStart = sizeof(std::uint16_t);
-  return request.code == 1 && response.size() > kTextStart && response[kTextStart] == ':';
 }
 
 }  // namespace
@@ -68,21 +76,47 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
     before = std::move(truth);
   }
   if (!hasChanged) return Verdict::kWrong;
-  if (HonestErrors(mPlace, request).contains(response)) return Verdict::kHonestError;
   std::vector<const State*> states;
   for (History::Version version = first; version <= last; ++version) {
     states.push_back(&mHistory.At(version));
   }
   const Truth inSteps = Answers(Graph(states), mPlace, request);
-  if (inSteps.responses.contains(response)) return Verdict::kMoved;
-  if (IsRecordByMadeUpID(request, response)) return Verdict::kNowhere;
-  if (IsFullPathWithoutVolume(request, response)) return Verdict::kNowhere;
-  return inSteps.nowhere.contains(response) ? Verdict::kNowhere : Verdict::kWrong;
+  if (inSteps.honestErrors.contains(response)) return Verdict::kHonestError;
+  switch (DestinationOf(states, request, response)) {
+    case Destination::kMeant:
+      return inSteps.responses.contains(response) ? Verdict::kMoved : Verdict::kWrong;
+    case Destination::kNone:
+      if (inSteps.responses.contains(response)) return Verdict::kMoved;
+      return inSteps.nowhere.contains(response) ||
+                     inSteps.byMadeUpID.contains(WithoutMadeUpID(response))
+                 ? Verdict::kNowhere
+                 : Verdict::kWrong;
+    case Destination::kAnother:
+      break;
+  }
+  return Verdict::kWrong;
+}
+
+// What is meant in a state is what the answer that is exact there leads to.
+Judge::Destination Judge::DestinationOf(const std::vector<const State*>& states,
+                                        const Request& request, const std::string& response) const {
+  std::set<Node> reached;
+  std::set<Node> meant = LedToInPassing(states, request);
+  for (const State* const state : states) {
+    const Graph graph({state});
+    reached.merge(LeadsTo(graph, mPlace, request.code, response));
+    for (const std::string& exact : Answers(graph, mPlace, request).responses)
+      meant.merge(LeadsTo(graph, mPlace, request.code, exact));
+  }
+  if (reached.empty()) return Destination::kNone;
+  const bool isMeant =
+      std::any_of(reached.begin(), reached.end(), [&](Node node) { return meant.contains(node); });
+  return isMeant ? Destination::kMeant : Destination::kAnother;
 }
 
 std::string Judge::Report(const Request& request, const std::string& response,
                           History::Version first, History::Version last) {
-  std::string text = "request   " + TextOf(request, mPlace) + "\nbytes     " +
+  std::string text = "request   " + TextOf(request) + "\nbytes     " +
                      Readable(BytesOf(request, mPlace)) + "\nresponse  " + Readable(response) +
                      "\n";
   for (History::Version version = first; version <= last; ++version) {

@@ -3,15 +3,18 @@
 
 #include <map>
 #include <string>
+#include <vector>
 
-#include "Churner.h"
-#include "Model.h"
+#include "Graph.h"
+#include "History.h"
+#include "Requests.h"
 
 namespace tallowmere::soak {
 
 enum class Verdict {
-  kExact,        // true in one of the states
-  kMoved,        // each of its steps was true in one of them: what was asked for was moved
+  kExact,  // true in one of the states
+  kMoved,  // each of its steps was true in one of them: what was asked for was moved. It leads
+           // to what could be meant in one of them, or to no item in any
   kHonestError,  // none, or not to be told, and what was asked for changed
   kNowhere,      // leads to no item in any of the states, and what was asked for changed
   kWrong,
@@ -30,6 +33,11 @@ class Judge {
                      History::Version last);
 
  private:
+  // The items, in all the states, to which an answer leads.
+  enum class Destination { kNone, kMeant, kAnother };
+
+  Destination DestinationOf(const std::vector<const State*>& states, const Request& request,
+                            const std::string& response) const;
   const Graph& GraphOf(History::Version version);
 
   const History& mHistory;

@@ -1,13 +1,11 @@
 // What a soak's tree looks like: two volumes of a few dozen items, as plain data that is copied
-// with each change, and the paths, records and answers that hold in it.
+// with each change.
 #pragma once
 
 #include <array>
 #include <cstdint>
-#include <set>
 #include <string>
 #include <string_view>
-#include <vector>
 
 namespace tallowmere::soak {
 
@@ -35,6 +33,15 @@ inline constexpr NameIndex kNoName = 255;
 
 const Name& NameAt(NameIndex index);
 
+// What a new item by an HFS name is called on Linux; it may be a short form.
+std::string NewName(std::string_view hfsName);
+
+// The most bytes of a name in a record.
+inline constexpr std::size_t kLongestRecordName = 63;
+
+// Whether the name is too long for a record, which has a short form of it.
+bool HasShortForm(NameIndex name);
+
 // --- Items ------------------------------------------------------------------------------------
 
 // Items are numbered as they are made; a number is never given to another item.
@@ -57,6 +64,16 @@ struct Entry {
   bool operator==(const Entry&) const = default;
 };
 
+// Whether it is the folder at which the other volume is mounted.
+bool IsVolumePlace(const Entry& entry);
+
+std::string ShortForm(const Entry& entry);
+
+// The HFS name that a record has for the entry.
+std::string RecordName(const Entry& entry);
+
+std::string TextOf(const Entry& entry);
+
 inline constexpr int kUnknownVolume = 32767;
 
 struct Volume {
@@ -64,6 +81,8 @@ struct Volume {
   int number;  // the last one
   bool operator==(const Volume&) const = default;
 };
+
+std::string TextOf(const Volume& volume);
 
 struct State {
   std::array<Entry, 96> entries;
@@ -75,83 +94,5 @@ struct State {
   const Entry* end() const { return entries.data() + count; }
   const Entry* Find(Node folder, NameIndex name) const;
 };
-
-// --- Requests ---------------------------------------------------------------------------------
-
-// Names from the main volume's root folder on.
-struct Path {
-  std::array<NameIndex, 3> names{};
-  std::size_t count = 0;
-
-  Path Parent() const;
-  bool operator==(const Path&) const = default;
-};
-
-struct Request {
-  unsigned code;
-  Path path;       // of codes 1, 2, 5, 6, 7
-  int volume = 0;  // of codes 4, 8, 9
-  std::uint32_t folder = 0;
-  std::string hfsName;   // of codes 6, 8, 9
-  bool search = false;   // of code 9
-  bool byOther = false;  // of code 2: the first name is the other volume's
-};
-
-// Where the main volume is mounted and what it is called.
-struct Place {
-  std::string path;
-  std::string name;
-};
-
-// The request as bytes.
-std::string BytesOf(const Request& request, const Place& place);
-
-// --- Answers ----------------------------------------------------------------------------------
-
-// What is true of the tree in one state, or what was true in several.
-class Graph {
- public:
-  explicit Graph(const std::vector<const State*>& states);
-
-  const std::vector<Entry>& Entries() const { return mEntries; }
-  const Volume& Main() const { return mMain; }
-  const std::vector<Volume>& Others() const { return mOthers; }
-  bool IsOfOneState() const { return mIsOfOneState; }
-
-  std::vector<const Entry*> In(Node folder, NameIndex name) const;
-
-  // Whether the folder is without the name, in one of the states.
-  bool CanMiss(Node folder, NameIndex name) const;
-
- private:
-  void Add(const Entry& entry);
-
-  bool mIsOfOneState;
-  std::vector<Entry> mEntries;
-  std::set<std::pair<Node, NameIndex>> mMissing;
-  Volume mMain{};
-  std::vector<Volume> mOthers;
-};
-
-struct Truth {
-  std::set<std::string> responses;
-  std::set<std::string> nowhere;  // for several states: those that lead to no item in any of them
-  std::string trace;              // of the items that were met: differs when any of them is another
-};
-
-// What is to be answered while the tree is like that: one response for one state. For several,
-// every response of which each step was true in one of them, though perhaps not in the same: the
-// item was moved while it was asked for.
-Truth Answers(const Graph& graph, const Place& place, const Request& request);
-
-// The answers that say that there is none, or that it cannot be told.
-std::set<std::string> HonestErrors(const Place& place, const Request& request);
-
-// The HFS name that a record has for the entry.
-std::string RecordName(const Entry& entry);
-
-std::string TextOf(const Request& request, const Place& place);
-std::string TextOf(const Entry& entry);
-std::string TextOf(const Volume& volume);
 
 }  // namespace tallowmere::soak

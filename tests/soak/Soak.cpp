@@ -25,7 +25,7 @@
 
 #include "Churner.h"
 #include "Judge.h"
-#include "Model.h"
+#include "Requests.h"
 #include "support/AtomReader.h"
 #include "support/ChildProgram.h"
 #include "support/EveryRequest.h"
@@ -42,12 +42,16 @@ using Clock = std::chrono::steady_clock;
 
 // What ctest takes for "skipped".
 constexpr int kSkipped = 77;
+// As other programs have it where they cannot make out what they are to do.
+constexpr int kMisused = 2;
 
 using tallowmere::test::kRateOfACD;
 constexpr unsigned kExport = 10;
 constexpr unsigned kCodes = 11;
 constexpr std::size_t kMostReports = 20;
 constexpr int kProgressLines = 20;
+// A question is about the latest state or one of those shortly before it.
+constexpr std::size_t kStatesAskedAbout = 40;
 
 struct Options {
   std::uint64_t requests = 1'000'000;
@@ -65,11 +69,11 @@ class Asked : public ChildProgram {
  public:
   explicit Asked(const std::string& service) : ChildProgram(service, {std::to_string(getpid())}) {}
 
-  // The response to a request with that code; `onRead` is called whenever bytes have come.
+  // The response to the request; `onRead` is called whenever bytes have come.
   template <class OnRead>
-  std::string Response(unsigned code, OnRead onRead) {
+  std::string Response(const Request& request, OnRead onRead) {
     std::optional<std::size_t> size;
-    while (!(size = SizeOfResponse(code)) || mRead.size() - mUsed < *size) {
+    while (!(size = SizeOfResponse(request)) || mRead.size() - mUsed < *size) {
       mRead.erase(0, std::exchange(mUsed, 0));
       const std::string more = ReadSome();
       if (more.empty()) throw std::runtime_error("the service gives no answer");
@@ -100,13 +104,12 @@ class Asked : public ChildProgram {
 
  private:
   // None until enough of it has come.
-  std::optional<std::size_t> SizeOfResponse(unsigned code) const {
-    constexpr std::size_t kFullPath = 2 + 1024;
+  std::optional<std::size_t> SizeOfResponse(const Request& request) const {
     constexpr std::size_t kRecord = 1 + 70;
     constexpr std::size_t kSettingsSize = 2;
-    switch (code) {
+    switch (request.code) {
       case 1:
-        return kFullPath + kTrailer.size();
+        return sizeof(std::uint16_t) + request.room + kTrailer.size();
       case 3:
         return 2 + kTrailer.size();
       case 7:
@@ -144,8 +147,13 @@ class Asker {
   Request AnyRequest(const State& state) {
     static constexpr std::array<unsigned, 24> kCodesByWeight{1, 1, 2, 2, 2, 3, 4, 5, 5, 5, 6, 6,
                                                              7, 7, 7, 7, 7, 8, 8, 8, 9, 9, 9, 9};
+    // Paths of 17 to 19 bytes are the only ones of this tree that are shortened.
+    static constexpr std::array<std::uint16_t, 8> kRooms{
+        0, kLeastRoom, kLeastRoom + 1, kLeastRoom + 2, kLeastRoom + 3, 768, kMostRoom, kMostRoom};
     Request request{};
     request.code = Below(2000) == 0 ? kExport : kCodesByWeight[Below(kCodesByWeight.size())];
+    request.room = kRooms[Below(kRooms.size())];
+    request.flag = Below(2) == 0;
     switch (request.code) {
       case 4:
         request.volume = Below(4) == 0 ? state.main.number : state.other.number;
@@ -195,9 +203,9 @@ class Asker {
 
   std::string AnyHFSName(const State& state, unsigned code) {
     const NameIndex name = AnyInnerName();
-    const std::string whole = NameAt(name).hfsName;
+    std::string whole = NameAt(name).hfsName;
     const bool isWhole = code != 9 && Below(2) == 0;
-    if (isWhole || whole.size() <= 63) return whole;
+    if (isWhole || whole.size() <= kLongestRecordName) return whole;
     // A short form, of an item that there is.
     const std::size_t start = Below(state.count);
     for (std::size_t i = 0; i < state.count; ++i) {
@@ -296,7 +304,7 @@ class Run {
   void AskGroup() {
     const History& history = mChurner.Changes();
     const auto first = history.Reached();
-    const auto shown = first - std::min<History::Version>(first, mAsker.Below(40));
+    const auto shown = first - std::min<History::Version>(first, mAsker.Below(kStatesAskedAbout));
     std::vector<Request> requests;
     std::string bytes;
     const std::size_t size = 1 + mAsker.Below(mOptions.group);
@@ -312,7 +320,7 @@ class Run {
     std::vector<Answered> answers;
     History::Version last = history.Begun();
     for (const Request& request : requests) {
-      std::string response = mService.Response(request.code, [&] { last = history.Begun(); });
+      std::string response = mService.Response(request, [&] { last = history.Begun(); });
       answers.push_back({std::move(response), last});
     }
     while (history.Reached() < last) std::this_thread::yield();
@@ -478,6 +486,10 @@ std::optional<Options> ReadOptions(int count, char** words) {
     } else if (name == "--service") {
       options.service = value;
     } else if (name == "--on") {
+      if (value != "tmpfs" && value != "ext4") {
+        std::fprintf(stderr, "tallowmere_soak: --on tmpfs or ext4, not %s\n", value.c_str());
+        return std::nullopt;
+      }
       options.on = value;
     } else if (name == "--pause") {
       options.pause = static_cast<unsigned>(std::stoul(value));
@@ -503,6 +515,7 @@ int main(int count, char** words) {
                  "usage: tallowmere_soak [--requests N] [--seed N] [--service PROGRAM]\n"
                  "                       [--on tmpfs|ext4] [--pause MICROSECONDS] [--group N]\n"
                  "                       [--slack KIB]\n");
+    return tallowmere::soak::kMisused;
   } catch (const std::exception& error) {
     std::fprintf(stderr, "tallowmere_soak: %s\n", error.what());
   }

@@ -1,0 +1,92 @@
+// What is true of the tree in one state, or in one of several, and what names lead to in it.
+#pragma once
+
+#include <cstdint>
+#include <set>
+#include <span>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "Model.h"
+
+namespace tallowmere::soak {
+
+inline constexpr std::uint32_t kRootID = 2;
+inline constexpr std::uint32_t kParentOfRoots = 1;
+
+// What is true of the tree in one state, or what was true in several.
+class Graph {
+ public:
+  explicit Graph(const std::vector<const State*>& states);
+
+  const std::vector<Entry>& Entries() const { return mEntries; }
+  const Volume& Main() const { return mMain; }
+  const std::vector<Volume>& Others() const { return mOthers; }
+  bool IsOfOneState() const { return mIsOfOneState; }
+
+  std::vector<const Entry*> In(Node folder, NameIndex name) const;
+
+  // Whether the folder is without the name, in one of the states.
+  bool CanMiss(Node folder, NameIndex name) const;
+
+ private:
+  void Add(const Entry& entry);
+
+  bool mIsOfOneState;
+  std::vector<Entry> mEntries;
+  std::set<std::pair<Node, NameIndex>> mMissing;
+  Volume mMain{};
+  std::vector<Volume> mOthers;
+};
+
+struct Item {
+  Node node;
+  const Entry* entry;
+  bool isRoot;  // of the other volume
+};
+
+// What a name or a path leads to: one item or none in one state.
+struct Outcome {
+  std::vector<Item> items;
+  bool canMiss = false;  // also where the folder is missing
+};
+
+// Looks names and ids up in a graph, and notes what it meets.
+class Walk {
+ public:
+  // REQUIRES: the graph outlives the walk and its outcomes.
+  explicit Walk(const Graph& graph) : mGraph(graph) {}
+
+  Outcome LookUp(Node folder, NameIndex name);
+  Outcome LookUpHFS(Node folder, std::string_view hfsName);
+
+  // A link in the last place is not followed. Nothing without a name.
+  Outcome At(std::span<const NameIndex> names);
+
+  // The folders that an item is or leads to. False in `always` when it can be none.
+  std::vector<Node> FoldersAt(const Outcome& outcome, bool& always);
+
+  // Whether a link can lead somewhere, and nowhere.
+  std::pair<bool, bool> Leads(const Entry& link);
+
+  std::vector<Node> FoldersWithID(const Volume& volume, std::uint32_t id);
+  std::uint32_t IDOf(Node folder) const;
+  std::vector<Volume> VolumesOf(Node folder) const;
+
+ protected:
+  void Note(std::uint64_t what) { mTrace += std::to_string(what) + ' '; }
+
+  static void Merge(const Outcome& more, Outcome& outcome);
+
+  const Graph& mGraph;
+  bool mMeetsOther = false;  // the root folder of the other volume has been met
+  std::string mTrace;        // of the items that were met: differs when any of them is another
+
+ private:
+  Outcome TargetOf(const Entry& link);
+  bool IsCoveredAlways() const;
+};
+
+}  // namespace tallowmere::soak

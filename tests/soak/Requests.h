@@ -1,0 +1,61 @@
+// What a soak asks, and the bytes of it.
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <span>
+#include <string>
+#include <string_view>
+
+#include "Model.h"
+
+namespace tallowmere::soak {
+
+// Names from the main volume's root folder on.
+struct Path {
+  std::array<NameIndex, 3> names{};
+  std::size_t count = 0;
+
+  Path Parent() const;
+  std::span<const NameIndex> Names() const { return {names.data(), count}; }
+  NameIndex Last() const { return names.at(count - 1); }
+  bool operator==(const Path&) const = default;
+};
+
+// The most bytes that a full path may be asked to have, with its NUL.
+inline constexpr std::uint16_t kMostRoom = 1024;
+// The least that is safe for this tree beside none: the longest name of a volume and six more.
+inline constexpr std::uint16_t kLeastRoom = 17;
+
+struct Request {
+  unsigned code;
+  Path path;       // of codes 1, 2, 5, 6, 7
+  int volume = 0;  // of codes 4, 8, 9
+  std::uint32_t folder = 0;
+  std::string hfsName;             // of codes 6, 8, 9
+  bool search = false;             // of code 9
+  bool byOther = false;            // of code 2: the first name is the other volume's
+  std::uint16_t room = kMostRoom;  // of code 1: none, or from kLeastRoom on
+  bool flag = false;               // the last one of codes 1, 2, 6, 8, 9
+};
+
+// Where the main volume is mounted and what it is called.
+struct Place {
+  std::string path;
+  std::string name;
+};
+
+std::string VolumeName(const Volume& volume, const Place& place);
+
+// What stands for the folders that a full path (code 1) has no room for.
+inline constexpr std::string_view kAnyFolders = "...";
+
+// The path on Linux.
+std::string TextOf(const Path& path, const Place& place);
+
+// The request as bytes.
+std::string BytesOf(const Request& request, const Place& place);
+
+std::string TextOf(const Request& request);
+
+}  // namespace tallowmere::soak
