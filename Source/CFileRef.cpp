@@ -820,9 +820,10 @@ bool CFileRef::Set(short vRefNum, long dirID, unsigned long nameLength, unsigned
     FSRef child = {};
     return FSMakeFSRefUnicode(&folder, nameLength, name, 0, &child) == noErr && Set(&child);
   }
-  Set(&folder);
-  if (!IsFolder()) ReInit();
-  return IsValid();
+  // In the place of another item there can be a folder by now.
+  const bool isFolder = Set(&folder) && CFURLHasDirectoryPath(mURL) && IsFolder();
+  if (!isFolder) ReInit();
+  return isFolder;
 }
 
 // The path is read before the reference is emptied, for it may be the reference's own.

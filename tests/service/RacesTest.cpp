@@ -336,6 +336,28 @@ INSTANTIATE_TEST_SUITE_P(
                     Way{"ThroughTheFolderAbove", "first/inner", "::other:item.aif", ""}),
     NameOfWay);
 
+// A folder takes a file's place in mid-question.
+TEST_F(InSmallRoot, TheNumberOfAFileIsNoFoldersInItsPlace) {
+  bool isChanged = true;
+  for (int call = 0; isChanged; ++call) {
+    const TemporaryFolder top;
+    for (int i = 0; i < 20; ++i) fs::remove(top.MakeFile("for a number that is an id"));
+    const fs::path file = top.MakeFile("file");
+    const fs::path folder = top.MakeFolder("folder");
+    StoppedService service(ServiceToRace());
+    if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
+    ItemAt(service.Streams(), file);
+    Item asked = ItemAt(service.Streams(), folder / kName);
+    const auto id = static_cast<std::int32_t>(IdentityOf(file)->second);
+    std::memcpy(asked.record.data() + sizeof asked.volume, &id, sizeof id);
+
+    service.ChangeAt(call, [&] { Exchange(file, folder); });
+    const std::string response = Answer(service.Streams(), 9, RequestAbout(asked, 9));
+    isChanged = service.HasChanged();
+    EXPECT_EQ(PathIn(9, response), "") << "changed at call " << call;
+  }
+}
+
 // --- Changes to something else ----------------------------------------------------------------
 
 struct Names {

@@ -54,6 +54,18 @@ bool Has(const State& state, const Entry& entry) {
   return std::find(state.begin(), state.end(), entry) != state.end();
 }
 
+// A request and what it becomes on its way: once code 8 has found a record, it goes on as code 9
+// with the search of the other volumes, which have items with that number and name of their own.
+std::vector<Request> StagesOf(const Request& request) {
+  std::vector<Request> stages{request};
+  if (request.code == 8 && request.hfsName.size() <= kLongestRecordName) {
+    stages.push_back(request);
+    stages.back().code = 9;
+    stages.back().search = true;
+  }
+  return stages;
+}
+
 }  // namespace
 
 const Graph& Judge::GraphOf(History::Version version) {
@@ -105,8 +117,10 @@ Judge::Destination Judge::DestinationOf(const std::vector<const State*>& states,
   for (const State* const state : states) {
     const Graph graph({state});
     reached.merge(LeadsTo(graph, mPlace, request.code, response));
-    for (const std::string& exact : Answers(graph, mPlace, request).responses)
-      meant.merge(LeadsTo(graph, mPlace, request.code, exact));
+    for (const Request& stage : StagesOf(request)) {
+      for (const std::string& exact : Answers(graph, mPlace, stage).responses)
+        meant.merge(LeadsTo(graph, mPlace, stage.code, exact));
+    }
   }
   if (reached.empty()) return Destination::kNone;
   const bool isMeant =
