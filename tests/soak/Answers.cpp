@@ -13,14 +13,6 @@ namespace {
 
 using namespace tallowmere::test;
 
-constexpr int kNoItem = -43;
-constexpr int kNoFolder = -120;
-constexpr int kNoVolume = -35;
-constexpr int kImpossibleName = -37;
-
-// The flag without a path: there is a name, and no folder.
-const std::string kNoPathWithName = (Flag(1) + U16(0)).append(kTrailer);
-
 // The name that the record of a new item has.
 std::string NameOfNew(NameIndex name) {
   return std::string(NameAt(name).hfsName).substr(0, kLongestRecordName);
@@ -245,8 +237,8 @@ class Evaluation : private Walk {
       case 2:
         // The result is that of the look-up. Where the item went before it was asked for its path,
         // there is none, and nothing is told in its place.
-        return {ResultResponse(0), ResultResponse(kNoItem), ResultResponse(kNoFolder),
-                ResultResponse(kNoVolume), ResultResponse(kImpossibleName)};
+        return {ResultResponse(0), ResultResponse(kResultNoItem), ResultResponse(kResultNoFolder),
+                ResultResponse(kResultNoVolume), ResultResponse(kResultImpossibleName)};
       case 5:
         return {kNoVolumeNameResponse, NameResponse(1, nameOfNew)};
       case 7:
@@ -255,7 +247,7 @@ class Evaluation : private Walk {
       case 6:
       case 8:
       case 9:
-        return {kNoPathResponse, kNoPathWithName};
+        return {kNoPathResponse, kNoItemResponse};
       default:
         return errors;
     }
@@ -391,7 +383,7 @@ class Evaluation : private Walk {
       for (const Volume& other : mGraph.Others()) {
         Note(other.root);
         if (other.root == kNoNode) {
-          Say(ResultResponse(kNoVolume));
+          Say(ResultResponse(kResultNoVolume));
         } else {
           folders.push_back(other.root);
         }
@@ -404,12 +396,12 @@ class Evaluation : private Walk {
       for (const Node folder : folders) Merge(LookUp(folder, path.names[i]), outcome);
       folders = FoldersAt(outcome, always);
     }
-    if (!always) Say(ResultResponse(kNoFolder));
+    if (!always) Say(ResultResponse(kResultNoFolder));
     for (const Node folder : folders) {
       const Outcome outcome = LookUp(folder, path.names[i]);
       NotePathsOfNothing(folder, outcome);
       if (outcome.canMiss)
-        Say(ResultResponse(HasShortForm(path.names[i]) ? kImpossibleName : kNoItem));
+        Say(ResultResponse(HasShortForm(path.names[i]) ? kResultImpossibleName : kResultNoItem));
       for (const Item& item : outcome.items) {
         for (const std::string& found : PathsOf(item)) Say(ResultResponse(0, found));
       }
@@ -501,7 +493,7 @@ class Evaluation : private Walk {
         Say(PathResponse(place.path + "/" + NewName(mRequest.hfsName)));
       }
     }
-    if (folders.empty() || !mGraph.IsOfOneState()) Say(kNoPathWithName);
+    if (folders.empty() || !mGraph.IsOfOneState()) Say(kNoItemResponse);
   }
 
   void PathOfRecord() {

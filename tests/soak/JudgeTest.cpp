@@ -209,6 +209,22 @@ TEST(Judge, FullPathWithoutRoomIsExactOnlyAsItIsShortened) {
   EXPECT_EQ(VerdictOn(states, request, response("soaked:")), Verdict::kWrong);
 }
 
+// Between the two, code 8 finds its record and searches the other volumes for it.
+TEST(Judge, ItemOfAnotherVolumeIsMeantOnlyWhereTheVolumesAreSearched) {
+  const Entry ofMain = EntryIn(kMainRoot, kTrack1, kX, Kind::kFile);
+  const Entry ofOther = EntryIn(kOtherRoot, kTrack1, kZ, Kind::kFile);
+  const std::vector<State> states{
+      StateOf({kPlaceEntry, ofMain, ofOther}, {kOtherRoot, kOtherNumber}),
+      StateOf({kPlaceEntry, ofMain})};
+  Request request = RequestAboutRecordOfX();
+  request.volume = kOtherNumber;
+  request.folder = kRootID;
+  const std::string response = PathResponse("/soaked/track 1.aif");
+  EXPECT_EQ(VerdictOn(states, request, response), Verdict::kWrong);
+  request.code = 8;
+  EXPECT_EQ(VerdictOn(states, request, response), Verdict::kMoved);
+}
+
 // --- Wrong answers ----------------------------------------------------------------------------
 
 TEST(Judge, PathThatLedToAnotherItemOnlyIsWrong) {

@@ -121,6 +121,7 @@ inline std::string FullPathResponse(std::string fullPath, unsigned room) {
 inline constexpr int kResultNoItem = -43;
 inline constexpr int kResultNoFolder = -120;
 inline constexpr int kResultNoVolume = -35;
+inline constexpr int kResultImpossibleName = -37;
 inline constexpr int kResultNotPermitted = -5000;
 inline constexpr int kResultSystemError = -36;
 inline constexpr int kResultNoMemory = -108;
