@@ -7,7 +7,8 @@
 // mounted in it, when it could not be read, or when a file is looked for: whoever looks for a file
 // reads every folder once. An id that no item had is noted, and the next question for it reads only
 // what has changed since. The index never leaves its volume, waits for no server and no
-// automounter, and passes over what it may not read. Between two questions it has nothing open.
+// automounter, unless a folder that it knows has become a link that leads there, and passes over
+// what it may not read. Between two questions it has nothing open.
 //
 // One thread. Everything may throw std::bad_alloc, after which the index is as good as new.
 #pragma once
