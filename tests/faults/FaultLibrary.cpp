@@ -3,7 +3,8 @@
 // A filter of the kernel's turns every system call, also those that the C library makes inside,
 // into a signal, except those from one instruction of this file. The signal's handler carries the
 // call out from there, or writes the error into the registers that the call returns with.
-// Allocations go through the functions below on their way to the C library's.
+// Allocations go through the functions below on their way to the C library's. The clock is some
+// time ahead, so that no item is so new that a service looks at it more often.
 #include <linux/audit.h>
 #include <linux/filter.h>
 #include <linux/futex.h>
@@ -12,6 +13,7 @@
 #include <sys/mman.h>
 #include <sys/prctl.h>
 #include <sys/syscall.h>
+#include <time.h>
 #include <ucontext.h>
 #include <unistd.h>
 
@@ -224,4 +226,14 @@ extern "C" void free(void* block) {
   if (block == nullptr) return;
   --gPage->liveAllocations;
   __libc_free(block);
+}
+
+// NOLINTNEXTLINE(readability-inconsistent-declaration-parameter-name): theirs are reserved.
+extern "C" int clock_gettime(clockid_t clock, timespec* shown) noexcept {
+  constexpr time_t kAhead = 60;
+  const long result =
+      FaultLibraryCall(SYS_clock_gettime, clock, reinterpret_cast<long>(shown), 0, 0, 0, 0);
+  if (result == 0 && clock == CLOCK_REALTIME) shown->tv_sec += kAhead;
+  if (result < 0) errno = static_cast<int>(-result);
+  return result < 0 ? -1 : 0;
 }

@@ -6,15 +6,14 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
-#include <chrono>
 #include <cstdint>
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iostream>
 #include <memory>
 #include <optional>
 #include <string>
-#include <thread>
 #include <utility>
 #include <vector>
 
@@ -30,9 +29,6 @@ namespace {
 
 // Enough to see what is wrong with a request.
 constexpr int kMostFindings = 6;
-
-// Of the times that file systems keep, and some more.
-constexpr std::chrono::milliseconds kCoarsestTick(2200);
 
 class InjectedFaults : public testing::Environment {
  public:
@@ -110,6 +106,12 @@ constexpr int kMostAttempts = 2;
 
 // How often a new service is asked once it has answered rightly after a fault.
 constexpr int kMoreAnswers = 3;
+
+// Whether what the services reach is counted, by clang. A fault at their start then decides whether
+// the file of counts is open.
+bool IsCounted() {
+  return getenv("LLVM_PROFILE_FILE") != nullptr;
+}
 
 // One question, asked while something fails.
 class Trial {
@@ -190,7 +192,8 @@ class Trial {
     const std::int64_t learned = service.Holds().allocations;
     for (int i = 0; i < kMoreAnswers; ++i) AskAgain(service, fault);
     const Holdings after = service.Holds();
-    if (after.descriptors != mDescriptors) Report(fault, "leaves a descriptor open");
+    const bool isLevel = after.descriptors == mDescriptors || IsCounted();
+    if (!isLevel) Report(fault, "leaves a descriptor open");
     if (after.allocations != learned + kMoreAnswers * mKept) {
       Report(fault, "makes every answer leave something behind");
     }
@@ -327,8 +330,7 @@ const std::vector<Item> kItems{
     {"RootOfAVolume", [] { return Subject("/Disk"); }, {1, 2, 5, 7, 8, 9}, {7, 9}},
 };
 
-// A small root with all the items on its volumes, made before the first question: a service looks
-// more often at what has just changed.
+// A small root with all the items on its volumes.
 class Tree {
  public:
   Tree() : mRoot({TALLOWMERE_SERVICE, TALLOWMERE_FAULT_LIBRARY}) {
@@ -349,8 +351,6 @@ class Tree {
       Make("/Disk/twins/" + std::to_string(i) + std::string(250, 'f'));
     }
     Make("/Disk/twins/\u00E9te\u0301");
-    // Until a service believes the times of change.
-    std::this_thread::sleep_for(kCoarsestTick);
   }
 
   bool IsMade() const { return mRoot.IsEntered(); }
