@@ -60,6 +60,11 @@ std::string JoinPath(std::string_view path, std::string_view component) {
   return joined += component;
 }
 
+bool IsWithin(std::string_view path, std::string_view folder) {
+  if (folder == "/") return path.starts_with('/');
+  return path.starts_with(folder) && (path.size() == folder.size() || path[folder.size()] == '/');
+}
+
 std::optional<std::string_view> Extension(std::string_view component) {
   const auto dot = component.rfind('.');
   if (dot == component.npos || dot == 0 || dot + 1 == component.size()) return std::nullopt;

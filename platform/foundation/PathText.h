@@ -31,6 +31,10 @@ std::string FolderOf(std::string_view path);
 // The path and a component with a "/" between them, unless the path is empty or ends in one.
 std::string JoinPath(std::string_view path, std::string_view component);
 
+// Whether a path is a folder's or below it, by their spelling. REQUIRES: both are absolute, without
+// a folder mark.
+bool IsWithin(std::string_view path, std::string_view folder);
+
 // What follows the last "." of a component. None when there is none, when it is empty and when the
 // only "." is the first character.
 std::optional<std::string_view> Extension(std::string_view component);

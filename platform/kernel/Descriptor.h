@@ -5,7 +5,7 @@
 
 #include <utility>
 
-namespace tallowmere::files {
+namespace tallowmere::kernel {
 
 class Descriptor {
  public:
@@ -32,4 +32,4 @@ class Descriptor {
   int mDescriptor = -1;
 };
 
-}  // namespace tallowmere::files
+}  // namespace tallowmere::kernel

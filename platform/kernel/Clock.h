@@ -1,0 +1,16 @@
+// The time of day.
+#pragma once
+
+#include <cstdint>
+
+namespace tallowmere::kernel {
+
+// A time in nanoseconds since 1970. Beyond the years 1677 to 2262 the number wraps, so that other
+// times still have other numbers.
+using Nanoseconds = std::int64_t;
+
+Nanoseconds NanosecondsOf(std::int64_t seconds, std::int64_t nanoseconds);
+
+Nanoseconds Now();
+
+}  // namespace tallowmere::kernel

@@ -1,0 +1,108 @@
+#include "kernel/Paths.h"
+
+#include <fcntl.h>
+#include <linux/openat2.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include <array>
+#include <climits>
+#include <cstdlib>
+#include <memory>
+
+#include "foundation/PathText.h"
+
+namespace tallowmere::kernel {
+namespace {
+
+constexpr int kHeld = O_PATH | O_NOFOLLOW | O_CLOEXEC;
+
+Result<Descriptor> AsResult(int descriptor) {
+  if (descriptor < 0) return Error::OfLastCall();
+  return Descriptor(descriptor);
+}
+
+// Folder by folder: an open link has nothing in it.
+Result<Descriptor> HoldStepByStep(std::string_view path, int flags) {
+  if (path.size() >= PATH_MAX) return Error{ENAMETOOLONG};
+  auto item = AsResult(open("/", kHeld));
+  while (item && path.size() > 1) {
+    path.remove_prefix(1);
+    const std::string name(path.substr(0, path.find('/')));
+    const bool isLast = name.size() == path.size();
+    item = AsResult(openat(item->Get(), name.c_str(), isLast ? flags : kHeld));
+    path.remove_prefix(name.size());
+  }
+  return item;
+}
+
+Result<Descriptor> Hold(const std::string& path, int flags) {
+  open_how how{};
+  how.flags = static_cast<std::uint64_t>(flags);
+  how.resolve = RESOLVE_NO_SYMLINKS;
+  const long descriptor = syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how);
+  // Before Linux 5.6 there is no such call, and some sandboxes forbid it: openat2(2).
+  const bool isCallMissing = descriptor < 0 && (errno == ENOSYS || errno == EPERM);
+  return isCallMissing ? HoldStepByStep(path, flags) : AsResult(static_cast<int>(descriptor));
+}
+
+}  // namespace
+
+bool IsNormalized(std::string_view path) {
+  if (path == "/") return true;
+  if (!path.starts_with('/')) return false;
+  while (!path.empty()) {
+    path.remove_prefix(1);
+    const auto name = path.substr(0, path.find('/'));
+    if (name.empty() || name == "." || name == "..") return false;
+    path.remove_prefix(name.size());
+  }
+  return true;
+}
+
+Result<Descriptor> HoldWithoutLinks(const std::string& path) {
+  return Hold(path, kHeld);
+}
+
+Result<Descriptor> HoldFolderWithoutLinks(const std::string& path) {
+  return Hold(path, kHeld | O_DIRECTORY);
+}
+
+Result<Descriptor> HoldFollowing(const Spot& spot) {
+  return AsResult(openat(spot.folder, spot.name, O_PATH | O_CLOEXEC));
+}
+
+Result<Descriptor> OpenForReading(const Spot& spot) {
+  return AsResult(
+      openat(spot.folder, spot.name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+}
+
+Result<std::string> RealPath(const std::string& path) {
+  struct Free {
+    void operator()(char* text) const { std::free(text); }
+  };
+  const std::unique_ptr<char, Free> real(realpath(path.c_str(), nullptr));
+  if (!real) return Error::OfLastCall();
+  return std::string(real.get());
+}
+
+Result<std::string> CanonicalPath(const std::string& path) {
+  const std::string_view name = *foundation::LastComponent(path);
+  if (name == "/" || name == "." || name == "..") return RealPath(path);
+  const auto length = static_cast<std::size_t>(name.data() - path.data());
+  const auto folder = RealPath(path.substr(0, length));
+  if (!folder) return folder.Error();
+  return foundation::JoinPath(*folder, name);
+}
+
+Result<std::string> PathOfDescriptor(const Descriptor& descriptor) {
+  const std::string link = "/proc/self/fd/" + std::to_string(descriptor.Get());
+  std::array<char, PATH_MAX> text{};
+  const ssize_t length = readlink(link.c_str(), text.data(), text.size());
+  if (length < 0) return Error::OfLastCall();
+  // What no path leads to has a text without "/" in front.
+  if (length == 0 || text[0] != '/') return kNotThere;
+  return std::string(text.data(), static_cast<std::size_t>(length));
+}
+
+}  // namespace tallowmere::kernel

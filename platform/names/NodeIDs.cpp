@@ -1,0 +1,153 @@
+#include "names/NodeIDs.h"
+
+#include <algorithm>
+
+namespace tallowmere::names {
+namespace {
+
+// The lower half: inode numbers as they are. HFS reserves the ids below 16.
+constexpr std::uint64_t kLowestOwnNumber = 16;
+constexpr std::uint64_t kHighestOwnNumber = 0x7FFFFFFF;
+
+constexpr std::uint32_t kLowestUpper = 0x80000000;
+constexpr std::uint32_t kHighestUpper = 0xFFFFFFEF;
+
+// Above them stand the numbers 1 to 15: 0xFFFFFFF0 to 0xFFFFFFFE.
+constexpr std::uint64_t kHighestSmallNumber = kLowestOwnNumber - 1;
+constexpr std::uint32_t kHighestID = kHighestUpper + kHighestSmallNumber;
+
+// Folding keeps the lowest 31 bits, and moves down what would be among the numbers 1 to 15.
+constexpr std::uint64_t kFold = std::uint64_t{1} << 31;
+constexpr std::uint32_t kMovedDown = 0x10;
+
+// 256 is the first id of a btrfs subvolume: BTRFS_FIRST_FREE_OBJECTID in <linux/btrfs_tree.h>.
+constexpr std::uint64_t kLowestSubvolume = 256;
+constexpr std::uint64_t kHighestSubvolume = 639;
+constexpr unsigned kSubvolumeShift = 22;
+constexpr std::uint64_t kNumbersOfSubvolume = std::uint64_t{1} << kSubvolumeShift;
+constexpr std::uint32_t kLowestMixedOfSubvolumes = 0xE0000000;
+static_assert(kLowestUpper + ((kHighestSubvolume - kLowestSubvolume + 1) << kSubvolumeShift) ==
+              kLowestMixedOfSubvolumes);
+
+// The finishing step of SplitMix64: every bit of the input moves every bit of the result.
+std::uint64_t Mix(std::uint64_t value) {
+  value = (value ^ value >> 30) * 0xBF58476D1CE4E5B9;
+  value = (value ^ value >> 27) * 0x94D049BB133111EB;
+  return value ^ value >> 31;
+}
+
+std::uint32_t MixInto(std::uint32_t lowest, std::uint64_t origin, std::uint64_t inode) {
+  const std::uint64_t mixed = Mix(inode ^ Mix(origin));
+  return static_cast<std::uint32_t>(lowest + mixed % (kHighestUpper - lowest + 1));
+}
+
+bool IsOnRootsDevice(const ItemNumbers& item, const NodeIDRule& rule) {
+  return item.device == rule.root.device;
+}
+
+bool HasOwnNumber(const ItemNumbers& item, const NodeIDRule& rule) {
+  return IsOnRootsDevice(item, rule) && item.inode > 0 && item.inode <= kHighestOwnNumber;
+}
+
+std::uint32_t Fold(std::uint64_t inode) {
+  const auto folded = static_cast<std::uint32_t>(kLowestUpper + inode % kFold);
+  return folded > kHighestUpper ? folded - kMovedDown : folded;
+}
+
+bool HasPlace(std::uint64_t subvolume, std::uint64_t inode) {
+  return subvolume >= kLowestSubvolume && subvolume <= kHighestSubvolume &&
+         inode < kNumbersOfSubvolume;
+}
+
+std::uint32_t UpperIDInSubvolumes(const ItemNumbers& item, const NodeIDRule& rule) {
+  if (IsOnRootsDevice(item, rule) || !HasPlace(item.subvolume, item.inode)) {
+    return MixInto(kLowestMixedOfSubvolumes, item.subvolume, item.inode);
+  }
+  const std::uint64_t place = (item.subvolume - kLowestSubvolume) << kSubvolumeShift;
+  return static_cast<std::uint32_t>(kLowestUpper + place + item.inode);
+}
+
+// The device of the root folder differs from mount to mount on file systems without a disk of their
+// own, so ids on it do without it.
+std::uint32_t UpperID(const ItemNumbers& item, const NodeIDRule& rule) {
+  if (rule.upper == UpperIDs::kSubvolumes) return UpperIDInSubvolumes(item, rule);
+  if (rule.upper == UpperIDs::kFolded && item.inode > kHighestOwnNumber) return Fold(item.inode);
+  return MixInto(kLowestUpper, IsOnRootsDevice(item, rule) ? 0 : item.device, item.inode);
+}
+
+using Candidates = std::vector<Candidate>;
+
+// The numbers on the root folder's device up to the highest whose lowest 31 bits fold into the id.
+std::optional<Candidates> FoldedInto(std::uint32_t id, std::uint64_t rootInode,
+                                     std::uint64_t highestInode) {
+  const std::uint64_t lowest = id;
+  const std::uint64_t movedDown = lowest + kMovedDown;
+  const std::uint64_t folds = highestInode / kFold;  // each with two candidates at most
+  if (folds > kMostCandidates / 2) return std::nullopt;
+  Candidates candidates;
+  for (std::uint64_t inode = lowest; inode <= highestInode; inode += kFold) {
+    candidates.push_back({inode, 0});
+    const std::uint64_t other = inode - lowest + movedDown;
+    if (Fold(other) == id && other <= highestInode) candidates.push_back({other, 0});
+  }
+  std::erase(candidates, Candidate{rootInode, 0});
+  return candidates;
+}
+
+std::optional<Candidates> InSubvolumes(std::uint32_t id, const NodeIDRule& rule) {
+  if (id >= kLowestMixedOfSubvolumes) return std::nullopt;
+  const std::uint32_t place = id - kLowestUpper;
+  const Candidate candidate{place % kNumbersOfSubvolume,
+                            kLowestSubvolume + (place >> kSubvolumeShift)};
+  if (candidate.subvolume == rule.root.subvolume) return Candidates{};
+  return Candidates{candidate};
+}
+
+Candidates OneUnlessRoot(std::uint64_t inode, const NodeIDRule& rule) {
+  return inode == rule.root.inode ? Candidates{} : Candidates{{inode, 0}};
+}
+
+}  // namespace
+
+bool NeedsSubvolume(const ItemNumbers& item, const NodeIDRule& rule) {
+  return rule.upper == UpperIDs::kSubvolumes && !HasOwnNumber(item, rule);
+}
+
+std::uint32_t NodeIDOf(const ItemNumbers& item, const NodeIDRule& rule) {
+  if (IsOnRootsDevice(item, rule) && item.inode == rule.root.inode) return kRootFolderID;
+  if (!HasOwnNumber(item, rule)) return UpperID(item, rule);
+  const auto number = static_cast<std::uint32_t>(item.inode);
+  return number < kLowestOwnNumber ? kHighestUpper + number : number;
+}
+
+bool CanBeNodeID(std::uint32_t id) {
+  return id == kRootFolderID || (id >= kLowestOwnNumber && id <= kHighestID);
+}
+
+bool IsInodeNumber(std::uint32_t id) {
+  return id >= kLowestOwnNumber && id <= kHighestOwnNumber;
+}
+
+std::optional<Candidates> CandidatesOf(std::uint32_t id, const NodeIDRule& rule,
+                                       std::uint64_t highestInode) {
+  if (!CanBeNodeID(id)) return Candidates{};
+  if (id == kRootFolderID) return Candidates{{rule.root.inode, 0}};
+  if (IsInodeNumber(id)) return OneUnlessRoot(id, rule);
+  if (id > kHighestUpper) return OneUnlessRoot(id - kHighestUpper, rule);
+  switch (rule.upper) {
+    case UpperIDs::kFolded:
+      return FoldedInto(id, rule.root.inode, highestInode);
+    case UpperIDs::kSubvolumes:
+      return InSubvolumes(id, rule);
+    case UpperIDs::kMixed:
+      break;
+  }
+  return std::nullopt;
+}
+
+bool IsCertain(std::uint32_t id, const NodeIDRule& rule, std::uint64_t highestInode) {
+  const auto candidates = CandidatesOf(id, rule, highestInode);
+  return candidates && candidates->size() <= 1;
+}
+
+}  // namespace tallowmere::names

@@ -1,0 +1,135 @@
+#include "volumes/Volume.h"
+
+#include <algorithm>
+#include <utility>
+
+#include "foundation/PathText.h"
+#include "kernel/MountTableFile.h"
+#include "names/HFSNames.h"
+
+namespace tallowmere::volumes {
+namespace {
+
+// What the volume of "/" is called when its file system has no label.
+constexpr const char* kUnlabelledRoot = "Root";
+
+// What a path has behind a folder that it is within, without "/" in front; empty for the folder.
+std::string_view BehindFolder(std::string_view path, std::string_view folder) {
+  path.remove_prefix(folder == "/" ? 0 : folder.size());
+  if (path.starts_with('/')) path.remove_prefix(1);
+  return path;
+}
+
+std::string Below(const std::string& folder, std::string_view path) {
+  return path.empty() ? folder : foundation::JoinPath(folder, path);
+}
+
+// Whether an error says that this process may not read the label, or that the device does not give
+// it: the next process may be told more.
+bool HidesLabel(kernel::Error error) {
+  return kernel::MeansRefused(error) || error.number == EIO;
+}
+
+std::string HFSNameOfVolume(const std::string& linuxName) {
+  auto plain = names::PlainHFSName(linuxName, names::kLongestSpecName);
+  return plain ? *std::move(plain) : names::ShortHFSName(linuxName, names::kRootFolderID);
+}
+
+// Whether the item that was found at a mount point is not what is mounted there.
+bool IsMoved(const kernel::Result<kernel::Status>& found, int mount) {
+  if (!found) return found.Error().number == ENOENT || found.Error().number == ENOTDIR;
+  return found->item.mount != kernel::kNoMount && found->item.mount != mount;
+}
+
+}  // namespace
+
+ListedVolume::ListedVolume(VolumeNumber number, std::vector<Place> places,
+                           std::vector<std::string> covers)
+    : mNumber(number), mPlaces(std::move(places)), mCovers(std::move(covers)) {}
+
+const std::vector<std::string>& ListedVolume::MountPoints() const {
+  if (!mMountPoints.empty()) return mMountPoints;
+  std::vector<std::string> mountPoints{MountPoint()};
+  for (auto place = mPlaces.begin() + 1; place != mPlaces.end(); ++place) {
+    const std::string& mountPoint = place->mount.mountPoint;
+    if (place->mayBeFile && !kernel::IsFolderByMemory(mountPoint)) continue;
+    mountPoints.push_back(mountPoint);
+  }
+  mMountPoints = std::move(mountPoints);
+  return mMountPoints;
+}
+
+const ListedVolume::Place* ListedVolume::PlaceWithID(int mount) const {
+  const auto found = std::find_if(mPlaces.begin(), mPlaces.end(), [mount](const Place& place) {
+    return place.mount.id == mount;
+  });
+  return found == mPlaces.end() ? nullptr : &*found;
+}
+
+bool ListedVolume::IsMountedAs(int mount) const {
+  return PlaceWithID(mount) != nullptr;
+}
+
+std::vector<std::string> ListedVolume::PathsOf(const std::string& path, int mount) const {
+  const Place* const own = PlaceWithID(mount);
+  if (own == nullptr || !foundation::IsWithin(path, own->mount.mountPoint)) return {path};
+  const std::string inside = Below(own->mount.root, BehindFolder(path, own->mount.mountPoint));
+  std::vector<std::string> paths;
+  for (const Place& other : mPlaces) {
+    if (!foundation::IsWithin(inside, other.mount.root)) continue;
+    paths.push_back(Below(other.mount.mountPoint, BehindFolder(inside, other.mount.root)));
+  }
+  return paths;
+}
+
+kernel::Result<std::string_view> ListedVolume::Name() const {
+  if (mIsNameKnown) return std::string_view(mName);
+  if (MountPoint() != "/") {
+    mName = HFSNameOfVolume(std::string(*foundation::LastComponent(MountPoint())));
+    mIsNameKnown = true;
+    return std::string_view(mName);
+  }
+  auto label = kernel::ReadRootLabel();
+  if (!label && !HidesLabel(label.Error())) return label.Error();
+  const bool isLabelled = label && !label->empty();
+  // A label may hold what no name of an item can.
+  if (isLabelled) std::replace(label->begin(), label->end(), '/', ':');
+  mName = HFSNameOfVolume(isLabelled ? *label : kUnlabelledRoot);
+  mIsNameKnown = static_cast<bool>(label);
+  return std::string_view(mName);
+}
+
+kernel::Result<VolumePointer> ListedVolume::Enter() const {
+  if (mEntered) return mEntered;
+  const kernel::Spot place = kernel::AtPath(MountPoint().c_str());
+  const auto root = kernel::ReadStatus(place);
+  if (IsMoved(root, mPlaces.front().mount.id)) return kMoved;
+  if (!root) return root.Error();
+  const auto kind = kernel::ReadKind(MountPoint().c_str(), root->item.device);
+  if (!kind) return kind.Error();
+  mEntered = std::make_shared<const Volume>(shared_from_this(), root->item, **kind);
+  return mEntered;
+}
+
+Volume::Volume(std::shared_ptr<const ListedVolume> listed, const kernel::Item& root,
+               const kernel::FileSystemKind& kind)
+    : mNumber(listed->Number()),
+      mMountPoint(listed->MountPoint()),
+      mRoot(root),
+      mKind(&kind),
+      mRule{root.device, root.inode, kind.idRule} {}
+
+bool Volume::NeedsHandleForID(const kernel::Item& item) const {
+  return mKind->idRule == names::UpperIDs::kBtrfs && item.device != mRoot.device &&
+         item.handle.size == 0;
+}
+
+std::uint32_t Volume::IDOf(const kernel::Item& item) const {
+  return names::NodeIDOf({item.inode, item.device, kernel::SubvolumeOf(item.handle)}, mRule);
+}
+
+std::uint32_t Volume::IDOfEntry(std::uint64_t inode, const kernel::Item& folder) const {
+  return names::NodeIDOf({inode, folder.device, kernel::SubvolumeOf(folder.handle)}, mRule);
+}
+
+}  // namespace tallowmere::volumes
