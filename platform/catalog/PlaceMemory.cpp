@@ -1,69 +1,68 @@
-#include "files/PlaceMemory.h"
+#include "catalog/PlaceMemory.h"
 
-#include "files/Spread.h"
+#include "catalog/Spread.h"
 
-namespace tallowmere::files {
+namespace tallowmere::catalog {
 namespace {
-
-// Some five thousand places with paths of usual length.
-constexpr std::size_t kLimitOfThisProcess = 1 << 20;
 
 // What the heap and the two containers add to a place and its path.
 constexpr std::size_t kOverhead = 96;
 
 }  // namespace
 
-std::size_t PlaceMemory::HashOfKey::operator()(const Key& key) const noexcept {
-  return (key.inode ^ (key.device * kSpread)) * kSpread;
-}
-
-PlaceMemory& PlaceMemory::OfThisProcess() {
-  static PlaceMemory memory(kLimitOfThisProcess);
-  return memory;
+std::size_t PlaceMemory::HashOfKey::operator()(const PlaceKey& key) const noexcept {
+  return static_cast<std::size_t>((key.number ^ (key.space * kSpread)) * kSpread);
 }
 
 PlaceMemory::PlaceMemory(std::size_t limit) : mLimit(limit) {}
 
-void PlaceMemory::Remember(const ItemReference& item, std::string_view path) {
-  const Key key{item.device, item.inode};
-  const auto known = mIndex.find(key);
-  if (known != mIndex.end() && known->second->path == path) {
-    mPlaces.splice(mPlaces.begin(), mPlaces, known->second);
+void PlaceMemory::Remember(const PlaceKey& item, std::string_view path) {
+  const auto known = mIndex.find(item);
+  if (known != mIndex.end() && known->second->place.path == path) {
+    mEntries.splice(mEntries.begin(), mEntries, known->second);
     return;
   }
-  Places fresh;
-  fresh.push_back({key, std::string(path)});
+  Entries fresh;
+  fresh.push_back({item, {std::string(path), 0}});
   if (known != mIndex.end()) {
     mSize -= SizeOf(*known->second);
-    mPlaces.erase(known->second);
+    mEntries.erase(known->second);
     known->second = fresh.begin();
   } else {
-    mIndex.emplace(key, fresh.begin());
+    mIndex.emplace(item, fresh.begin());
   }
   mSize += SizeOf(fresh.front());
-  mPlaces.splice(mPlaces.begin(), fresh);
+  mEntries.splice(mEntries.begin(), fresh);
   while (mSize > mLimit) ForgetTheOldest();
 }
 
-const std::string* PlaceMemory::Recall(const ItemReference& item) {
-  const auto known = mIndex.find({item.device, item.inode});
+void PlaceMemory::RememberParent(const PlaceKey& item, std::string_view path,
+                                 std::uint32_t parent) {
+  const auto known = mIndex.find(item);
+  if (known != mIndex.end() && known->second->place.path == path) {
+    known->second->place.parent = parent;
+  }
+}
+
+const PlaceMemory::Place* PlaceMemory::Recall(const PlaceKey& item) {
+  const auto known = mIndex.find(item);
   if (known == mIndex.end()) return nullptr;
-  mPlaces.splice(mPlaces.begin(), mPlaces, known->second);
-  return &known->second->path;
+  mEntries.splice(mEntries.begin(), mEntries, known->second);
+  return &known->second->place;
 }
 
 std::string_view PlaceMemory::Latest() const {
-  return mPlaces.empty() ? std::string_view() : mPlaces.front().path;
+  return mEntries.empty() ? std::string_view() : mEntries.front().place.path;
 }
 
-std::size_t PlaceMemory::SizeOf(const Place& place) {
-  return sizeof(Place) + place.path.capacity() + kOverhead;
+std::size_t PlaceMemory::SizeOf(const Entry& entry) {
+  return sizeof(Entry) + entry.place.path.capacity() + kOverhead;
 }
 
 void PlaceMemory::ForgetTheOldest() {
-  mSize -= SizeOf(mPlaces.back());
-  mIndex.erase(mPlaces.back().key);
-  mPlaces.pop_back();
+  mSize -= SizeOf(mEntries.back());
+  mIndex.erase(mEntries.back().key);
+  mEntries.pop_back();
 }
 
-}  // namespace tallowmere::files
+}  // namespace tallowmere::catalog

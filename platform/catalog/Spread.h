@@ -4,7 +4,7 @@
 #include <cstddef>
 #include <cstdint>
 
-namespace tallowmere::files {
+namespace tallowmere::catalog {
 
 // An odd number that spreads the bits of what it multiplies: 2^64 divided by the golden ratio.
 inline constexpr std::uint64_t kSpread = 0x9E3779B97F4A7C15;
@@ -14,4 +14,4 @@ inline std::size_t FirstSlot(std::uint32_t number, std::size_t slots) {
   return (number * kSpread >> 32) & (slots - 1);
 }
 
-}  // namespace tallowmere::files
+}  // namespace tallowmere::catalog

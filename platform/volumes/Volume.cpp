@@ -5,6 +5,7 @@
 
 #include "foundation/PathText.h"
 #include "kernel/MountTableFile.h"
+#include "kernel/VolumeFacts.h"
 #include "names/HFSNames.h"
 
 namespace tallowmere::volumes {
@@ -100,28 +101,34 @@ kernel::Result<std::string_view> ListedVolume::Name() const {
 }
 
 kernel::Result<VolumePointer> ListedVolume::Enter() const {
-  if (mEntered) return mEntered;
-  const kernel::Spot place = kernel::AtPath(MountPoint().c_str());
-  const auto root = kernel::ReadStatus(place);
-  if (IsMoved(root, mPlaces.front().mount.id)) return kMoved;
-  if (!root) return root.Error();
-  const auto kind = kernel::ReadKind(MountPoint().c_str(), root->item.device);
-  if (!kind) return kind.Error();
-  mEntered = std::make_shared<const Volume>(shared_from_this(), root->item, **kind);
-  return mEntered;
+  if (!mEntered) {
+    const auto root = kernel::ReadStatus(kernel::AtPath(MountPoint().c_str()));
+    if (IsMoved(root, mPlaces.front().mount.id)) return kMoved;
+    if (!root) return root.Error();
+    const auto kind = kernel::ReadKind(MountPoint(), root->item.device);
+    if (!kind) return kind.Error();
+    mEntered.emplace(*this, root->item, **kind);
+  }
+  return VolumePointer(shared_from_this(), &*mEntered);
 }
 
-Volume::Volume(std::shared_ptr<const ListedVolume> listed, const kernel::Item& root,
+Volume::Volume(const ListedVolume& listed, const kernel::Item& root,
                const kernel::FileSystemKind& kind)
-    : mNumber(listed->Number()),
-      mMountPoint(listed->MountPoint()),
+    : mListed(listed),
       mRoot(root),
-      mKind(&kind),
-      mRule{root.device, root.inode, kind.idRule} {}
+      mKind(kind),
+      mRule{{root.inode, root.device, kernel::SubvolumeOf(root.handle)}, kind.upperIDs} {}
+
+VolumeNumber Volume::Number() const {
+  return mListed.Number();
+}
+
+const std::string& Volume::MountPoint() const {
+  return mListed.MountPoint();
+}
 
 bool Volume::NeedsHandleForID(const kernel::Item& item) const {
-  return mKind->idRule == names::UpperIDs::kBtrfs && item.device != mRoot.device &&
-         item.handle.size == 0;
+  return item.handle.size == 0 && names::NeedsSubvolume({item.inode, item.device, 0}, mRule);
 }
 
 std::uint32_t Volume::IDOf(const kernel::Item& item) const {
@@ -130,6 +137,23 @@ std::uint32_t Volume::IDOf(const kernel::Item& item) const {
 
 std::uint32_t Volume::IDOfEntry(std::uint64_t inode, const kernel::Item& folder) const {
   return names::NodeIDOf({inode, folder.device, kernel::SubvolumeOf(folder.handle)}, mRule);
+}
+
+std::uint64_t Volume::HighestInode() const {
+  return kernel::HighestInode(mKind, MountPoint());
+}
+
+bool Volume::IsCertain(std::uint32_t id) const {
+  if (!NumbersTellItemsApart()) return false;
+  return names::IsInodeNumber(id) || id == names::kRootFolderID ||
+         names::IsCertain(id, mRule, HighestInode());
+}
+
+bool Volume::IsRoot(const kernel::Item& item, const std::string& path) const {
+  if (!kernel::HaveSameNumbers(item, mRoot)) return false;
+  const auto& mountPoints = mListed.MountPoints();
+  return NumbersTellItemsApart() ||
+         std::find(mountPoints.begin(), mountPoints.end(), path) != mountPoints.end();
 }
 
 }  // namespace tallowmere::volumes

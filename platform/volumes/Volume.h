@@ -21,9 +21,59 @@ namespace tallowmere::volumes {
 // place.
 using VolumeNumber = std::int16_t;
 
-class Volume;
+class ListedVolume;
 
-// A volume whose root folder was seen. It stays valid for whoever holds it.
+// A volume whose root folder was seen: what its items' ids follow from. It belongs to a ListedVolume
+// and lives as long.
+class Volume {
+ public:
+  // REQUIRES: `root` was found at the mount point of `listed`.
+  Volume(const ListedVolume& listed, const kernel::Item& root, const kernel::FileSystemKind& kind);
+
+  const ListedVolume& Listed() const { return mListed; }
+  VolumeNumber Number() const;
+  const std::string& MountPoint() const;
+
+  // The root folder as it was when it was first seen; its mount is the volume's place.
+  const kernel::Item& Root() const { return mRoot; }
+
+  const kernel::FileSystemKind& Kind() const { return mKind; }
+
+  // Whether device and inode number are one item's while the volume is mounted. Where they are not,
+  // only the place tells two items apart.
+  bool NumbersTellItemsApart() const { return mKind.numbersTellItemsApart; }
+
+  // Whether an item read without its handle must get it before IDOf: the id follows from the
+  // subvolume, which the handle tells.
+  bool NeedsHandleForID(const kernel::Item& item) const;
+
+  // The node id of an item of the volume. REQUIRES: it has its handle where it needs it.
+  std::uint32_t IDOf(const kernel::Item& item) const;
+
+  // The same for an entry of a folder, by its inode number and the folder that holds it, which is on
+  // this volume. Not for what is mounted at the entry, nor for another subvolume at it.
+  std::uint32_t IDOfEntry(std::uint64_t inode, const kernel::Item& folder) const;
+
+  // What ids are computed with.
+  const names::NodeIDRule& IDRule() const { return mRule; }
+
+  // The highest inode number that an item can have now: a volume may grow.
+  std::uint64_t HighestInode() const;
+
+  // Whether one item at most can have the id, so that whoever finds it need not look any further.
+  bool IsCertain(std::uint32_t id) const;
+
+  // Whether an item at a path is the root folder. REQUIRES: the path is canonical.
+  bool IsRoot(const kernel::Item& item, const std::string& path) const;
+
+ private:
+  const ListedVolume& mListed;
+  kernel::Item mRoot;
+  const kernel::FileSystemKind& mKind;
+  names::NodeIDRule mRule;
+};
+
+// It stays valid for whoever holds it.
 using VolumePointer = std::shared_ptr<const Volume>;
 
 // A volume as the table of mounts lists it. Nothing is looked at until it is asked for, since its
@@ -78,48 +128,9 @@ class ListedVolume : public std::enable_shared_from_this<ListedVolume> {
   mutable std::vector<std::string> mMountPoints;
   mutable std::string mName;
   mutable bool mIsNameKnown = false;
-  mutable VolumePointer mEntered;
+  mutable std::optional<Volume> mEntered;
 };
 
 using ListedVolumePointer = std::shared_ptr<const ListedVolume>;
-
-class Volume {
- public:
-  // `listed` as the table listed it when `root` was found at its mount point.
-  Volume(std::shared_ptr<const ListedVolume> listed, const kernel::Item& root,
-         const kernel::FileSystemKind& kind);
-
-  VolumeNumber Number() const { return mNumber; }
-  const std::string& MountPoint() const { return mMountPoint; }
-
-  // The root folder as it was when it was first seen; its mount is the volume's place.
-  const kernel::Item& Root() const { return mRoot; }
-
-  const kernel::FileSystemKind& Kind() const { return *mKind; }
-
-  // Whether device and inode number are one item's while the volume is mounted.
-  bool HasTrueNumbers() const { return mKind->hasTrueNumbers; }
-
-  // Whether an item read without its handle must get it before IDOf: the id follows from the
-  // subvolume, which the handle tells.
-  bool NeedsHandleForID(const kernel::Item& item) const;
-
-  // The node id of an item of the volume. REQUIRES: it has its handle where it needs it.
-  std::uint32_t IDOf(const kernel::Item& item) const;
-
-  // The same for an entry of a folder, by its inode number and the folder that holds it, which is on
-  // this volume. Not for what is mounted at the entry, nor for another subvolume at it.
-  std::uint32_t IDOfEntry(std::uint64_t inode, const kernel::Item& folder) const;
-
-  // What ids are computed with.
-  const names::NodeIDRule& IDRule() const { return mRule; }
-
- private:
-  VolumeNumber mNumber;
-  std::string mMountPoint;
-  kernel::Item mRoot;
-  const kernel::FileSystemKind* mKind;
-  names::NodeIDRule mRule;
-};
 
 }  // namespace tallowmere::volumes
