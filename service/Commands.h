@@ -2,7 +2,8 @@
 // answer.
 //
 // A command starts its work only after its last field has arrived: when the channel has failed by
-// then it returns at once. The trailer is not the command's.
+// then it returns at once. Work of several host calls is one moment, which ends before the answer
+// begins. The trailer is not the command's.
 #pragma once
 
 #include "service/Channel.h"

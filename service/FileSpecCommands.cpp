@@ -1,6 +1,7 @@
 #include <CFileRef.h>
 #include <CoreServices/CoreServices.h>
 #include <LegacyHFSBridge.h>
+#include <Tallowmere/Process.h>
 
 #include <algorithm>
 #include <iterator>
@@ -26,10 +27,12 @@ void GetHFSName(Channel& channel) {
   const auto maximum = channel.Take<std::uint16_t>();
   if (channel.Failed()) return;
 
+  process::Moment moment;
   const CFileRef item(path.get(), false);
   path.reset();
   char name[protocol::kLongestHFSName] = {};
   const bool fits = CFileUtilGetHFSName(item, name, maximum);
+  moment.End();
 
   channel.PutFlag(fits);
   channel.PutString(name);
@@ -40,10 +43,12 @@ void GetFSSpec(Channel& channel) {
   auto path = channel.TakeAllocated();
   if (channel.Failed()) return;
 
+  process::Moment moment;
   const CFileRef item(path.get(), true);
   path.reset();
   FSSpec spec;
   const bool usable = CFileUtilGetDeprecatedFSSpecThroughIPC(item, &spec);
+  moment.End();
   // What a record holds behind its name is whatever was in memory.
   std::fill(spec.name + 1 + spec.name[0], std::end(spec.name), 0);
 
@@ -59,8 +64,10 @@ void SetFileRefFromFSSpecData(Channel& channel) {
   const bool last = channel.Take<std::uint8_t>() != 0;
   if (channel.Failed()) return;
 
+  process::Moment moment;
   CFileRef item;
   const bool isSet = CFileUtilSetFileRefFromFSSpecData(&item, volume, folder, name, last);
+  moment.End();
 
   channel.PutFlag(isSet);
   channel.PutString(item.GetPath());
@@ -72,9 +79,11 @@ void SetFileRefFromFSSpec(Channel& channel) {
   const bool last = channel.Take<std::uint8_t>() != 0;
   if (channel.Failed()) return;
 
+  process::Moment moment;
   CFileRef item;
   const bool isSet =
       CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC(&item, &spec, searchOtherVolumes, last);
+  moment.End();
 
   channel.PutFlag(isSet);
   channel.PutString(item.GetPath());

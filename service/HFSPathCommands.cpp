@@ -1,5 +1,6 @@
 #include <CFileRef.h>
 #include <LegacyHFSBridge.h>
+#include <Tallowmere/Process.h>
 
 #include <algorithm>
 #include <cstring>
@@ -17,6 +18,7 @@ void MakeFullPath(Channel& channel) {
   const auto flag = channel.Take<std::uint8_t>();
   if (channel.Failed()) return;
 
+  process::Moment moment;
   CFileRef item;
   item.Set(path.get(), false);
   path.reset();
@@ -24,6 +26,7 @@ void MakeFullPath(Channel& channel) {
   fullPath[0] = '\0';
   const unsigned short length =
       CFileUtilMakeFullPath(item, size == 0 ? nullptr : fullPath, size, flag);
+  moment.End();
 
   // Behind the NUL is what was in memory, or without the flag the folders that were cut.
   std::fill(fullPath + std::strlen(fullPath), fullPath + size, '\0');
@@ -40,9 +43,11 @@ void MakeFileRefFromPath(Channel& channel) {
   const auto flag = channel.Take<std::uint8_t>();
   if (channel.Failed()) return;
 
+  process::Moment moment;
   CFileRef item;
   const char* const nameIfAny = nameLength == 0 ? nullptr : name.get();
   const OSErr result = CFileUtilMakeFileRefFromPath(&item, folder.get(), nameIfAny, flag);
+  moment.End();
 
   channel.Put<std::int16_t>(result);
   channel.PutString(item.GetPath());
@@ -55,9 +60,11 @@ void AddHFSName(Channel& channel) {
   const bool flag = channel.Take<std::uint8_t>() != 0;
   if (channel.Failed()) return;
 
+  process::Moment moment;
   CFileRef item(path.get(), true);
   path.reset();
   const bool isAdded = CFileUtilAddHFSName(&item, name, flag);
+  moment.End();
 
   channel.PutFlag(isAdded);
   channel.PutString(item.GetPath());

@@ -1,79 +1,38 @@
 // The File Manager's questions about existing items.
 
 #include <CoreServices/CoreServices.h>
-#include <fcntl.h>
-#include <sys/stat.h>
 
 #include <algorithm>
+#include <optional>
 #include <string>
-#include <utility>
 
-#include "files/HFSNames.h"
-#include "files/NodeID.h"
-#include "files/PascalName.h"
-#include "files/Specs.h"
+#include "calls/Process.h"
+#include "calls/References.h"
+#include "calls/ResultCodes.h"
+#include "catalog/Finding.h"
+#include "catalog/NameLookup.h"
 #include "foundation/ColonsAndSlashes.h"
 #include "foundation/FileNameText.h"
 #include "foundation/MacRoman.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
+#include "names/HFSNames.h"
+#include "names/PascalNames.h"
 
-using namespace tallowmere::files;
-using namespace tallowmere::foundation;
+using namespace tallowmere;
+using namespace tallowmere::calls;
 
 namespace {
 
 constexpr std::size_t kLongestUnicodeName = 255;
 
-// The volume that an item counts to: its own, or for a file that is mounted alone and so is on
-// none, that of the folder that holds it.
-VolumePointer VolumeOfItem(const Place& item) {
-  auto volume = VolumeOf(item, nullptr);
-  if (volume && volume->Root()) return volume;
-  Folder folder;
-  return HoldingFolder(item, nullptr, folder) == noErr ? folder.volume : nullptr;
-}
+// An item seen now, and the folder that holds it: none for "/", and where that is on no volume.
+struct Subject {
+  catalog::Sighting seen;
+  std::optional<catalog::HeldFolder> holder;
 
-OSErr GiveReference(const Place& place, const Spot& spot, FSRef* reference) {
-  ItemReference item = place.item;
-  ReadProof(item, spot.folder, spot.name);
-  RememberPlace(place);
-  *reference = Pack(item);
-  return noErr;
-}
-
-OSErr GiveReference(const Place& place, FSRef* reference) {
-  return GiveReference(place, {AT_FDCWD, place.path.c_str()}, reference);
-}
-
-OSErr FillInfo(const Place& item, FSCatalogInfoBitmap whichInfo, FSCatalogInfo& info) {
-  if ((whichInfo & (kFSCatInfoVolume | kFSCatInfoNodeID)) == 0) return noErr;
-  const VolumePointer volume = VolumeOfItem(item);
-  if (!volume) return nsvErr;
-  if ((whichInfo & kFSCatInfoVolume) != 0) info.volume = volume->Number();
-  if ((whichInfo & kFSCatInfoNodeID) != 0) info.nodeID = NodeIDOf(item.item, *volume->Root());
-  return noErr;
-}
-
-void FillName(const Place& item, HFSUniStr255& name) {
-  const VolumePointer volume = VolumeOf(item, nullptr);
-  std::u16string text = IsRootOf(volume, item)
-                            ? DecodeMacRoman(volume->Name())
-                            : ExchangeColonsAndSlashes(TextOfFileName(*LastComponent(item.path)));
-  text.resize(std::min(text.size(), kLongestUnicodeName));
-  name.length = static_cast<UInt16>(text.size());
-  std::copy(text.begin(), text.end(), name.unicode);
-}
-
-OSErr FillParent(const Place& item, FSRef& parent) {
-  parent = {};
-  const VolumePointer volume = VolumeOf(item, nullptr);
-  if (IsRootOf(volume, item)) return noErr;
-  Folder folder;
-  if (const OSErr error = HoldingFolder(item, volume, folder)) return error;
-  if (!Holds(folder, item.item, *LastComponent(item.path))) return fnfErr;
-  return GiveReference(folder.place, {folder.descriptor->Get(), ""}, &parent);
-}
+  catalog::Look Look() const { return {*holder, seen}; }
+};
 
 // What was asked of an item, where one is told.
 struct Description {
@@ -82,62 +41,153 @@ struct Description {
   HFSUniStr255* name;
   FSSpec* spec;
   FSRef* parent;
+
+  bool IsOfVolumeAndNumberAlone() const {
+    return name == nullptr && spec == nullptr && parent == nullptr;
+  }
 };
 
-// The path need not be canonical. fnfErr when the item is not there.
-OSErr Describe(const Place& item, const Description& wanted) {
-  // A record alone is made of what its folder holds.
-  const bool isLookedAtLater =
-      wanted.spec != nullptr && wanted.info == nullptr && wanted.name == nullptr;
-  if (!isLookedAtLater && !IsAt(item.item, AT_FDCWD, item.path.c_str())) return fnfErr;
-  OSErr error = noErr;
-  if (wanted.info != nullptr) error = FillInfo(item, wanted.whichInfo, *wanted.info);
-  if (error == noErr && wanted.name != nullptr) FillName(item, *wanted.name);
-  if (error == noErr && wanted.spec != nullptr) error = SpecOfPlace(item, *wanted.spec);
-  if (error == noErr && wanted.parent != nullptr) error = FillParent(item, *wanted.parent);
+// The volume and the id of an item. A file that is mounted alone, and the folder at which a kernel
+// interface is mounted, are on no volume: they count to that of their folder, with an id that leads
+// nowhere.
+OSErr FillInfo(catalog::Moment& moment, Subject& item, FSCatalogInfo& info) {
+  const auto volume = moment.VolumeOf(item.seen);
+  if (volume) {
+    if ((*volume)->NeedsHandleForID(item.seen.item)) {
+      kernel::ReadProof(item.seen.item, kernel::AtPath(item.seen.path.c_str()));
+    }
+    info.volume = (*volume)->Number();
+    info.nodeID = catalog::IDOf(**volume, item.seen);
+    return noErr;
+  }
+  if (!item.holder) return nsvErr;
+  info.volume = item.holder->Volume()->Number();
+  info.nodeID = names::kNoVolumeID;
+  return noErr;
+}
+
+OSErr FillInfo(catalog::Moment& moment, Subject& item, const Description& wanted) {
+  constexpr FSCatalogInfoBitmap kBoth = kFSCatInfoVolume | kFSCatInfoNodeID;
+  if (wanted.info == nullptr || (wanted.whichInfo & kBoth) == 0) return noErr;
+  FSCatalogInfo info;
+  if (const OSErr error = FillInfo(moment, item, info)) return error;
+  if ((wanted.whichInfo & kFSCatInfoVolume) != 0) wanted.info->volume = info.volume;
+  if ((wanted.whichInfo & kFSCatInfoNodeID) != 0) wanted.info->nodeID = info.nodeID;
+  return noErr;
+}
+
+OSErr FillName(catalog::Moment& moment, const Subject& item, HFSUniStr255& name) {
+  std::u16string text;
+  if (const auto volume = VolumeOfRoot(moment, item.seen)) {
+    const auto volumeName = volume->Listed().Name();
+    if (!volumeName) return ResultCodeOf(volumeName.Error());
+    text = foundation::DecodeMacRoman(*volumeName);
+  } else {
+    text = foundation::ExchangeColonsAndSlashes(
+        foundation::TextOfFileName(*foundation::LastComponent(item.seen.path)));
+  }
+  text.resize(std::min(text.size(), kLongestUnicodeName));
+  name.length = static_cast<UInt16>(text.size());
+  std::copy(text.begin(), text.end(), name.unicode);
+  return noErr;
+}
+
+OSErr FillSpec(catalog::Moment& moment, const Subject& item, FSSpec& spec) {
+  if (const auto volume = VolumeOfRoot(moment, item.seen)) {
+    const auto name = volume->Listed().Name();
+    if (!name) return ResultCodeOf(name.Error());
+    spec = MakeRecord(volume->Number(), names::kParentOfRootID, *name);
+    return noErr;
+  }
+  if (!item.holder) return nsvErr;
+  const auto record = RecordOf(moment, item.Look());
+  if (!record) return ResultCodeOf(record.Error());
+  spec = *record;
+  return noErr;
+}
+
+OSErr FillParent(catalog::Moment& moment, const Subject& item, FSRef& parent) {
+  parent = {};
+  if (VolumeOfRoot(moment, item.seen)) return noErr;
+  if (!item.holder) return nsvErr;
+  parent = ReferenceTo(moment, *item.holder);
+  return noErr;
+}
+
+OSErr Describe(catalog::Moment& moment, Subject& item, const Description& wanted) {
+  OSErr error = FillInfo(moment, item, wanted);
+  if (error == noErr && wanted.name != nullptr) error = FillName(moment, item, *wanted.name);
+  if (error == noErr && wanted.spec != nullptr) error = FillSpec(moment, item, *wanted.spec);
+  if (error == noErr && wanted.parent != nullptr) error = FillParent(moment, item, *wanted.parent);
   return error;
 }
 
-// Sees the folder with an id, not its volume's root, in the folder that holds it by a path.
-OSErr SeeInHolder(const VolumePointer& volume, UInt32 id, const std::string& path, Place& folder,
-                  Folder& holder) {
-  if (const OSErr error = HoldingFolder({path, {}}, volume, holder)) return OnTheWay(error);
-  const std::string name(*LastComponent(path));
-  const auto found = ReadStatus(holder.descriptor->Get(), name.c_str());
-  if (!found || !S_ISDIR(found->item.type)) return dirNFErr;
-  folder = {JoinPath(holder.place.path, name), found->item};
-  const VolumePointer own = VolumeOf(folder, volume);
-  const bool isIt = own && own->Root() && own->Number() == volume->Number() &&
-                    NodeIDOf(folder.item, *own->Root()) == id;
-  return isIt ? noErr : dirNFErr;
+// The item of a reference at a path, links on the way followed.
+kernel::Result<Subject> SeeAt(catalog::Moment& moment, const kernel::Item& reference,
+                              const std::string& path) {
+  const auto look = catalog::LookAgain(moment, reference, path);
+  if (look) return Subject{look->seen, look->folder};
+  const bool hasHolder = path != "/" && look.Error() != kernel::kNoVolume;
+  if (hasHolder) return look.Error();
+  const auto seen = moment.See(path);
+  if (!seen) return seen.Error();
+  if (!catalog::IsItemOf(reference, *seen, kernel::AtPath(seen->path.c_str()))) {
+    return kernel::kNotThere;
+  }
+  return Subject{*seen, std::nullopt};
 }
 
-// Of the places of a folder one where its own volume holds it, if there is one: a part of a volume
-// can be mounted by itself.
-void PreferItsVolume(const VolumePointer& volume, UInt32 id, Place& folder, Folder& holder) {
-  if (holder.volume->Number() == volume->Number()) return;
-  for (const std::string& path : volume->PathsOf(folder.path, folder.item.mount)) {
-    Place other;
-    Folder otherHolder;
-    if (SeeInHolder(volume, id, path, other, otherHolder) != noErr) continue;
-    if (otherHolder.volume->Number() != volume->Number()) continue;
-    folder = std::move(other);
-    holder = std::move(otherHolder);
-    return;
+// What this moment knows of the item already.
+std::optional<Subject> Known(const catalog::Moment& moment, const kernel::Item& reference,
+                             const Description& wanted) {
+  if (const catalog::Look* const look = moment.LookFor(reference)) {
+    return Subject{look->seen, look->folder};
   }
+  const catalog::HeldFolder* const held = moment.HeldFor(reference);
+  if (held == nullptr || !wanted.IsOfVolumeAndNumberAlone()) return std::nullopt;
+  return Subject{held->Place(), std::nullopt};
 }
 
-// The folder with an id that is not its volume's root, and the folder that holds it.
-OSErr FindInHolder(const VolumePointer& volume, UInt32 id, Place& folder, Folder& holder) {
-  const auto last = LastPathOf(*volume, id);
-  const bool isThere = last && SeeInHolder(volume, id, *last, folder, holder) == noErr;
-  if (!isThere) {
-    const auto found = FindItem(volume, id, true);
-    if (!found) return dirNFErr;
-    if (const OSErr error = SeeInHolder(volume, id, found->path, folder, holder)) return error;
+kernel::Result<Subject> FindSubject(catalog::Moment& moment, const kernel::Item& reference,
+                                    const Description& wanted) {
+  if (auto known = Known(moment, reference, wanted)) return *std::move(known);
+  const std::string last = catalog::LastPathOf(moment, reference);
+  if (!last.empty()) {
+    auto subject = SeeAt(moment, reference, last);
+    if (subject) return subject;
   }
-  PreferItsVolume(volume, id, folder, holder);
+  // It has moved; or a link of /proc led to it, and only other paths tell where it is.
+  const auto path = catalog::FindPathOf(moment, reference);
+  if (!path) return path.Error();
+  return SeeAt(moment, reference, *path);
+}
+
+OSErr MakeReference(catalog::Moment& moment, const FSSpec& spec, FSRef& reference) {
+  const std::string_view name = names::TextOfPascal(spec.name);
+  const auto id = static_cast<UInt32>(spec.parID);
+  if (id == names::kParentOfRootID) {
+    const auto root = catalog::HoldFolderWithID(moment, spec.vRefNum, names::kRootFolderID);
+    if (!root) return root.Error() == kernel::kNoVolume ? nsvErr : fnfErr;
+    const auto own = root->Volume()->Listed().Name();
+    if (!own) return ResultCodeOf(own.Error());
+    if (*own != name) return fnfErr;
+    reference = ReferenceTo(moment, *root);
+    return noErr;
+  }
+  const auto folder = catalog::HoldFolderWithID(moment, spec.vRefNum, id);
+  if (!folder) return ResultCodeOf(folder.Error());
+  const auto item = catalog::LookUpHFSName(moment, *folder, name);
+  if (!item) return ResultCodeOf(item.Error());
+  reference = ReferenceTo(moment, *item);
   return noErr;
+}
+
+// The Linux name that a UTF-16 name stands for; empty when no item can be called so.
+std::string LinuxNameOf(UniCharCount length, const UniChar* name) {
+  if (length > kLongestUnicodeName) return {};
+  const auto bytes = foundation::FileNameOfText(
+      foundation::ExchangeColonsAndSlashes(std::u16string(name, name + length)));
+  return bytes && names::CanBeLinuxName(*bytes) ? *bytes : std::string();
 }
 
 }  // namespace
@@ -145,98 +195,54 @@ OSErr FindInHolder(const VolumePointer& volume, UInt32 id, Place& folder, Folder
 OSErr FSGetCatalogInfo(const FSRef* ref, FSCatalogInfoBitmap whichInfo, FSCatalogInfo* catalogInfo,
                        HFSUniStr255* outName, FSSpec* fsSpec, FSRef* parentRef) {
   const Description wanted{whichInfo, catalogInfo, outName, fsSpec, parentRef};
-  return OrError([&]() -> OSErr {
-    const auto item = Unpack(ref);
-    if (!item) return fnfErr;
-    const auto last = LastPathOf(*item);
-    const OSErr error = last ? Describe({*last, *item}, wanted) : static_cast<OSErr>(fnfErr);
-    if (error == noErr) return noErr;
-    // It has moved; or a link of /proc led to it, and only other paths tell where it is.
-    const auto path = FindCanonicalPath(*item);
-    return path && path != last ? Describe({*path, *item}, wanted) : error;
+  return foundation::OrError([&]() -> OSErr {
+    const auto reference = Unpack(ref);
+    if (!reference) return fnfErr;
+    return InMoment([&](catalog::Moment& moment) -> OSErr {
+      auto subject = FindSubject(moment, *reference, wanted);
+      return subject ? Describe(moment, *subject, wanted) : ResultCodeOf(subject.Error());
+    });
   });
 }
 
 OSErr FSResolveNodeID(SInt16 volume, UInt32 nodeID, FSRef* outRef) {
-  return OrError([&]() -> OSErr {
-    const VolumePointer found = MountTable::OfThisProcess().WithNumber(volume);
-    if (!found) return nsvErr;
-    const auto place = FindItem(found, nodeID, false);
-    if (!place) return fnfErr;
-    return GiveReference(*place, outRef);
+  return foundation::OrError([&] {
+    return InMoment([&](catalog::Moment& moment) -> OSErr {
+      const auto found = moment.VolumeWithNumber(volume);
+      if (!found) return found.Error() == kernel::kNoVolume ? nsvErr : fnfErr;
+      const auto item = catalog::FindItem(moment, *found, nodeID, false);
+      if (!item) return ResultCodeOf(item.Error());
+      *outRef = ReferenceTo(moment, *item);
+      return noErr;
+    });
   });
 }
 
 OSErr FSMakeFSRefUnicode(const FSRef* parentRef, UniCharCount nameLength, const UniChar* name,
                          TextEncoding, FSRef* newRef) {
-  return OrError([&]() -> OSErr {
+  return foundation::OrError([&]() -> OSErr {
     const auto parent = Unpack(parentRef);
-    const auto parentPath = parent ? FindCanonicalPath(*parent) : std::nullopt;
-    if (!parentPath) return fnfErr;
-    if (!S_ISDIR(parent->type)) return errFSNotAFolder;
-    if (nameLength > kLongestUnicodeName) return fnfErr;
-    const auto linuxName =
-        FileNameOfText(ExchangeColonsAndSlashes(std::u16string(name, name + nameLength)));
-    if (!linuxName || !CanBeLinuxName(*linuxName)) return fnfErr;
-    std::string path = JoinPath(*parentPath, *linuxName);
-    const auto folder = OpenHolderOf(path);
-    const bool isThere = folder && Holds(*folder, *parent, "");
-    if (!isThere) return fnfErr;
-    const auto item = ReadItem(folder->descriptor->Get(), linuxName->c_str());
-    if (!item) return ErrorOfSystem();
-    RememberPlace({std::move(path), *item});
-    *newRef = Pack(*item);
-    return noErr;
+    if (!parent) return fnfErr;
+    return InMoment([&](catalog::Moment& moment) -> OSErr {
+      const auto path = catalog::FindPathOf(moment, *parent);
+      if (!path) return fnfErr;
+      if (!kernel::IsFolder(*parent)) return errFSNotAFolder;
+      const std::string linuxName = LinuxNameOf(nameLength, name);
+      if (linuxName.empty()) return fnfErr;
+      const auto folder = moment.HoldFolder(*path);
+      const bool isIt = folder && catalog::IsItemOf(*parent, folder->Place(), folder->OwnSpot());
+      if (!isIt) return fnfErr;
+      const auto item = moment.LookUp(*folder, linuxName);
+      if (!item) return ResultCodeOf(item.Error());
+      *newRef = ReferenceTo(moment, *item);
+      return noErr;
+    });
   });
 }
 
 OSErr FSpMakeFSRef(const FSSpec* spec, FSRef* newRef) {
-  return OrError([&]() -> OSErr {
-    if (spec->name[0] > kLongestSpecName) return fnfErr;
-    const std::string_view name = TextOfPascal(spec->name);
-    if (spec->parID == static_cast<SInt32>(kParentOfRootID)) {
-      const VolumePointer volume = MountTable::OfThisProcess().WithNumber(spec->vRefNum);
-      if (!volume) return nsvErr;
-      if (volume->Name() != name) return fnfErr;
-      const auto root = FindItem(volume, kRootFolderID, true);
-      if (!root) return fnfErr;
-      return GiveReference(*root, newRef);
-    }
-    Folder folder;
-    const auto id = static_cast<UInt32>(spec->parID);
-    if (const OSErr error = FolderWithID(spec->vRefNum, id, folder)) return error;
-    Place item;
-    if (const OSErr error = LookUpHFSName(folder, name, item)) return error;
-    return GiveReference(item, SpotOf(item, folder), newRef);
-  });
-}
-
-OSErr PBGetCatInfoSync(CInfoPBPtr paramBlock) {
-  return OrError([&]() -> OSErr {
-    DirInfo& block = paramBlock->dirInfo;
-    if (block.ioFDirIndex != -1) return paramErr;
-    const auto id = static_cast<UInt32>(block.ioDrDirID);
-    std::string name;
-    UInt32 parentID = kParentOfRootID;
-    if (id == kRootFolderID) {
-      Folder root;
-      if (const OSErr error = FolderWithID(block.ioVRefNum, id, root)) return error;
-      name = root.volume->Name();
-    } else {
-      const VolumePointer volume = MountTable::OfThisProcess().WithNumber(block.ioVRefNum);
-      if (!volume) return nsvErr;
-      Place folder;
-      Folder holder;
-      if (const OSErr error = FindInHolder(volume, id, folder, holder)) return error;
-      const auto found = HFSNameOf(holder, folder, kLongestStr255Name);
-      if (!found) return fnfErr;
-      name = *found;
-      // A folder that hangs in another volume is the top of what can be climbed on this one.
-      const bool sameVolume = holder.volume->Number() == volume->Number();
-      if (sameVolume) parentID = holder.ID();
-    }
-    if (block.ioNamePtr != nullptr) CopyToPascal(name, block.ioNamePtr);
-    block.ioDrParID = static_cast<SInt32>(parentID);
-    return noErr;
+  return foundation::OrError([&]() -> OSErr {
+    if (spec->name[0] > names::kLongestSpecName) return fnfErr;
+    return InMoment([&](catalog::Moment& moment) { return MakeReference(moment, *spec, *newRef); });
   });
 }

@@ -1,39 +1,91 @@
+// References to items by URL, and back.
+
 #include <CoreServices/CoreServices.h>
-#include <fcntl.h>
-#include <sys/stat.h>
 
-#include <utility>
+#include <optional>
+#include <string>
 
-#include "files/Catalog.h"
-#include "files/ItemReference.h"
+#include "calls/Process.h"
+#include "calls/References.h"
+#include "catalog/Finding.h"
 #include "foundation/NoThrow.h"
+#include "foundation/PathText.h"
 #include "foundation/Url.h"
 
-using namespace tallowmere::files;
-using tallowmere::foundation::AbsolutePathOfUrl;
-using tallowmere::foundation::CreateUrlOfPath;
-using tallowmere::foundation::OrZero;
+using namespace tallowmere;
+using namespace tallowmere::calls;
 
-// One statx as a rule. The path is without "/" at its end, so a link in the last place is read
-// itself.
+namespace {
+
+// A link is on the way, or the folder is on no volume: the path has to be looked at by itself.
+constexpr kernel::Error kOtherWay{ENOTDIR};
+
+// Looks at the item so that what is seen serves the rest of the moment: holds the folder that is
+// meant, or the one that holds the item. ENOENT when it is missing; kOtherWay or another error
+// where that is not certain.
+kernel::Result<FSRef> ReferenceInMoment(catalog::Moment& moment, const std::string& path,
+                                        bool isFolderMeant) {
+  if (isFolderMeant) {
+    if (const auto folder = moment.HoldFolder(path)) return ReferenceTo(moment, *folder);
+  }
+  if (path == "/") return kOtherWay;
+  const auto holder = moment.HoldFolder(foundation::FolderOf(path));
+  if (!holder) return holder.Error() == kernel::kNotThere ? kernel::kNotThere : kOtherWay;
+  const auto look = moment.LookUp(*holder, std::string(*foundation::LastComponent(path)));
+  if (!look) return look.Error();
+  return ReferenceTo(moment, *look);
+}
+
+// The path is without "/" at its end, so a link in the last place is read itself.
+std::optional<FSRef> ReferenceAt(const std::string& path, bool isFolderMeant) {
+  if (catalog::Moment* const moment = OpenMoment()) {
+    const auto reference = ReferenceInMoment(*moment, path, isFolderMeant);
+    if (reference) return *reference;
+    if (reference.Error() == kernel::kNotThere) return std::nullopt;
+  }
+  const auto status = kernel::ReadStatus(kernel::AtPath(path.c_str()));
+  if (!status) return std::nullopt;
+  return InMoment([&](catalog::Moment& moment) {
+    return ReferenceTo(moment, catalog::Sighting{path, status->item});
+  });
+}
+
+// The path by which this moment has seen the item, if it still leads to it.
+std::optional<std::string> PathSeen(const catalog::Moment& moment, const kernel::Item& reference) {
+  const catalog::Look* const look = moment.LookFor(reference);
+  const catalog::HeldFolder* const held = look == nullptr ? moment.HeldFor(reference) : nullptr;
+  if (look == nullptr && held == nullptr) return std::nullopt;
+  const std::string& path = look != nullptr ? look->seen.path : held->Path();
+  if (!catalog::IsItemAt(reference, kernel::AtPath(path.c_str()), path)) return std::nullopt;
+  return path;
+}
+
+}  // namespace
+
 Boolean CFURLGetFSRef(CFURLRef url, FSRef* item) {
-  return OrZero([&]() -> Boolean {
-    auto path = AbsolutePathOfUrl(url);
-    if (!path) return false;
-    const auto found = ReadItem(AT_FDCWD, path->c_str());
-    if (!found) return false;
-    RememberPlace({*std::move(path), *found});
-    *item = Pack(*found);
+  return foundation::OrZero([&]() -> Boolean {
+    const auto path = foundation::AbsolutePathOfUrl(url);
+    const auto reference =
+        path ? ReferenceAt(*path, CFURLHasDirectoryPath(url)) : std::optional<FSRef>();
+    if (!reference) return false;
+    *item = *reference;
     return true;
   });
 }
 
 CFURLRef CFURLCreateFromFSRef(CFAllocatorRef, const FSRef* item) {
-  return OrZero([&]() -> CFURLRef {
-    const auto wanted = Unpack(item);
-    if (!wanted) return nullptr;
-    const auto path = FindCanonicalPath(*wanted);
-    return path ? CreateUrlOfPath(*path, S_ISDIR(wanted->type)) : nullptr;
+  return foundation::OrZero([&]() -> CFURLRef {
+    const auto reference = Unpack(item);
+    if (!reference) return nullptr;
+    return InMoment([&](catalog::Moment& moment) -> CFURLRef {
+      auto path = PathSeen(moment, *reference);
+      if (!path) {
+        const auto found = catalog::FindPathOf(moment, *reference);
+        if (!found) return nullptr;
+        path = *found;
+      }
+      return foundation::CreateUrlOfPath(*path, kernel::IsFolder(*reference));
+    });
   });
 }
 
@@ -41,5 +93,5 @@ OSErr FSCompareFSRefs(const FSRef* first, const FSRef* second) {
   const auto firstItem = Unpack(first);
   const auto secondItem = Unpack(second);
   if (!firstItem || !secondItem) return errFSBadFSRef;
-  return AreEqual(*firstItem, *secondItem) ? noErr : errFSRefsDifferent;
+  return catalog::AreToSameItem(*firstItem, *secondItem) ? noErr : errFSRefsDifferent;
 }

@@ -1,36 +1,54 @@
+// The File Manager's list of volumes.
+
 #include <CoreServices/CoreServices.h>
 
-#include "files/MountTable.h"
-#include "files/PascalName.h"
+#include "calls/Process.h"
+#include "calls/ResultCodes.h"
 #include "foundation/NoThrow.h"
+#include "names/PascalNames.h"
 
-using namespace tallowmere::files;
-using tallowmere::foundation::OrError;
+using namespace tallowmere;
+using namespace tallowmere::calls;
 
 namespace {
 
-VolumePointer VolumeFor(long index, SInt16 number) {
-  MountTable& table = MountTable::OfThisProcess();
+// The next volume of the walk, or the first of a new one. Null past the last.
+volumes::ListedVolumePointer VolumeAt(std::size_t index) {
+  VolumeWalk& walk = ThisProcess().walk;
+  const bool goesOn = walk.volumes && index > 0 && index == walk.next;
+  if (!goesOn) walk.volumes = ThisProcess().catalog.Table().Now();
+  walk.next = index + 1;
+  const auto& volumes = walk.volumes->InOrder();
+  return index < volumes.size() ? volumes[index] : nullptr;
+}
+
+volumes::ListedVolumePointer FindVolume(long index, SInt16 number) {
   if (index < 0) return nullptr;
-  return index == 0 ? table.WithNumber(number) : table.AtIndex(static_cast<std::size_t>(index - 1));
+  if (index > 0) return VolumeAt(static_cast<std::size_t>(index - 1));
+  return InMoment(
+      [number](catalog::Moment& moment) { return moment.Volumes().WithNumber(number); });
 }
 
 }  // namespace
 
 OSErr PBHGetVInfoSync(HParmBlkPtr paramBlock) {
-  return OrError([&]() -> OSErr {
+  return foundation::OrError([&]() -> OSErr {
     HVolumeParam& block = paramBlock->volumeParam;
-    const VolumePointer volume = VolumeFor(block.ioVolIndex, block.ioVRefNum);
+    const auto volume = FindVolume(block.ioVolIndex, block.ioVRefNum);
     if (!volume) return nsvErr;
-    if (block.ioNamePtr != nullptr) CopyToPascal(volume->Name(), block.ioNamePtr);
+    if (block.ioNamePtr != nullptr) {
+      const auto name = volume->Name();
+      if (!name) return ResultCodeOf(name.Error());
+      names::CopyToPascal(*name, block.ioNamePtr);
+    }
     block.ioVRefNum = volume->Number();
     return noErr;
   });
 }
 
 OSErr PBGetVolumeInfoSync(FSVolumeInfoParamPtr paramBlock) {
-  return OrError([&]() -> OSErr {
-    const VolumePointer volume = VolumeFor(paramBlock->volumeIndex, paramBlock->ioVRefNum);
+  return foundation::OrError([&]() -> OSErr {
+    const auto volume = FindVolume(paramBlock->volumeIndex, paramBlock->ioVRefNum);
     if (!volume) return nsvErr;
     paramBlock->ioVRefNum = volume->Number();
     return noErr;

@@ -15,8 +15,8 @@ constexpr std::uint64_t kByPlace = std::uint64_t{1} << 62;
 // On a volume an item is remembered by its node id, so that its record finds it too.
 PlaceKey KeyOf(const kernel::Item& item, const volumes::Volume* volume) {
   if (IsProvedByPlace(item)) return {kByPlace | item.device, PlaceDigest(item)};
-  const bool hasID = volume != nullptr && volume->NumbersTellItemsApart() &&
-                     !volume->NeedsHandleForID(item);
+  const bool hasID =
+      volume != nullptr && volume->NumbersTellItemsApart() && !volume->NeedsHandleForID(item);
   if (!hasID) return {kByInode | item.device, item.inode};
   return {volume->Root().device, volume->IDOf(item)};
 }

@@ -37,8 +37,8 @@ class Catalog {
   // Where anything was last seen; empty when nothing is remembered.
   std::string_view LatestPlace() const { return mPlaces.Latest(); }
 
-  // A lead from a pass over a volume: the folder, or the item, with an id, or one very item. Folders
-  // near `start` are read first.
+  // A lead from a pass over a volume: the folder, or the item, with an id, or one very item.
+  // Folders near `start` are read first.
   std::optional<std::string> SearchVolume(const volumes::VolumePointer& volume,
                                           const SearchedItem& item, const std::string& start);
 

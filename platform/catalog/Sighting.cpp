@@ -24,26 +24,6 @@ Digest DigestOf(std::string_view path) {
   return digest;
 }
 
-std::uint32_t IDOf(const Sighting& folder, const volumes::Volume& volume, bool isRoot) {
-  const std::uint32_t id = volume.IDOf(folder.item);
-  return id == names::kRootFolderID && !isRoot ? names::kNoVolumeID : id;
-}
-
-}  // namespace
-
-HeldFolder::HeldFolder(Sighting place, kernel::Descriptor descriptor,
-                       volumes::VolumePointer volume) {
-  const bool isRoot = volume->IsRoot(place.item, place.path);
-  const std::uint32_t id = IDOf(place, *volume, isRoot);
-  mState = std::make_shared<const State>(
-      State{std::move(place), std::move(descriptor), std::move(volume), isRoot, id});
-}
-
-bool AreSame(const volumes::Volume& volume, const Sighting& first, const Sighting& second) {
-  return kernel::HaveSameNumbers(first.item, second.item) &&
-         (volume.NumbersTellItemsApart() || first.path == second.path);
-}
-
 void ProveByPlace(kernel::Item& item, std::string_view path) {
   const Digest digest = DigestOf(path);
   item.handle = {};
@@ -52,8 +32,45 @@ void ProveByPlace(kernel::Item& item, std::string_view path) {
   std::memcpy(item.handle.bytes.data(), &digest, sizeof digest);
 }
 
+}  // namespace
+
+HeldFolder::HeldFolder(Sighting place, kernel::Descriptor descriptor,
+                       volumes::VolumePointer volume) {
+  const bool isRoot = volume->IsRoot(place.item, place.path);
+  const std::uint32_t id = IDOf(*volume, place);
+  mState = std::make_shared<const State>(
+      State{std::move(place), std::move(descriptor), std::move(volume), isRoot, id});
+}
+
+std::uint32_t IDOf(const volumes::Volume& volume, const Sighting& seen) {
+  const std::uint32_t id = volume.IDOf(seen.item);
+  const bool isFalseRoot = id == names::kRootFolderID && !volume.IsRoot(seen.item, seen.path);
+  return isFalseRoot ? names::kNoVolumeID : id;
+}
+
+bool AreSame(const volumes::Volume& volume, const Sighting& first, const Sighting& second) {
+  return kernel::HaveSameNumbers(first.item, second.item) &&
+         (volume.NumbersTellItemsApart() || first.path == second.path);
+}
+
+kernel::Item Proved(const Sighting& seen, const volumes::Volume& volume, const kernel::Spot& spot) {
+  kernel::Item item = seen.item;
+  if (!volume.NumbersTellItemsApart()) {
+    ProveByPlace(item, seen.path);
+  } else if (item.handle.size == 0) {
+    kernel::ReadProof(item, spot);
+  }
+  return item;
+}
+
 bool IsProvedByPlace(const kernel::Item& item) {
   return item.handle.type == kPlaceProof && item.handle.size == sizeof(Digest);
+}
+
+bool AreToSameItem(const kernel::Item& first, const kernel::Item& second) {
+  if (!kernel::HaveSameNumbers(first, second)) return false;
+  const bool isByPlace = IsProvedByPlace(first) || IsProvedByPlace(second);
+  return !isByPlace || first.handle == second.handle;
 }
 
 std::uint64_t PlaceDigest(const kernel::Item& item) {
@@ -62,13 +79,22 @@ std::uint64_t PlaceDigest(const kernel::Item& item) {
   return digest.words[0];
 }
 
-bool IsItemAt(const kernel::Item& item, const kernel::Spot& spot, std::string_view path) {
-  if (!IsProvedByPlace(item)) return kernel::IsAt(item, spot);
-  const auto found = kernel::ReadStatus(spot);
-  if (!found) return false;
-  kernel::Item there = found->item;
-  ProveByPlace(there, path);
-  return kernel::IsProvedSame(there, item);
+bool IsItemOf(const kernel::Item& reference, const Sighting& seen, const kernel::Spot& spot) {
+  if (!kernel::HaveSameNumbers(seen.item, reference)) return false;
+  kernel::Item found = seen.item;
+  found.handle = {};
+  if (IsProvedByPlace(reference)) {
+    ProveByPlace(found, seen.path);
+  } else if (reference.handle.size != 0) {
+    found.handle = kernel::HandleAt(spot);
+  }
+  return kernel::IsProvedSame(found, reference);
+}
+
+bool IsItemAt(const kernel::Item& reference, const kernel::Spot& spot, std::string_view path) {
+  if (!IsProvedByPlace(reference)) return kernel::IsAt(reference, spot);
+  const auto status = kernel::ReadStatus(spot);
+  return status && IsItemOf(reference, {std::string(path), status->item}, spot);
 }
 
 }  // namespace tallowmere::catalog

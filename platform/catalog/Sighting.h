@@ -1,11 +1,11 @@
 // How sure the catalog is of a place, as types:
 //
-// | Type       | What is known                                                                     |
+// | Type       | What is known |
 // |------------|-----------------------------------------------------------------------------------|
-// | a lead     | a path that somebody remembers or found in passing: just a std::string            |
-// | Sighting   | the item was at that path, at one moment                                          |
-// | HeldFolder | the folder is open, so that device, number and mount stay its own, and its volume |
-// |            | is known                                                                          |
+// | a lead     | a path that somebody remembers or found in passing: just a std::string | |
+// Sighting   | the item was at that path, at one moment                                          |
+// | HeldFolder | the folder is open, so that device, number and mount stay its own, and its volume
+// | |            | is known |
 //
 // That a path led to a folder, or that a folder had an item under a name, is true of one moment
 // only. Two such facts are put together only when the held folder or the item is the pivot.
@@ -42,8 +42,6 @@ class HeldFolder {
   const kernel::Item& Item() const { return mState->place.item; }
   const volumes::VolumePointer& Volume() const { return mState->volume; }
 
-  // The node id. That of a folder that shares the root's number without being the root, where
-  // numbers do not tell items apart, leads nowhere.
   std::uint32_t ID() const { return mState->id; }
 
   bool IsRoot() const { return mState->isRoot; }
@@ -63,19 +61,31 @@ class HeldFolder {
   std::shared_ptr<const State> mState;
 };
 
+// The node id of an item of a volume, seen at its canonical path. Where numbers do not tell items
+// apart, one that shares the root folder's without being the root gets kNoVolumeID.
+std::uint32_t IDOf(const volumes::Volume& volume, const Sighting& seen);
+
 // Whether two sightings are of one item.
 bool AreSame(const volumes::Volume& volume, const Sighting& first, const Sighting& second);
 
-// Makes the place a part of the proof of identity, for an item of a volume whose numbers do not tell
-// items apart: the handle becomes a digest of the canonical path. Such a reference does not survive
-// a rename.
-void ProveByPlace(kernel::Item& item, std::string_view path);
+// The item of a sighting, just seen at a spot, with what proves its identity from now on: birth,
+// the handle, or on a volume whose numbers do not tell items apart its place, as a digest of the
+// canonical path where else is the handle. Such a reference does not survive a rename.
+kernel::Item Proved(const Sighting& seen, const volumes::Volume& volume, const kernel::Spot& spot);
 bool IsProvedByPlace(const kernel::Item& item);
+
+// Whether two references are to one item: by number, and where both are proved by it by their
+// place.
+bool AreToSameItem(const kernel::Item& first, const kernel::Item& second);
 
 // The digest of an item that is proved by its place.
 std::uint64_t PlaceDigest(const kernel::Item& item);
 
-// Whether this very item is at a spot now. REQUIRES: `path` is the canonical path of the spot.
-bool IsItemAt(const kernel::Item& item, const kernel::Spot& spot, std::string_view path);
+// Whether an item seen just now at a spot is that of a reference. REQUIRES: its path is canonical.
+bool IsItemOf(const kernel::Item& reference, const Sighting& seen, const kernel::Spot& spot);
+
+// Whether the item of a reference is at a spot now. REQUIRES: `path` is the canonical path of the
+// spot.
+bool IsItemAt(const kernel::Item& reference, const kernel::Spot& spot, std::string_view path);
 
 }  // namespace tallowmere::catalog

@@ -85,8 +85,13 @@ Result<Item> ReadItem(const Spot& spot) {
   return status->item;
 }
 
+FileHandle HandleAt(const Spot& spot) {
+  const auto handle = ReadHandleToIdentify(spot.folder, spot.name);
+  return handle ? *handle : FileHandle{};
+}
+
 void ReadProof(Item& item, const Spot& spot) {
-  if (!IsProvedByBirth(item)) item.handle = ReadHandle(spot.folder, spot.name);
+  if (!IsProvedByBirth(item)) item.handle = HandleAt(spot);
 }
 
 bool IsAt(const Item& item, const Spot& spot) {
@@ -94,7 +99,7 @@ bool IsAt(const Item& item, const Spot& spot) {
   if (!status) return false;
   Item found = status->item;
   if (!HaveSameNumbers(found, item)) return false;
-  if (HasHandle(item)) found.handle = ReadHandle(spot.folder, spot.name);
+  if (HasHandle(item)) found.handle = HandleAt(spot);
   return IsProvedSame(found, item);
 }
 

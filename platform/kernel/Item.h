@@ -7,15 +7,14 @@
 // Birth proves nothing without a device: an overlay gives an item another birth when it is first
 // renamed or written to.
 //
-// | birth | handle | proved by                  | not noticed                                      |
+// | birth | handle | proved by                  | not noticed |
 // |-------|--------|----------------------------|--------------------------------------------------|
-// | old   | any    | birth (on a block device)  |                                                  |
-// | any   | yes    | handle                     |                                                  |
-// | any   | no     | birth                      | a number that goes round within one tick         |
-// | none  | no     | type and mount             | a new item of that type with that number         |
+// | old   | any    | birth (on a block device)  | | | any   | yes    | handle                     |
+// | | any   | no     | birth                      | a number that goes round within one tick | |
+// none  | no     | type and mount             | a new item of that type with that number         |
 //
-// On file systems whose numbers are not one item's, the place is a part of the identity as well: see
-// catalog/Sightings.h.
+// On file systems whose numbers are not one item's, the place is a part of the identity as well:
+// see catalog/Sightings.h.
 #pragma once
 
 #include <cstdint>
@@ -73,6 +72,9 @@ Result<Status> ReadStatus(const Spot& spot);
 
 // The same with the handle where birth does not prove.
 Result<Item> ReadItem(const Spot& spot);
+
+// The handle that tells an item from others; all zero where the file system has none.
+FileHandle HandleAt(const Spot& spot);
 
 // Gives an item that was just read at a spot the handle that ReadItem would have read. If it has
 // been replaced since, the result refers to no item at all, unless number and birth are the new

@@ -38,7 +38,7 @@ Result<Descriptor> HoldStepByStep(std::string_view path, int flags) {
 
 Result<Descriptor> Hold(const std::string& path, int flags) {
   open_how how{};
-  how.flags = static_cast<std::uint64_t>(flags);
+  how.flags = static_cast<unsigned>(flags);
   how.resolve = RESOLVE_NO_SYMLINKS;
   const long descriptor = syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how);
   // Before Linux 5.6 there is no such call, and some sandboxes forbid it: openat2(2).
@@ -68,13 +68,16 @@ Result<Descriptor> HoldFolderWithoutLinks(const std::string& path) {
   return Hold(path, kHeld | O_DIRECTORY);
 }
 
+Result<Descriptor> HoldFolderIn(const Spot& spot) {
+  return AsResult(openat(spot.folder, spot.name, kHeld | O_DIRECTORY));
+}
+
 Result<Descriptor> HoldFollowing(const Spot& spot) {
   return AsResult(openat(spot.folder, spot.name, O_PATH | O_CLOEXEC));
 }
 
 Result<Descriptor> OpenForReading(const Spot& spot) {
-  return AsResult(
-      openat(spot.folder, spot.name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  return AsResult(openat(spot.folder, spot.name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
 }
 
 Result<std::string> RealPath(const std::string& path) {

@@ -24,6 +24,9 @@ Result<Descriptor> HoldWithoutLinks(const std::string& path);
 // The same for a folder; ENOTDIR for anything else.
 Result<Descriptor> HoldFolderWithoutLinks(const std::string& path);
 
+// Holds the folder with a name in an open folder. ENOTDIR for anything else, a link among it.
+Result<Descriptor> HoldFolderIn(const Spot& spot);
+
 // Holds the folder to which a spot leads, links followed. No automounter is asked at its end.
 Result<Descriptor> HoldFollowing(const Spot& spot);
 

@@ -40,8 +40,8 @@ template <class T>
 class Result {
  public:
   // From a value or an error, so that both can be returned as they are.
-  Result(T value) : mValue(std::move(value)) {}               // NOLINT(google-explicit-constructor)
-  Result(kernel::Error error) : mError(error) {}              // NOLINT(google-explicit-constructor)
+  Result(T value) : mValue(std::move(value)) {}   // NOLINT(google-explicit-constructor)
+  Result(kernel::Error error) : mError(error) {}  // NOLINT(google-explicit-constructor)
 
   explicit operator bool() const { return mValue.has_value(); }
 

@@ -19,7 +19,8 @@ std::uint64_t HighestInode(const FileSystemKind& kind, const std::string& mountP
   if (kind.numberBits == 32) return std::numeric_limits<std::uint32_t>::max();
   if (kind.byNumber == ByNumber::kInodeAndGeneration) {
     const auto root = OpenForReading(AtPath(mountPoint.c_str()));
-    const auto highest = root ? HighestXfsInode(*root) : Result<std::uint64_t>(root.Error());
+    const auto highest =
+        root ? ReadHighestXfsInode(root->Get()) : Result<std::uint64_t>(root.Error());
     if (highest) return *highest;
   }
   return std::numeric_limits<std::uint64_t>::max();

@@ -9,8 +9,8 @@
 
 namespace tallowmere::kernel {
 
-// The kind of the file system at a mount point whose root folder is on that device: statfs(2). Valid
-// for the life of the process.
+// The kind of the file system at a mount point whose root folder is on that device: statfs(2).
+// Valid for the life of the process.
 Result<const FileSystemKind*> ReadKind(const std::string& mountPoint, std::uint64_t device);
 
 // The highest inode number that the file system at a mount point can have now. It may grow.

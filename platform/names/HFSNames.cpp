@@ -1,15 +1,15 @@
-#include "files/HFSNames.h"
+#include "names/HFSNames.h"
 
 #include <algorithm>
 #include <charconv>
 
-#include "files/NodeID.h"
 #include "foundation/ColonsAndSlashes.h"
 #include "foundation/FileNameText.h"
 #include "foundation/MacRoman.h"
 #include "foundation/Utf16.h"
+#include "names/NodeIDs.h"
 
-namespace tallowmere::files {
+namespace tallowmere::names {
 namespace {
 
 constexpr char kMark = '#';
@@ -122,4 +122,4 @@ SpelledNames SpellHFSName(std::string_view name) {
   return names;
 }
 
-}  // namespace tallowmere::files
+}  // namespace tallowmere::names

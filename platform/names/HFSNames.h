@@ -12,7 +12,7 @@
 #include <string_view>
 #include <vector>
 
-namespace tallowmere::files {
+namespace tallowmere::names {
 
 // The longest name, in bytes, that an FSSpec can hold, and that a Str255 can.
 inline constexpr std::size_t kLongestSpecName = 63;
@@ -52,4 +52,4 @@ struct SpelledNames {
 };
 SpelledNames SpellHFSName(std::string_view name);
 
-}  // namespace tallowmere::files
+}  // namespace tallowmere::names

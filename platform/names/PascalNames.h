@@ -6,7 +6,7 @@
 #include <algorithm>
 #include <string_view>
 
-namespace tallowmere::files {
+namespace tallowmere::names {
 
 // The text of a Pascal string, valid while it is.
 inline std::string_view TextOfPascal(const unsigned char* string) {
@@ -19,4 +19,4 @@ inline void CopyToPascal(std::string_view text, StringPtr destination) {
   std::copy(text.begin(), text.end(), destination + 1);
 }
 
-}  // namespace tallowmere::files
+}  // namespace tallowmere::names

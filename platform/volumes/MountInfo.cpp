@@ -3,6 +3,8 @@
 #include <sys/sysmacros.h>
 
 #include <charconv>
+#include <optional>
+#include <utility>
 
 namespace tallowmere::volumes {
 namespace {

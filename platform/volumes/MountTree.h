@@ -21,8 +21,8 @@ namespace tallowmere::volumes {
 // missing from the table count as reachable.
 class MountTree {
  public:
-  // `rootID` is the id of the mount that the process's root is in. REQUIRES: it is among the mounts,
-  // which outlive the tree.
+  // `rootID` is the id of the mount that the process's root is in. REQUIRES: it is among the
+  // mounts, which outlive the tree.
   MountTree(const std::vector<Mount>& mounts, int rootID);
 
   // The mounts that make each volume, by index, its place in front; the volumes in their order: the

@@ -36,6 +36,11 @@ std::string HFSNameOfVolume(const std::string& linuxName) {
   return plain ? *std::move(plain) : names::ShortHFSName(linuxName, names::kRootFolderID);
 }
 
+// 0 for an item that has no handle, or is in none.
+std::uint64_t SubvolumeOfItem(const kernel::Item& item) {
+  return kernel::SubvolumeOf(item.handle).value_or(0);
+}
+
 // Whether the item that was found at a mount point is not what is mounted there.
 bool IsMoved(const kernel::Result<kernel::Status>& found, int mount) {
   if (!found) return found.Error().number == ENOENT || found.Error().number == ENOTDIR;
@@ -61,9 +66,8 @@ const std::vector<std::string>& ListedVolume::MountPoints() const {
 }
 
 const ListedVolume::Place* ListedVolume::PlaceWithID(int mount) const {
-  const auto found = std::find_if(mPlaces.begin(), mPlaces.end(), [mount](const Place& place) {
-    return place.mount.id == mount;
-  });
+  const auto found = std::find_if(mPlaces.begin(), mPlaces.end(),
+                                  [mount](const Place& place) { return place.mount.id == mount; });
   return found == mPlaces.end() ? nullptr : &*found;
 }
 
@@ -102,12 +106,16 @@ kernel::Result<std::string_view> ListedVolume::Name() const {
 
 kernel::Result<VolumePointer> ListedVolume::Enter() const {
   if (!mEntered) {
-    const auto root = kernel::ReadStatus(kernel::AtPath(MountPoint().c_str()));
+    const kernel::Spot place = kernel::AtPath(MountPoint().c_str());
+    const auto root = kernel::ReadStatus(place);
     if (IsMoved(root, mPlaces.front().mount.id)) return kMoved;
     if (!root) return root.Error();
     const auto kind = kernel::ReadKind(MountPoint(), root->item.device);
     if (!kind) return kind.Error();
-    mEntered.emplace(*this, root->item, **kind);
+    kernel::Item item = root->item;
+    // Subvolumes are told by handles.
+    if ((*kind)->upperIDs == names::UpperIDs::kSubvolumes) item.handle = kernel::HandleAt(place);
+    mEntered.emplace(*this, item, **kind);
   }
   return VolumePointer(shared_from_this(), &*mEntered);
 }
@@ -117,7 +125,7 @@ Volume::Volume(const ListedVolume& listed, const kernel::Item& root,
     : mListed(listed),
       mRoot(root),
       mKind(kind),
-      mRule{{root.inode, root.device, kernel::SubvolumeOf(root.handle)}, kind.upperIDs} {}
+      mRule{{root.inode, root.device, SubvolumeOfItem(root)}, kind.upperIDs} {}
 
 VolumeNumber Volume::Number() const {
   return mListed.Number();
@@ -132,11 +140,11 @@ bool Volume::NeedsHandleForID(const kernel::Item& item) const {
 }
 
 std::uint32_t Volume::IDOf(const kernel::Item& item) const {
-  return names::NodeIDOf({item.inode, item.device, kernel::SubvolumeOf(item.handle)}, mRule);
+  return names::NodeIDOf({item.inode, item.device, SubvolumeOfItem(item)}, mRule);
 }
 
 std::uint32_t Volume::IDOfEntry(std::uint64_t inode, const kernel::Item& folder) const {
-  return names::NodeIDOf({inode, folder.device, kernel::SubvolumeOf(folder.handle)}, mRule);
+  return names::NodeIDOf({inode, folder.device, SubvolumeOfItem(folder)}, mRule);
 }
 
 std::uint64_t Volume::HighestInode() const {

@@ -23,8 +23,8 @@ using VolumeNumber = std::int16_t;
 
 class ListedVolume;
 
-// A volume whose root folder was seen: what its items' ids follow from. It belongs to a ListedVolume
-// and lives as long.
+// A volume whose root folder was seen: what its items' ids follow from. It belongs to a
+// ListedVolume and lives as long.
 class Volume {
  public:
   // REQUIRES: `root` was found at the mount point of `listed`.
@@ -50,8 +50,8 @@ class Volume {
   // The node id of an item of the volume. REQUIRES: it has its handle where it needs it.
   std::uint32_t IDOf(const kernel::Item& item) const;
 
-  // The same for an entry of a folder, by its inode number and the folder that holds it, which is on
-  // this volume. Not for what is mounted at the entry, nor for another subvolume at it.
+  // The same for an entry of a folder, by its inode number and the folder that holds it, which is
+  // on this volume. Not for what is mounted at the entry, nor for another subvolume at it.
   std::uint32_t IDOfEntry(std::uint64_t inode, const kernel::Item& folder) const;
 
   // What ids are computed with.
@@ -85,8 +85,8 @@ class ListedVolume : public std::enable_shared_from_this<ListedVolume> {
     bool mayBeFile;  // a file can be mounted by itself
   };
 
-  // `places` are the reachable mounts of one file system, the volume's place first; `covers` are the
-  // mount points of what is mounted on those.
+  // `places` are the reachable mounts of one file system, the volume's place first; `covers` are
+  // the mount points of what is mounted on those.
   ListedVolume(VolumeNumber number, std::vector<Place> places, std::vector<std::string> covers);
 
   VolumeNumber Number() const { return mNumber; }

@@ -97,7 +97,7 @@ class VolumeTable {
   kernel::MountTableFile mFile;
   kernel::RootMount (*mReadRoot)();
   VolumesPointer mVolumes;
-  bool mIsCurrent = false;  // unless the kernel has signalled a change since
+  bool mIsCurrent = false;            // unless the kernel has signalled a change since
   std::unordered_set<int> mMountIDs;  // of the last reading
   // Where minus the mount id does not fit 16 bits: the numbers by mount id, and which are taken so.
   std::map<int, VolumeNumber> mAssignedNumbers;

@@ -1,14 +1,14 @@
 #include <CoreServices/CoreServices.h>
-#include <sys/stat.h>
 
-#include "files/ItemReference.h"
+#include "calls/References.h"
+#include "kernel/Item.h"
 
-using tallowmere::files::Unpack;
+using tallowmere::calls::Unpack;
 
 OSErr FSResolveAliasFile(FSRef* item, Boolean, Boolean* targetIsFolder, Boolean* wasAliased) {
   const auto found = Unpack(item);
   if (!found) return fnfErr;
-  if (targetIsFolder != nullptr) *targetIsFolder = S_ISDIR(found->type);
+  if (targetIsFolder != nullptr) *targetIsFolder = tallowmere::kernel::IsFolder(*found);
   if (wasAliased != nullptr) *wasAliased = false;
   return noErr;
 }

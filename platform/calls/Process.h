@@ -1,0 +1,41 @@
+// The state of a process: what it knows, and the moment that is open. It is never destroyed, so
+// that calls from static destructors and exit handlers find it whole.
+#pragma once
+
+#include <CoreServices/CoreServices.h>
+
+#include <exception>
+#include <optional>
+
+#include "catalog/Catalog.h"
+#include "catalog/Moment.h"
+
+namespace tallowmere::calls {
+
+// A walk over the volumes by index: it sees one state of the table from index 1 to its end,
+// whatever else is asked meanwhile.
+struct VolumeWalk {
+  volumes::VolumesPointer volumes;
+  std::size_t next = 0;  // the index, from 0, that goes on with the walk
+};
+
+struct Process {
+  catalog::Catalog catalog;
+  VolumeWalk walk;
+  std::optional<catalog::Moment> moment;  // the open one, of one thread
+};
+
+Process& ThisProcess();
+
+// The moment that this thread has open; null when it has none.
+catalog::Moment* OpenMoment();
+
+// What `body` answers in the open moment, or in one of its own.
+template <class Body>
+auto InMoment(Body&& body) {
+  if (catalog::Moment* const open = OpenMoment()) return body(*open);
+  catalog::Moment own(ThisProcess().catalog);
+  return body(own);
+}
+
+}  // namespace tallowmere::calls

@@ -1,0 +1,17 @@
+#include "calls/ResultCodes.h"
+
+namespace tallowmere::calls {
+
+OSErr ResultCodeOf(kernel::Error error) {
+  if (error == kernel::kNoVolume) return nsvErr;
+  if (error == kernel::kNoFolder) return dirNFErr;
+  if (kernel::MeansGone(error) || error.number == ENAMETOOLONG) return fnfErr;
+  return kernel::MeansRefused(error) ? afpAccessDenied : ioErr;
+}
+
+OSErr ResultCodeOfFolder(kernel::Error error) {
+  const OSErr code = ResultCodeOf(error);
+  return code == fnfErr ? static_cast<OSErr>(dirNFErr) : code;
+}
+
+}  // namespace tallowmere::calls

@@ -1,0 +1,22 @@
+// The host's result codes for what failed below: the one place where errors become codes.
+#pragma once
+
+#include <CoreServices/CoreServices.h>
+
+#include "kernel/Result.h"
+
+namespace tallowmere::calls {
+
+// | error                                   | code                          |
+// |-----------------------------------------|-------------------------------|
+// | nothing is there, or no path leads there| fnfErr                        |
+// | kNoFolder                               | dirNFErr                      |
+// | kNoVolume                               | nsvErr                        |
+// | permission refused                      | afpAccessDenied               |
+// | any other                               | ioErr                         |
+OSErr ResultCodeOf(kernel::Error error);
+
+// The code for a folder on the way: one that is missing is a missing folder.
+OSErr ResultCodeOfFolder(kernel::Error error);
+
+}  // namespace tallowmere::calls

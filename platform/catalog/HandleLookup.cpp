@@ -1,0 +1,103 @@
+#include "catalog/HandleLookup.h"
+
+#include <optional>
+
+#include "kernel/FileHandle.h"
+#include "kernel/Paths.h"
+#include "kernel/Xfs.h"
+#include "names/NodeIDs.h"
+
+namespace tallowmere::catalog {
+namespace {
+
+// What a file system said of one item.
+enum class Said { kOpened, kGone, kNothing };
+
+// Questions to one file system, through its root folder.
+class Questions {
+ public:
+  explicit Questions(const volumes::Volume& volume)
+      : mVolume(volume),
+        mSpot(kernel::AtPath(volume.MountPoint().c_str())),
+        mRoot(kernel::OpenForReading(mSpot)) {}
+
+  // What no process below the mount may see is refused, not gone.
+  bool CanBeComplete() const { return mVolume.Listed().MountPoints().size() == 1; }
+
+  Said Open(const kernel::FileHandle& handle, std::vector<Sighting>& opened) const {
+    if (!mRoot) return Said::kNothing;
+    const auto item = kernel::OpenByHandle(mRoot->Get(), handle);
+    if (!item) return item.Error().number == ESTALE ? Said::kGone : Said::kNothing;
+    const auto status = kernel::ReadStatus(kernel::AtOpen(item->Get()));
+    const auto path = kernel::PathOfDescriptor(*item);
+    if (!status || !path) return Said::kNothing;
+    opened.push_back({*path, status->item});
+    return Said::kOpened;
+  }
+
+  Said OpenByNumber(const names::Candidate& candidate, std::vector<Sighting>& opened) {
+    kernel::HandleNumbers numbers{candidate.inode, SubvolumeOf(candidate), 0};
+    if (mVolume.Kind().byNumber == kernel::ByNumber::kInodeAndGeneration) {
+      if (!mRoot) return Said::kNothing;
+      const auto generation = kernel::ReadXfsGeneration(mRoot->Get(), candidate.inode);
+      if (!generation) {
+        return generation.Error() == kernel::kNotThere ? Said::kGone : Said::kNothing;
+      }
+      numbers.generation = *generation;
+    }
+    const auto handle = HandleOf(numbers);
+    return handle ? Open(*handle, opened) : Said::kNothing;
+  }
+
+ private:
+  std::uint64_t SubvolumeOf(const names::Candidate& candidate) const {
+    return candidate.subvolume != 0 ? candidate.subvolume : mVolume.IDRule().root.subvolume;
+  }
+
+  std::optional<kernel::FileHandle> HandleOf(const kernel::HandleNumbers& numbers) {
+    if (mRootHandle.size == 0) mRootHandle = kernel::HandleAt(mSpot);
+    return kernel::HandleOf(numbers, mRootHandle, mVolume.Root().inode);
+  }
+
+  const volumes::Volume& mVolume;
+  kernel::Spot mSpot;
+  kernel::Result<kernel::Descriptor> mRoot;
+  kernel::FileHandle mRootHandle{};
+};
+
+}  // namespace
+
+HandleAnswer AskForReference(const volumes::Volume& volume, const kernel::Item& reference) {
+  HandleAnswer answer{};
+  if (IsProvedByPlace(reference)) return answer;
+  Questions questions(volume);
+  Said said = Said::kNothing;
+  if (reference.handle.size != 0) {
+    said = questions.Open(reference.handle, answer.opened);
+    answer.isComplete = volume.Kind().findsAllByHandle;
+  } else if (volume.Kind().byNumber != kernel::ByNumber::kNone &&
+             reference.device == volume.Root().device) {
+    said = questions.OpenByNumber({reference.inode, 0}, answer.opened);
+    answer.isComplete = true;
+  }
+  answer.isComplete = answer.isComplete && said != Said::kNothing && questions.CanBeComplete();
+  return answer;
+}
+
+HandleAnswer AskForID(const volumes::Volume& volume, std::uint32_t id) {
+  HandleAnswer answer{};
+  if (volume.Kind().byNumber == kernel::ByNumber::kNone) return answer;
+  const auto candidates = names::CandidatesOf(id, volume.IDRule(), volume.HighestInode());
+  if (!candidates) return answer;
+  Questions questions(volume);
+  answer.isComplete = volume.NumbersTellItemsApart() && questions.CanBeComplete();
+  for (const names::Candidate& candidate : *candidates) {
+    if (questions.OpenByNumber(candidate, answer.opened) == Said::kNothing) {
+      answer.isComplete = false;
+      break;
+    }
+  }
+  return answer;
+}
+
+}  // namespace tallowmere::catalog

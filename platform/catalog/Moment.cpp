@@ -1,0 +1,263 @@
+#include "catalog/Moment.h"
+
+#include <algorithm>
+#include <climits>
+#include <utility>
+
+#include "foundation/PathText.h"
+#include "kernel/Paths.h"
+
+namespace tallowmere::catalog {
+namespace {
+
+// More are not kept beyond the call that holds them.
+constexpr std::size_t kMostHeld = 8;
+constexpr std::size_t kMostLooks = 8;
+
+bool MeansNoDescriptors(kernel::Error error) {
+  return error.number == EMFILE || error.number == ENFILE;
+}
+
+// Whether an error of a path without links says that there may be one.
+bool MayBeALink(kernel::Error error) {
+  return error.number == ELOOP || error.number == ENOTDIR;
+}
+
+}  // namespace
+
+void Moment::Restart() {
+  mClimb.reset();
+  mLooks.clear();
+  mHeld.clear();
+  mVolumes = nullptr;
+  mIsTableNew = false;
+}
+
+// --- Volumes ------------------------------------------------------------------------------------
+
+void Moment::Poll() {
+  const auto before = mCatalog.Table().AsLastRead();
+  mVolumes = mCatalog.Table().Now();
+  mIsTableNew = mIsTableNew || mVolumes != before;
+}
+
+const volumes::Volumes& Moment::Volumes() {
+  if (!mVolumes) Poll();
+  return *mVolumes;
+}
+
+const volumes::Volumes& Moment::LastVolumes() {
+  const auto& last = mCatalog.Table().AsLastRead();
+  return last ? *last : Volumes();
+}
+
+void Moment::InvalidateVolumes() {
+  mCatalog.Table().Invalidate();
+  mVolumes = nullptr;
+}
+
+// The kernel does not signal that a folder above a mount point was renamed: then the table is read
+// once more.
+kernel::Result<volumes::VolumePointer> Moment::VolumeWithNumber(volumes::VolumeNumber number) {
+  for (const bool isLast : {false, true}) {
+    const auto listed = Volumes().WithNumber(number);
+    if (!listed) return kernel::kNoVolume;
+    auto entered = listed->Enter();
+    if (entered || isLast || entered.Error() != volumes::ListedVolume::kMoved) return entered;
+    InvalidateVolumes();
+  }
+  return kernel::kNoVolume;
+}
+
+bool Moment::IsMountHeld(int mount) const {
+  return mount != kernel::kNoMount &&
+         std::any_of(mHeld.begin(), mHeld.end(),
+                     [mount](const auto& held) { return held.fact.Item().mount == mount; });
+}
+
+// As VolumeWithNumber reads the table once more.
+kernel::Result<volumes::VolumePointer> Moment::FindVolume(const Sighting& seen) {
+  for (const bool isLast : {false, true}) {
+    const auto listed = mVolumes->OfItem(seen.item, seen.path);
+    if (!listed) break;
+    auto entered = listed->Enter();
+    if (entered) return entered;
+    if (isLast || entered.Error() != volumes::ListedVolume::kMoved) break;
+    mCatalog.Table().Invalidate();
+    Poll();
+  }
+  return kernel::kNoVolume;
+}
+
+kernel::Result<volumes::VolumePointer> Moment::VolumeOf(const Sighting& seen) {
+  if (!mVolumes || !IsMountHeld(seen.item.mount)) Poll();
+  return FindVolume(seen);
+}
+
+bool Moment::IsOnVolume(const volumes::Volume& volume, const Sighting& seen) {
+  const auto found = VolumeOf(seen);
+  return found && (*found)->Number() == volume.Number();
+}
+
+// --- Folders ------------------------------------------------------------------------------------
+
+const HeldFolder* Moment::HeldAt(const std::string& path) const {
+  for (const auto& held : mHeld) {
+    if (held.fact.Path() == path) return &held.fact;
+  }
+  return nullptr;
+}
+
+const HeldFolder* Moment::HeldWithID(volumes::VolumeNumber volume, std::uint32_t id) const {
+  for (const auto& held : mHeld) {
+    const volumes::Volume& own = *held.fact.Volume();
+    if (held.fact.ID() == id && own.Number() == volume && own.IsCertain(id)) return &held.fact;
+  }
+  return nullptr;
+}
+
+const HeldFolder* Moment::HeldFor(const kernel::Item& reference) const {
+  for (const auto& held : mHeld) {
+    const kernel::Item& known = held.reference.value_or(held.fact.Item());
+    if (known.mount == reference.mount && kernel::IsProvedSame(known, reference)) {
+      return &held.fact;
+    }
+  }
+  return nullptr;
+}
+
+kernel::Result<HeldFolder> Moment::HoldFolder(const std::string& path) {
+  if (!kernel::IsNormalized(path)) return kernel::Error{ELOOP};
+  if (const HeldFolder* const held = HeldAt(path)) return *held;
+  auto descriptor = kernel::HoldFolderWithoutLinks(path);
+  if (!descriptor && MeansNoDescriptors(descriptor.Error()) && !mHeld.empty()) {
+    Restart();
+    descriptor = kernel::HoldFolderWithoutLinks(path);
+  }
+  if (!descriptor) return descriptor.Error();
+  return Keep(path, *std::move(descriptor));
+}
+
+// Looks up the volume after the folder is held.
+kernel::Result<HeldFolder> Moment::Keep(std::string path, kernel::Descriptor descriptor) {
+  const kernel::Spot spot = kernel::AtOpen(descriptor.Get());
+  auto status = kernel::ReadStatus(spot);
+  if (!status) return status.Error();
+  Sighting place{std::move(path), status->item};
+  auto volume = VolumeOf(place);
+  if (!volume) return volume.Error();
+  if ((*volume)->NeedsHandleForID(place.item)) kernel::ReadProof(place.item, spot);
+  HeldFolder held(std::move(place), std::move(descriptor), *std::move(volume));
+  mCatalog.Remember(held.Place(), held.Volume().get());
+  if (mHeld.size() < kMostHeld) mHeld.push_back({held, std::nullopt});
+  return held;
+}
+
+kernel::Result<HeldFolder> Moment::HoldHolderOf(const std::string& path) {
+  if (path == "/") return kernel::kNotThere;
+  const std::string folder = foundation::FolderOf(path);
+  auto held = HoldFolder(folder);
+  if (held || !MayBeALink(held.Error())) return held;
+  return HoldAtRealPath(kernel::HoldFollowing(kernel::AtPath(folder.c_str())), folder);
+}
+
+kernel::Result<HeldFolder> Moment::HoldFolderOf(const Look& folder) {
+  if (const HeldFolder* const held = HeldAt(folder.seen.path)) return *held;
+  const std::string name(*foundation::LastComponent(folder.seen.path));
+  auto descriptor = kernel::HoldFolderIn(folder.folder.SpotOf(name.c_str()));
+  if (!descriptor) return descriptor.Error();
+  return Keep(folder.seen.path, *std::move(descriptor));
+}
+
+kernel::Result<HeldFolder> Moment::HoldTargetOf(const Look& link) {
+  const std::string name(*foundation::LastComponent(link.seen.path));
+  return HoldAtRealPath(kernel::HoldFollowing(link.folder.SpotOf(name.c_str())), link.seen.path);
+}
+
+// The folder that was found by following an absolute path, at its canonical path. A path that leads
+// through a link of /proc can spell another folder than the one it leads to.
+kernel::Result<HeldFolder> Moment::HoldAtRealPath(kernel::Result<kernel::Descriptor> found,
+                                                  const std::string& path) {
+  if (!found) return found.Error();
+  const auto status = kernel::ReadStatus(kernel::AtOpen(found->Get()));
+  if (!status) return status.Error();
+  if (!kernel::IsFolder(status->item)) return kernel::Error{ENOTDIR};
+  const auto real = kernel::RealPath(path);
+  if (!real) return real.Error();
+  auto held = HoldFolder(*real);
+  if (!held) return held;
+  const bool isSame = kernel::HaveSameNumbers(held->Item(), status->item) &&
+                      held->Item().mount == status->item.mount;
+  if (!isSame) return kernel::kNotThere;
+  return held;
+}
+
+// --- Items --------------------------------------------------------------------------------------
+
+kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, const std::string& name) {
+  std::string path = foundation::JoinPath(folder.Path(), name);
+  if (path.size() >= PATH_MAX) return kernel::Error{ENAMETOOLONG};
+  for (const auto& [look, reference] : mLooks) {
+    if (look.seen.path == path && kernel::HaveSameNumbers(look.folder.Item(), folder.Item())) {
+      return look;
+    }
+  }
+  const kernel::Spot spot = folder.SpotOf(name.c_str());
+  const auto status = kernel::ReadStatus(spot);
+  if (!status) return status.Error();
+  Look look{folder, {std::move(path), status->item}};
+  if (folder.Volume()->NeedsHandleForID(look.seen.item)) {
+    kernel::ReadProof(look.seen.item, spot);
+    if (look.seen.item.handle.size == 0) return kernel::kNotThere;
+  }
+  if (mLooks.size() < kMostLooks) mLooks.push_back({look, std::nullopt});
+  return look;
+}
+
+kernel::Result<Sighting> Moment::See(const std::string& path) {
+  std::string canonical = path;
+  auto item = kernel::IsNormalized(path) ? kernel::HoldWithoutLinks(path)
+                                         : kernel::Result<kernel::Descriptor>(kernel::Error{ELOOP});
+  if (!item) {
+    auto real = kernel::CanonicalPath(path);
+    if (!real) return real.Error();
+    canonical = *std::move(real);
+    item = kernel::HoldWithoutLinks(canonical);
+  }
+  if (!item) return item.Error();
+  const auto status = kernel::ReadStatus(kernel::AtOpen(item->Get()));
+  if (!status) return status.Error();
+  return Sighting{std::move(canonical), status->item};
+}
+
+const Look* Moment::LookFor(const kernel::Item& reference) const {
+  for (const auto& look : mLooks) {
+    const kernel::Item& known = look.reference.value_or(look.fact.seen.item);
+    if (known.mount == reference.mount && kernel::IsProvedSame(known, reference)) {
+      return &look.fact;
+    }
+  }
+  return nullptr;
+}
+
+// --- References ---------------------------------------------------------------------------------
+
+kernel::Item Moment::Prove(const Look& look) {
+  const std::string name(*foundation::LastComponent(look.seen.path));
+  const kernel::Item reference =
+      Proved(look.seen, *look.folder.Volume(), look.folder.SpotOf(name.c_str()));
+  for (auto& known : mLooks) {
+    if (known.fact.seen.path == look.seen.path) known.reference = reference;
+  }
+  return reference;
+}
+
+kernel::Item Moment::Prove(const HeldFolder& folder) {
+  const kernel::Item reference = Proved(folder.Place(), *folder.Volume(), folder.OwnSpot());
+  for (auto& known : mHeld) {
+    if (known.fact.Path() == folder.Path()) known.reference = reference;
+  }
+  return reference;
+}
+
+}  // namespace tallowmere::catalog
