@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <optional>
 #include <string>
+#include <utility>
 
 #include "calls/Process.h"
 #include "calls/References.h"
@@ -16,6 +17,7 @@
 #include "foundation/MacRoman.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
+#include "kernel/Paths.h"
 #include "names/HFSNames.h"
 #include "names/PascalNames.h"
 
@@ -26,12 +28,19 @@ namespace {
 
 constexpr std::size_t kLongestUnicodeName = 255;
 
-// An item seen now, and the folder that holds it: none for "/", and where that is on no volume.
-struct Subject {
-  catalog::Sighting seen;
-  std::optional<catalog::HeldFolder> holder;
+// An item seen now: in the folder that holds it, or alone, as "/" is and what is in a folder on no
+// volume.
+class Subject {
+ public:
+  explicit Subject(catalog::Look look) : mLook(std::move(look)) {}
+  explicit Subject(catalog::Sighting alone) : mAlone(std::move(alone)) {}
 
-  catalog::Look Look() const { return {*holder, seen}; }
+  const catalog::Sighting& Seen() const { return mLook ? mLook->Seen() : mAlone; }
+  const std::optional<catalog::Look>& Look() const { return mLook; }
+
+ private:
+  std::optional<catalog::Look> mLook;
+  catalog::Sighting mAlone{};
 };
 
 // What was asked of an item, where one is told.
@@ -47,26 +56,29 @@ struct Description {
   }
 };
 
+// An item of another volume than its folder's is looked at once more where its id takes the handle.
+UInt32 IDOnVolume(const volumes::Volume& volume, const catalog::Sighting& seen) {
+  if (!volume.NeedsHandleForID(seen.item)) return catalog::IDOf(volume, seen);
+  catalog::Sighting proved = seen;
+  kernel::ReadProof(proved.item, kernel::AtPath(seen.path.c_str()));
+  return catalog::IDOf(volume, proved);
+}
+
 // The volume and the id of an item. A file that is mounted alone, and the folder at which a kernel
 // interface is mounted, are on no volume: they count to that of their folder, with an id that leads
 // nowhere.
-OSErr FillInfo(catalog::Moment& moment, Subject& item, FSCatalogInfo& info) {
-  const auto volume = moment.VolumeOf(item.seen);
+OSErr FillInfo(catalog::Moment& moment, const Subject& item, FSCatalogInfo& info) {
+  const auto volume = moment.VolumeOf(item.Seen());
   if (volume) {
-    if ((*volume)->NeedsHandleForID(item.seen.item)) {
-      kernel::ReadProof(item.seen.item, kernel::AtPath(item.seen.path.c_str()));
-    }
-    info.volume = (*volume)->Number();
-    info.nodeID = catalog::IDOf(**volume, item.seen);
+    info = {(*volume)->Number(), IDOnVolume(**volume, item.Seen())};
     return noErr;
   }
-  if (!item.holder) return nsvErr;
-  info.volume = item.holder->Volume()->Number();
-  info.nodeID = names::kNoVolumeID;
+  if (!item.Look()) return nsvErr;
+  info = {item.Look()->Folder().Volume()->Number(), names::kNoVolumeID};
   return noErr;
 }
 
-OSErr FillInfo(catalog::Moment& moment, Subject& item, const Description& wanted) {
+OSErr FillInfo(catalog::Moment& moment, const Subject& item, const Description& wanted) {
   constexpr FSCatalogInfoBitmap kBoth = kFSCatInfoVolume | kFSCatInfoNodeID;
   if (wanted.info == nullptr || (wanted.whichInfo & kBoth) == 0) return noErr;
   FSCatalogInfo info;
@@ -78,13 +90,13 @@ OSErr FillInfo(catalog::Moment& moment, Subject& item, const Description& wanted
 
 OSErr FillName(catalog::Moment& moment, const Subject& item, HFSUniStr255& name) {
   std::u16string text;
-  if (const auto volume = VolumeOfRoot(moment, item.seen)) {
+  if (const auto volume = VolumeOfRoot(moment, item.Seen())) {
     const auto volumeName = volume->Listed().Name();
     if (!volumeName) return ResultCodeOf(volumeName.Error());
     text = foundation::DecodeMacRoman(*volumeName);
   } else {
     text = foundation::ExchangeColonsAndSlashes(
-        foundation::TextOfFileName(*foundation::LastComponent(item.seen.path)));
+        foundation::TextOfFileName(*foundation::LastComponent(item.Seen().path)));
   }
   text.resize(std::min(text.size(), kLongestUnicodeName));
   name.length = static_cast<UInt16>(text.size());
@@ -93,14 +105,8 @@ OSErr FillName(catalog::Moment& moment, const Subject& item, HFSUniStr255& name)
 }
 
 OSErr FillSpec(catalog::Moment& moment, const Subject& item, FSSpec& spec) {
-  if (const auto volume = VolumeOfRoot(moment, item.seen)) {
-    const auto name = volume->Listed().Name();
-    if (!name) return ResultCodeOf(name.Error());
-    spec = MakeRecord(volume->Number(), names::kParentOfRootID, *name);
-    return noErr;
-  }
-  if (!item.holder) return nsvErr;
-  const auto record = RecordOf(moment, item.Look());
+  const auto record = item.Look() ? RecordOf(moment, *item.Look())
+                                  : RecordOfRoot(VolumeOfRoot(moment, item.Seen()));
   if (!record) return ResultCodeOf(record.Error());
   spec = *record;
   return noErr;
@@ -108,13 +114,13 @@ OSErr FillSpec(catalog::Moment& moment, const Subject& item, FSSpec& spec) {
 
 OSErr FillParent(catalog::Moment& moment, const Subject& item, FSRef& parent) {
   parent = {};
-  if (VolumeOfRoot(moment, item.seen)) return noErr;
-  if (!item.holder) return nsvErr;
-  parent = ReferenceTo(moment, *item.holder);
+  if (VolumeOfRoot(moment, item.Seen())) return noErr;
+  if (!item.Look()) return nsvErr;
+  parent = ReferenceTo(moment, item.Look()->Folder());
   return noErr;
 }
 
-OSErr Describe(catalog::Moment& moment, Subject& item, const Description& wanted) {
+OSErr Describe(catalog::Moment& moment, const Subject& item, const Description& wanted) {
   OSErr error = FillInfo(moment, item, wanted);
   if (error == noErr && wanted.name != nullptr) error = FillName(moment, item, *wanted.name);
   if (error == noErr && wanted.spec != nullptr) error = FillSpec(moment, item, *wanted.spec);
@@ -126,7 +132,7 @@ OSErr Describe(catalog::Moment& moment, Subject& item, const Description& wanted
 kernel::Result<Subject> SeeAt(catalog::Moment& moment, const kernel::Item& reference,
                               const std::string& path) {
   const auto look = catalog::LookAgain(moment, reference, path);
-  if (look) return Subject{look->seen, look->folder};
+  if (look) return Subject(*look);
   const bool hasHolder = path != "/" && look.Error() != kernel::kNoVolume;
   if (hasHolder) return look.Error();
   const auto seen = moment.See(path);
@@ -134,25 +140,26 @@ kernel::Result<Subject> SeeAt(catalog::Moment& moment, const kernel::Item& refer
   if (!catalog::IsItemOf(reference, *seen, kernel::AtPath(seen->path.c_str()))) {
     return kernel::kNotThere;
   }
-  return Subject{*seen, std::nullopt};
+  return Subject(*seen);
 }
 
 // What this moment knows of the item already.
 std::optional<Subject> Known(const catalog::Moment& moment, const kernel::Item& reference,
                              const Description& wanted) {
   if (const catalog::Look* const look = moment.LookFor(reference)) {
-    return Subject{look->seen, look->folder};
+    return Subject(*look);
   }
   const catalog::HeldFolder* const held = moment.HeldFor(reference);
   if (held == nullptr || !wanted.IsOfVolumeAndNumberAlone()) return std::nullopt;
-  return Subject{held->Place(), std::nullopt};
+  return Subject(held->Place());
 }
 
 kernel::Result<Subject> FindSubject(catalog::Moment& moment, const kernel::Item& reference,
                                     const Description& wanted) {
   if (auto known = Known(moment, reference, wanted)) return *std::move(known);
+  // Where the kernel does not tell the mount, only the canonical path tells the volume.
   const std::string last = catalog::LastPathOf(moment, reference);
-  if (!last.empty()) {
+  if (reference.mount != kernel::kNoMount && kernel::IsNormalized(last)) {
     auto subject = SeeAt(moment, reference, last);
     if (subject) return subject;
   }
@@ -199,7 +206,7 @@ OSErr FSGetCatalogInfo(const FSRef* ref, FSCatalogInfoBitmap whichInfo, FSCatalo
     const auto reference = Unpack(ref);
     if (!reference) return fnfErr;
     return InMoment([&](catalog::Moment& moment) -> OSErr {
-      auto subject = FindSubject(moment, *reference, wanted);
+      const auto subject = FindSubject(moment, *reference, wanted);
       return subject ? Describe(moment, *subject, wanted) : ResultCodeOf(subject.Error());
     });
   });

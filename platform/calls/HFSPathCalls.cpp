@@ -74,7 +74,8 @@ kernel::Result<HeldFolder> StepUp(Moment& moment, const HeldFolder& folder) {
   auto above = moment.HoldHolderOf(folder.Path());
   if (!above) return above;
   const auto look = moment.LookUp(*above, std::string(*foundation::LastComponent(folder.Path())));
-  const bool isStillThere = look && catalog::AreSame(*folder.Volume(), look->seen, folder.Place());
+  const bool isStillThere =
+      look && catalog::AreSame(*folder.Volume(), look->Seen(), folder.Place());
   if (!isStillThere) return kernel::kNoFolder;
   return above;
 }
@@ -84,7 +85,7 @@ kernel::Result<HeldFolder> Step(Moment& moment, const HeldFolder& folder, std::s
   if (name.empty()) return StepUp(moment, folder);
   const auto item = catalog::LookUpHFSName(moment, folder, name);
   if (!item) return item.Error();
-  return kernel::IsLink(item->seen.item) ? moment.HoldTargetOf(*item) : moment.HoldFolderOf(*item);
+  return kernel::IsLink(item->Item()) ? moment.HoldTargetOf(*item) : moment.HoldFolderOf(*item);
 }
 
 // The path to the folder of steps from a volume's root, when each has its name in Linux; else
@@ -129,16 +130,14 @@ kernel::Result<HeldFolder> HoldFolder(Moment& moment, SInt16 vRefNum, SInt32 dir
   return folder;
 }
 
-OSErr RecordOfFolder(Moment& moment, const HeldFolder& folder, FSSpec& spec) {
-  if (folder.IsRoot()) {
-    const auto name = folder.Volume()->Listed().Name();
-    if (!name) return ResultCodeOf(name.Error());
-    spec = MakeRecord(folder.Volume()->Number(), names::kParentOfRootID, *name);
-    return noErr;
-  }
+kernel::Result<FSSpec> RecordOfFolder(Moment& moment, const HeldFolder& folder) {
+  if (folder.IsRoot()) return RecordOfRoot(folder.Volume());
   const auto look = catalog::LookAgain(moment, folder.Item(), folder.Path());
-  if (!look) return ResultCodeOf(look.Error());
-  const auto record = RecordOf(moment, *look);
+  if (!look) return look.Error();
+  return RecordOf(moment, *look);
+}
+
+OSErr Fill(const kernel::Result<FSSpec>& record, FSSpec& spec) {
   if (!record) return ResultCodeOf(record.Error());
   spec = *record;
   return noErr;
@@ -146,12 +145,7 @@ OSErr RecordOfFolder(Moment& moment, const HeldFolder& folder, FSSpec& spec) {
 
 OSErr RecordOfName(Moment& moment, const HeldFolder& folder, std::string_view name, FSSpec& spec) {
   const auto item = catalog::LookUpHFSName(moment, folder, name);
-  if (item) {
-    const auto record = RecordOf(moment, *item);
-    if (!record) return ResultCodeOf(record.Error());
-    spec = *record;
-    return noErr;
-  }
+  if (item) return Fill(RecordOf(moment, *item), spec);
   const OSErr error = ResultCodeOf(item.Error());
   if (error != fnfErr) return error;
   const bool isPossible =
@@ -161,8 +155,8 @@ OSErr RecordOfName(Moment& moment, const HeldFolder& folder, std::string_view na
   return fnfErr;
 }
 
-// The record of a root: the volume's name in the parent that every root has.
-OSErr RecordOfRoot(Moment& moment, SInt16 vRefNum, std::string_view name, FSSpec& spec) {
+// The record of a name in the parent that every root has, where only the volume's own is.
+OSErr RecordInParentOfRoot(Moment& moment, SInt16 vRefNum, std::string_view name, FSSpec& spec) {
   const auto volume = moment.Volumes().WithNumber(vRefNum);
   if (!volume) return nsvErr;
   if (name.empty()) return dirNFErr;
@@ -176,12 +170,12 @@ OSErr RecordOfRoot(Moment& moment, SInt16 vRefNum, std::string_view name, FSSpec
 OSErr Make(Moment& moment, SInt16 vRefNum, SInt32 dirID, std::string_view path, FSSpec& spec) {
   const bool isName = path.find(kSeparator) == std::string_view::npos;
   if (dirID == static_cast<SInt32>(names::kParentOfRootID) && isName) {
-    return RecordOfRoot(moment, vRefNum, path, spec);
+    return RecordInParentOfRoot(moment, vRefNum, path, spec);
   }
   const Steps steps = ReadPath(path);
   const auto folder = HoldFolder(moment, vRefNum, dirID, steps);
   if (!folder) return ResultCodeOfFolder(folder.Error());
-  return steps.item.empty() ? RecordOfFolder(moment, *folder, spec)
+  return steps.item.empty() ? Fill(RecordOfFolder(moment, *folder), spec)
                             : RecordOfName(moment, *folder, steps.item, spec);
 }
 

@@ -9,7 +9,7 @@ namespace tallowmere::calls {
 namespace {
 
 struct State : Process {
-  std::thread::id owner;  // of the open moment
+  std::thread::id owner;  // whose moment is open; no thread's where none is
 };
 
 State& ThisState() {
@@ -25,8 +25,7 @@ Process& ThisProcess() {
 
 catalog::Moment* OpenMoment() {
   State& state = ThisState();
-  const bool isOpen = state.moment && state.owner == std::this_thread::get_id();
-  return isOpen ? &*state.moment : nullptr;
+  return state.owner == std::this_thread::get_id() ? &state.moment : nullptr;
 }
 
 }  // namespace tallowmere::calls
@@ -37,8 +36,7 @@ namespace tallowmere::process {
 Moment::Moment() noexcept : mIsOutermost(false) {
   try {
     calls::State& state = calls::ThisState();
-    if (state.moment) return;
-    state.moment.emplace(state.catalog);
+    if (state.owner != std::thread::id()) return;
     state.owner = std::this_thread::get_id();
     mIsOutermost = true;
   } catch (const std::bad_alloc&) {
@@ -48,7 +46,8 @@ Moment::Moment() noexcept : mIsOutermost(false) {
 
 void Moment::End() noexcept {
   if (!mIsOutermost) return;
-  calls::ThisState().moment.reset();
+  calls::ThisState().moment.Restart();
+  calls::ThisState().owner = {};
   mIsOutermost = false;
 }
 

@@ -5,7 +5,6 @@
 #include <CoreServices/CoreServices.h>
 
 #include <exception>
-#include <optional>
 
 #include "catalog/Catalog.h"
 #include "catalog/Moment.h"
@@ -22,7 +21,7 @@ struct VolumeWalk {
 struct Process {
   catalog::Catalog catalog;
   VolumeWalk walk;
-  std::optional<catalog::Moment> moment;  // the open one, of one thread
+  catalog::Moment moment{catalog};  // of a request; restarted with each
 };
 
 Process& ThisProcess();

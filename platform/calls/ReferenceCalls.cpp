@@ -11,6 +11,7 @@
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
 #include "foundation/Url.h"
+#include "kernel/Paths.h"
 
 using namespace tallowmere;
 using namespace tallowmere::calls;
@@ -28,7 +29,7 @@ kernel::Result<FSRef> ReferenceInMoment(catalog::Moment& moment, const std::stri
   if (isFolderMeant) {
     if (const auto folder = moment.HoldFolder(path)) return ReferenceTo(moment, *folder);
   }
-  if (path == "/") return kOtherWay;
+  if (path == "/" || !kernel::IsNormalized(path)) return kOtherWay;
   const auto holder = moment.HoldFolder(foundation::FolderOf(path));
   if (!holder) return holder.Error() == kernel::kNotThere ? kernel::kNotThere : kOtherWay;
   const auto look = moment.LookUp(*holder, std::string(*foundation::LastComponent(path)));
@@ -55,7 +56,7 @@ std::optional<std::string> PathSeen(const catalog::Moment& moment, const kernel:
   const catalog::Look* const look = moment.LookFor(reference);
   const catalog::HeldFolder* const held = look == nullptr ? moment.HeldFor(reference) : nullptr;
   if (look == nullptr && held == nullptr) return std::nullopt;
-  const std::string& path = look != nullptr ? look->seen.path : held->Path();
+  const std::string& path = look != nullptr ? look->Path() : held->Path();
   if (!catalog::IsItemAt(reference, kernel::AtPath(path.c_str()), path)) return std::nullopt;
   return path;
 }

@@ -24,7 +24,7 @@ std::optional<kernel::Item> Unpack(const FSRef* reference) {
 
 FSRef ReferenceTo(catalog::Moment& moment, const catalog::Look& look) {
   const kernel::Item reference = moment.Prove(look);
-  moment.Knowledge().Remember({look.seen.path, reference}, look.folder.Volume().get());
+  moment.Knowledge().Remember(reference, look.Path(), look.Folder().Volume().get());
   return Pack(reference);
 }
 
@@ -43,7 +43,7 @@ FSRef ReferenceTo(catalog::Moment& moment, const catalog::Sighting& seen) {
   } else if (const auto canonical = moment.See(seen.path)) {
     reference = catalog::Proved(*canonical, **volume, spot);
   }
-  moment.Knowledge().Remember({seen.path, reference}, volume ? volume->get() : nullptr);
+  moment.Knowledge().Remember(reference, seen.path, volume ? volume->get() : nullptr);
   return Pack(reference);
 }
 
@@ -53,15 +53,18 @@ volumes::VolumePointer VolumeOfRoot(catalog::Moment& moment, const catalog::Sigh
   return volume && (*volume)->IsRoot(seen.item, seen.path) ? *volume : nullptr;
 }
 
+kernel::Result<FSSpec> RecordOfRoot(const volumes::VolumePointer& volume) {
+  if (!volume) return kernel::kNoVolume;
+  const auto name = volume->Listed().Name();
+  if (!name) return name.Error();
+  return MakeRecord(volume->Number(), names::kParentOfRootID, *name);
+}
+
 kernel::Result<FSSpec> RecordOf(catalog::Moment& moment, const catalog::Look& item) {
-  if (const auto volume = VolumeOfRoot(moment, item.seen)) {
-    const auto name = volume->Listed().Name();
-    if (!name) return name.Error();
-    return MakeRecord(volume->Number(), names::kParentOfRootID, *name);
-  }
+  if (const auto volume = VolumeOfRoot(moment, item.Seen())) return RecordOfRoot(volume);
   const auto name = catalog::HFSNameOf(moment, item, names::kLongestSpecName);
   if (!name) return name.Error();
-  return MakeRecord(item.folder.Volume()->Number(), item.folder.ID(), *name);
+  return MakeRecord(item.Folder().Volume()->Number(), item.Folder().ID(), *name);
 }
 
 FSSpec MakeRecord(SInt16 vRefNum, UInt32 parID, std::string_view name) {

@@ -23,6 +23,9 @@ FSRef ReferenceTo(catalog::Moment& moment, const catalog::Look& look);
 FSRef ReferenceTo(catalog::Moment& moment, const catalog::HeldFolder& folder);
 FSRef ReferenceTo(catalog::Moment& moment, const catalog::Sighting& seen);
 
+// The record of a volume's root folder; kNoVolume for null.
+kernel::Result<FSSpec> RecordOfRoot(const volumes::VolumePointer& volume);
+
 // The record of an item: that of its volume's root folder, or of what its folder holds.
 kernel::Result<FSSpec> RecordOf(catalog::Moment& moment, const catalog::Look& item);
 

@@ -30,8 +30,9 @@ bool IsSeenAlike(const volumes::ListedVolume& first, const volumes::ListedVolume
 
 Catalog::Catalog() : mPlaces(kPlacesLimit) {}
 
-void Catalog::Remember(const Sighting& seen, const volumes::Volume* volume) {
-  mPlaces.Remember(KeyOf(seen.item, volume), seen.path);
+void Catalog::Remember(const kernel::Item& item, std::string_view path,
+                       const volumes::Volume* volume) {
+  mPlaces.Remember(KeyOf(item, volume), path);
 }
 
 void Catalog::RememberParent(const Sighting& seen, const volumes::Volume& volume,

@@ -24,7 +24,7 @@ class Catalog {
   volumes::VolumeTable& Table() { return mTable; }
 
   // Remembers where an item was seen. `volume` is null for an item that is on none.
-  void Remember(const Sighting& seen, const volumes::Volume* volume);
+  void Remember(const kernel::Item& item, std::string_view path, const volumes::Volume* volume);
 
   // Remembers which folder held an item at its place.
   void RememberParent(const Sighting& seen, const volumes::Volume& volume, std::uint32_t parent);

@@ -37,8 +37,8 @@ std::optional<ClimbedFolder> StepAlongPath(Moment& moment, Moment::Climb climb) 
   const volumes::Volume& volume = *climb.folder.Volume();
   const std::string_view path = std::string_view(climb.folder.Path()).substr(0, climb.length);
   const std::string_view linuxName = *foundation::LastComponent(path);
-  auto name = names::PlainHFSName(linuxName, names::kLongestStr255Name);
-  if (!name || names::SpellHFSName(*name).precomposed != linuxName) return std::nullopt;
+  auto name = names::UnmistakableHFSName(linuxName, names::kLongestStr255Name);
+  if (!name) return std::nullopt;
   const auto parent = RememberedParent(moment, volume, path, climb.id);
   if (!parent) return std::nullopt;
   climb.length = foundation::FolderOf(path).size();
@@ -63,13 +63,13 @@ kernel::Result<Step> LookInHolder(Moment& moment, const HeldFolder& folder) {
 // can be mounted by itself.
 Step PreferItsVolume(Moment& moment, Step step) {
   const volumes::Volume& volume = *step.folder.Volume();
-  if (step.look.folder.Volume()->Number() == volume.Number()) return step;
+  if (step.look.Folder().Volume()->Number() == volume.Number()) return step;
   for (const std::string& path :
        volume.Listed().PathsOf(step.folder.Path(), step.folder.Item().mount)) {
     const auto other = moment.HoldFolder(path);
     if (!other || !kernel::HaveSameNumbers(other->Item(), step.folder.Item())) continue;
     auto otherStep = LookInHolder(moment, *other);
-    if (otherStep && otherStep->look.folder.Volume()->Number() == volume.Number()) {
+    if (otherStep && otherStep->look.Folder().Volume()->Number() == volume.Number()) {
       return *std::move(otherStep);
     }
   }
@@ -85,7 +85,7 @@ kernel::Result<ClimbedFolder> StepByLook(Moment& moment, const HeldFolder& folde
   auto found = LookInHolder(moment, folder);
   if (!found) return found.Error();
   const Step step = PreferItsVolume(moment, *std::move(found));
-  const HeldFolder& holder = step.look.folder;
+  const HeldFolder& holder = step.look.Folder();
   const auto name = HFSNameOf(moment, step.look, names::kLongestStr255Name);
   if (!name) return name.Error();
   if (holder.Volume()->Number() != folder.Volume()->Number()) {

@@ -25,7 +25,7 @@ kernel::Result<Look> LookAgain(Moment& moment, const kernel::Item& reference,
   const std::string name(*foundation::LastComponent(path));
   auto look = moment.LookUp(*holder, name);
   if (!look) return look;
-  if (!IsItemOf(reference, look->seen, holder->SpotOf(name.c_str()))) {
+  if (!IsItemOf(reference, look->Seen(), look->Spot())) {
     return kernel::kNotThere;
   }
   return look;
@@ -146,7 +146,7 @@ std::optional<std::string> SearchFor(Moment& moment, const kernel::Item& referen
 
 void Remember(Moment& moment, const Sighting& seen) {
   const auto volume = moment.VolumeOf(seen);
-  moment.Knowledge().Remember(seen, volume ? volume->get() : nullptr);
+  moment.Knowledge().Remember(seen.item, seen.path, volume ? volume->get() : nullptr);
 }
 
 // Of an id that only one item can have the place where it was seen last, if it is still there.

@@ -25,6 +25,11 @@ bool MayBeALink(kernel::Error error) {
 
 }  // namespace
 
+Look::Look(HeldFolder folder, Sighting seen) {
+  const std::size_t nameAt = seen.path.rfind('/') + 1;
+  mState = std::make_shared<const State>(State{std::move(folder), std::move(seen), nameAt});
+}
+
 void Moment::Restart() {
   mClimb.reset();
   mLooks.clear();
@@ -148,7 +153,7 @@ kernel::Result<HeldFolder> Moment::Keep(std::string path, kernel::Descriptor des
   if (!volume) return volume.Error();
   if ((*volume)->NeedsHandleForID(place.item)) kernel::ReadProof(place.item, spot);
   HeldFolder held(std::move(place), std::move(descriptor), *std::move(volume));
-  mCatalog.Remember(held.Place(), held.Volume().get());
+  mCatalog.Remember(held.Item(), held.Path(), held.Volume().get());
   if (mHeld.size() < kMostHeld) mHeld.push_back({held, std::nullopt});
   return held;
 }
@@ -162,16 +167,14 @@ kernel::Result<HeldFolder> Moment::HoldHolderOf(const std::string& path) {
 }
 
 kernel::Result<HeldFolder> Moment::HoldFolderOf(const Look& folder) {
-  if (const HeldFolder* const held = HeldAt(folder.seen.path)) return *held;
-  const std::string name(*foundation::LastComponent(folder.seen.path));
-  auto descriptor = kernel::HoldFolderIn(folder.folder.SpotOf(name.c_str()));
+  if (const HeldFolder* const held = HeldAt(folder.Path())) return *held;
+  auto descriptor = kernel::HoldFolderIn(folder.Spot());
   if (!descriptor) return descriptor.Error();
-  return Keep(folder.seen.path, *std::move(descriptor));
+  return Keep(folder.Path(), *std::move(descriptor));
 }
 
 kernel::Result<HeldFolder> Moment::HoldTargetOf(const Look& link) {
-  const std::string name(*foundation::LastComponent(link.seen.path));
-  return HoldAtRealPath(kernel::HoldFollowing(link.folder.SpotOf(name.c_str())), link.seen.path);
+  return HoldAtRealPath(kernel::HoldFollowing(link.Spot()), link.Path());
 }
 
 // The folder that was found by following an absolute path, at its canonical path. A path that leads
@@ -194,22 +197,22 @@ kernel::Result<HeldFolder> Moment::HoldAtRealPath(kernel::Result<kernel::Descrip
 
 // --- Items --------------------------------------------------------------------------------------
 
-kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, const std::string& name) {
+kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, std::string_view name) {
   std::string path = foundation::JoinPath(folder.Path(), name);
   if (path.size() >= PATH_MAX) return kernel::Error{ENAMETOOLONG};
   for (const auto& [look, reference] : mLooks) {
-    if (look.seen.path == path && kernel::HaveSameNumbers(look.folder.Item(), folder.Item())) {
-      return look;
-    }
+    const bool isSame =
+        look.Path() == path && kernel::HaveSameNumbers(look.Folder().Item(), folder.Item());
+    if (isSame) return look;
   }
-  const kernel::Spot spot = folder.SpotOf(name.c_str());
-  const auto status = kernel::ReadStatus(spot);
+  const kernel::Spot spot = folder.SpotOf(path.c_str() + path.size() - name.size());
+  auto status = kernel::ReadStatus(spot);
   if (!status) return status.Error();
-  Look look{folder, {std::move(path), status->item}};
-  if (folder.Volume()->NeedsHandleForID(look.seen.item)) {
-    kernel::ReadProof(look.seen.item, spot);
-    if (look.seen.item.handle.size == 0) return kernel::kNotThere;
+  if (folder.Volume()->NeedsHandleForID(status->item)) {
+    kernel::ReadProof(status->item, spot);
+    if (status->item.handle.size == 0) return kernel::kNotThere;
   }
+  Look look(folder, {std::move(path), status->item});
   if (mLooks.size() < kMostLooks) mLooks.push_back({look, std::nullopt});
   return look;
 }
@@ -232,7 +235,7 @@ kernel::Result<Sighting> Moment::See(const std::string& path) {
 
 const Look* Moment::LookFor(const kernel::Item& reference) const {
   for (const auto& look : mLooks) {
-    const kernel::Item& known = look.reference.value_or(look.fact.seen.item);
+    const kernel::Item& known = look.reference.value_or(look.fact.Item());
     if (known.mount == reference.mount && kernel::IsProvedSame(known, reference)) {
       return &look.fact;
     }
@@ -243,11 +246,9 @@ const Look* Moment::LookFor(const kernel::Item& reference) const {
 // --- References ---------------------------------------------------------------------------------
 
 kernel::Item Moment::Prove(const Look& look) {
-  const std::string name(*foundation::LastComponent(look.seen.path));
-  const kernel::Item reference =
-      Proved(look.seen, *look.folder.Volume(), look.folder.SpotOf(name.c_str()));
+  const kernel::Item reference = Proved(look.Seen(), *look.Folder().Volume(), look.Spot());
   for (auto& known : mLooks) {
-    if (known.fact.seen.path == look.seen.path) known.reference = reference;
+    if (known.fact.Path() == look.Path()) known.reference = reference;
   }
   return reference;
 }

@@ -31,10 +31,30 @@
 
 namespace tallowmere::catalog {
 
-// An item seen under a name in a held folder.
-struct Look {
-  HeldFolder folder;
-  Sighting seen;
+// An item seen under a name in a held folder. Copies share it.
+class Look {
+ public:
+  // REQUIRES: the path of `seen` is that of the folder and one component more.
+  Look(HeldFolder folder, Sighting seen);
+
+  const HeldFolder& Folder() const { return mState->folder; }
+  const Sighting& Seen() const { return mState->seen; }
+  const std::string& Path() const { return mState->seen.path; }
+  const kernel::Item& Item() const { return mState->seen.item; }
+
+  // The last component of the path.
+  const char* Name() const { return Path().c_str() + mState->nameAt; }
+
+  // Where it was seen: the name in the folder.
+  kernel::Spot Spot() const { return Folder().SpotOf(Name()); }
+
+ private:
+  struct State {
+    HeldFolder folder;
+    Sighting seen;
+    std::size_t nameAt;
+  };
+  std::shared_ptr<const State> mState;
 };
 
 class Moment {
@@ -95,7 +115,7 @@ class Moment {
 
   // The item with a name in a held folder, its handle read where its id follows from it.
   // ENAMETOOLONG where no path could tell where it is.
-  kernel::Result<Look> LookUp(const HeldFolder& folder, const std::string& name);
+  kernel::Result<Look> LookUp(const HeldFolder& folder, std::string_view name);
 
   // The item at a path, links on the way followed, at its canonical path.
   kernel::Result<Sighting> See(const std::string& path);

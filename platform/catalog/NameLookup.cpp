@@ -1,5 +1,6 @@
 #include "catalog/NameLookup.h"
 
+#include <utility>
 #include <vector>
 
 #include "catalog/OwnNames.h"
@@ -30,14 +31,14 @@ bool IsItsAlone(Moment& moment, const std::vector<HeldFolder>& views, std::uint3
 // The first short form by which the item is found.
 kernel::Result<std::string> ShortFormOf(Moment& moment, const std::vector<HeldFolder>& views,
                                         const Look& item) {
-  const volumes::Volume& volume = *item.folder.Volume();
-  const std::string_view linuxName = *foundation::LastComponent(item.seen.path);
+  const volumes::Volume& volume = *item.Folder().Volume();
+  const std::string_view linuxName = item.Name();
   const std::uint32_t id = IDInShortForm(moment, item);
   for (std::size_t marks = 1; marks <= names::kMostMarks; ++marks) {
     std::string name = names::ShortHFSName(linuxName, id, marks);
     if (IsItsAlone(moment, views, id, name)) return name;
     const auto found = LookUpInViews(moment, views, name);
-    if (found && AreSame(volume, found->seen, item.seen)) return name;
+    if (found && AreSame(volume, found->Seen(), item.Seen())) return name;
     // Another short form would be one for now.
     if (!found && !IsMissing(found)) return found.Error();
   }
@@ -56,13 +57,14 @@ kernel::Result<Look> LookUpHFSName(Moment& moment, const HeldFolder& folder,
 }
 
 kernel::Result<std::string> HFSNameOf(Moment& moment, const Look& item, std::size_t limit) {
-  const std::string_view linuxName = *foundation::LastComponent(item.seen.path);
-  auto plain = names::PlainHFSName(linuxName, limit);
-  const bool isUnmistakable = plain && names::SpellHFSName(*plain).precomposed == linuxName;
-  if (isUnmistakable && HasOneView(item.folder)) return *std::move(plain);
-  const std::vector<HeldFolder> views = ViewsOf(moment, item.folder);
-  if (isUnmistakable && views.size() == 1) return *std::move(plain);
-  if (plain && HasOwnName(moment, views.front(), item.seen, limit)) return *std::move(plain);
+  const std::string_view linuxName = item.Name();
+  auto unmistakable = names::UnmistakableHFSName(linuxName, limit);
+  if (unmistakable && HasOneView(item.Folder())) return *std::move(unmistakable);
+  const std::vector<HeldFolder> views = ViewsOf(moment, item.Folder());
+  if (unmistakable && views.size() == 1) return *std::move(unmistakable);
+  if (HasOwnName(moment, views.front(), item.Seen(), limit)) {
+    return *names::PlainHFSName(linuxName, limit);
+  }
   return ShortFormOf(moment, views, item);
 }
 

@@ -48,7 +48,7 @@ bool HasOwnName(Moment& moment, const HeldFolder& folder, const Sighting& item, 
   const auto name = names::PlainHFSName(*foundation::LastComponent(item.path), limit);
   if (!name) return false;
   const auto found = FindByOwnName(moment, folder, *name);
-  return found && AreSame(*folder.Volume(), found->seen, item);
+  return found && AreSame(*folder.Volume(), found->Seen(), item);
 }
 
 }  // namespace tallowmere::catalog

@@ -34,10 +34,10 @@ bool EntriesMayDiffer(Moment& moment, const HeldFolder& folder) {
 }  // namespace
 
 std::uint32_t IDInShortForm(Moment& moment, const Look& item) {
-  const volumes::Volume& volume = *item.folder.Volume();
-  const bool isOnVolume = item.seen.item.mount == item.folder.Item().mount ||
-                          static_cast<bool>(moment.VolumeOf(item.seen));
-  return isOnVolume ? volume.IDOf(item.seen.item) : names::kNoVolumeID;
+  const volumes::Volume& volume = *item.Folder().Volume();
+  const bool isOnVolume = item.Item().mount == item.Folder().Item().mount ||
+                          static_cast<bool>(moment.VolumeOf(item.Seen()));
+  return isOnVolume ? volume.IDOf(item.Item()) : names::kNoVolumeID;
 }
 
 ShortFormSearch::ShortFormSearch(Moment& moment, const std::vector<HeldFolder>& views,
@@ -63,8 +63,8 @@ bool ShortFormSearch::CanStandForOne() const {
 }
 
 bool ShortFormSearch::IsShortFormOf(const names::ShortNameParts& parts, const Look& item) {
-  return StandsFor(parts, mName, NameOf(item.seen).c_str()) &&
-         !HasOwnName(mMoment, mViews.front(), item.seen, names::kLongestSpecName);
+  return StandsFor(parts, mName, NameOf(item.Seen()).c_str()) &&
+         !HasOwnName(mMoment, mViews.front(), item.Seen(), names::kLongestSpecName);
 }
 
 // Without reading the folder.
@@ -74,7 +74,7 @@ bool ShortFormSearch::FindByNumber(const names::ShortNameParts& parts) {
   if (!item) return false;
   for (const HeldFolder& view : mViews) {
     auto look = mMoment.LookUp(view, NameOf(*item));
-    if (!look || !AreSame(*volume, look->seen, *item)) continue;
+    if (!look || !AreSame(*volume, look->Seen(), *item)) continue;
     if (!IsShortFormOf(parts, *look)) return false;
     mFound.push_back(*std::move(look));
     return true;
@@ -113,7 +113,7 @@ void ShortFormSearch::Offer(const HeldFolder& view, const names::ShortNameParts&
   }
   if (IDInShortForm(mMoment, *item) != parts.nodeID) return;
   const bool isKnown = std::any_of(mFound.begin(), mFound.end(), [&](const Look& found) {
-    return AreSame(*view.Volume(), found.seen, item->seen);
+    return AreSame(*view.Volume(), found.Seen(), item->Seen());
   });
   if (!isKnown && IsShortFormOf(parts, *item)) mFound.push_back(*item);
 }

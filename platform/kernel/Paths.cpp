@@ -51,11 +51,13 @@ Result<Descriptor> Hold(const std::string& path, int flags) {
 bool IsNormalized(std::string_view path) {
   if (path == "/") return true;
   if (!path.starts_with('/')) return false;
-  while (!path.empty()) {
-    path.remove_prefix(1);
-    const auto name = path.substr(0, path.find('/'));
-    if (name.empty() || name == "." || name == "..") return false;
-    path.remove_prefix(name.size());
+  const std::size_t size = path.size();
+  for (std::size_t slash = 0; slash < size; slash = path.find('/', slash + 1)) {
+    // What begins behind the slash is neither empty nor "." nor "..".
+    const auto isEnd = [&](std::size_t at) { return at == size || path[at] == '/'; };
+    if (isEnd(slash + 1)) return false;
+    if (path[slash + 1] != '.') continue;
+    if (isEnd(slash + 2) || (path[slash + 2] == '.' && isEnd(slash + 3))) return false;
   }
   return true;
 }

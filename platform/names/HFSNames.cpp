@@ -79,6 +79,15 @@ std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t 
   return name;
 }
 
+std::optional<std::string> UnmistakableHFSName(std::string_view linuxName, std::size_t limit) {
+  // Most names are the same in both.
+  const bool isSame = IsAsciiName(linuxName) && linuxName.find(':') == std::string_view::npos;
+  if (isSame && linuxName.size() <= limit) return std::string(linuxName);
+  auto name = PlainHFSName(linuxName, limit);
+  if (name && SpellHFSName(*name).precomposed != linuxName) name.reset();
+  return name;
+}
+
 std::string ShortHFSName(std::string_view linuxName, std::uint32_t nodeID, std::size_t marks) {
   const std::u16string text = ExchangedText(linuxName);
   const std::string extension = KeptExtension(text);

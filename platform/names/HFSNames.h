@@ -21,6 +21,10 @@ inline constexpr std::size_t kLongestStr255Name = 255;
 // The name itself in HFS form, when Mac Roman has all of it and it takes at most `limit` bytes.
 std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t limit);
 
+// The plain HFS name by which this very Linux name is looked up first, so that no other item can be
+// found by it where the folder has this one.
+std::optional<std::string> UnmistakableHFSName(std::string_view linuxName, std::size_t limit);
+
 // What stands for a name that has no plain form, at most 31 bytes: as much of the name as fits, '?'
 // for what Mac Roman lacks, "#", the node id in capital hexadecimal, and the extension if it has
 // one of 1 to 5 characters that all can be encoded: "A very long name tha#1B4A3F.aif". Where an
