@@ -1,6 +1,7 @@
 #include "CFileRef.h"
 
 #include <AppKit/Workspace.h>
+#include <locale.h>
 #include <pwd.h>
 #include <strings.h>
 #include <sys/stat.h>
@@ -80,8 +81,10 @@ std::size_t LengthWithoutTrailingSlashes(char const* path) {
   return length;
 }
 
+// As in the POSIX locale, also called "C", whatever locale the program has chosen: it folds ASCII
+// alone. To have that locale takes no memory, and nothing is to be given back.
 bool EqualIgnoringCase(char const* first, char const* second, std::size_t length) {
-  return strncasecmp(first, second, length) == 0;
+  return strncasecmp_l(first, second, length, newlocale(LC_ALL_MASK, "C", nullptr)) == 0;
 }
 
 // What follows the last "." of a name; null without one.

@@ -1,11 +1,11 @@
 #include "foundation/Url.h"
 
-#include <strings.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <utility>
 
+#include "foundation/LetterCase.h"
 #include "foundation/PathText.h"
 #include "foundation/PercentEncoding.h"
 #include "foundation/UrlParts.h"
@@ -17,10 +17,6 @@ namespace {
 constexpr std::string_view kFileUrlStart = "file://";
 constexpr std::string_view kFileScheme = "file";
 constexpr std::string_view kThisMachine = "localhost";
-
-bool EqualIgnoringCase(std::string_view a, std::string_view b) {
-  return a.size() == b.size() && strncasecmp(a.data(), b.data(), a.size()) == 0;
-}
 
 std::string UrlTextOfAbsolutePath(std::string_view path) {
   return std::string(kFileUrlStart) + PercentEncodePath(path, false);
