@@ -1,6 +1,7 @@
 #include "CFileRef.h"
 
 #include <AppKit/Workspace.h>
+#include <locale.h>
 #include <pwd.h>
 #include <strings.h>
 #include <sys/stat.h>
@@ -80,8 +81,10 @@ std::size_t LengthWithoutTrailingSlashes(char const* path) {
   return length;
 }
 
+// As in the POSIX locale, also called "C", whatever locale the program has chosen: it folds ASCII
+// alone. To have that locale takes no memory, and nothing is to be given back.
 bool EqualIgnoringCase(char const* first, char const* second, std::size_t length) {
-  return strncasecmp(first, second, length) == 0;
+  return strncasecmp_l(first, second, length, newlocale(LC_ALL_MASK, "C", nullptr)) == 0;
 }
 
 // What follows the last "." of a name; null without one.
@@ -710,6 +713,11 @@ short CFileRef::GetVolumeRefNumber() const {
   FSRef item = {};
   if (CFURLGetFSRef(mURL, &item)) return VolumeOf(item);
   CFileRef root(*this);
+  if (root.GetPath() == nullptr) {
+    // What has no path can be in a folder that has one, unless all that was missing is memory.
+    root.SetToParent();
+    if (GetPath() != nullptr) return kNoVolume;
+  }
   while (root.ClimbToExisting()) {
     const std::optional<bool> isRoot = root.ReadIsRoot();
     if (!isRoot) return kNoVolume;
@@ -781,7 +789,7 @@ bool CFileRef::GetFSSpec(FSSpec* spec) const {
   }
   // What is there all the same is no new item: its record can have another name, or another folder.
   mode_t mode = 0;
-  if (ReadMode(GetPath(), &mode)) return false;
+  if (ReadMode(GetPath(), &mode) && !IsOfNoFile()) return false;
   CFileRef folder(*this);
   folder.SetToParent();
   FSCatalogInfo about = {};
@@ -794,6 +802,13 @@ bool CFileRef::GetFSSpec(FSSpec* spec) const {
   if (!name) return false;
   StoreName(name.Get(), spec);
   return true;
+}
+
+// Asked a second time, for the first time something may have been missing that looking took.
+bool CFileRef::IsOfNoFile() const {
+  CFileRef file;
+  file.Set(mURL, false);
+  return file.UpdateInternalFSRef() && !UpdateInternalFSRef();
 }
 
 CFileRef::operator FSSpec const&() const {

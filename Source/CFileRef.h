@@ -244,7 +244,8 @@ class CFileRef {
   // and the volume and id of what stands where its folder should (the empty ones when nothing
   // does); a file or a link there is not told from a folder. False, with the
   // record untouched, for an empty reference; false as well for an item that the catalog refuses
-  // and for a path without a last component.
+  // and for a path without a last component. A URL that is no file's, or another machine's, is that
+  // of an item that does not exist.
   bool GetFSSpec(FSSpec* spec) const;
 
   // The cached FSSpec, made anew with GetFSSpec(), whatever that says; valid like GetPath().
@@ -274,7 +275,8 @@ class CFileRef {
   bool HoldPathOf(CFURLRef url, bool isDirectory);
   bool FollowLink();
   std::optional<bool> ReadIsRoot() const;  // none when it cannot be looked at
-  bool ClimbToExisting();  // to the item itself if that exists; false, and empty, to none
+  bool IsOfNoFile() const;  // whether it is not this URL that names the item at its path
+  bool ClimbToExisting();   // to the item itself if that exists; false, and empty, to none
 
   CFURLRef mURL;           // one reference of ours; null when empty
   UInt32 mValid;           // 1 exactly when mURL is not null; the lowest bit counts

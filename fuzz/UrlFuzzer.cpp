@@ -95,7 +95,9 @@ void CheckUrl(std::string_view text) {
 void CheckBytes(std::string_view bytes) {
   Check(foundation::PercentDecode(bytes).size() <= bytes.size());
   for (const bool isStart : {false, true}) {
-    Check(foundation::PercentDecode(foundation::PercentEncodePath(bytes, isStart)) == bytes);
+    std::string text;
+    foundation::AppendPercentEncodedPath(text, bytes, isStart);
+    Check(foundation::PercentDecode(text) == bytes);
   }
   const std::string path = "/" + std::string(bytes);
   const OwnedUrl url(foundation::CreateUrlOfPath(path, false));

@@ -1,5 +1,4 @@
 #include <AppKit/Workspace.h>
-#include <strings.h>
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -7,6 +6,7 @@
 #include <string_view>
 
 #include "foundation/FileNameText.h"
+#include "foundation/LetterCase.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
 #include "foundation/String.h"
@@ -36,11 +36,9 @@ constexpr std::string_view kPackageExtensions[] = {
 constexpr std::string_view kPackageFiles[] = {"Contents/Info.plist", "Contents/PkgInfo"};
 
 bool IsPackageExtension(std::string_view extension) {
-  return std::any_of(std::begin(kPackageExtensions), std::end(kPackageExtensions),
-                     [extension](std::string_view known) {
-                       return known.size() == extension.size() &&
-                              strncasecmp(known.data(), extension.data(), known.size()) == 0;
-                     });
+  return std::any_of(
+      std::begin(kPackageExtensions), std::end(kPackageExtensions),
+      [extension](std::string_view known) { return EqualIgnoringCase(known, extension); });
 }
 
 bool IsFolder(const std::string& path) {

@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <cstdarg>
-#include <cstring>
 #include <exception>
 #include <limits>
 #include <new>
@@ -16,6 +15,7 @@
 #include "foundation/NoThrow.h"
 #include "foundation/PascalStrings.h"
 #include "foundation/String.h"
+#include "foundation/Utf16.h"
 
 namespace {
 
@@ -80,6 +80,15 @@ std::optional<std::u16string> Formatted(std::u16string_view format, va_list argu
   return text;
 }
 
+// Stores the bytes of a name and a NUL behind them. False, with the buffer untouched, when they do
+// not fit and when there is a NUL among them, which no name has.
+template <typename Char>
+bool StoreName(const std::basic_string<Char>& bytes, char* buffer, std::size_t capacity) {
+  if (bytes.size() >= capacity || bytes.find(Char{}) != bytes.npos) return false;
+  *std::copy(bytes.begin(), bytes.end(), buffer) = '\0';
+  return true;
+}
+
 }  // namespace
 
 // --- Encodings --------------------------------------------------------------------------------
@@ -112,8 +121,7 @@ CFStringRef __CFStringMakeConstantString(const char* utf8, unsigned char* room) 
     std::terminate();
   }
   if (!text) std::terminate();
-  const Object* const object = new (room) String(*std::move(text));
-  return reinterpret_cast<CFStringRef>(object);
+  return ReferenceTo(new (room) String(*std::move(text), false));
 }
 
 CFStringRef CFStringCreateWithCharacters(CFAllocatorRef, const UniChar* characters,
@@ -150,7 +158,7 @@ CFStringRef CFStringCreateWithFormat(CFAllocatorRef, CFDictionaryRef, CFStringRe
 }
 
 CFStringRef CFStringCreateCopy(CFAllocatorRef, CFStringRef string) {
-  return OrZero([&] { return CreateString(StringOf(string).Text()); });
+  return OrZero([&] { return ReferenceTo(CopyOf(StringOf(string)).release()); });
 }
 
 CFStringRef CFStringCreateWithSubstring(CFAllocatorRef, CFStringRef string, CFRange range) {
@@ -160,7 +168,7 @@ CFStringRef CFStringCreateWithSubstring(CFAllocatorRef, CFStringRef string, CFRa
 }
 
 CFMutableStringRef CFStringCreateMutableCopy(CFAllocatorRef, CFIndex, CFStringRef string) {
-  return OrZero([&] { return CreateString(StringOf(string).Text()); });
+  return OrZero([&] { return CreateMutableString(StringOf(string).Text()); });
 }
 
 // --- Changing ---------------------------------------------------------------------------------
@@ -174,19 +182,21 @@ CFIndex CFStringFindAndReplace(CFMutableStringRef string, CFStringRef wanted,
   const auto slice = Slice(string, range);
   const std::u16string& pattern = StringOf(wanted).Text();
   if (!slice || pattern.empty()) return 0;
+  auto at = slice->find(pattern);
+  if (at == slice->npos) return 0;
   return OrZero([&]() -> CFIndex {
     std::u16string& text = StringOf(string).Text();
-    std::u16string changed = text.substr(0, SizeOf(range.location));
+    std::u16string changed(text, 0, SizeOf(range.location));
     CFIndex count = 0;
     std::size_t copied = 0;
-    for (auto at = slice->find(pattern); at != slice->npos; at = slice->find(pattern, copied)) {
+    for (; at != slice->npos; at = slice->find(pattern, copied)) {
       changed += slice->substr(copied, at - copied);
       changed += StringOf(replacement).Text();
       copied = at + pattern.size();
       ++count;
     }
     changed += slice->substr(copied);
-    changed += text.substr(SizeOf(range.location) + slice->size());
+    changed.append(text, SizeOf(range.location) + slice->size());
     text = std::move(changed);
     return count;
   });
@@ -237,19 +247,20 @@ Boolean CFStringGetPascalString(CFStringRef string, StringPtr buffer, CFIndex ca
   if (found == nullptr || capacity < 1) return false;
   const std::u16string& text = StringOf(string).Text();
   const std::size_t room = std::min(SizeOf(capacity) - 1, kLongestPascalString);
-  const EncodedLength done = Encode(text, *found, 0, nullptr, room);
+  UInt8 encoded[kLongestPascalString];
+  const EncodedLength done = Encode(text, *found, 0, encoded, room);
   if (done.units < text.size()) return false;
-  Encode(text, *found, 0, buffer + 1, room);
+  std::copy_n(encoded, done.bytes, buffer + 1);
   buffer[0] = static_cast<unsigned char>(done.bytes);
   return true;
 }
 
 Boolean CFStringGetFileSystemRepresentation(CFStringRef string, char* buffer, CFIndex capacity) {
+  const std::u16string& text = StringOf(string).Text();
+  if (IsAllAscii(std::u16string_view(text))) return StoreName(text, buffer, SizeOf(capacity));
   return OrZero([&] {
-    const auto name = FileNameOfText(StringOf(string).Text());
-    if (!name || name->size() >= SizeOf(capacity) || name->find('\0') != name->npos) return false;
-    std::memcpy(buffer, name->c_str(), name->size() + 1);
-    return true;
+    const auto name = FileNameOfText(text);
+    return name && StoreName(*name, buffer, SizeOf(capacity));
   });
 }
 

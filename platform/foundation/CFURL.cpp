@@ -29,10 +29,9 @@ CFStringRef CreateFileNameString(const Bytes& name) {
   return CreateString(TextOfFileName(*name));
 }
 
+// Of a path in another style than POSIX.
 Bytes LinuxPath(const std::string& path, CFURLPathStyle style) {
   switch (style) {
-    case kCFURLPOSIXPathStyle:
-      return path;
     case kCFURLHFSPathStyle:
       return LinuxPathOfHfsPath(path);
     case kCFURLWindowsPathStyle:
@@ -42,10 +41,9 @@ Bytes LinuxPath(const std::string& path, CFURLPathStyle style) {
   }
 }
 
+// In another style than POSIX.
 Bytes PathInStyle(const std::string& path, bool folder, CFURLPathStyle style) {
   switch (style) {
-    case kCFURLPOSIXPathStyle:
-      return path;
     case kCFURLHFSPathStyle:
       return HfsPathOfLinuxPath(path, folder);
     case kCFURLWindowsPathStyle:
@@ -56,7 +54,15 @@ Bytes PathInStyle(const std::string& path, bool folder, CFURLPathStyle style) {
 }
 
 std::string_view EncodedPath(CFURLRef url) {
-  return SplitUrl(UrlOf(url).Text()).path;
+  return UrlOf(url).Parts().path;
+}
+
+// Another reference to the path of a URL; null when it has none.
+CFStringRef SharedPath(CFURLRef url) {
+  const String* const path = UrlOf(url).Path();
+  if (path == nullptr) return nullptr;
+  path->Retain();
+  return ReferenceTo(path);
 }
 
 Bytes DecodedLastComponent(CFURLRef url) {
@@ -76,6 +82,7 @@ CFURLRef CreateUrlWithPath(CFURLRef url, std::string_view path) {
 CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef, CFStringRef path, CFURLPathStyle style,
                                        Boolean isDirectory) {
   return OrZero([&]() -> CFURLRef {
+    if (style == kCFURLPOSIXPathStyle) return CreateUrlOfPath(StringOf(path), isDirectory);
     const auto bytes = FileNameOfText(StringOf(path).Text());
     if (!bytes) return nullptr;
     const auto linuxPath = LinuxPath(*bytes, style);
@@ -100,6 +107,7 @@ CFURLRef CFURLCreateWithBytes(CFAllocatorRef, const UInt8* bytes, CFIndex length
 
 CFStringRef CFURLCopyFileSystemPath(CFURLRef url, CFURLPathStyle style) {
   return OrZero([&]() -> CFStringRef {
+    if (style == kCFURLPOSIXPathStyle) return SharedPath(url);
     const auto path = PathOfUrl(url);
     if (!path) return nullptr;
     return CreateFileNameString(PathInStyle(*path, CFURLHasDirectoryPath(url), style));
@@ -107,13 +115,9 @@ CFStringRef CFURLCopyFileSystemPath(CFURLRef url, CFURLPathStyle style) {
 }
 
 CFStringRef CFURLCopyStrictPath(CFURLRef url, Boolean* isAbsolute) {
-  if (isAbsolute != nullptr) *isAbsolute = false;
-  return OrZero([&]() -> CFStringRef {
-    const auto path = PathOfUrl(url);
-    if (!path) return nullptr;
-    if (isAbsolute != nullptr) *isAbsolute = path->starts_with('/');
-    return CreateFileNameString(path);
-  });
+  const String* const path = UrlOf(url).Path();
+  if (isAbsolute != nullptr) *isAbsolute = path != nullptr && path->Text().starts_with(u'/');
+  return SharedPath(url);
 }
 
 // --- Components -------------------------------------------------------------------------------
@@ -147,10 +151,11 @@ CFURLRef CFURLCreateCopyAppendingPathComponent(CFAllocatorRef, CFURLRef url, CFS
   return OrZero([&]() -> CFURLRef {
     const auto bytes = FileNameOfText(StringOf(component).Text());
     if (!bytes) return nullptr;
-    const UrlParts parts = SplitUrl(UrlOf(url).Text());
+    const UrlParts& parts = UrlOf(url).Parts();
     // Behind an authority, an empty path is the root's.
     const std::string_view path = parts.path.empty() && parts.authority ? "/" : parts.path;
-    const std::string joined = JoinPath(path, PercentEncodePath(*bytes, path.empty()));
+    std::string joined = JoinPath(path, "");
+    AppendPercentEncodedPath(joined, *bytes, path.empty());
     return joined.empty() ? nullptr : CreateUrlWithPath(url, WithFolderMark(joined, isDirectory));
   });
 }

@@ -102,6 +102,7 @@ MacRomanStep NextMacRoman(std::u16string_view text) {
 }
 
 std::optional<std::string> EncodeMacRoman(std::u16string_view text) {
+  if (IsAllAscii(text)) return std::string(text.begin(), text.end());
   std::string bytes;
   bytes.reserve(text.size());
   while (!text.empty()) {
@@ -114,6 +115,7 @@ std::optional<std::string> EncodeMacRoman(std::u16string_view text) {
 }
 
 std::u16string DecodeMacRoman(std::string_view bytes) {
+  if (IsAllAscii(bytes)) return {bytes.begin(), bytes.end()};
   std::u16string text;
   text.reserve(bytes.size());
   for (const char byte : bytes) text.push_back(MacRomanToUnicode(static_cast<std::uint8_t>(byte)));

@@ -28,4 +28,9 @@ class Object {
   mutable std::atomic<CFIndex> mCount{1};
 };
 
+// Gives back one reference at the end of the pointer that holds it.
+struct ReleaseObject {
+  void operator()(const Object* object) const noexcept { object->Release(); }
+};
+
 }  // namespace tallowmere::foundation

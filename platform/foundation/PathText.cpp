@@ -24,10 +24,18 @@ bool IsDotOrDotDot(std::string_view component) {
 
 }  // namespace
 
-std::string WithFolderMark(std::string_view path, bool folder) {
-  if (folder) return std::string(path) + (path.ends_with('/') ? "" : "/");
+std::string_view WithoutFolderMark(std::string_view path) {
   const std::string_view trimmed = WithoutTrailingSlashes(path);
-  return std::string(trimmed.empty() ? path.substr(0, 1) : trimmed);
+  return trimmed.empty() ? path.substr(0, 1) : trimmed;
+}
+
+std::string WithFolderMark(std::string_view path, bool folder) {
+  std::string marked;
+  if (!folder) return marked.assign(WithoutFolderMark(path));
+  marked.reserve(path.size() + 1);
+  marked += path;
+  if (!path.ends_with('/')) marked += '/';
+  return marked;
 }
 
 std::optional<std::string_view> LastComponent(std::string_view path) {
@@ -55,8 +63,10 @@ std::string FolderOf(std::string_view path) {
 }
 
 std::string JoinPath(std::string_view path, std::string_view component) {
-  std::string joined(path);
-  if (!joined.empty() && !joined.ends_with('/')) joined.push_back('/');
+  std::string joined;
+  joined.reserve(path.size() + 1 + component.size());
+  joined += path;
+  if (!joined.empty() && !joined.ends_with('/')) joined += '/';
   return joined += component;
 }
 

@@ -14,6 +14,9 @@ namespace tallowmere::foundation {
 // itself. REQUIRES: the path is not empty.
 std::string WithFolderMark(std::string_view path, bool folder);
 
+// The path without "/" at its end, except for "/" itself.
+std::string_view WithoutFolderMark(std::string_view path);
+
 // The last component without the folder mark: "/a/b/" → "b", "/" → "/". None for an empty path.
 std::optional<std::string_view> LastComponent(std::string_view path);
 

@@ -1,45 +1,61 @@
 #include "foundation/PercentEncoding.h"
 
+#include <array>
 #include <cstdint>
+#include <limits>
 
 #include "foundation/UrlCharacters.h"
 
 namespace tallowmere::foundation {
+namespace {
 
-std::string PercentEncodePath(std::string_view bytes, bool firstSegmentIsUrlStart) {
-  constexpr char kDigits[] = "0123456789ABCDEF";
-  std::string text;
-  text.reserve(bytes.size());
-  bool colonIsPlain = !firstSegmentIsUrlStart;
-  for (const char c : bytes) {
-    if (c == '/') colonIsPlain = true;
-    if (c == '/' || (IsPathCharacter(c) && (c != ':' || colonIsPlain))) {
-      text.push_back(c);
-    } else {
-      const auto byte = static_cast<std::uint8_t>(c);
-      text.push_back('%');
-      text.push_back(kDigits[byte >> 4]);
-      text.push_back(kDigits[byte & 0xF]);
-    }
+// Which bytes of a path stand for themselves in a URL.
+constexpr auto kStandsForItself = [] {
+  std::array<bool, std::size_t{std::numeric_limits<std::uint8_t>::max()} + 1> does{};
+  for (std::size_t byte = 0; byte < does.size(); ++byte) {
+    const char c = static_cast<char>(byte);
+    does[byte] = c == '/' || IsPathCharacter(c);
   }
-  return text;
+  return does;
+}();
+
+void AppendEncodedByte(std::string& text, char c) {
+  constexpr char kDigits[] = "0123456789ABCDEF";
+  const auto byte = static_cast<std::uint8_t>(c);
+  text.append({'%', kDigits[byte >> 4], kDigits[byte & 0xF]});
+}
+
+}  // namespace
+
+void AppendPercentEncodedPath(std::string& text, std::string_view bytes,
+                              bool firstSegmentIsUrlStart) {
+  const std::size_t plainColons = firstSegmentIsUrlStart ? bytes.find('/') : 0;
+  std::size_t done = 0;
+  for (std::size_t i = 0; i < bytes.size(); ++i) {
+    const char c = bytes[i];
+    if (kStandsForItself[static_cast<std::uint8_t>(c)] && (c != ':' || i >= plainColons)) continue;
+    text.append(bytes, done, i - done);
+    AppendEncodedByte(text, c);
+    done = i + 1;
+  }
+  text.append(bytes, done);
 }
 
 std::string PercentDecode(std::string_view text) {
-  if (text.find('%') == text.npos) return std::string(text);
   std::string bytes;
   bytes.reserve(text.size());
-  for (std::size_t i = 0; i < text.size(); ++i) {
-    const int high = text[i] == '%' && text.size() - i > 2 ? HexValue(text[i + 1]) : -1;
-    const int low = high >= 0 ? HexValue(text[i + 2]) : -1;
+  std::size_t done = 0;
+  for (auto at = text.find('%'); at != text.npos; at = text.find('%', at)) {
+    const int high = text.size() - at > 2 ? HexValue(text[at + 1]) : -1;
+    const int low = high >= 0 ? HexValue(text[at + 2]) : -1;
     if (low < 0) {
-      bytes.push_back(text[i]);
-    } else {
-      bytes.push_back(static_cast<char>(high << 4 | low));
-      i += 2;
+      ++at;
+      continue;
     }
+    bytes.append(text, done, at - done).push_back(static_cast<char>(high << 4 | low));
+    done = at += 3;
   }
-  return bytes;
+  return bytes.append(text, done);
 }
 
 }  // namespace tallowmere::foundation

@@ -7,10 +7,11 @@
 
 namespace tallowmere::foundation {
 
-// The text of a path's bytes. What may stand for itself in a path does, "/" among it; every other
-// byte becomes "%" and two capital hexadecimal digits. With `firstSegmentIsUrlStart` a ":" before
-// the first "/" is encoded too, so that a relative path does not read as a scheme.
-std::string PercentEncodePath(std::string_view bytes, bool firstSegmentIsUrlStart);
+// Adds the text of a path's bytes. What may stand for itself in a path does, "/" among it; every
+// other byte becomes "%" and two capital hexadecimal digits. With `firstSegmentIsUrlStart` a ":"
+// before the first "/" is encoded too, so that a relative path does not read as a scheme.
+void AppendPercentEncodedPath(std::string& text, std::string_view bytes,
+                              bool firstSegmentIsUrlStart);
 
 // The bytes of a text. A "%" without two hexadecimal digits behind it stands for itself.
 std::string PercentDecode(std::string_view text);

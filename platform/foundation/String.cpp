@@ -15,9 +15,24 @@ String& StringOf(CFMutableStringRef reference) noexcept {
   return static_cast<String&>(*reinterpret_cast<Object*>(reference));
 }
 
-CFMutableStringRef CreateString(std::u16string text) {
-  Object* const object = new String(std::move(text));
+CFStringRef CreateString(std::u16string text) {
+  return ReferenceTo(new String(std::move(text), false));
+}
+
+CFMutableStringRef CreateMutableString(std::u16string text) {
+  Object* const object = new String(std::move(text), true);
   return reinterpret_cast<CFMutableStringRef>(object);
+}
+
+CFStringRef ReferenceTo(const String* string) noexcept {
+  const Object* const object = string;
+  return reinterpret_cast<CFStringRef>(object);
+}
+
+OwnedString CopyOf(const String& string) {
+  if (string.IsMutable()) return OwnedString(new String(string.Text(), false));
+  string.Retain();
+  return OwnedString(&string);
 }
 
 }  // namespace tallowmere::foundation

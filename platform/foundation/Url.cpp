@@ -1,14 +1,15 @@
 #include "foundation/Url.h"
 
-#include <strings.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <utility>
 
+#include "foundation/FileNameText.h"
+#include "foundation/LetterCase.h"
 #include "foundation/PathText.h"
 #include "foundation/PercentEncoding.h"
-#include "foundation/UrlParts.h"
+#include "foundation/Utf16.h"
 
 namespace tallowmere::foundation {
 namespace {
@@ -18,12 +19,15 @@ constexpr std::string_view kFileUrlStart = "file://";
 constexpr std::string_view kFileScheme = "file";
 constexpr std::string_view kThisMachine = "localhost";
 
-bool EqualIgnoringCase(std::string_view a, std::string_view b) {
-  return a.size() == b.size() && strncasecmp(a.data(), b.data(), a.size()) == 0;
-}
-
-std::string UrlTextOfAbsolutePath(std::string_view path) {
-  return std::string(kFileUrlStart) + PercentEncodePath(path, false);
+// The text of the URL of a path, absolute or relative, with or without the folder mark.
+std::string UrlTextOfPath(std::string_view path, bool folder) {
+  const bool isAbsolute = path.starts_with('/');
+  std::string text;
+  text.reserve(kFileUrlStart.size() + path.size() + 1);
+  if (isAbsolute) text += kFileUrlStart;
+  AppendPercentEncodedPath(text, folder ? path : WithoutFolderMark(path), !isAbsolute);
+  if (folder && !path.ends_with('/')) text += '/';
+  return text;
 }
 
 // The current directory, none when it has been removed or cannot be read.
@@ -37,11 +41,8 @@ std::optional<std::string> CurrentDirectory() {
   return path;
 }
 
-// The decoded path; none when the text has no path or it contains a NUL.
-std::optional<std::string> DecodedPath(std::string_view url) {
-  std::string path = PercentDecode(SplitUrl(url).path);
-  if (path.empty() || path.find('\0') != path.npos) return std::nullopt;
-  return path;
+bool HasNul(std::string_view path) {
+  return path.find('\0') != path.npos;
 }
 
 bool IsFileUrlOfThisMachine(const UrlParts& parts) {
@@ -50,10 +51,41 @@ bool IsFileUrlOfThisMachine(const UrlParts& parts) {
           EqualIgnoringCase(*parts.authority, kThisMachine));
 }
 
+CFURLRef ReferenceTo(const Url* url) noexcept {
+  const Object* const object = url;
+  return reinterpret_cast<CFURLRef>(object);
+}
+
+// The path as Url keeps it; null for none and for one with a NUL.
+OwnedString KeptPath(std::string_view path) {
+  if (path.empty() || HasNul(path)) return nullptr;
+  return OwnedString(new String(TextOfFileName(WithoutFolderMark(path)), false));
+}
+
+// `kept` has no folder mark. REQUIRES: the path is not empty.
+CFURLRef CreateUrlOfPath(std::string_view path, bool folder, OwnedString kept) {
+  std::string base;
+  if (!path.starts_with('/')) {
+    const auto directory = CurrentDirectory();
+    if (!directory) return nullptr;
+    base = UrlTextOfPath(*directory, true);
+  }
+  return ReferenceTo(new Url(UrlTextOfPath(path, folder), std::move(base), std::move(kept)));
+}
+
 }  // namespace
 
-Url::Url(std::string text, std::string base) noexcept
-    : mText(std::move(text)), mBase(std::move(base)) {}
+Url::Url(std::string text, std::string base)
+    : mText(std::move(text)),
+      mBase(std::move(base)),
+      mParts(SplitUrl(mText)),
+      mPath(KeptPath(PercentDecode(mParts.path))) {}
+
+Url::Url(std::string text, std::string base, OwnedString path) noexcept
+    : mText(std::move(text)),
+      mBase(std::move(base)),
+      mParts(SplitUrl(mText)),
+      mPath(std::move(path)) {}
 
 bool Url::Equals(const Object& other) const noexcept {
   const auto* url = dynamic_cast<const Url*>(&other);
@@ -65,24 +97,25 @@ const Url& UrlOf(CFURLRef reference) noexcept {
 }
 
 CFURLRef CreateUrl(std::string text, std::string base) {
-  const Object* const object = new Url(std::move(text), std::move(base));
-  return reinterpret_cast<CFURLRef>(object);
+  return ReferenceTo(new Url(std::move(text), std::move(base)));
 }
 
 CFURLRef CreateUrlOfPath(std::string_view path, bool folder) {
-  if (path.empty()) return nullptr;
-  const std::string marked = WithFolderMark(path, folder);
-  if (marked.starts_with('/')) return CreateUrl(UrlTextOfAbsolutePath(marked), "");
-  const auto directory = CurrentDirectory();
-  if (!directory) return nullptr;
-  return CreateUrl(PercentEncodePath(marked, true),
-                   UrlTextOfAbsolutePath(WithFolderMark(*directory, true)));
+  return path.empty() ? nullptr : CreateUrlOfPath(path, folder, KeptPath(path));
+}
+
+// A string of ASCII without NUL or mark is kept itself: what its bytes read as is the same.
+CFURLRef CreateUrlOfPath(const String& path, bool folder) {
+  const auto bytes = FileNameOfText(path.Text());
+  if (!bytes || bytes->empty()) return nullptr;
+  const bool isKept = IsAllAscii(std::string_view(*bytes)) && !HasNul(*bytes) &&
+                      WithoutFolderMark(*bytes).size() == bytes->size();
+  return CreateUrlOfPath(*bytes, folder, isKept ? CopyOf(path) : KeptPath(*bytes));
 }
 
 std::optional<std::string> PathOfUrl(CFURLRef url) {
-  const auto path = DecodedPath(UrlOf(url).Text());
-  if (!path) return std::nullopt;
-  return WithFolderMark(*path, false);
+  const String* const path = UrlOf(url).Path();
+  return path == nullptr ? std::nullopt : FileNameOfText(path->Text());
 }
 
 std::optional<std::string> AbsolutePathOfUrl(CFURLRef url) {
@@ -90,12 +123,10 @@ std::optional<std::string> AbsolutePathOfUrl(CFURLRef url) {
   auto path = PathOfUrl(url);
   if (!path) return std::nullopt;
   if (object.Base().empty()) {
-    const bool names = path->starts_with('/') && IsFileUrlOfThisMachine(SplitUrl(object.Text()));
-    return names ? path : std::nullopt;
+    const bool names = path->starts_with('/') && IsFileUrlOfThisMachine(object.Parts());
+    return names ? std::move(path) : std::nullopt;
   }
-  const auto base = DecodedPath(object.Base());
-  if (!base) return std::nullopt;
-  return JoinPath(*base, *path);
+  return JoinPath(PercentDecode(SplitUrl(object.Base()).path), *path);
 }
 
 }  // namespace tallowmere::foundation

@@ -37,7 +37,9 @@ UrlParts SplitUrl(std::string_view url) {
 std::string WithPath(std::string_view url, std::string_view path) {
   const UrlParts parts = SplitUrl(url);
   const auto pathStart = static_cast<std::size_t>(parts.path.data() - url.data());
-  std::string result(url.substr(0, pathStart));
+  std::string result;
+  result.reserve(url.size() + path.size());
+  result += url.substr(0, pathStart);
   if (!parts.authority && path.starts_with(kAuthorityMark)) result += "/.";
   result += path;
   result += url.substr(pathStart + parts.path.size());

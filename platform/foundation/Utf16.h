@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <string>
 #include <string_view>
+#include <type_traits>
 
 namespace tallowmere::foundation {
 
@@ -14,6 +15,17 @@ constexpr char32_t kFirstSupplementary = 0x10000;
 constexpr bool IsAscii(char16_t unit) {
   return unit < 0x80;
 }
+
+// Whether a text, in bytes or in UTF-16, is of ASCII alone, as most names are: then its characters
+// are the same in every encoding of a name. Looks at all of it, which the compiler makes several
+// characters at a time.
+template <typename Char>
+constexpr bool IsAllAscii(std::basic_string_view<Char> text) {
+  char32_t bits = 0;
+  for (const Char character : text) bits |= static_cast<std::make_unsigned_t<Char>>(character);
+  return bits < 0x80;
+}
+
 constexpr bool IsHighSurrogate(char16_t unit) {
   return unit >= kFirstHighSurrogate && unit <= 0xDBFF;
 }

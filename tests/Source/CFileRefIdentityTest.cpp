@@ -140,6 +140,19 @@ TEST_F(Identity, AMissingItemBelowDotsThatExistIsOnTheirVolume) {
   EXPECT_EQ(missing.GetVolumeRefNumber(), mFolderRef.GetVolumeRefNumber());
 }
 
+TEST_F(Identity, OfANameWithANULIsTheVolumeOfItsFolder) {
+  CFileRef ref;
+  ASSERT_TRUE(ref.SetFromURLString("file://" + mFolder.Path().string() + "/a%00b"));
+  EXPECT_EQ(ref.GetVolumeRefNumber(), mFolderRef.GetVolumeRefNumber());
+  EXPECT_NE(ref.GetVolumeRefNumber(), kNoVolume);
+}
+
+TEST_F(Identity, BelowANameWithANULIsNone) {
+  CFileRef ref;
+  ASSERT_TRUE(ref.SetFromURLString("file://" + mFolder.Path().string() + "/a%00b/c"));
+  EXPECT_EQ(ref.GetVolumeRefNumber(), kNoVolume);
+}
+
 TEST_F(Identity, OfPathsOf65535BytesIsFoundByClimbing) {
   std::string deep(65535, '/');
   for (std::size_t i = 1; i < deep.size(); i += 2) deep[i] = 'a';

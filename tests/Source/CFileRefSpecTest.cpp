@@ -83,12 +83,18 @@ TEST_F(SpecOfReference, AMissingFileInAMissingFolderHasItsNameAlone) {
   EXPECT_TRUE(IsZero(CachedFSRefOf(missing)));
 }
 
-TEST_F(SpecOfReference, WhatIsThereButNotByAFileURLHasNone) {
-  for (const std::string& path : {mData->MakeFile("file"), mData->MakeFolder("folder")}) {
-    CFileRef item;
-    ASSERT_TRUE(item.SetFromURLString("http://elsewhere" + path));
-    FSSpec spec = Untouched();
-    EXPECT_FALSE(item.GetFSSpec(&spec)) << path;
+TEST_F(SpecOfReference, AURLThatIsNoFilesHasTheRecordOfAMissingItemAtItsPath) {
+  mData->MakeFolder("Work/folder");
+  mData->MakeFile("Work/file");
+  for (const std::string start : {"http://elsewhere", "file://elsewhere", "http:"}) {
+    for (const std::string name : {"file", "folder", "missing"}) {
+      CFileRef item;
+      ASSERT_TRUE(item.SetFromURLString(start + mData->Path("Work/" + name)));
+      FSSpec spec = Untouched();
+      EXPECT_TRUE(item.GetFSSpec(&spec)) << start << " " << name;
+      EXPECT_EQ(FieldsOf(spec),
+                (Fields{mData->Number(), mData->Ref("Work").GetDirectoryID(), name}));
+    }
   }
 }
 

@@ -13,6 +13,7 @@ namespace {
 
 using foundation::test::FailAllocationsAfter;
 using foundation::test::FailNoAllocation;
+using foundation::test::FailOneAllocationAfter;
 using foundation::test::LiveAllocations;
 
 // As many allocations as the operations need, once they have run.
@@ -93,6 +94,26 @@ TEST_F(BridgeWithoutMemory, MakesAnItemsRecordOrNone) {
             EXPECT_EQ(FieldsOf(spec), FieldsOf(whole));
           }
         });
+  }
+}
+
+// Its name is too long for a record: a new item's would be cut.
+TEST_F(BridgeWithoutMemory, MakesNoNewItemsRecordOfOneThatIsThere) {
+  const std::string name(70, 'n');
+  mData->MakeFile(name);
+  const CFileRef item = mData->Ref(name);
+  FSSpec whole;
+  ASSERT_TRUE(item.GetFSSpec(&whole));
+  for (long n = 0; n <= kEnough; ++n) {
+    const CFileRef ref(item);
+    FSSpec spec;
+    FailOneAllocationAfter(n);
+    const bool made = ref.GetFSSpec(&spec);
+    FailNoAllocation();
+    EXPECT_TRUE(made || n < kEnough);
+    if (made) {
+      EXPECT_EQ(FieldsOf(spec), FieldsOf(whole)) << n;
+    }
   }
 }
 

@@ -68,15 +68,15 @@ TEST_P(OfARequest, AreNoMoreThanThese) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Allocations, OfARequest,
-                         testing::ValuesIn(std::to_array<Allocations>({{1, 110},
-                                                                       {2, 60},
+                         testing::ValuesIn(std::to_array<Allocations>({{1, 70},
+                                                                       {2, 39},
                                                                        {3, 0},
                                                                        {4, 0},
-                                                                       {5, 39},
-                                                                       {6, 82},
-                                                                       {7, 26},
-                                                                       {8, 35},
-                                                                       {9, 28},
+                                                                       {5, 16},
+                                                                       {6, 31},
+                                                                       {7, 15},
+                                                                       {8, 21},
+                                                                       {9, 15},
                                                                        {10, 25}})),
                          [](const auto& row) { return "Code" + std::to_string(row.param.code); });
 

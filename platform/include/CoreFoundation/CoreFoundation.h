@@ -90,7 +90,7 @@ CFIndex CFStringGetMaximumSizeForEncoding(CFIndex length, CFStringEncoding encod
     static const CFStringRef sConstant = __CFStringMakeConstantString("" literal "", sRoom); \
     return sConstant;                                                                        \
   }())
-enum { __kCFConstantStringSize = 48 };  // bytes
+enum { __kCFConstantStringSize = 56 };  // bytes
 CFStringRef __CFStringMakeConstantString(const char* utf8, unsigned char* room);
 
 // The string of `length` UTF-16 units.

@@ -6,6 +6,7 @@
 
 #include "platform/foundation/TestStrings.h"
 #include "support/TemporaryFolder.h"
+#include "support/TurkishLocale.h"
 
 namespace tallowmere::test {
 namespace {
@@ -47,6 +48,13 @@ TEST_F(APackage, IsToldByItsExtensionInAnyLetterCase) {
   mFolder.MakeFolder("x.RTFD");
   EXPECT_TRUE(IsPackageHere("x.App"));
   EXPECT_TRUE(IsPackageHere("x.RTFD"));
+}
+
+TEST_F(APackage, IsToldByItsExtensionInTurkishToo) {
+  const TurkishLocale locale;
+  if (!locale.IsChosen()) GTEST_SKIP() << "the C library's locales cannot be made here";
+  mFolder.MakeFolder("x.IBPLUGIN");
+  EXPECT_TRUE(IsPackageHere("x.IBPLUGIN"));
 }
 
 TEST_F(APackage, IsAFolderThatHoldsAPropertyList) {

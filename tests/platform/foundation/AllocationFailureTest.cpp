@@ -44,9 +44,10 @@ TEST_F(AllocationFailure, GivesNoString) {
                                                kCFStringEncodingMacRoman);
             }),
             2);
-  EXPECT_GE(
-      FailEachAllocation([this] { return CFStringCreateCopy(kCFAllocatorDefault, mName.Get()); }),
-      2);
+  const CFOwned changing(CFStringCreateMutableCopy(kCFAllocatorDefault, 0, mName.Get()));
+  EXPECT_GE(FailEachAllocation(
+                [&changing] { return CFStringCreateCopy(kCFAllocatorDefault, changing.Get()); }),
+            2);
   EXPECT_GE(FailEachAllocation(
                 [this] { return CFStringCreateMutableCopy(kCFAllocatorDefault, 0, mName.Get()); }),
             2);
@@ -110,8 +111,7 @@ TEST_F(AllocationFailure, GivesNoEditedUrl) {
 
 TEST_F(AllocationFailure, GivesNoPathAndNoComponent) {
   for (const CFURLRef url : {mUrl.Get(), mRelativeUrl.Get()}) {
-    for (const CFURLPathStyle style :
-         {kCFURLPOSIXPathStyle, kCFURLHFSPathStyle, kCFURLWindowsPathStyle}) {
+    for (const CFURLPathStyle style : {kCFURLHFSPathStyle, kCFURLWindowsPathStyle}) {
       EXPECT_GE(FailEachAllocation([url, style] { return CFURLCopyFileSystemPath(url, style); }),
                 2);
     }
@@ -120,13 +120,17 @@ TEST_F(AllocationFailure, GivesNoPathAndNoComponent) {
   }
 }
 
-TEST_F(AllocationFailure, GivesNoStrictPathWhichIsNotAbsolute) {
-  Boolean isAbsolute = true;
+TEST_F(AllocationFailure, DoesNotReachThePathOfAUrlNorACopyOfWhatCannotChange) {
+  Boolean isAbsolute = false;
   FailAllocationsAfter(0);
-  const CFStringRef path = CFURLCopyStrictPath(mUrl.Get(), &isAbsolute);
+  const CFOwned path(CFURLCopyStrictPath(mUrl.Get(), &isAbsolute));
+  const CFOwned samePath(CFURLCopyFileSystemPath(mUrl.Get(), kCFURLPOSIXPathStyle));
+  const CFOwned name(CFStringCreateCopy(kCFAllocatorDefault, mName.Get()));
   FailNoAllocation();
-  EXPECT_EQ(path, nullptr);
-  EXPECT_FALSE(isAbsolute);
+  EXPECT_EQ(NameOf(path.Get()), kLongName);
+  EXPECT_EQ(path.Get(), samePath.Get());
+  EXPECT_TRUE(isAbsolute);
+  EXPECT_EQ(name.Get(), mName.Get());
 }
 
 TEST_F(AllocationFailure, LeavesAMutableStringAsItWas) {

@@ -112,6 +112,21 @@ TEST(CFURLPath, IsPercentDecoded) {
   EXPECT_EQ(PathOf(ParseUrl("file:///a%20%c3%A9%ff")), "/a \xC3\xA9\xFF");
 }
 
+TEST(CFURLPath, EscapedBytesThatAreUtf8TogetherAreReadAsThat) {
+  const CFOwned url(CFURLCreateWithFileSystemPath(
+      kCFAllocatorDefault, MakeString(u"/\xDCC3\xDCA9").Get(), kCFURLPOSIXPathStyle, 0));
+  const CFOwned path(CFURLCopyFileSystemPath(url.Get(), kCFURLPOSIXPathStyle));
+  EXPECT_EQ(TextOf(path.Get()), u"/\u00E9");
+}
+
+TEST(CFURLPath, IsThatOfTheMomentWhenItsStringCanChange) {
+  const CFOwned string(CFStringCreateMutableCopy(kCFAllocatorDefault, 0, MakeName("/a").Get()));
+  const CFOwned url(
+      CFURLCreateWithFileSystemPath(kCFAllocatorDefault, string.Get(), kCFURLPOSIXPathStyle, 0));
+  CFStringAppend(string.Get(), CFSTR("b"));
+  EXPECT_EQ(PathOf(url), "/a");
+}
+
 TEST(CFURLPath, EncodedNulHasNoPath) {
   const auto url = ParseUrl("file:///a%00b");
   for (const CFURLPathStyle style :

@@ -46,7 +46,9 @@ TEST(UrlParts, PathThatWouldReadAsAnAuthorityDoesNot) {
 }
 
 TEST(PercentEncoding, UsesCapitalDigits) {
-  EXPECT_EQ(PercentEncodePath("\xAB\x0F", false), "%AB%0F");
+  std::string text;
+  AppendPercentEncodedPath(text, "\xAB\x0F", false);
+  EXPECT_EQ(text, "%AB%0F");
 }
 
 TEST(PercentEncoding, DecodesBothLetterCases) {
