@@ -16,8 +16,12 @@ constexpr std::uint32_t kHighestUpper = 0xFFFFFFEF;
 constexpr std::uint64_t kHighestSmallNumber = kLowestOwnNumber - 1;
 constexpr std::uint32_t kHighestID = kHighestUpper + kHighestSmallNumber;
 
-// Folding keeps the lowest 31 bits, and moves down what would be among the numbers 1 to 15.
+// Folding keeps the lowest 31 bits, but for each 2^31 in the number beyond the first it shifts
+// them: the groups of a large xfs volume begin at multiples of 2^31 and number their items alike.
+// The shift is the golden ratio of 2^31, which keeps any few of them well apart. Then what would be
+// among the numbers 1 to 15 is moved down.
 constexpr std::uint64_t kFold = std::uint64_t{1} << 31;
+constexpr std::uint64_t kShift = 0x1E3779B1;
 constexpr std::uint32_t kMovedDown = 0x10;
 
 // 256 is the first id of a btrfs subvolume: BTRFS_FIRST_FREE_OBJECTID in <linux/btrfs_tree.h>.
@@ -49,9 +53,20 @@ bool HasOwnNumber(const ItemNumbers& item, const NodeIDRule& rule) {
   return IsOnRootsDevice(item, rule) && item.inode > 0 && item.inode <= kHighestOwnNumber;
 }
 
+std::uint64_t ShiftOf(std::uint64_t fold) {
+  return (fold - 1) * kShift;
+}
+
+// REQUIRES: the number is above kHighestOwnNumber.
 std::uint32_t Fold(std::uint64_t inode) {
-  const auto folded = static_cast<std::uint32_t>(kLowestUpper + inode % kFold);
+  const std::uint64_t kept = (inode + ShiftOf(inode / kFold)) % kFold;
+  const auto folded = static_cast<std::uint32_t>(kLowestUpper + kept);
   return folded > kHighestUpper ? folded - kMovedDown : folded;
+}
+
+// The number that has those 31 bits after its shift.
+std::uint64_t Unfold(std::uint64_t kept, std::uint64_t fold) {
+  return fold * kFold + (kept - ShiftOf(fold)) % kFold;
 }
 
 bool HasPlace(std::uint64_t subvolume, std::uint64_t inode) {
@@ -77,20 +92,22 @@ std::uint32_t UpperID(const ItemNumbers& item, const NodeIDRule& rule) {
 
 using Candidates = std::vector<Candidate>;
 
-// The numbers on the root folder's device up to the highest whose lowest 31 bits fold into the id.
+// The numbers on the root folder's device up to the highest that are folded into the id.
 std::optional<Candidates> FoldedInto(std::uint32_t id, std::uint64_t rootInode,
                                      std::uint64_t highestInode) {
-  const std::uint64_t lowest = id;
-  const std::uint64_t movedDown = lowest + kMovedDown;
   const std::uint64_t folds = highestInode / kFold;  // each with two candidates at most
   if (folds > kMostCandidates / 2) return std::nullopt;
-  Candidates candidates;
-  for (std::uint64_t inode = lowest; inode <= highestInode; inode += kFold) {
-    candidates.push_back({inode, 0});
-    const std::uint64_t other = inode - lowest + movedDown;
-    if (Fold(other) == id && other <= highestInode) candidates.push_back({other, 0});
+  std::vector<std::uint64_t> inodes;
+  for (std::uint64_t fold = 1; fold <= folds; ++fold) {
+    inodes.push_back(Unfold(id, fold));
+    const std::uint64_t movedDown = Unfold(std::uint64_t{id} + kMovedDown, fold);
+    if (Fold(movedDown) == id) inodes.push_back(movedDown);
   }
-  std::erase(candidates, Candidate{rootInode, 0});
+  std::sort(inodes.begin(), inodes.end());
+  Candidates candidates;
+  for (const std::uint64_t inode : inodes) {
+    if (inode <= highestInode && inode != rootInode) candidates.push_back({inode, 0});
+  }
   return candidates;
 }
 

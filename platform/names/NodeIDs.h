@@ -8,8 +8,9 @@
 //   the volume's root folder                            kRootFolderID
 //   root folder's device, number 16 to 0x7FFFFFFF       the number
 //   root folder's device, number 1 to 15                0xFFFFFFEF + the number
-//   kFolded, number above 0x7FFFFFFF                    0x80000000 + its lowest 31 bits, 0x10 less
-//                                                       where that is above 0xFFFFFFEF
+//   kFolded, number above 0x7FFFFFFF                    0x80000000 + the lowest 31 bits of: number
+//                                                       + 0x1E3779B1 * (number / 2^31 - 1); 0x10
+//                                                       less where that is above 0xFFFFFFEF
 //   kSubvolumes, another subvolume than the root        0x80000000 + (subvolume - 256) * 2^22 + the
 //   folder's: subvolume 256 to 639, number below 2^22   number
 //   kSubvolumes, everything else                        mixed: 0xE0000000 to 0xFFFFFFEF
@@ -35,7 +36,7 @@ enum class UpperIDs : std::uint8_t {
 
 // What the kernel says of an item.
 struct ItemNumbers {
-  std::uint64_t inode;
+  std::uint64_t inode;  // 0 is no item's where numbers tell items apart
   std::uint64_t device;
   std::uint64_t subvolume;  // 0 where nobody asked; see NeedsSubvolume
 

@@ -1,0 +1,41 @@
+// What holds for a process that has fewer privileges than the test.
+#pragma once
+
+#include <linux/capability.h>
+#include <sys/syscall.h>
+#include <sys/types.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+namespace tallowmere::test {
+
+// Whether `work` says true in a child process, after `prepare` did.
+template <class Prepare, class Work>
+bool HoldsInChild(Prepare prepare, Work work) {
+  const pid_t child = fork();
+  if (child == 0) _exit(prepare() && work() ? 0 : 1);
+  int status = 0;
+  return waitpid(child, &status, 0) == child && WIFEXITED(status) && WEXITSTATUS(status) == 0;
+}
+
+// Whether `work` says true in a child process that has no privileges.
+template <class Work>
+bool HoldsForNobody(Work work) {
+  constexpr uid_t kNobody = 65534;
+  return HoldsInChild([] { return setresuid(kNobody, kNobody, kNobody) == 0; }, work);
+}
+
+// Whether `work` says true in a child process that lacks a privilege below 32: CAP_SYS_ADMIN, ….
+template <class Work>
+bool HoldsWithout(unsigned capability, Work work) {
+  const auto giveUp = [capability] {
+    __user_cap_header_struct header{_LINUX_CAPABILITY_VERSION_3, 0};
+    __user_cap_data_struct sets[_LINUX_CAPABILITY_U32S_3] = {};
+    if (syscall(SYS_capget, &header, sets) != 0) return false;
+    sets[0].effective &= ~(1U << capability);
+    return syscall(SYS_capset, &header, sets) == 0;
+  };
+  return HoldsInChild(giveUp, work);
+}
+
+}  // namespace tallowmere::test
