@@ -1,0 +1,349 @@
+#include "catalog/VolumeWalk.h"
+
+#include <algorithm>
+#include <iterator>
+#include <utility>
+
+#include "foundation/PathText.h"
+#include "kernel/Clock.h"
+#include "kernel/Paths.h"
+
+namespace tallowmere::catalog {
+namespace {
+
+// A change this recent may be followed by another with the same time: file systems count in ticks,
+// of two seconds at the coarsest (FAT).
+constexpr std::uint64_t kCoarsestTick = 2'000'000'000;
+
+constexpr std::size_t kMostOpenFolders = 16;
+
+constexpr std::uint32_t kLinksWithoutSubfolders = 2;
+
+}  // namespace
+
+VolumeWalk::VolumeWalk(const volumes::Volume& volume, const volumes::Volumes& volumes,
+                       KnownFolders& known, Question& question)
+    : mVolume(volume), mVolumes(volumes), mKnown(known), mTree(known.tree), mQuestion(question) {
+  ++mKnown.walks;
+}
+
+void VolumeWalk::LookAtKnown() {
+  for (const FolderNumber folder : mTree.WithID(mQuestion.ID())) {
+    const std::string path = mTree.PathOf(folder);
+    if (path.empty() || !mVolumes.IsReachable(mVolume.Listed(), path)) continue;
+    const kernel::Spot spot = kernel::AtPath(path.c_str());
+    const auto status = kernel::ReadStatus(spot);
+    if (!status || !mTree.IsSame(folder, status->item)) continue;
+    mQuestion.Offer(status->item, mTree[folder].id, spot, [&] { return path; });
+  }
+}
+
+// `start`, the folders above it, and the volume's places. Those alone where folders are known by
+// their places: a whole path would be another one.
+std::vector<std::string> VolumeWalk::StartsFrom(const std::string& start) const {
+  const auto& mountPoints = mVolume.Listed().MountPoints();
+  if (!mVolume.NumbersTellItemsApart()) return mountPoints;
+  const auto isMountPoint = [&](const std::string& path) {
+    return std::find(mountPoints.begin(), mountPoints.end(), path) != mountPoints.end();
+  };
+  std::vector<std::string> starts;
+  for (std::string path = start;; path = foundation::FolderOf(path)) {
+    starts.push_back(path);
+    if (path == "/" || isMountPoint(path)) break;
+  }
+  starts.insert(starts.end(), mountPoints.begin(), mountPoints.end());
+  return starts;
+}
+
+void VolumeWalk::Walk(const std::string& start) {
+  std::vector<FolderPlace> left = std::exchange(mKnown.waiting, {});
+  for (const std::string& path : StartsFrom(start)) {
+    Visit({kNoParent, path});
+    VisitWaiting();
+    if (mQuestion.IsSettled()) return PutBack(std::move(left));
+  }
+  mKnown.waiting = std::move(left);
+  VisitWaiting();
+  if (!mQuestion.IsSettled() && mQuestion.HasSeenAll()) mKnown.isWhole = true;
+}
+
+// After a walk that stopped: what was left before still waits, and what was found in folders that
+// were read anew, once. The rest is known.
+void VolumeWalk::PutBack(std::vector<FolderPlace> left) {
+  const auto isNews = [this](const FolderPlace& place) {
+    return place.parent != kNoParent && mTree[place.parent].read == mKnown.walks;
+  };
+  auto& waiting = mKnown.waiting;
+  std::erase_if(left, isNews);
+  std::erase_if(waiting, [&](const FolderPlace& place) { return !isNews(place); });
+  if (left.empty()) return;
+  ReserveFor(left, waiting.size());
+  std::move(waiting.begin(), waiting.end(), std::back_inserter(left));
+  waiting = std::move(left);
+}
+
+void VolumeWalk::VisitWaiting() {
+  while (!mKnown.waiting.empty() && !mQuestion.IsSettled()) {
+    const FolderPlace next = std::move(mKnown.waiting.back());
+    mKnown.waiting.pop_back();
+    Visit(next);
+  }
+}
+
+void VolumeWalk::Visit(const FolderPlace& place) {
+  const auto spot = SpotOf(place);
+  if (!spot) return Invalidate(place.parent);
+  kernel::Descriptor descriptor;
+  if (!mVolume.Kind().countsSubfolders) {
+    if (auto opened = OpenToRead(*spot)) descriptor = *std::move(opened);
+  }
+  const auto status =
+      kernel::ReadStatus(descriptor.IsOpen() ? kernel::AtOpen(descriptor.Get()) : *spot);
+  if (!status) {
+    mQuestion.NoteError(status.Error());
+    return Invalidate(place.parent);
+  }
+  if (!kernel::IsFolder(status->item)) return;
+  if (!IsOfVolume(status->item, place)) {
+    mQuestion.NoteCovered();
+    return Invalidate(place.parent);
+  }
+  VisitFolder({place, *spot, std::move(descriptor), *status});
+}
+
+// Where to look for the folder. Nullopt where something is mounted, and where the parent cannot be
+// entered.
+std::optional<kernel::Spot> VolumeWalk::SpotOf(const FolderPlace& place) {
+  if (place.parent == kNoParent) return kernel::AtPath(place.name.c_str());
+  if (!EnterFolder(place.parent)) return std::nullopt;
+  const OpenFolder& parent = mOpen.back();
+  if (parent.holdsMountPoint && mVolumes.IsMountPoint(mTree.PathOf(place))) {
+    mQuestion.NoteCovered();
+    return std::nullopt;
+  }
+  return kernel::Spot{parent.descriptor.Get(), place.name.c_str()};
+}
+
+// Whether a folder that was come upon belongs to the walk: at a start it is on the volume, further
+// down on the mount of its parent. What is mounted on the way has starts of its own.
+bool VolumeWalk::IsOfVolume(const kernel::Item& item, const FolderPlace& place) const {
+  if (place.parent == kNoParent) {
+    const auto volume = mVolumes.OfItem(item, place.name);
+    return volume && volume->Number() == mVolume.Number();
+  }
+  if (item.mount == kernel::kNoMount) return item.device == mVolume.Root().device;
+  return item.mount == mTree.RegionOf(place.parent).mount;
+}
+
+void VolumeWalk::VisitFolder(Visited visited) {
+  kernel::Item& item = visited.status.item;
+  const auto id = IDOf(item, visited.place.parent, visited.spot);
+  if (!id) return Invalidate(visited.place.parent);
+  const FolderNumber number = mTree.Learn(visited.place, item, *id);
+  mQuestion.Offer(item, *id, visited.spot, [&] { return mTree.PathOf(number); });
+  if (IsSeen(number)) return;
+  FolderTree::Folder& folder = mTree[number];
+  if (folder.change != visited.status.change) folder.isRead = false;
+  folder.change = visited.status.change;
+  if (folder.isRead && !mQuestion.HasToRead(folder.read)) return MarkAsSeen(number);
+  if (mQuestion.IsSettled()) {
+    mKnown.waiting.push_back(visited.place);
+    return;
+  }
+  ReadFolder(number, std::move(visited));
+}
+
+void VolumeWalk::ReadFolder(FolderNumber folder, Visited visited) {
+  const kernel::Status& status = visited.status;
+  const kernel::Nanoseconds now = kernel::Now();
+  const bool isLeaf = mVolume.Kind().countsSubfolders && status.links == kLinksWithoutSubfolders;
+  if (isLeaf && mQuestion.WantsFoldersOnly()) return MarkAsRead(folder, status.change, now);
+
+  if (!visited.descriptor.IsOpen()) {
+    auto opened = OpenAgain(visited);
+    if (!opened) {
+      // Another server, or a new ticket, can let it be read without a change.
+      if (kernel::MeansRefused(opened.Error())) MarkAsSeen(folder);
+      mTree[folder].isRead = false;
+      return;
+    }
+    visited.descriptor = *std::move(opened);
+  }
+  auto& waiting = mKnown.waiting;
+  const std::size_t before = waiting.size();
+  const Reading reading = ReadEntries(folder, visited.descriptor);
+  if (reading == Reading::kStopped) {
+    waiting.resize(before);
+    waiting.push_back(visited.place);
+    return;
+  }
+  MarkAsRead(folder, status.change, now);
+  if (reading == Reading::kPartly) Invalidate(folder);
+  if (waiting.size() > before) KeepOpen(folder, std::move(visited.descriptor));
+}
+
+// Opens the folder that was seen there. Another one may have come in the meantime.
+kernel::Result<kernel::Descriptor> VolumeWalk::OpenAgain(const Visited& visited) {
+  auto opened = OpenToRead(visited.spot);
+  const auto status = opened ? kernel::ReadStatus(kernel::AtOpen(opened->Get()))
+                             : kernel::Result<kernel::Status>(opened.Error());
+  if (!status) {
+    mQuestion.NoteError(status.Error());
+    return status.Error();
+  }
+  if (!kernel::HaveSameNumbers(status->item, visited.status.item)) return kernel::kNotThere;
+  return opened;
+}
+
+// Stops when the question is settled.
+VolumeWalk::Reading VolumeWalk::ReadEntries(FolderNumber folder,
+                                            const kernel::Descriptor& descriptor) {
+  const bool isNew = !mTree[folder].isRead || mQuestion.HasToReadAll();
+  const kernel::Item region = mTree.RegionOf(folder);
+  Reading reading = Reading::kWhole;
+  kernel::FolderReader reader(descriptor);
+  while (const kernel::Entry* const entry = reader.Next()) {
+    Seen seen = entry->kind == kernel::Entry::Kind::kFolder ? Seen::kFolder : Seen::kOther;
+    if (entry->kind == kernel::Entry::Kind::kUnknown ||
+        mQuestion.IsWorthALook(entry->inode, region, seen == Seen::kFolder)) {
+      seen = SeeEntry(folder, {descriptor.Get(), entry->name});
+      if (mQuestion.IsSettled()) return Reading::kStopped;
+    }
+    if (seen == Seen::kHidden) reading = Reading::kPartly;
+    // What an earlier reading found is known or waits already.
+    if (seen == Seen::kFolder && isNew) mKnown.waiting.push_back({folder, entry->name});
+  }
+  if (reader.FailedBy().number == 0) return reading;
+  mQuestion.NoteError(reader.FailedBy());
+  return Reading::kPartly;
+}
+
+// Offers the item at an entry of an open folder. Hidden when something covers it and when it cannot
+// be looked at.
+VolumeWalk::Seen VolumeWalk::SeeEntry(FolderNumber folder, const kernel::Spot& spot) {
+  const std::string path = foundation::JoinPath(mTree.PathOf(folder), spot.name);
+  if (mVolumes.IsMountPoint(path)) {
+    mQuestion.NoteCovered();
+    return Seen::kHidden;
+  }
+  auto status = kernel::ReadStatus(spot);
+  if (!status) mQuestion.NoteError(status.Error());
+  if (!status || status->item.mount != mTree.RegionOf(folder).mount) return Seen::kHidden;
+  const auto id = IDOf(status->item, folder, spot);
+  if (!id) return Seen::kHidden;
+  mQuestion.Offer(status->item, *id, spot, [&] { return path; });
+  return kernel::IsFolder(status->item) ? Seen::kFolder : Seen::kOther;
+}
+
+// A folder is gone when it is not there even after all others have been looked at.
+void VolumeWalk::CheckKnown() {
+  for (const bool isLast : {false, true}) {
+    for (FolderNumber number = 0; number < mTree.Count() && !mQuestion.IsSettled(); ++number) {
+      if (mTree[number].id == 0 || IsSeen(number) || CheckUnchanged(number)) continue;
+      const FolderNumber parent = mTree[number].parent;
+      if (parent == kNoParent || EnterFolder(parent)) {
+        Visit({parent, std::string(mTree.NameOf(number))});
+        VisitWaiting();
+      }
+      if (isLast && !IsSeen(number) && !mQuestion.IsSettled()) ForgetIfGone(number);
+    }
+  }
+}
+
+// Whether the folder is where it is known to be, as it was when it was read, and need not be read
+// for this question. It then counts as seen.
+bool VolumeWalk::CheckUnchanged(FolderNumber number) {
+  const FolderTree::Folder& folder = mTree[number];
+  if (!folder.isRead || mQuestion.HasToRead(folder.read)) return false;
+  // Unless its parent is where it was, the path may lead through a link.
+  if (folder.parent != kNoParent && !IsSeen(folder.parent)) return false;
+  const std::string path = mTree.PathOf(number);
+  if (path.empty() || !mVolumes.IsReachable(mVolume.Listed(), path)) return false;
+  const kernel::Spot spot = kernel::AtPath(path.c_str());
+  const auto status = kernel::ReadStatus(spot);
+  if (!status || !mTree.IsSame(number, status->item) || status->change != folder.change) {
+    return false;
+  }
+  mQuestion.Offer(status->item, folder.id, spot, [&] { return path; });
+  MarkAsSeen(number);
+  return true;
+}
+
+// A folder that no walk can see. One that is merely covered, or not to be looked at, may come back
+// without a change.
+void VolumeWalk::ForgetIfGone(FolderNumber folder) {
+  mTree[folder].isRead = false;
+  const std::string path = mTree.PathOf(folder);
+  if (!path.empty()) {
+    if (!mVolumes.IsReachable(mVolume.Listed(), path)) return;
+    const auto status = kernel::ReadStatus(kernel::AtPath(path.c_str()));
+    const bool isThere =
+        status ? mTree.IsSame(folder, status->item) : !kernel::MeansGone(status.Error());
+    if (isThere) return;
+  }
+  mTree.Forget(folder);
+}
+
+// Nullopt where it cannot be told. What is in another subvolume than its parent gets its handle.
+std::optional<std::uint32_t> VolumeWalk::IDOf(kernel::Item& item, FolderNumber parent,
+                                              const kernel::Spot& spot) const {
+  if (parent != kNoParent && mTree.RegionOf(parent).device == item.device) {
+    return mVolume.IDOfEntry(item.inode, mTree.RegionOf(parent));
+  }
+  if (mVolume.Kind().upperIDs == names::UpperIDs::kSubvolumes) kernel::ReadProof(item, spot);
+  if (!mVolume.NeedsHandleForID(item)) return mVolume.IDOf(item);
+  mQuestion.NoteError({EIO});
+  return std::nullopt;
+}
+
+// `change` and `now` as they were before it was read.
+void VolumeWalk::MarkAsRead(FolderNumber number, kernel::Nanoseconds change,
+                            kernel::Nanoseconds now) {
+  MarkAsSeen(number);
+  FolderTree::Folder& folder = mTree[number];
+  if (folder.isRead) return;
+  folder.read = mKnown.walks;
+  const std::uint64_t age = static_cast<std::uint64_t>(now) - static_cast<std::uint64_t>(change);
+  const bool mayChangeUnseen = now <= change || age <= kCoarsestTick;
+  folder.isRead = !mayChangeUnseen;
+}
+
+// Something in the folder was not seen that may be seen later though the folder does not change, or
+// at another mount.
+void VolumeWalk::Invalidate(FolderNumber folder) {
+  if (folder == kNoParent) return;
+  mTree[folder].isRead = false;
+  mTree[folder].checked = kNoWalk;
+}
+
+kernel::Result<kernel::Descriptor> VolumeWalk::OpenToRead(const kernel::Spot& spot) {
+  ++mKnown.opened;
+  return kernel::OpenForReading(spot);
+}
+
+// Makes a folder the last of the open ones. False when it cannot be opened, and when another is in
+// its place.
+bool VolumeWalk::EnterFolder(FolderNumber folder) {
+  while (!mOpen.empty() && mOpen.back().number != folder) mOpen.pop_back();
+  if (!mOpen.empty()) return true;
+  const std::string path = mTree.PathOf(folder);
+  if (path.empty() || !mVolumes.IsReachable(mVolume.Listed(), path)) {
+    mQuestion.NoteCovered();
+    return false;
+  }
+  auto held = kernel::HoldFolderWithoutLinks(path);
+  const auto status = held ? kernel::ReadStatus(kernel::AtOpen(held->Get()))
+                           : kernel::Result<kernel::Status>(held.Error());
+  if (!status) mQuestion.NoteError(status.Error());
+  if (!status || !mTree.IsSame(folder, status->item)) return false;
+  KeepOpen(folder, *std::move(held));
+  return true;
+}
+
+void VolumeWalk::KeepOpen(FolderNumber folder, kernel::Descriptor descriptor) {
+  if (mOpen.size() == kMostOpenFolders) mOpen.erase(mOpen.begin());
+  const bool holds = mVolumes.HoldsMountPoint(mTree.PathOf(folder));
+  mOpen.push_back({folder, std::move(descriptor), holds});
+}
+
+}  // namespace tallowmere::catalog
