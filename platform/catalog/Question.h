@@ -1,13 +1,10 @@
 // What a search over a volume looks for, what it has found of it, and when it is settled.
 //
-// | Numbers of the volume | Looked for          | A find                   | Settled by            |
-// |-----------------------|---------------------|--------------------------|-----------------------|
-// | tell items apart      | a reference, or an  | that item                | the first             |
-// |                       | id that is certain  |                          |                       |
-// | tell items apart      | another id          | an item with the id      | the second, or all    |
-// |                       |                     |                          | being seen            |
-// | do not tell them      | an id, or the       | a place of an item with  | the second, or all    |
-// |                       | numbers of an item  | them                     | being seen            |
+// | Numbers of the volume | Looked for                | A find is | Settled by             |
+// |-----------------------|---------------------------|-----------|------------------------|
+// | tell items apart      | a reference, a certain id | that item | the first              |
+// | tell items apart      | another id                | an item   | two, or all being seen |
+// | do not tell them      | an id, or numbers         | a place   | two, or all being seen |
 #pragma once
 
 #include <cstdint>

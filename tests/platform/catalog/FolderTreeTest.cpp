@@ -1,0 +1,3 @@
+#include "catalog/FolderTree.h"
+
+#include <gtest/gtest.h>
