@@ -57,9 +57,10 @@ class Question {
     if (IsMeant(item, id, spot)) Take(item, path());
   }
 
-  // Takes note of what could not be seen: for an error, or because something is mounted there.
+  // Takes note of what could not be seen: for an error; because something is mounted there, or what
+  // was there is no more.
   void NoteError(kernel::Error error);
-  void NoteCovered();
+  void NoteHidden();
   bool HasSeenAll() const { return !mIsHidden; }
 
   // Whether no item with the id was met, files included.

@@ -10,6 +10,7 @@
 #include <cstdarg>
 #include <cstddef>
 #include <cstdint>
+#include <utility>
 
 namespace {
 
@@ -17,6 +18,7 @@ constexpr long kNanosecondsInASecond = 1'000'000'000;
 
 std::chrono::nanoseconds later{0};
 bool isUntyped = false;
+std::function<void(int)> beforeEntries;
 int openat2Error = 0;
 
 template <class Call>
@@ -39,6 +41,7 @@ extern "C" int clock_gettime(clockid_t clock, timespec* shown) noexcept {
 
 extern "C" ssize_t getdents64(int folder, void* buffer, size_t size) noexcept {
   static const auto real = Real<ssize_t (*)(int, void*, size_t)>("getdents64");
+  if (beforeEntries) beforeEntries(folder);
   const ssize_t got = real(folder, buffer, size);
   auto* const bytes = static_cast<char*>(buffer);
   for (ssize_t at = 0; isUntyped && at < got;) {
@@ -90,6 +93,14 @@ RefusedOpenat2::RefusedOpenat2(int error) {
 
 RefusedOpenat2::~RefusedOpenat2() {
   openat2Error = 0;
+}
+
+BeforeEntries::BeforeEntries(std::function<void(int)> happens) {
+  beforeEntries = std::move(happens);
+}
+
+BeforeEntries::~BeforeEntries() {
+  beforeEntries = nullptr;
 }
 
 void WaitForTheNextTick() {

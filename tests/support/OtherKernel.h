@@ -1,9 +1,10 @@
 // Shows the program that it is linked into another kernel than the real one, where a test asks for
-// it: another time of day, entries without types, calls that are missing. Each for as long as its
-// object lives; nothing is changed otherwise.
+// it: another time of day, entries without types, a missing call, something that happens between
+// two calls. Each for as long as its object lives; nothing is changed otherwise.
 #pragma once
 
 #include <chrono>
+#include <functional>
 
 namespace tallowmere::test {
 
@@ -32,6 +33,15 @@ class RefusedOpenat2 {
   RefusedOpenat2(const RefusedOpenat2&) = delete;
   RefusedOpenat2& operator=(const RefusedOpenat2&) = delete;
   ~RefusedOpenat2();
+};
+
+// Something happens whenever entries of a folder are about to be read: getdents64 of that descriptor.
+class BeforeEntries {
+ public:
+  explicit BeforeEntries(std::function<void(int folder)> happens);
+  BeforeEntries(const BeforeEntries&) = delete;
+  BeforeEntries& operator=(const BeforeEntries&) = delete;
+  ~BeforeEntries();
 };
 
 // Waits until the kernel's clock for time stamps has moved on, so that what is changed from now on

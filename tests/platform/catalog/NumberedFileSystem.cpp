@@ -101,6 +101,16 @@ void RemoveFolder(fuse_req_t request, fuse_ino_t parent, const char* name) {
   fuse_reply_err(request, 0);
 }
 
+void Rename(fuse_req_t request, fuse_ino_t parent, const char* name, fuse_ino_t newParent,
+            const char* newName, unsigned) {
+  Node& moved = nodes[Child(parent, name)];
+  moved.parent = newParent;
+  moved.name = newName;
+  Touch(parent);
+  Touch(newParent);
+  fuse_reply_err(request, 0);
+}
+
 void ReadFolder(fuse_req_t request, fuse_ino_t folder, size_t size, off_t offset, fuse_file_info*) {
   std::vector<char> buffer(size);
   size_t used = 0;
@@ -140,6 +150,7 @@ std::string MakeBlockDevice(const std::string& file) {
   operations.mkdir = MakeFolderNode;
   operations.mknod = MakeNode;
   operations.rmdir = RemoveFolder;
+  operations.rename = Rename;
   operations.readdir = ReadFolder;
   std::string options = "-oallow_other,default_permissions";
   if (on == NumberedFileSystem::On::kBlockDevice) {

@@ -1,6 +1,6 @@
 // A file system whose items have the inode numbers that a test gives them: the number behind the
 // last '@' of their names, else one of their own. Nothing can be written, and folders alone can be
-// removed.
+// removed; nothing can be moved to where something is.
 #pragma once
 
 #include <sys/types.h>

@@ -1,1 +1,230 @@
+// Volumes on which two items can have one device and inode number: what tells them apart is their
+// places.
+#include <algorithm>
+#include <climits>
+
 #include "FolderIndexFixture.h"
+#include "NumberedFileSystem.h"
+#include "support/FileSystemImage.h"
+
+namespace tallowmere::catalog {
+namespace {
+
+using test::BeforeEntries;
+using test::FileSystemImage;
+using test::NumberedFileSystem;
+using test::RunTool;
+using test::ScopedMount;
+using test::TemporaryFolder;
+
+constexpr unsigned long kShared = 500;
+
+std::string PathOfDescriptor(int descriptor) {
+  const std::string link = "/proc/self/fd/" + std::to_string(descriptor);
+  return std::filesystem::read_symlink(link);
+}
+
+// A server that gives two items one number.
+class AnUntrustedVolume : public AnIndex {
+ protected:
+  void SetUp() override {
+    if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    mNumbered.emplace();
+    if (!mNumbered->IsMounted()) GTEST_SKIP() << "no FUSE here";
+    std::filesystem::permissions(mNumbered->Path().parent_path(), std::filesystem::perms(0755));
+    mTop = mNumbered->Path();
+    UseVolumeOf(mTop);
+    ASSERT_FALSE(mVolume->NumbersTellItemsApart());
+    for (const char* name : {"a", "b", "c"}) Make(name);
+  }
+  std::string MakeShared(const std::string& name) {
+    return mNumbered->MakeFolder(name, kShared);
+  }
+  std::string FindShared() { return Find(kShared); }
+
+  std::optional<NumberedFileSystem> mNumbered;
+};
+
+TEST_F(AnUntrustedVolume, AnswersWhenOnePlaceHasTheNumber) {
+  const std::string only = MakeShared("a/f");
+  EXPECT_EQ(FindShared(), only);
+  EXPECT_EQ(FindAny(kShared), only);
+}
+
+TEST_F(AnUntrustedVolume, AnswersNothingWhenTwoPlacesHaveTheNumber) {
+  const std::string first = MakeShared("a/f");
+  const std::string second = MakeShared("b/f");
+  ASSERT_TRUE(kernel::HaveSameNumbers(ItemOf(first), ItemOf(second)));
+  EXPECT_EQ(FindShared(), "(none)");
+  EXPECT_EQ(FindAny(kShared), "(none)");
+  EXPECT_EQ(Find(kShared, "a"), "(none)");
+}
+
+TEST_F(AnUntrustedVolume, NoticesWhenTheSecondComesAndWhenTheFirstGoes) {
+  const std::string first = MakeShared("a/f");
+  LetChangesAge();
+  EXPECT_EQ(FindShared(), first);
+  EXPECT_EQ(FindShared(), first);
+  const std::string second = MakeShared("b/f");
+  EXPECT_EQ(FindShared(), "(none)");
+  Remove(first);
+  EXPECT_EQ(FindShared(), second);
+}
+
+TEST_F(AnUntrustedVolume, AnswersNothingWhenOneIsInTheOther) {
+  MakeShared("a/f");
+  MakeShared("a/f@500/f");
+  EXPECT_EQ(FindShared(), "(none)");
+}
+
+TEST_F(AnUntrustedVolume, AnswersNothingWhereEveryItemHasOneNumber) {
+  for (const char* name : {"x", "y", "x@500/x", "x@500/y", "y@500/z"}) MakeShared(name);
+  EXPECT_EQ(FindShared(), "(none)");
+  EXPECT_EQ(FindAny(kShared), "(none)");
+  EXPECT_EQ(Find(ID("a")), PathTo("a"));
+}
+
+TEST_F(AnUntrustedVolume, OfAFolderAndAFileAnswersTheFolderWhenOneIsWanted) {
+  const std::string folder = MakeShared("a/f");
+  mNumbered->MakeFile("b/x", kShared);
+  EXPECT_EQ(FindShared(), folder);
+  EXPECT_EQ(FindAny(kShared), "(none)");
+}
+
+TEST_F(AnUntrustedVolume, LooksForTheNumbersOfAReference) {
+  const std::string first = MakeShared("a/f");
+  const kernel::Item reference = ItemOf(first);
+  const SearchedItem wanted{kShared, &reference, true};
+  EXPECT_EQ(Search(wanted, mTop), first);
+  MakeShared("b/f");
+  EXPECT_EQ(Search(wanted, mTop), std::nullopt);
+}
+
+TEST_F(AnUntrustedVolume, AnswersNothingUnlessEveryFolderMayBeRead) {
+  MakeShared("a/f");
+  MakeShared("b/f");
+  chmod(PathTo("b").c_str(), 0700);
+  EXPECT_TRUE(HoldsForNobody([&] { return FindShared() == "(none)"; }));
+  chmod(PathTo("b").c_str(), 0711);
+  EXPECT_TRUE(HoldsForNobody([&] { return FindShared() == "(none)"; }));
+}
+
+TEST_F(AnUntrustedVolume, AnswersNothingWhileSomethingIsMountedInIt) {
+  const std::string first = MakeShared("a/f");
+  MakeShared("b/f");
+  {
+    const ScopedMount cover("tmpfs", PathTo("b"), "tmpfs");
+    ASSERT_TRUE(cover.IsMounted());
+    EXPECT_EQ(FindShared(), "(none)");
+    EXPECT_EQ(FindAny(kShared), "(none)");
+  }
+  Remove(PathTo("b/f@500"));
+  EXPECT_EQ(FindShared(), first);
+}
+
+TEST_F(AnUntrustedVolume, AnswersOnceWhatTwoMountsShow) {
+  const std::string path = MakeShared("a/f");
+  const ScopedMount again(PathTo("a"), mFolder.MakeFolder("again"), "", MS_BIND);
+  ASSERT_TRUE(again.IsMounted());
+  UseVolumeOf(mTop);
+  ASSERT_EQ(mVolume->Listed().MountPoints().size(), 2u);
+  EXPECT_EQ(FindShared(), path);
+  MakeShared("b/f");
+  EXPECT_EQ(FindShared(), "(none)");
+}
+
+TEST_F(AnUntrustedVolume, KeepsNothingFromOneQuestionToTheNext) {
+  Make("a/d/e");
+  LetChangesAge();
+  const std::uint64_t opened = OpenedFor(kOfNoItem);
+  EXPECT_GE(opened, 6u);
+  EXPECT_EQ(OpenedFor(kOfNoItem), opened);
+}
+
+// The second of two moves from where the walk has not looked to where it has.
+TEST_F(AnUntrustedVolume, MissesNothingThatMovesWhileItLooks) {
+  MakeShared("c/f");
+  MakeShared("a/f");
+  MakeShared("b/f");
+  for (const auto& [from, to] : {std::pair("a", "b"), std::pair("b", "a")}) {
+    std::filesystem::remove(PathTo(to) + "/f@500");
+    int moves = 0;
+    const BeforeEntries entries([&, source = PathTo(from), target = PathTo(to)](int folder) {
+      if (moves > 0 || PathOfDescriptor(folder) != source) return;
+      std::filesystem::rename(source + "/f@500", target + "/f@500");
+      ++moves;
+    });
+    EXPECT_EQ(FindShared(), "(none)");
+    EXPECT_EQ(moves, 1);
+  }
+}
+
+TEST_F(AnUntrustedVolume, AnswersWhenItHasChangedOnceWhileItLooked) {
+  const std::string path = MakeShared("c/f");
+  bool hasChanged = false;
+  const BeforeEntries entries([&](int folder) {
+    if (hasChanged || PathOfDescriptor(folder) != PathTo("a")) return;
+    hasChanged = true;
+    std::filesystem::create_directory(PathTo("b/new"));
+  });
+  EXPECT_EQ(FindShared(), path);
+  EXPECT_TRUE(hasChanged);
+}
+
+TEST_F(AnUntrustedVolume, AnswersNothingWhileItNeverStaysAsItIs) {
+  MakeShared("c/f");
+  int changes = 0;
+  const BeforeEntries entries([&](int folder) {
+    if (PathOfDescriptor(folder) != PathTo("a")) return;
+    std::filesystem::create_directory(PathTo("b/" + std::to_string(++changes)));
+  });
+  EXPECT_EQ(FindShared(), "(none)");
+  EXPECT_LT(changes, 20);
+}
+
+// Two file systems that bindfs shows as one.
+class TwoFileSystemsAsOne : public AnIndex {
+ protected:
+  void SetUp() override {
+    if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    const std::string source = mFolder.MakeFolder("source");
+    for (const std::string name : {"/e1", "/e2"}) {
+      std::filesystem::create_directory(source + name);
+      mParts.emplace_back(std::make_unique<ScopedMount>("tmpfs", source + name, "tmpfs"));
+      ASSERT_TRUE(mParts.back()->IsMounted());
+      std::filesystem::create_directories(source + name + "/d/f");
+    }
+    mTop = mFolder.MakeFolder("volume");
+    if (!RunTool({"bindfs", source, mTop})) GTEST_SKIP() << "no bindfs here";
+    UseVolumeOf(mTop);
+    const kernel::Item item = ItemAt("e1/d/f");
+    ASSERT_TRUE(kernel::HaveSameNumbers(item, ItemAt("e2/d/f")));
+    mID = mVolume->IDOf(item);
+  }
+  void TearDown() override { umount2(mTop.c_str(), MNT_DETACH); }
+
+  std::vector<std::unique_ptr<ScopedMount>> mParts;
+  std::uint32_t mID = 0;
+};
+
+TEST_F(TwoFileSystemsAsOne, HaveNoItemWithANumberThatBothHave) {
+  for (const char* start : {"", "e1/d", "e2/d"}) {
+    EXPECT_EQ(Find(mID, start), "(none)") << start;
+    EXPECT_EQ(FindAny(mID, start), "(none)") << start;
+  }
+}
+
+TEST_F(TwoFileSystemsAsOne, HaveAnItemWithANumberThatOneHas) {
+  Remove(PathTo("e2/d/f"));
+  EXPECT_EQ(Find(mID), PathTo("e1/d/f"));
+  Make("e2/d/f");
+  EXPECT_EQ(Find(ID("e2/d/f")), PathTo("e2/d/f"));
+}
+
+TEST_F(TwoFileSystemsAsOne, HaveNoItemWithTheNumbersOfAReferenceThatBothHave) {
+  const kernel::Item reference = ItemAt("e1/d/f");
+  EXPECT_EQ(Search({mID, &reference, true}, PathTo("e1/d")), std::nullopt);
+}
+
+}  // namespace
+}  // namespace tallowmere::catalog
