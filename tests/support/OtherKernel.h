@@ -35,7 +35,8 @@ class RefusedOpenat2 {
   ~RefusedOpenat2();
 };
 
-// Something happens whenever entries of a folder are about to be read: getdents64 of that descriptor.
+// Something happens whenever entries of a folder are about to be read: getdents64 of that
+// descriptor.
 class BeforeEntries {
  public:
   explicit BeforeEntries(std::function<void(int folder)> happens);

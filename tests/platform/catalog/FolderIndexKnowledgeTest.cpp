@@ -767,10 +767,8 @@ TEST_F(AnIndexOfMixedIDs, FindsNoneWhenAFolderCannotBeReadToItsEnd) {
 
 TEST_F(AnIndexOfMixedIDs, PassesOverFoldersWithoutPermission) {
   chmod(PathTo("deep/1/2").c_str(), 0700);
-  EXPECT_TRUE(HoldsForNobody([&] {
-    return Find(mID) == mSmall && FindAny(mID) == mSmall &&
-           Find(mID) == mSmall;
-  }));
+  EXPECT_TRUE(HoldsForNobody(
+      [&] { return Find(mID) == mSmall && FindAny(mID) == mSmall && Find(mID) == mSmall; }));
 }
 
 TEST_F(AnIndexOfMixedIDs, PassesOverFoldersThatHaveNoPath) {
@@ -779,7 +777,8 @@ TEST_F(AnIndexOfMixedIDs, PassesOverFoldersThatHaveNoPath) {
   for (int depth = 0; depth < 40; ++depth) {
     ASSERT_EQ(mkdirat(folder.Get(), name.c_str(), 0700), 0);
     ASSERT_EQ(mkdirat(folder.Get(), "side", 0700), 0);
-    folder = kernel::Descriptor(openat(folder.Get(), name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    folder =
+        kernel::Descriptor(openat(folder.Get(), name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   }
   for (int round = 0; round < 3; ++round) {
     EXPECT_EQ(Find(mID), mSmall);

@@ -83,11 +83,13 @@ TEST_F(AFolderIndex, PassesOverFoldersThatCannotBeNamedFromTheRoot) {
   mFolder.MakeFolder("a");
   mFolder.MakeFolder("b");
   mFolder.MakeFile("b/x");
-  kernel::Descriptor folder(open((mFolder.Path() / "a").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  kernel::Descriptor folder(
+      open((mFolder.Path() / "a").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   const std::string name(250, 'd');
   for (int depth = 0; depth < 20; ++depth) {
     ASSERT_EQ(mkdirat(folder.Get(), name.c_str(), 0700), 0);
-    folder = kernel::Descriptor(openat(folder.Get(), name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    folder =
+        kernel::Descriptor(openat(folder.Get(), name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   }
   ExpectFoundFrom("a", "b/x");
 }

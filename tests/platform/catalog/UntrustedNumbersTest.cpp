@@ -37,9 +37,7 @@ class AnUntrustedVolume : public AnIndex {
     ASSERT_FALSE(mVolume->NumbersTellItemsApart());
     for (const char* name : {"a", "b", "c"}) Make(name);
   }
-  std::string MakeShared(const std::string& name) {
-    return mNumbered->MakeFolder(name, kShared);
-  }
+  std::string MakeShared(const std::string& name) { return mNumbered->MakeFolder(name, kShared); }
   std::string FindShared() { return Find(kShared); }
 
   std::optional<NumberedFileSystem> mNumbered;
@@ -224,6 +222,100 @@ TEST_F(TwoFileSystemsAsOne, HaveAnItemWithANumberThatOneHas) {
 TEST_F(TwoFileSystemsAsOne, HaveNoItemWithTheNumbersOfAReferenceThatBothHave) {
   const kernel::Item reference = ItemAt("e1/d/f");
   EXPECT_EQ(Search({mID, &reference, true}, PathTo("e1/d")), std::nullopt);
+}
+
+constexpr std::uintmax_t kBtrfsSize = 128 << 20;
+
+class ABtrfsVolume : public AnIndex {
+ protected:
+  void SetUp() override {
+    if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    mImage.emplace("btrfs", std::vector<std::string>{"mkfs.btrfs", "-q"}, kBtrfsSize);
+    if (!mImage->IsMade() || !mImage->Mount()) GTEST_SKIP() << "no btrfs here";
+    mTop = mImage->Path();
+    for (const char* name : {"/s1", "/s2"}) {
+      if (!RunTool({"btrfs", "subvolume", "create", mTop + name})) GTEST_SKIP() << "no btrfs here";
+    }
+    UseVolumeOf(mTop);
+    for (const char* name : {"s1/d/f", "s2/d/f"}) Make(name);
+    ASSERT_EQ(ItemAt("s1/d/f").inode, ItemAt("s2/d/f").inode);
+  }
+
+  std::optional<FileSystemImage> mImage;
+};
+
+TEST_F(ABtrfsVolume, HasAnIDForEachItemOfEachSubvolume) {
+  MakeFile("s1/d/x");
+  MakeFile("s2/d/x");
+  ASSERT_NE(ID("s1/d/f"), ID("s2/d/f"));
+  for (const char* name : {"s1", "s2", "s1/d", "s2/d", "s1/d/f", "s2/d/f"}) ExpectFound(name);
+  for (const char* name : {"s1/d/x", "s2/d/x"}) {
+    EXPECT_EQ(FindAny(ID(name), "s1/d"), PathTo(name));
+    EXPECT_EQ(FindAny(ID(name), "s2/d"), PathTo(name));
+  }
+}
+
+TEST_F(ABtrfsVolume, FindsWhatMovedWithItsSubvolume) {
+  KnowEverything();
+  Move("s1", "s3");
+  Move("s2", "s1");
+  for (const char* name : {"s3", "s1", "s1/d", "s3/d", "s1/d/f", "s3/d/f"}) ExpectFound(name);
+}
+
+// An overlay whose layers are in two subvolumes, so that its numbers are not to be trusted, but its
+// change times are.
+class AnOverlayOfSubvolumes : public ABtrfsVolume {
+ protected:
+  void SetUp() override {
+    ABtrfsVolume::SetUp();
+    if (IsSkipped()) return;
+    Move("s1/d", "s1/e1");
+    Move("s2/d", "s2/e2");
+    for (const char* name : {"upper", "work"}) Make(name);
+    const std::string place = mFolder.MakeFolder("overlay");
+    mOverlay.emplace("overlay", place, "overlay", 0,
+                     "lowerdir=" + mTop + "/s1:" + mTop + "/s2,upperdir=" + mTop +
+                         "/upper,workdir=" + mTop + "/work");
+    if (!mOverlay->IsMounted()) GTEST_SKIP() << "no overlay here";
+    mTop = place;
+    UseVolumeOf(mTop);
+    ASSERT_FALSE(mVolume->NumbersTellItemsApart());
+    ASSERT_TRUE(mVolume->Kind().keepsNumbers);
+  }
+
+  std::optional<ScopedMount> mOverlay;
+};
+
+TEST_F(AnOverlayOfSubvolumes, HasNoItemWithANumberThatTwoHave) {
+  ASSERT_TRUE(kernel::HaveSameNumbers(ItemAt("e1/f"), ItemAt("e2/f")));
+  for (int round = 0; round < 2; ++round) {
+    EXPECT_EQ(Find(ID("e1/f")), "(none)");
+    EXPECT_EQ(FindAny(ID("e1/f")), "(none)");
+    LetChangesAge();
+  }
+}
+
+TEST_F(AnOverlayOfSubvolumes, ReadsOnlyFoldersThatHaveChanged) {
+  for (int i = 0; i < 20; ++i) Make("new/" + std::to_string(i) + "/x");
+  KnowEverything();
+  EXPECT_LE(OpenedFor(kOfNoItem), 1u);
+  Make("new/7/y");
+  const std::uint32_t id = ID("new/7/y");
+  EXPECT_LE(OpenedFor(id), 4u);
+  EXPECT_EQ(Find(id), PathTo("new/7/y"));
+}
+
+TEST_F(AnOverlayOfSubvolumes, FollowsWhatMovesAndWhatTakesItsPlace) {
+  for (const char* name : {"x/a/b", "y/a/b"}) Make(name);
+  KnowEverything();
+  const std::uint32_t first = ID("x/a/b");
+  const std::uint32_t second = ID("y/a/b");
+  ASSERT_NE(first, second);
+  Move("x/a", "z");
+  Move("y/a", "x/a");
+  Move("z", "y/a");
+  EXPECT_EQ(Find(first), PathTo("y/a/b"));
+  EXPECT_EQ(Find(second), PathTo("x/a/b"));
 }
 
 }  // namespace
