@@ -12,6 +12,9 @@ FolderTree::TellApart HowToTellApart(const volumes::Volume& volume) {
                                         : FolderTree::TellApart::kPlaces;
 }
 
+// How often a volume that changes while it is looked at is looked at again.
+constexpr int kMostLooks = 3;
+
 // Whether what is known of a folder holds until its change time moves. A server that promises
 // nothing can show several folders as one, with the time of one of them.
 bool HoldsUntilChange(const volumes::Volume& volume) {
@@ -26,27 +29,33 @@ FolderIndex::FolderIndex(volumes::VolumePointer volume)
 std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std::string& start,
                                              const volumes::Volumes& volumes) {
   if (!volumes.WithNumber(mVolume->Number())) return std::nullopt;
-  const bool isLast = mKnown.walks == std::numeric_limits<WalkNumber>::max();
-  if (mKnown.tree.IsMostlyWaste() || isLast || !HoldsUntilChange(*mVolume)) Clear();
-  Question question(item, *mVolume, LastMissed(item.id));
   try {
-    Run(question, start, volumes);
+    for (int look = 0; look < kMostLooks; ++look) {
+      const bool isLast = mKnown.walks == std::numeric_limits<WalkNumber>::max();
+      if (mKnown.tree.IsMostlyWaste() || isLast || !HoldsUntilChange(*mVolume)) Clear();
+      Question question(item, *mVolume, LastMissed(item.id));
+      const bool isProved = Run(question, start, volumes);
+      if (mKnown.waiting.empty()) mKnown.waiting = {};
+      if (isProved) return question.Answer();
+    }
   } catch (...) {
     Clear();
     throw;
   }
-  if (mKnown.waiting.empty()) mKnown.waiting = {};
-  return question.Answer();
+  return std::nullopt;
 }
 
-void FolderIndex::Run(Question& question, const std::string& start,
+// Whether the answer of the question is one. That there is only one place takes a volume that
+// stayed as it was while it was looked at.
+bool FolderIndex::Run(Question& question, const std::string& start,
                       const volumes::Volumes& volumes) {
   VolumeWalk walk(*mVolume, volumes, mKnown, question);
   if (question.IsCertain()) walk.LookAtKnown();
-  if (question.IsSettled()) return;
+  if (question.IsSettled()) return true;
   if (!mKnown.isWhole || !mKnown.waiting.empty() || question.HasToReadAll()) walk.Walk(start);
   walk.CheckKnown();
   if (!question.IsSettled() && question.IsMissed()) NoteMissing(question.ID());
+  return mVolume->NumbersTellItemsApart() || !question.Answer() || walk.IsSteady();
 }
 
 std::size_t FolderIndex::Size() const {

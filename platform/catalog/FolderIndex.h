@@ -52,7 +52,7 @@ class FolderIndex {
   };
 
   void Clear();
-  void Run(Question& question, const std::string& start, const volumes::Volumes& volumes);
+  bool Run(Question& question, const std::string& start, const volumes::Volumes& volumes);
   WalkNumber LastMissed(std::uint32_t id) const;
   void NoteMissing(std::uint32_t id);
 

@@ -60,7 +60,7 @@ void Question::NoteError(kernel::Error error) {
   if (!isPassedOver || !mVolume.NumbersTellItemsApart()) mIsHidden = true;
 }
 
-void Question::NoteCovered() {
+void Question::NoteHidden() {
   if (!mVolume.NumbersTellItemsApart()) mIsHidden = true;
 }
 

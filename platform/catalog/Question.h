@@ -1,11 +1,10 @@
 // What a search over a volume looks for, what it has found of it, and when it is settled.
 //
-// | Numbers of the volume | What is looked for         | A find is      | It is settled by |
-// |-----------------------|----------------------------|----------------|--------------------------|
-// | tell items apart      | a reference, a certain id  | that item      | the first | | tell items
-// apart      | another id                 | an item        | two, or all being seen   | | do not
-// tell them      | an id, a reference's       | a place        | two, or all being seen   | | |
-// numbers                    |                |                          |
+// | Numbers of the volume | Looked for                | A find is | Settled by             |
+// |-----------------------|---------------------------|-----------|------------------------|
+// | tell items apart      | a reference, a certain id | that item | the first              |
+// | tell items apart      | another id                | an item   | two, or all being seen |
+// | do not tell them      | an id, or numbers         | a place   | two, or all being seen |
 #pragma once
 
 #include <cstdint>
@@ -58,9 +57,10 @@ class Question {
     if (IsMeant(item, id, spot)) Take(item, path());
   }
 
-  // Takes note of what could not be seen: for an error, or because something is mounted there.
+  // Takes note of what could not be seen: for an error; because something is mounted there, or what
+  // was there is no more.
   void NoteError(kernel::Error error);
-  void NoteCovered();
+  void NoteHidden();
   bool HasSeenAll() const { return !mIsHidden; }
 
   // Whether no item with the id was met, files included.

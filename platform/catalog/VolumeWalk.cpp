@@ -105,7 +105,7 @@ void VolumeWalk::Visit(const FolderPlace& place) {
   }
   if (!kernel::IsFolder(status->item)) return;
   if (!IsOfVolume(status->item, place)) {
-    mQuestion.NoteCovered();
+    mQuestion.NoteHidden();
     return Invalidate(place.parent);
   }
   VisitFolder({place, *spot, std::move(descriptor), *status});
@@ -118,7 +118,7 @@ std::optional<kernel::Spot> VolumeWalk::SpotOf(const FolderPlace& place) {
   if (!EnterFolder(place.parent)) return std::nullopt;
   const OpenFolder& parent = mOpen.back();
   if (parent.holdsMountPoint && mVolumes.IsMountPoint(mTree.PathOf(place))) {
-    mQuestion.NoteCovered();
+    mQuestion.NoteHidden();
     return std::nullopt;
   }
   return kernel::Spot{parent.descriptor.Get(), place.name.c_str()};
@@ -191,8 +191,9 @@ kernel::Result<kernel::Descriptor> VolumeWalk::OpenAgain(const Visited& visited)
     mQuestion.NoteError(status.Error());
     return status.Error();
   }
-  if (!kernel::HaveSameNumbers(status->item, visited.status.item)) return kernel::kNotThere;
-  return opened;
+  if (kernel::HaveSameNumbers(status->item, visited.status.item)) return opened;
+  mQuestion.NoteHidden();
+  return kernel::kNotThere;
 }
 
 // Stops when the question is settled.
@@ -223,13 +224,17 @@ VolumeWalk::Reading VolumeWalk::ReadEntries(FolderNumber folder,
 VolumeWalk::Seen VolumeWalk::SeeEntry(FolderNumber folder, const kernel::Spot& spot) {
   const std::string path = foundation::JoinPath(mTree.PathOf(folder), spot.name);
   if (mVolumes.IsMountPoint(path)) {
-    mQuestion.NoteCovered();
+    mQuestion.NoteHidden();
     return Seen::kHidden;
   }
   auto status = kernel::ReadStatus(spot);
-  if (!status) mQuestion.NoteError(status.Error());
-  if (!status || status->item.mount != mTree.RegionOf(folder).mount) return Seen::kHidden;
-  const auto id = IDOf(status->item, folder, spot);
+  if (!status) {
+    mQuestion.NoteError(status.Error());
+    return Seen::kHidden;
+  }
+  const bool isOfMount = status->item.mount == mTree.RegionOf(folder).mount;
+  if (!isOfMount) mQuestion.NoteHidden();
+  const auto id = isOfMount ? IDOf(status->item, folder, spot) : std::nullopt;
   if (!id) return Seen::kHidden;
   mQuestion.Offer(status->item, *id, spot, [&] { return path; });
   return kernel::IsFolder(status->item) ? Seen::kFolder : Seen::kOther;
@@ -248,6 +253,18 @@ void VolumeWalk::CheckKnown() {
       if (isLast && !IsSeen(number) && !mQuestion.IsSettled()) ForgetIfGone(number);
     }
   }
+}
+
+bool VolumeWalk::IsSteady() const {
+  for (FolderNumber number = 0; number < mTree.Count(); ++number) {
+    if (!IsSeen(number)) continue;
+    const std::string path = mTree.PathOf(number);
+    const auto status = kernel::ReadStatus(kernel::AtPath(path.c_str()));
+    const bool isAsSeen =
+        status && mTree.IsSame(number, status->item) && status->change == mTree[number].change;
+    if (!isAsSeen) return false;
+  }
+  return true;
 }
 
 // Whether the folder is where it is known to be, as it was when it was read, and need not be read
@@ -328,14 +345,20 @@ bool VolumeWalk::EnterFolder(FolderNumber folder) {
   if (!mOpen.empty()) return true;
   const std::string path = mTree.PathOf(folder);
   if (path.empty() || !mVolumes.IsReachable(mVolume.Listed(), path)) {
-    mQuestion.NoteCovered();
+    mQuestion.NoteHidden();
     return false;
   }
   auto held = kernel::HoldFolderWithoutLinks(path);
   const auto status = held ? kernel::ReadStatus(kernel::AtOpen(held->Get()))
                            : kernel::Result<kernel::Status>(held.Error());
-  if (!status) mQuestion.NoteError(status.Error());
-  if (!status || !mTree.IsSame(folder, status->item)) return false;
+  if (!status) {
+    mQuestion.NoteError(status.Error());
+    return false;
+  }
+  if (!mTree.IsSame(folder, status->item)) {
+    mQuestion.NoteHidden();
+    return false;
+  }
   KeepOpen(folder, *std::move(held));
   return true;
 }

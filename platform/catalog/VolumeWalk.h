@@ -45,6 +45,10 @@ class VolumeWalk {
   // again, and those that have moved are found where they are now.
   void CheckKnown();
 
+  // Whether every folder still is as this walk has seen it, by its change time: all of it was so at
+  // one time, when the walk ended, and nothing moved from where it had not looked to where it had.
+  bool IsSteady() const;
+
  private:
   struct OpenFolder {
     FolderNumber number;

@@ -4,7 +4,7 @@
 #include <unordered_map>
 
 #include "CatalogFixture.h"
-#include "NumberedFileSystem.h"
+#include "platform/catalog/NumberedFileSystem.h"
 
 namespace tallowmere::files {
 namespace {

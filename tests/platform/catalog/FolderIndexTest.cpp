@@ -1,16 +1,9 @@
-#include <fcntl.h>
-#include <gtest/gtest.h>
+// Where an index finds items, from wherever it starts.
 #include <sys/mount.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
-#include "files/Descriptor.h"
-#include "files/FolderIndex.h"
-#include "files/NodeID.h"
-#include "support/MountNamespace.h"
-#include "support/TemporaryFolder.h"
+#include "FolderIndexFixture.h"
 
-namespace tallowmere::files {
+namespace tallowmere::catalog {
 namespace {
 
 using test::EnterOwnMountNamespace;
@@ -19,22 +12,19 @@ using test::TemporaryFolder;
 
 class AFolderIndex : public testing::Test {
  protected:
-  ItemReference ItemAt(const std::string& name) const {
-    const auto item = ReadItem(AT_FDCWD, (mFolder.Path() / name).c_str());
-    EXPECT_TRUE(item) << name;
-    return item.value_or(ItemReference{});
-  }
+  kernel::Item ItemAt(const std::string& name) const { return ItemOf(mFolder.Path() / name); }
   // Where a pass that starts at a folder finds what is at `name`, which must be there.
   void ExpectFoundFrom(const std::string& start, const std::string& name) const {
     EXPECT_EQ(Search(ItemAt(name), mFolder.Path() / start), mFolder.Path() / name);
   }
 
   // What a new index of the item's volume finds.
-  std::optional<std::string> Search(const ItemReference& item, const std::string& start) const {
-    const VolumePointer volume = MountTable::OfThisProcess().OfItem(item, start);
-    if (!volume || !volume->Root()) return "(on no volume)";
-    const std::uint32_t id = NodeIDOf(item, *volume->Root());
-    return FolderIndex(volume).Find({id, &item, S_ISDIR(item.type)}, start);
+  std::optional<std::string> Search(const kernel::Item& item, const std::string& start) const {
+    volumes::VolumeTable table;
+    const auto volume = VolumeOf(table, start);
+    if (!volume) return "(on no volume)";
+    const SearchedItem wanted{volume->IDOf(item), &item, kernel::IsFolder(item)};
+    return FolderIndex(volume).Find(wanted, start, *table.Now());
   }
 
   const TemporaryFolder mFolder;
@@ -93,11 +83,13 @@ TEST_F(AFolderIndex, PassesOverFoldersThatCannotBeNamedFromTheRoot) {
   mFolder.MakeFolder("a");
   mFolder.MakeFolder("b");
   mFolder.MakeFile("b/x");
-  Descriptor folder(open((mFolder.Path() / "a").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  kernel::Descriptor folder(
+      open((mFolder.Path() / "a").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   const std::string name(250, 'd');
   for (int depth = 0; depth < 20; ++depth) {
     ASSERT_EQ(mkdirat(folder.Get(), name.c_str(), 0700), 0);
-    folder = Descriptor(openat(folder.Get(), name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    folder =
+        kernel::Descriptor(openat(folder.Get(), name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   }
   ExpectFoundFrom("a", "b/x");
 }
@@ -119,14 +111,14 @@ class AFolderIndexOfAVolume : public AFolderIndex {
 };
 
 TEST_F(AFolderIndexOfAVolume, EndsWithoutAnItemThatIsGone) {
-  const ItemReference item = ItemAt("volume/a/x");
+  const kernel::Item item = ItemAt("volume/a/x");
   std::filesystem::remove(PathOf("volume/a/x"));
   EXPECT_EQ(Search(item, PathOf("volume/a")), std::nullopt);
   EXPECT_EQ(Search(item, PathOf("volume")), std::nullopt);
 }
 
 TEST_F(AFolderIndexOfAVolume, FindsAnItemWhereItIsBeforeWhereItIsMountedOnceMore) {
-  const ItemReference item = ItemAt("volume/a/x");
+  const kernel::Item item = ItemAt("volume/a/x");
   std::filesystem::rename(PathOf("volume/a"), PathOf("volume/b"));
   // The same files once more, under another mount.
   const ScopedMount again(PathOf("volume/b"), mFolder.MakeFolder("volume/first"), "", MS_BIND);
@@ -135,7 +127,7 @@ TEST_F(AFolderIndexOfAVolume, FindsAnItemWhereItIsBeforeWhereItIsMountedOnceMore
 }
 
 TEST_F(AFolderIndexOfAVolume, DoesNotTakeACoveredFolderForWhatCoversIt) {
-  const ItemReference covered = ItemAt("volume/a/mounted");
+  const kernel::Item covered = ItemAt("volume/a/mounted");
   const ScopedMount cover("tmpfs", PathOf("volume/a/mounted"), "tmpfs");
   ASSERT_TRUE(cover.IsMounted());
   EXPECT_EQ(Search(covered, PathOf("volume")), std::nullopt);
@@ -143,11 +135,11 @@ TEST_F(AFolderIndexOfAVolume, DoesNotTakeACoveredFolderForWhatCoversIt) {
 
 TEST_F(AFolderIndexOfAVolume, StaysBelowItsRoot) {
   mFolder.MakeFile("outside");
-  const ItemReference outside = ItemAt("outside");
-  ItemReference item = outside;
+  const kernel::Item outside = ItemAt("outside");
+  kernel::Item item = outside;
   item.mount = ItemAt("volume/a/x").mount;
   EXPECT_EQ(Search(item, PathOf("volume/a")), std::nullopt);
 }
 
 }  // namespace
-}  // namespace tallowmere::files
+}  // namespace tallowmere::catalog

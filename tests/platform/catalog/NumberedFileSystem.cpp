@@ -1,8 +1,11 @@
 #include "NumberedFileSystem.h"
 
 #define FUSE_USE_VERSION 34
+#include <fcntl.h>
 #include <fuse_lowlevel.h>
+#include <linux/loop.h>
 #include <signal.h>
+#include <sys/ioctl.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -23,6 +26,9 @@ struct Node {
   fuse_ino_t parent;
   std::string name;
 };
+// Of items for which the test gives no number.
+constexpr ino_t kFirstOwnNumber = 0x1000;
+
 // Nodes are never given away again; the kernel's number of one is its index.
 std::vector<Node> nodes;
 
@@ -61,13 +67,23 @@ void GetAttributes(fuse_req_t request, fuse_ino_t node, fuse_file_info*) {
   fuse_reply_attr(request, &nodes[node].about, 0);
 }
 
+void SetAttributes(fuse_req_t request, fuse_ino_t node, struct stat* given, int which,
+                   fuse_file_info*) {
+  if ((which & FUSE_SET_ATTR_MODE) != 0) nodes[node].about.st_mode = given->st_mode;
+  clock_gettime(CLOCK_REALTIME, &nodes[node].about.st_ctim);
+  fuse_reply_attr(request, &nodes[node].about, 0);
+}
+
 void Touch(fuse_ino_t node) {
   clock_gettime(CLOCK_REALTIME, &nodes[node].about.st_ctim);
 }
 
 void Make(fuse_req_t request, fuse_ino_t parent, const char* name, mode_t mode) {
   const std::string text = name;
-  const ino_t number = std::strtoul(text.substr(text.rfind('@') + 1).c_str(), nullptr, 10);
+  const std::size_t mark = text.rfind('@');
+  const ino_t number = mark == std::string::npos
+                           ? kFirstOwnNumber + nodes.size()
+                           : std::strtoul(text.substr(mark + 1).c_str(), nullptr, 10);
   nodes.push_back({About(number, mode), parent, text});
   Touch(parent);
   ReplyEntry(request, nodes.size() - 1);
@@ -85,6 +101,16 @@ void RemoveFolder(fuse_req_t request, fuse_ino_t parent, const char* name) {
   fuse_reply_err(request, 0);
 }
 
+void Rename(fuse_req_t request, fuse_ino_t parent, const char* name, fuse_ino_t newParent,
+            const char* newName, unsigned) {
+  Node& moved = nodes[Child(parent, name)];
+  moved.parent = newParent;
+  moved.name = newName;
+  Touch(parent);
+  Touch(newParent);
+  fuse_reply_err(request, 0);
+}
+
 void ReadFolder(fuse_req_t request, fuse_ino_t folder, size_t size, off_t offset, fuse_file_info*) {
   std::vector<char> buffer(size);
   size_t used = 0;
@@ -99,19 +125,40 @@ void ReadFolder(fuse_req_t request, fuse_ino_t folder, size_t size, off_t offset
   fuse_reply_buf(request, buffer.data(), used);
 }
 
-[[noreturn]] void Serve(const std::string& place) {
+// A block device that lasts as long as the process; empty where there is none.
+std::string MakeBlockDevice(const std::string& file) {
+  constexpr off_t kSize = 1 << 20;
+  loop_config config{};
+  config.fd = static_cast<__u32>(open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
+  config.info.lo_flags = LO_FLAGS_AUTOCLEAR;
+  const int control = open("/dev/loop-control", O_RDWR | O_CLOEXEC);
+  const int number = ioctl(control, LOOP_CTL_GET_FREE);
+  std::string device = "/dev/loop" + std::to_string(number);
+  const int loop = open(device.c_str(), O_RDWR | O_CLOEXEC);
+  const bool isMade = ftruncate(static_cast<int>(config.fd), kSize) == 0 &&
+                      ioctl(loop, LOOP_CONFIGURE, &config) == 0;
+  return isMade ? device : "";
+}
+
+[[noreturn]] void Serve(const std::string& place, NumberedFileSystem::On on) {
   nodes.resize(FUSE_ROOT_ID + 1);
   nodes[FUSE_ROOT_ID].about = About(FUSE_ROOT_ID, S_IFDIR | 0755);
   fuse_lowlevel_ops operations{};
   operations.lookup = LookUp;
   operations.getattr = GetAttributes;
+  operations.setattr = SetAttributes;
   operations.mkdir = MakeFolderNode;
   operations.mknod = MakeNode;
   operations.rmdir = RemoveFolder;
+  operations.rename = Rename;
   operations.readdir = ReadFolder;
+  std::string options = "-oallow_other,default_permissions";
+  if (on == NumberedFileSystem::On::kBlockDevice) {
+    options += ",blkdev,fsname=" + MakeBlockDevice(place + ".image");
+  }
   char name[] = "numbered";
-  char* arguments[] = {name, nullptr};
-  fuse_args given = FUSE_ARGS_INIT(1, arguments);
+  char* arguments[] = {name, options.data(), nullptr};
+  fuse_args given = FUSE_ARGS_INIT(2, arguments);
   fuse_session* const session = fuse_session_new(&given, &operations, sizeof operations, nullptr);
   if (session != nullptr && fuse_session_mount(session, place.c_str()) == 0) {
     fuse_session_loop(session);
@@ -121,12 +168,12 @@ void ReadFolder(fuse_req_t request, fuse_ino_t folder, size_t size, off_t offset
 
 }  // namespace
 
-NumberedFileSystem::NumberedFileSystem() {
+NumberedFileSystem::NumberedFileSystem(On on) {
   const std::string place = mFolder.MakeFolder("numbered");
   struct stat before {};
   stat(place.c_str(), &before);
   mServer = fork();
-  if (mServer == 0) Serve(place);
+  if (mServer == 0) Serve(place, on);
   for (int i = 0; i < 500 && !mIsMounted; ++i) {
     std::this_thread::sleep_for(std::chrono::milliseconds(10));
     struct stat now {};

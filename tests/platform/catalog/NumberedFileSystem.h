@@ -1,5 +1,6 @@
 // A file system whose items have the inode numbers that a test gives them: the number behind the
-// last '@' of their names. Folders alone can be made and removed in it.
+// last '@' of their names, else one of their own. Nothing can be written, and folders alone can be
+// removed; nothing can be moved to where something is.
 #pragma once
 
 #include <sys/types.h>
@@ -13,8 +14,11 @@ namespace tallowmere::test {
 
 class NumberedFileSystem {
  public:
+  // On a block device it passes for a file system of a disk: fuseblk.
+  enum class On { kNothing, kBlockDevice };
+
   // Served by a child process. REQUIRES: the test is in a mount namespace of its own.
-  NumberedFileSystem();
+  explicit NumberedFileSystem(On on = On::kNothing);
   NumberedFileSystem(const NumberedFileSystem&) = delete;
   NumberedFileSystem& operator=(const NumberedFileSystem&) = delete;
   ~NumberedFileSystem();
