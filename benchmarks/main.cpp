@@ -77,7 +77,8 @@ std::string MachineLine() {
 
 std::vector<Measure> AllMeasures() {
   std::vector<Measure> all;
-  for (const auto& measures : {RoundTripMeasures(), ProcessMeasures(), NodeIDMeasures()}) {
+  for (const auto& measures :
+       {RoundTripMeasures(), ProcessMeasures(), NodeIDMeasures(), FileSystemMeasures()}) {
     all.insert(all.end(), measures.begin(), measures.end());
   }
   return all;
