@@ -137,7 +137,12 @@ class KindVolume {
       if (!mMemory->IsMounted()) mObstacle = "mounting is not permitted";
       return;
     }
-    mImage = std::make_unique<test::FileSystemImage>(kind.type, kind.command, kind.size);
+    try {
+      mImage = std::make_unique<test::FileSystemImage>(kind.type, kind.command, kind.size);
+    } catch (const std::filesystem::filesystem_error& error) {
+      mObstacle = error.code().message();
+      return;
+    }
     mTop = mImage->Path();
     if (!mImage->IsMade()) {
       mObstacle = kind.command.front() + " fails or is not installed";
@@ -182,7 +187,7 @@ std::vector<Figure> WarmBeside(const Settings& settings, const std::string& what
 }
 
 std::vector<Figure> WarmByKind(const Settings& settings) {
-  const std::string what = "node id, warm, ";
+  const std::string what = "node id, warm";
   if (!test::EnterOwnMountNamespace()) return {Skipped(what, "mounting is not permitted")};
   const auto kinds = Kinds();
   std::vector<std::unique_ptr<KindVolume>> volumes;
@@ -193,7 +198,7 @@ std::vector<Figure> WarmByKind(const Settings& settings) {
   std::this_thread::sleep_for(settings.settle);
   std::vector<Figure> figures;
   for (std::size_t i = 1; i < kinds.size(); ++i) {
-    const std::string name = what + kinds[i].what + " / " + kinds[0].what;
+    const std::string name = what + ", " + kinds[i].what + " / " + kinds[0].what;
     const std::string obstacle = volumes[0]->Obstacle() + volumes[i]->Obstacle();
     if (!obstacle.empty()) {
       figures.push_back(Skipped(name, obstacle));
