@@ -44,9 +44,9 @@ double TimeOfWayBack(Server& service, const Item& item) {
 }
 
 double MedianOfWayBack(Server& service, const Item& item) {
-  constexpr int kTimes = 15;
-  std::vector<double> times;
-  for (int i = 0; i < kTimes; ++i) times.push_back(TimeOfWayBack(service, item));
+  constexpr std::size_t kTimes = 15;
+  std::vector<double> times(kTimes);
+  for (double& time : times) time = TimeOfWayBack(service, item);
   return Median(times);
 }
 
@@ -191,6 +191,7 @@ std::vector<Figure> WarmByKind(const Settings& settings) {
   if (!test::EnterOwnMountNamespace()) return {Skipped(what, "mounting is not permitted")};
   const auto kinds = Kinds();
   std::vector<std::unique_ptr<KindVolume>> volumes;
+  volumes.reserve(kinds.size());
   for (const Kind& kind : kinds) {
     volumes.push_back(
         std::make_unique<KindVolume>(kind, std::min(kFoldersBeside, settings.entries)));
