@@ -17,8 +17,7 @@ constexpr std::size_t kFoldersInAFolder = 8;
 // Without a limit on how much there can be in it; what is there takes memory.
 constexpr const char* kNoLimit = "size=0,nr_inodes=0,mode=0755";
 
-// Memory's inode numbers count from 1, and the first ones are no node ids: whether an item that has
-// one is the only one with its id takes a look at the whole volume.
+// Memory's inode numbers count from 1, and those below this are not the node ids of their items.
 constexpr std::uint64_t kReservedInodes = 16;
 
 }  // namespace

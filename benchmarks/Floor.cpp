@@ -1,24 +1,25 @@
-// The floor: what no service for these requests can do without.
+// The floors: what no service for these requests can do without.
 //
-// tallowmere_floor PARENT_PROCESS_ID ITEM VOLUME_NAME: reads, field by field, a request (0 and
-// unknown codes end it), writes an answer of constant content field by field, and looks for its
-// parent, with the very calls that the service makes for that. In between it makes the fewest
-// file-system calls that an answer can rest on, given a memory without cost of everything that an
-// earlier request has told:
+// tallowmere_floor PARENT_PROCESS_ID ITEM VOLUME_NAME [sound]: reads, field by field, a request (0
+// and unknown codes end it), writes an answer of constant content field by field, and looks for its
+// parent, with the very calls that the service makes for that. In between it makes calls on files,
+// given a memory without cost of everything that an earlier request has told; the mount table is
+// read once. There are two floors:
 //
-// - One poll on the mount table where the answer depends on which volumes there are. The table is
-//   read once.
-// - One look (statx) at everything that the answer claims to exist, as all else of it can have been
-//   remembered: that the folder with an id is still at its place (one look at that place) and that
-//   a path leads to an item (one look at the path, whatever its depth, which proves the folders on
-//   the way too).
+// - The lean one makes the fewest calls that an answer can rest on if nothing changes between two
+//   of them: one poll on the mount table where the answer depends on which volumes there are, and
+//   one look (statx) at everything that the answer claims to exist.
+// - The sound one makes the calls that an answer needs which is right whatever happens meanwhile,
+//   about an item that is some seconds old on a disk.
 //
-// ITEM is the path of an existing item with a name that is its HFS name, the one that the requests
-// are about.
+// ITEM is the canonical path of an existing item with a name that is its HFS name, the one that the
+// requests are about.
 #include <fcntl.h>
+#include <linux/openat2.h>
 #include <poll.h>
 #include <signal.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <array>
@@ -26,6 +27,7 @@
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
+#include <string_view>
 
 #include "service/Protocol.h"
 
@@ -35,33 +37,46 @@ using namespace tallowmere::protocol;
 
 // What is done for a request, a character each. Fields: digits are so many bytes, 'r' a record, 's'
 // a counted string; in an answer 'i' is the path of the item, 'n' its name, 'v' the volume's, 'b'
-// as many bytes as the request's last 16-bit field says, and 'e' the settings. Looks: 'i' at the
-// item, 'f' at the folder that holds it, 'p' the poll.
+// as many bytes as the request's last 16-bit field says, and 'e' the settings. Looks:
+//
+//   i  at the item, at its path                l  the same by lstat, as the host's logic asks
+//   f  at the item's folder, at its path       d  the same by lstat
+//   o  opens the folder, by a path without links; it is held
+//   h  at the folder that is held              n  at the item, by its name in that folder
+//   c  closes the folder                       p  the poll on the mount table
 struct Steps {
   const char* fields;
-  const char* looks;
+  const char* lean;
+  const char* sound;
   const char* answer;
 };
 
+// Sound answers: "oh" finds out which folder it is and which mount it is on; "p" comes behind it,
+// as a mount keeps its number only while something on it is held; "n" is the item with the name in
+// that very folder; a path in the answer takes one look along all of it, "i", that finds that item.
 constexpr auto kSteps = std::to_array<Steps>({
     {},
-    // What kind of item is there, and is its folder the one whose names are remembered?
-    {"s21", "ifp", "2b"},
+    // Lean: what kind of item is there, and is its folder the one whose names are remembered?
+    // Sound: the host's logic asks whether each of both is a folder; the names are those of the
+    // walk to the folder, and the item tells which volume it is on.
+    {"s21", "ifp", "ldohpnc", "2b"},
     // Plain names are the names of Linux: the kernel walks the whole path in one look.
-    {"ss1", "pi", "2i"},
-    {"s", "p", "2"},
-    {"2", "p", "1v"},
-    // The kernel says too whether the item is a mounted root, which is called as its volume.
-    {"s2", "ip", "1n"},
+    {"ss1", "pi", "ohpnic", "2i"},
+    {"s", "p", "p", "2"},
+    {"2", "p", "p", "1v"},
+    // The kernel says too whether the item is a mounted root, which is called as its volume. The
+    // host's logic asks first whether the item exists.
+    {"s2", "ip", "lohpnc", "1n"},
     // The item is there and so is its folder. Whether that is on a volume decides what a name is.
-    {"ss1", "ip", "1i"},
+    // The host's logic asks first whether the folder is one.
+    {"ss1", "ip", "dohpnic", "1i"},
     // There is the item, and the record has the number of its folder.
-    {"s", "ifp", "1r"},
+    {"s", "ifp", "ohpnc", "1r"},
     // The folder with the id is where it was, and has the item; the next one too.
-    {"24s1", "pfi", "1i"},
-    {"r11", "pfi", "1i"},
+    {"24s1", "pfi", "ohpnic", "1i"},
+    {"r11", "pfi", "ohpnic", "1i"},
     // Asks nobody.
-    {"4414", "", "2e"},
+    {"4414", "", "", "2e"},
 });
 static_assert(kSteps.size() == kLastRequestCode + 1);
 
@@ -95,10 +110,22 @@ void PutString(const char* text) {
   Put(text, size);
 }
 
-void LookAt(const char* path) {
+void LookAt(int at, const char* path, int flags = 0) {
   struct statx about {};
-  statx(AT_FDCWD, path, AT_SYMLINK_NOFOLLOW | AT_NO_AUTOMOUNT, STATX_BASIC_STATS | STATX_MNT_ID,
-        &about);
+  statx(at, path, AT_SYMLINK_NOFOLLOW | AT_NO_AUTOMOUNT | flags,
+        STATX_BASIC_STATS | STATX_BTIME | STATX_MNT_ID, &about);
+}
+
+void AskFor(const char* path) {
+  struct stat about {};
+  lstat(path, &about);
+}
+
+int OpenWithoutLinks(const char* path) {
+  open_how how{};
+  how.flags = O_PATH | O_NOFOLLOW | O_CLOEXEC;
+  how.resolve = RESOLVE_NO_SYMLINKS;
+  return static_cast<int>(syscall(SYS_openat2, AT_FDCWD, path, &how, sizeof how));
 }
 
 void PollMountTable() {
@@ -109,6 +136,49 @@ void PollMountTable() {
   } else {
     pollfd watched{table, POLLPRI, 0};
     poll(&watched, 1, 0);
+  }
+}
+
+// The item that the requests are about.
+struct Place {
+  const char* item;
+  const char* folder;
+  const char* name;
+  const char* volume;
+};
+
+void Look(const char* looks, const Place& place) {
+  int held = -1;
+  for (; *looks != '\0'; ++looks) {
+    switch (*looks) {
+      case 'i':
+        LookAt(AT_FDCWD, place.item);
+        break;
+      case 'f':
+        LookAt(AT_FDCWD, place.folder);
+        break;
+      case 'l':
+        AskFor(place.item);
+        break;
+      case 'd':
+        AskFor(place.folder);
+        break;
+      case 'o':
+        held = OpenWithoutLinks(place.folder);
+        break;
+      case 'h':
+        LookAt(held, "", AT_EMPTY_PATH);
+        break;
+      case 'n':
+        LookAt(held, place.name);
+        break;
+      case 'c':
+        close(held);
+        break;
+      case 'p':
+        PollMountTable();
+        break;
+    }
   }
 }
 
@@ -131,18 +201,17 @@ void TakeFields(const char* fields, std::uint16_t& last) {
   }
 }
 
-void PutAnswer(const char* fields, std::uint16_t size, const char* item, const char* name,
-               const char* volume) {
+void PutAnswer(const char* fields, std::uint16_t size, const Place& place) {
   for (; *fields != '\0'; ++fields) {
     switch (*fields) {
       case 'i':
-        PutString(item);
+        PutString(place.item);
         break;
       case 'n':
-        PutString(name);
+        PutString(place.name);
         break;
       case 'v':
-        PutString(volume);
+        PutString(place.volume);
         break;
       case 'b':
         Put(answer, size);
@@ -161,20 +230,21 @@ void PutAnswer(const char* fields, std::uint16_t size, const char* item, const c
 }  // namespace
 
 int main(int count, char** arguments) {
-  if (count != 4) return EXIT_FAILURE;
+  if (count < 4) return EXIT_FAILURE;
+  const bool isSound = count > 4 && std::string_view(arguments[4]) == "sound";
   const pid_t parent = std::atoi(arguments[1]);  // NOLINT(cert-err34-c)
   const char* const item = arguments[2];
   const char* const name = std::strrchr(item, '/') + 1;
   static char folder[PATH_MAX];
   std::memcpy(folder, item, static_cast<std::size_t>(name - 1 - item));
+  const Place place{item, folder, name, arguments[3]};
   do {
     const std::uint16_t code = TakeU16();
     if (code == kRequestQuit || code > kLastRequestCode) break;
+    const Steps& steps = kSteps[code];
     std::uint16_t size = 0;
-    TakeFields(kSteps[code].fields, size);
-    for (const char* look = kSteps[code].looks; *look != '\0'; ++look) {
-      *look == 'p' ? PollMountTable() : LookAt(*look == 'i' ? item : folder);
-    }
-    PutAnswer(kSteps[code].answer, size, item, name, arguments[3]);
+    TakeFields(steps.fields, size);
+    Look(isSound ? steps.sound : steps.lean, place);
+    PutAnswer(steps.answer, size, place);
   } while (kill(parent, 0) == 0);
 }

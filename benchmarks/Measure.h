@@ -50,8 +50,11 @@ std::vector<Measure> RoundTripMeasures();
 // The service as a process, "start", "batch" and "memory".
 std::vector<Measure> ProcessMeasures();
 
-// From a node id to its item, "warm", "cold" and "privileged".
+// From a node id to its item, "warm" and "cold".
 std::vector<Measure> NodeIDMeasures();
+
+// The same on kinds of file systems, "kinds", "privileged" and "untrusted".
+std::vector<Measure> FileSystemMeasures();
 
 // The middle one; of an even number the upper one of two. REQUIRES: there is one.
 double Median(std::vector<double> values);

@@ -1,19 +1,15 @@
-// Pieces of the service in one process, by Google Benchmark: where the time of a request goes.
+// Pieces of a request in one process, by Google Benchmark: where its time goes, by calls of the
+// host and by steps of the service.
+#include <CFOwned.h>
 #include <CFileRef.h>
 #include <CoreServices/CoreServices.h>
 #include <LegacyHFSBridge.h>
 #include <benchmark/benchmark.h>
-#include <fcntl.h>
 
-#include <fstream>
-#include <sstream>
+#include <cstdlib>
 #include <string>
+#include <vector>
 
-#include "files/Catalog.h"
-#include "files/HFSNames.h"
-#include "files/MountInfo.h"
-#include "files/MountTable.h"
-#include "files/PlaceMemory.h"
 #include "support/TemporaryFolder.h"
 
 namespace {
@@ -22,57 +18,118 @@ using namespace tallowmere;
 using benchmark::DoNotOptimize;
 using benchmark::State;
 
-void PlainNameToHFS(State& state) {
-  for ([[maybe_unused]] auto _ : state) DoNotOptimize(files::PlainHFSName("Mix 1 (final).aif", 63));
-}
-BENCHMARK(PlainNameToHFS);
+constexpr const char* kPlainName = "Mix 1 (final).aif";
+constexpr const char* kAccentedName = "Été à Genève.aif";
 
-void AccentedNameToHFS(State& state) {
-  for ([[maybe_unused]] auto _ : state) DoNotOptimize(files::PlainHFSName("Été à Genève.aif", 63));
-}
-BENCHMARK(AccentedNameToHFS);
+// A new file and what the host calls it.
+struct File {
+  explicit File(const char* name = kPlainName) : path(folder.MakeFile(name)) {
+    if (!CFileRef(path.c_str(), false).GetFSRef(&reference) ||
+        FSGetCatalogInfo(&reference, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr) != noErr) {
+      std::abort();
+    }
+  }
 
-void HFSNameToSpelledNames(State& state) {
-  for ([[maybe_unused]] auto _ : state) DoNotOptimize(files::SpellHFSName("Mix 1 (final).aif"));
-}
-BENCHMARK(HFSNameToSpelledNames);
+  test::TemporaryFolder folder;
+  std::string path;
+  FSRef reference{};
+  FSSpec spec{};
+};
 
-void ParseTheMountTable(State& state) {
-  std::ostringstream text;
-  text << std::ifstream("/proc/self/mountinfo").rdbuf();
-  for ([[maybe_unused]] auto _ : state) DoNotOptimize(files::ParseMountInfo(text.str()));
-}
-BENCHMARK(ParseTheMountTable);
+// --- Calls of the host --------------------------------------------------------------------------
 
-void AskTheMountTable(State& state) {
-  for ([[maybe_unused]] auto _ : state)
-    DoNotOptimize(files::MountTable::OfThisProcess().WithNumber(0));
-}
-BENCHMARK(AskTheMountTable);
-
-void RememberAPlace(State& state) {
-  const std::size_t places = static_cast<std::size_t>(state.range(0));
-  files::PlaceMemory memory(places * 256);
-  files::ItemReference item{};
+void VolumeOfANumber(State& state) {
+  const File file;
   for ([[maybe_unused]] auto _ : state) {
-    item.inode = (item.inode + 1) % (2 * places);
-    memory.Remember(item, "/home/ann/Music/1994/Mixes");
+    HParamBlockRec volume{};
+    volume.volumeParam.ioVRefNum = file.spec.vRefNum;
+    DoNotOptimize(PBHGetVInfoSync(&volume));
   }
 }
-BENCHMARK(RememberAPlace)->Arg(10)->Arg(1000)->Arg(100'000);
+BENCHMARK(VolumeOfANumber);
 
-void LookAtAPlace(State& state) {
-  const test::TemporaryFolder folder;
-  const std::string path = folder.MakeFile("Mix 1.aif");
-  for ([[maybe_unused]] auto _ : state) DoNotOptimize(files::PlaceAt(path));
+void AllVolumes(State& state) {
+  HParamBlockRec volume{};
+  for ([[maybe_unused]] auto _ : state) {
+    volume = {};
+    do ++volume.volumeParam.ioVolIndex;
+    while (PBHGetVInfoSync(&volume) == noErr);
+  }
+  state.counters["volumes"] = volume.volumeParam.ioVolIndex - 1;
 }
-BENCHMARK(LookAtAPlace);
+BENCHMARK(AllVolumes);
+
+// Files are asked for in turn; beyond some thousands the places of the first are forgotten
+// meanwhile.
+void ReferenceOfAPath(State& state) {
+  const test::TemporaryFolder folder;
+  std::vector<std::string> paths;
+  for (int64_t i = 0; i < state.range(0); ++i) paths.push_back(folder.MakeFile(std::to_string(i)));
+  std::size_t next = 0;
+  for ([[maybe_unused]] auto _ : state) {
+    FSRef reference;
+    DoNotOptimize(CFileRef(paths[next].c_str(), false).GetFSRef(&reference));
+    next = (next + 1) % paths.size();
+  }
+}
+BENCHMARK(ReferenceOfAPath)->Arg(1)->Arg(1000)->Arg(10'000);
+
+void PathOfAReference(State& state) {
+  const File file;
+  for ([[maybe_unused]] auto _ : state) {
+    DoNotOptimize(CFOwned<CFURLRef>(CFURLCreateFromFSRef(nullptr, &file.reference)));
+  }
+}
+BENCHMARK(PathOfAReference);
+
+void SpecOfAReference(State& state, const char* name) {
+  const File file(name);
+  for ([[maybe_unused]] auto _ : state) {
+    FSSpec spec;
+    DoNotOptimize(
+        FSGetCatalogInfo(&file.reference, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr));
+  }
+}
+BENCHMARK_CAPTURE(SpecOfAReference, plain_name, kPlainName);
+BENCHMARK_CAPTURE(SpecOfAReference, accented_name, kAccentedName);
+
+void ReferenceOfASpec(State& state, const char* name) {
+  const File file(name);
+  for ([[maybe_unused]] auto _ : state) {
+    FSRef reference;
+    DoNotOptimize(FSpMakeFSRef(&file.spec, &reference));
+  }
+}
+BENCHMARK_CAPTURE(ReferenceOfASpec, plain_name, kPlainName);
+BENCHMARK_CAPTURE(ReferenceOfASpec, accented_name, kAccentedName);
+
+void ReferenceOfANodeID(State& state) {
+  const File file;
+  for ([[maybe_unused]] auto _ : state) {
+    FSRef reference;
+    DoNotOptimize(
+        FSResolveNodeID(file.spec.vRefNum, static_cast<UInt32>(file.spec.parID), &reference));
+  }
+}
+BENCHMARK(ReferenceOfANodeID);
+
+void ParentOfAFolder(State& state) {
+  const File file;
+  for ([[maybe_unused]] auto _ : state) {
+    Str255 name;
+    CInfoPBRec folder{};
+    folder.dirInfo = {name, file.spec.vRefNum, -1, file.spec.parID, 0};
+    DoNotOptimize(PBGetCatInfoSync(&folder));
+  }
+}
+BENCHMARK(ParentOfAFolder);
+
+// --- Steps of the service -----------------------------------------------------------------------
 
 void RecordOfAPath(State& state) {
-  const test::TemporaryFolder folder;
-  const std::string path = folder.MakeFile("Mix 1.aif");
+  const File file;
   for ([[maybe_unused]] auto _ : state) {
-    const CFileRef item(path.c_str(), true);
+    const CFileRef item(file.path.c_str(), true);
     FSSpec spec;
     DoNotOptimize(CFileUtilGetDeprecatedFSSpecThroughIPC(item, &spec));
   }
@@ -80,24 +137,21 @@ void RecordOfAPath(State& state) {
 BENCHMARK(RecordOfAPath);
 
 void PathOfARecord(State& state) {
-  const test::TemporaryFolder folder;
-  const std::string path = folder.MakeFile("Mix 1.aif");
-  FSSpec spec;
-  CFileUtilGetDeprecatedFSSpecThroughIPC(CFileRef(path.c_str(), true), &spec);
+  const File file;
   for ([[maybe_unused]] auto _ : state) {
     CFileRef item;
-    DoNotOptimize(CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC(&item, &spec, false, false));
+    DoNotOptimize(
+        CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC(&item, &file.spec, false, false));
   }
 }
 BENCHMARK(PathOfARecord);
 
 void FullPathOfAPath(State& state) {
-  const test::TemporaryFolder folder;
-  const std::string path = folder.MakeFile("Mix 1.aif");
+  const File file;
   char full[1024];
   for ([[maybe_unused]] auto _ : state) {
     CFileRef item;
-    item.Set(path.c_str(), false);
+    item.Set(file.path.c_str(), false);
     DoNotOptimize(CFileUtilMakeFullPath(item, full, sizeof full, 1));
   }
 }

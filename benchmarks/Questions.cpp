@@ -44,6 +44,15 @@ std::string NameOfVolume(Server& service, int number) {
   return std::string(service.Ask({}, length + kTrailer.size()).substr(0, length - 1));
 }
 
+Item ItemWithRecord(Server& service, const std::filesystem::path& path) {
+  Item item{};
+  item.path = path;
+  const std::string answer = AnswerTo(service, QuestionOf(protocol::kRequestGetFSSpec, item));
+  if (answer[0] != 1) Fail("no record of " + item.path);
+  item.record = answer.substr(1);
+  return item;
+}
+
 // Of the fields of an answer, in bytes.
 std::size_t SizeOfAnswer(protocol::RequestCode code, const Item& item) {
   switch (code) {
@@ -90,13 +99,9 @@ std::filesystem::path SettledFile(const Settings& settings, int components) {
 
 Item AskAbout(const std::string& program, const std::filesystem::path& path) {
   Server service(program, {std::to_string(getpid())});
-  Item item{};
-  item.path = path;
+  Item item = ItemWithRecord(service, path);
   item.folder = path.parent_path();
   item.name = path.filename();
-  const std::string answer = AnswerTo(service, QuestionOf(protocol::kRequestGetFSSpec, item));
-  if (answer[0] != 1) Fail("no record of " + item.path);
-  item.record = answer.substr(1);
   item.volume = NumberAt<std::int16_t>(item.record, 0);
   item.folderID = NumberAt<std::int32_t>(item.record, sizeof(std::int16_t));
   item.volumeName = NameOfVolume(service, item.volume);
@@ -106,6 +111,15 @@ Item AskAbout(const std::string& program, const std::filesystem::path& path) {
       AnswerTo(service, QuestionOf(protocol::kRequestSetFileRefFromFSSpec, item));
   if (back.c_str() + 1 + sizeof(std::uint16_t) != item.path) Fail("no way back to " + item.path);
   return item;
+}
+
+std::vector<Item> RecordsOf(const std::string& program,
+                            const std::vector<std::filesystem::path>& paths) {
+  Server service(program, {std::to_string(getpid())});
+  std::vector<Item> items;
+  items.reserve(paths.size());
+  for (const auto& path : paths) items.push_back(ItemWithRecord(service, path));
+  return items;
 }
 
 Question QuestionOf(protocol::RequestCode code, const Item& item) {

@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <filesystem>
 #include <string>
+#include <vector>
 
 #include "Measure.h"
 #include "service/Protocol.h"
@@ -20,6 +21,10 @@ std::filesystem::path SettledFile(const Settings& settings, int components);
 // Asks the service at `program` about an existing item. Fails where its answers are not those for
 // an item with a plain name.
 Item AskAbout(const std::string& program, const std::filesystem::path& path);
+
+// Existing items with their paths and records alone, told by the service at `program`.
+std::vector<Item> RecordsOf(const std::string& program,
+                            const std::vector<std::filesystem::path>& paths);
 
 struct Question {
   std::string request;

@@ -19,17 +19,23 @@ struct Row {
 };
 
 constexpr auto kRows = std::to_array<Row>({
-    {protocol::kRequestMakeFullPath, 8, 1.40, 2.5},
-    {protocol::kRequestMakeFileRefFromPath, 8, 1.40, 2.5},
-    {protocol::kRequestGetVolRefnumByHFSName, 6, 1.10, 1.3},
-    {protocol::kRequestGetHFSVolumeName, 6, 1.10, 1.3},
-    {protocol::kRequestGetHFSName, 6, 1.25, 1.8},
-    {protocol::kRequestAddHFSName, 6, 1.25, 1.8},
-    {protocol::kRequestGetFSSpec, 6, 1.25, 1.8},
-    {protocol::kRequestSetFileRefFromFSSpecData, 6, 1.25, 1.8},
-    {protocol::kRequestSetFileRefFromFSSpec, 6, 1.25, 1.8},
-    {protocol::kRequestGetAIFFExportSettings, 6, 1.10, 1.3},
+    {protocol::kRequestMakeFullPath, 8, 1.70, 2.00},
+    {protocol::kRequestMakeFileRefFromPath, 8, 1.45, 1.45},
+    {protocol::kRequestGetVolRefnumByHFSName, 6, 1.10, 1.10},
+    {protocol::kRequestGetHFSVolumeName, 6, 1.10, 1.10},
+    {protocol::kRequestGetHFSName, 6, 1.30, 1.45},
+    {protocol::kRequestAddHFSName, 6, 1.45, 1.55},
+    {protocol::kRequestGetFSSpec, 6, 1.30, 1.30},
+    {protocol::kRequestSetFileRefFromFSSpecData, 6, 1.45, 1.45},
+    {protocol::kRequestSetFileRefFromFSSpec, 6, 1.45, 1.45},
+    {protocol::kRequestGetAIFFExportSettings, 6, 1.10, 1.20},
 });
+
+// Of the processor time over that of the sound floor, for every code.
+constexpr double kBarOverSoundFloor = 1.25;
+
+// The contestants, in their order.
+enum : std::size_t { kService, kFloor, kSoundFloor, kPeer };
 
 // One contestant over another in each run.
 Figure RatioIn(const std::vector<std::vector<Cost>>& runs, const std::string& what,
@@ -55,18 +61,37 @@ std::optional<Question> PeerQuestion(protocol::RequestCode code, const std::stri
   }
 }
 
+std::vector<Figure> FiguresOf(const Row& row, const std::vector<std::vector<Cost>>& runs) {
+  const std::string code = "code " + std::to_string(row.code);
+  return {AtMost(row.barOfRoundTrip,
+                 RatioIn(runs, code + ": round trip / floor", kService, kFloor, &Cost::roundTrip)),
+          AtMost(row.barOfProcessor, RatioIn(runs, code + ": processor time / floor", kService,
+                                             kFloor, &Cost::processor)),
+          AtMost(kBarOverSoundFloor, RatioIn(runs, code + ": processor time / sound floor",
+                                             kService, kSoundFloor, &Cost::processor))};
+}
+
+std::vector<Figure> FiguresBesidePeer(const Row& row, const std::vector<std::vector<Cost>>& runs) {
+  const std::string code = "code " + std::to_string(row.code);
+  const std::string name = row.code == protocol::kRequestGetFSSpec ? "LSTAT" : "REALPATH";
+  return {RatioIn(runs, code + " / SFTP " + name, kService, kPeer, &Cost::roundTrip),
+          RatioIn(runs, "floor of " + code + " / SFTP " + name, kFloor, kPeer, &Cost::roundTrip)};
+}
+
 std::vector<Figure> Take(const Row& row, const Settings& settings) {
   const Item item = AskAbout(settings.service, SettledFile(settings, row.components));
   const Question question = QuestionOf(row.code, item);
   const std::string parent = std::to_string(getpid());
   Server service(settings.service, {parent});
   Server floor(TALLOWMERE_FLOOR, {parent, item.path, item.volumeName});
+  Server soundFloor(TALLOWMERE_FLOOR, {parent, item.path, item.volumeName, "sound"});
   // From then on the folder is a remembered one.
   const Question record = QuestionOf(protocol::kRequestGetFSSpec, item);
   service.Ask(record.request, record.answerSize);
 
   std::vector<Contestant> contestants{{&service, question.request, question.answerSize},
-                                      {&floor, question.request, question.answerSize}};
+                                      {&floor, question.request, question.answerSize},
+                                      {&soundFloor, question.request, question.answerSize}};
   const auto peerQuestion = PeerQuestion(row.code, item.path);
   std::optional<FileServer> peer;
   if (peerQuestion && FileServer::IsInstalled()) {
@@ -79,19 +104,12 @@ std::vector<Figure> Take(const Row& row, const Settings& settings) {
     runs.push_back(Compete(contestants, settings.requests));
   }
 
-  const std::string code = "code " + std::to_string(row.code);
-  std::vector<Figure> figures{
-      AtMost(row.barOfRoundTrip,
-             RatioIn(runs, code + ": round trip / floor", 0, 1, &Cost::roundTrip)),
-      AtMost(row.barOfProcessor,
-             RatioIn(runs, code + ": processor time / floor", 0, 1, &Cost::processor))};
+  std::vector<Figure> figures = FiguresOf(row, runs);
   if (peer) {
-    const std::string name = row.code == protocol::kRequestGetFSSpec ? "LSTAT" : "REALPATH";
-    figures.push_back(RatioIn(runs, code + " / SFTP " + name, 0, 2, &Cost::roundTrip));
-    figures.push_back(
-        RatioIn(runs, "floor of " + code + " / SFTP " + name, 1, 2, &Cost::roundTrip));
+    for (const Figure& figure : FiguresBesidePeer(row, runs)) figures.push_back(figure);
   } else if (peerQuestion) {
-    figures.push_back(Skipped(code + " / SFTP", "openssh-sftp-server is not installed"));
+    const std::string what = "code " + std::to_string(row.code) + " / SFTP";
+    figures.push_back(Skipped(what, "openssh-sftp-server is not installed"));
   }
   return figures;
 }

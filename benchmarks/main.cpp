@@ -4,6 +4,8 @@
 #include <sys/utsname.h>
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
+#include <array>
 #include <cstdio>
 #include <fstream>
 #include <iostream>
@@ -49,7 +51,7 @@ std::string Padded(std::string text, std::size_t width) {
 }
 
 void PrintRow(const std::vector<std::string>& cells) {
-  static constexpr std::array<std::size_t, 5> kWidths{52, 9, 9, 7, 24};
+  static constexpr std::array<std::size_t, 5> kWidths{60, 9, 9, 7, 24};
   for (std::size_t i = 0; i < cells.size(); ++i) {
     std::cout << "| " << Padded(cells[i], kWidths[i]) << ' ';
   }
@@ -77,25 +79,33 @@ std::string MachineLine() {
 
 std::vector<Measure> AllMeasures() {
   std::vector<Measure> all;
-  for (const auto& measures : {RoundTripMeasures(), ProcessMeasures(), NodeIDMeasures()}) {
+  for (const auto& measures :
+       {RoundTripMeasures(), ProcessMeasures(), NodeIDMeasures(), FileSystemMeasures()}) {
     all.insert(all.end(), measures.begin(), measures.end());
   }
   return all;
 }
 
-int Run(int argumentCount, char** arguments) {
-  const std::vector<Measure> all = AllMeasures();
+// What is asked for on the command line.
+struct Choices {
   Settings settings{TALLOWMERE_SERVICE, 5, 5000, 1'000'000, kTimeToSettle, {}};
   bool isTrial = false;
-  std::vector<std::string> chosen;
+  std::vector<std::string> measures;  // none: all
   std::string json;
   std::string plots;
 
-  CLI::App app("Measures the service against floors and peers and prints one table.");
+  bool Has(const Measure& measure) const {
+    return measures.empty() ||
+           std::find(measures.begin(), measures.end(), measure.name) != measures.end();
+  }
+};
+
+void AddOptions(CLI::App& app, Choices& choices, const std::vector<Measure>& all) {
   std::vector<std::string> names;
   names.reserve(all.size());
   for (const Measure& measure : all) names.push_back(measure.name);
-  app.add_option("--only", chosen, "A measure to take, of all of them; can be repeated")
+  Settings& settings = choices.settings;
+  app.add_option("--only", choices.measures, "A measure to take, of all of them; can be repeated")
       ->check(CLI::IsMember(names));
   app.add_option("--runs", settings.runs, "How often a measure is taken; the table has medians")
       ->check(CLI::Range(1, 1000))
@@ -107,44 +117,56 @@ int Run(int argumentCount, char** arguments) {
       ->check(CLI::Range(100, 100'000'000))
       ->capture_default_str();
   app.add_option("--service", settings.service, "The program to measure")->capture_default_str();
-  app.add_option("--json", json, "A file for the same figures as JSON; \"-\" for standard output");
-  app.add_option("--plots", plots, "Plot how cost grows instead, into that folder")
+  app.add_option("--json", choices.json,
+                 "A file for the same figures as JSON; \"-\" for standard output");
+  app.add_option("--plots", choices.plots, "Plot how cost grows instead, into that folder")
       ->check(CLI::ExistingDirectory);
-  app.add_flag("--trial", isTrial, "Only see that it runs: the figures mean nothing");
-  CLI11_PARSE(app, argumentCount, arguments);
-  if (isTrial) settings = {settings.service, 1, 10, 300, {}, {}};
+  app.add_flag("--trial", choices.isTrial, "Only see that it runs: the figures mean nothing");
+}
 
-  signal(SIGPIPE, SIG_IGN);
-  const test::TemporaryFolder folder;
-  settings.folder = folder.Path();
-  PinToOneCore();
-  if (!plots.empty()) {
-    PlotGrowth(settings, plots);
-    return EXIT_SUCCESS;
-  }
+void PrintFigure(const Figure& figure) {
+  PrintRow({figure.what, figure.value ? TextOf(*figure.value, figure.unit) : "", BarOf(figure),
+            VerdictOf(figure), figure.remark});
+}
 
-  const bool printsTable = json != "-";
+void TakeMeasures(const Choices& choices, const std::vector<Measure>& all) {
+  const bool printsTable = choices.json != "-";
   if (printsTable) {
-    std::cout << MachineLine() << ", medians of " << settings.runs << " runs\n\n";
+    std::cout << MachineLine() << ", medians of " << choices.settings.runs << " runs\n\n";
     PrintRow({"Measure", "Figure", "Bar", "", "Of"});
     PrintRow({"---", "---", "---", "---", "---"});
   }
   auto objects = nlohmann::json::array();
   for (const Measure& measure : all) {
-    if (!chosen.empty() && std::find(chosen.begin(), chosen.end(), measure.name) == chosen.end()) {
-      continue;
-    }
-    for (const Figure& figure : measure.take(settings)) {
+    if (!choices.Has(measure)) continue;
+    for (const Figure& figure : measure.take(choices.settings)) {
       objects.push_back(JSONOf(figure));
-      if (!printsTable) continue;
-      PrintRow({figure.what, figure.value ? TextOf(*figure.value, figure.unit) : "", BarOf(figure),
-                VerdictOf(figure), figure.remark});
+      if (printsTable) PrintFigure(figure);
     }
   }
-  if (json == "-") {
+  if (choices.json == "-") {
     std::cout << objects.dump(2) << '\n';
-  } else if (!json.empty()) {
-    std::ofstream(json) << objects.dump(2) << '\n';
+  } else if (!choices.json.empty()) {
+    std::ofstream(choices.json) << objects.dump(2) << '\n';
+  }
+}
+
+int Run(int argumentCount, char** arguments) {
+  const std::vector<Measure> all = AllMeasures();
+  Choices choices;
+  CLI::App app("Measures the service against floors and peers and prints one table.");
+  AddOptions(app, choices, all);
+  CLI11_PARSE(app, argumentCount, arguments);
+  if (choices.isTrial) choices.settings = {choices.settings.service, 1, 10, 300, {}, {}};
+
+  signal(SIGPIPE, SIG_IGN);
+  const test::TemporaryFolder folder;
+  choices.settings.folder = folder.Path();
+  PinToOneCore();
+  if (choices.plots.empty()) {
+    TakeMeasures(choices, all);
+  } else {
+    PlotGrowth(choices.settings, choices.plots);
   }
   return EXIT_SUCCESS;
 }

@@ -32,7 +32,7 @@ to_test+=(hfsutils qemu-system-x86 busybox-static cpio)
 # Tests on the Debian packages, the manual pages and the completions.
 to_test+=(dpkg-dev file mandoc zsh fish)
 # What the benchmarks compare with, and their pieces in one process.
-to_measure=(libbenchmark-dev openssh-sftp-server bfs e2fsprogs)
+to_measure=(libbenchmark-dev openssh-sftp-server bfs e2fsprogs btrfs-progs xfsprogs bindfs)
 to_check=(clang-format clang-tidy)
 to_fuzz=(clang libclang-rt-dev)
 to_cover=(clang libclang-rt-dev llvm)
