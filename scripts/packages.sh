@@ -26,14 +26,16 @@ need() {
 
 to_build=(g++ cmake ninja-build libcli11-dev nlohmann-json3-dev)
 to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf python3 strace)
-# Tests on file systems that these make, and on a real HFS volume in a machine of its own.
+# Tests on file systems that these make, on the manual pages and the completions.
 to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools)
-to_test+=(hfsutils qemu-system-x86 busybox-static cpio)
-# Tests on the Debian packages, the manual pages and the completions.
-to_test+=(dpkg-dev file mandoc zsh fish)
+to_test+=(mandoc zsh fish)
+# Tests on a real HFS volume in a machine of its own, and on the Debian packages.
+to_emulate=(hfsutils qemu-system-x86 busybox-static cpio)
+to_package=(dpkg-dev file python3)
 # What the benchmarks compare with, and their pieces in one process.
 to_measure=(libbenchmark-dev openssh-sftp-server bfs e2fsprogs btrfs-progs xfsprogs bindfs)
-to_check=(clang-format clang-tidy)
+to_format=(clang-format)
+to_lint=(clang-tidy)
 to_fuzz=(clang libclang-rt-dev)
 to_cover=(clang libclang-rt-dev llvm)
 
@@ -56,9 +58,23 @@ unpack_kernel() {
   rm -f "$1"/*.deb
 }
 
-# build PRESET: configures where that has not been done, and builds.
+# build PRESET [TARGET…]: configures where that has not been done, and builds.
 build() {
-  echo "== Building ($1)"
+  local preset=$1
+  shift
+  echo "== Building ($preset)"
+  configure "$preset"
+  cmake --build --preset "$preset" ${1:+--target "$@"} -- --quiet
+}
+
+configure() {
   [ -f "build/$1/build.ninja" ] || cmake --preset "$1" >/dev/null
-  cmake --build --preset "$1" -- --quiet
+}
+
+# lint CHECKS: what the linter says of the product's sources, by these of the checks in .clang-tidy. Longest first,
+# so that no processor waits for the last one.
+lint() {
+  configure dev
+  find . -path ./build -prune -o -path ./tests -prune -o -path ./fuzz -prune -o -name '*.cpp' -printf '%s %p\n' |
+    sort -rn | cut -d ' ' -f 2 | xargs -P "$(nproc)" -n 1 clang-tidy --quiet --checks="$1" -p build/dev 2>/dev/null
 }

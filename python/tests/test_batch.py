@@ -128,7 +128,7 @@ class Bounds(BatchTest):
 
     def test_the_deadline_is_for_each_answer_not_for_those_before(self) -> None:
         client = self.client("time.sleep(0.1)", deadline=1.5)
-        batch = client.batch(numbers(30))
+        batch = client.batch(numbers(18))
         self.assertEqual(next(batch), b"0")
         self.assertEqual(client.get_hfs_volume_name(99), b"99")
 

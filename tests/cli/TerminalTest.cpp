@@ -1,7 +1,10 @@
 // What people see: colours and the progress bar, on a terminal that script(1) makes.
 
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <stdlib.h>
+#include <unistd.h>
 
 #include "support/ChildProgram.h"
 #include "support/TemporaryFolder.h"
@@ -20,23 +23,41 @@ std::string OnATerminal(const std::string& command) {
   return terminal.ReadToEnd();
 }
 
-TEST(Terminal, HeadsAreBoldAndComplaintsAreRed) {
+// Some containers have no pseudo-terminals.
+bool PseudoTerminalsExist() {
+  const int controller = posix_openpt(O_RDWR | O_NOCTTY);
+  if (controller < 0) return false;
+  const char* const name = unlockpt(controller) == 0 ? ptsname(controller) : nullptr;
+  const int terminal = name != nullptr ? open(name, O_RDWR | O_NOCTTY) : -1;
+  if (terminal >= 0) close(terminal);
+  close(controller);
+  return terminal >= 0;
+}
+
+class Terminal : public testing::Test {
+ protected:
+  void SetUp() override {
+    if (!PseudoTerminalsExist()) GTEST_SKIP() << "there are no pseudo-terminals here";
+  }
+};
+
+TEST_F(Terminal, HeadsAreBoldAndComplaintsAreRed) {
   EXPECT_THAT(OnATerminal("$CLI volumes"), HasSubstr("\x1B[1mvRefNum  name"));
   EXPECT_THAT(OnATerminal("$CLI name /nonexistent"),
               HasSubstr("\x1B[31mtallowmere-cli:\x1B[0m /nonexistent: "));
 }
 
-TEST(Terminal, ColoursCanBeRefused) {
+TEST_F(Terminal, ColoursCanBeRefused) {
   EXPECT_THAT(OnATerminal("NO_COLOR=1 $CLI volumes"), Not(HasSubstr("\x1B[")));
   EXPECT_THAT(OnATerminal("TERM=dumb $CLI volumes"), Not(HasSubstr("\x1B[")));
   EXPECT_THAT(OnATerminal("unset TERM; $CLI volumes"), Not(HasSubstr("\x1B[")));
 }
 
-TEST(Terminal, WhatIsNoTerminalHasNoColours) {
+TEST_F(Terminal, WhatIsNoTerminalHasNoColours) {
   EXPECT_THAT(OnATerminal("$CLI volumes | cat"), Not(HasSubstr("\x1B[")));
 }
 
-TEST(Terminal, ControlCharactersOfAPathAreShownAndNotSent) {
+TEST_F(Terminal, ControlCharactersOfAPathAreShownAndNotSent) {
   const TemporaryFolder folder;
   folder.MakeFile("\x1B[1m\xFF");
   const std::string command =
@@ -45,7 +66,7 @@ TEST(Terminal, ControlCharactersOfAPathAreShownAndNotSent) {
   EXPECT_THAT(OnATerminal(command + " | cat"), HasSubstr("\x1B[1m"));
 }
 
-TEST(Terminal, AComplaintTakesTheProgressBarAway) {
+TEST_F(Terminal, AComplaintTakesTheProgressBarAway) {
   const std::string output =
       OnATerminal("(echo /; sleep 1; echo /; echo /nonexistent) | $CLI name - >/dev/null");
   EXPECT_THAT(output, HasSubstr(" items"));
@@ -54,7 +75,7 @@ TEST(Terminal, AComplaintTakesTheProgressBarAway) {
               Not(HasSubstr("\x1B[")));
 }
 
-TEST(Terminal, LongWorkHasAProgressBarAndShortWorkHasNone) {
+TEST_F(Terminal, LongWorkHasAProgressBarAndShortWorkHasNone) {
   const std::string slowly =
       "(echo /; sleep 1; echo /; sleep 0.4; echo /) | $CLI name - >/dev/null";
   EXPECT_THAT(OnATerminal(slowly), HasSubstr(" items"));

@@ -2,10 +2,15 @@
 #include <gtest/gtest.h>
 
 #include <array>
+#include <filesystem>
+#include <optional>
 #include <ostream>
 #include <string>
+#include <vector>
 
+#include "faults/TwoVolumeRoot.h"
 #include "support/EveryRequest.h"
+#include "support/MountNamespace.h"
 #include "support/TracedService.h"
 
 namespace tallowmere::test {
@@ -22,7 +27,20 @@ std::ostream& operator<<(std::ostream& out, const Calls& calls) {
   return out << "code " << calls.code;
 }
 
-class SystemCalls : public testing::TestWithParam<Calls> {};
+// In a root folder on a volume of its own where that is permitted: of a file system that is mounted
+// at several places each answer takes more.
+class SystemCalls : public testing::TestWithParam<Calls> {
+ protected:
+  void SetUp() override {
+    if (!EnterOwnMountNamespace()) return;
+    const std::filesystem::path temporary = std::filesystem::temp_directory_path();
+    mRoot.emplace(std::vector<std::string>{TALLOWMERE_SERVICE, "/usr/bin/strace"});
+    if (mRoot->IsEntered()) std::filesystem::create_directories(temporary);
+  }
+
+ private:
+  std::optional<TwoVolumeRoot> mRoot;
+};
 
 TEST_P(SystemCalls, AreNoMoreThanThese) {
   const auto [code, reads, writes, mostOfFiles] = GetParam();

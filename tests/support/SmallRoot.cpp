@@ -32,7 +32,7 @@ std::set<std::string> FilesOf(const std::vector<std::string>& programs) {
   std::set<std::string> files;
   for (const std::string& program : programs) {
     files.insert(fs::absolute(program));
-    std::istringstream words(OutputOf("ldd '" + program + "'"));
+    std::istringstream words(OutputOf("ldd '" + program + "' 2>/dev/null"));
     for (std::string word; words >> word;) {
       if (word.starts_with('/') && fs::exists(word)) files.insert(word);
     }
