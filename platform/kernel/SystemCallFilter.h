@@ -16,7 +16,7 @@ struct Openings {
 
 // A program of the kernel's filters: bpf(2), classic.
 struct SystemCallFilter {
-  static constexpr std::size_t kMost = 128;
+  static constexpr std::size_t kMost = 200;
   std::array<sock_filter, kMost> steps;
   unsigned short size = 0;
 };
