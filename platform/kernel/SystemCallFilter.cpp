@@ -193,25 +193,15 @@ constexpr unsigned kOfThisArchitecture[] = {
 constexpr std::span<const unsigned> kOfThisArchitecture;
 #endif
 
-// Which ioctl requests pass: the label of a file system, what xfs tells of its geometry and its
-// items (ioctl_xfs_fsgeometry(2), ioctl_xfs_bulkstat(2)), and what the C library asks of a stream
-// and a socket. By kind and number, whatever their size.
+// Which ioctl requests pass: the label of a file system; the geometry of xfs and the generations of
+// its items (XFS_IOC_FSGEOMETRY, XFS_IOC_BULKSTAT); what the C library asks of a stream and a
+// socket. By kind and number, whatever their size.
 constexpr unsigned KindAndNumber(unsigned request) {
   return request & (_IOC_TYPEMASK << _IOC_TYPESHIFT | _IOC_NRMASK << _IOC_NRSHIFT);
 }
-constexpr unsigned XFSRequest(unsigned number) {
-  return _IOC(0U, 'X', number, 0U);
-}
-constexpr unsigned kRequests[] = {KindAndNumber(FS_IOC_GETFSLABEL),
-                                  XFSRequest(100),
-                                  XFSRequest(124),
-                                  XFSRequest(126),
-                                  XFSRequest(101),
-                                  XFSRequest(102),
-                                  XFSRequest(127),
-                                  KindAndNumber(TCGETS),
-                                  KindAndNumber(FIONREAD),
-                                  KindAndNumber(FIONBIO)};
+constexpr unsigned kRequests[] = {KindAndNumber(FS_IOC_GETFSLABEL), _IOC(0U, 'X', 126U, 0U),
+                                  _IOC(0U, 'X', 127U, 0U),          KindAndNumber(TCGETS),
+                                  KindAndNumber(FIONREAD),          KindAndNumber(FIONBIO)};
 
 // Families of sockets: of this machine, and of networks.
 constexpr unsigned kLocalFamilies[] = {AF_UNIX};

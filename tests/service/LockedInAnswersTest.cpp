@@ -176,6 +176,16 @@ TEST(LockedInAnswers, AreTheSameAboutUsersOfALocalDaemon) {
   EXPECT_EQ(AnswersOf(TALLOWMERE_SERVICE, requests), open);
 }
 
+// The exception: Landlock keeps a process from what /proc shows of others.
+TEST(LockedInAnswers, LeadThroughNoOtherProcess) {
+  const TemporaryFolder folder;
+  folder.MakeFile("item");
+  const std::string here = "/proc/" + std::to_string(getpid()) + "/root";
+  const std::string request = RecordRequest(here + folder.Path().string() + "/item");
+  EXPECT_EQ(AnswersOf(TALLOWMERE_OPEN_SERVICE, request).at(0), '\1');
+  EXPECT_EQ(AnswersOf(TALLOWMERE_SERVICE, request).at(0), '\0');
+}
+
 // The root folder is on a disk with a label: the volume is called by it.
 TEST(LockedInAnswers, TellTheLabelOfTheRootVolume) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
