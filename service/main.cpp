@@ -1,6 +1,7 @@
 // The helper process: serves its parent's requests on standard input and output until the parent is
 // gone, the channel fails, or the parent tells it to stop.
 
+#include <Tallowmere/Process.h>
 #include <signal.h>
 #include <sys/types.h>
 
@@ -16,6 +17,9 @@ int main(int argumentCount, char** arguments) {
   }
   // The parent is trusted to know its own number; a text that is none gives 0, this process group.
   const pid_t parent = std::atoi(arguments[1]);  // NOLINT(cert-err34-c)
+
+  // It reads a file system that others write to, and only ever has to read.
+  tallowmere::process::LockIn();
 
   // The parent is looked for after every request, answered or not, and never before the first one:
   // a service without a parent ends when its input does.

@@ -1,8 +1,6 @@
-// What a process asks of its platform beside the host's calls. Elsewhere than on Linux all of it
-// does nothing.
+// What a process asks of its platform beside the host's calls. Where the host's own frameworks are,
+// all of it does nothing.
 #pragma once
-
-#include <MacTypes.h>
 
 namespace tallowmere::process {
 
@@ -25,5 +23,15 @@ class Moment {
  private:
   bool mIsOutermost;
 };
+
+// Locks this process in, and what it starts from now on, for good: from then on it can read files,
+// use the descriptors that it has, and ask local sockets, but not write to files, make, move or
+// remove them, run programs, start processes, signal or trace others, mount, or reach a network
+// that the machine's user database does without. What is closed answers an error, mostly EPERM or
+// EACCES; it never ends the process. docs/reliability.md tells all of it.
+//
+// What the kernel does not offer is left out without a word: this never fails. To be called once,
+// by a program with one thread, before its first request. A library does not lock its users in.
+void LockIn();
 
 }  // namespace tallowmere::process

@@ -1,0 +1,7 @@
+#include <Tallowmere/Process.h>
+
+#include "kernel/Confinement.h"
+
+void tallowmere::process::LockIn() {
+  tallowmere::kernel::LockIn();
+}
