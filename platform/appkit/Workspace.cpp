@@ -6,14 +6,15 @@
 #include <string>
 #include <string_view>
 
-#include "foundation/FileNameText.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
 #include "foundation/String.h"
+#include "text/FileNameText.h"
 
 namespace {
 
 using namespace tallowmere::foundation;
+namespace text = tallowmere::text;
 
 // The extensions of registered document and bundle types that are folders.
 constexpr std::string_view kPackageExtensions[] = {
@@ -66,7 +67,7 @@ bool IsPackage(const std::string& path) {
 bool Workspace::IsFilePackageAtPath(CFStringRef path) {
   if (path == nullptr) return false;
   return OrZero([path] {
-    const auto bytes = FileNameOfText(StringOf(path).Text());
+    const auto bytes = text::FileNameOfText(StringOf(path).Text());
     if (!bytes || bytes->empty() || bytes->find('\0') != bytes->npos) return false;
     return IsPackage(WithFolderMark(*bytes, false));
   });

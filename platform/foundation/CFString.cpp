@@ -12,14 +12,15 @@
 #include <utility>
 
 #include "foundation/Encodings.h"
-#include "foundation/FileNameText.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PascalStrings.h"
 #include "foundation/String.h"
+#include "text/FileNameText.h"
 
 namespace {
 
 using namespace tallowmere::foundation;
+namespace text = tallowmere::text;
 
 // UTF-8 spends at most 3 bytes on a UTF-16 unit, an escaped byte 1.
 constexpr CFIndex kFileNameBytesPerUnit = 3;
@@ -135,7 +136,7 @@ CFStringRef CFStringCreateWithPascalString(CFAllocatorRef, ConstStr255Param byte
 }
 
 CFStringRef CFStringCreateWithFileSystemRepresentation(CFAllocatorRef, const char* name) {
-  return OrZero([&] { return CreateString(TextOfFileName(name)); });
+  return OrZero([&] { return CreateString(text::TextOfFileName(name)); });
 }
 
 CFStringRef CFStringCreateWithFormat(CFAllocatorRef, CFDictionaryRef, CFStringRef format, ...) {
@@ -246,7 +247,7 @@ Boolean CFStringGetPascalString(CFStringRef string, StringPtr buffer, CFIndex ca
 
 Boolean CFStringGetFileSystemRepresentation(CFStringRef string, char* buffer, CFIndex capacity) {
   return OrZero([&] {
-    const auto name = FileNameOfText(StringOf(string).Text());
+    const auto name = text::FileNameOfText(StringOf(string).Text());
     if (!name || name->size() >= SizeOf(capacity) || name->find('\0') != name->npos) return false;
     std::memcpy(buffer, name->c_str(), name->size() + 1);
     return true;

@@ -7,7 +7,6 @@
 #include <utility>
 
 #include "foundation/Encodings.h"
-#include "foundation/FileNameText.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathStyles.h"
 #include "foundation/PathText.h"
@@ -15,18 +14,20 @@
 #include "foundation/String.h"
 #include "foundation/Url.h"
 #include "foundation/UrlParts.h"
-#include "foundation/Utf16.h"
+#include "text/FileNameText.h"
+#include "text/Utf16.h"
 
 namespace {
 
 using namespace tallowmere::foundation;
+namespace text = tallowmere::text;
 
 using Bytes = std::optional<std::string>;
 
 // A new string of a file name or path, null for none and for one with a NUL, which no name has.
 CFStringRef CreateFileNameString(const Bytes& name) {
   if (!name || name->find('\0') != name->npos) return nullptr;
-  return CreateString(TextOfFileName(*name));
+  return CreateString(text::TextOfFileName(*name));
 }
 
 Bytes LinuxPath(const std::string& path, CFURLPathStyle style) {
@@ -76,7 +77,7 @@ CFURLRef CreateUrlWithPath(CFURLRef url, std::string_view path) {
 CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef, CFStringRef path, CFURLPathStyle style,
                                        Boolean isDirectory) {
   return OrZero([&]() -> CFURLRef {
-    const auto bytes = FileNameOfText(StringOf(path).Text());
+    const auto bytes = text::FileNameOfText(StringOf(path).Text());
     if (!bytes) return nullptr;
     const auto linuxPath = LinuxPath(*bytes, style);
     return linuxPath ? CreateUrlOfPath(*linuxPath, isDirectory) : nullptr;
@@ -90,7 +91,7 @@ CFURLRef CFURLCreateWithBytes(CFAllocatorRef, const UInt8* bytes, CFIndex length
   return OrZero([&]() -> CFURLRef {
     const auto text =
         found->decode({reinterpret_cast<const char*>(bytes), static_cast<std::size_t>(length)});
-    if (!text || !std::all_of(text->begin(), text->end(), IsAscii)) return nullptr;
+    if (!text || !std::all_of(text->begin(), text->end(), text::IsAscii)) return nullptr;
     std::string url(text->begin(), text->end());
     return IsUrl(url) ? CreateUrl(std::move(url), "") : nullptr;
   });
@@ -145,7 +146,7 @@ CFURLRef CFURLCreateCopyAppendingPathComponent(CFAllocatorRef, CFURLRef url, CFS
                                                Boolean isDirectory) {
   if (component == nullptr) return nullptr;
   return OrZero([&]() -> CFURLRef {
-    const auto bytes = FileNameOfText(StringOf(component).Text());
+    const auto bytes = text::FileNameOfText(StringOf(component).Text());
     if (!bytes) return nullptr;
     const UrlParts parts = SplitUrl(UrlOf(url).Text());
     // Behind an authority, an empty path is the root's.

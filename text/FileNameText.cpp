@@ -1,13 +1,13 @@
-#include "foundation/FileNameText.h"
+#include "text/FileNameText.h"
 
 #include <algorithm>
 #include <cstdint>
 #include <type_traits>
 
-#include "foundation/Utf16.h"
-#include "foundation/Utf8.h"
+#include "text/Utf16.h"
+#include "text/Utf8.h"
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 namespace {
 
 // Moves the ASCII characters at the beginning of one text, as most names have no others, to the end
@@ -56,4 +56,4 @@ std::optional<std::string> FileNameOfText(std::u16string_view text) {
   return bytes;
 }
 
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text
