@@ -1,6 +1,6 @@
 #include <sys/stat.h>
 
-#include <cerrno>
+#include <filesystem>
 #include <iostream>
 #include <optional>
 #include <string>
@@ -10,9 +10,9 @@
 #include "cli/Commands.h"
 #include "cli/Output.h"
 #include "cli/ProgressBar.h"
+#include "cli/SameItem.h"
 #include "cli/Text.h"
 #include "cli/TreeWalk.h"
-#include "files/Catalog.h"
 
 namespace tallowmere::cli {
 namespace {
@@ -35,9 +35,9 @@ class Census {
   // Whether the services still answer.
   bool Count(const std::string& path, const struct stat& item, double done) {
     ++mItems;
-    auto trouble = TroubleWith(path, item);
+    auto trouble = TroubleWith(path);
     // Whoever moves an item, or a folder above it, between the two questions spoils the answer.
-    if (trouble && IsAt(path, item)) trouble = TroubleWith(path, item);
+    if (trouble && IsAt(path, item)) trouble = TroubleWith(path);
     if (mFailure) return false;
     if (!trouble) {
       ++mBack;
@@ -48,6 +48,14 @@ class Census {
     }
     mBar.Show(done, std::to_string(mItems) + " items");
     return true;
+  }
+
+  // Whether a folder that was just seen is on a volume: what is there and has no HFS name is on
+  // none.
+  bool IsOnVolume(const std::string& path, const struct stat& folder) {
+    const auto name = mRecords.GetHFSName(path);
+    if (!name) Fail(name.Failure());
+    return !name || *name || !IsAt(path, folder);
   }
 
   void LeaveOut(const std::string& path, const std::string& reason) {
@@ -71,14 +79,14 @@ class Census {
 
  private:
   // Why the item did not come back, if so.
-  std::optional<std::string> TroubleWith(const std::string& path, const struct stat& item) {
+  std::optional<std::string> TroubleWith(const std::string& path) {
     const auto record = mRecords.GetFSSpec(path);
     if (!record) return Fail(record.Failure());
     if (!*record) return "has no record";
     const auto back = mPaths.SetFileRefFromFSSpec(**record, false);
     if (!back) return Fail(back.Failure());
     if (!*back) return "its record leads nowhere";
-    if (!IsAt(**back, item)) return "came back as " + **back;
+    if (!IsSameItem(**back, path)) return "came back as " + **back;
     return std::nullopt;
   }
 
@@ -123,16 +131,20 @@ class Census {
 }  // namespace
 
 int TakeCensus(const ClientOptions& options, bool isJson, const std::string& folder) {
-  const auto path = files::RealPath(folder);
-  if (!path) return Complain(folder + ": " + std::generic_category().message(errno));
+  std::error_code error;
+  const auto path = std::filesystem::canonical(folder, error);
+  if (error) return Complain(folder + ": " + error.message());
 
   Census census(options, isJson);
   const TreeVisitor visitor{
       [&](const std::string& item, const struct stat& status, double done) {
         return census.Count(item, status, done);
       },
+      [&](const std::string& item, const struct stat& status) {
+        return census.IsOnVolume(item, status);
+      },
       [&](const std::string& item, const std::string& reason) { census.LeaveOut(item, reason); }};
-  WalkTree(*path, visitor);
+  WalkTree(path, visitor);
   return census.Finish();
 }
 

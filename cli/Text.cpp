@@ -2,8 +2,8 @@
 
 #include <algorithm>
 
-#include "foundation/FileNameText.h"
-#include "foundation/Utf16.h"
+#include "text/FileNameText.h"
+#include "text/Utf16.h"
 
 namespace tallowmere::cli {
 namespace {
@@ -16,7 +16,7 @@ bool IsControl(char16_t unit) {
 }
 
 bool IsPlain(std::u16string_view character) {
-  return !IsControl(character[0]) && !foundation::IsEscapedByte(character[0]);
+  return !IsControl(character[0]) && !text::IsEscapedByte(character[0]);
 }
 
 void AppendOctal(std::string_view bytes, std::string& text) {
@@ -32,12 +32,12 @@ void AppendOctal(std::string_view bytes, std::string& text) {
 
 std::string Printable(std::string_view text) {
   std::string printable;
-  const std::u16string units = foundation::TextOfFileName(text);
+  const std::u16string units = text::TextOfFileName(text);
   for (std::u16string_view rest = units; !rest.empty();) {
-    const bool isPair = rest.size() > 1 && foundation::IsHighSurrogate(rest[0]);
+    const bool isPair = rest.size() > 1 && text::IsHighSurrogate(rest[0]);
     const std::u16string_view character = rest.substr(0, isPair ? 2 : 1);
     rest.remove_prefix(character.size());
-    const std::string bytes = foundation::FileNameOfText(character).value_or("");
+    const std::string bytes = text::FileNameOfText(character).value_or("");
     if (IsPlain(character)) {
       printable.append(bytes);
     } else {
@@ -48,11 +48,11 @@ std::string Printable(std::string_view text) {
 }
 
 std::string Utf8OfAnyBytes(std::string_view bytes) {
-  std::u16string text = foundation::TextOfFileName(bytes);
+  std::u16string text = text::TextOfFileName(bytes);
   std::replace_if(
-      text.begin(), text.end(), [](char16_t unit) { return foundation::IsEscapedByte(unit); },
+      text.begin(), text.end(), [](char16_t unit) { return text::IsEscapedByte(unit); },
       kReplacement);
-  return foundation::FileNameOfText(text).value_or("");
+  return text::FileNameOfText(text).value_or("");
 }
 
 std::size_t CharacterCount(std::string_view text) {

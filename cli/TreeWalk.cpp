@@ -1,7 +1,6 @@
 #include "cli/TreeWalk.h"
 
 #include <dirent.h>
-#include <fcntl.h>
 
 #include <cerrno>
 #include <memory>
@@ -10,10 +9,6 @@
 #include <system_error>
 #include <utility>
 #include <vector>
-
-#include "files/ItemReference.h"
-#include "files/MountTable.h"
-#include "foundation/PathText.h"
 
 namespace tallowmere::cli {
 namespace {
@@ -36,9 +31,8 @@ std::optional<std::vector<std::string>> NamesIn(const std::string& path) {
   return names;
 }
 
-bool IsKernelInterface(const std::string& path) {
-  const auto status = files::ReadStatus(AT_FDCWD, path.c_str());
-  return status && !files::MountTable::OfThisProcess().OfItem(status->item, path);
+std::string PathIn(const std::string& folder, const std::string& name) {
+  return folder == "/" ? folder + name : folder + '/' + name;
 }
 
 class Walk {
@@ -71,7 +65,7 @@ class Walk {
       LeaveOut(folder.path);
     } else {
       for (const std::string& name : *names) {
-        if (!Look(foundation::JoinPath(folder.path, name), folder.device)) return false;
+        if (!Look(PathIn(folder.path, name), folder.device)) return false;
       }
     }
     mShareOfEach = folder.share / static_cast<double>(mFound.size() + 1);
@@ -89,7 +83,7 @@ class Walk {
     }
     if (!mVisitor.item(path, status, mDone)) return false;
     if (!S_ISDIR(status.st_mode)) return true;
-    if (status.st_dev != deviceOfFolder && IsKernelInterface(path)) {
+    if (status.st_dev != deviceOfFolder && !mVisitor.isOnVolume(path, status)) {
       mVisitor.leftOut(path, "an interface of the kernel");
     } else {
       mFound.push_back({path, status.st_dev, 0});

@@ -1,46 +1,44 @@
+#include <tallowmere/Volumes.h>
+
 #include <iostream>
+#include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "cli/Commands.h"
 #include "cli/Output.h"
 #include "cli/Table.h"
 #include "cli/Text.h"
-#include "files/MountTable.h"
 
 namespace tallowmere::cli {
 namespace {
 
 struct Row {
-  std::int16_t number;
-  std::string name;  // as UTF-8
-  std::string mountPoint;
+  Volume volume;
   std::optional<std::int16_t> numberByName;  // what the service answers for the name
 
-  bool Answers() const { return !numberByName || *numberByName == number; }
+  bool Answers() const { return !numberByName || *numberByName == volume.number; }
 };
 
-// The mount table says which numbers there are and where; the service says what they are called.
 Result<std::vector<Row>> AskForVolumes(const ClientOptions& options) {
   Client client(options);
+  auto volumes = ListVolumes(client);
+  if (!volumes) return volumes.Failure();
   std::vector<Row> rows;
-  files::MountTable& table = files::MountTable::OfThisProcess();
-  for (std::size_t i = 0; const files::VolumePointer volume = table.AtIndex(i); ++i) {
-    const auto name = client.GetHFSVolumeName(volume->Number());
-    if (!name) return name.Failure();
-    if (!*name) continue;  // unmounted in between
-    const auto number = client.GetVolRefnumByHFSName(**name);
+  for (Volume& volume : *volumes) {
+    const auto number = client.GetVolRefnumByHFSName(volume.name);
     if (!number) return number.Failure();
-    rows.push_back({volume->Number(), Utf8OfHFSName(**name), volume->MountPoint(), *number});
+    rows.push_back({std::move(volume), *number});
   }
   return rows;
 }
 
 void PrintAsJson(const Row& row) {
   Json json;
-  json["volume"] = row.number;
-  json["name"] = row.name;
-  Put(json, "mount_point", row.mountPoint);
+  json["volume"] = row.volume.number;
+  json["name"] = Utf8OfHFSName(row.volume.name);
+  Put(json, "mount_point", row.volume.mountPoint);
   json["answers_to_its_name"] = row.Answers();
   std::cout << json.dump() << '\n';
 }
@@ -55,8 +53,8 @@ int PrintVolumes(const ClientOptions& options, bool isJson) {
     if (isJson) {
       PrintAsJson(row);
     } else {
-      table.Add({std::to_string(row.number), Printable(row.name),
-                 Printable(row.mountPoint) +
+      table.Add({std::to_string(row.volume.number), Printable(Utf8OfHFSName(row.volume.name)),
+                 Printable(row.volume.mountPoint) +
                      (row.Answers() ? "" : "  (the first volume of this name answers to it)")});
     }
   }

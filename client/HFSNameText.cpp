@@ -1,18 +1,18 @@
 #include <tallowmere/Types.h>
 
-#include "foundation/FileNameText.h"
-#include "foundation/MacRoman.h"
+#include "text/FileNameText.h"
+#include "text/MacRoman.h"
 
 namespace tallowmere {
 
 std::string Utf8OfHFSName(std::string_view name) {
   // No Mac Roman character is a surrogate, so there always is one.
-  return foundation::FileNameOfText(foundation::DecodeMacRoman(name)).value_or("");
+  return text::FileNameOfText(text::DecodeMacRoman(name)).value_or("");
 }
 
 std::optional<std::string> HFSNameOfUtf8(std::string_view text) {
   // A byte that is not part of valid UTF-8 stands as a surrogate, which Mac Roman lacks.
-  return foundation::EncodeMacRoman(foundation::TextOfFileName(text));
+  return text::EncodeMacRoman(text::TextOfFileName(text));
 }
 
 }  // namespace tallowmere

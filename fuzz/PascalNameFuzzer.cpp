@@ -11,9 +11,9 @@
 #include "files/NodeID.h"
 #include "files/PascalName.h"
 #include "foundation/ColonsAndSlashes.h"
-#include "foundation/FileNameText.h"
-#include "foundation/MacRoman.h"
 #include "fuzz/Check.h"
+#include "text/FileNameText.h"
+#include "text/MacRoman.h"
 
 namespace tallowmere::fuzz {
 namespace {
@@ -23,10 +23,10 @@ using files::kLongestStr255Name;
 
 // Any bytes are text, and Mac Roman text at that, and come back.
 void CheckText(std::string_view bytes) {
-  Check(foundation::FileNameOfText(foundation::TextOfFileName(bytes)) == bytes);
-  const std::u16string text = foundation::DecodeMacRoman(bytes);
-  Check(foundation::EncodeMacRoman(text) == bytes);
-  Check(foundation::EncodeMacRoman(foundation::DecomposeMacRoman(text)) == bytes);
+  Check(text::FileNameOfText(text::TextOfFileName(bytes)) == bytes);
+  const std::u16string text = text::DecodeMacRoman(bytes);
+  Check(text::EncodeMacRoman(text) == bytes);
+  Check(text::EncodeMacRoman(text::DecomposeMacRoman(text)) == bytes);
   Check(HFSNameOfUtf8(Utf8OfHFSName(bytes)) == bytes);
 }
 
@@ -80,7 +80,7 @@ void CheckPascalStrings(std::string_view bytes) {
 // A string as a Pascal name in a buffer of that size, and back. A ':' of the string becomes a '/',
 // and every '/' comes back as ':'.
 void CheckBridge(std::string_view bytes, SInt32 bufferSize) {
-  const std::u16string text = foundation::TextOfFileName(bytes);
+  const std::u16string text = text::TextOfFileName(bytes);
   const CFOwned<CFStringRef> string(CFStringCreateWithCharacters(
       kCFAllocatorDefault, reinterpret_cast<const UniChar*>(text.data()),
       static_cast<CFIndex>(text.size())));
@@ -93,11 +93,11 @@ void CheckBridge(std::string_view bytes, SInt32 bufferSize) {
   Check(name[0] < bufferSize);
   if (isWhole) {
     Check(foundation::ExchangeColonsAndSlashes(std::string(files::TextOfPascal(name))) ==
-          foundation::EncodeMacRoman(text));
+          text::EncodeMacRoman(text));
   }
   const CFOwned<CFMutableStringRef> back(CreateCFStringFromPascalString(name));
   Check(back.Get() != nullptr);
-  std::u16string expected = foundation::DecodeMacRoman(files::TextOfPascal(name));
+  std::u16string expected = text::DecodeMacRoman(files::TextOfPascal(name));
   std::replace(expected.begin(), expected.end(), u'/', u':');
   const CFIndex length = CFStringGetLength(back.Get());
   Check(static_cast<std::size_t>(length) == expected.size());

@@ -5,13 +5,13 @@
 #include <string>
 
 #include "CFOwned.h"
-#include "foundation/FileNameText.h"
 #include "foundation/PathText.h"
 #include "foundation/PercentEncoding.h"
 #include "foundation/String.h"
 #include "foundation/Url.h"
 #include "foundation/UrlParts.h"
 #include "fuzz/Check.h"
+#include "text/FileNameText.h"
 
 namespace tallowmere::fuzz {
 namespace {
@@ -20,12 +20,12 @@ using OwnedUrl = CFOwned<CFURLRef>;
 using OwnedString = CFOwned<CFStringRef>;
 
 OwnedString StringOfBytes(std::string_view bytes) {
-  return OwnedString(foundation::CreateString(foundation::TextOfFileName(bytes)));
+  return OwnedString(foundation::CreateString(text::TextOfFileName(bytes)));
 }
 
 std::optional<std::string> BytesOf(const OwnedString& string) {
   if (!string) return std::nullopt;
-  return foundation::FileNameOfText(foundation::StringOf(string.Get()).Text());
+  return text::FileNameOfText(foundation::StringOf(string.Get()).Text());
 }
 
 std::optional<std::string> PathOf(CFURLRef url) {

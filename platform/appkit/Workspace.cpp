@@ -5,11 +5,11 @@
 #include <string>
 #include <string_view>
 
-#include "foundation/FileNameText.h"
 #include "foundation/LetterCase.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
 #include "foundation/String.h"
+#include "text/FileNameText.h"
 
 namespace {
 
@@ -64,7 +64,7 @@ bool IsPackage(const std::string& path) {
 bool Workspace::IsFilePackageAtPath(CFStringRef path) {
   if (path == nullptr) return false;
   return OrZero([path] {
-    const auto bytes = FileNameOfText(StringOf(path).Text());
+    const auto bytes = tallowmere::text::FileNameOfText(StringOf(path).Text());
     if (!bytes || bytes->empty() || bytes->find('\0') != bytes->npos) return false;
     return IsPackage(WithFolderMark(*bytes, false));
   });

@@ -13,13 +13,13 @@
 #include "catalog/Finding.h"
 #include "catalog/NameLookup.h"
 #include "foundation/ColonsAndSlashes.h"
-#include "foundation/FileNameText.h"
-#include "foundation/MacRoman.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
 #include "kernel/Paths.h"
 #include "names/HFSNames.h"
 #include "names/PascalNames.h"
+#include "text/FileNameText.h"
+#include "text/MacRoman.h"
 
 using namespace tallowmere;
 using namespace tallowmere::calls;
@@ -93,10 +93,10 @@ OSErr FillName(catalog::Moment& moment, const Subject& item, HFSUniStr255& name)
   if (const auto volume = VolumeOfRoot(moment, item.Seen())) {
     const auto volumeName = volume->Listed().Name();
     if (!volumeName) return ResultCodeOf(volumeName.Error());
-    text = foundation::DecodeMacRoman(*volumeName);
+    text = text::DecodeMacRoman(*volumeName);
   } else {
     text = foundation::ExchangeColonsAndSlashes(
-        foundation::TextOfFileName(*foundation::LastComponent(item.Seen().path)));
+        text::TextOfFileName(*foundation::LastComponent(item.Seen().path)));
   }
   text.resize(std::min(text.size(), kLongestUnicodeName));
   name.length = static_cast<UInt16>(text.size());
@@ -192,7 +192,7 @@ OSErr MakeReference(catalog::Moment& moment, const FSSpec& spec, FSRef& referenc
 // The Linux name that a UTF-16 name stands for; empty when no item can be called so.
 std::string LinuxNameOf(UniCharCount length, const UniChar* name) {
   if (length > kLongestUnicodeName) return {};
-  const auto bytes = foundation::FileNameOfText(
+  const auto bytes = text::FileNameOfText(
       foundation::ExchangeColonsAndSlashes(std::u16string(name, name + length)));
   return bytes && names::CanBeLinuxName(*bytes) ? *bytes : std::string();
 }

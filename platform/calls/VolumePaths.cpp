@@ -1,17 +1,17 @@
 #include "foundation/VolumePaths.h"
 
 #include "calls/Process.h"
-#include "foundation/MacRoman.h"
+#include "text/MacRoman.h"
 
 namespace tallowmere::foundation {
 
 std::optional<std::string> MountPointOfVolume(std::u16string_view name) {
-  const auto bytes = EncodeMacRoman(name);
+  const auto bytes = text::EncodeMacRoman(name);
   if (!bytes) return std::nullopt;
   const auto& volumes = calls::ThisProcess().catalog.Table().Now();
   const auto volume = volumes->WithName(*bytes);
   // Names are compared as text: one that only encodes like a volume's name is not it.
-  if (!volume || DecodeMacRoman(*bytes) != name) return std::nullopt;
+  if (!volume || text::DecodeMacRoman(*bytes) != name) return std::nullopt;
   return (*volume)->MountPoint();
 }
 
@@ -22,7 +22,7 @@ std::optional<VolumeOfPath> FindVolumeOfPath(std::string_view path) {
   if (!name) return std::nullopt;
   const auto first = volumes->WithName(*name);
   if (!first || *first != volume) return std::nullopt;
-  return VolumeOfPath{DecodeMacRoman(*name), volume->MountPoint().size()};
+  return VolumeOfPath{text::DecodeMacRoman(*name), volume->MountPoint().size()};
 }
 
 }  // namespace tallowmere::foundation

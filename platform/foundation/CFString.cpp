@@ -11,11 +11,11 @@
 #include <utility>
 
 #include "foundation/Encodings.h"
-#include "foundation/FileNameText.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PascalStrings.h"
 #include "foundation/String.h"
-#include "foundation/Utf16.h"
+#include "text/FileNameText.h"
+#include "text/Utf16.h"
 
 namespace {
 
@@ -143,7 +143,7 @@ CFStringRef CFStringCreateWithPascalString(CFAllocatorRef, ConstStr255Param byte
 }
 
 CFStringRef CFStringCreateWithFileSystemRepresentation(CFAllocatorRef, const char* name) {
-  return OrZero([&] { return CreateString(TextOfFileName(name)); });
+  return OrZero([&] { return CreateString(tallowmere::text::TextOfFileName(name)); });
 }
 
 CFStringRef CFStringCreateWithFormat(CFAllocatorRef, CFDictionaryRef, CFStringRef format, ...) {
@@ -257,9 +257,10 @@ Boolean CFStringGetPascalString(CFStringRef string, StringPtr buffer, CFIndex ca
 
 Boolean CFStringGetFileSystemRepresentation(CFStringRef string, char* buffer, CFIndex capacity) {
   const std::u16string& text = StringOf(string).Text();
-  if (IsAllAscii(std::u16string_view(text))) return StoreName(text, buffer, SizeOf(capacity));
+  if (tallowmere::text::IsAllAscii(std::u16string_view(text)))
+    return StoreName(text, buffer, SizeOf(capacity));
   return OrZero([&] {
-    const auto name = FileNameOfText(text);
+    const auto name = tallowmere::text::FileNameOfText(text);
     return name && StoreName(*name, buffer, SizeOf(capacity));
   });
 }

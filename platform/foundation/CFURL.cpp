@@ -7,7 +7,6 @@
 #include <utility>
 
 #include "foundation/Encodings.h"
-#include "foundation/FileNameText.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathStyles.h"
 #include "foundation/PathText.h"
@@ -15,7 +14,8 @@
 #include "foundation/String.h"
 #include "foundation/Url.h"
 #include "foundation/UrlParts.h"
-#include "foundation/Utf16.h"
+#include "text/FileNameText.h"
+#include "text/Utf16.h"
 
 namespace {
 
@@ -26,7 +26,7 @@ using Bytes = std::optional<std::string>;
 // A new string of a file name or path, null for none and for one with a NUL, which no name has.
 CFStringRef CreateFileNameString(const Bytes& name) {
   if (!name || name->find('\0') != name->npos) return nullptr;
-  return CreateString(TextOfFileName(*name));
+  return CreateString(tallowmere::text::TextOfFileName(*name));
 }
 
 // Of a path in another style than POSIX.
@@ -83,7 +83,7 @@ CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef, CFStringRef path, CFURLPa
                                        Boolean isDirectory) {
   return OrZero([&]() -> CFURLRef {
     if (style == kCFURLPOSIXPathStyle) return CreateUrlOfPath(StringOf(path), isDirectory);
-    const auto bytes = FileNameOfText(StringOf(path).Text());
+    const auto bytes = tallowmere::text::FileNameOfText(StringOf(path).Text());
     if (!bytes) return nullptr;
     const auto linuxPath = LinuxPath(*bytes, style);
     return linuxPath ? CreateUrlOfPath(*linuxPath, isDirectory) : nullptr;
@@ -97,7 +97,8 @@ CFURLRef CFURLCreateWithBytes(CFAllocatorRef, const UInt8* bytes, CFIndex length
   return OrZero([&]() -> CFURLRef {
     const auto text =
         found->decode({reinterpret_cast<const char*>(bytes), static_cast<std::size_t>(length)});
-    if (!text || !std::all_of(text->begin(), text->end(), IsAscii)) return nullptr;
+    if (!text || !std::all_of(text->begin(), text->end(), tallowmere::text::IsAscii))
+      return nullptr;
     std::string url(text->begin(), text->end());
     return IsUrl(url) ? CreateUrl(std::move(url), "") : nullptr;
   });
@@ -149,7 +150,7 @@ CFURLRef CFURLCreateCopyAppendingPathComponent(CFAllocatorRef, CFURLRef url, CFS
                                                Boolean isDirectory) {
   if (component == nullptr) return nullptr;
   return OrZero([&]() -> CFURLRef {
-    const auto bytes = FileNameOfText(StringOf(component).Text());
+    const auto bytes = tallowmere::text::FileNameOfText(StringOf(component).Text());
     if (!bytes) return nullptr;
     const UrlParts& parts = UrlOf(url).Parts();
     // Behind an authority, an empty path is the root's.

@@ -4,9 +4,9 @@
 #include <bit>
 #include <cstring>
 
-#include "foundation/MacRoman.h"
-#include "foundation/Utf16.h"
-#include "foundation/Utf8.h"
+#include "text/MacRoman.h"
+#include "text/Utf16.h"
+#include "text/Utf8.h"
 
 namespace tallowmere::foundation {
 namespace {
@@ -14,19 +14,19 @@ namespace {
 using Decoded = std::optional<std::u16string>;
 
 EncodedCharacter NextInMacRoman(std::u16string_view text) {
-  const MacRomanStep step = NextMacRoman(text);
+  const text::MacRomanStep step = text::NextMacRoman(text);
   if (!step.byte) return {step.units, 0, {}};
   return {step.units, 1, {*step.byte}};
 }
 
 Decoded DecodedMacRoman(std::string_view bytes) {
-  return DecodeMacRoman(bytes);
+  return text::DecodeMacRoman(bytes);
 }
 
 // ASCII and Latin-1 are the first kCount code points of Unicode.
 template <char32_t kCount>
 EncodedCharacter NextInPrefixOfUnicode(std::u16string_view text) {
-  const auto [codePoint, units] = NextUtf16(text);
+  const auto [codePoint, units] = text::NextUtf16(text);
   if (codePoint >= kCount) return {units, 0, {}};
   return {units, 1, {static_cast<std::uint8_t>(codePoint)}};
 }
@@ -44,7 +44,7 @@ Decoded DecodedPrefixOfUnicode(std::string_view bytes) {
 }
 
 EncodedCharacter NextInUtf16(std::u16string_view text) {
-  const std::size_t units = NextUtf16(text).units;
+  const std::size_t units = text::NextUtf16(text).units;
   EncodedCharacter character{units, units * sizeof(char16_t), {}};
   std::memcpy(character.bytes.data(), text.data(), character.size);
   return character;
@@ -58,9 +58,9 @@ Decoded DecodedUtf16(std::string_view bytes) {
 }
 
 EncodedCharacter NextInUtf8(std::u16string_view text) {
-  const auto [codePoint, units] = NextUtf16(text);
-  if (IsSurrogate(codePoint)) return {units, 0, {}};
-  const Utf8Sequence sequence = EncodeUtf8(codePoint);
+  const auto [codePoint, units] = text::NextUtf16(text);
+  if (text::IsSurrogate(codePoint)) return {units, 0, {}};
+  const text::Utf8Sequence sequence = text::EncodeUtf8(codePoint);
   return {units, sequence.length,
           std::bit_cast<std::array<std::uint8_t, std::size(sequence.bytes)>>(sequence.bytes)};
 }
@@ -69,9 +69,9 @@ Decoded DecodedUtf8(std::string_view bytes) {
   std::u16string text;
   text.reserve(bytes.size());
   while (!bytes.empty()) {
-    const Utf8Character character = NextUtf8(bytes);
+    const text::Utf8Character character = text::NextUtf8(bytes);
     if (character.length == 0) return std::nullopt;
-    AppendUtf16(text, character.codePoint);
+    text::AppendUtf16(text, character.codePoint);
     bytes.remove_prefix(character.length);
   }
   return text;

@@ -3,10 +3,10 @@
 #include <algorithm>
 
 #include "foundation/ColonsAndSlashes.h"
-#include "foundation/FileNameText.h"
 #include "foundation/PathText.h"
 #include "foundation/UrlCharacters.h"
 #include "foundation/VolumePaths.h"
+#include "text/FileNameText.h"
 
 namespace tallowmere::foundation {
 namespace {
@@ -44,7 +44,7 @@ std::optional<std::string> LinuxPathOfHfsPath(std::string_view hfs) {
   const std::string_view volume = TakeComponent(hfs, ':');
   std::string path;
   if (!volume.empty()) {
-    auto mountPoint = MountPointOfVolume(TextOfFileName(volume));
+    auto mountPoint = MountPointOfVolume(text::TextOfFileName(volume));
     if (!mountPoint) return std::nullopt;
     path = *std::move(mountPoint);
   }
@@ -68,7 +68,7 @@ std::optional<std::string> HfsPathOfLinuxPath(std::string_view path, bool folder
   if (absolute) {
     const auto volume = FindVolumeOfPath(tidied);
     if (!volume) return std::nullopt;
-    auto name = FileNameOfText(volume->name);
+    auto name = text::FileNameOfText(volume->name);
     if (!name) return std::nullopt;
     hfs = *std::move(name);
     rest.remove_prefix(volume->mountPointLength);

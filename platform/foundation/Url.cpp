@@ -5,11 +5,11 @@
 #include <cerrno>
 #include <utility>
 
-#include "foundation/FileNameText.h"
+#include "text/FileNameText.h"
 #include "foundation/LetterCase.h"
 #include "foundation/PathText.h"
 #include "foundation/PercentEncoding.h"
-#include "foundation/Utf16.h"
+#include "text/Utf16.h"
 
 namespace tallowmere::foundation {
 namespace {
@@ -59,7 +59,7 @@ CFURLRef ReferenceTo(const Url* url) noexcept {
 // The path as Url keeps it; null for none and for one with a NUL.
 OwnedString KeptPath(std::string_view path) {
   if (path.empty() || HasNul(path)) return nullptr;
-  return OwnedString(new String(TextOfFileName(WithoutFolderMark(path)), false));
+  return OwnedString(new String(text::TextOfFileName(WithoutFolderMark(path)), false));
 }
 
 // `kept` has no folder mark. REQUIRES: the path is not empty.
@@ -106,16 +106,16 @@ CFURLRef CreateUrlOfPath(std::string_view path, bool folder) {
 
 // A string of ASCII without NUL or mark is kept itself: what its bytes read as is the same.
 CFURLRef CreateUrlOfPath(const String& path, bool folder) {
-  const auto bytes = FileNameOfText(path.Text());
+  const auto bytes = text::FileNameOfText(path.Text());
   if (!bytes || bytes->empty()) return nullptr;
-  const bool isKept = IsAllAscii(std::string_view(*bytes)) && !HasNul(*bytes) &&
+  const bool isKept = text::IsAllAscii(std::string_view(*bytes)) && !HasNul(*bytes) &&
                       WithoutFolderMark(*bytes).size() == bytes->size();
   return CreateUrlOfPath(*bytes, folder, isKept ? CopyOf(path) : KeptPath(*bytes));
 }
 
 std::optional<std::string> PathOfUrl(CFURLRef url) {
   const String* const path = UrlOf(url).Path();
-  return path == nullptr ? std::nullopt : FileNameOfText(path->Text());
+  return path == nullptr ? std::nullopt : text::FileNameOfText(path->Text());
 }
 
 std::optional<std::string> AbsolutePathOfUrl(CFURLRef url) {

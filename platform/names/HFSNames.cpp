@@ -4,10 +4,10 @@
 #include <charconv>
 
 #include "foundation/ColonsAndSlashes.h"
-#include "foundation/FileNameText.h"
-#include "foundation/MacRoman.h"
-#include "foundation/Utf16.h"
 #include "names/NodeIDs.h"
+#include "text/FileNameText.h"
+#include "text/MacRoman.h"
+#include "text/Utf16.h"
 
 namespace tallowmere::names {
 namespace {
@@ -18,20 +18,19 @@ constexpr std::size_t kLongestKeptExtension = 5;  // without its dot
 
 // ASCII names, as most are, have the same letters in every form.
 bool IsAsciiName(std::string_view name) {
-  return std::all_of(name.begin(), name.end(), [](char letter) {
-    return foundation::IsAscii(static_cast<unsigned char>(letter));
-  });
+  return std::all_of(name.begin(), name.end(),
+                     [](char letter) { return text::IsAscii(static_cast<unsigned char>(letter)); });
 }
 
 std::u16string ExchangedText(std::string_view linuxName) {
-  return foundation::ExchangeColonsAndSlashes(foundation::TextOfFileName(linuxName));
+  return foundation::ExchangeColonsAndSlashes(text::TextOfFileName(linuxName));
 }
 
 // ".aif" of "a.aif", or nothing.
 std::string KeptExtension(std::u16string_view text) {
   const std::size_t dot = text.rfind(u'.');
   if (dot == std::u16string_view::npos || dot == 0) return {};
-  const auto extension = foundation::EncodeMacRoman(text.substr(dot + 1));
+  const auto extension = text::EncodeMacRoman(text.substr(dot + 1));
   if (!extension || extension->empty() || extension->size() > kLongestKeptExtension) return {};
   return "." + *extension;
 }
@@ -39,7 +38,7 @@ std::string KeptExtension(std::u16string_view text) {
 std::string EncodeWithQuestionMarks(std::u16string_view text, std::size_t limit) {
   std::string bytes;
   while (!text.empty() && bytes.size() < limit) {
-    const foundation::MacRomanStep step = foundation::NextMacRoman(text);
+    const text::MacRomanStep step = text::NextMacRoman(text);
     bytes.push_back(static_cast<char>(step.byte.value_or('?')));
     text.remove_prefix(step.units);
   }
@@ -74,7 +73,7 @@ std::optional<ShortNameParts> ReadShortStem(std::string_view stem) {
 
 std::optional<std::string> PlainHFSName(std::string_view linuxName, std::size_t limit) {
   auto name = IsAsciiName(linuxName) ? foundation::ExchangeColonsAndSlashes(std::string(linuxName))
-                                     : foundation::EncodeMacRoman(ExchangedText(linuxName));
+                                     : text::EncodeMacRoman(ExchangedText(linuxName));
   if (name && name->size() > limit) return std::nullopt;
   return name;
 }
@@ -122,12 +121,11 @@ SpelledNames SpellHFSName(std::string_view name) {
     names.precomposed = foundation::ExchangeColonsAndSlashes(std::string(name));
     return CanBeLinuxName(names.precomposed) ? names : SpelledNames();
   }
-  const std::u16string text =
-      foundation::ExchangeColonsAndSlashes(foundation::DecodeMacRoman(name));
-  const std::u16string decomposed = foundation::DecomposeMacRoman(text);
-  names.precomposed = foundation::FileNameOfText(text).value_or("");
+  const std::u16string text = foundation::ExchangeColonsAndSlashes(text::DecodeMacRoman(name));
+  const std::u16string decomposed = text::DecomposeMacRoman(text);
+  names.precomposed = text::FileNameOfText(text).value_or("");
   if (!CanBeLinuxName(names.precomposed)) return {};
-  if (decomposed != text) names.decomposed = foundation::FileNameOfText(decomposed).value_or("");
+  if (decomposed != text) names.decomposed = text::FileNameOfText(decomposed).value_or("");
   return names;
 }
 

@@ -12,12 +12,12 @@
 #include <cstring>
 #include <sstream>
 
-#include "foundation/FileNameText.h"
-#include "foundation/MacRoman.h"
 #include "support/ChildProgram.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
 #include "support/Wire.h"
+#include "text/FileNameText.h"
+#include "text/MacRoman.h"
 
 namespace tallowmere::test {
 namespace {
@@ -93,13 +93,13 @@ class CensusOfHostileFolder : public testing::Test {
 std::vector<std::u16string> Letters() {
   std::vector<std::u16string> letters;
   for (int byte = 0x80; byte <= 0xFF; ++byte) {
-    letters.push_back(foundation::DecodeMacRoman(std::string(1, static_cast<char>(byte))));
+    letters.push_back(text::DecodeMacRoman(std::string(1, static_cast<char>(byte))));
   }
   return letters;
 }
 
 std::string Bytes(const std::u16string& text) {
-  return foundation::FileNameOfText(text).value_or("");
+  return text::FileNameOfText(text).value_or("");
 }
 
 TEST_F(CensusOfHostileFolder, EveryKindOfItem) {
@@ -156,14 +156,14 @@ TEST_F(CensusOfHostileFolder, EveryMacRomanLetterPrecomposed) {
 
 TEST_F(CensusOfHostileFolder, EveryMacRomanLetterDecomposed) {
   for (const std::u16string& letter : Letters()) {
-    Make(Bytes(foundation::DecomposeMacRoman(letter)));
+    Make(Bytes(text::DecomposeMacRoman(letter)));
   }
 }
 
 TEST_F(CensusOfHostileFolder, EveryMacRomanLetterInBothNormalFormsSideBySide) {
   for (const std::u16string& letter : Letters()) {
     const std::string precomposed = Bytes(letter);
-    const std::string decomposed = Bytes(foundation::DecomposeMacRoman(letter));
+    const std::string decomposed = Bytes(text::DecomposeMacRoman(letter));
     Make(precomposed);
     Make(decomposed);
     Make(precomposed + decomposed);

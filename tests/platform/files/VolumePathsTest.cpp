@@ -1,10 +1,10 @@
 // The volumes of HFS paths, as they are on this machine and as they are made here.
 #include <gtest/gtest.h>
 
-#include "foundation/MacRoman.h"
 #include "foundation/VolumePaths.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
+#include "text/MacRoman.h"
 
 namespace tallowmere::foundation {
 namespace {

@@ -6,7 +6,7 @@
 #include <string_view>
 #include <type_traits>
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 
 constexpr char16_t kFirstHighSurrogate = 0xD800;
 constexpr char16_t kFirstLowSurrogate = 0xDC00;
@@ -67,4 +67,4 @@ inline void AppendUtf16(std::u16string& text, char32_t codePoint) {
   text.push_back(static_cast<char16_t>(kFirstLowSurrogate + (rest & 0x3FF)));
 }
 
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text

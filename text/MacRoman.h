@@ -7,7 +7,7 @@
 #include <string>
 #include <string_view>
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 
 // The character of a byte, always precomposed.
 char16_t MacRomanToUnicode(std::uint8_t byte);
@@ -35,4 +35,4 @@ std::u16string DecodeMacRoman(std::string_view bytes);
 // (canonical decomposition).
 std::u16string DecomposeMacRoman(std::u16string_view text);
 
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text

@@ -9,7 +9,7 @@
 #include <string>
 #include <string_view>
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 
 // The text of a name. Every run of bytes has one.
 std::u16string TextOfFileName(std::string_view bytes);
@@ -18,4 +18,4 @@ std::u16string TextOfFileName(std::string_view bytes);
 // stands for no byte.
 std::optional<std::string> FileNameOfText(std::u16string_view text);
 
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text

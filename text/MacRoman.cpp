@@ -1,11 +1,11 @@
-#include "foundation/MacRoman.h"
+#include "text/MacRoman.h"
 
 #include <algorithm>
 #include <array>
 
-#include "foundation/Utf16.h"
+#include "text/Utf16.h"
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 namespace {
 
 // Bytes 0x80 to 0xFF; the lower half is ASCII. The mapping that the Unicode Consortium publishes
@@ -140,4 +140,4 @@ std::u16string DecomposeMacRoman(std::u16string_view text) {
   return decomposed;
 }
 
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text

@@ -1,10 +1,10 @@
-#include "foundation/Utf8.h"
+#include "text/Utf8.h"
 
 #include <cstdint>
 
-#include "foundation/Utf16.h"
+#include "text/Utf16.h"
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 namespace {
 
 std::uint8_t ByteAt(std::string_view bytes, std::size_t i) {
@@ -59,4 +59,4 @@ Utf8Sequence EncodeUtf8(char32_t codePoint) {
           4};
 }
 
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text

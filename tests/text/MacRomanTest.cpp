@@ -1,8 +1,8 @@
 #include <gtest/gtest.h>
 
-#include "foundation/MacRoman.h"
+#include "text/MacRoman.h"
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 namespace {
 
 TEST(MacRoman, EveryByteDecodesAndEncodesBack) {
@@ -71,4 +71,4 @@ TEST(MacRoman, DecomposesOnlyAccentedLetters) {
 }
 
 }  // namespace
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text

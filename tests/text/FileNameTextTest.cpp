@@ -1,8 +1,8 @@
 #include <gtest/gtest.h>
 
-#include "foundation/FileNameText.h"
+#include "text/FileNameText.h"
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 namespace {
 
 using namespace std::string_literals;
@@ -68,4 +68,4 @@ TEST(FileNameText, OnlyALowSurrogateCompletesAHighOne) {
 }
 
 }  // namespace
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text

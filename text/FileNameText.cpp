@@ -1,11 +1,11 @@
-#include "foundation/FileNameText.h"
+#include "text/FileNameText.h"
 
 #include <cstdint>
 
-#include "foundation/Utf16.h"
-#include "foundation/Utf8.h"
+#include "text/Utf16.h"
+#include "text/Utf8.h"
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 
 std::u16string TextOfFileName(std::string_view bytes) {
   if (IsAllAscii(bytes)) return {bytes.begin(), bytes.end()};
@@ -42,4 +42,4 @@ std::optional<std::string> FileNameOfText(std::u16string_view text) {
   return bytes;
 }
 
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text

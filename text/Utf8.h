@@ -5,7 +5,7 @@
 #include <cstddef>
 #include <string_view>
 
-namespace tallowmere::foundation {
+namespace tallowmere::text {
 
 struct Utf8Character {
   char32_t codePoint;
@@ -25,4 +25,4 @@ struct Utf8Sequence {
 // REQUIRES: codePoint is at most U+10FFFF and no surrogate.
 Utf8Sequence EncodeUtf8(char32_t codePoint);
 
-}  // namespace tallowmere::foundation
+}  // namespace tallowmere::text
