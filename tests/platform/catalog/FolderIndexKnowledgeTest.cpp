@@ -835,5 +835,18 @@ TEST_F(AnIndexBesideADeadMount, DoesNotLookForWhatItKnewBelowIt) {
   EXPECT_EQ(Find(mCovered), "(none)");
 }
 
+TEST_F(AnIndexBesideADeadMount, IsNotLedThereByALinkInAFoldersPlace) {
+  Make("l/below");
+  const std::uint32_t id = ID("l/below");
+  KnowEverything();
+  EXPECT_EQ(Find(id), PathTo("l/below"));
+  Kill();
+  if (IsSkipped()) return;
+  Move("l", "m");
+  std::filesystem::create_directory_symlink(PathTo("a/dead"), PathTo("l"));
+  EXPECT_EQ(Find(id), PathTo("m/below"));
+  EXPECT_EQ(Find(kOfNoItem), "(none)");
+}
+
 }  // namespace
 }  // namespace tallowmere::catalog
