@@ -836,16 +836,19 @@ TEST_F(AnIndexBesideADeadMount, DoesNotLookForWhatItKnewBelowIt) {
 }
 
 TEST_F(AnIndexBesideADeadMount, IsNotLedThereByALinkInAFoldersPlace) {
-  Make("l/below");
-  const std::uint32_t id = ID("l/below");
+  for (const char* name : {"gone/below", "moved/below"}) Make(name);
+  const std::uint32_t gone = ID("gone/below");
+  const std::uint32_t moved = ID("moved/below");
   KnowEverything();
-  EXPECT_EQ(Find(id), PathTo("l/below"));
   Kill();
   if (IsSkipped()) return;
-  Move("l", "m");
-  std::filesystem::create_directory_symlink(PathTo("a/dead"), PathTo("l"));
-  EXPECT_EQ(Find(id), PathTo("m/below"));
-  EXPECT_EQ(Find(kOfNoItem), "(none)");
+  Remove(PathTo("gone"));
+  Move("moved", "elsewhere");
+  for (const char* name : {"gone", "moved"}) {
+    std::filesystem::create_directory_symlink(PathTo("a/dead"), PathTo(name));
+  }
+  EXPECT_EQ(Find(moved), PathTo("elsewhere/below"));
+  EXPECT_EQ(Find(gone), "(none)");
 }
 
 }  // namespace
