@@ -139,6 +139,12 @@ TEST_F(AnUntrustedVolume, KeepsNothingFromOneQuestionToTheNext) {
   EXPECT_EQ(OpenedFor(kOfNoItem), opened);
 }
 
+TEST_F(AnUntrustedVolume, IsReadOnceWhereverTheSearchStarts) {
+  Make("a/d/e");
+  const std::uint64_t opened = OpenedForAny(kOfNoItem);
+  EXPECT_EQ(OpenedForAny(kOfNoItem, "a/d"), opened);
+}
+
 // The second of two moves from where the walk has not looked to where it has.
 TEST_F(AnUntrustedVolume, MissesNothingThatMovesWhileItLooks) {
   MakeShared("c/f");
@@ -269,6 +275,7 @@ class AnOverlayOfSubvolumes : public ABtrfsVolume {
   void SetUp() override {
     ABtrfsVolume::SetUp();
     if (IsSkipped()) return;
+    MakeFile("s1/d/x");
     Move("s1/d", "s1/e1");
     Move("s2/d", "s2/e2");
     for (const char* name : {"upper", "work"}) Make(name);
@@ -293,6 +300,10 @@ TEST_F(AnOverlayOfSubvolumes, HasNoItemWithANumberThatTwoHave) {
     EXPECT_EQ(FindAny(ID("e1/f")), "(none)");
     LetChangesAge();
   }
+}
+
+TEST_F(AnOverlayOfSubvolumes, FindsAFileWhoseEntryHasAnotherNumber) {
+  EXPECT_EQ(FindAny(ID("e1/x")), PathTo("e1/x"));
 }
 
 TEST_F(AnOverlayOfSubvolumes, ReadsOnlyFoldersThatHaveChanged) {
