@@ -705,6 +705,22 @@ TEST_F(AnIndex, DoesNotNoteAsMissedWhatItCouldNotSee) {
   EXPECT_EQ(FindAny(id), PathTo("a/b/c/d/e/f/x"));
 }
 
+TEST_F(AnIndex, FindsAFileInAnOverlayOfTwoFileSystemsByItsOwnNumber) {
+  const std::string other = mFolder.MakeFolder("other");
+  const ScopedMount lower("tmpfs", other, "tmpfs");
+  mFolder.MakeFolder("other/a");
+  mFolder.MakeFile("other/a/x");
+  Make("a");
+  MakeFile("a/y");
+  const std::string place = mFolder.MakeFolder("overlay");
+  const ScopedMount overlay("overlay", place, "overlay", 0, "lowerdir=" + mTop + ":" + other);
+  if (!overlay.IsMounted()) GTEST_SKIP() << "no overlay here";
+  mTop = place;
+  UseVolumeOf(place);
+  EXPECT_EQ(FindAny(ID("a/x")), PathTo("a/x"));
+  EXPECT_EQ(FindAny(ID("a/y")), PathTo("a/y"));
+}
+
 // An id that two items could have, on a volume whose numbers tell items apart.
 class AnIndexOfMixedIDs : public AnIndex {
  protected:

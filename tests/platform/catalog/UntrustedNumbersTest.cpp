@@ -275,7 +275,6 @@ class AnOverlayOfSubvolumes : public ABtrfsVolume {
   void SetUp() override {
     ABtrfsVolume::SetUp();
     if (IsSkipped()) return;
-    MakeFile("s1/d/x");
     Move("s1/d", "s1/e1");
     Move("s2/d", "s2/e2");
     for (const char* name : {"upper", "work"}) Make(name);
@@ -300,10 +299,6 @@ TEST_F(AnOverlayOfSubvolumes, HasNoItemWithANumberThatTwoHave) {
     EXPECT_EQ(FindAny(ID("e1/f")), "(none)");
     LetChangesAge();
   }
-}
-
-TEST_F(AnOverlayOfSubvolumes, FindsAFileWhoseEntryHasAnotherNumber) {
-  EXPECT_EQ(FindAny(ID("e1/x")), PathTo("e1/x"));
 }
 
 TEST_F(AnOverlayOfSubvolumes, ReadsOnlyFoldersThatHaveChanged) {
