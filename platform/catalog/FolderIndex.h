@@ -8,6 +8,11 @@
 // every folder once. An id that no item had is noted, and the next question for it reads only what
 // has changed since. Between two questions nothing is open.
 //
+// Where numbers do not tell items apart, a question is answered when one place of the whole volume
+// has the id: every folder was read, nothing was mounted on the volume or closed to this process,
+// and nothing changed from the first look to the last. On kinds whose change times promise nothing
+// either, nothing is kept.
+//
 // One thread. Everything may throw std::bad_alloc, after which the index is as good as new.
 #pragma once
 
@@ -31,7 +36,8 @@ class FolderIndex {
 
   // A lead to the item: the path at which it was just seen, canonical unless something moved in
   // between. Nullopt when no folder that can be read holds it, when two items have the id, and when
-  // two could have it but not every folder was seen. Folders near `start` are read first: it, those
+  // two could have it but not every folder was seen; missing permission is no reason where numbers
+  // tell items apart. Folders near `start` are read first: it, those
   // below it, those above it. REQUIRES: `start` is the canonical path of a folder; `volumes` lists
   // the volume's mounts as the index was made for.
   std::optional<std::string> Find(const SearchedItem& item, const std::string& start,

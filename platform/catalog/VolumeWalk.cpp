@@ -28,13 +28,12 @@ VolumeWalk::VolumeWalk(const volumes::Volume& volume, const volumes::Volumes& vo
 }
 
 void VolumeWalk::LookAtKnown() {
-  for (const FolderNumber folder : mTree.WithID(mQuestion.ID())) {
-    const std::string path = mTree.PathOf(folder);
-    if (path.empty() || !mVolumes.IsReachable(mVolume.Listed(), path)) continue;
-    const kernel::Spot spot = kernel::AtPath(path.c_str());
-    const auto status = kernel::ReadStatus(spot);
-    if (!status || !mTree.IsSame(folder, status->item)) continue;
-    mQuestion.Offer(status->item, mTree[folder].id, spot, [&] { return path; });
+  for (const FolderNumber number : mTree.WithID(mQuestion.ID())) {
+    const std::string path = mTree.PathOf(number);
+    const auto held = HoldAt(path);
+    if (!held || !mTree.IsSame(number, held->item)) continue;
+    const kernel::Spot spot = kernel::AtOpen(held->descriptor.Get());
+    mQuestion.Offer(held->item, mTree[number].id, spot, [&] { return path; });
   }
 }
 
@@ -292,10 +291,8 @@ void VolumeWalk::ForgetIfGone(FolderNumber folder) {
   mTree[folder].isRead = false;
   const std::string path = mTree.PathOf(folder);
   if (!path.empty()) {
-    if (!mVolumes.IsReachable(mVolume.Listed(), path)) return;
-    const auto status = kernel::ReadStatus(kernel::AtPath(path.c_str()));
-    const bool isThere =
-        status ? mTree.IsSame(folder, status->item) : !kernel::MeansGone(status.Error());
+    const auto held = HoldAt(path);
+    const bool isThere = held ? mTree.IsSame(folder, held->item) : !kernel::MeansGone(held.Error());
     if (isThere) return;
   }
   mTree.Forget(folder);
@@ -338,29 +335,34 @@ kernel::Result<kernel::Descriptor> VolumeWalk::OpenToRead(const kernel::Spot& sp
   return kernel::OpenForReading(spot);
 }
 
-// Makes a folder the last of the open ones. False when it cannot be opened, and when another is in
+// The folder at the known path of one, no links on the way. kNoVolume where something else is
+// mounted.
+kernel::Result<VolumeWalk::HeldItem> VolumeWalk::HoldAt(const std::string& path) const {
+  const bool isReachable = !path.empty() && mVolumes.IsReachable(mVolume.Listed(), path);
+  if (!isReachable) return kernel::kNoVolume;
+  auto held = kernel::HoldFolderWithoutLinks(path);
+  if (!held) return held.Error();
+  const auto status = kernel::ReadStatus(kernel::AtOpen(held->Get()));
+  if (!status) return status.Error();
+  return HeldItem{*std::move(held), status->item};
+}
+
+// Makes a folder the last of the open ones. False when it cannot be held, and when another is in
 // its place.
 bool VolumeWalk::EnterFolder(FolderNumber folder) {
   while (!mOpen.empty() && mOpen.back().number != folder) mOpen.pop_back();
   if (!mOpen.empty()) return true;
-  const std::string path = mTree.PathOf(folder);
-  if (path.empty() || !mVolumes.IsReachable(mVolume.Listed(), path)) {
+  auto held = HoldAt(mTree.PathOf(folder));
+  if (held && mTree.IsSame(folder, held->item)) {
+    KeepOpen(folder, std::move(held->descriptor));
+    return true;
+  }
+  if (held || held.Error() == kernel::kNoVolume) {
     mQuestion.NoteHidden();
-    return false;
+  } else {
+    mQuestion.NoteError(held.Error());
   }
-  auto held = kernel::HoldFolderWithoutLinks(path);
-  const auto status = held ? kernel::ReadStatus(kernel::AtOpen(held->Get()))
-                           : kernel::Result<kernel::Status>(held.Error());
-  if (!status) {
-    mQuestion.NoteError(status.Error());
-    return false;
-  }
-  if (!mTree.IsSame(folder, status->item)) {
-    mQuestion.NoteHidden();
-    return false;
-  }
-  KeepOpen(folder, *std::move(held));
-  return true;
+  return false;
 }
 
 void VolumeWalk::KeepOpen(FolderNumber folder, kernel::Descriptor descriptor) {

@@ -55,6 +55,10 @@ class VolumeWalk {
     kernel::Descriptor descriptor;
     bool holdsMountPoint;
   };
+  struct HeldItem {
+    kernel::Descriptor descriptor;
+    kernel::Item item;
+  };
   // A folder that is being visited.
   struct Visited {
     const FolderPlace& place;
@@ -87,6 +91,7 @@ class VolumeWalk {
   void Invalidate(FolderNumber folder);
 
   kernel::Result<kernel::Descriptor> OpenToRead(const kernel::Spot& spot);
+  kernel::Result<HeldItem> HoldAt(const std::string& path) const;
   bool EnterFolder(FolderNumber folder);
   void KeepOpen(FolderNumber folder, kernel::Descriptor descriptor);
 

@@ -705,6 +705,22 @@ TEST_F(AnIndex, DoesNotNoteAsMissedWhatItCouldNotSee) {
   EXPECT_EQ(FindAny(id), PathTo("a/b/c/d/e/f/x"));
 }
 
+TEST_F(AnIndex, FindsAFileInAnOverlayOfTwoFileSystemsByItsOwnNumber) {
+  const std::string other = mFolder.MakeFolder("other");
+  const ScopedMount lower("tmpfs", other, "tmpfs");
+  mFolder.MakeFolder("other/a");
+  mFolder.MakeFile("other/a/x");
+  Make("a");
+  MakeFile("a/y");
+  const std::string place = mFolder.MakeFolder("overlay");
+  const ScopedMount overlay("overlay", place, "overlay", 0, "lowerdir=" + mTop + ":" + other);
+  if (!overlay.IsMounted()) GTEST_SKIP() << "no overlay here";
+  mTop = place;
+  UseVolumeOf(place);
+  EXPECT_EQ(FindAny(ID("a/x")), PathTo("a/x"));
+  EXPECT_EQ(FindAny(ID("a/y")), PathTo("a/y"));
+}
+
 // An id that two items could have, on a volume whose numbers tell items apart.
 class AnIndexOfMixedIDs : public AnIndex {
  protected:
@@ -833,6 +849,22 @@ TEST_F(AnIndexBesideADeadMount, DoesNotLookForWhatItKnewBelowIt) {
   if (IsSkipped()) return;
   EXPECT_EQ(Find(mBelow), "(none)");
   EXPECT_EQ(Find(mCovered), "(none)");
+}
+
+TEST_F(AnIndexBesideADeadMount, IsNotLedThereByALinkInAFoldersPlace) {
+  for (const char* name : {"gone/below", "moved/below"}) Make(name);
+  const std::uint32_t gone = ID("gone/below");
+  const std::uint32_t moved = ID("moved/below");
+  KnowEverything();
+  Kill();
+  if (IsSkipped()) return;
+  Remove(PathTo("gone"));
+  Move("moved", "elsewhere");
+  for (const char* name : {"gone", "moved"}) {
+    std::filesystem::create_directory_symlink(PathTo("a/dead"), PathTo(name));
+  }
+  EXPECT_EQ(Find(moved), PathTo("elsewhere/below"));
+  EXPECT_EQ(Find(gone), "(none)");
 }
 
 }  // namespace

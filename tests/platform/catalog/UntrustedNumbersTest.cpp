@@ -139,6 +139,12 @@ TEST_F(AnUntrustedVolume, KeepsNothingFromOneQuestionToTheNext) {
   EXPECT_EQ(OpenedFor(kOfNoItem), opened);
 }
 
+TEST_F(AnUntrustedVolume, IsReadOnceWhereverTheSearchStarts) {
+  Make("a/d/e");
+  const std::uint64_t opened = OpenedForAny(kOfNoItem);
+  EXPECT_EQ(OpenedForAny(kOfNoItem, "a/d"), opened);
+}
+
 // The second of two moves from where the walk has not looked to where it has.
 TEST_F(AnUntrustedVolume, MissesNothingThatMovesWhileItLooks) {
   MakeShared("c/f");
