@@ -8,7 +8,7 @@
 namespace tallowmere::test {
 
 // The numbers of the calls that `work` makes after `prepare`, but those for memory: both run in a
-// child process, traced. None where it cannot be traced.
+// child process, traced. None where nothing can be traced; throws when they end the child.
 std::optional<std::vector<long>> CallsOf(const std::function<void()>& prepare,
                                          const std::function<void()>& work);
 

@@ -1,5 +1,7 @@
 // From id to place: what was remembered is verified, and nothing but the item itself is an answer.
+#include <fcntl.h>
 #include <sys/mount.h>
+#include <sys/stat.h>
 
 #include <filesystem>
 #include <fstream>
@@ -23,6 +25,12 @@ class TheCatalog : public testing::Test {
   }
   std::string Make(const std::string& name) const { return mFolder.MakeFolder("volume/" + name); }
   std::string Top() const { return mFolder.Path() / "volume"; }
+  // The mount's id, by statx(2) itself.
+  std::uint64_t MountID() const {
+    struct statx about {};
+    EXPECT_EQ(statx(AT_FDCWD, Top().c_str(), 0, STATX_MNT_ID, &about), 0);
+    return about.stx_mnt_id;
+  }
   SInt16 Number() const { return InfoOf(Top()).volume; }
   // What has the id on the volume: a path, or the result code in brackets.
   std::string FindFolder(std::uint32_t id) const { return FolderWithID(Number(), id); }
@@ -90,16 +98,16 @@ TEST_F(TheCatalog, SearchesANewVolumeThatHasTheNumberOfAFormerOne) {
   };
   const std::string path = fill("volume");
   EXPECT_EQ(searchFor(path), path);
-  const SInt16 number = Number();
+  const std::uint64_t former = MountID();
   ScopedMount other("tmpfs", mFolder.MakeFolder("other"), "tmpfs");
   fill("other");
   // The kernel gives the lowest free number, which another process can have taken for a while.
-  for (int attempt = 0; attempt == 0 || (attempt < 1000 && Number() != number); ++attempt) {
+  for (int attempt = 0; attempt == 0 || (attempt < 1000 && MountID() != former); ++attempt) {
     mMount->Unmount();
     mMount.emplace(mFolder.Path() / "other", Top(), "", MS_BIND);
   }
   other.Unmount();
-  if (Number() != number) GTEST_SKIP() << "another mount has the number";
+  if (MountID() != former) GTEST_SKIP() << "another mount has the number";
   EXPECT_EQ(searchFor(path), path);
 }
 
