@@ -17,17 +17,18 @@ bool IsForMemory(long call) {
 }
 
 // One call, by which the parent knows where the child is.
-void Stop() {
-  syscall(SYS_kill, getpid(), SIGSTOP);
+void Stop(pid_t self) {
+  kill(self, SIGSTOP);
 }
 
 [[noreturn]] void Run(const std::function<void()>& prepare, const std::function<void()>& work) {
+  const pid_t self = getpid();
   if (ptrace(PTRACE_TRACEME, 0, nullptr, nullptr) != 0) _exit(1);
-  Stop();
+  Stop(self);
   prepare();
-  Stop();
+  Stop(self);
   work();
-  Stop();
+  Stop(self);
   _exit(0);
 }
 

@@ -20,6 +20,7 @@ class TheCatalog : public testing::Test {
  protected:
   void SetUp() override {
     if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    std::filesystem::permissions(mFolder.Path(), std::filesystem::perms(0755));
     mMount.emplace("tmpfs", mFolder.MakeFolder("volume"), "tmpfs");
     ASSERT_TRUE(mMount->IsMounted());
   }

@@ -39,6 +39,8 @@ class AMoment : public testing::Test {
       mFolder.MakeFolder(std::string(name) + "/a/b");
       mFolder.MakeFile(std::string(name) + "/a/b/x");
     }
+    // Child processes share the kernel's signal that the mounts have changed: it is for this one.
+    VolumeAt(1);
   }
   std::string PathTo(const std::string& name) const { return mFolder.Path() / name; }
   void Rename(const std::string& from, const std::string& to) const {
