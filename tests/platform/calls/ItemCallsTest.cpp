@@ -1,5 +1,7 @@
 // FSGetCatalogInfo, FSResolveNodeID, FSMakeFSRefUnicode, FSpMakeFSRef and PBGetCatInfoSync.
+#include <gmock/gmock.h>
 #include <sys/mount.h>
+#include <sys/syscall.h>
 
 #include <algorithm>
 #include <cstring>
@@ -7,6 +9,7 @@
 #include <vector>
 
 #include "platform/HostCalls.h"
+#include "support/CountedCalls.h"
 #include "support/OwnMountNamespace.h"
 #include "support/Privileges.h"
 #include "support/TemporaryFolder.h"
@@ -324,6 +327,37 @@ TEST_F(ItemCalls, TheRootOfAnotherVolumeHasParent1AndItsOwnName) {
   EXPECT_EQ(NameOf(spec), "My Disk");
   EXPECT_EQ(ItemOf(spec), path);
   EXPECT_EQ(IDOf(path), 2u);
+}
+
+// --- What is on no volume -----------------------------------------------------------------------
+
+TEST_F(ItemCalls, TheFolderOfAKernelInterfaceHasAnIDThatLeadsNowhere) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const ScopedMount interface("none", mFolder.MakeFolder("interface"), "proc");
+  if (!interface.IsMounted()) GTEST_SKIP() << "proc cannot be mounted here";
+  const FSCatalogInfo info = InfoOf(mFolder.Path() / "interface");
+  EXPECT_EQ(info.volume, mInfo.volume);
+  EXPECT_EQ(info.nodeID, 3u);
+  EXPECT_EQ(ItemOf(MakeRecord(info.volume, info.nodeID, "version")), "(-120)");
+  EXPECT_EQ(ItemWithID(info.volume, info.nodeID), "(-43)");
+}
+
+TEST_F(ItemCalls, ItemsOfAKernelInterfaceAreOnNoVolume) {
+  const FSRef reference = ReferenceTo("/proc/version");
+  FSCatalogInfo info{};
+  EXPECT_EQ(FSGetCatalogInfo(&reference, kFSCatInfoVolume, &info, nullptr, nullptr, nullptr),
+            nsvErr);
+  EXPECT_EQ(PathOf(reference), "/proc/version");
+}
+
+TEST_F(ItemCalls, TheIDOfWhatIsOnNoVolumeIsNotSearchedFor) {
+  const auto calls = CallsOf([] {},
+                             [&] {
+                               ItemOf(MakeRecord(mInfo.volume, 3, "x"));
+                               ItemWithID(mInfo.volume, 3);
+                             });
+  if (!calls) GTEST_SKIP() << "nothing can be traced here";
+  EXPECT_THAT(*calls, testing::Not(testing::Contains(SYS_getdents64)));
 }
 
 TEST_F(ItemCalls, AFileThatIsMountedAloneComesBack) {

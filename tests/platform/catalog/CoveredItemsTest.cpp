@@ -121,6 +121,16 @@ TEST_F(CoveredItems, AreNotWhatAFullPathLeadsToWhereverTheyWereSeen) {
   EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
 }
 
+// The volume still shows each of its folders at one place.
+TEST_F(CoveredItems, AreNoneWhereAFileOfTheVolumeIsMountedElsewhere) {
+  mFolder.MakeFile("elsewhere");
+  Cover("elsewhere", PathTo("volume/file"));
+  const FSSpec spec = SpecOf(PathTo("volume/file"));
+  EXPECT_EQ(NameOf(spec), "file");
+  EXPECT_EQ(ItemOf(spec), PathTo("volume/file"));
+  ExpectRoundTrip(PathTo("elsewhere"));
+}
+
 // At the place where its mount hangs another volume's folder may have the same name.
 TEST_F(CoveredItems, OfAPartThatIsMountedByItselfTheVolumesOwnFolderIsTold) {
   // The first inodes are too low for ids that are remembered.

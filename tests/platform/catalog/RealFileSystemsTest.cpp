@@ -147,7 +147,7 @@ TEST_F(ARealFileSystem, BtrfsKeepsThePromises) {
   ExpectTheSameIDsAfterMountingAgain();
 }
 
-TEST_F(ARealFileSystem, BtrfsKeepsThemInSubvolumesWhileItIsMounted) {
+TEST_F(ARealFileSystem, BtrfsKeepsThemInSubvolumes) {
   MakeImage("btrfs", {"mkfs.btrfs", "-q", "-f"}, 128 * kMegabyte);
   if (IsSkipped()) return;
   const std::string top = mImage->Path();
@@ -167,6 +167,22 @@ TEST_F(ARealFileSystem, BtrfsKeepsThemInSubvolumesWhileItIsMounted) {
       return FSResolveNodeID(info.volume, info.nodeID, &found) == noErr && PathOf(found) == path;
     })) << path;
   }
+  ExpectTheSameIDsAfterMountingAgain();
+}
+
+// The first subvolume that is made has the number 256, and its folder too.
+TEST_F(ARealFileSystem, BtrfsTellsASubvolumeInTheIDsOfItsItems) {
+  MakeImage("btrfs", {"mkfs.btrfs", "-q", "-f"}, 128 * kMegabyte);
+  if (IsSkipped()) return;
+  const std::string top = mImage->Path();
+  for (const char* name : {"/one", "/two"}) {
+    ASSERT_TRUE(RunTool({"btrfs", "subvolume", "create", top + name}));
+    std::filesystem::create_directory(top + name + "/folder");
+  }
+  EXPECT_EQ(IDOf(top + "/one"), 0x80000000 + 256);
+  EXPECT_EQ(IDOf(top + "/one/folder"), 0x80000000 + 257);
+  EXPECT_EQ(IDOf(top + "/two"), 0x80000000 + (1 << 22) + 256);
+  EXPECT_EQ(IDOf(top + "/two/folder"), 0x80000000 + (1 << 22) + 257);
 }
 
 TEST_F(ARealFileSystem, ASubvolumeMountedAloneKeepsThePromises) {

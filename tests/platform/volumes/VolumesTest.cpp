@@ -2,6 +2,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <linux/fs.h>
+#include <sys/mount.h>
 #include <sys/resource.h>
 #include <unistd.h>
 
@@ -255,6 +256,24 @@ TEST(TheTableOfVolumes, IsReadAnewWhenSomethingWasMountedAndOnlyThen) {
   // Who holds the former state still has it whole.
   EXPECT_EQ(before->OfPath(place)->MountPoint(),
             after->OfPath(folder.Path().string())->MountPoint());
+}
+
+TEST(AVolume, IsShownWhereAFolderOfItIsMountedAndNotWhereAFileIs) {
+  if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  const std::string place = folder.MakeFolder("place");
+  const test::ScopedMount mount("none", place, "tmpfs");
+  ASSERT_TRUE(mount.IsMounted());
+  const test::ScopedMount ofFile(folder.MakeFile("place/file"), folder.MakeFile("file"), "",
+                                 MS_BIND);
+  ASSERT_TRUE(ofFile.IsMounted());
+  VolumeTable table;
+  const auto volume = table.Now()->OfPath(place);
+  EXPECT_THAT(volume->MountPoints(), testing::ElementsAre(place));
+  const std::string again = folder.MakeFolder("again");
+  const test::ScopedMount ofFolder(folder.MakeFolder("place/folder"), again, "", MS_BIND);
+  ASSERT_TRUE(ofFolder.IsMounted());
+  EXPECT_THAT(table.Now()->OfPath(place)->MountPoints(), testing::ElementsAre(place, again));
 }
 
 // --- The name of the volume of "/" --------------------------------------------------------------
