@@ -5,13 +5,14 @@
 #include <string>
 #include <vector>
 
-#include "files/MountInfo.h"
 #include "fuzz/Check.h"
+#include "kernel/FileSystemKinds.h"
+#include "volumes/MountTree.h"
 
 namespace tallowmere::fuzz {
 namespace {
 
-using files::Mount;
+using volumes::Mount;
 
 // As the kernel escapes a field.
 void AppendEscaped(std::string& line, std::string_view field) {
@@ -46,7 +47,7 @@ bool IsSame(const Mount& a, const Mount& b) {
 void CheckLinesOf(const std::vector<Mount>& mounts) {
   std::string table;
   for (const Mount& mount : mounts) AppendLine(table, mount);
-  const std::vector<Mount> again = files::ParseMountInfo(table);
+  const std::vector<Mount> again = volumes::ParseMountInfo(table);
   Check(std::equal(mounts.begin(), mounts.end(), again.begin(), again.end(), IsSame));
 }
 
@@ -67,7 +68,7 @@ void CheckMountsAt(std::string_view text) {
 void CheckVolumes(const std::vector<Mount>& mounts, std::size_t root) {
   const int rootID = mounts[root].id;
   const auto isFolder = [](const Mount& mount) { return !mount.mountPoint.ends_with('f'); };
-  const auto volumes = files::GroupIntoVolumes(mounts, rootID, isFolder);
+  const auto volumes = volumes::MountTree(mounts, rootID).GroupIntoVolumes(isFolder);
 
   std::vector<bool> isTaken(mounts.size());
   std::size_t lastPlace = 0;
@@ -82,7 +83,7 @@ void CheckVolumes(const std::vector<Mount>& mounts, std::size_t root) {
       Check(index < mounts.size() && !isTaken[index]);
       isTaken[index] = true;
       Check(mounts[index].device == mounts[place].device);
-      Check(files::HoldsFiles(mounts[index].type) || mounts[index].id == rootID);
+      Check(kernel::HoldsFiles(mounts[index].type) || mounts[index].id == rootID);
     }
   }
 }
@@ -96,7 +97,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   Input input(data, size);
   const std::size_t root = input.TakeByte();
   const std::string_view text = input.Rest();
-  const auto mounts = tallowmere::files::ParseMountInfo(text);
+  const auto mounts = tallowmere::volumes::ParseMountInfo(text);
   CheckMounts(mounts);
   CheckMountsAt(text);
   if (!mounts.empty()) CheckVolumes(mounts, root % mounts.size());

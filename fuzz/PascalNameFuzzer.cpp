@@ -7,26 +7,26 @@
 #include <string>
 
 #include "CFOwned.h"
-#include "files/HFSNames.h"
-#include "files/NodeID.h"
-#include "files/PascalName.h"
 #include "foundation/ColonsAndSlashes.h"
-#include "fuzz/Check.h"
-#include "text/FileNameText.h"
+#include "foundation/FileNameText.h"
 #include "text/MacRoman.h"
+#include "fuzz/Check.h"
+#include "names/HFSNames.h"
+#include "names/NodeIDs.h"
+#include "names/PascalNames.h"
 
 namespace tallowmere::fuzz {
 namespace {
 
-using files::kLongestSpecName;
-using files::kLongestStr255Name;
+using names::kLongestSpecName;
+using names::kLongestStr255Name;
 
 // Any bytes are text, and Mac Roman text at that, and come back.
 void CheckText(std::string_view bytes) {
-  Check(text::FileNameOfText(text::TextOfFileName(bytes)) == bytes);
+  Check(foundation::FileNameOfText(foundation::TextOfFileName(bytes)) == bytes);
   const std::u16string text = text::DecodeMacRoman(bytes);
   Check(text::EncodeMacRoman(text) == bytes);
-  Check(text::EncodeMacRoman(text::DecomposeMacRoman(text)) == bytes);
+  Check(text::EncodeMacRoman(foundation::DecomposeMacRoman(text)) == bytes);
   Check(HFSNameOfUtf8(Utf8OfHFSName(bytes)) == bytes);
 }
 
@@ -34,33 +34,33 @@ void CheckText(std::string_view bytes) {
 // it can stand for.
 void CheckLinuxName(std::string_view name, std::uint32_t id, std::size_t marks) {
   for (const std::size_t limit : {kLongestSpecName, kLongestStr255Name}) {
-    const auto plain = files::PlainHFSName(name, limit);
+    const auto plain = names::PlainHFSName(name, limit);
     if (!plain) continue;
     Check(plain->size() <= limit);
-    const auto spelled = files::SpellHFSName(*plain);
-    Check(spelled.precomposed.empty() == !files::CanBeLinuxName(name));
+    const auto spelled = names::SpellHFSName(*plain);
+    Check(spelled.precomposed.empty() == !names::CanBeLinuxName(name));
     if (!spelled.precomposed.empty()) {
-      Check(files::PlainHFSName(spelled.precomposed, limit) == plain);
+      Check(names::PlainHFSName(spelled.precomposed, limit) == plain);
     }
   }
-  if (!files::CanBeNodeID(id)) return;
-  const std::string shortName = files::ShortHFSName(name, id, marks);
+  if (!names::CanBeNodeID(id)) return;
+  const std::string shortName = names::ShortHFSName(name, id, marks);
   Check(shortName.size() <= 31);
-  const auto readings = files::ReadShortHFSName(shortName);
-  Check(std::any_of(readings.begin(), readings.end(), [&](const files::ShortNameParts& parts) {
+  const auto readings = names::ReadShortHFSName(shortName);
+  Check(std::any_of(readings.begin(), readings.end(), [&](const names::ShortNameParts& parts) {
     return parts.nodeID == id && parts.marks >= marks;
   }));
 }
 
 // What an HFS name can stand for is called so.
 void CheckHFSName(std::string_view name) {
-  const auto spelled = files::SpellHFSName(name);
+  const auto spelled = names::SpellHFSName(name);
   if (spelled.precomposed.empty()) return;
-  Check(files::CanBeLinuxName(spelled.precomposed));
-  Check(files::PlainHFSName(spelled.precomposed, name.size()) == name);
+  Check(names::CanBeLinuxName(spelled.precomposed));
+  Check(names::PlainHFSName(spelled.precomposed, name.size()) == name);
   if (spelled.decomposed.empty()) return;
   Check(spelled.decomposed != spelled.precomposed);
-  Check(files::PlainHFSName(spelled.decomposed, name.size()) == name);
+  Check(names::PlainHFSName(spelled.decomposed, name.size()) == name);
 }
 
 // C strings to Pascal strings and back.
@@ -69,7 +69,7 @@ void CheckPascalStrings(std::string_view bytes) {
   Str255 pascal;
   c2pstrcpy(pascal, text.c_str());
   const auto kept = std::string_view(text).substr(0, kLongestStr255Name);
-  Check(files::TextOfPascal(pascal) == kept);
+  Check(names::TextOfPascal(pascal) == kept);
   char back[kLongestStr255Name + 1];
   p2cstrcpy(back, pascal);
   Check(back == kept);
@@ -80,7 +80,7 @@ void CheckPascalStrings(std::string_view bytes) {
 // A string as a Pascal name in a buffer of that size, and back. A ':' of the string becomes a '/',
 // and every '/' comes back as ':'.
 void CheckBridge(std::string_view bytes, SInt32 bufferSize) {
-  const std::u16string text = text::TextOfFileName(bytes);
+  const std::u16string text = foundation::TextOfFileName(bytes);
   const CFOwned<CFStringRef> string(CFStringCreateWithCharacters(
       kCFAllocatorDefault, reinterpret_cast<const UniChar*>(text.data()),
       static_cast<CFIndex>(text.size())));
@@ -92,12 +92,12 @@ void CheckBridge(std::string_view bytes, SInt32 bufferSize) {
   if (bufferSize < 1) return;
   Check(name[0] < bufferSize);
   if (isWhole) {
-    Check(foundation::ExchangeColonsAndSlashes(std::string(files::TextOfPascal(name))) ==
+    Check(foundation::ExchangeColonsAndSlashes(std::string(names::TextOfPascal(name))) ==
           text::EncodeMacRoman(text));
   }
   const CFOwned<CFMutableStringRef> back(CreateCFStringFromPascalString(name));
   Check(back.Get() != nullptr);
-  std::u16string expected = text::DecodeMacRoman(files::TextOfPascal(name));
+  std::u16string expected = text::DecodeMacRoman(names::TextOfPascal(name));
   std::replace(expected.begin(), expected.end(), u'/', u':');
   const CFIndex length = CFStringGetLength(back.Get());
   Check(static_cast<std::size_t>(length) == expected.size());
@@ -126,7 +126,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const unsigned way = input.TakeByte() % 5;
   const unsigned times = 1 + input.TakeByte() % kMostTimes;
   const auto bufferSize = static_cast<SInt32>(input.TakeByte());
-  const std::size_t marks = 1 + input.TakeByte() % tallowmere::files::kMostMarks;
+  const std::size_t marks = 1 + input.TakeByte() % tallowmere::names::kMostMarks;
   const std::uint32_t id = input.TakeTwoBytes() | input.TakeTwoBytes() << 16;
   const std::string repeated = times > 1 ? Repeated(input.Rest(), times) : "";
   const std::string_view name = times > 1 ? repeated : input.Rest();

@@ -8,21 +8,21 @@
 #include <cstring>
 #include <string>
 
-#include "files/PascalName.h"
 #include "fuzz/Check.h"
 #include "fuzz/SmallTree.h"
+#include "names/PascalNames.h"
 
 namespace tallowmere::fuzz {
 namespace {
 
 bool IsSame(const FSSpec& a, const FSSpec& b) {
   return a.vRefNum == b.vRefNum && a.parID == b.parID &&
-         files::TextOfPascal(a.name) == files::TextOfPascal(b.name);
+         names::TextOfPascal(a.name) == names::TextOfPascal(b.name);
 }
 
 OSErr MakeSpec(SInt16 volume, SInt32 folder, std::string_view path, FSSpec& spec) {
   Str255 pascal;
-  files::CopyToPascal(path, pascal);
+  names::CopyToPascal(path, pascal);
   return FSMakeFSSpec(volume, folder, pascal, &spec);
 }
 
@@ -33,7 +33,7 @@ void CheckItem(const FSSpec& spec) {
   FSSpec again;
   Check(FSGetCatalogInfo(&item, kFSCatInfoNone, nullptr, nullptr, &again, nullptr) == noErr);
   Check(IsSame(again, spec));
-  Check(MakeSpec(spec.vRefNum, spec.parID, files::TextOfPascal(spec.name), again) == noErr);
+  Check(MakeSpec(spec.vRefNum, spec.parID, names::TextOfPascal(spec.name), again) == noErr);
   Check(IsSame(again, spec));
 
   const CFileRef reference(&item);
@@ -42,7 +42,7 @@ void CheckItem(const FSSpec& spec) {
   Check(length == std::strlen(buffer.data()));
   // A path that leaves folders out, or has to be cut, is not the item's.
   std::string path(buffer.data());
-  if (!reference.IsFolder()) path += files::TextOfPascal(spec.name);
+  if (!reference.IsFolder()) path += names::TextOfPascal(spec.name);
   if (path.size() > sizeof(Str255) - 1) return;
   Check(MakeSpec(0, 0, path, again) == noErr);
   Check(IsSame(again, spec));
@@ -53,7 +53,7 @@ void CheckNewItem(const FSSpec& spec) {
   FSRef item;
   Check(FSpMakeFSRef(&spec, &item) == fnfErr);
   FSSpec again;
-  Check(MakeSpec(spec.vRefNum, spec.parID, files::TextOfPascal(spec.name), again) == fnfErr);
+  Check(MakeSpec(spec.vRefNum, spec.parID, names::TextOfPascal(spec.name), again) == fnfErr);
   Check(IsSame(again, spec));
 }
 

@@ -1,5 +1,6 @@
 #include "fuzz/SmallTree.h"
 
+#include <CoreServices/CoreServices.h>
 #include <fcntl.h>
 #include <sys/mount.h>
 #include <unistd.h>
@@ -9,7 +10,6 @@
 #include <memory>
 #include <string>
 
-#include "files/MountTable.h"
 #include "fuzz/Check.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
@@ -98,6 +98,13 @@ bool ShowMountTable(const test::TemporaryFolder& tree) {
   return mount("/proc/self/mountinfo", table.c_str(), nullptr, MS_BIND, nullptr) == 0;
 }
 
+std::int16_t NumberAtIndex(std::uint32_t index) {
+  FSVolumeInfoParam volume{};
+  volume.volumeIndex = index;
+  Check(PBGetVolumeInfoSync(&volume) == noErr);
+  return volume.ioVRefNum;
+}
+
 }  // namespace
 
 void MakeSmallTree() {
@@ -126,8 +133,7 @@ InsideSmallTree::~InsideSmallTree() {
 
 std::int16_t VolumeNumberHere(std::int16_t number) {
   if (number != -1 && number != -2) return number;
-  static const std::int16_t numbers[] = {files::MountTable::OfThisProcess().AtIndex(0)->Number(),
-                                         files::MountTable::OfThisProcess().AtIndex(1)->Number()};
+  static const std::int16_t numbers[] = {NumberAtIndex(1), NumberAtIndex(2)};
   return numbers[-1 - number];
 }
 

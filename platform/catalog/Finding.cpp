@@ -70,20 +70,21 @@ std::optional<Sighting> SeeWithID(Moment& moment, const volumes::Volume& volume,
   return *std::move(seen);
 }
 
-// The nearest folder to a former place of an item that is still there and on the volume; else the
-// volume's root folder. What is on another volume, by the spelling or behind a link, is not looked
-// at: that one may not answer.
+// The nearest folder to a former place, that place among them, that is still there and on the
+// volume; else the volume's root folder. What is on another volume, by the spelling or behind a
+// link, is not looked at: that one may not answer.
 std::string NearestFolder(Moment& moment, const volumes::Volume& volume,
                           const std::string& formerPlace) {
   const auto& volumes = moment.Volumes();
   const auto former = volumes.OfPath(formerPlace);
   const bool isNear =
       former && former->Number() == volume.Number() && kernel::IsNormalized(formerPlace);
-  for (std::string path = formerPlace; isNear && path != "/";) {
-    path = foundation::FolderOf(path);
-    if (!volumes.IsReachable(*former, path)) continue;
-    const auto held = moment.HoldFolder(path);
-    if (held && held->Volume()->Number() == volume.Number()) return path;
+  for (std::string path = formerPlace; isNear; path = foundation::FolderOf(path)) {
+    if (volumes.IsReachable(*former, path)) {
+      const auto held = moment.HoldFolder(path);
+      if (held && held->Volume()->Number() == volume.Number()) return path;
+    }
+    if (path == "/") break;
   }
   return volume.MountPoint();
 }

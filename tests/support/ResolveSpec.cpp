@@ -10,8 +10,7 @@
 #include <cstdio>
 #include <cstring>
 
-#include "files/Catalog.h"
-#include "files/ItemReference.h"
+#include "platform/foundation/TestStrings.h"
 
 int main(int count, char** arguments) {
   constexpr uid_t kNobody = 65534;
@@ -24,9 +23,9 @@ int main(int count, char** arguments) {
     FSRef reference;
     OSErr error = FSpMakeFSRef(&spec, &reference);
     std::printf("%d ", error);
-    const auto item = error == noErr ? tallowmere::files::Unpack(&reference) : std::nullopt;
-    const auto path = item ? tallowmere::files::FindCanonicalPath(*item) : std::nullopt;
-    if (path) {
+    const CFOwned url(error == noErr ? CFURLCreateFromFSRef(kCFAllocatorDefault, &reference)
+                                     : nullptr);
+    if (const auto path = tallowmere::foundation::test::PathOf(url)) {
       for (const char byte : *path) std::printf("%02x", static_cast<unsigned char>(byte));
     }
     std::printf("\n");

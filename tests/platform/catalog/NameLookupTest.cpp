@@ -1,19 +1,30 @@
+// HFS names of items in a folder, and the items that they find.
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
 #include <cerrno>
 #include <climits>
-#include <map>
+#include <cstring>
+#include <filesystem>
 #include <set>
 #include <vector>
 
-#include "CatalogFixture.h"
-#include "files/Descriptor.h"
-#include "files/HFSNames.h"
-#include "files/MountTable.h"
-#include "files/NameLookup.h"
+#include "kernel/Descriptor.h"
+#include "names/HFSNames.h"
+#include "platform/HostCalls.h"
+#include "support/OwnMountNamespace.h"
+#include "support/Privileges.h"
+#include "support/RefusedCalls.h"
+#include "support/TemporaryFolder.h"
 
-namespace tallowmere::files {
+namespace tallowmere::test {
 namespace {
 
-using test::TemporaryFolder;
+using kernel::Descriptor;
+using names::ShortHFSName;
+using names::SpellHFSName;
 
 const std::string kComposed = "caf\xC3\xA9";
 const std::string kDecomposed = "cafe\xCC\x81";
@@ -264,8 +275,9 @@ TEST_F(NamesInAFolder, HardLinksWithOneShortFormComeBackAsOneItem) {
 TEST_F(NamesInAFolder, ALiteralNameForEveryNumberOfMarksButOneLeavesThatOne) {
   const std::string name = "\xE6\x97\xA5.aif";
   const std::uint32_t id = IDOf(Make(name));
-  for (std::size_t marks = 1; marks < kMostMarks; ++marks) Make(ShortHFSName(name, id, marks));
-  EXPECT_EQ(HFSName(name), ShortHFSName(name, id, kMostMarks));
+  for (std::size_t marks = 1; marks < names::kMostMarks; ++marks)
+    Make(ShortHFSName(name, id, marks));
+  EXPECT_EQ(HFSName(name), ShortHFSName(name, id, names::kMostMarks));
   ExpectRoundTrip(name);
 }
 
@@ -298,12 +310,27 @@ TEST_F(NamesInAFolder, AShortFormOfWhatCannotBeLookedAtIsNotTakenForANewName) {
   const Descriptor folder(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   const Descriptor file(
       openat(folder.Get(), longName.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0644));
-  const auto item = ReadItem(file.Get(), "");
-  ASSERT_TRUE(item);
-  const VolumePointer volume = MountTable::OfThisProcess().WithNumber(mInfo.volume);
-  const std::string shortForm = ShortHFSName(longName, NodeIDOf(*item, *volume->Root()));
+  struct stat about {};
+  ASSERT_EQ(fstat(file.Get(), &about), 0);
+  ASSERT_TRUE(about.st_ino >= 16 && about.st_ino <= 0x7FFFFFFF) << "the number is not the id";
+  const std::string shortForm = ShortHFSName(longName, static_cast<std::uint32_t>(about.st_ino));
   EXPECT_EQ(ItemOf(MakeRecord(mInfo.volume, IDOf(path), shortForm)), "(-36)");
   unlinkat(folder.Get(), longName.c_str(), 0);
+}
+
+// A sandbox that lets folders be searched, and not read.
+TEST_F(NamesInAFolder, AFolderWhoseReadingIsForbiddenIsRefused) {
+  ASSERT_EQ(LookUp("missing\x8E"), "(-43)");
+  for (const int error : {EACCES, EPERM}) {
+    EXPECT_TRUE(HoldsInChild([&] { return RefuseCall(SYS_openat, error); },
+                             [&] { return LookUp("missing\x8E") == "(-5000)"; }))
+        << error;
+    EXPECT_TRUE(HoldsInChild([&] { return RefuseCall(SYS_getdents64, error); },
+                             [&] { return LookUp("missing\x8E") == "(-5000)"; }))
+        << error;
+  }
+  EXPECT_TRUE(HoldsInChild([] { return RefuseCall(SYS_getdents64, EIO); },
+                           [&] { return LookUp("missing\x8E") == "(-36)"; }));
 }
 
 TEST_F(NamesInAFolder, NoItemIsCalledSo) {
@@ -359,4 +386,4 @@ TEST_F(NamesInAFolder, ManyHostileNamesSideBySideComeBack) {
 }
 
 }  // namespace
-}  // namespace tallowmere::files
+}  // namespace tallowmere::test

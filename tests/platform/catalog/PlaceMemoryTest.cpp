@@ -4,22 +4,19 @@
 #include <map>
 #include <string>
 
-#include "files/PlaceMemory.h"
+#include "catalog/PlaceMemory.h"
 
-namespace tallowmere::files {
+namespace tallowmere::catalog {
 namespace {
 
 constexpr std::size_t kPlenty = 1 << 16;
 
-ItemReference Item(std::uint64_t device, std::uint64_t inode) {
-  ItemReference item{};
-  item.device = device;
-  item.inode = inode;
-  return item;
+PlaceKey Item(std::uint64_t space, std::uint64_t number) {
+  return {space, number};
 }
 
-std::string PathOf(const std::string* place) {
-  return place == nullptr ? "(null)" : *place;
+std::string PathOf(const PlaceMemory::Place* place) {
+  return place == nullptr ? "(null)" : place->path;
 }
 
 // Bytes that one place with a short path takes.
@@ -97,6 +94,32 @@ TEST(PlaceMemory, StaysBoundedAfterAMillionItems) {
   EXPECT_NE(memory.Recall(Item(1, 999999)), nullptr);
 }
 
+TEST(PlaceMemory, KnowsTheParentOfAPlaceUntilTheItemIsElsewhere) {
+  PlaceMemory memory(kPlenty);
+  memory.Remember(Item(1, 1), "/a");
+  EXPECT_EQ(memory.Recall(Item(1, 1))->parent, 0U);
+  memory.RememberParent(Item(1, 1), "/b", 7);
+  EXPECT_EQ(memory.Recall(Item(1, 1))->parent, 0U);
+  memory.RememberParent(Item(1, 1), "/a", 7);
+  EXPECT_EQ(memory.Recall(Item(1, 1))->parent, 7U);
+  memory.Remember(Item(1, 1), "/a");
+  EXPECT_EQ(memory.Recall(Item(1, 1))->parent, 7U);
+  memory.Remember(Item(1, 1), "/b");
+  EXPECT_EQ(memory.Recall(Item(1, 1))->parent, 0U);
+  memory.RememberParent(Item(1, 2), "/c", 7);
+  EXPECT_EQ(memory.Recall(Item(1, 2)), nullptr);
+}
+
+TEST(PlaceMemory, KnowsThePlaceOfTheLastUse) {
+  PlaceMemory memory(kPlenty);
+  EXPECT_EQ(memory.Latest(), "");
+  memory.Remember(Item(1, 1), "/a");
+  memory.Remember(Item(1, 2), "/b");
+  EXPECT_EQ(memory.Latest(), "/b");
+  memory.Recall(Item(1, 1));
+  EXPECT_EQ(memory.Latest(), "/a");
+}
+
 // What it recalls is what it was last told, and its size is that of what it can recall.
 RC_GTEST_PROP(PlaceMemory, NeverRecallsAWrongPlace, ()) {
   PlaceMemory memory(10 * SizeOfOnePlace());
@@ -113,10 +136,10 @@ RC_GTEST_PROP(PlaceMemory, NeverRecallsAWrongPlace, ()) {
     RC_ASSERT(memory.Size() <= 10 * SizeOfOnePlace());
   }
   for (std::uint64_t inode = 0; inode < 20; ++inode) {
-    const std::string* const place = memory.Recall(Item(1, inode));
-    if (place != nullptr) RC_ASSERT(*place == told.at(inode));
+    const PlaceMemory::Place* const place = memory.Recall(Item(1, inode));
+    if (place != nullptr) RC_ASSERT(place->path == told.at(inode));
   }
 }
 
 }  // namespace
-}  // namespace tallowmere::files
+}  // namespace tallowmere::catalog

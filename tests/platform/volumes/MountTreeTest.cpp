@@ -1,14 +1,15 @@
+// Which mounts make a volume, and which are reachable.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sys/sysmacros.h>
 
-#include "files/MountInfo.h"
+#include <functional>
 
-namespace tallowmere::files {
+#include "volumes/MountTree.h"
+
+namespace tallowmere::volumes {
 namespace {
 
 using testing::ElementsAre;
-using testing::IsEmpty;
 using testing::SizeIs;
 
 // The lowest mount at "/".
@@ -17,6 +18,12 @@ int RootIDOf(const std::vector<Mount>& mounts) {
     if (mount.mountPoint == "/") return mount.id;
   }
   return 0;
+}
+
+std::vector<std::vector<std::size_t>> GroupIntoVolumes(
+    const std::vector<Mount>& mounts, int rootID,
+    const std::function<bool(const Mount&)>& isFolder) {
+  return MountTree(mounts, rootID).GroupIntoVolumes(isFolder);
 }
 
 // The mount points of the volumes' places. Every mount but a path that ends in "file" is a folder.
@@ -31,58 +38,7 @@ std::vector<std::string> PlacesIn(std::string_view table) {
   return places;
 }
 
-TEST(MountInfo, ALineHasItsFields) {
-  const auto mounts = ParseMountInfo(
-      "36 35 98:7 /sub /mnt rw,noatime shared:1 master:2 propagate_from:3 - ext3 /dev/x rw,a=b\n");
-  ASSERT_THAT(mounts, SizeIs(1));
-  EXPECT_EQ(mounts[0].id, 36);
-  EXPECT_EQ(mounts[0].parent, 35);
-  EXPECT_EQ(mounts[0].device, makedev(98, 7));
-  EXPECT_EQ(mounts[0].root, "/sub");
-  EXPECT_EQ(mounts[0].mountPoint, "/mnt");
-  EXPECT_EQ(mounts[0].type, "ext3");
-}
-
-TEST(MountInfo, OptionalFieldsMayBeMissing) {
-  EXPECT_EQ(ParseMountInfo("1 0 8:1 / / rw - xfs /dev/x rw").at(0).type, "xfs");
-}
-
-TEST(MountInfo, EscapesAreUndone) {
-  const auto mounts = ParseMountInfo(
-      "2 1 0:5 /a\\134b /My\\040Disk\\011x\\012y\\043z\\134040 rw - tmpfs none rw\n");
-  ASSERT_THAT(mounts, SizeIs(1));
-  EXPECT_EQ(mounts[0].root, "/a\\b");
-  EXPECT_EQ(mounts[0].mountPoint, "/My Disk\tx\ny#z\\040");
-}
-
-TEST(MountInfo, ABackslashThatBeginsNoEscapeStaysAsItIs) {
-  EXPECT_EQ(ParseMountInfo("2 1 0:5 / /a\\04 rw - tmpfs none rw\n").at(0).mountPoint, "/a\\04");
-  EXPECT_EQ(ParseMountInfo("2 1 0:5 / /a\\89z rw - tmpfs none rw\n").at(0).mountPoint, "/a\\89z");
-  for (const std::string place : {"/a\\/040", "/a\\0/40", "/a\\04/0", "/a\\080", "/a\\048"}) {
-    const auto mounts = ParseMountInfo("2 1 0:5 / " + place + " rw - tmpfs none rw\n");
-    EXPECT_EQ(mounts.at(0).mountPoint, place);
-  }
-}
-
-TEST(MountInfo, MalformedLinesArePassedOverAndTheRestIsKept) {
-  EXPECT_THAT(PlacesIn("1 0 8:1 / / rw - ext4 /dev/a rw\n"
-                       "\n"
-                       "x 1 8:2 / /no-id rw - ext4 /dev/b rw\n"
-                       "3 1 8 / /no-minor rw - ext4 /dev/b rw\n"
-                       "4 1 8:4 / relative rw - ext4 /dev/b rw\n"
-                       "5 1 8:5 / /no-type rw -\n"
-                       "6 1 8:6 / /no-separator rw shared:1 ext4\n"
-                       "7 1 8:7\n"
-                       "99999999999 1 8:8 / /overflow rw - ext4 /dev/b rw\n"
-                       "9 1 8:9 / /good rw - ext4 /dev/c rw\n"),
-              ElementsAre("/", "/good"));
-}
-
-TEST(MountInfo, NoTextHasNoMounts) {
-  EXPECT_THAT(ParseMountInfo(""), IsEmpty());
-}
-
-TEST(MountInfo, KernelInterfacesAreNoVolumes) {
+TEST(MountTree, KernelInterfacesAreNoVolumes) {
   EXPECT_THAT(PlacesIn("1 0 8:1 / / rw - ext4 /dev/a rw\n"
                        "2 1 0:2 / /proc rw - proc proc rw\n"
                        "3 1 0:3 / /sys rw - sysfs sysfs rw\n"
@@ -95,7 +51,7 @@ TEST(MountInfo, KernelInterfacesAreNoVolumes) {
               ElementsAre("/"));
 }
 
-TEST(MountInfo, NetworkOverlayMemoryAndFuseFileSystemsAreVolumes) {
+TEST(MountTree, NetworkOverlayMemoryAndFuseFileSystemsAreVolumes) {
   EXPECT_THAT(PlacesIn("1 0 0:30 / / rw - overlay overlay rw\n"
                        "2 1 0:31 / /net rw - nfs4 host:/x rw\n"
                        "3 1 0:32 / /smb rw - cifs //host/x rw\n"
@@ -105,7 +61,7 @@ TEST(MountInfo, NetworkOverlayMemoryAndFuseFileSystemsAreVolumes) {
               ElementsAre("/", "/net", "/smb", "/tmp", "/fuse", "/new"));
 }
 
-TEST(MountInfo, TheRootComesFirstThenTheKernelsOrder) {
+TEST(MountTree, TheRootComesFirstThenTheKernelsOrder) {
   EXPECT_THAT(PlacesIn("20 30 0:31 / /b rw - tmpfs none rw\n"
                        "21 30 0:32 / /a rw - tmpfs none rw\n"
                        "30 1 8:1 / / rw - ext4 /dev/a rw\n"
@@ -113,39 +69,39 @@ TEST(MountInfo, TheRootComesFirstThenTheKernelsOrder) {
               ElementsAre("/", "/b", "/a", "/c"));
 }
 
-TEST(MountInfo, TheRootIsAVolumeWhateverItsType) {
+TEST(MountTree, TheRootIsAVolumeWhateverItsType) {
   EXPECT_THAT(PlacesIn("1 1 0:2 / / rw - devtmpfs none rw\n"), ElementsAre("/"));
 }
 
-TEST(MountInfo, BtrfsSubvolumesOfOneFileSystemAreOneVolume) {
+TEST(MountTree, BtrfsSubvolumesOfOneFileSystemAreOneVolume) {
   EXPECT_THAT(PlacesIn("25 1 0:22 /@ / rw - btrfs /dev/sda2 rw,subvolid=256,subvol=/@\n"
                        "40 25 0:22 /@home /home rw - btrfs /dev/sda2 rw,subvolid=257\n"
                        "41 25 8:1 / /boot rw - ext4 /dev/sda1 rw\n"),
               ElementsAre("/", "/boot"));
 }
 
-TEST(MountInfo, TheFileSystemsRootFolderIsThePlaceBeforeAnEarlierMountOfAFolder) {
+TEST(MountTree, TheFileSystemsRootFolderIsThePlaceBeforeAnEarlierMountOfAFolder) {
   EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
                        "40 25 0:22 /@home /home rw - btrfs /dev/sda2 rw\n"
                        "41 25 0:22 / /mnt/all rw - btrfs /dev/sda2 rw\n"),
               ElementsAre("/", "/mnt/all"));
 }
 
-TEST(MountInfo, TheRootIsThePlaceOfItsVolumeBeforeTheFileSystemsRootFolder) {
+TEST(MountTree, TheRootIsThePlaceOfItsVolumeBeforeTheFileSystemsRootFolder) {
   EXPECT_THAT(PlacesIn("20 25 0:30 / /early rw - tmpfs none rw\n"
                        "25 1 8:1 /@ / rw - btrfs /dev/sda1 rw\n"
                        "41 25 8:1 / /mnt/toplevel rw - btrfs /dev/sda1 rw\n"),
               ElementsAre("/", "/early"));
 }
 
-TEST(MountInfo, BindMountsAddNoVolume) {
+TEST(MountTree, BindMountsAddNoVolume) {
   EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
                        "26 25 8:1 /srv/data /export rw - ext4 /dev/sda1 rw\n"
                        "27 25 8:1 / /again rw - ext4 /dev/sda1 rw\n"),
               ElementsAre("/"));
 }
 
-TEST(MountInfo, AFileMountedAloneIsNoVolumeAndTheNextFolderIsThePlace) {
+TEST(MountTree, AFileMountedAloneIsNoVolumeAndTheNextFolderIsThePlace) {
   EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
                        "26 25 8:2 /hosts /etc/file rw - ext4 /dev/sda2 rw\n"
                        "27 25 8:3 /resolv /run/file rw - ext4 /dev/sda3 rw\n"
@@ -153,7 +109,7 @@ TEST(MountInfo, AFileMountedAloneIsNoVolumeAndTheNextFolderIsThePlace) {
               ElementsAre("/", "/data"));
 }
 
-TEST(MountInfo, OnlyMountsOfInnerFoldersAreAskedWhetherTheyAreFolders) {
+TEST(MountTree, OnlyMountsOfInnerFoldersAreAskedWhetherTheyAreFolders) {
   std::vector<std::string> asked;
   GroupIntoVolumes(ParseMountInfo("25 1 8:1 /inner / rw - ext4 /dev/sda1 rw\n"
                                   "26 25 0:40 / /net rw - nfs host:/x rw\n"
@@ -166,7 +122,7 @@ TEST(MountInfo, OnlyMountsOfInnerFoldersAreAskedWhetherTheyAreFolders) {
   EXPECT_THAT(asked, ElementsAre("/bound"));
 }
 
-TEST(MountInfo, OfStackedMountsOnlyTheTopmostIsAVolume) {
+TEST(MountTree, OfStackedMountsOnlyTheTopmostIsAVolume) {
   const auto mounts = ParseMountInfo(
       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
       "26 25 0:40 / /mnt rw - tmpfs none rw\n"
@@ -176,7 +132,7 @@ TEST(MountInfo, OfStackedMountsOnlyTheTopmostIsAVolume) {
               ElementsAre(ElementsAre(0), ElementsAre(3)));
 }
 
-TEST(MountInfo, MountsUnderACoveredFolderAreHiddenWithIt) {
+TEST(MountTree, MountsUnderACoveredFolderAreHiddenWithIt) {
   EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
                        "26 25 0:40 / /mnt/a/deep rw - tmpfs none rw\n"
                        "27 26 0:41 / /mnt/a/deep/er rw - tmpfs none rw\n"
@@ -186,7 +142,7 @@ TEST(MountInfo, MountsUnderACoveredFolderAreHiddenWithIt) {
               ElementsAre("/", "/mnt/a", "/mnt/a/new", "/mnt/ab"));
 }
 
-TEST(MountInfo, MountsOnACoveredMountAreHidden) {
+TEST(MountTree, MountsOnACoveredMountAreHidden) {
   EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
                        "26 25 0:40 / /mnt rw - tmpfs none rw\n"
                        "27 26 0:41 / /mnt/inner rw - tmpfs none rw\n"
@@ -194,7 +150,7 @@ TEST(MountInfo, MountsOnACoveredMountAreHidden) {
               ElementsAre("/", "/mnt"));
 }
 
-TEST(MountInfo, WhatIsMountedOverTheRootIsComeUponByNobody) {
+TEST(MountTree, WhatIsMountedOverTheRootIsComeUponByNobody) {
   EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
                        "26 25 0:40 / /mnt rw - tmpfs none rw\n"
                        "27 25 0:41 / / rw - tmpfs none rw\n"
@@ -203,7 +159,7 @@ TEST(MountInfo, WhatIsMountedOverTheRootIsComeUponByNobody) {
               ElementsAre("/", "/mnt", "/under"));
 }
 
-TEST(MountInfo, OfTwoMountsOnOnePlaceOfOneParentTheLaterIsComeUpon) {
+TEST(MountTree, OfTwoMountsOnOnePlaceOfOneParentTheLaterIsComeUpon) {
   const auto mounts = ParseMountInfo(
       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
       "26 25 0:40 / /mnt rw - tmpfs none rw\n"
@@ -212,7 +168,7 @@ TEST(MountInfo, OfTwoMountsOnOnePlaceOfOneParentTheLaterIsComeUpon) {
               ElementsAre(ElementsAre(0), ElementsAre(2)));
 }
 
-TEST(MountInfo, NobodyIsAskedForAFolderWhereAServerIsOnTheWay) {
+TEST(MountTree, NobodyIsAskedForAFolderWhereAServerIsOnTheWay) {
   std::vector<std::string> asked;
   const auto mounts = ParseMountInfo(
       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
@@ -228,7 +184,7 @@ TEST(MountInfo, NobodyIsAskedForAFolderWhereAServerIsOnTheWay) {
   EXPECT_THAT(asked, ElementsAre("/near"));
 }
 
-TEST(MountInfo, AThousandEntriesKeepTheirOrder) {
+TEST(MountTree, AThousandEntriesKeepTheirOrder) {
   std::string table = "1 0 8:1 / / rw - ext4 /dev/a rw\n";
   std::vector<std::string> expected = {"/"};
   for (int i = 0; i < 1000; ++i) {
@@ -240,7 +196,7 @@ TEST(MountInfo, AThousandEntriesKeepTheirOrder) {
   EXPECT_EQ(PlacesIn(table), expected);
 }
 
-TEST(MountInfo, AChainOfAThousandMountsHasAnEnd) {
+TEST(MountTree, AChainOfAThousandMountsHasAnEnd) {
   std::string table = "1 1 8:1 / / rw - ext4 /dev/a rw\n";
   std::string place;
   for (int i = 2; i < 1002; ++i) {
@@ -251,11 +207,11 @@ TEST(MountInfo, AChainOfAThousandMountsHasAnEnd) {
   EXPECT_THAT(PlacesIn(table), SizeIs(1001));
 }
 
-TEST(MountInfo, MountsThatAreEachOthersParentsHaveAnEnd) {
+TEST(MountTree, MountsThatAreEachOthersParentsHaveAnEnd) {
   EXPECT_THAT(PlacesIn("5 6 8:1 / / rw - ext4 /dev/a rw\n"
                        "6 5 8:2 / /mnt rw - ext4 /dev/b rw\n"),
               SizeIs(2));
 }
 
 }  // namespace
-}  // namespace tallowmere::files
+}  // namespace tallowmere::volumes

@@ -1,16 +1,21 @@
 // FSGetCatalogInfo, FSResolveNodeID, FSMakeFSRefUnicode, FSpMakeFSRef and PBGetCatInfoSync.
+#include <gmock/gmock.h>
 #include <sys/mount.h>
+#include <sys/syscall.h>
 
+#include <algorithm>
+#include <cstring>
+#include <optional>
 #include <vector>
 
-#include "CatalogFixture.h"
+#include "platform/HostCalls.h"
+#include "support/CountedCalls.h"
+#include "support/OwnMountNamespace.h"
+#include "support/Privileges.h"
+#include "support/TemporaryFolder.h"
 
-namespace tallowmere::files {
+namespace tallowmere::test {
 namespace {
-
-using test::EnterOwnMountNamespace;
-using test::ScopedMount;
-using test::TemporaryFolder;
 
 constexpr SInt16 kNoVolume = 32767;
 
@@ -150,7 +155,7 @@ TEST_F(ItemCalls, ANodeIDFindsFilesFoldersAndTheRoot) {
 }
 
 TEST_F(ItemCalls, IDsThatNoItemHasAreNotFound) {
-  for (const std::uint32_t id : {0u, 1u, 3u, 15u, 0x7FFFFF00u, 0xFFFFFFF0u, 0xFFFFFFFFu}) {
+  for (const std::uint32_t id : {0u, 1u, 3u, 15u, 0xFFFFFFFFu}) {
     FSRef reference;
     Fill(reference);
     EXPECT_EQ(FSResolveNodeID(mInfo.volume, id, &reference), fnfErr) << id;
@@ -243,7 +248,7 @@ TEST_F(ItemCalls, AFoldersNameAndParentAreThoseOfTheCatalog) {
   Str255 name;
   auto block = Block(mInfo.nodeID, name);
   ASSERT_EQ(CatalogInfo(block), noErr);
-  EXPECT_EQ(TextOfPascal(name), "folder");
+  EXPECT_EQ(names::TextOfPascal(name), "folder");
   EXPECT_EQ(static_cast<std::uint32_t>(block.dirInfo.ioDrParID), IDOf(mFolder.Path()));
 }
 
@@ -258,7 +263,7 @@ TEST_F(ItemCalls, AFoldersNameCanHave255Bytes) {
   Str255 name;
   auto block = Block(IDOf(path), name);
   ASSERT_EQ(CatalogInfo(block), noErr);
-  EXPECT_EQ(TextOfPascal(name), longName);
+  EXPECT_EQ(names::TextOfPascal(name), longName);
 }
 
 TEST_F(ItemCalls, ClimbingEndsAtTheRootWithParent1) {
@@ -268,7 +273,7 @@ TEST_F(ItemCalls, ClimbingEndsAtTheRootWithParent1) {
     Str255 name;
     auto block = Block(id, name);
     ASSERT_EQ(CatalogInfo(block), noErr);
-    path = "/" + std::string(TextOfPascal(name)) + path;
+    path = "/" + std::string(names::TextOfPascal(name)) + path;
     id = static_cast<std::uint32_t>(block.dirInfo.ioDrParID);
   }
   FSRef root{};
@@ -292,7 +297,16 @@ TEST_F(ItemCalls, OnlyIndexMinus1IsTaken) {
   }
 }
 
-TEST_F(ItemCalls, WhatIsGoneHasNoFolderInfoNorItems) {
+// Elsewhere a neighbour can take the number of what is gone.
+class ItemCallsOnAVolumeOfTheirOwn : public ItemCalls {
+ protected:
+  void SetUp() override {
+    ItemCalls::SetUp();
+    if (!mVolume || !mVolume->IsMounted()) GTEST_SKIP() << "mounting is not permitted here";
+  }
+};
+
+TEST_F(ItemCallsOnAVolumeOfTheirOwn, WhatIsGoneHasNoFolderInfoNorItems) {
   const std::string path = mFolder.MakeFolder("x");
   const FSCatalogInfo info = InfoOf(path);
   std::filesystem::remove(path);
@@ -313,6 +327,37 @@ TEST_F(ItemCalls, TheRootOfAnotherVolumeHasParent1AndItsOwnName) {
   EXPECT_EQ(NameOf(spec), "My Disk");
   EXPECT_EQ(ItemOf(spec), path);
   EXPECT_EQ(IDOf(path), 2u);
+}
+
+// --- What is on no volume -----------------------------------------------------------------------
+
+TEST_F(ItemCalls, TheFolderOfAKernelInterfaceHasAnIDThatLeadsNowhere) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const ScopedMount interface("none", mFolder.MakeFolder("interface"), "proc");
+  if (!interface.IsMounted()) GTEST_SKIP() << "proc cannot be mounted here";
+  const FSCatalogInfo info = InfoOf(mFolder.Path() / "interface");
+  EXPECT_EQ(info.volume, mInfo.volume);
+  EXPECT_EQ(info.nodeID, 3u);
+  EXPECT_EQ(ItemOf(MakeRecord(info.volume, info.nodeID, "version")), "(-120)");
+  EXPECT_EQ(ItemWithID(info.volume, info.nodeID), "(-43)");
+}
+
+TEST_F(ItemCalls, ItemsOfAKernelInterfaceAreOnNoVolume) {
+  const FSRef reference = ReferenceTo("/proc/version");
+  FSCatalogInfo info{};
+  EXPECT_EQ(FSGetCatalogInfo(&reference, kFSCatInfoVolume, &info, nullptr, nullptr, nullptr),
+            nsvErr);
+  EXPECT_EQ(PathOf(reference), "/proc/version");
+}
+
+TEST_F(ItemCalls, TheIDOfWhatIsOnNoVolumeIsNotSearchedFor) {
+  const auto calls = CallsOf([] {},
+                             [&] {
+                               ItemOf(MakeRecord(mInfo.volume, 3, "x"));
+                               ItemWithID(mInfo.volume, 3);
+                             });
+  if (!calls) GTEST_SKIP() << "nothing can be traced here";
+  EXPECT_THAT(*calls, testing::Not(testing::Contains(SYS_getdents64)));
 }
 
 TEST_F(ItemCalls, AFileThatIsMountedAloneComesBack) {
@@ -340,4 +385,4 @@ TEST_F(ItemCalls, PermissionRefusedIsSaid) {
 }
 
 }  // namespace
-}  // namespace tallowmere::files
+}  // namespace tallowmere::test

@@ -1,14 +1,17 @@
 // FSMakeFSSpec: records by HFS paths.
+#include <sys/mount.h>
+
+#include <algorithm>
+#include <cstring>
 #include <vector>
 
-#include "CatalogFixture.h"
+#include "platform/HostCalls.h"
+#include "support/OwnMountNamespace.h"
+#include "support/Privileges.h"
+#include "support/TemporaryFolder.h"
 
-namespace tallowmere::files {
+namespace tallowmere::test {
 namespace {
-
-using test::EnterOwnMountNamespace;
-using test::ScopedMount;
-using test::TemporaryFolder;
 
 class HFSPathsToRecords : public testing::Test {
  protected:
@@ -262,4 +265,4 @@ TEST_F(HFSPathsToRecords, APathIntoAnotherVolumeGivesItsNumber) {
 }
 
 }  // namespace
-}  // namespace tallowmere::files
+}  // namespace tallowmere::test

@@ -4,17 +4,11 @@
 
 #include <cstring>
 
-#include "platform/foundation/TestStrings.h"
+#include "platform/HostCalls.h"
 #include "support/TemporaryFolder.h"
 
 namespace tallowmere::test {
 namespace {
-
-FSRef ReferenceTo(const std::string& path) {
-  FSRef item = {};
-  EXPECT_TRUE(CFURLGetFSRef(foundation::test::MakeUrl(path, false).Get(), &item)) << path;
-  return item;
-}
 
 // Expects that `path` is no alias, by both calls, and that it is a folder or not.
 void ExpectNoAlias(const std::string& path, bool isFolder) {

@@ -1,42 +1,52 @@
 // From id to place: what was remembered is verified, and nothing but the item itself is an answer.
+#include <fcntl.h>
 #include <sys/mount.h>
+#include <sys/stat.h>
 
-#include "CatalogFixture.h"
+#include <filesystem>
+#include <fstream>
+#include <optional>
+
+#include "platform/HostCalls.h"
 #include "support/FileSystemImage.h"
+#include "support/OwnMountNamespace.h"
+#include "support/Privileges.h"
+#include "support/TemporaryFolder.h"
 
-namespace tallowmere::files {
+namespace tallowmere::test {
 namespace {
-
-using test::EnterOwnMountNamespace;
-using test::FileSystemImage;
-using test::ScopedMount;
-using test::TemporaryFolder;
 
 class TheCatalog : public testing::Test {
  protected:
   void SetUp() override {
     if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    std::filesystem::permissions(mFolder.Path(), std::filesystem::perms(0755));
     mMount.emplace("tmpfs", mFolder.MakeFolder("volume"), "tmpfs");
     ASSERT_TRUE(mMount->IsMounted());
   }
   std::string Make(const std::string& name) const { return mFolder.MakeFolder("volume/" + name); }
-  VolumePointer Volume() const {
-    const std::string path = mFolder.Path() / "volume";
-    return MountTable::OfThisProcess().OfItem(*ReadItem(AT_FDCWD, path.c_str()), path);
+  std::string Top() const { return mFolder.Path() / "volume"; }
+  // The mount's id, by statx(2) itself.
+  std::uint64_t MountID() const {
+    struct statx about {};
+    EXPECT_EQ(statx(AT_FDCWD, Top().c_str(), 0, STATX_MNT_ID, &about), 0);
+    return about.stx_mnt_id;
   }
-  std::string Find(std::uint32_t id, bool folder = true) const {
-    const auto place = FindItem(Volume(), id, folder);
-    return place ? place->path : "(none)";
-  }
+  SInt16 Number() const { return InfoOf(Top()).volume; }
+  // What has the id on the volume: a path, or the result code in brackets.
+  std::string FindFolder(std::uint32_t id) const { return FolderWithID(Number(), id); }
+  std::string FindItem(std::uint32_t id) const { return ItemWithID(Number(), id); }
 
   TemporaryFolder mFolder;
   std::optional<ScopedMount> mMount;
 };
 
-TEST_F(TheCatalog, FindsFoldersWithNumbersBelow16ByTheirMixedIDs) {
+TEST_F(TheCatalog, FindsFoldersWithNumbersBelow16) {
   for (int i = 0; i < 10; ++i) {
     const std::string path = Make("first/" + std::to_string(i));
-    EXPECT_EQ(Find(IDOf(path)), path);
+    EXPECT_EQ(IDOf(path), 0xFFFFFFEF + InodeOf(path));
+    EXPECT_EQ(FindFolder(IDOf(path)), path);
+    EXPECT_TRUE(HoldsForNobody([&] { return FindFolder(IDOf(path)) == path; }));
   }
 }
 
@@ -44,9 +54,9 @@ TEST_F(TheCatalog, FindsARememberedItemWhereItIsNow) {
   for (int i = 0; i < 20; ++i) Make("filler/" + std::to_string(i));
   const std::string path = Make("a/b/c");
   const std::uint32_t id = IDOf(path);
-  EXPECT_EQ(Find(id), path);
+  EXPECT_EQ(FindFolder(id), path);
   std::filesystem::rename(mFolder.Path() / "volume/a/b", mFolder.Path() / "volume/d");
-  EXPECT_EQ(Find(id), mFolder.Path() / "volume/d/c");
+  EXPECT_EQ(FindFolder(id), mFolder.Path() / "volume/d/c");
 }
 
 TEST_F(TheCatalog, FindsWhatMovesInAFolderWhoseNameIsTheFolderAboveInAUrl) {
@@ -54,16 +64,16 @@ TEST_F(TheCatalog, FindsWhatMovesInAFolderWhoseNameIsTheFolderAboveInAUrl) {
   const std::uint32_t id = IDOf(Make("a/%2E%2E/b"));
   const std::filesystem::path volume = mFolder.Path() / "volume";
   std::filesystem::rename(volume / "a/%2E%2E/b", volume / "a/%2E%2E/c");
-  EXPECT_EQ(Find(id), volume / "a/%2E%2E/c");
+  EXPECT_EQ(FindFolder(id), volume / "a/%2E%2E/c");
   std::filesystem::rename(volume / "a/%2E%2E", volume / "a/%2e");
-  EXPECT_EQ(Find(id), volume / "a/%2e/c");
+  EXPECT_EQ(FindFolder(id), volume / "a/%2e/c");
 }
 
 TEST_F(TheCatalog, DoesNotTakeAFileForAFolder) {
   for (int i = 0; i < 20; ++i) Make("filler/" + std::to_string(i));
   const std::string file = mFolder.MakeFile("volume/file");
-  EXPECT_EQ(Find(IDOf(file), true), "(none)");
-  EXPECT_EQ(Find(IDOf(file), false), file);
+  EXPECT_EQ(FindFolder(IDOf(file)), "(-120)");
+  EXPECT_EQ(FindItem(IDOf(file)), file);
 }
 
 TEST_F(TheCatalog, KnowsTheVolumeWhereItIsMountedNow) {
@@ -71,14 +81,11 @@ TEST_F(TheCatalog, KnowsTheVolumeWhereItIsMountedNow) {
   const std::uint32_t id = IDOf(Make("a/b/c"));
   const std::string elsewhere = mFolder.MakeFolder("elsewhere");
   const std::string here = mFolder.Path() / "volume";
-  EXPECT_EQ(Find(id), here + "/a/b/c");
+  EXPECT_EQ(FindFolder(id), here + "/a/b/c");
   ASSERT_EQ(mount(here.c_str(), elsewhere.c_str(), nullptr, MS_MOVE, nullptr), 0);
-  const VolumePointer volume =
-      MountTable::OfThisProcess().OfItem(*ReadItem(AT_FDCWD, elsewhere.c_str()), elsewhere);
-  const auto place = FindItem(volume, id, true);
+  const std::string found = FolderWithID(InfoOf(elsewhere).volume, id);
   umount2(elsewhere.c_str(), MNT_DETACH);
-  ASSERT_TRUE(place);
-  EXPECT_EQ(place->path, elsewhere + "/a/b/c");
+  EXPECT_EQ(found, elsewhere + "/a/b/c");
 }
 
 TEST_F(TheCatalog, SearchesANewVolumeThatHasTheNumberOfAFormerOne) {
@@ -88,25 +95,20 @@ TEST_F(TheCatalog, SearchesANewVolumeThatHasTheNumberOfAFormerOne) {
     return mFolder.MakeFolder(folder + "/a/b");
   };
   const auto searchFor = [&](const std::string& path) {
-    return Find(static_cast<std::uint32_t>(ReadItem(AT_FDCWD, path.c_str())->inode));
+    return FindFolder(static_cast<std::uint32_t>(InodeOf(path)));
   };
   const std::string path = fill("volume");
   EXPECT_EQ(searchFor(path), path);
-  const VolumeNumber number = Volume()->Number();
-  const auto mountID = [&] {
-    return ReadItem(AT_FDCWD, (mFolder.Path() / "volume").c_str())->mount;
-  };
-  const std::int32_t former = mountID();
-
+  const std::uint64_t former = MountID();
   ScopedMount other("tmpfs", mFolder.MakeFolder("other"), "tmpfs");
   fill("other");
   // The kernel gives the lowest free number, which another process can have taken for a while.
-  for (int attempt = 0; attempt == 0 || (attempt < 1000 && mountID() != former); ++attempt) {
+  for (int attempt = 0; attempt == 0 || (attempt < 1000 && MountID() != former); ++attempt) {
     mMount->Unmount();
-    mMount.emplace(mFolder.Path() / "other", mFolder.Path() / "volume", "", MS_BIND);
+    mMount.emplace(mFolder.Path() / "other", Top(), "", MS_BIND);
   }
   other.Unmount();
-  if (Volume()->Number() != number) GTEST_SKIP() << "another mount has the number";
+  if (MountID() != former) GTEST_SKIP() << "another mount has the number";
   EXPECT_EQ(searchFor(path), path);
 }
 
@@ -148,4 +150,4 @@ TEST_F(NumbersThatAreTakenAgain, DoNotMakeAReferenceOneToTheNewItem) {
 }
 
 }  // namespace
-}  // namespace tallowmere::files
+}  // namespace tallowmere::test

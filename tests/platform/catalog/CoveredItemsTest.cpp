@@ -1,24 +1,24 @@
 // Mounts over parts of a volume, and mount points that move: what is seen at one place of a volume
 // is hidden at another.
-#include <linux/filter.h>
-#include <linux/seccomp.h>
-#include <sys/prctl.h>
+#include <sys/mount.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
 
 #include <cerrno>
-#include <cstddef>
-#include <fstream>
-#include <iterator>
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <vector>
 
-#include "CatalogFixture.h"
-#include "files/HFSNames.h"
+#include "names/HFSNames.h"
+#include "platform/HostCalls.h"
+#include "support/OwnMountNamespace.h"
+#include "support/Privileges.h"
+#include "support/RefusedCalls.h"
+#include "support/TemporaryFolder.h"
 
-namespace tallowmere::files {
+namespace tallowmere::test {
 namespace {
-
-using test::EnterOwnMountNamespace;
-using test::ScopedMount;
-using test::TemporaryFolder;
 
 // Nobody in particular: what the kernel may only show to the superuser is not used.
 void ExpectRoundTrip(const std::string& path) {
@@ -26,8 +26,7 @@ void ExpectRoundTrip(const std::string& path) {
   const auto comesBack = [&] {
     std::error_code error;
     const std::string found = ItemOf(spec);
-    return found == path ||
-           AreEqual(*ReadItem(AT_FDCWD, found.c_str()), *ReadItem(AT_FDCWD, path.c_str()));
+    return found == path || std::filesystem::equivalent(found, path, error);
   };
   EXPECT_EQ(ItemOf(spec).front(), '/')
       << path << " is (" << spec.vRefNum << ", " << ParentOf(spec) << ", " << NameOf(spec) << ")";
@@ -102,7 +101,6 @@ TEST_F(CoveredItems, HaveARecordOfTheirOwn) {
 
 TEST_F(CoveredItems, AreFoundAgainWhenTheCoverIsGone) {
   const FSSpec spec = SpecOf(PathTo("volume/folder/below/x"));
-  const VolumePointer volume = MountTable::OfThisProcess().WithNumber(spec.vRefNum);
   Cover("volume/folder");
   EXPECT_EQ(ItemOf(spec), "(-120)");
   mMounts.clear();
@@ -123,6 +121,16 @@ TEST_F(CoveredItems, AreNotWhatAFullPathLeadsToWhereverTheyWereSeen) {
   EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
 }
 
+// The volume still shows each of its folders at one place.
+TEST_F(CoveredItems, AreNoneWhereAFileOfTheVolumeIsMountedElsewhere) {
+  mFolder.MakeFile("elsewhere");
+  Cover("elsewhere", PathTo("volume/file"));
+  const FSSpec spec = SpecOf(PathTo("volume/file"));
+  EXPECT_EQ(NameOf(spec), "file");
+  EXPECT_EQ(ItemOf(spec), PathTo("volume/file"));
+  ExpectRoundTrip(PathTo("elsewhere"));
+}
+
 // At the place where its mount hangs another volume's folder may have the same name.
 TEST_F(CoveredItems, OfAPartThatIsMountedByItselfTheVolumesOwnFolderIsTold) {
   // The first inodes are too low for ids that are remembered.
@@ -136,7 +144,7 @@ TEST_F(CoveredItems, OfAPartThatIsMountedByItselfTheVolumesOwnFolderIsTold) {
   CInfoPBRec block{};
   block.dirInfo = {name, inside.vRefNum, -1, inside.parID, 0};
   ASSERT_EQ(PBGetCatInfoSync(&block), noErr);
-  EXPECT_EQ(TextOfPascal(name), "inner");
+  EXPECT_EQ(names::TextOfPascal(name), "inner");
   EXPECT_EQ(static_cast<std::uint32_t>(block.dirInfo.ioDrParID), 2U);
 }
 
@@ -149,8 +157,7 @@ TEST_F(CoveredItems, APartThatNothingElseShowsIsTheTopOfWhatCanBeClimbed) {
   CInfoPBRec block{};
   block.dirInfo = {name, inside.vRefNum, -1, inside.parID, 0};
   ASSERT_EQ(PBGetCatInfoSync(&block), noErr);
-  EXPECT_EQ(static_cast<std::uint32_t>(block.dirInfo.ioDrParID),
-            inside.parID == 2 ? 1U : kParentOfRootID);
+  EXPECT_EQ(static_cast<std::uint32_t>(block.dirInfo.ioDrParID), 1U);
 }
 
 // A process that was in a folder before it was covered still shows it.
@@ -264,27 +271,13 @@ TEST_F(CoveredItemsOnAWayThatIsALinkNow, LeaveTheirShortFormToWhatCoversThem) {
 
 TEST_F(CoveredItemsOnAWayThatIsALinkNow, ComeBackWhereAnotherMountShowsThem) {
   ShowAt("again");
-  const auto covered = ReadItem(AT_FDCWD, PathTo("volume/moved/folder/x").c_str());
+  const auto id = static_cast<std::uint32_t>(InodeOf(PathTo("volume/moved/folder/x")));
   Cover("volume/moved/folder/x", PathTo("other"));
-  const auto id = static_cast<std::uint32_t>(covered->inode);
-  const FSSpec spec = MakeRecord(mSpec.vRefNum, ParentOf(mSpec), ShortHFSName("x", id));
+  const FSSpec spec = MakeRecord(mSpec.vRefNum, ParentOf(mSpec), names::ShortHFSName("x", id));
   EXPECT_EQ(ItemOf(spec), PathTo("again/moved/folder/x"));
 }
 
 // --- Kernels that answer otherwise --------------------------------------------------------------
-
-// Lets a system call fail so for the rest of the process.
-bool LetFail(std::uint32_t call, std::uint32_t error) {
-  sock_filter steps[] = {
-      BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
-      BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, call, 0, 1),
-      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | error),
-      BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
-  };
-  const sock_fprog filter{static_cast<unsigned short>(std::size(steps)), steps};
-  return prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0 &&
-         prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &filter) == 0;
-}
 
 class ItemsInAClosedFolder : public CoveredItems {};
 
@@ -295,15 +288,14 @@ TEST_F(ItemsInAClosedFolder, AreFoundNearTheLastOneWithoutOpenat2) {
   mFolder.MakeFile("volume/closed/open/x");
   mFolder.MakeFile("volume/closed/open/y");
   chmod(PathTo("volume/closed").c_str(), 0711);
-  const auto wanted = ReadItem(AT_FDCWD, PathTo("volume/closed/open/y").c_str());
-  EXPECT_TRUE(HoldsForNobody([&] {
-    if (!LetFail(SYS_openat2, ENOSYS)) return false;
-    const FSSpec last = SpecOf(PathTo("volume/closed/open/x"));
-    FSRef found{};
-    const auto id = static_cast<std::uint32_t>(wanted->inode);
-    return FSResolveNodeID(last.vRefNum, id, &found) == noErr &&
-           PathOf(found) == PathTo("volume/closed/open/y");
-  }));
+  const auto id = static_cast<std::uint32_t>(InodeOf(PathTo("volume/closed/open/y")));
+  for (const int error : {ENOSYS, EPERM}) {
+    EXPECT_TRUE(HoldsForNobody([&] {
+      if (!RefuseCall(SYS_openat2, error)) return false;
+      const FSSpec last = SpecOf(PathTo("volume/closed/open/x"));
+      return ItemWithID(last.vRefNum, id) == PathTo("volume/closed/open/y");
+    })) << error;
+  }
 }
 
 // Who has the right to open by handle in a user namespace alone is told that what is not below the
@@ -313,10 +305,9 @@ class ItemsOnTwoMounts : public CoveredItems {};
 TEST_F(ItemsOnTwoMounts, AreSearchedThoughOneMountSaysThatTheyAreGone) {
   ShowAt("again");
   const FSRef reference = ReferenceTo(PathTo("again/folder/below/x"));
-  ASSERT_TRUE(HasHandle(*Unpack(&reference)));
   std::filesystem::rename(PathTo("volume/folder/below/x"), PathTo("volume/folder/moved"));
   EXPECT_TRUE(HoldsForNobody([&] {
-    return LetFail(SYS_open_by_handle_at, ESTALE) &&
+    return RefuseCall(SYS_open_by_handle_at, ESTALE) &&
            PathOf(reference) == PathTo("volume/folder/moved");
   }));
 }
@@ -333,7 +324,7 @@ class AVolumeThatMoves : public testing::Test {
     for (int i = 0; i < 20; ++i) mFolder.MakeFile("a/volume/" + std::to_string(i));
     mFolder.MakeFolder("a/volume/folder/below");
     mFolder.MakeFile("a/volume/folder/below/x");
-    MountTable::OfThisProcess().AtIndex(0);
+    VolumeNamed("volume");
   }
   void TearDown() override {
     if (mIsMoved) std::filesystem::rename(PathTo("b"), PathTo("a"));
@@ -351,7 +342,7 @@ class AVolumeThatMoves : public testing::Test {
 };
 
 TEST_F(AVolumeThatMoves, GivesTheIdsThatItGaveBefore) {
-  const std::uint64_t inode = ReadItem(AT_FDCWD, PathTo("a/volume/folder/below").c_str())->inode;
+  const std::uint64_t inode = InodeOf(PathTo("a/volume/folder/below"));
   Move();
   const FSSpec spec = SpecOf(PathTo("b/volume/folder/below/x"));
   EXPECT_EQ(ParentOf(spec), inode);
@@ -359,7 +350,7 @@ TEST_F(AVolumeThatMoves, GivesTheIdsThatItGaveBefore) {
 }
 
 TEST_F(AVolumeThatMoves, IsNotTakenForWhatIsWhereItWas) {
-  const std::uint64_t inode = ReadItem(AT_FDCWD, PathTo("a/volume/folder/below").c_str())->inode;
+  const std::uint64_t inode = InodeOf(PathTo("a/volume/folder/below"));
   Move();
   mFolder.MakeFolder("a/volume/folder/below");
   const FSSpec spec = SpecOf(PathTo("b/volume/folder/below/x"));
@@ -378,22 +369,18 @@ TEST_F(AVolumeThatMoves, IsSearchedWhereItIsNow) {
 }
 
 TEST_F(AVolumeThatMoves, IsFoundByItsNumberWhenNobodyHasLookedAtItBefore) {
-  MountTable& table = MountTable::OfThisProcess();
-  VolumeNumber number = 0;
-  for (std::size_t i = 0; const VolumePointer volume = table.AtIndex(i); ++i) {
-    if (volume->MountPoint() == PathTo("a/volume")) number = volume->Number();
-  }
+  const SInt16 number = VolumeNamed("volume");
   ASSERT_NE(number, 0);
-  const std::uint64_t inode = ReadItem(AT_FDCWD, PathTo("a/volume/folder").c_str())->inode;
+  const std::uint64_t inode = InodeOf(PathTo("a/volume/folder"));
   Move();
   FSSpec missing{};
-  EXPECT_EQ(FSMakeFSSpec(number, kRootFolderID, Str255Of("missing").bytes, &missing), fnfErr);
-  EXPECT_EQ(ParentOf(missing), kRootFolderID);
+  EXPECT_EQ(FSMakeFSSpec(number, 2, Str255Of("missing").bytes, &missing), fnfErr);
+  EXPECT_EQ(ParentOf(missing), 2);
   FSSpec below{};
-  EXPECT_EQ(FSMakeFSSpec(number, kRootFolderID, Str255Of(":folder:below").bytes, &below), noErr);
+  EXPECT_EQ(FSMakeFSSpec(number, 2, Str255Of(":folder:below").bytes, &below), noErr);
   EXPECT_EQ(ParentOf(below), inode);
   EXPECT_EQ(ItemOf(below), PathTo("b/volume/folder/below"));
 }
 
 }  // namespace
-}  // namespace tallowmere::files
+}  // namespace tallowmere::test

@@ -1,8 +1,8 @@
 #include <gtest/gtest.h>
 
-#include "files/HFSNames.h"
+#include "names/HFSNames.h"
 
-namespace tallowmere::files {
+namespace tallowmere::names {
 namespace {
 
 TEST(HFSNames, ColonAndSlashAreExchanged) {
@@ -74,4 +74,4 @@ TEST(HFSNames, AnExtensionOfAccentedLettersCountsItsCharacters) {
 }
 
 }  // namespace
-}  // namespace tallowmere::files
+}  // namespace tallowmere::names

@@ -1,0 +1,336 @@
+// Moments as a process opens them: what was looked at once serves until the end.
+#include <Tallowmere/Process.h>
+#include <fcntl.h>
+#include <gmock/gmock.h>
+#include <sys/mount.h>
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <filesystem>
+#include <optional>
+#include <stdexcept>
+#include <thread>
+
+#include "kernel/Descriptor.h"
+#include "platform/HostCalls.h"
+#include "support/CountedCalls.h"
+#include "support/OwnMountNamespace.h"
+#include "support/Privileges.h"
+#include "support/TemporaryFolder.h"
+
+namespace tallowmere::test {
+namespace {
+
+using process::Moment;
+using testing::IsEmpty;
+using testing::Not;
+
+// On volumes of its own: "first" and "second", each with the same items.
+class AMoment : public testing::Test {
+ protected:
+  void SetUp() override {
+    if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    for (auto [mount, name] : {std::pair(&mFirst, "first"), std::pair(&mSecond, "second")}) {
+      mount->emplace("none", mFolder.MakeFolder(name), "tmpfs");
+      ASSERT_TRUE((*mount)->IsMounted());
+      // The first numbers are not their ids.
+      for (int i = 0; i < 20; ++i) mFolder.MakeFile(std::string(name) + "/" + std::to_string(i));
+      mFolder.MakeFolder(std::string(name) + "/a/b");
+      mFolder.MakeFile(std::string(name) + "/a/b/x");
+    }
+    // Child processes share the kernel's signal that the mounts have changed: it is for this one.
+    VolumeAt(1);
+  }
+  std::string PathTo(const std::string& name) const { return mFolder.Path() / name; }
+  void Rename(const std::string& from, const std::string& to) const {
+    std::filesystem::rename(PathTo(from), PathTo(to));
+  }
+  bool CanUnmount(const std::string& name) const { return umount2(PathTo(name).c_str(), 0) == 0; }
+
+  // The name that the item of a reference has.
+  static std::string NameOfItem(const FSRef& item) {
+    FSSpec spec{};
+    const OSErr error = FSGetCatalogInfo(&item, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr);
+    return error == noErr ? NameOf(spec) : "(" + std::to_string(error) + ")";
+  }
+  // What asking about an item once more costs, after a first time.
+  std::optional<std::vector<long>> CallsOfTheSecondQuestion(bool inMoment) const {
+    std::optional<Moment> moment;
+    FSRef item{};
+    const auto ask = [&] {
+      FSSpec spec{};
+      FSGetCatalogInfo(&item, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr);
+    };
+    const auto prepare = [&] {
+      if (inMoment) moment.emplace();
+      item = ReferenceTo(PathTo("first/a/b/x"));
+      ask();
+    };
+    return CallsOf(prepare, ask);
+  }
+
+  TemporaryFolder mFolder;
+  std::optional<ScopedMount> mFirst;
+  std::optional<ScopedMount> mSecond;
+};
+
+// --- What serves --------------------------------------------------------------------------------
+
+TEST_F(AMoment, LooksAtAnItemOnce) {
+  const auto within = CallsOfTheSecondQuestion(true);
+  const auto without = CallsOfTheSecondQuestion(false);
+  if (!within || !without) GTEST_SKIP() << "nothing can be traced here";
+  EXPECT_THAT(*within, IsEmpty());
+  EXPECT_THAT(*without, Not(IsEmpty()));
+}
+
+TEST_F(AMoment, HoldsAFolderOnceForAllItsItems) {
+  mFolder.MakeFile("first/a/b/y");
+  const auto callsFor = [&](const std::string& before) {
+    std::optional<Moment> moment;
+    const auto prepare = [&] {
+      moment.emplace();
+      SpecOf(PathTo(before));
+    };
+    return CallsOf(prepare, [&] { SpecOf(PathTo("first/a/b/y")); });
+  };
+  const auto known = callsFor("first/a/b/x");
+  const auto unknown = callsFor("second/a/b/x");
+  if (!known || !unknown) GTEST_SKIP() << "nothing can be traced here";
+  EXPECT_LT(known->size(), unknown->size());
+}
+
+TEST_F(AMoment, AnswersAsOutside) {
+  const FSSpec outside = SpecOf(PathTo("first/a/b/x"));
+  const Moment moment;
+  const FSSpec spec = SpecOf(PathTo("first/a/b/x"));
+  EXPECT_EQ(spec.vRefNum, outside.vRefNum);
+  EXPECT_EQ(ParentOf(spec), ParentOf(outside));
+  EXPECT_EQ(NameOf(spec), NameOf(outside));
+  EXPECT_EQ(ItemOf(spec), PathTo("first/a/b/x"));
+}
+
+TEST_F(AMoment, ClimbsFromAFolderToTheRoot) {
+  const Moment moment;
+  const FSSpec spec = SpecOf(PathTo("first/a/b/x"));
+  std::string names;
+  std::uint32_t id = ParentOf(spec);
+  for (int steps = 0; id != 1 && steps < 10; ++steps) {
+    Str255 name = {};
+    CInfoPBRec block{};
+    block.dirInfo = {name, spec.vRefNum, -1, static_cast<SInt32>(id), 0};
+    ASSERT_EQ(PBGetCatInfoSync(&block), noErr);
+    names = std::string(names::TextOfPascal(name)) + ":" + names;
+    id = static_cast<std::uint32_t>(block.dirInfo.ioDrParID);
+  }
+  EXPECT_EQ(names, "first:a:b:");
+}
+
+// --- What does not ------------------------------------------------------------------------------
+
+TEST_F(AMoment, KeepsNothingNegative) {
+  const Moment moment;
+  const FSSpec spec = SpecOf(PathTo("first/a/b/x"));
+  const FSSpec later = MakeRecord(spec.vRefNum, ParentOf(spec), "later");
+  EXPECT_EQ(ItemOf(later), "(-43)");
+  const std::string path = mFolder.MakeFile("first/a/b/later");
+  EXPECT_EQ(ItemOf(later), path);
+
+  const auto url = foundation::test::MakeUrl(PathTo("first/a/b/latest"), false);
+  FSRef item{};
+  EXPECT_FALSE(CFURLGetFSRef(url.Get(), &item));
+  mFolder.MakeFile("first/a/b/latest");
+  EXPECT_TRUE(CFURLGetFSRef(url.Get(), &item));
+}
+
+TEST_F(AMoment, LooksAlongAPathOnceMoreBeforeItGivesIt) {
+  const Moment moment;
+  const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
+  ASSERT_EQ(NameOfItem(item), "x");
+  Rename("first/a/b/x", "first/a/y");
+  EXPECT_EQ(PathOf(item), PathTo("first/a/y"));
+}
+
+TEST_F(AMoment, DoesNotTakeWhatIsMountedMeanwhileForWhatItHasSeen) {
+  const Moment moment;
+  const FSSpec before = SpecOf(PathTo("first/a/b/x"));
+  const ScopedMount cover("none", PathTo("first/a/b"), "tmpfs");
+  ASSERT_TRUE(cover.IsMounted());
+  mFolder.MakeFile("first/a/b/y");
+  const FSRef item = ReferenceTo(mFolder.MakeFile("first/a/b/x"));
+  FSCatalogInfo info{};
+  ASSERT_EQ(FSGetCatalogInfo(&item, kFSCatInfoVolume, &info, nullptr, nullptr, nullptr), noErr);
+  // Either state is one of this moment, but of one item only.
+  FSSpec spec{};
+  ASSERT_EQ(FSGetCatalogInfo(&item, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr), noErr);
+  EXPECT_EQ(info.volume, spec.vRefNum);
+  EXPECT_EQ(ParentOf(spec) == 2U, spec.vRefNum != before.vRefNum);
+}
+
+TEST_F(AMoment, KnowsAVolumeThatIsMountedMeanwhile) {
+  const Moment moment;
+  const FSSpec before = SpecOf(PathTo("first/a/b/x"));
+  const ScopedMount third("none", mFolder.MakeFolder("third"), "tmpfs");
+  ASSERT_TRUE(third.IsMounted());
+  const FSSpec spec = SpecOf(mFolder.MakeFile("third/x"));
+  EXPECT_EQ(ParentOf(spec), 2U);
+  EXPECT_NE(spec.vRefNum, before.vRefNum);
+  EXPECT_EQ(spec.vRefNum, VolumeNamed("third"));
+}
+
+TEST(WithoutAMoment, EachCallLooksForItself) {
+  const TemporaryFolder folder;
+  const std::string path = folder.MakeFile("x");
+  const FSRef item = ReferenceTo(path);
+  FSSpec spec = SpecOf(path);
+  EXPECT_EQ(NameOf(spec), "x");
+  std::filesystem::rename(path, folder.Path() / "y");
+  ASSERT_EQ(FSGetCatalogInfo(&item, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr), noErr);
+  EXPECT_EQ(NameOf(spec), "y");
+}
+
+// --- Its end ------------------------------------------------------------------------------------
+
+TEST_F(AMoment, KeepsAVolumeMountedUntilItsScopeEnds) {
+  {
+    const Moment moment;
+    SpecOf(PathTo("first/a/b/x"));
+    EXPECT_FALSE(CanUnmount("first"));
+  }
+  EXPECT_TRUE(CanUnmount("first"));
+}
+
+TEST_F(AMoment, LetsGoWhenItIsEnded) {
+  Moment moment;
+  SpecOf(PathTo("first/a/b/x"));
+  moment.End();
+  EXPECT_TRUE(CanUnmount("first"));
+  moment.End();
+}
+
+TEST_F(AMoment, EndsByAnException) {
+  try {
+    const Moment moment;
+    SpecOf(PathTo("first/a/b/x"));
+    throw std::runtime_error("thrown");
+  } catch (const std::runtime_error&) {
+  }
+  EXPECT_TRUE(CanUnmount("first"));
+}
+
+TEST_F(AMoment, LeavesNothingToTheNext) {
+  const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
+  {
+    const Moment moment;
+    ASSERT_EQ(NameOfItem(item), "x");
+  }
+  Rename("first/a/b/x", "first/a/b/y");
+  const Moment next;
+  EXPECT_EQ(NameOfItem(item), "y");
+}
+
+TEST_F(AMoment, ThatWasEndedServesNoLongerThoughItsScopeGoesOn) {
+  const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
+  Moment moment;
+  ASSERT_EQ(NameOfItem(item), "x");
+  moment.End();
+  Rename("first/a/b/x", "first/a/b/y");
+  EXPECT_EQ(NameOfItem(item), "y");
+}
+
+TEST_F(AMoment, WithinAnotherIsThatOne) {
+  Moment outer;
+  SpecOf(PathTo("first/a/b/x"));
+  {
+    Moment inner;
+    SpecOf(PathTo("second/a/b/x"));
+    inner.End();
+    EXPECT_FALSE(CanUnmount("first"));
+    EXPECT_FALSE(CanUnmount("second"));
+  }
+  EXPECT_FALSE(CanUnmount("first"));
+  EXPECT_FALSE(CanUnmount("second"));
+  outer.End();
+  EXPECT_TRUE(CanUnmount("first"));
+  EXPECT_TRUE(CanUnmount("second"));
+}
+
+// --- Whose it is --------------------------------------------------------------------------------
+
+TEST_F(AMoment, IsNotThatOfAnotherThread) {
+  const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
+  const Moment moment;
+  ASSERT_EQ(NameOfItem(item), "x");
+  Rename("first/a/b/x", "first/a/b/y");
+  std::string seen;
+  std::thread([&] { seen = NameOfItem(item); }).join();
+  EXPECT_EQ(seen, "y");
+}
+
+TEST_F(AMoment, IsNotEndedByThatOfAnotherThread) {
+  Moment moment;
+  SpecOf(PathTo("first/a/b/x"));
+  std::thread([&] {
+    const Moment other;
+    SpecOf(PathTo("second/a/b/x"));
+  }).join();
+  EXPECT_FALSE(CanUnmount("first"));
+  EXPECT_TRUE(CanUnmount("second"));
+  moment.End();
+  EXPECT_TRUE(CanUnmount("first"));
+}
+
+// --- What it holds ------------------------------------------------------------------------------
+
+TEST_F(AMoment, LetsGoOfWhatItHoldsWhenAVolumeIsSearched) {
+  const std::string path = mFolder.MakeFolder("second/gone");
+  const FSCatalogInfo info = InfoOf(path);
+  std::filesystem::remove(path);
+  const Moment moment;
+  SpecOf(PathTo("first/a/b/x"));
+  ASSERT_FALSE(CanUnmount("first"));
+  EXPECT_EQ(ItemWithID(info.volume, info.nodeID), "(-43)");
+  EXPECT_TRUE(CanUnmount("first"));
+}
+
+TEST_F(AMoment, GoesOnWhenNoMoreDescriptorsCanBeOpened) {
+  constexpr int kFolders = 6;
+  for (int i = 0; i <= kFolders; ++i) {
+    mFolder.MakeFolder("first/" + std::to_string(i) + " folder");
+    mFolder.MakeFile("first/" + std::to_string(i) + " folder/x");
+  }
+  const auto pathIn = [this](int i) { return PathTo("first/" + std::to_string(i) + " folder/x"); };
+  const FSSpec wanted = SpecOf(pathIn(kFolders));
+  const auto leaveNoDescriptors = [] {
+    const kernel::Descriptor lowest(dup(STDIN_FILENO));
+    const rlimit tight{static_cast<rlim_t>(lowest.Get()), static_cast<rlim_t>(lowest.Get())};
+    return setrlimit(RLIMIT_NOFILE, &tight) == 0;
+  };
+  EXPECT_TRUE(HoldsInChild([] { return true; },
+                           [&] {
+                             const Moment moment;
+                             for (int i = 0; i < kFolders; ++i) SpecOf(pathIn(i));
+                             if (!leaveNoDescriptors() || dup(STDIN_FILENO) != -1) return false;
+                             const FSSpec spec = SpecOf(pathIn(kFolders));
+                             return ParentOf(spec) == ParentOf(wanted) && NameOf(spec) == "x" &&
+                                    ItemOf(spec) == pathIn(kFolders);
+                           }));
+}
+
+// More folders than a moment holds.
+TEST_F(AMoment, AnswersForManyFolders) {
+  const Moment moment;
+  std::vector<FSSpec> specs;
+  for (int i = 0; i < 50; ++i) {
+    mFolder.MakeFolder("first/many/" + std::to_string(i));
+    specs.push_back(SpecOf(mFolder.MakeFile("first/many/" + std::to_string(i) + "/x")));
+  }
+  for (int i = 0; i < 50; ++i) {
+    EXPECT_EQ(ItemOf(specs[static_cast<std::size_t>(i)]),
+              PathTo("first/many/" + std::to_string(i) + "/x"));
+  }
+}
+
+}  // namespace
+}  // namespace tallowmere::test
