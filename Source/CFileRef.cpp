@@ -174,15 +174,24 @@ CFOwned<CFMutableStringRef> FolderAndName(CFStringRef folder, CFStringRef name) 
   std::abort();
 }
 
+// Whether there is memory to look a user up. Without any for what it keeps of the first look, glibc
+// 2.36 ends the process; a block like this, given back at once, is large enough for that.
+bool HasMemoryForUsers() {
+  constexpr std::size_t kEnough = 0x4000;  // bytes
+  return AllocateText(kEnough) != nullptr;
+}
+
 // The user whose name are the `length` units behind the "~"; the current one for an empty name.
+// Null for an unknown one, and without memory.
 passwd const* FindUser(CFStringRef tildePath, CFIndex length) {
   const CFIndex size = CFStringGetMaximumSizeForEncoding(length, kCFStringEncodingUTF8);
-  std::string name(static_cast<std::size_t>(size), '\0');
+  const Text name = AllocateText(static_cast<std::size_t>(size) + 1);
+  if (!name || !HasMemoryForUsers()) return nullptr;
   CFIndex used = 0;
   CFStringGetBytes(tildePath, CFRangeMake(1, length), kCFStringEncodingUTF8, 0, false,
-                   reinterpret_cast<UInt8*>(name.data()), size, &used);
-  name.resize(static_cast<std::size_t>(used));
-  return used == 0 ? getpwuid(getuid()) : getpwnam(name.c_str());
+                   reinterpret_cast<UInt8*>(name.get()), size, &used);
+  name[static_cast<std::size_t>(used)] = '\0';
+  return used == 0 ? getpwuid(getuid()) : getpwnam(name.get());
 }
 
 // What stands behind the "/" that ends the user's name; empty without one.

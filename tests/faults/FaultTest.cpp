@@ -3,6 +3,7 @@
 // the service ends as the protocol tells; the same question is answered rightly right after, and
 // nothing is left behind.
 #include <gtest/gtest.h>
+#include <signal.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -123,8 +124,9 @@ class Trial {
     mAnswers.insert(mRight);
   }
 
-  // A new service for each fault.
-  void FailNewServices(bool withAllocations) {
+  // A new service for each fault. Of so many allocations that fail, each may end it with SIGSEGV.
+  void FailNewServices(int deadlyAllocations) {
+    mDeadlyAllocations = deadlyAllocations;
     FaultyService sound;
     if (!IsAnswered(sound)) return;
     mEffort = sound.EffortSoFar();
@@ -133,7 +135,6 @@ class Trial {
     if (!IsAnswered(sound)) return;
     mKept = sound.Holds().allocations - once.allocations;
     for (const Fault& fault : FaultsIn(mEffort)) {
-      if (!withAllocations && fault.kind == Fault::Kind::kAllocation) continue;
       FailANewService(fault);
       if (mFindings >= kMostFindings) break;
     }
@@ -223,6 +224,11 @@ class Trial {
       Report(fault, "is never reached");
     }
     mIsRight = outcome.response == mRight;
+    if (outcome.status == -SIGSEGV && fault.kind == Fault::Kind::kAllocation &&
+        mDeadlyAllocations > 0) {
+      --mDeadlyAllocations;
+      return false;
+    }
     const bool isFine = outcome.status ? IsDocumentedEnd(fault, outcome, mEffort.calls, mRight)
                                        : mAnswers.contains(outcome.response);
     if (!isFine) {
@@ -259,6 +265,7 @@ class Trial {
   std::int64_t mKept = 0;        // allocations that stay for each right answer
   std::size_t mDescriptors = 0;  // of a new service to which nothing has happened
   bool mIsRight = false;         // the last one while something failed
+  int mDeadlyAllocations = 0;    // that are still expected
   int mFindings = 0;
 };
 
@@ -289,7 +296,6 @@ struct Item {
   Subject (*learn)();
   std::vector<unsigned> codes;         // asked of an old service
   std::vector<unsigned> codesWhenNew;  // and of new ones, which is slower
-  // Without memory for its first look at the users the C library itself ends the process.
   bool asksForUsers = false;
 };
 
@@ -325,7 +331,8 @@ const std::vector<Item> kItems{
      [] { return Subject("/Disk/twins/\u00E9t\u00E9", "\u00E9t\u00E9"); },
      {9},
      {9}},
-    {"InTheHomeFolder", [] { return Subject("~/a track.aif"); }, {1, 5, 7}, {7}, true},
+    {"InTheHomeFolder", [] { return Subject("~/a track.aif"); }, {1, 5, 7}, {1, 5, 7}, true},
+    {"InAUsersFolder", [] { return Subject("~user/a track.aif"); }, {1, 5, 7}, {7}, true},
     {"Deep", [] { return Subject(DeepPath()); }, {5, 7, 9}, {7}},
     {"RootOfAVolume", [] { return Subject("/Disk"); }, {1, 2, 5, 7, 8, 9}, {7, 9}},
 };
@@ -398,7 +405,9 @@ class FaultsOfNewServices : public Faults {};
 class FaultsOfOldServices : public Faults {};
 
 TEST_P(FaultsOfNewServices, AreAnsweredHonestlyAndNotRemembered) {
-  MakeTrial().FailNewServices(!GetParam().item->asksForUsers);
+  // Without memory for what it keeps of its first look at the users, one block, the C library
+  // itself ends the process. Only here is that block alone refused.
+  MakeTrial().FailNewServices(GetParam().item->asksForUsers ? 1 : 0);
 }
 
 TEST_P(FaultsOfOldServices, AreAnsweredHonestlyAndLeaveNothing) {

@@ -57,7 +57,7 @@ std::string Settings(const std::string& request, const Atom& settings) {
 
 // A path that begins in the home folder, spelled out.
 std::filesystem::path SpelledOut(const std::string& path) {
-  return path.starts_with("~/") ? TwoVolumeRoot::kHome + path.substr(1) : path;
+  return path.starts_with('~') ? TwoVolumeRoot::kHome + path.substr(path.find('/')) : path;
 }
 
 }  // namespace

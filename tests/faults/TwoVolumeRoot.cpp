@@ -41,7 +41,7 @@ void TwoVolumeRoot::Furnish(const std::vector<std::string>& files) {
     std::filesystem::create_directories(Outside(folder));
   }
   std::ofstream(Outside("/etc/passwd"))
-      << "user:x:" << getuid() << ":" << getgid() << "::" << kHome << ":/bin/sh\n";
+      << kUser << ":x:" << getuid() << ":" << getgid() << "::" << kHome << ":/bin/sh\n";
 }
 
 TwoVolumeRoot::~TwoVolumeRoot() {

@@ -27,6 +27,7 @@ class TwoVolumeRoot {
 
   static constexpr char kDisk[] = "/Disk";
   static constexpr char kHome[] = "/Home";
+  static constexpr char kUser[] = "user";  // whose that is
   static constexpr char kLabel[] = "System";
 
   bool IsEntered() const { return mIsEntered; }

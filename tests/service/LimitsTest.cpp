@@ -118,20 +118,76 @@ TEST_F(LimitsOfAPass, SixtyFourMegabytesAreEnoughForAHundredThousandFolders) {
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
 }
 
+// As long as it lives, a service has no more than so many pages beside those in use.
+class MemoryLimit {
+ public:
+  explicit MemoryLimit(const Service& service, rlim_t pages = 0) : mProcess(service.Process()) {
+    rlim_t inUse = 0;
+    std::ifstream("/proc/" + std::to_string(mProcess) + "/statm") >> inUse;
+    const rlim_t most = (inUse + pages) * static_cast<rlim_t>(sysconf(_SC_PAGESIZE));
+    const rlimit limit{most, RLIM_INFINITY};
+    EXPECT_EQ(prlimit(mProcess, RLIMIT_AS, &limit, &mBefore), 0);
+  }
+  MemoryLimit(const MemoryLimit&) = delete;
+  MemoryLimit& operator=(const MemoryLimit&) = delete;
+  ~MemoryLimit() { prlimit(mProcess, RLIMIT_AS, &mBefore, nullptr); }
+
+ private:
+  pid_t mProcess;
+  rlimit mBefore{};
+};
+
 TEST_F(LimitsOfAPass, WithoutMemoryThePassIsAnErrorAndTheNextOneIsRight) {
   if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
   const std::string record = RecordOnALargeVolume();
   Service service;
   ASSERT_TRUE(service.Answers(kAnyRequest, kItsResponse));
-  std::size_t pages = 0;
-  std::ifstream("/proc/" + std::to_string(service.Process()) + "/statm") >> pages;
-  const rlim_t inUse = pages * static_cast<rlim_t>(sysconf(_SC_PAGESIZE));
-  const rlimit nothingMore{inUse, RLIM_INFINITY};
-  rlimit before{};
-  ASSERT_EQ(prlimit(service.Process(), RLIMIT_AS, &nothingMore, &before), 0);
-  EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), kNoItemResponse));
-  ASSERT_EQ(prlimit(service.Process(), RLIMIT_AS, &before, nullptr), 0);
+  {
+    const MemoryLimit limit(service);
+    EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), kNoItemResponse));
+  }
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
+}
+
+// The answer of a new service that has no more than so many pages for it; nothing when it ends.
+std::string AnswerWithin(Service& service, rlim_t pages, const std::string& request) {
+  EXPECT_TRUE(service.Answers(kAnyRequest, kItsResponse));
+  const MemoryLimit limit(service, pages);
+  return service.Ask(request, 75);
+}
+
+TEST_F(Limits, WithoutMemoryToLookAUserUpTheItemIsNotFound) {
+  if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
+  for (const std::string name : {"", "root", "no such user of tallowmere"}) {
+    const std::string request = RecordRequest("~" + name);
+    const std::string right = Service().Ask(request, 75);
+    for (rlim_t pages = 0; pages < 60; ++pages) {
+      Service service;
+      const std::string answer = AnswerWithin(service, pages, request);
+      EXPECT_TRUE(answer == right || answer == RecordResponse(0, kEmptyRecord)) << pages;
+      EXPECT_EQ(service.Ask(request, 75), right) << name << " " << pages;
+    }
+  }
+}
+
+// Without memory for the request itself it ends.
+TEST_F(Limits, WithoutMemoryForAUsersLongNameTheItemIsNotFound) {
+  if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
+  const std::string request = RecordRequest("~" + std::string(60'000, 'u'));
+  const std::string right = RecordResponse(0, kEmptyRecord);
+  int answers = 0;
+  for (rlim_t pages = 0; pages < 200; pages += 2) {
+    Service service;
+    const std::string answer = AnswerWithin(service, pages, request);
+    if (answer.empty()) {
+      EXPECT_EQ(service.Wait(), 0) << pages;
+    } else {
+      ++answers;
+      EXPECT_EQ(answer, right) << pages;
+      EXPECT_EQ(service.Ask(request, 75), right) << pages;
+    }
+  }
+  EXPECT_GT(answers, 50);
 }
 
 // --- Permissions --------------------------------------------------------------------------------

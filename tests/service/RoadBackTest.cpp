@@ -80,7 +80,9 @@ TEST_F(RoadBack, OfTenThousandFilesLeadsToEach) {
     EXPECT_TRUE(mService.Answers(PathOfPartsRequest(spec.volume, spec.parent, spec.name, 0),
                                  PathResponse(real)))
         << path;
-    EXPECT_TRUE(mService.Answers(HFSNameRequest(path, 64), NameResponse(1, spec.name))) << path;
+    // A link that leads nowhere does not exist for code 5.
+    const std::string named = fs::exists(path) ? NameResponse(1, spec.name) : NameResponse(0, "");
+    EXPECT_TRUE(mService.Answers(HFSNameRequest(path, 64), named)) << path;
     if (HasFailure() && !IsStillThere(path)) GTEST_SKIP() << path << " vanished meanwhile";
     ASSERT_FALSE(HasFailure()) << path;
   }
