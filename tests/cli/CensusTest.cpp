@@ -358,8 +358,8 @@ Exchange NoRecordOf(const std::string& path) {
 Exchange RecordOf(const std::string& path) {
   return {RecordRequest(path), RecordResponse(1, Record(-1, 2, "a"))};
 }
-Exchange NameOf(const std::string& path) {
-  return {HFSNameRequest(path, 767), NameResponse(1, "a")};
+Exchange RecordIn(const std::string& folder) {
+  return RecordOf(folder + "/any");
 }
 Exchange PathIs(const std::string& path) {
   return {PathOfRecordRequest(kEmptyRecord, 0, 0), PathResponse(path)};
@@ -370,7 +370,7 @@ TEST(Census, AnItemWithoutARecordIsSaidInOctalAndIsStatus1) {
   const TemporaryFolder folder;
   const std::string path = folder.MakeFolder("a\nb").string();
   const std::string service =
-      Impostor(folder, {NoRecordOf(path), NoRecordOf(path), NameOf(path)}, {});
+      Impostor(folder, {NoRecordOf(path), NoRecordOf(path), RecordIn(path)}, {});
   const CensusResult result = CensusOf(path, {"--service", service});
   EXPECT_THAT(result.text, HasSubstr("/a\\012b: has no record\n"
                                      "1 items, 0 came back, 1 did not, 0 vanished"));
@@ -380,8 +380,8 @@ TEST(Census, AnItemWithoutARecordIsSaidInOctalAndIsStatus1) {
 TEST(Census, AnItemThatComesBackAsAnotherIsSaidAndIsStatus1) {
   const TemporaryFolder folder;
   const std::string path = folder.MakeFolder("asked").string();
-  const std::string service =
-      Impostor(folder, {RecordOf(path), RecordOf(path), NameOf(path)}, {PathIs("/"), PathIs("/")});
+  const std::string service = Impostor(folder, {RecordOf(path), RecordOf(path), RecordIn(path)},
+                                       {PathIs("/"), PathIs("/")});
   const CensusResult result = CensusOf(path, {"--service", service});
   EXPECT_THAT(result.text, StartsWith(path + ": came back as /\n"));
   EXPECT_EQ(result.status, 1);
@@ -391,7 +391,7 @@ TEST(Census, ARecordThatLeadsNowhereIsSaidAndIsStatus1) {
   const TemporaryFolder folder;
   const std::string path = folder.MakeFolder("asked").string();
   const std::string service =
-      Impostor(folder, {RecordOf(path), RecordOf(path), NameOf(path)}, {kNoPath, kNoPath});
+      Impostor(folder, {RecordOf(path), RecordOf(path), RecordIn(path)}, {kNoPath, kNoPath});
   const CensusResult result = CensusOf(path, {"--service", service});
   EXPECT_THAT(result.text, StartsWith(path + ": its record leads nowhere\n"));
   EXPECT_EQ(result.status, 1);
@@ -403,7 +403,7 @@ CensusResult CensusWith(const TemporaryFolder& folder, const std::string& asked,
   const std::string item = asked + "/a";
   return CensusOf(
       asked, {"--service",
-              Impostor(folder, {RecordOf(asked), NameOf(asked), RecordOf(item), RecordOf(item)},
+              Impostor(folder, {RecordOf(asked), RecordIn(asked), RecordOf(item), RecordOf(item)},
                        {PathIs(asked), PathIs(other), PathIs(other)})});
 }
 
@@ -445,7 +445,7 @@ TEST(Census, WhatVanishesMeanwhileDoesNotCount) {
   const TemporaryFolder folder;
   const std::string path = folder.MakeFolder("asked").string();
   const std::string victim = folder.MakeFile("asked/victim").string();
-  const std::vector<Exchange> whole{NoRecordOf(path), NoRecordOf(path), NameOf(path)};
+  const std::vector<Exchange> whole{NoRecordOf(path), NoRecordOf(path), RecordIn(path)};
   std::string script = "#!/bin/sh\n" + Play(whole, 0);
   script.erase(script.rfind("exec"));
   script += "head -c 1 >/dev/null; rm " + victim + "; printf '" +
