@@ -1,5 +1,6 @@
 #include <sys/stat.h>
 
+#include <cstdint>
 #include <filesystem>
 #include <iostream>
 #include <optional>
@@ -16,6 +17,11 @@
 
 namespace tallowmere::cli {
 namespace {
+
+// The parent id of what is on no volume; no item has it.
+constexpr std::int32_t kParentOnNoVolume = 3;
+
+constexpr const char* kAnyItem = "/any";
 
 bool IsSame(const struct stat& first, const struct stat& second) {
   return first.st_dev == second.st_dev && first.st_ino == second.st_ino;
@@ -50,12 +56,13 @@ class Census {
     return true;
   }
 
-  // Whether a folder that was just seen is on a volume: what is there and has no HFS name is on
-  // none.
+  // Whether a folder that was just seen is on a volume: what is in one that is on none has no
+  // record, or one that leads nowhere.
   bool IsOnVolume(const std::string& path, const struct stat& folder) {
-    const auto name = mRecords.GetHFSName(path);
-    if (!name) Fail(name.Failure());
-    return !name || *name || !IsAt(path, folder);
+    const auto record = mRecords.GetFSSpec((path == "/" ? "" : path) + kAnyItem);
+    if (!record) Fail(record.Failure());
+    const bool leadsBack = record && *record && (*record)->parID != kParentOnNoVolume;
+    return !record || leadsBack || !IsAt(path, folder);
   }
 
   void LeaveOut(const std::string& path, const std::string& reason) {

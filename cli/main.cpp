@@ -1,6 +1,7 @@
 // tallowmere-cli: the service's requests for people and scripts.
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
 #include <charconv>
 #include <chrono>
 #include <exception>
@@ -8,6 +9,8 @@
 #include <iostream>
 #include <optional>
 #include <string>
+#include <utility>
+#include <vector>
 
 #include "cli/Commands.h"
 #include "cli/Output.h"
@@ -18,6 +21,8 @@ using namespace tallowmere::cli;
 
 // Without privilege a request can take a pass over a whole volume.
 constexpr double kSecondsForARequest = 600;
+
+const std::string kHelpTells = "--help tells more";
 
 // What the arguments say.
 struct Arguments {
@@ -49,6 +54,10 @@ std::string CheckRate(const std::string& text) {
   return hertz && IsRate(*hertz) ? "" : text + " is no rate below 65536 hertz";
 }
 
+bool HasInputAmongOthers(const std::vector<std::string>& items) {
+  return items.size() > 1 && std::find(items.begin(), items.end(), "-") != items.end();
+}
+
 class CommandLine {
  public:
   CommandLine() {
@@ -69,7 +78,11 @@ class CommandLine {
       mApp.parse(count, arguments);
     } catch (const CLI::ParseError& error) {
       if (error.get_exit_code() == 0) return mApp.exit(error);
-      Complain(std::string(error.what()) + "; --help tells more");
+      Complain(std::string(error.what()) + "; " + kHelpTells);
+      return kWrongUsage;
+    }
+    if (HasInputAmongOthers(mArguments.items.items)) {
+      Complain("\"-\" stands for standard input and takes no other items beside it; " + kHelpTells);
       return kWrongUsage;
     }
     const std::chrono::duration<double> deadline(mArguments.seconds);

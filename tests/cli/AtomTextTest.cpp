@@ -29,6 +29,16 @@ TEST(AtomText, OfAnythingThatIsCutOffIsNone) {
   }
 }
 
+// A size that is below an atom's own head leads nowhere, and one of 0 for ever to the same place.
+TEST(AtomText, OfAnAtomThatIsShorterThanItsHeadIsNone) {
+  const std::string whole = Nested(0);
+  for (const UInt32 size : {0U, 1U, 19U}) {
+    std::string container = whole;
+    container.replace(12, 4, quicktime::BigEndian(size));
+    EXPECT_EQ(TextOfAtoms(container), std::nullopt) << size;
+  }
+}
+
 TEST(AtomText, OfSixteenAtomsWithinEachOtherIsThereAndOfMoreIsNone) {
   EXPECT_NE(TextOfAtoms(Nested(15)), std::nullopt);
   EXPECT_EQ(TextOfAtoms(Nested(16)), std::nullopt);

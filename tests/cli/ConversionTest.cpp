@@ -178,6 +178,16 @@ TEST_F(Conversion, ALineIsAnsweredBeforeTheNextOneIsThere) {
   EXPECT_EQ(cli.Wait(), 0);
 }
 
+// Another reader of a descriptor that does not block can have taken what poll promised.
+TEST_F(Conversion, AnInputThatHasNothingYetIsWaitedFor) {
+  ChildProgram cli("env", {"ASAN_OPTIONS=verify_asan_link_order=0", "TALLOWMERE_UNREADY_READS=3",
+                           "LD_PRELOAD=" TALLOWMERE_FAULTY_INPUT, TALLOWMERE_CLI, "name", "-"});
+  cli.Write(mFile + "\n");
+  cli.CloseInput();
+  EXPECT_EQ(cli.ReadToEnd(), "a/b\n");
+  EXPECT_EQ(cli.Wait(), 0);
+}
+
 TEST_F(Conversion, AnInputThatCannotBeReadIsSaid) {
   ChildProgram cli("/bin/sh", {"-c", "exec \"$0\" name - <\"$1\"", TALLOWMERE_CLI, mHere});
   EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: standard input: Is a directory\n");

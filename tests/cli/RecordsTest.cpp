@@ -37,6 +37,18 @@ TEST(Records, ANameMayHoldColonsAndBeEmpty) {
   EXPECT_EQ(ReadRecord("1:2:"), (FSSpec{1, 2, ""}));
 }
 
+// As long as one in hexadecimal.
+TEST(Records, ATextOf140BytesIsTakenAsText) {
+  std::string text = "1:2:a";
+  std::string name = "a";
+  for (int i = 0; i < 45; ++i) {
+    text += "\xE2\x89\xA0";
+    name += '\xAD';
+  }
+  ASSERT_EQ(text.size(), 140u);
+  EXPECT_EQ(ReadRecord(text), (FSSpec{1, 2, name}));
+}
+
 TEST(Records, CapitalHexadecimalDigitsAreTaken) {
   const std::string digits =
       "E5FF0200000001"

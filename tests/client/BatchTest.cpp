@@ -230,6 +230,24 @@ TEST(Batch, TheFirstUnansweredRequestGetsTheErrorAndAllOthersAreAnswered) {
   EXPECT_EQ(answers, expected);
 }
 
+TEST(Batch, HalfAnAnswerToALaterRequestIsForgottenWithTheServiceThatGaveIt) {
+  const TemporaryFolder folder;
+  Client client(
+      {.service = ImpostorOnce(folder, std::string("head -c 16 >/dev/null; printf '") +
+                                           kNoSuchVolume + "\\001\\005\\000ha'; kill -9 $$")});
+  const Text name = *StartClient().GetHFSVolumeName(0);
+  ASSERT_TRUE(name);
+  Batch batch(client);
+  std::vector<std::string> answers;
+  for (int i = 0; i < 4; ++i) {
+    batch.Add(request::GetHFSVolumeName(0), [&](Result<Text> answer) {
+      answers.push_back(answer ? answer->value_or("none") : answer.Failure().message);
+    });
+  }
+  batch.Finish();
+  EXPECT_EQ(answers, (std::vector<std::string>{"none", test::kEnded, *name, *name}));
+}
+
 TEST(Batch, AServiceKilledInTheMiddleCostsOneAnswer) {
   const test::MortalService service;
   Client client({.service = service.Path()});

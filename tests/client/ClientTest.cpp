@@ -5,6 +5,7 @@
 #include <optional>
 
 #include "client/ClientSupport.h"
+#include "client/FindService.h"
 #include "support/AtomReader.h"
 
 namespace tallowmere {
@@ -183,6 +184,37 @@ TEST(Client, TheServiceIsFoundOnTheSearchPath) {
   EXPECT_TRUE(found);
   EXPECT_EQ(test::MessageOf(notFound),
             "the service \"tallowmere\" is neither beside this program nor on PATH");
+}
+
+// The status of a child whose root is that folder, in which nothing is beside its program.
+int StatusIn(const std::filesystem::path& root, const std::function<bool()>& isRight) {
+  const pid_t child = fork();
+  if (child == 0) _exit(chroot(root.c_str()) == 0 && isRight() ? 0 : 1);
+  int status = -1;
+  waitpid(child, &status, 0);
+  return status;
+}
+
+// It is neither the root folder nor the current one.
+TEST(FindService, PassesOverAnEmptyElementOfTheSearchPath) {
+  if (geteuid() != 0) GTEST_SKIP() << "changing the root folder is not permitted here";
+  const TemporaryFolder folder;
+  folder.MakeFolder("there");
+  for (const char* const name : {"tallowmere", "there/tallowmere"}) {
+    chmod(folder.MakeFile(name).c_str(), 0755);
+  }
+  EXPECT_EQ(StatusIn(folder.Path(),
+                     [] {
+                       setenv("PATH", "::", 1);
+                       return chdir("/there") == 0 && FindService().empty();
+                     }),
+            0);
+  EXPECT_EQ(StatusIn(folder.Path(),
+                     [] {
+                       setenv("PATH", ":/nonexistent::/there", 1);
+                       return FindService() == "/there/tallowmere";
+                     }),
+            0);
 }
 
 }  // namespace

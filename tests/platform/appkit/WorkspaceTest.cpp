@@ -27,8 +27,18 @@ class APackage : public testing::Test {
 
 TEST_F(APackage, IsAFolderWithARegisteredExtension) {
   for (const char* extension :
-       {"app", "bundle", "plugin", "kext", "component", "vst", "vst3", "pkg", "mpkg", "rtfd",
-        "xcodeproj", "photoslibrary", "logicx", "band"}) {
+       {"aaxplugin",    "aplibrary",     "app",         "appex",         "band",
+        "bundle",       "clr",           "colorpicker", "component",     "concert",
+        "dictionary",   "docset",        "download",    "dpm",           "dsym",
+        "fcpbundle",    "graffle",       "ibplugin",    "imovielibrary", "imovieproject",
+        "kext",         "key",           "logicx",      "mdimporter",    "migratedphotolibrary",
+        "mpkg",         "musiclibrary",  "numbers",     "pages",         "patch",
+        "photolibrary", "photoslibrary", "pkg",         "playground",    "plugin",
+        "prefpane",     "qlgenerator",   "rcproject",   "rtfd",          "saver",
+        "scptd",        "service",       "slidesaver",  "sparsebundle",  "systemextension",
+        "theater",      "tvlibrary",     "vst",         "vst3",          "wdgt",
+        "webplugin",    "workflow",      "xcassets",    "xcdatamodel",   "xcdatamodeld",
+        "xcodeproj",    "xcworkspace",   "xpc"}) {
     const std::string name = std::string("x.") + extension;
     mFolder.MakeFolder(name);
     EXPECT_TRUE(IsPackageHere(name)) << name;

@@ -1,0 +1,95 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/mount.h>
+#include <tallowmere/Volumes.h>
+
+#include <algorithm>
+
+#include "client/ClientSupport.h"
+#include "client/Mounts.h"
+#include "support/MountNamespace.h"
+
+namespace tallowmere {
+namespace {
+
+using test::EnterOwnMountNamespace;
+using test::ScopedMount;
+using test::StartClient;
+using test::TemporaryFolder;
+using testing::ElementsAre;
+
+TEST(MountPoints, AreTheRootFirstAndThenInTheOrderOfTheirLines) {
+  EXPECT_THAT(MountPointsIn("22 21 0:20 / /proc rw,nosuid shared:5 master:1 - proc proc rw\n"
+                            "21 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+                            "23 21 8:2 /sub /home rw - ext4 /dev/sda2 rw\n"),
+              ElementsAre("/", "/proc", "/home"));
+}
+
+TEST(MountPoints, HaveTheirEscapesUndone) {
+  EXPECT_THAT(MountPointsIn("23 21 8:2 / /a\\040b\\011\\012\\134\\043 rw - ext4 x rw\n"
+                            "24 21 8:3 / /tail\\04 rw - ext4 x rw\n"),
+              ElementsAre("/", "/a b\t\n\\#", "/tail\\04"));
+}
+
+TEST(MountPoints, AtWhichSeveralAreMountedStandWhereTheLastOneDoes) {
+  EXPECT_THAT(MountPointsIn("2 1 8:2 / /a rw - ext4 x rw\n3 1 8:3 / /b rw - ext4 x rw\n"
+                            "4 2 8:4 / /a rw - ext4 x rw\n"),
+              ElementsAre("/", "/b", "/a"));
+}
+
+TEST(MountPoints, OfLinesThatAreNoneAreNone) {
+  EXPECT_THAT(MountPointsIn(""), ElementsAre("/"));
+  EXPECT_THAT(MountPointsIn("\n1 2 3\n1 2 3 4 relative\n2 1 8:2 / /a"), ElementsAre("/", "/a"));
+}
+
+// The listed volume with that mount point.
+std::optional<Volume> At(const std::vector<Volume>& volumes, const std::string& mountPoint) {
+  const auto found = std::find_if(volumes.begin(), volumes.end(), [&](const Volume& volume) {
+    return volume.mountPoint == mountPoint;
+  });
+  return found == volumes.end() ? std::nullopt : std::optional(*found);
+}
+
+TEST(ListVolumes, HasNumberNameAndMountPointOfEachWithTheRootFirst) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  const std::string place = folder.MakeFolder("V\xC3\xA9 1");
+  const ScopedMount volume("none", place, "tmpfs");
+  ASSERT_TRUE(volume.IsMounted());
+  Client client = StartClient();
+  const auto volumes = ListVolumes(client);
+  ASSERT_TRUE(volumes);
+  EXPECT_EQ(volumes->front().mountPoint, "/");
+  const auto listed = At(*volumes, place);
+  ASSERT_TRUE(listed);
+  EXPECT_EQ(listed->name, "V\x8E 1");
+  EXPECT_EQ(*client.GetVolRefnumByHFSName(listed->name), listed->number);
+}
+
+TEST(ListVolumes, HasEachVolumeOnceAndNoInterfaceOfTheKernelNorFolderMountedAlone) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  const std::string place = folder.MakeFolder("first");
+  const ScopedMount volume("none", place, "tmpfs");
+  ASSERT_TRUE(volume.IsMounted());
+  folder.MakeFolder("first/inner");
+  const ScopedMount again(place, folder.MakeFolder("second"), nullptr, MS_BIND);
+  const ScopedMount inner(place + "/inner", folder.MakeFolder("inner"), nullptr, MS_BIND);
+  const ScopedMount processes("none", folder.MakeFolder("processes"), "proc");
+  ASSERT_TRUE(again.IsMounted() && inner.IsMounted() && processes.IsMounted());
+  Client client = StartClient();
+  const auto volumes = ListVolumes(client);
+  ASSERT_TRUE(volumes);
+  EXPECT_TRUE(At(*volumes, place));
+  for (const char* const name : {"second", "inner", "processes"}) {
+    EXPECT_FALSE(At(*volumes, folder.Path() / name)) << name;
+  }
+}
+
+TEST(ListVolumes, GivesTheErrorOfAServiceThatEnds) {
+  Client client({.service = "/bin/true"});
+  EXPECT_EQ(test::MessageOf(ListVolumes(client)), test::kEnded);
+}
+
+}  // namespace
+}  // namespace tallowmere
