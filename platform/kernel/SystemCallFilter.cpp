@@ -19,14 +19,6 @@
 #include <cstdint>
 #include <span>
 
-// Made by the compiler, so that a process that starts does not have to; by the process itself where
-// is counted what the tests reach.
-#ifdef TALLOWMERE_COVERAGE
-#define TALLOWMERE_MADE_BEFORE const
-#else
-#define TALLOWMERE_MADE_BEFORE constexpr
-#endif
-
 namespace tallowmere::kernel {
 namespace {
 
@@ -251,7 +243,7 @@ constexpr Rules MakeRules() {
   return rules;
 }
 
-TALLOWMERE_MADE_BEFORE Rules kRules = MakeRules();
+constexpr Rules kRules = MakeRules();
 
 constexpr Rule kRulesWithLooks[] = {Rule::kNoSignal,   Rule::kThisProcess, Rule::kItsOwn,
                                     Rule::kThread,     Rule::kSocket,      Rule::kFlagsSecond,
@@ -421,15 +413,26 @@ class Writer {
   std::size_t mWayCount = 0;
 };
 
-TALLOWMERE_MADE_BEFORE SystemCallFilter kFilters[2][2] = {
+#ifdef TALLOWMERE_COVERAGE
+// Made anew each time, so that what makes it is counted.
+SystemCallFilter FilterFor(const Openings& openings) {
+  return Writer(openings).Filter();
+}
+#else
+// Made by the compiler: a process that starts only copies the one that it needs.
+constexpr SystemCallFilter kFilters[2][2] = {
     {Writer({false, false}).Filter(), Writer({false, true}).Filter()},
     {Writer({true, false}).Filter(), Writer({true, true}).Filter()},
 };
+const SystemCallFilter& FilterFor(const Openings& openings) {
+  return kFilters[openings.toWrite ? 1 : 0][openings.toNetworks ? 1 : 0];
+}
+#endif
 
 }  // namespace
 
 SystemCallFilter MakeSystemCallFilter(const Openings& openings) {
-  SystemCallFilter filter = kFilters[openings.toWrite ? 1 : 0][openings.toNetworks ? 1 : 0];
+  SystemCallFilter filter = FilterFor(openings);
   for (sock_filter& step : filter.steps) {
     if (step.k == kSelf) step.k = static_cast<unsigned>(getpid());
   }
