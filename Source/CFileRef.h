@@ -8,6 +8,11 @@
 // std::string of no path). A setter or an edit that fails leaves the reference empty unless its
 // comment says otherwise.
 //
+// A relative path is that of an item in the directory that was current when the URL was made; a
+// setter or an edit that makes a URL anew takes the one that is current then. Of a URL that is no
+// file's (another scheme or host) the path, the existence and the kind are those of the file with
+// its path; it has no FSRef and no node id.
+//
 // "Path" without more is the POSIX path in the form that the file system stores: NUL-terminated
 // bytes. Sizes are in bytes.
 #pragma once
@@ -96,7 +101,7 @@ class CFileRef {
   // A new URL of the path that `url` has.
   bool Set(CFURLRef url, bool isDirectory);
 
-  // An existing item.
+  // An existing item. Not this reference's own cache, which is emptied before it is read.
   explicit CFileRef(FSRef const* item);
   bool Set(FSRef const* item);
 
@@ -134,8 +139,8 @@ class CFileRef {
   bool operator==(CFileRef const& other) const;
   bool operator!=(CFileRef const& other) const;
 
-  // Whether the other path is this one or lies below it, letter case ignored. "/" contains itself
-  // alone.
+  // Whether the other path is this one or lies below it, letter case ignored. "/" contains
+  // itself and paths that begin with "//".
   bool PathContains(CFileRef const& other) const;
 
   // Writes the path and whether the item exists to std::cout, for debugging. The path of a

@@ -66,8 +66,8 @@ bool CFileUtilAddHFSName(CFileRef* ref, char const* name, bool flag);
 // Make a record, or a reference to an existing item, of a folder's full path (or null) and a name
 // (or null), joined by ':'. With `joinSecond` a second C string follows the first in memory and is
 // a part of the folder's path. The length of the joined path is taken modulo 256. The result is
-// FSMakeFSSpec's: for the record, fnfErr means that only the last component is missing; a reference
-// is as it was unless the result is noErr.
+// FSMakeFSSpec's: for the record, fnfErr means that only the last component is missing, and with any
+// other error nothing is written; a reference is as it was unless the result is noErr.
 OSErr CFileUtilMakeFSSpecFromPath(FSSpec* spec, char const* hfsFolderPath, char const* name,
                                   unsigned char joinSecond);
 OSErr CFileUtilMakeFileRefFromPath(CFileRef* ref, char const* hfsFolderPath, char const* name,

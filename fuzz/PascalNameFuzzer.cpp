@@ -8,7 +8,7 @@
 
 #include "CFOwned.h"
 #include "foundation/ColonsAndSlashes.h"
-#include "foundation/FileNameText.h"
+#include "text/FileNameText.h"
 #include "text/MacRoman.h"
 #include "fuzz/Check.h"
 #include "names/HFSNames.h"
@@ -23,7 +23,7 @@ using names::kLongestStr255Name;
 
 // Any bytes are text, and Mac Roman text at that, and come back.
 void CheckText(std::string_view bytes) {
-  Check(foundation::FileNameOfText(foundation::TextOfFileName(bytes)) == bytes);
+  Check(text::FileNameOfText(foundation::TextOfFileName(bytes)) == bytes);
   const std::u16string text = text::DecodeMacRoman(bytes);
   Check(text::EncodeMacRoman(text) == bytes);
   Check(text::EncodeMacRoman(foundation::DecomposeMacRoman(text)) == bytes);
@@ -80,7 +80,7 @@ void CheckPascalStrings(std::string_view bytes) {
 // A string as a Pascal name in a buffer of that size, and back. A ':' of the string becomes a '/',
 // and every '/' comes back as ':'.
 void CheckBridge(std::string_view bytes, SInt32 bufferSize) {
-  const std::u16string text = foundation::TextOfFileName(bytes);
+  const std::u16string text = text::TextOfFileName(bytes);
   const CFOwned<CFStringRef> string(CFStringCreateWithCharacters(
       kCFAllocatorDefault, reinterpret_cast<const UniChar*>(text.data()),
       static_cast<CFIndex>(text.size())));

@@ -52,6 +52,28 @@ TEST_F(Identity, OfARelativePathIsNone) {
   EXPECT_FALSE(CFileRef("here", false).IsRoot());
 }
 
+TEST_F(Identity, OfARelativePathIsThatInTheFolderWhereItWasMade) {
+  const CFileRef there = RefTo(mFolder.MakeFile("here"));
+  const CurrentFolder former(mFolder.Path());
+  const CFileRef relative("here", false);
+  const CurrentFolder current("/");
+  EXPECT_EQ(relative.GetNodeID(), there.GetNodeID());
+  CFileRef anew;
+  anew.Set(relative, true);
+  EXPECT_EQ(anew.GetNodeID(), kNoNode);
+}
+
+TEST_F(Identity, OfAUrlThatIsNoFilesIsNoneThoughItsPathHasAnItem) {
+  CFileRef reference;
+  for (const std::string host : {"http://host", "file://host"}) {
+    ASSERT_TRUE(reference.SetFromURLString(host + mFolder.MakeFile("here").string()));
+    EXPECT_TRUE(reference.Exists());
+    EXPECT_TRUE(reference.IsFile());
+    EXPECT_FALSE(reference.UpdateInternalFSRef());
+    EXPECT_EQ(reference.GetNodeID(), kNoNode);
+  }
+}
+
 TEST_F(Identity, OfAMissingFileIsThatOfItsFolder) {
   const CFileRef missing = RefTo(mFolder.Path() / "missing");
   EXPECT_EQ(missing.GetNodeID(), kNoNode);

@@ -133,6 +133,13 @@ TEST(SettingAReference, TakesItsOwnPath) {
   EXPECT_TRUE(IsMarkedAsFolder(reference));
 }
 
+TEST(SettingAReference, FromItsOwnCacheLeavesItEmpty) {
+  CFileRef reference("/", true);
+  FSRef const& cache = reference;
+  EXPECT_FALSE(reference.Set(&cache));
+  EXPECT_FALSE(reference.IsValid());
+}
+
 // --- Styles -----------------------------------------------------------------------------------
 
 TEST(SettingAReference, FromAnHfsPathFindsItsVolume) {

@@ -82,7 +82,7 @@ void AttemptProcesses() {
   Tell("calls/execve", execve(program, words, words));
   Tell("calls/execveat", syscall(SYS_execveat, AT_FDCWD, program, words, words, 0));
   Tell("processes/clone", Fork());
-  Tell("calls/clone-thread-in-namespace",
+  Tell("processes/clone-thread-in-namespace",
        syscall(SYS_clone, CLONE_THREAD | CLONE_NEWNET, 0, 0, 0, 0));
   Tell("unknown/clone3", syscall(SYS_clone3, nullptr, 0));
   Tell("processes/ptrace", ptrace(PTRACE_ATTACH, kNoProcess, nullptr, nullptr));
