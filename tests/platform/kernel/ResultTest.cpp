@@ -23,10 +23,10 @@ TEST(Result, HasAValueOrAnError) {
   ASSERT_TRUE(made);
   EXPECT_EQ(**made, "made");
   EXPECT_EQ(made->get()->size(), 4u);
-  EXPECT_EQ(made.ErrorNumber(), 0);
+  EXPECT_EQ(made.Error().number, 0);
   const auto failed = Make(false);
   EXPECT_FALSE(failed);
-  EXPECT_EQ(failed.ErrorNumber(), ENOENT);
+  EXPECT_EQ(failed.Error().number, ENOENT);
 }
 
 TEST(Result, GivesItsValueAway) {
@@ -36,16 +36,16 @@ TEST(Result, GivesItsValueAway) {
 
 TEST(Result, WithoutAValueIsAnErrorOrNone) {
   EXPECT_TRUE(Do(true));
-  EXPECT_EQ(Do(true).ErrorNumber(), 0);
+  EXPECT_EQ(Do(true).Error().number, 0);
   EXPECT_FALSE(Do(false));
-  EXPECT_EQ(Do(false).ErrorNumber(), EPERM);
+  EXPECT_EQ(Do(false).Error().number, EPERM);
 }
 
 TEST(Result, KeepsTheErrorOfTheCallThatFailed) {
   errno = EIO;
   const Result<int> failed = LastError();
   errno = 0;
-  EXPECT_EQ(failed.ErrorNumber(), EIO);
+  EXPECT_EQ(failed.Error().number, EIO);
 }
 
 }  // namespace
