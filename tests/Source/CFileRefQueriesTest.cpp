@@ -283,6 +283,13 @@ TEST_F(AnItem, IsAPackageWhenTheWorkspaceSaysSo) {
   EXPECT_FALSE(At("z.app").IsExistingPackage());
 }
 
+TEST_F(AnItem, IsAPackageByARelativePathToo) {
+  const CurrentFolder current(mFolder.Path());
+  mFolder.MakeFolder("x.app");
+  EXPECT_TRUE(CFileRef("x.app", true).IsExistingPackage());
+  EXPECT_FALSE(CFileRef("missing.app", true).IsExistingPackage());
+}
+
 // --- Equality ---------------------------------------------------------------------------------
 
 TEST(EqualReferences, AreTwoEmptyOnes) {

@@ -93,6 +93,10 @@ TEST_F(HomeFolder, OfANameThatCannotBeConvertedIsTheCurrentUsers) {
   EXPECT_EQ(PathOf(reference), mUser.home + "/x");
 }
 
+TEST_F(HomeFolder, OfANameThatCanBeConvertedInPartIsThatPartsUsers) {
+  ExpectPath("~" + mUser.name + "\xFFz/x", false, mUser.home + "/x", false);
+}
+
 TEST(SettingAReference, ToTheHomeFolderOfAnUnknownUserFails) {
   ASSERT_EQ(getpwnam("tallowmere no such user"), nullptr);
   CFileRef reference("/a", false);

@@ -5,10 +5,26 @@
 
 #include <array>
 #include <cstdlib>
+#include <string_view>
 
 #include "CountedAllocations.h"
 #include "service/Request.h"
 #include "support/EveryRequest.h"
+
+namespace {
+
+// Of those that live when a trailer is written.
+int gLiveAtTrailer = 0;
+
+}  // namespace
+
+// In place of the C library's in this program.
+extern "C" ssize_t __real_write(int descriptor, const void* bytes, std::size_t size);
+extern "C" ssize_t __wrap_write(int descriptor, const void* bytes, std::size_t size) {
+  const std::string_view text(static_cast<const char*>(bytes), size);
+  if (text == tallowmere::test::kTrailer) gLiveAtTrailer = tallowmere::test::LiveAllocations();
+  return __real_write(descriptor, bytes, size);
+}
 
 namespace tallowmere::test {
 namespace {
@@ -67,18 +83,27 @@ TEST_P(OfARequest, AreNoMoreThanThese) {
   EXPECT_LE(Serve(requests.Of(GetParam().code)), GetParam().most);
 }
 
-INSTANTIATE_TEST_SUITE_P(Allocations, OfARequest,
-                         testing::ValuesIn(std::to_array<Allocations>({{1, 70},
-                                                                       {2, 39},
-                                                                       {3, 0},
-                                                                       {4, 0},
-                                                                       {5, 16},
-                                                                       {6, 31},
-                                                                       {7, 15},
-                                                                       {8, 21},
-                                                                       {9, 15},
-                                                                       {10, 25}})),
-                         [](const auto& row) { return "Code" + std::to_string(row.param.code); });
+// But for what the exporter keeps of each success.
+TEST_P(OfARequest, AreGivenBackBeforeTheTrailer) {
+  const EveryRequest requests;
+  if (!requests.IsMade()) GTEST_SKIP() << "the folder for temporary files is too deep";
+  const std::string request = requests.Of(GetParam().code);
+  Serve(requests.Of(7));
+  Serve(request);
+  Serve(request);
+  const int before = LiveAllocations();
+  Serve(request);
+  EXPECT_EQ(gLiveAtTrailer, LiveAllocations());
+  if (GetParam().code != 10) {
+    EXPECT_EQ(gLiveAtTrailer, before);
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Allocations, OfARequest,
+    testing::ValuesIn(std::to_array<Allocations>(
+        {{1, 70}, {2, 39}, {3, 0}, {4, 0}, {5, 16}, {6, 31}, {7, 15}, {8, 21}, {9, 15}, {10, 25}})),
+    [](const auto& row) { return "Code" + std::to_string(row.param.code); });
 
 }  // namespace
 }  // namespace tallowmere::test

@@ -45,5 +45,42 @@ TEST(Channel, AWriteThatIsCutShortGoesOnBehindWhatWasWritten) {
   EXPECT_EQ(got.substr(0, count), bytes);
 }
 
+// Takes a number of four bytes.
+bool CanTake(int input) {
+  Channel channel(input, -1);
+  channel.Take<std::uint32_t>();
+  return !channel.Failed();
+}
+
+TEST(Channel, AReadThatWouldHaveToWaitAndMayNotIsAFailure) {
+  int ends[2];
+  ASSERT_EQ(pipe2(ends, O_CLOEXEC | O_NONBLOCK), 0);
+  EXPECT_FALSE(CanTake(ends[0]));
+  ASSERT_EQ(write(ends[1], "abc", 3), 3);  // a part of the field
+  EXPECT_FALSE(CanTake(ends[0]));
+  ASSERT_EQ(write(ends[1], "abcd", 4), 4);
+  EXPECT_TRUE(CanTake(ends[0]));
+  close(ends[0]);
+  close(ends[1]);
+}
+
+TEST(Channel, AReadOfAFolderIsAFailure) {
+  const int folder = open("/", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  ASSERT_GE(folder, 0);
+  EXPECT_FALSE(CanTake(folder));
+  close(folder);
+}
+
+TEST(Channel, AWriteThatWouldHaveToWaitAndMayNotIsAFailure) {
+  int ends[2];
+  ASSERT_EQ(pipe2(ends, O_CLOEXEC | O_NONBLOCK), 0);
+  const std::string more(static_cast<std::size_t>(fcntl(ends[1], F_GETPIPE_SZ)) + 1, 'x');
+  Channel channel(-1, ends[1]);
+  channel.PutBytes(more.data(), more.size());
+  EXPECT_TRUE(channel.Failed());
+  close(ends[0]);
+  close(ends[1]);
+}
+
 }  // namespace
 }  // namespace tallowmere::service

@@ -6,6 +6,7 @@
 namespace {
 
 int allocations = 0;
+int released = 0;
 
 }  // namespace
 
@@ -17,13 +18,18 @@ void* operator new(std::size_t size) {
 }
 
 void operator delete(void* block) noexcept {
+  if (block != nullptr) ++released;
   std::free(block);
 }
 
 void operator delete(void* block, std::size_t) noexcept {
-  std::free(block);
+  operator delete(block);
 }
 
 int tallowmere::test::CountedAllocations() {
   return allocations;
+}
+
+int tallowmere::test::LiveAllocations() {
+  return allocations - released;
 }

@@ -128,6 +128,18 @@ TEST(Lifetime, TheParentIsLookedForAfterEveryRequestAlsoAfterOneThatFailed) {
             3);
 }
 
+TEST(Lifetime, TheParentIsNotLookedForWhenACodeEndsTheService) {
+  for (const unsigned code : {0u, 11u, 65535u}) {
+    const auto run = RunTraced("kill", kAnyRequest + U16(code));
+    if (!run) GTEST_SKIP() << "strace cannot trace here";
+    EXPECT_EQ(run->responses, kItsResponse);
+    EXPECT_EQ(std::count_if(run->calls.begin(), run->calls.end(),
+                            [](const std::string& call) { return IsCall(call, "kill"); }),
+              1)
+        << code;
+  }
+}
+
 class UnknownCode : public testing::TestWithParam<unsigned> {};
 
 TEST_P(UnknownCode, EndsTheServiceWithStatus1AndNoResponse) {
