@@ -433,8 +433,9 @@ const SystemCallFilter& FilterFor(const Openings& openings) {
 
 SystemCallFilter MakeSystemCallFilter(const Openings& openings) {
   SystemCallFilter filter = FilterFor(openings);
+  const auto self = static_cast<unsigned>(getpid());
   for (sock_filter& step : filter.steps) {
-    if (step.k == kSelf) step.k = static_cast<unsigned>(getpid());
+    if (step.k == kSelf) step.k = self;
   }
   return filter;
 }

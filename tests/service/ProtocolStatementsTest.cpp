@@ -2,6 +2,7 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
+#include <sys/mount.h>
 #include <unistd.h>
 
 #include <array>
@@ -100,7 +101,7 @@ TEST_F(FullPathOf, AnythingElseIsThatOfItsFolder) {
 TEST_F(FullPathOf, ASingleFileMountedByItselfIsThatOfItsFolder) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const std::string file = mFolder.MakeFile("file");
-  const ScopedMount mount(mFolder.MakeFile("other"), file, nullptr, 4096 /* MS_BIND */);
+  const ScopedMount mount(mFolder.MakeFile("other"), file, nullptr, MS_BIND);
   ASSERT_TRUE(mount.IsMounted());
   EXPECT_EQ(FullPath(file), FullPath(mFolder.Path()));
 }

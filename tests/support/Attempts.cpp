@@ -7,6 +7,7 @@
 #include <fcntl.h>
 #include <linux/fs.h>
 #include <linux/openat2.h>
+#include <netinet/in.h>
 #include <pthread.h>
 #include <setjmp.h>
 #include <signal.h>
@@ -108,11 +109,23 @@ void AttemptMounts() {
   Tell("calls/mount_setattr", syscall(SYS_mount_setattr, kNoDescriptor, "", 0, nullptr, 0));
 }
 
+// Where there is no such socket, that is what is told.
+void AttemptTCP(const char* name, int (*call)(int, const sockaddr*, socklen_t)) {
+  sockaddr_in here{};
+  here.sin_family = AF_INET;
+  here.sin_port = htons(1);
+  here.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+  const int internet = socket(AF_INET, SOCK_STREAM, 0);
+  Tell(name, internet < 0 ? -1 : call(internet, reinterpret_cast<sockaddr*>(&here), sizeof here));
+}
+
 void AttemptSockets() {
   Tell("network/internet", socket(AF_INET, SOCK_STREAM, 0));
   Tell("network/internet6", socket(AF_INET6, SOCK_DGRAM, 0));
   Tell("network/netlink", socket(AF_NETLINK, SOCK_RAW, 0));
   Tell("calls/packet", socket(AF_PACKET, SOCK_RAW, 0));
+  AttemptTCP("tcp/bind", bind);
+  AttemptTCP("tcp/connect", connect);
   const int local = socket(AF_UNIX, SOCK_STREAM, 0);
   const sockaddr_un place = Address("new socket");
   Tell("files/bind", bind(local, reinterpret_cast<const sockaddr*>(&place), sizeof place));
