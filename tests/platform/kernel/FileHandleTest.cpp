@@ -24,8 +24,8 @@ FileHandle MakeHandle(std::uint32_t inode, std::uint32_t generation) {
 
 TEST(FileHandle, OfAMissingItemIsAnError) {
   const TemporaryFolder folder;
-  EXPECT_EQ(ReadHandle(AT_FDCWD, (folder.Path() / "x").c_str()).ErrorNumber(), ENOENT);
-  EXPECT_EQ(ReadHandleToIdentify(AT_FDCWD, (folder.Path() / "x").c_str()).ErrorNumber(), ENOENT);
+  EXPECT_EQ(ReadHandle(AT_FDCWD, (folder.Path() / "x").c_str()).Error().number, ENOENT);
+  EXPECT_EQ(ReadHandleToIdentify(AT_FDCWD, (folder.Path() / "x").c_str()).Error().number, ENOENT);
 }
 
 TEST(FileHandle, OfAnInodeTakesItsFormFromASibling) {
@@ -65,9 +65,9 @@ TEST_F(AFileHandleOnExt4, OpensItsItemAndNotTheNextOneWithItsNumber) {
   ASSERT_TRUE(handle);
   EXPECT_TRUE(OpenByHandle(Root(), *handle));
   std::filesystem::remove(path);
-  EXPECT_EQ(OpenByHandle(Root(), *handle).ErrorNumber(), ESTALE);
+  EXPECT_EQ(OpenByHandle(Root(), *handle).Error().number, ESTALE);
   ASSERT_EQ(InodeOf(MakeFile("y")), inode);
-  EXPECT_EQ(OpenByHandle(Root(), *handle).ErrorNumber(), ESTALE);
+  EXPECT_EQ(OpenByHandle(Root(), *handle).Error().number, ESTALE);
 }
 
 TEST_F(AFileHandleOnExt4, OfANumberOpensFoldersAndFiles) {
@@ -90,7 +90,7 @@ TEST_F(AFileHandleOnExt4, OfANumberThatNoItemHasIsStale) {
 TEST_F(AFileHandleOnExt4, IsReadByEveryoneAndOpensForThePrivilegedOnly) {
   const auto refusesToOpen = [&] {
     const auto handle = ReadHandle(Root(), "");
-    return handle && OpenByHandle(Root(), *handle).ErrorNumber() == EPERM;
+    return handle && OpenByHandle(Root(), *handle).Error().number == EPERM;
   };
   EXPECT_FALSE(refusesToOpen());
   EXPECT_TRUE(test::HoldsForNobody(refusesToOpen));
@@ -197,10 +197,10 @@ TEST_F(AFileHandleOnSquashfs, OfANumberOpensFoldersAndFiles) {
 TEST_F(AFileHandleOnSquashfs, WithoutAnExportTableOpensNothing) {
   ASSERT_NO_FATAL_FAILURE(Make({"-no-exports"}));
   if (IsSkipped()) return;
-  EXPECT_EQ(ReadHandle(Root(), "").ErrorNumber(), EOPNOTSUPP);
+  EXPECT_EQ(ReadHandle(Root(), "").Error().number, EOPNOTSUPP);
   const auto identity = ReadHandleToIdentify(Root(), "");
   if (!identity) GTEST_SKIP() << "no handles to identify before Linux 6.5";
-  EXPECT_EQ(OpenByHandle(Root(), *identity).ErrorNumber(), ESTALE);
+  EXPECT_EQ(OpenByHandle(Root(), *identity).Error().number, ESTALE);
 }
 
 TEST(FileHandle, OfTmpfsIsNotMadeOfNumbers) {

@@ -73,7 +73,7 @@ class AMountedImage : public testing::Test {
 
   FileHandle HandleOfRoot() const {
     const auto handle = ReadHandle(Root(), "");
-    EXPECT_TRUE(handle) << handle.ErrorNumber();
+    EXPECT_TRUE(handle) << handle.Error().number;
     return handle ? *handle : FileHandle{};
   }
 
@@ -84,7 +84,7 @@ class AMountedImage : public testing::Test {
     const auto handle = HandleOf(numbers, HandleOfRoot(), status.st_ino);
     if (!handle) return EINVAL;
     const auto opened = OpenByHandle(Root(), *handle);
-    if (!opened) return opened.ErrorNumber();
+    if (!opened) return opened.Error().number;
     EXPECT_EQ(fstat(opened->Get(), &status), 0);
     EXPECT_EQ(status.st_ino, InodeOf(path)) << path;
     EXPECT_EQ(status.st_dev, StatusOf(path).st_dev) << path;

@@ -19,7 +19,7 @@ class AnXfsVolume : public AMountedImage {
   // Opens the item that has an inode number, whichever it is; the error of what fails first.
   int ErrorOfOpeningNow(std::uint64_t inode, const std::filesystem::path& path = {}) const {
     const auto generation = ReadXfsGeneration(Root(), inode);
-    if (!generation) return generation.ErrorNumber();
+    if (!generation) return generation.Error().number;
     return ErrorOfOpening({inode, 0, *generation}, path);
   }
 
@@ -55,11 +55,11 @@ TEST_F(AnXfsVolume, HasNoGenerationForANumberThatNoItemHas) {
   const std::uint64_t inode = InodeOf(MakeFile("f"));
   MakeFile("next");
   std::filesystem::remove(PathOf("f"));
-  EXPECT_EQ(ReadXfsGeneration(Root(), inode).ErrorNumber(), ENOENT);
-  EXPECT_EQ(ReadXfsGeneration(Root(), 0).ErrorNumber(), ENOENT);
-  EXPECT_EQ(ReadXfsGeneration(Root(), 1).ErrorNumber(), ENOENT);
-  EXPECT_EQ(ReadXfsGeneration(Root(), 0xFFFFFFFF).ErrorNumber(), ENOENT);
-  EXPECT_EQ(ReadXfsGeneration(Root(), ~std::uint64_t{0}).ErrorNumber(), ENOENT);
+  EXPECT_EQ(ReadXfsGeneration(Root(), inode).Error().number, ENOENT);
+  EXPECT_EQ(ReadXfsGeneration(Root(), 0).Error().number, ENOENT);
+  EXPECT_EQ(ReadXfsGeneration(Root(), 1).Error().number, ENOENT);
+  EXPECT_EQ(ReadXfsGeneration(Root(), 0xFFFFFFFF).Error().number, ENOENT);
+  EXPECT_EQ(ReadXfsGeneration(Root(), ~std::uint64_t{0}).Error().number, ENOENT);
 }
 
 TEST_F(AnXfsVolume, GivesANumberAgainWithAnotherGeneration) {
@@ -90,7 +90,7 @@ TEST_F(AnXfsVolume, HasNoNumberAboveTheHighest) {
 TEST_F(AnXfsVolume, TellsGenerationsToAdministratorsOnlyAndItsSizeToAll) {
   const std::uint64_t inode = InodeOf(MakeFile("f"));
   const auto knowsSizeOnly = [&] {
-    return ReadXfsGeneration(Root(), inode).ErrorNumber() == EPERM && ReadHighestXfsInode(Root());
+    return ReadXfsGeneration(Root(), inode).Error().number == EPERM && ReadHighestXfsInode(Root());
   };
   EXPECT_FALSE(knowsSizeOnly());
   EXPECT_TRUE(test::HoldsForNobody(knowsSizeOnly));
@@ -131,14 +131,14 @@ TEST_F(ALargeXfsVolume, HasLongNumbers) {
 TEST(Xfs, AsksNoOtherKind) {
   const Descriptor root(open("/dev", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   ASSERT_TRUE(root.IsOpen());
-  EXPECT_EQ(ReadXfsGeneration(root.Get(), 128).ErrorNumber(), ENOTTY);
-  EXPECT_EQ(ReadHighestXfsInode(root.Get()).ErrorNumber(), ENOTTY);
+  EXPECT_EQ(ReadXfsGeneration(root.Get(), 128).Error().number, ENOTTY);
+  EXPECT_EQ(ReadHighestXfsInode(root.Get()).Error().number, ENOTTY);
 }
 
 TEST(Xfs, NeedsAFolderThatIsOpenForReading) {
   const Descriptor root(open("/", O_PATH | O_DIRECTORY | O_CLOEXEC));
   ASSERT_TRUE(root.IsOpen());
-  EXPECT_EQ(ReadXfsGeneration(root.Get(), 128).ErrorNumber(), EBADF);
+  EXPECT_EQ(ReadXfsGeneration(root.Get(), 128).Error().number, EBADF);
 }
 
 }  // namespace
