@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 #include <sys/syscall.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <filesystem>
 #include <memory>
@@ -119,6 +120,20 @@ TEST_F(CoveredItems, AreNotWhatAFullPathLeadsToWhereverTheyWereSeen) {
   mFolder.MakeFile("volume/folder/below/x", "covering");
   EXPECT_EQ(FSMakeFSSpec(0, 0, path.bytes, &spec), noErr);
   EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
+}
+
+// A name is that of an item of the first place, also on the way.
+TEST_F(CoveredItems, OfTheFirstPlaceAreWhatAFullPathLeadsToThroughAnother) {
+  ShowAt("again");
+  Cover("again/folder");
+  const std::string covering = mFolder.MakeFile("again/folder/new");
+  std::string path = NameOf(SpecOf("/")) + covering;
+  std::replace(path.begin(), path.end(), '/', ':');
+  FSSpec spec{};
+  EXPECT_EQ(FSMakeFSSpec(0, 0, Str255Of(path).bytes, &spec), fnfErr);
+  mFolder.MakeFile("volume/folder/new");
+  EXPECT_EQ(FSMakeFSSpec(0, 0, Str255Of(path).bytes, &spec), noErr);
+  EXPECT_EQ(spec.vRefNum, SpecOf(PathTo("volume/folder/new")).vRefNum);
 }
 
 // The volume still shows each of its folders at one place.

@@ -5,7 +5,6 @@
 #include <gtest/gtest.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <chrono>
@@ -17,6 +16,7 @@
 #include "kernel/Item.h"
 #include "support/MountNamespace.h"
 #include "support/OtherKernel.h"
+#include "support/Privileges.h"
 #include "support/TemporaryFolder.h"
 #include "volumes/Volumes.h"
 
@@ -36,15 +36,7 @@ inline volumes::VolumePointer VolumeOf(volumes::VolumeTable& table, const std::s
   return volume ? *volume : nullptr;
 }
 
-// Whether `work` says true in a child process that has no privileges.
-template <class Work>
-bool HoldsForNobody(Work work) {
-  constexpr uid_t kNobody = 65534;
-  const pid_t child = fork();
-  if (child == 0) _exit(setresuid(kNobody, kNobody, kNobody) == 0 && work() ? 0 : 1);
-  int status = 0;
-  return waitpid(child, &status, 0) == child && WIFEXITED(status) && WEXITSTATUS(status) == 0;
-}
+using test::HoldsForNobody;
 
 // A node id that no item of a test has.
 inline constexpr std::uint32_t kOfNoItem = 0x12345678;

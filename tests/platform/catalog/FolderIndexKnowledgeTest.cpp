@@ -1,19 +1,15 @@
 // What an index keeps from one search to the next, and what it does not touch.
-#include <linux/filter.h>
-#include <linux/seccomp.h>
 #include <sys/mount.h>
-#include <sys/prctl.h>
 #include <sys/resource.h>
 #include <sys/syscall.h>
 
-#include <array>
 #include <cerrno>
-#include <cstddef>
 #include <cstring>
 
 #include "FolderIndexFixture.h"
 #include "NumberedFileSystem.h"
 #include "support/DeadMount.h"
+#include "support/RefusedCalls.h"
 
 namespace tallowmere::catalog {
 namespace {
@@ -46,19 +42,6 @@ class FewDescriptors {
  private:
   rlimit mBefore{};
 };
-
-// From now on no folder can be read in this process. False where that cannot be arranged.
-bool BreakReadingOfFolders() {
-  std::array filter{
-      sock_filter BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
-      sock_filter BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_getdents64, 0, 1),
-      sock_filter BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EIO),
-      sock_filter BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
-  };
-  const sock_fprog program{filter.size(), filter.data()};
-  return prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0 &&
-         prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) == 0;
-}
 
 // A file without a name until it is given one.
 class NamelessFile {
@@ -770,7 +753,7 @@ TEST_F(AnIndexOfMixedIDs, FindsNoneWhenTheLookAtWhatItKnowsFails) {
 TEST_F(AnIndexOfMixedIDs, FindsNoneWhenAFolderCannotBeReadToItsEnd) {
   const pid_t child = fork();
   if (child == 0) {
-    if (!BreakReadingOfFolders()) _exit(2);
+    if (!test::RefuseCall(SYS_getdents64, EIO)) _exit(2);
     const bool isCertainFound = Find(ID("deep"), "deep") == PathTo("deep");
     _exit(isCertainFound && Find(mID) == "(none)" ? 0 : 1);
   }

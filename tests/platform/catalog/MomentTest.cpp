@@ -220,9 +220,10 @@ TEST_F(AMoment, EndsByAnException) {
 }
 
 TEST_F(AMoment, LeavesNothingToTheNext) {
-  const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
+  FSRef item{};
   {
     const Moment moment;
+    item = ReferenceTo(PathTo("first/a/b/x"));
     ASSERT_EQ(NameOfItem(item), "x");
   }
   Rename("first/a/b/x", "first/a/b/y");
@@ -231,8 +232,8 @@ TEST_F(AMoment, LeavesNothingToTheNext) {
 }
 
 TEST_F(AMoment, ThatWasEndedServesNoLongerThoughItsScopeGoesOn) {
-  const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   Moment moment;
+  const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   ASSERT_EQ(NameOfItem(item), "x");
   moment.End();
   Rename("first/a/b/x", "first/a/b/y");
@@ -259,8 +260,8 @@ TEST_F(AMoment, WithinAnotherIsThatOne) {
 // --- Whose it is --------------------------------------------------------------------------------
 
 TEST_F(AMoment, IsNotThatOfAnotherThread) {
-  const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   const Moment moment;
+  const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   ASSERT_EQ(NameOfItem(item), "x");
   Rename("first/a/b/x", "first/a/b/y");
   std::string seen;

@@ -13,11 +13,6 @@ Result<std::unique_ptr<std::string>> Make(bool works) {
   return std::make_unique<std::string>("made");
 }
 
-Result<void> Do(bool works) {
-  if (!works) return Error{EPERM};
-  return Ok{};
-}
-
 TEST(Result, HasAValueOrAnError) {
   const auto made = Make(true);
   ASSERT_TRUE(made);
@@ -34,18 +29,19 @@ TEST(Result, GivesItsValueAway) {
   EXPECT_EQ(*taken, "made");
 }
 
-TEST(Result, WithoutAValueIsAnErrorOrNone) {
-  EXPECT_TRUE(Do(true));
-  EXPECT_EQ(Do(true).Error().number, 0);
-  EXPECT_FALSE(Do(false));
-  EXPECT_EQ(Do(false).Error().number, EPERM);
-}
-
 TEST(Result, KeepsTheErrorOfTheCallThatFailed) {
   errno = EIO;
-  const Result<int> failed = LastError();
+  const Result<int> failed = Error::OfLastCall();
   errno = 0;
   EXPECT_EQ(failed.Error().number, EIO);
+}
+
+TEST(Errors, ThatSayThatNothingIsThereAreNotThoseThatHideIt) {
+  for (const int number : {ENOENT, ENOTDIR, ELOOP}) EXPECT_TRUE(MeansGone({number})) << number;
+  for (const int number : {EACCES, EPERM, EIO, EMFILE}) EXPECT_FALSE(MeansGone({number})) << number;
+  for (const int number : {EACCES, EPERM}) EXPECT_TRUE(MeansRefused({number})) << number;
+  for (const int number : {ENOENT, EIO}) EXPECT_FALSE(MeansRefused({number})) << number;
+  EXPECT_FALSE(MeansGone(kNoVolume) || MeansGone(kNoFolder));
 }
 
 }  // namespace
