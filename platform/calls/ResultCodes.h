@@ -7,13 +7,13 @@
 
 namespace tallowmere::calls {
 
-// | error                                   | code                          |
-// |-----------------------------------------|-------------------------------|
-// | nothing is there, or no path leads there| fnfErr                        |
-// | kNoFolder                               | dirNFErr                      |
-// | kNoVolume                               | nsvErr                        |
-// | permission refused                      | afpAccessDenied               |
-// | any other                               | ioErr                         |
+//   error                                       code
+//   ---------------------------------------------------------------------
+//   nothing is there, or no path leads there    fnfErr
+//   kNoFolder                                   dirNFErr
+//   kNoVolume                                   nsvErr
+//   permission refused                          afpAccessDenied
+//   any other                                   ioErr
 OSErr ResultCodeOf(kernel::Error error);
 
 // The code for a folder on the way: one that is missing is a missing folder.

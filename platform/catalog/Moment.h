@@ -1,12 +1,12 @@
 // One question, or all questions of one request, as one moment: what was looked at once serves all
 // of it, and the answer is one that a single walk of the kernel could have given meanwhile.
 //
-// | Fact                                              | Serves |
-// |---------------------------------------------------|--------------------------------------------|
-// | held: device, number and mount of a held folder   | as long as it is held | | timed: a path led
-// to that folder; that folder had | with the held folder as the pivot; a path  | | that item under
-// that name                         | in an answer takes one more look along it  | | that nothing
-// was there                            | never: it is looked again                  |
+//   fact                                           serves
+//   ---------------------------------------------------------------------------------------------
+//   held: device, number and mount of a folder     as long as the folder is held
+//   timed: a path led to that folder; that         with the held folder as the pivot; a path in an
+//   folder had that item under that name           answer takes one more look along the whole path
+//   that nothing was there                         never: it is looked again
 //
 // The table of mounts is polled after the first folder is held: the kernel does not give a mount id
 // away while something on that mount is held, but at once afterwards. A mount that is met later is

@@ -1,10 +1,10 @@
 // What a search over a volume looks for, what it has found of it, and when it is settled.
 //
-// | Numbers of the volume | Looked for                | A find is | Settled by             |
-// |-----------------------|---------------------------|-----------|------------------------|
-// | tell items apart      | a reference, a certain id | that item | the first              |
-// | tell items apart      | another id                | an item   | two, or all being seen |
-// | do not tell them      | an id, or numbers         | a place   | two, or all being seen |
+//   numbers of the volume    looked for                   a find is    settled by
+//   ---------------------------------------------------------------------------------------------
+//   tell items apart         a reference, a certain id    that item    the first
+//   tell items apart         another id                   an item      two, or all being seen
+//   do not tell them         an id, or numbers            a place      two, or all being seen
 #pragma once
 
 #include <cstdint>

@@ -1,11 +1,10 @@
 // How sure the catalog is of a place, as types:
 //
-// | Type       | What is known |
-// |------------|-----------------------------------------------------------------------------------|
-// | a lead     | a path that somebody remembers or found in passing: just a std::string | |
-// Sighting   | the item was at that path, at one moment                                          |
-// | HeldFolder | the folder is open, so that device, number and mount stay its own, and its volume
-// | |            | is known |
+//   type         what is known
+//   ---------------------------------------------------------------------------------------------
+//   a lead       a path that somebody remembers or found in passing: just a std::string
+//   Sighting     the item was at that path, at one moment
+//   HeldFolder   the folder is open, so that device, number and mount stay its own; its volume
 //
 // That a path led to a folder, or that a folder had an item under a name, is true of one moment
 // only. Two such facts are put together only when the held folder or the item is the pivot.

@@ -7,14 +7,15 @@
 // Birth proves nothing without a device: an overlay gives an item another birth when it is first
 // renamed or written to.
 //
-// | birth | handle | proved by                  | not noticed |
-// |-------|--------|----------------------------|--------------------------------------------------|
-// | old   | any    | birth (on a block device)  | | | any   | yes    | handle                     |
-// | | any   | no     | birth                      | a number that goes round within one tick | |
-// none  | no     | type and mount             | a new item of that type with that number         |
+//   birth    handle    proved by                   not noticed
+//   ---------------------------------------------------------------------------------------------
+//   old      any       birth, on a block device
+//   any      yes       handle
+//   any      no        birth                       a number that goes round within one tick
+//   none     no        type and mount              a new item of that type with that number
 //
 // On file systems whose numbers are not one item's, the place is a part of the identity as well:
-// see catalog/Sightings.h.
+// see catalog/Sighting.h.
 #pragma once
 
 #include <cstdint>
