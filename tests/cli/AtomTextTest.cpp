@@ -50,7 +50,7 @@ void ExitWith0IfNone(const std::string& container) {
 
 // A size of 0 leads to the same atom for ever.
 TEST(AtomText, OfAnAtomThatIsShorterThanItsHeadIsNone) {
-  for (const std::size_t size : {0, 1, 19}) {
+  for (const std::size_t size : {0U, 1U, 19U}) {
     std::string container = Nested(0);
     container.replace(12, 4, Number(size, 4));
     EXPECT_EXIT(ExitWith0IfNone(container), testing::ExitedWithCode(0), "") << size;
