@@ -1,8 +1,8 @@
-// Writing atom containers: a tree of typed pieces of data, all numbers big-endian, as published
-// with the movie file format ("QT atoms").
+// Writes atom containers: trees of typed pieces of data, all numbers big-endian, as published with
+// the movie file format ("QT atoms").
 //
-// An atom is a header of 20 bytes and then its children or its data. Every atom written here has id
-// 1: no two of one type are siblings.
+// An atom is a header of 20 bytes, followed by its children or its data. Every atom written here
+// has id 1, as no two siblings have the same type.
 #pragma once
 
 #include <QuickTime/QuickTime.h>
@@ -21,7 +21,7 @@ std::string BigEndian(UInt32 number);
 std::string Leaf(OSType type, std::string_view data);
 std::string Parent(OSType type, std::initializer_list<std::string_view> children);
 
-// The whole container: what stands before the root atom, and that.
+// The whole container: the bytes that precede the root atom, then the root atom.
 std::string AtomContainer(std::initializer_list<std::string_view> children);
 
 }  // namespace tallowmere::quicktime
