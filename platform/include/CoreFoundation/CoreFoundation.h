@@ -23,8 +23,7 @@ using CFOptionFlags = unsigned long;  // a set of bits
 using CFTypeRef = const void*;        // any of the objects below
 using CFAllocatorRef = const struct __CFAllocator*;
 using CFDictionaryRef = const struct __CFDictionary*;
-using CFStringRef =
-    const struct __CFString*;  // an immutable string, or a mutable one that is only read
+using CFStringRef = const struct __CFString*;   // an immutable string, or a mutable one only read
 using CFMutableStringRef = struct __CFString*;  // a string that can change
 using CFURLRef = const struct __CFURL*;         // an immutable URL
 
