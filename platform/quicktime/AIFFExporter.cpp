@@ -10,7 +10,7 @@ namespace {
 
 struct Format {
   OSType code;
-  bool isCompressed;  // its name alone says how many bits there are to a sample
+  bool isCompressed;  // its name alone determines the bits per sample
 };
 
 constexpr Format kFormats[] = {
