@@ -1,11 +1,11 @@
-// Ownership of what a Create or Copy call returns. Needs nothing but the public header.
+// Ownership of what a Create or Copy call returns. Needs only the public header.
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
 
 #include <utility>
 
-// Holds one reference to an object, or null, and gives it back at its end:
+// Holds one reference to an object, or null, and releases it when destroyed:
 //   const CFOwned name(CFURLCopyLastPathComponent(url));
 template <typename Reference>
 class CFOwned {
@@ -27,7 +27,7 @@ class CFOwned {
   // Lends the object, or null.
   Reference Get() const noexcept { return mObject; }
 
-  // Hands the reference over to the caller and holds null from then on.
+  // Hands the reference over to the caller and holds null afterwards.
   [[nodiscard]] Reference Detach() noexcept { return std::exchange(mObject, nullptr); }
 
  private:

@@ -30,7 +30,7 @@ constexpr std::size_t kTextBufferSize = 1024;
 // The longest name in an HFSUniStr255, in UTF-16 units.
 constexpr CFIndex kLongestUnicodeName = sizeof(HFSUniStr255::unicode) / sizeof(UniChar);
 
-// Room for an extension that is compared, with the NUL.
+// Room for an extension to compare, with the NUL.
 constexpr std::size_t kExtensionBufferSize = 20;
 
 // Parts of st_mode.
@@ -43,15 +43,15 @@ constexpr mode_t kStickyBit = 0x200;
 constexpr std::string_view kRootPath = "/";
 constexpr std::string_view kVolumesPrefix = "/Volumes/";
 
-// What the platform may give for the folder of a bare name.
+// What the platform may return as the folder of a bare name.
 constexpr std::string_view kThisFolder = ".";
 constexpr std::string_view kThisFolderMarked = "./";
 constexpr std::string_view kFolderAbove = "..";
 
 // --- Text -------------------------------------------------------------------------------------
 
-// Copies as much of `source` as fits into `size` bytes, NUL-terminated unless `size` is 0. The
-// length of `source`.
+// Copies as much of `source` as fits into `size` bytes, NUL-terminated unless `size` is 0. Returns
+// the length of `source`.
 std::size_t CopyBounded(char* destination, char const* source, std::size_t size) {
   const std::size_t length = std::strlen(source);
   if (size > 0) {
@@ -62,12 +62,12 @@ std::size_t CopyBounded(char* destination, char const* source, std::size_t size)
   return length;
 }
 
-// Null when there is no memory.
+// Null when there is not enough memory.
 Text AllocateText(std::size_t size) {
   return Text(new (std::nothrow) char[size]);
 }
 
-// Null for null, and when there is no memory.
+// Null for null, and when there is not enough memory.
 Text CopyText(char const* source) {
   const std::size_t size = source != nullptr ? std::strlen(source) + 1 : 0;
   Text copy = source != nullptr ? AllocateText(size) : nullptr;
@@ -81,13 +81,13 @@ std::size_t LengthWithoutTrailingSlashes(char const* path) {
   return length;
 }
 
-// As in the POSIX locale, also called "C", whatever locale the program has chosen: it folds ASCII
-// alone. To have that locale takes no memory, and nothing is to be given back.
+// Compares as the POSIX locale (also called "C") does, whatever locale the program has set: it
+// folds ASCII alone. Obtaining that locale takes no memory, and it need not be freed.
 bool EqualIgnoringCase(char const* first, char const* second, std::size_t length) {
   return strncasecmp_l(first, second, length, newlocale(LC_ALL_MASK, "C", nullptr)) == 0;
 }
 
-// What follows the last "." of a name; null without one.
+// What follows the last "." of a name. Null when there is none.
 char const* ExtensionIn(char const* name) {
   char const* const dot = std::strrchr(name, '.');
   return dot == nullptr ? nullptr : dot + 1;
@@ -141,7 +141,7 @@ bool HasAbsolutePath(CFURLRef url) {
 }
 
 // The string as a path on the heap, for one that is too long for the buffer on the stack. Null when
-// it is no path or there is no memory.
+// it is not a path or there is not enough memory.
 Text LongPathOf(CFStringRef string) {
   const CFIndex size = CFStringGetMaximumSizeOfFileSystemRepresentation(string);
   if (size <= 0) return nullptr;
@@ -151,7 +151,7 @@ Text LongPathOf(CFStringRef string) {
 }
 
 // The folder and the name with "/" between them; a copy of the folder for a null name, of the name
-// for an empty folder. Null without memory for all of it.
+// for an empty folder. Null when there is not enough memory.
 CFOwned<CFMutableStringRef> FolderAndName(CFStringRef folder, CFStringRef name) {
   CFOwned<CFMutableStringRef> joined(CFStringCreateMutableCopy(kCFAllocatorDefault, 0, folder));
   if (!joined || name == nullptr) return joined;
@@ -165,7 +165,7 @@ CFOwned<CFMutableStringRef> FolderAndName(CFStringRef folder, CFStringRef name) 
 
 // --- "~" --------------------------------------------------------------------------------------
 
-// Stops the process with the report of a failed assertion, in every kind of build.
+// Aborts with the message of a failed assertion, in every kind of build.
 [[noreturn]] void StopForNullPath() {
   std::fputs(
       "Assertion failed: (path != NULL), function CreateURLByExpandingTildePath, "
@@ -174,15 +174,16 @@ CFOwned<CFMutableStringRef> FolderAndName(CFStringRef folder, CFStringRef name) 
   std::abort();
 }
 
-// Whether there is memory to look a user up. Without any for what it keeps of the first look, glibc
-// 2.36 ends the process; a block like this, given back at once, is large enough for that.
+// Whether there is enough memory to look a user up. glibc 2.36 ends the process when the first
+// lookup finds no memory for what it keeps; a block of this size, freed at once, shows that there
+// is enough.
 bool HasMemoryForUsers() {
   constexpr std::size_t kEnough = 0x4000;  // bytes
   return AllocateText(kEnough) != nullptr;
 }
 
-// The user whose name are the `length` units behind the "~"; the current one for an empty name.
-// Null for an unknown one, and without memory.
+// The user whose name is the `length` units after the "~"; the current user for an empty name. Null
+// for an unknown user, and when there is not enough memory.
 passwd const* FindUser(CFStringRef tildePath, CFIndex length) {
   const CFIndex size = CFStringGetMaximumSizeForEncoding(length, kCFStringEncodingUTF8);
   const Text name = AllocateText(static_cast<std::size_t>(size) + 1);
@@ -194,7 +195,7 @@ passwd const* FindUser(CFStringRef tildePath, CFIndex length) {
   return used == 0 ? getpwuid(getuid()) : getpwnam(name.get());
 }
 
-// What stands behind the "/" that ends the user's name; empty without one.
+// What follows the "/" that ends the user's name; empty when there is no "/".
 CFOwned<CFStringRef> RemainderBehind(CFStringRef tildePath, CFIndex slash) {
   const CFIndex length = CFStringGetLength(tildePath);
   if (slash == length) {
@@ -204,7 +205,7 @@ CFOwned<CFStringRef> RemainderBehind(CFStringRef tildePath, CFIndex slash) {
       kCFAllocatorDefault, tildePath, CFRangeMake(slash + 1, length - slash - 1)));
 }
 
-// The place of the "/" that ends the user's name, or the end of the path.
+// The position of the "/" that ends the user's name, or the end of the path.
 CFIndex EndOfUserName(CFStringRef tildePath) {
   const CFIndex length = CFStringGetLength(tildePath);
   CFRange found = {};
@@ -228,7 +229,7 @@ CFURLRef CreateURLInHomeFolder(CFStringRef tildePath, bool isDirectory) {
 
 // --- Items on disk ----------------------------------------------------------------------------
 
-// Of the item itself; false when there is none, and for null.
+// Reads the status of the item itself. Returns false when there is none, and for null.
 bool ReadStatus(char const* path, struct stat* about) {
   return path != nullptr && lstat(path, about) == 0;
 }
@@ -244,8 +245,9 @@ bool IsFolderMode(mode_t mode) {
   return (mode & kTypeMask) == kFolderType;
 }
 
-// Cuts components off an absolute path until something is there. False when that never comes: what
-// is not there and ends in "." or ".." has only "…/../.." above it, which is not there either.
+// Cuts components off an absolute path until the rest exists. Returns false when that never
+// happens: a missing item that ends in "." or ".." has only "…/../.." above it, which is missing
+// too.
 bool CutToExisting(char* path) {
   std::size_t length = std::strlen(path);
   mode_t mode = 0;
@@ -261,8 +263,8 @@ bool CutToExisting(char* path) {
   return true;
 }
 
-// The text of the link at `path`; null when it is none or cannot be read. The test is a mask, not
-// a comparison of types.
+// The text of the link at `path`. Null when it is not a link or cannot be read. The test is a mask,
+// not a comparison of types.
 Text ReadLink(char const* path) {
   struct stat about = {};
   if (!ReadStatus(path, &about) || (about.st_mode & kLinkType) != kLinkType) return nullptr;
@@ -277,14 +279,14 @@ Text ReadLink(char const* path) {
 
 // --- Records ----------------------------------------------------------------------------------
 
-// The bytes behind the name stay as they are.
+// Leaves the bytes after the name as they are.
 void Empty(FSSpec* spec) {
   spec->vRefNum = kNoVolume;
   spec->parID = kNoFolder;
   spec->name[0] = 0;
 }
 
-// False when the catalog does not tell.
+// Returns false when the catalog does not tell.
 bool ReadCatalog(FSRef const& item, FSCatalogInfoBitmap wanted, FSCatalogInfo* about) {
   return FSGetCatalogInfo(&item, wanted, about, nullptr, nullptr, nullptr) == noErr;
 }
@@ -299,7 +301,7 @@ SInt32 SignedID(unsigned long id) {
   return static_cast<SInt32>(id);
 }
 
-// The name in HFS form, bluntly cut where the record ends.
+// Stores the name in HFS form, cut off where the record ends.
 void StoreName(CFStringRef name, FSSpec* spec) {
   Str255 converted;
   GetPascalStringFromCFString(name, converted, sizeof converted);
@@ -307,7 +309,7 @@ void StoreName(CFStringRef name, FSSpec* spec) {
   std::memcpy(spec->name, converted, std::size_t{1} + converted[0]);
 }
 
-// In another order of encodings than the names have: Mac Roman has no place of its own in it.
+// Tries the encodings in another order than for names: Mac Roman has no place of its own in it.
 CFOwned<CFStringRef> StringOfHFSPath(char const* path) {
   for (const CFStringEncoding encoding : {CFileRef::mLocalEncoding, CFStringGetSystemEncoding(),
                                           CFStringEncoding{kCFStringEncodingUnicode}}) {
@@ -404,7 +406,7 @@ CFileRef::CFileRef(char const* path, bool isDirectory) : CFileRef() {
   Set(path, isDirectory);
 }
 
-// The path is read before the reference is emptied, for it may be the reference's own.
+// Reads the path before the reference is emptied, as it may be the reference's own.
 bool CFileRef::Set(char const* path, bool isDirectory) {
   const auto string = path != nullptr ? StringOfPath(path) : CFOwned<CFStringRef>();
   ReInit();
@@ -575,8 +577,8 @@ bool CFileRef::GetFileName(char* name, long size) const {
   char text[kTextBufferSize];
   if (!CFStringGetFileSystemRepresentation(component.Get(), text, sizeof text)) return false;
   const auto room = static_cast<std::size_t>(std::max(size, 0L));
-  // Without room the caller's text stays, but for the "/" at its end. With room the name overwrites
-  // it, and the caller's buffer need not be text at all.
+  // Without room the caller's text stays, except for the "/" at its end. With room the name
+  // overwrites it, and the caller's buffer need not hold text at all.
   if (room == 0 && name != nullptr) {
     for (std::size_t end = std::strlen(name); end > 0 && name[end - 1] == '/'; --end) {
       name[end - 1] = '\0';
@@ -612,7 +614,7 @@ bool CFileRef::GetExtension(std::string& extension) const {
   return true;
 }
 
-// Compares over the length of the name's extension only, so an empty one matches everything.
+// Compares only the length of the name's extension, so an empty one matches everything.
 bool CFileRef::HasExtension(std::string const& extension) const {
   char name[kTextBufferSize];
   if (extension.empty() || !GetFileName(name, sizeof name)) return false;
@@ -659,7 +661,7 @@ bool CFileRef::AddToPath(char const* component, bool isDirectory) {
   return string && AddToPath(string.Get(), isDirectory);
 }
 
-// The new URL is made from the path of the appended one, so that it is a plain URL of a file.
+// Made from the path of the appended URL, so that the new URL is a plain file URL.
 bool CFileRef::ReplaceName(CFStringRef name, bool isDirectory) {
   if (!IsValid()) return !isDirectory && Set(name, kPathStylePOSIX, false);
   const CFOwned<CFURLRef> folder(
@@ -703,8 +705,8 @@ bool CFileRef::ResolveAlias(bool allowInteraction) {
   return result == noErr && wasAliased ? Set(&target) : FollowLink();
 }
 
-// A relative text is looked at from the current folder, as it is used; a target that cannot be
-// looked at counts as a file, and so does a link.
+// A relative link text is looked up from the current folder, as it is then used; a target that
+// cannot be looked up counts as a file, and so does a link.
 bool CFileRef::FollowLink() {
   const Text target = ReadLink(GetPath());
   if (!target) return false;
@@ -715,15 +717,15 @@ bool CFileRef::FollowLink() {
 
 // --- Volume and folder ------------------------------------------------------------------------
 
-// The climb goes to the top, not just to the nearest folder that exists. A folder that cannot be
-// looked at could be the top, and what is above it on another volume.
+// Climbs to the top, not just to the nearest existing folder. A folder that cannot be examined
+// could be the top, with another volume above it.
 short CFileRef::GetVolumeRefNumber() const {
   if (!IsValid()) return kNoVolume;
   FSRef item = {};
   if (CFURLGetFSRef(mURL, &item)) return VolumeOf(item);
   CFileRef root(*this);
   if (root.GetPath() == nullptr) {
-    // What has no path can be in a folder that has one, unless all that was missing is memory.
+    // Without a path, it may still be in a folder that has one, unless only memory was missing.
     root.SetToParent();
     if (GetPath() != nullptr) return kNoVolume;
   }
@@ -736,7 +738,7 @@ short CFileRef::GetVolumeRefNumber() const {
   return root.IsValid() && CFURLGetFSRef(root.mURL, &item) ? VolumeOf(item) : kNoVolume;
 }
 
-// All that is missing is left out at once, for a path can have tens of thousands of components.
+// Skips all that is missing at once, as a path can have tens of thousands of components.
 bool CFileRef::ClimbToExisting() {
   if (IsFolder()) return true;
   const Text existing = CopyText(GetPath());
@@ -796,7 +798,7 @@ bool CFileRef::GetFSSpec(FSSpec* spec) const {
   if (UpdateInternalFSRef()) {
     return FSGetCatalogInfo(&mFSRef, kFSCatInfoNone, nullptr, nullptr, spec, nullptr) == noErr;
   }
-  // What is there all the same is no new item: its record can have another name, or another folder.
+  // It exists all the same, so it is not a new item: its record may have another name or folder.
   mode_t mode = 0;
   if (ReadMode(GetPath(), &mode) && !IsOfNoFile()) return false;
   CFileRef folder(*this);
@@ -813,7 +815,7 @@ bool CFileRef::GetFSSpec(FSSpec* spec) const {
   return true;
 }
 
-// Asked a second time, for the first time something may have been missing that looking took.
+// Looks a second time, as the first look may have lacked something that it needs, such as memory.
 bool CFileRef::IsOfNoFile() const {
   CFileRef file;
   file.Set(mURL, false);
@@ -844,13 +846,13 @@ bool CFileRef::Set(short vRefNum, long dirID, unsigned long nameLength, unsigned
     FSRef child = {};
     return FSMakeFSRefUnicode(&folder, nameLength, name, 0, &child) == noErr && Set(&child);
   }
-  // In the place of another item there can be a folder by now.
+  // By now, a folder may have taken the place of another item.
   const bool isFolder = Set(&folder) && CFURLHasDirectoryPath(mURL) && IsFolder();
   if (!isFolder) ReInit();
   return isFolder;
 }
 
-// The path is read before the reference is emptied, for it may be the reference's own.
+// Reads the path before the reference is emptied, as it may be the reference's own.
 bool CFileRef::SetFromHFSPath(char const* hfsPath, bool isFolder) {
   const auto path = hfsPath != nullptr ? StringOfHFSPath(hfsPath) : CFOwned<CFStringRef>();
   return Set(path.Get(), kPathStyleHFS, isFolder);
@@ -863,7 +865,7 @@ CFileRef::CFileRef(FSSpec const* spec, bool searchOtherVolumes, bool last) : CFi
 CFileRef::CFileRef(FSSpec const& spec, bool searchOtherVolumes, bool last)
     : CFileRef(&spec, searchOtherVolumes, last) {}
 
-// An alias that leads nowhere stays what it is.
+// An alias with a missing target is kept as it is.
 CFileRef::CFileRef(FSSpec* spec, bool searchOtherVolumes, bool last) : CFileRef() {
   if (spec == nullptr) return;
   const FSSpec wanted = BoundedFSSpec(*spec);

@@ -1,20 +1,20 @@
 // A file or folder, named by a URL.
 //
-// A reference is empty or holds one URL, which its copies share. Beside it stand three copies of
-// the same identity, filled when asked for: the POSIX path, the FSRef and the FSSpec. Queries write
-// them, so one reference belongs to one thread at a time, even for queries.
+// A reference is empty or holds one URL, which its copies share. It caches the same identity in
+// three other forms, filled in on demand: the POSIX path, the FSRef and the FSSpec. Queries write
+// these caches, so one reference belongs to one thread at a time, even for queries.
 //
-// No operation throws, logs or retries, but for what the standard library throws (no memory, a
-// std::string of no path). A setter or an edit that fails leaves the reference empty unless its
+// No operation throws, logs or retries, except that the standard library may throw (no memory, a
+// std::string without a path). A setter or an edit that fails leaves the reference empty unless its
 // comment says otherwise.
 //
-// A relative path is that of an item in the directory that was current when the URL was made; a
-// setter or an edit that makes a URL anew takes the one that is current then. Of a URL that is no
-// file's (another scheme or host) the path, the existence and the kind are those of the file with
-// its path; it has no FSRef and no node id.
+// A relative path starts at the directory that was current when the URL was made; a setter or an
+// edit that makes a new URL uses the one that is current then. For a URL that is not a file's
+// (another scheme or host), path, existence and kind are those of the file with the same path; it
+// has no FSRef and no node id.
 //
-// "Path" without more is the POSIX path in the form that the file system stores: NUL-terminated
-// bytes. Sizes are in bytes.
+// "Path" alone means the POSIX path in the form that the file system stores: NUL-terminated bytes.
+// Sizes are in bytes.
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
@@ -30,17 +30,17 @@ enum tPathStyle : UInt32 {
   kPathStyleWindows = 2,  // "C:\a\b"
 };
 
-// What stands for no volume, for no folder and for no item at all.
+// These stand for no volume, no folder and no item.
 inline constexpr SInt16 kNoVolume = 32767;
 inline constexpr SInt32 kNoFolder = -1;
 inline constexpr unsigned long kNoNode = ~0UL;
 
 class CFileRef {
  public:
-  // An empty reference, for reading only.
+  // An empty reference, to be read only.
   static const CFileRef None;
 
-  // The encoding that names in 8-bit text are tried in first; at the start 0, Mac Roman.
+  // The encoding that is tried first for names in 8-bit text; initially 0, Mac Roman.
   static CFStringEncoding mLocalEncoding;
 
   // --- Life -----------------------------------------------------------------------------------
@@ -50,22 +50,22 @@ class CFileRef {
   CFileRef& operator=(CFileRef const& source);
   ~CFileRef();
 
-  // Writes the empty state over the fields without releasing anything. REQUIRES: fresh storage.
+  // Sets the fields to the empty state without releasing anything. REQUIRES: fresh storage.
   void Init();
 
-  // Releases what is held; the reference is empty then. Two names for one operation.
+  // Releases what is held, leaving the reference empty. Two names for one operation.
   void ReInit();
   void Invalidate();
 
   // Whether a URL is held. Says nothing about the item.
   bool IsValid() const;
 
-  // Refreshes the cached FSRef. False, with the cache all zero, when there is no such item; false,
-  // with the cache as it was, for an empty reference.
+  // Refreshes the cached FSRef. Returns false with the cache all zero when there is no such item;
+  // returns false with the cache unchanged for an empty reference.
   bool UpdateInternalFSRef() const;
 
-  // Writes the item's FSRef. False for a reference without a path, for one whose path begins with
-  // "." and for an item that does not exist; the cache is not touched.
+  // Writes the item's FSRef, without touching the cache. Returns false for a reference without a
+  // path, for one whose path begins with "." and for an item that does not exist.
   bool GetFSRef(FSRef* item) const;
 
   // The cached FSRef, refreshed; all zero when there is no such item. Valid like GetPath().
@@ -74,20 +74,21 @@ class CFileRef {
 
   // --- Setting --------------------------------------------------------------------------------
   //
-  // A constructor is an empty reference and then the setter with the same arguments. A setter
-  // empties the reference, even when an argument is null (which fails), and returns whether a URL
-  // is held at the end. `isDirectory` makes the URL one of a folder; nothing is looked up on disk.
+  // A constructor makes an empty reference and calls the setter with the same arguments. A setter
+  // first empties the reference, even when an argument is null (which fails), and returns whether a
+  // URL is held in the end. `isDirectory` makes the URL that of a folder; nothing is looked up on
+  // disk.
 
   // A path; a "~" or "~user" in front of it is expanded.
   CFileRef(char const* path, bool isDirectory);
   bool Set(char const* path, bool isDirectory);
 
-  // A path in a style; "~" is expanded in the POSIX style alone.
+  // A path in a style; only the POSIX style expands "~".
   CFileRef(CFStringRef path, tPathStyle style, bool isDirectory);
   bool Set(CFStringRef path, tPathStyle style, bool isDirectory);
 
-  // The file `name` in a folder, the two joined with "/" as they are; or with a null name the
-  // folder. "~" is expanded. REQUIRES: `folder` is not null.
+  // The file `name` in a folder, the two joined with "/" as they are; with a null name, the folder.
+  // "~" is expanded. REQUIRES: `folder` is not null.
   CFileRef(CFStringRef folder, CFStringRef name);
   bool Set(CFStringRef folder, CFStringRef name);
 
@@ -98,53 +99,54 @@ class CFileRef {
   explicit CFileRef(CFURLRef url);
   bool Set(CFURLRef url);
 
-  // A new URL of the path that `url` has.
+  // A new URL with the path of `url`.
   bool Set(CFURLRef url, bool isDirectory);
 
-  // An existing item. Not this reference's own cache, which is emptied before it is read.
+  // An existing item. Must not be this reference's own cache, which is emptied before it is read.
   explicit CFileRef(FSRef const* item);
   bool Set(FSRef const* item);
 
-  // A new URL of the path that `source` has. REQUIRES: `source` is another object.
+  // A new URL with the path of `source`. REQUIRES: `source` is another object.
   bool Set(CFileRef const& source, bool isDirectory);
 
   // --- Path and state -------------------------------------------------------------------------
 
-  // The path in a style, owned by the caller. Null for an empty reference and a path that the style
-  // cannot say.
+  // The path in a style, owned by the caller. Null for an empty reference and for a path that the
+  // style cannot express.
   CFStringRef CopyFileSystemPath(tPathStyle style) const;
 
   // The absolute path without "/" at its end, except for "/". Null for an empty reference, for one
-  // with a relative path and for a path that the file system cannot store. Owned by the reference,
-  // valid until it changes or ends.
+  // with a relative path and for a path that the file system cannot store. Owned by the reference
+  // and valid until it changes or is destroyed.
   char const* GetPath() const;
   operator char const*() const;  // NOLINT(google-explicit-constructor)
 
-  // Copies the path as far as it fits, always NUL-terminated; whether all of it fits. REQUIRES:
-  // `buffer` has at least one byte, which is written even when `size` is 0.
+  // Copies as much of the path as fits, always NUL-terminated; returns whether all of it fits.
+  // REQUIRES: `buffer` has at least one byte, which is written even when `size` is 0.
   bool GetPath(char* buffer, unsigned long size) const;
 
   // Throws std::logic_error for a reference without a path.
   operator std::string() const;  // NOLINT(google-explicit-constructor)
 
-  // Whether the item is there; a link is there when its target is, or when its sticky bit is set.
+  // Whether the item exists; a link exists when its target does, or when its sticky bit is set.
   bool Exists() const;
 
-  // Whether the item itself, links not followed, is a folder; is there and anything else.
+  // Whether the item itself, links not followed, is a folder; whether it exists and is anything
+  // else.
   bool IsFolder() const;
   bool IsFile() const;
 
-  // Whether both name one item, however they spell it. Items that cannot both be found are the same
-  // when their URLs are equal. Two empty references are equal.
+  // Whether both name the same item, however they spell it. Unless both can be found, they are the
+  // same when their URLs are equal. Two empty references are equal.
   bool operator==(CFileRef const& other) const;
   bool operator!=(CFileRef const& other) const;
 
-  // Whether the other path is this one or lies below it, letter case ignored. "/" contains
+  // Whether the other path is this one or lies below it, ignoring letter case. "/" contains only
   // itself and paths that begin with "//".
   bool PathContains(CFileRef const& other) const;
 
-  // Writes the path and whether the item exists to std::cout, for debugging. The path of a
-  // reference without one leaves the stream failed.
+  // Writes the path and whether the item exists to std::cout, for debugging. A reference without a
+  // path leaves the stream in a failed state.
   void Trace() const;
 
   // Whether the workspace shows the item as one document.
@@ -152,80 +154,86 @@ class CFileRef {
 
   // --- Names and extensions -------------------------------------------------------------------
   //
-  // The Copy operations give the platform's view. For the others, the extension is what follows
-  // the last "." of the name: ".profile" has one, and "a." an empty one.
+  // The Copy operations return the platform's view. For all others, the extension is what follows
+  // the last "." of the name: that of ".profile" is "profile", that of "a." is empty.
 
   // The last component, owned by the caller; null for an empty reference or a URL without a path.
   CFStringRef CopyFileName() const;
 
-  // Copies the name as far as it fits, always NUL-terminated. True when the name has at most `size`
-  // bytes; one of exactly `size` bytes loses its last. False, with the buffer untouched, for a name
-  // beyond 1023 bytes or that no file can have. REQUIRES: `name` is not null, and NUL-terminated
-  // text when `size` is 0; that text loses the "/" at its end.
+  // Copies as much of the name as fits, always NUL-terminated. Returns true when the name has at
+  // most `size` bytes; one of exactly `size` bytes loses its last byte. Returns false, with the
+  // buffer untouched, for a name that has more than 1023 bytes or that no file can have. REQUIRES:
+  // `name` is not null; when `size` is 0, it is NUL-terminated text, which loses any "/" at its
+  // end.
   bool GetFileName(char* name, long size) const;
 
-  // Whether there is a name that a file can have, of at most 1023 bytes.
+  // Whether the reference has a name that a file can have, of at most 1023 bytes.
   bool HasValidName() const;
 
   // The platform's extension, owned by the caller; null when there is none.
   CFStringRef CopyFileExtension() const;
 
-  // Copies the extension without its ".", the rest of the buffer filled with NUL. False, with the
-  // buffer untouched, for null, for no extension, and for one that does not fit.
+  // Copies the extension without its "." and fills the rest of the buffer with NULs. Returns false,
+  // with the buffer untouched, for null, for no extension, and for one that does not fit.
   bool GetExtension(char* extension, unsigned long size) const;
 
-  // The extension without its "."; false, with the string untouched, when there is none.
+  // Stores the extension without its "."; returns false, with the string untouched, when there is
+  // none.
   bool GetExtension(std::string& extension) const;
 
-  // Whether the wanted extension, with or without a "." in front, begins with the name's, letter
-  // case ignored. False for an empty one and for a name's extension beyond 19 bytes.
+  // Whether `extension`, with or without a leading ".", begins with the name's extension, ignoring
+  // letter case. False when `extension` is empty or the name's extension has more than 19 bytes.
   bool HasExtension(std::string const& extension) const;
 
-  // Renames the reference so that its name has the extension, given with or without a "." in
-  // front. An empty one cuts the extension off with its ".", or adds a "." where there is none. The
-  // URL is then one of a file. Without a name the reference stays as it is.
+  // Renames the reference so that its name has the extension, given with or without a leading ".".
+  // An empty one removes the extension and its ".", or adds a "." where there is none. The new URL
+  // is that of a file. A reference without a name stays as it is.
   void ReplaceExtensionBy(std::string const& extension);
 
   // --- Editing --------------------------------------------------------------------------------
   //
-  // True when the reference names the new item. What is null or cannot be joined leaves a reference
-  // that holds a URL as it was; a URL that cannot be made leaves it empty. `char const*` is UTF-8.
+  // Returns true when the reference names the new item. A null argument, or one that cannot be
+  // joined, leaves a reference that holds a URL as it was; a URL that cannot be made leaves it
+  // empty. `char const*` is UTF-8.
 
-  // Adds a component, or several with "/" between them, as it stands. An empty reference takes the
-  // component for its path, "~" expanded. REQUIRES: not null when a URL is held.
+  // Appends a component, or several with "/" between them, as it stands. An empty reference takes
+  // the component as its path, with "~" expanded. REQUIRES: not null when a URL is held.
   bool AddToPath(CFStringRef component, bool isDirectory);
 
-  // Adds the other's last component, a folder if that is one. An empty reference is refused.
+  // Appends the other's last component, as a folder if it is one. An empty reference is refused.
   bool AddToPath(CFileRef const& other);
   bool AddToPath(char const* component, bool isDirectory);
 
-  // Puts a name in the place of the last component. An empty reference takes the name for its path,
-  // "~" expanded, unless `isDirectory` is set: then it is refused.
+  // Replaces the last component by a name. An empty reference takes the name as its path, with "~"
+  // expanded, unless `isDirectory` is set: then it is refused.
   bool ReplaceName(CFStringRef name, bool isDirectory);
   bool ReplaceName(CFileRef const& other);
   bool ReplaceName(char const* name, bool isDirectory);
 
-  // Names the containing folder; of "/" that is "/". Empty when it has no absolute path.
+  // Makes the reference name the containing folder; that of "/" is "/". Without an absolute path,
+  // it becomes empty.
   void SetToParent();
 
-  // Names what an alias or a symbolic link points to, one link at a time. False, with the reference
-  // as it was, when the item is neither. A relative link text becomes a relative path as it stands.
+  // Makes the reference name the target of an alias or a symbolic link, one link at a time. Returns
+  // false, with the reference as it was, when the item is neither. A relative link text becomes a
+  // relative path as it stands.
   bool ResolveAlias(bool allowInteraction);
 
   // --- Volume and folder ----------------------------------------------------------------------
   //
-  // Ids are 32 bits wide. The signed results are ids as an FSSpec holds them, so one from
-  // 0x80000000 on is negative; GetNodeID() gives the same id unsigned. Where an id is an argument
-  // its lower 32 bits count, so both forms are taken.
+  // Ids are 32 bits wide. Signed results are ids as an FSSpec holds them, so an id from 0x80000000
+  // on is negative; GetNodeID() returns the same id unsigned. Of an id argument, the lower 32 bits
+  // count, so both forms are accepted.
 
-  // The volume that has the item, or the one that would: for an item that does not exist, that of
-  // the volume root above its path. kNoVolume on failure.
+  // The volume that holds the item. For an item that does not exist, that of the nearest volume
+  // root above its path. kNoVolume on failure.
   short GetVolumeRefNumber() const;
 
-  // The id of the folder that holds the item or would; kNoFolder when that is no folder on disk.
+  // The id of the folder that holds the item, or would hold it; kNoFolder when that is not a folder
+  // on disk.
   long GetParentID() const;
 
-  // A folder's own id; for everything else GetParentID().
+  // The item's own id when it is a folder; otherwise GetParentID().
   long GetDirectoryID() const;
 
   // The id of an existing item; kNoNode on failure.
@@ -235,63 +243,64 @@ class CFileRef {
   // item itself.
   bool IsRoot() const;
 
-  // Writes the name as UTF-16. That of an existing item is the catalog's, in which ':' and '/' are
-  // exchanged; any other is the last component as it stands. False, with the record as it was, for
-  // an empty reference and for a component of more than 255 units.
+  // Writes the name as UTF-16. For an existing item, it is the catalog's name, in which ':' and '/'
+  // are exchanged; for any other, the last component as it stands. Returns false, with the record
+  // as it was, for an empty reference and for a component of more than 255 units.
   bool UnicodeFileName(HFSUniStr255* name) const;
 
   // --- FSSpec ---------------------------------------------------------------------------------
   //
-  // The empty FSSpec has kNoVolume, kNoFolder and a name of length 0. Where a record is an
-  // argument, a name length above 63 counts as 63. `last` changes nothing.
+  // The empty FSSpec has kNoVolume, kNoFolder and a name of length 0. In a record passed as an
+  // argument, a name length above 63 counts as 63. `last` has no effect.
 
-  // The record of an existing item is the File Manager's. Any other gets its name, cut to 63 bytes,
-  // and the volume and id of what stands where its folder should (the empty ones when nothing
-  // does); a file or a link there is not told from a folder. False, with the
-  // record untouched, for an empty reference; false as well for an item that the catalog refuses
-  // and for a path without a last component. A URL that is no file's, or another machine's, is that
-  // of an item that does not exist.
+  // The record of an existing item is the File Manager's. Any other item gets its name, cut to 63
+  // bytes, and the volume and id of whatever is in the place of its folder, be it a folder, a file
+  // or a link (the empty values when nothing is). Returns false, with the record untouched, for an
+  // empty reference; also returns false for an item that the catalog refuses and for a path without
+  // a last component. A URL that is not a file's, or is another machine's, counts as an item that
+  // does not exist.
   bool GetFSSpec(FSSpec* spec) const;
 
-  // The cached FSSpec, made anew with GetFSSpec(), whatever that says; valid like GetPath().
+  // The cached FSSpec, filled in anew by GetFSSpec(), whatever that returns; valid like GetPath().
   operator FSSpec const&() const;  // NOLINT(google-explicit-constructor)
   operator FSSpec const*() const;  // NOLINT(google-explicit-constructor)
 
-  // The existing item with a name of `nameLength` UTF-16 units in the folder `dirID`; with length 0
-  // the folder itself. What cannot be found leaves the reference as it was; an id that is not a
-  // folder's, with length 0, leaves it empty.
+  // The existing item with a name of `nameLength` UTF-16 units in the folder `dirID`; with length
+  // 0, the folder itself. An item that cannot be found leaves the reference as it was; with length
+  // 0, an id that is not a folder's leaves it empty.
   CFileRef(short vRefNum, long dirID, unsigned long nameLength, unsigned short const* name,
            bool last);
   bool Set(short vRefNum, long dirID, unsigned long nameLength, unsigned short const* name,
            bool last);
 
-  // An HFS path with its volume's name in front, in mLocalEncoding or the system's. Null fails.
+  // An HFS path that begins with its volume's name, in mLocalEncoding or the system's encoding.
+  // Fails for null.
   bool SetFromHFSPath(char const* hfsPath, bool isFolder);
 
-  // What CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC makes of the record; null gives an empty
-  // reference. The form for a record that is not const resolves an alias, the others do not.
+  // Sets the reference as CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC does; null gives an
+  // empty reference. Only the form for a non-const record resolves an alias.
   CFileRef(FSSpec const* spec, bool searchOtherVolumes, bool last);
   CFileRef(FSSpec const& spec, bool searchOtherVolumes, bool last);
   CFileRef(FSSpec* spec, bool searchOtherVolumes, bool last);
   bool SetFromFSSpec(FSSpec const* spec, bool searchOtherVolumes, bool last);
 
  private:
-  bool Hold(CFURLRef url);  // takes the URL over, into an empty reference; whether it is one
+  bool Hold(CFURLRef url);  // takes over the URL, into an empty reference; false for null
   bool HoldPathOf(CFURLRef url, bool isDirectory);
   bool FollowLink();
-  std::optional<bool> ReadIsRoot() const;  // none when it cannot be looked at
-  bool IsOfNoFile() const;  // whether it is not this URL that names the item at its path
-  bool ClimbToExisting();   // to the item itself if that exists; false, and empty, to none
+  std::optional<bool> ReadIsRoot() const;  // nullopt when it cannot be examined
+  bool IsOfNoFile() const;  // whether there is an item at the path that this URL does not name
+  bool ClimbToExisting();   // stays at an existing folder; false, and empty, when nothing exists
 
-  CFURLRef mURL;           // one reference of ours; null when empty
+  CFURLRef mURL;           // one reference that we own; null when empty
   UInt32 mValid;           // 1 exactly when mURL is not null; the lowest bit counts
-  mutable char* mPath;     // the path once asked for, from new[]; null before
+  mutable char* mPath;     // allocated with new[] on first use; null before
   mutable FSRef mFSRef;    // rewritten on each use; all zero when there is no such item
   mutable FSSpec mFSSpec;  // rewritten on each use
 };
 
-// The URL of a POSIX path, owned by the caller. "~" in front is the home folder of the current
-// user, "~name" that of a user; alone, or with nothing behind "/", it is a folder whatever
-// `isDirectory` says. Null for an unknown user, an empty path, or what else has no URL. The process
-// stops for a null path.
+// The URL of a POSIX path, owned by the caller. A leading "~" is the home folder of the current
+// user, "~name" that of the named user; with nothing, or only a "/", after it, the URL is a
+// folder's whatever `isDirectory` says. Null for an unknown user, an empty path, or any path
+// without a URL. Aborts for a null path.
 CFURLRef CreateURLByExpandingTildePath(CFStringRef path, bool isDirectory);

@@ -1,4 +1,4 @@
-// Apart from the rest, so that a program that traces nothing starts without the standard streams.
+// Kept apart, so that a program that traces nothing starts without the standard streams.
 #include <iostream>
 
 #include "CFileRef.h"

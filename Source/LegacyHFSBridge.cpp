@@ -13,7 +13,7 @@ namespace {
 // The id of a volume's root folder.
 constexpr SInt32 kRootFolder = 2;
 
-// The text for a name of which nothing can be said.
+// The text for a name that cannot be converted at all.
 constexpr std::string_view kConversionError = "(str_conversion_err)";
 
 // The longest text of a Pascal string, in bytes.
@@ -22,8 +22,8 @@ constexpr std::size_t kLongestPascalText = sizeof(Str255) - 1;
 // The most bytes of folder names in a full path.
 constexpr std::size_t kLongestFolderPart = 511;
 
-// What stands for the folders that a shortened path leaves out, and the first place at which a
-// colon can be behind more than that.
+// Replaces the folders that a shortened path leaves out, and the first position of a colon with
+// more than that in front of it.
 constexpr std::string_view kShortened = "...";
 constexpr std::size_t kFirstColonToCutAt = 4;
 
@@ -48,7 +48,7 @@ void ConvertWithLoss(CFStringRef name, StringPtr buffer, std::size_t room) {
   const CFIndex converted =
       CFStringGetBytes(name, CFRangeMake(0, CFStringGetLength(name)), kCFStringEncodingMacRoman,
                        '?', false, buffer + 1, static_cast<CFIndex>(room), &used);
-  // The text for an error leaves room for a NUL.
+  // The error text leaves room for a NUL.
   buffer[0] = static_cast<unsigned char>(
       converted > 0 ? static_cast<std::size_t>(used)
                     : kConversionError.copy(reinterpret_cast<char*>(buffer + 1),
@@ -61,7 +61,7 @@ bool SameName(ConstStr255Param first, ConstStr255Param second) {
 
 // --- Records ----------------------------------------------------------------------------------
 
-// The item that the record names on the first mounted volume but its own that has one.
+// Finds the record's item on the first other mounted volume that has one.
 bool FindOnOtherVolumes(FSSpec spec, FSRef* item) {
   const SInt16 ownVolume = spec.vRefNum;
   FSVolumeInfoParam volume = {};
@@ -75,8 +75,8 @@ bool FindOnOtherVolumes(FSSpec spec, FSRef* item) {
   }
 }
 
-// An HFS path as FSMakeFSSpec takes it. Its length byte counts all of the text modulo 256; of the
-// text no more is kept than that byte can tell of.
+// An HFS path as FSMakeFSSpec takes it. Its length byte is the length of the whole text modulo 256;
+// no more of the text is kept than that byte can count.
 class HFSPath {
  public:
   HFSPath(char const* folderPath, char const* name, bool joinSecond) {
@@ -117,7 +117,7 @@ class FolderPart {
   std::size_t Length() const { return kLongestFolderPart - mStart; }
   std::string_view Text() const { return {mText + mStart, Length()}; }
 
-  // Puts a folder in front; false when it does not fit.
+  // Puts a folder in front; returns false when it does not fit.
   bool Prepend(ConstStr255Param name) {
     const std::size_t size = std::size_t{1} + name[0];
     if (size > mStart) return false;
@@ -127,7 +127,7 @@ class FolderPart {
     return true;
   }
 
-  // Puts "..." in the place of the outermost folders; nothing when there is nothing to replace.
+  // Replaces the outermost folders by "..."; does nothing when there is nothing to replace.
   void Shorten() {
     const std::size_t colon = Text().find(':', kFirstColonToCutAt);
     if (colon == std::string_view::npos) return;
@@ -140,14 +140,14 @@ class FolderPart {
   std::size_t mStart = kLongestFolderPart;
 };
 
-// A folder as the catalog knows it, of one moment: something can be mounted there between two
-// questions, and the id would then be looked up on the wrong volume.
+// A folder as the catalog knew it at one moment: something could be mounted there between two
+// queries, and the id would then be looked up on the wrong volume.
 struct FolderNumbers {
   SInt16 volume;
   SInt32 id;
 };
 
-// The id is kNoFolder for what is not there.
+// The id is kNoFolder when the folder does not exist.
 FolderNumbers NumbersOf(CFileRef const& folder) {
   FSRef const& item = folder;
   FSCatalogInfo about = {};
@@ -157,7 +157,8 @@ FolderNumbers NumbersOf(CFileRef const& folder) {
   return {folder.GetVolumeRefNumber(), kNoFolder};
 }
 
-// Of the item if it is a folder, else of the folder that holds it if that is on the same volume.
+// The numbers of the item if it is a folder, else of the folder that holds it, if that is on the
+// same volume.
 FolderNumbers NumbersOfFolderOf(CFileRef const& ref) {
   if (ref.IsFolder()) return NumbersOf(ref);
   CFileRef folder(ref);
@@ -168,7 +169,7 @@ FolderNumbers NumbersOfFolderOf(CFileRef const& ref) {
   return numbers.volume == volume ? numbers : FolderNumbers{volume, kNoFolder};
 }
 
-// The folders from the one with this id up to the volume's root, which is not among them.
+// The folders from the one with this id up to the volume's root, excluding the root.
 FolderPart FoldersAbove(SInt16 volume, SInt32 folder) {
   FolderPart folders;
   Str255 name;
@@ -184,7 +185,7 @@ FolderPart FoldersAbove(SInt16 volume, SInt32 folder) {
   return folders;
 }
 
-// The name of a volume; false, with the name as it was, for an unknown one.
+// Reads the name of a volume. Returns false, with the name as it was, for an unknown one.
 bool ReadVolumeName(SInt16 volume, StringPtr name) {
   HParamBlockRec block = {};
   block.volumeParam.ioNamePtr = name;
@@ -228,7 +229,7 @@ CFMutableStringRef CreateCFStringFromPascalString(ConstStr255Param pascalName) {
   if (!name) return nullptr;
   const CFRange whole = CFRangeMake(0, length);
   CFStringFindAndReplace(name.Get(), CFSTR("/"), CFSTR(":"), whole, 0);
-  // Without memory nothing has been replaced, and a '/' would lead into another folder.
+  // When memory runs out nothing has been replaced, and a '/' would lead into another folder.
   if (CFStringFindWithOptions(name.Get(), CFSTR("/"), whole, 0, nullptr)) return nullptr;
   return name.Detach();
 }
@@ -244,7 +245,7 @@ FSSpec BoundedFSSpec(FSSpec const& spec) {
 bool CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC(CFileRef* ref, FSSpec const* spec,
                                                        bool searchOtherVolumes, bool) {
   if (ref == nullptr) return false;
-  // Read before the reference is emptied, for it may be the reference's own.
+  // Read before the reference is emptied, as the record may be the reference's own.
   const auto wanted = spec != nullptr ? std::optional(BoundedFSSpec(*spec)) : std::nullopt;
   ref->Invalidate();
   if (!wanted) return false;
@@ -260,7 +261,7 @@ bool CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC(CFileRef* ref, FSSpec con
     ref->Invalidate();
     return false;
   }
-  // The reference names what is meant, even when that has no URL; never the folder.
+  // The reference names the intended item, even when that has no URL; never the folder.
   if (hasFolder) {
     if (!ref->AddToPath(name.Get(), false)) ref->Invalidate();
   } else {
@@ -327,9 +328,9 @@ unsigned short CFileUtilMakeFullPath(CFileRef const& ref, char* path, unsigned s
   const auto fullLength = static_cast<unsigned short>(folders.Length() + volumeLength);
   if (path == nullptr) return fullLength;
 
-  // A path that cannot be made short enough is tried for ever, which callers are told to expect.
-  // Reading a volatile is an effect, without which the compiler may take the loop for one that
-  // ends.
+  // A path that cannot be made short enough keeps this loop running for ever, as callers are told
+  // to expect. Reading a volatile is a side effect; without it the compiler may assume that the
+  // loop ends.
   volatile unsigned short length = fullLength;
   while (length >= maxLength) {
     folders.Shorten();

@@ -12,9 +12,9 @@ constexpr std::size_t kContainerHead = 12;  // ten zero bytes and a lock count
 constexpr std::size_t kAtomHead = 20;
 constexpr std::size_t kCodeLength = 4;
 constexpr std::size_t kDeepest = 16;
-constexpr int kDigitsOfARate = 10;  // five before the point and what 16 bits can tell
+constexpr int kDigitsOfARate = 10;  // five before the point, and all that 16 bits can express
 
-// A leaf's data in the words of its kind.
+// A leaf's data, as text that suits its type.
 std::string Value(std::string_view type, std::string_view data) {
   if (type == "ssct") return std::string(data);
   const std::uint32_t number = BigEndian(data);
@@ -24,7 +24,7 @@ std::string Value(std::string_view type, std::string_view data) {
   return hertz.str();
 }
 
-// Adds the atoms in `atoms` and what is in them; false where they are not well formed.
+// Appends the atoms in `atoms` and their contents; returns false when they are malformed.
 bool AppendAtoms(std::string_view atoms, std::size_t depth, std::string& text) {
   if (depth == kDeepest) return false;
   while (!atoms.empty()) {

@@ -8,15 +8,15 @@
 
 namespace tallowmere::cli {
 
-// 1 as a number with 16 bits behind the point.
+// 1 as a fixed-point number with 16 bits after the point.
 inline constexpr double kFixedOne = 65536;
 
-// The big-endian number in the last four of the bytes.
+// The big-endian number in the last four bytes.
 std::uint32_t BigEndian(std::string_view bytes);
 
-// A line for each atom, indented by two spaces for each atom around it: its type, and a leaf's data
-// in the words of its kind. None for what is no container, and where more than 16 atoms lie within
-// each other, as in no settings.
+// One line for each atom, indented by two spaces per enclosing atom: its type and, for a leaf, its
+// data. Nullopt when the bytes are not a container, and when atoms are nested more than 16 deep, as
+// in no settings.
 std::optional<std::string> TextOfAtoms(std::string_view container);
 
 }  // namespace tallowmere::cli

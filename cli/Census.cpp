@@ -18,7 +18,7 @@
 namespace tallowmere::cli {
 namespace {
 
-// The parent id of what is on no volume; no item has it.
+// The parent id of an item on no volume; never an item's own id.
 constexpr std::int32_t kParentOnNoVolume = 3;
 
 constexpr const char* kAnyItem = "/any";
@@ -32,17 +32,18 @@ bool IsAt(const std::string& path, const struct stat& item) {
   return lstat(path.c_str(), &found) == 0 && IsSame(found, item);
 }
 
-// Asks one service for the record of each item and another one for the path of that record.
+// Asks one service for the record of each item and another for the path of that record.
 class Census {
  public:
   Census(const ClientOptions& options, bool isJson)
       : mRecords(options), mPaths(options), mIsJson(isJson) {}
 
-  // Whether the services still answer.
+  // Returns whether the services still answer.
   bool Count(const std::string& path, const struct stat& item, double done) {
     ++mItems;
     auto trouble = TroubleWith(path);
-    // Whoever moves an item, or a folder above it, between the two questions spoils the answer.
+    // Asks again, as somebody may have moved the item, or a folder above it, between the two
+    // questions.
     if (trouble && IsAt(path, item)) trouble = TroubleWith(path);
     if (mFailure) return false;
     if (!trouble) {
@@ -56,8 +57,8 @@ class Census {
     return true;
   }
 
-  // Whether a folder that was just seen is on a volume: what is in one that is on none has no
-  // record, or one that leads nowhere.
+  // Whether a folder that was just seen is on a volume. If it is not, its items have no record, or
+  // one that leads nowhere.
   bool IsOnVolume(const std::string& path, const struct stat& folder) {
     const auto record = mRecords.GetFSSpec((path == "/" ? "" : path) + kAnyItem);
     if (!record) Fail(record.Failure());
@@ -70,7 +71,7 @@ class Census {
     Print(path, "left out, " + reason);
   }
 
-  // The program's exit status.
+  // Returns the program's exit status.
   int Finish() {
     mBar.Hide();
     if (mFailure) return Complain(mFailure->message);
@@ -85,7 +86,7 @@ class Census {
   }
 
  private:
-  // Why the item did not come back, if so.
+  // The reason why the item did not come back; nullopt when it did.
   std::optional<std::string> TroubleWith(const std::string& path) {
     const auto record = mRecords.GetFSSpec(path);
     if (!record) return Fail(record.Failure());

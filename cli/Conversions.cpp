@@ -15,7 +15,7 @@ constexpr const char* kNoRecord =
     "hexadecimal digits";
 constexpr const char* kNotMacRoman = "it has a character that HFS names cannot have";
 
-// The usual handler: the answer, or why there is none.
+// The usual handler: reports the answer, or why there is none.
 template <class Value>
 std::function<void(Result<std::optional<Value>>)> Tell(const std::string& item, Report& report,
                                                        std::function<void(const Value&)> answer,
@@ -28,7 +28,7 @@ std::function<void(Result<std::optional<Value>>)> Tell(const std::string& item, 
   };
 }
 
-// The handler of what gives a path.
+// The handler for answers that are paths.
 std::function<void(Result<std::optional<std::string>>)> TellPath(
     const std::string& item, Report& report, std::function<std::string()> whyNone) {
   return Tell<std::string>(

@@ -16,10 +16,10 @@ namespace {
 struct Identity {
   FSSpec spec;
   std::string hfsPath;
-  std::optional<std::string> wayBack;  // where the record leads
+  std::optional<std::string> wayBack;  // the path that the record leads to
 };
 
-// None for what has no record.
+// Nullopt when the path has no record.
 Result<std::optional<Identity>> Identify(Client& client, const std::string& path) {
   auto spec = client.GetFSSpec(path);
   if (!spec) return spec.Failure();

@@ -19,7 +19,7 @@ std::size_t SizeOfInput() {
   return isFile ? static_cast<std::size_t>(about.st_size) : 0;
 }
 
-// Whether a read would not wait, after `milliseconds` at the latest; -1 is for ever.
+// Waits at most `milliseconds`, -1 for ever; returns whether a read would not block.
 bool HasInput(int milliseconds) {
   pollfd input{STDIN_FILENO, POLLIN, 0};
   return poll(&input, 1, milliseconds) != 0;
@@ -59,7 +59,7 @@ std::optional<double> Items::Done() const {
   return static_cast<double>(mNext) / static_cast<double>(all);
 }
 
-// Reads a piece behind what has not been taken; false at the end.
+// Reads a piece into the buffer, after what has not been taken; returns false at the end.
 bool Items::Fill(const std::function<void()>& beforeWaiting) {
   mBuffer.erase(0, std::exchange(mTaken, 0));
   std::array<char, kPiece> piece;

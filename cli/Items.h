@@ -1,5 +1,5 @@
-// The items that a command is about: its arguments, or with the one argument "-" the lines of
-// standard input.
+// The items of a command: its arguments, or, with "-" as the only argument, the lines of standard
+// input.
 #pragma once
 
 #include <cstddef>
@@ -12,17 +12,17 @@ namespace tallowmere::cli {
 
 class Items {
  public:
-  // `separator` ends an item of standard input; the last one may lack it.
+  // `separator` ends each item on standard input; it is optional after the last one.
   Items(std::vector<std::string> arguments, char separator);
 
-  // The next one, or none at the end. `beforeWaiting` is called before each wait for whoever writes
-  // to standard input.
+  // The next item, or nullopt at the end. `beforeWaiting` is called before each wait for more
+  // standard input.
   std::optional<std::string> Next(const std::function<void()>& beforeWaiting);
 
-  // How much of it lies behind, 0 to 1; none where nobody can tell.
+  // How much has been taken, 0 to 1. Nullopt when that is unknown.
   std::optional<double> Done() const;
 
-  // The error number of a read that failed, which is an end; 0 without one.
+  // The error number of a failed read, which counts as the end; 0 without one.
   int ReadError() const { return mReadError; }
 
  private:
@@ -31,10 +31,10 @@ class Items {
   std::vector<std::string> mArguments;
   char mSeparator;
   bool mFromInput;
-  std::size_t mNext = 0;   // of the arguments, or the bytes taken from standard input
-  std::size_t mSize = 0;   // of standard input where it is a file, in bytes
+  std::size_t mNext = 0;   // index of an argument, or bytes taken from standard input
+  std::size_t mSize = 0;   // of standard input when it is a file, in bytes
   std::string mBuffer;     // read from standard input
-  std::size_t mTaken = 0;  // of the buffer
+  std::size_t mTaken = 0;  // bytes of mBuffer
   int mReadError = 0;
 };
 

@@ -1,4 +1,4 @@
-// Paths as a person gives them.
+// Paths as a person enters them.
 #pragma once
 
 #include <optional>
@@ -6,15 +6,15 @@
 
 namespace tallowmere::cli {
 
-// The path from the root, without slashes at its end and with the links on the way resolved where
-// they lead somewhere: the service takes a link in the last place but one for a folder itself.
-// REQUIRES: not empty.
+// The absolute path, without slashes at its end. Links before the last component are resolved where
+// they lead somewhere, because the service would take a link in place of the item's folder for a
+// folder itself. REQUIRES: the path is not empty.
 std::string AbsolutePath(const std::string& path);
 
-// The folder that a path leads to, all links resolved; none where there is none.
+// The folder that a path leads to, all links resolved. Nullopt when it is not a folder.
 std::optional<std::string> FolderAt(const std::string& path);
 
-// Whether a folder is there; a link to one is none.
+// Whether there is a folder at a path; a link to one does not count.
 bool IsFolder(const std::string& path);
 
 }  // namespace tallowmere::cli

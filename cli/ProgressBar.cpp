@@ -15,7 +15,7 @@ constexpr int kWidth = 40;  // characters
 constexpr auto kFirstPause = std::chrono::milliseconds(500);
 constexpr auto kPause = std::chrono::milliseconds(200);
 
-// Back to the first column, and the line erased from there (ECMA-48, "EL").
+// Moves to the first column and erases the line from there (ECMA-48, "EL").
 constexpr const char* kStartAgain = "\r\x1B[K";
 
 }  // namespace

@@ -1,4 +1,4 @@
-// A bar on standard error while something long goes on; nothing where that is no terminal.
+// A progress bar on standard error; does nothing when that is not a terminal.
 #pragma once
 
 #include <chrono>
@@ -14,11 +14,11 @@ class ProgressBar {
   ProgressBar& operator=(const ProgressBar&) = delete;
   ~ProgressBar() { Hide(); }
 
-  // Draws the part that is done, 0 to 1, where that is known, and a text behind it, a few times a
-  // second at the most. Nothing is drawn in the first half second: short work needs no bar.
+  // Draws the part that is done, 0 to 1, if known, followed by a text, at most a few times a
+  // second. Draws nothing in the first half second: short work needs no bar.
   void Show(std::optional<double> done, const std::string& text);
 
-  // Takes the bar away until it is next shown, for a line of output.
+  // Removes the bar until it is next shown, to make way for a line of output.
   void Hide();
 
  private:

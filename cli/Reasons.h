@@ -9,16 +9,16 @@ namespace tallowmere::cli {
 
 inline constexpr const char* kEmptyItem = "an empty text names nothing";
 
-// Of an item that has no record.
+// Why an item has no record.
 std::string WhyNoRecord(const std::string& path);
 
-// Of an item that has no HFS name or HFS path.
+// Why an item has no HFS name or HFS path.
 std::string WhyNoName(const std::string& path);
 
-// Of a record that leads nowhere. `client` is not one whose answer is awaited.
+// Why a record leads nowhere. REQUIRES: no answer of `client` is awaited.
 std::string WhyNoPath(Client& client, const FSSpec& spec);
 
-// Of an HFS path, in Mac Roman, that leads nowhere.
+// Why an HFS path, in Mac Roman, leads nowhere.
 std::string WhyNoPath(Client& client, const std::string& hfsPath);
 
 }  // namespace tallowmere::cli

@@ -1,5 +1,5 @@
-// What a command has found out of its items, printed as text or as JSON: one line, or with --null
-// one NUL-terminated text, for each item, in their order.
+// A command's findings about its items, printed as text or as JSON: one line for each item, or with
+// --null one NUL-terminated text, in the items' order.
 #pragma once
 
 #include <functional>
@@ -21,8 +21,8 @@ struct Format {
   char Separator() const { return isNullTerminated ? '\0' : '\n'; }
 };
 
-// Puts bytes under a key: as text, and where they are no UTF-8 with U+FFFD for the bytes that are
-// none and all of them in hexadecimal under "KEY_hex".
+// Stores bytes under a key, as text. Where they are not UTF-8, the text has U+FFFD for each invalid
+// byte, and "KEY_hex" holds all bytes in hexadecimal.
 void Put(Json& json, const std::string& key, std::string_view bytes);
 
 class Report {
@@ -30,19 +30,19 @@ class Report {
   // `key` is that of the item itself in JSON.
   Report(Format format, std::string key);
 
-  // `item` has an answer: `text`, or what `fill` puts behind the item.
+  // Reports the answer for `item`: `text`, or in JSON what `fill` adds to the item's object.
   void Answer(std::string_view item, std::string_view text, const std::function<void(Json&)>& fill);
 
-  // `item` has none: the reason goes to standard error, or into its JSON object.
+  // Reports that `item` has no answer: the reason goes to standard error, or into its JSON object.
   void Fail(std::string_view item, std::string_view reason);
 
-  // Shows how far the work has come, where the answers themselves do not.
+  // Shows the progress, unless the answers themselves show it.
   void ShowProgress(std::optional<double> done);
 
-  // Whether the output can be written.
+  // Whether the output can still be written.
   bool GoesOn() const;
 
-  // The program's exit status when all has been printed.
+  // Returns the program's exit status once everything has been printed.
   int Finish();
 
  private:

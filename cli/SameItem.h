@@ -1,12 +1,13 @@
-// Whether two paths lead to one item.
+// Whether two paths lead to the same item.
 #pragma once
 
 #include <string>
 
 namespace tallowmere::cli {
 
-// Whether two absolute paths lead to the same item now, the last link of each not followed. By its
-// number, and on a file system where two items can have one number by its canonical path as well.
+// Whether two absolute paths lead to the same item now, without following a link as the last
+// component. Compares inode numbers and, on a file system where two items can share one, canonical
+// paths as well.
 bool IsSameItem(const std::string& first, const std::string& second);
 
 }  // namespace tallowmere::cli

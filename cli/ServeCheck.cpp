@@ -13,7 +13,7 @@ namespace {
 constexpr const char* kRoot = "/";
 constexpr std::int16_t kVolumeOfRoot = 0;
 
-// What was found out so far, for the requests behind it.
+// What earlier checks have found out, for later ones.
 struct Findings {
   std::string volumeName;
   std::int16_t volume = 0;
@@ -21,14 +21,14 @@ struct Findings {
   std::string fullPath;
 };
 
-// A request and what has to be right about its answer: empty, or what is wrong.
+// A request, and a check of its answer that returns what is wrong with it, or an empty text.
 struct Check {
   int code;
   const char* what;
   std::function<std::string(Client&, Findings&)> run;
 };
 
-// Keeps the answer in `found`; what is wrong when there is none.
+// Keeps the answer in `found`; returns what is wrong when there is none.
 template <class Value>
 std::string Keep(const Result<std::optional<Value>>& answer, Value& found) {
   if (!answer) return answer.Failure().message;
@@ -37,7 +37,7 @@ std::string Keep(const Result<std::optional<Value>>& answer, Value& found) {
   return {};
 }
 
-// What is wrong when the answer is not `wanted`.
+// Returns what is wrong unless the answer is `wanted`.
 template <class Value>
 std::string Compare(const Result<std::optional<Value>>& answer, const Value& wanted) {
   Value found{};
@@ -119,7 +119,7 @@ int CheckService(const ClientOptions& options, bool isJson) {
     }
     if (!wrong.empty()) {
       status = kFailed;
-      break;  // what follows rests on it
+      break;  // later checks depend on it
     }
   }
   if (!isJson) table.Print(std::cout);

@@ -17,7 +17,7 @@ class Table {
 
   explicit Table(std::vector<Column> columns);
 
-  // As many texts as there are columns, fit for a terminal.
+  // REQUIRES: one text for each column, safe for a terminal.
   void Add(std::vector<std::string> row);
 
   bool IsEmpty() const { return mRows.empty(); }

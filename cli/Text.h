@@ -7,14 +7,14 @@
 
 namespace tallowmere::cli {
 
-// The text with each byte of a control character, and each that is not UTF-8, as a backslash and
-// three octal digits, so that no name can break a table or steer a terminal.
+// The text with each byte of a control character, and each that is not UTF-8, written as a
+// backslash and three octal digits, so that no name can break a table or control a terminal.
 std::string Printable(std::string_view text);
 
 // The text with U+FFFD for each byte that is not UTF-8.
 std::string Utf8OfAnyBytes(std::string_view bytes);
 
-// How many characters the UTF-8 text has.
+// The number of characters in a UTF-8 text.
 std::size_t CharacterCount(std::string_view text);
 
 }  // namespace tallowmere::cli

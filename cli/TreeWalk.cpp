@@ -17,7 +17,7 @@ struct CloseFolder {
   void operator()(DIR* folder) const { closedir(folder); }
 };
 
-// None when the folder cannot be read, with the reason in errno.
+// Returns nullopt and sets errno when the folder cannot be read.
 std::optional<std::vector<std::string>> NamesIn(const std::string& path) {
   const std::unique_ptr<DIR, CloseFolder> folder(opendir(path.c_str()));
   if (!folder) return std::nullopt;
@@ -57,8 +57,8 @@ class Walk {
     double share;  // of the whole walk
   };
 
-  // Half-way down a tree nobody knows how much is left of it: each folder of a folder counts as
-  // much as the next, and as much as the items beside them.
+  // An estimate, as nobody knows how much of the tree is left: each subfolder counts as much as any
+  // other, and as much as all items beside them.
   bool Read(const Folder& folder) {
     const auto names = NamesIn(folder.path);
     if (!names) {
@@ -74,7 +74,7 @@ class Walk {
     return true;
   }
 
-  // Whether the walk goes on.
+  // Returns whether the walk goes on.
   bool Look(const std::string& path, std::optional<dev_t> deviceOfFolder) {
     struct stat status {};
     if (lstat(path.c_str(), &status) != 0) {
@@ -105,8 +105,8 @@ class Walk {
   }
 
   const TreeVisitor& mVisitor;
-  std::vector<Folder> mPending;  // the last one is next
-  std::vector<Folder> mFound;    // in the folder in hand
+  std::vector<Folder> mPending;  // the last one is visited next
+  std::vector<Folder> mFound;    // in the current folder
   double mShareOfEach = 1;
   double mDone = 0;
 };

@@ -1,6 +1,6 @@
-// Every item of a folder that lstat can see, whatever its kind, the folder itself first.
+// Visits every item in a folder that lstat can see, whatever its kind, the folder itself first.
 //
-// The folders of kernel interfaces (proc, sysfs, ...) are items too, what is in them is left out.
+// Folders of kernel interfaces (proc, sysfs, ...) are visited, but their contents are left out.
 #pragma once
 
 #include <sys/stat.h>
@@ -11,13 +11,14 @@
 namespace tallowmere::cli {
 
 struct TreeVisitor {
-  // An item, and how much of the walk lies behind it, 0 to 1: an estimate that never falls. False
-  // ends the walk.
+  // Called for each item with the part of the walk that is done, 0 to 1, an estimate that never
+  // falls. Returning false ends the walk.
   std::function<bool(const std::string& path, const struct stat& status, double done)> item;
-  // Whether a folder is on a volume, asked of the first one and of each on another device than the
-  // folder that holds it.
+  // Whether a folder is on a volume. Called for the first folder and for each on another device
+  // than its parent.
   std::function<bool(const std::string& path, const struct stat& status)> isOnVolume;
-  // What could not be looked at, and why, in a few words. Not called for what has vanished.
+  // Called for what could not be examined, with the reason in a few words; not for what has
+  // vanished.
   std::function<void(const std::string& path, const std::string& reason)> leftOut;
 };
 

@@ -19,12 +19,12 @@ namespace {
 
 using namespace tallowmere::cli;
 
-// Without privilege a request can take a pass over a whole volume.
+// Without privilege, a request can take a pass over a whole volume.
 constexpr double kSecondsForARequest = 600;
 
 const std::string kHelpTells = "--help tells more";
 
-// What the arguments say.
+// The parsed arguments.
 struct Arguments {
   double seconds = kSecondsForARequest;
   ItemsToAsk items;
@@ -43,7 +43,7 @@ std::optional<double> ReadNumber(const std::string& text) {
   return number;
 }
 
-// Checks of numbers: empty, or what is wrong.
+// Checks of numbers: return what is wrong, or an empty text.
 std::string CheckTime(const std::string& text) {
   const auto seconds = ReadNumber(text);
   return seconds && *seconds > 0 ? "" : text + " is no time above 0";

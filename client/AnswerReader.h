@@ -1,7 +1,7 @@
-// The fields of one answer, taken one after the other from the bytes that have arrived.
+// Reads the fields of one answer, in order, from the bytes that have arrived.
 //
-// When bytes are missing or are not what the protocol knows, that field and all that follow are
-// zeros and empty, and the reader says so at the end.
+// When bytes are missing or violate the protocol, that field and all that follow are zero or empty,
+// and the reader reports it at the end.
 #pragma once
 
 #include <tallowmere/Types.h>
@@ -15,7 +15,7 @@ namespace tallowmere {
 
 class AnswerReader {
  public:
-  // REQUIRES: the bytes outlive the reader. More may follow the answer.
+  // REQUIRES: the bytes outlive the reader. They may extend beyond the answer.
   explicit AnswerReader(std::string_view bytes) : mBytes(bytes) {}
 
   template <class Number>
@@ -31,31 +31,31 @@ class AnswerReader {
 
   std::string_view TakeBytes(std::size_t size);
 
-  // Counted bytes that end with their only NUL, without it; empty when there are none.
+  // Counted bytes that end in their only NUL, without it; empty when the count is 0.
   std::string TakeString();
 
-  // What stands before the first NUL of a buffer, which has one.
+  // The bytes before the first NUL of a buffer. A buffer without a NUL is refused.
   std::string TakeBuffer(std::size_t size);
 
-  // A record; its name is within its bounds.
+  // A record, whose name is within its bounds.
   FSSpec TakeSpec();
 
   void TakeTrailer();
 
-  // Refuses the answer. `fault` is a sentence that outlives the reader.
+  // Rejects the answer. REQUIRES: `fault` is a sentence that outlives the reader.
   void Refuse(std::string_view fault = "the service's answer is not what the protocol says");
 
-  // Why this is no answer; empty when nothing is wrong so far.
+  // Why this is not an answer; empty when nothing is wrong so far.
   std::string_view Fault() const { return mFault; }
 
-  // Whether everything that was asked for was there.
+  // Whether every field that was asked for has arrived.
   bool IsWhole() const { return mFault.empty() && mNeeded == 0; }
 
-  // Of how many bytes, from the answer's first one, there must be more than there are now.
-  // REQUIRES: neither whole nor at fault.
+  // The number of bytes, counted from the answer's first, that must arrive before it is worth
+  // reading again. REQUIRES: neither whole nor at fault.
   std::size_t Needed() const { return mNeeded; }
 
-  // How many bytes the answer has. REQUIRES: IsWhole().
+  // The size of the answer in bytes. REQUIRES: IsWhole().
   std::size_t Size() const { return mUsed; }
 
  private:

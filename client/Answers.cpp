@@ -7,7 +7,7 @@
 namespace tallowmere::answer {
 namespace {
 
-// Far above what any settings need; what claims to be more is no size.
+// Far more than any settings need; a larger size is invalid.
 constexpr std::uint32_t kMostSettings = 1 << 20;
 
 std::optional<std::string> NoneIfEmpty(bool isThere, std::string text) {

@@ -56,7 +56,7 @@ Result<T> Client::Ask(const Request<T>& request) {
   return *std::move(answer);
 }
 
-// What the requests are answered with, and no other type.
+// The types of answers to requests; there are no others.
 #define TALLOWMERE_ANSWERED_WITH(...)                                                       \
   template void Batch::Add(const Request<__VA_ARGS__>&,                                     \
                            std::type_identity_t<std::function<void(Result<__VA_ARGS__>)>>); \

@@ -1,4 +1,5 @@
-// Bytes that are added behind and taken in front, each moved a bounded number of times.
+// A queue of bytes: appended at the end, removed at the front, each moved a bounded number of
+// times.
 #pragma once
 
 #include <cstddef>
@@ -11,11 +12,11 @@ class ByteQueue {
  public:
   std::string_view View() const { return std::string_view(mBytes).substr(mBegin); }
 
-  // After it, as many bytes can be appended without memory.
+  // Afterwards, this many bytes can be appended without allocating memory.
   void Reserve(std::size_t size) { mBytes.reserve(mBytes.size() + size); }
   void Append(std::string_view bytes) { mBytes.append(bytes); }
 
-  // Takes the first bytes away. REQUIRES: there are as many.
+  // Removes the first bytes. REQUIRES: there are that many.
   void Drop(std::size_t size) {
     mBegin += size;
     if (mBegin < mBytes.size() - mBegin) return;

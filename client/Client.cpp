@@ -11,15 +11,15 @@
 namespace tallowmere {
 namespace {
 
-// What is left of folders that have been shortened as far as they can be: "...:", or a first folder
-// that is no longer than that.
+// The length of folders that have been shortened as far as they can be: "...:", or a first folder
+// no longer than that.
 constexpr std::size_t kShortestFolders = 4;
 
 std::string_view VolumeNameOf(std::string_view fullPath) {
   return fullPath.substr(0, fullPath.find(protocol::kSeparator));
 }
 
-// Whether the full path comes to an end when it is shortened for a buffer of `size` bytes.
+// Whether shortening the full path for a buffer of `size` bytes ever ends.
 bool CanBeShortened(const answer::FullPath& whole, std::size_t size) {
   const std::size_t volume = VolumeNameOf(whole.text).size() + 1;
   return volume + std::min<std::size_t>(whole.wholeLength - volume, kShortestFolders) < size;

@@ -15,17 +15,17 @@ namespace {
 using std::chrono::milliseconds;
 using std::chrono::steady_clock;
 
-// How much is under way at the most; a question that is larger than that goes alone.
+// The most questions and bytes under way; a question larger than that goes alone.
 constexpr std::size_t kMostQuestions = 256;
 constexpr std::size_t kMostBytes = 65536;
 
-// A piece that is worth a write while more is to come.
+// With more to come, a smaller piece is not worth a write.
 constexpr std::size_t kPieceToSend = 4096;
 
 constexpr std::size_t kPieceToReceive = 16384;
 
-// While the service has so many questions, its answers gather for a time: to be woken for each of
-// them would cost more than the answer.
+// While the service has this many questions, answers are left to gather for a while: waking up for
+// each of them would cost more than the answer.
 constexpr std::size_t kManyQuestions = kMostQuestions / 2;
 constexpr std::chrono::microseconds kTimeToGather{200};
 
@@ -62,15 +62,16 @@ void Conversation::Abandon() {
   mRequests.Clear();
 }
 
-// Takes the conversation on by a step, however long that takes. REQUIRES: a question is pending.
+// Advances the conversation by one step, waiting as long as that takes. REQUIRES: a question is
+// pending.
 void Conversation::Advance() {
   if (Step()) return;
   if (mPending.size() >= kManyQuestions) std::this_thread::sleep_for(kTimeToGather);
   Wait();
 }
 
-// The same without waiting; false when there is nothing to do but wait. The owner of a question is
-// called last: what it throws leaves nothing half done.
+// The same without waiting; returns false when there is nothing to do but wait. The owner of a
+// question is called last, so an exception from it leaves nothing half done.
 bool Conversation::Step() {
   if (HandOver()) return true;
   if (mOptions.deadline.count() <= 0) {
@@ -84,7 +85,8 @@ bool Conversation::Step() {
   return Receive() || Send();
 }
 
-// Hands over the first answer or why there is none; false when too little is known for either.
+// Hands over the first answer, or the reason why there is none; returns false when neither is known
+// yet.
 bool Conversation::HandOver() {
   const std::string_view received = mReceived.View();
   Pending& first = mPending.front();
@@ -172,7 +174,7 @@ Conversation::Pending Conversation::TakeFirst() {
   return first;
 }
 
-// Those behind the first one will be asked of a new service.
+// The questions after the first are asked again of a new service.
 void Conversation::FailFirst(const Error& error) {
   EndService();
   TakeFirst().question->Fail(error);

@@ -1,8 +1,8 @@
-// What is said to the service and what it says: questions are sent in the order in which they are
-// put, and their answers handed over in that order.
+// The exchange with the service: questions are sent in the order in which they are put, and their
+// answers are handed over in the same order.
 //
 // Nothing here waits for one pipe alone, so a service that answers while it is being asked cannot
-// bring the two to a stop.
+// cause a deadlock.
 #pragma once
 
 #include <tallowmere/Client.h>
@@ -23,7 +23,7 @@ namespace tallowmere {
 
 class AnswerReader;
 
-// Waits for one answer, of whatever type.
+// Waits for one answer, whatever its type.
 class Question {
  public:
   Question() = default;
@@ -31,10 +31,11 @@ class Question {
   Question& operator=(const Question&) = delete;
   virtual ~Question() = default;
 
-  // Reads and keeps the answer, up to the trailer. Called again when it was not whole.
+  // Reads and keeps the answer, up to the trailer. Called again when the answer was not whole.
   virtual void Read(AnswerReader& answer) = 0;
 
-  // Hands over the answer that was read last. Each may throw what the question's owner throws.
+  // Answer hands over the answer that was read last, Fail the reason why there is none. Both may
+  // throw what the question's owner throws.
   virtual void Answer() = 0;
   virtual void Fail(const Error& error) = 0;
 };
@@ -43,20 +44,20 @@ class Conversation {
  public:
   explicit Conversation(ClientOptions options) : mOptions(std::move(options)) {}
 
-  // Puts a question behind the others. Nothing is sent for one without bytes, which has its answer
-  // already. When enough are under way, this hands over answers until half of them are. What that
-  // throws leaves Put, the question is put nevertheless.
+  // Queues a question. One without bytes is not sent: it has its answer already. When enough are
+  // under way, hands over answers until half of them are left. An exception from that leaves Put,
+  // with the question queued nevertheless.
   void Put(std::string_view bytes, std::unique_ptr<Question> question);
 
-  // Hands over all answers.
+  // Waits for all answers and hands them over.
   void Finish();
 
-  // Forgets what has not been answered.
+  // Drops every question that has not been answered.
   void Abandon();
 
  private:
   struct Pending {
-    std::size_t size;  // of its bytes
+    std::size_t size;  // of its request, in bytes
     std::unique_ptr<Question> question;
   };
 
@@ -74,11 +75,11 @@ class Conversation {
   ClientOptions mOptions;
   std::optional<ServiceProcess> mService;
   std::deque<Pending> mPending;  // not answered yet
-  ByteQueue mRequests;           // their bytes
-  std::size_t mSent = 0;         // of those, to the service that is running now
-  ByteQueue mReceived;           // what follows the last answer
-  std::size_t mNeeded = 1;       // with fewer bytes received there is no answer
-  // When the first one was first sent, or the one before it answered.
+  ByteQueue mRequests;           // their requests
+  std::size_t mSent = 0;         // bytes of mRequests sent to the running service
+  ByteQueue mReceived;           // bytes after the last answer
+  std::size_t mNeeded = 1;       // no answer is complete with fewer bytes received
+  // When the first question was first sent, or the one before it answered, if later.
   std::chrono::steady_clock::time_point mFirstSince;
 };
 

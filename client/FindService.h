@@ -1,11 +1,12 @@
-// Where the service's program is.
+// Finds the service's program.
 #pragma once
 
 #include <string>
 
 namespace tallowmere {
 
-// "tallowmere" beside this process's own program, else on PATH; empty when it is in neither place.
+// "tallowmere" in the folder of this process's own program, else on PATH; empty when it is in
+// neither.
 std::string FindService();
 
 }  // namespace tallowmere

@@ -11,11 +11,11 @@
 
 namespace tallowmere::request {
 
-// The longest buffer in bytes, which every full path fits into.
+// The longest buffer in bytes; every full path fits into it.
 inline constexpr std::uint16_t kLongestFullPathBuffer = protocol::kLongestHFSName;
 
-// REQUIRES: the path fits into `size` bytes, if need be shortened; the service is busy with it for
-// ever otherwise. At most kLongestFullPathBuffer.
+// REQUIRES: the path fits into `size` bytes, shortened if necessary, as the service is otherwise
+// busy with it for ever; at most kLongestFullPathBuffer.
 Request<answer::FullPath> FullPathInBuffer(std::string_view path, std::uint16_t size,
                                            bool keepFolders);
 

@@ -10,14 +10,15 @@
 namespace tallowmere {
 namespace {
 
-constexpr std::size_t kFieldOfMountPoint = 4;  // behind mount id, parent id, device and root
+constexpr std::size_t kFieldOfMountPoint = 4;  // after mount id, parent id, device and root
 constexpr std::size_t kDigitsOfAnEscape = 3;
 
 bool IsOctalDigit(char c) {
   return c >= '0' && c <= '7';
 }
 
-// Takes the text up to the next `separator` off the front of `rest`.
+// Removes the text up to the next `separator`, and the separator, from the front of `rest`; returns
+// the text.
 std::string_view TakeUntil(std::string_view& rest, char separator) {
   const std::size_t end = rest.find(separator);
   const std::string_view taken = rest.substr(0, end);
@@ -25,7 +26,7 @@ std::string_view TakeUntil(std::string_view& rest, char separator) {
   return taken;
 }
 
-// A space, tab, newline, backslash or '#' stands as a backslash and three octal digits.
+// A space, tab, newline, backslash or '#' is written as a backslash and three octal digits.
 std::string Unescape(std::string_view text) {
   std::string plain;
   while (!text.empty()) {

@@ -1,4 +1,4 @@
-// The kernel's table of mounts, as far as a client needs it: proc_pid_mountinfo(5).
+// The parts of the kernel's mount table that a client needs: proc_pid_mountinfo(5).
 #pragma once
 
 #include <string>
@@ -9,10 +9,10 @@ namespace tallowmere {
 
 // Every path at which something is mounted, once each: "/" first, then in the kernel's order. Of
 // several mounts at one path the last one counts, as it covers the others. Malformed lines are
-// passed over. "/" alone for an empty text.
+// skipped. Just "/" for an empty text.
 std::vector<std::string> MountPointsIn(std::string_view mountInfo);
 
-// The mount points of this process; "/" alone where there is no /proc.
+// The mount points of this process; just "/" where there is no /proc.
 std::vector<std::string> ReadMountPoints();
 
 }  // namespace tallowmere

@@ -14,12 +14,12 @@ namespace {
 // The longest text that a counted string can hold with its NUL, in bytes.
 constexpr std::size_t kLongestText = std::numeric_limits<std::uint16_t>::max() - 1;
 
-// Whether a C string can carry the text whole.
+// Whether a C string can carry the whole text.
 bool CanBeText(std::string_view text, std::size_t longest = kLongestText) {
   return text.size() <= longest && text.find('\0') == std::string_view::npos;
 }
 
-// The full path of what is on no volume.
+// The full path of an item that is on no volume.
 std::string NoFullPath() {
   return {protocol::kSeparator};
 }
@@ -143,7 +143,7 @@ Request<std::optional<std::string>> SetFileRefFromFSSpecData(const FSSpec& spec)
               .Put(spec.vRefNum)
               .Put(spec.parID)
               .PutString(spec.name)
-              .PutFlag(false)  // changes nothing
+              .PutFlag(false)  // has no effect
               .Bytes(),
           answer::ReadStringByFlag};
 }
@@ -156,7 +156,7 @@ Request<std::optional<std::string>> SetFileRefFromFSSpec(const FSSpec& spec,
   return {RequestWriter(protocol::kRequestSetFileRefFromFSSpec)
               .PutSpec(spec)
               .PutFlag(searchOtherVolumes)
-              .PutFlag(false)  // changes nothing
+              .PutFlag(false)  // has no effect
               .Bytes(),
           answer::ReadStringByFlag};
 }

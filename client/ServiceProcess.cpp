@@ -20,7 +20,7 @@ namespace {
 using std::chrono::milliseconds;
 using std::chrono::steady_clock;
 
-constexpr milliseconds kLongestPoll{60'000};  // a longer wait takes several
+constexpr milliseconds kLongestPoll{60'000};  // a longer wait takes several polls
 
 std::string MessageOf(int errorNumber) {
   return std::generic_category().message(errorNumber);
@@ -30,8 +30,8 @@ void CloseIfOpen(int& descriptor) {
   if (descriptor >= 0) close(std::exchange(descriptor, -1));
 }
 
-// Moves a descriptor above the standard ones: what a program prints that has closed those must not
-// reach the service.
+// Moves a descriptor above the standard ones: in a program that has closed those, what it prints
+// must not reach the service.
 bool MoveUp(int& descriptor) {
   if (descriptor > STDERR_FILENO) return true;
   const int moved = fcntl(descriptor, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
@@ -65,7 +65,7 @@ bool SetNonBlocking(int descriptor) {
   return fcntl(descriptor, F_SETFL, O_NONBLOCK) == 0;
 }
 
-// Starts `path`; the error number, or 0.
+// Starts `path`. Returns the error number, or 0.
 int Spawn(const std::string& path, int input, int output, pid_t& process) {
   std::string program = path;
   std::string parent = std::to_string(getpid());
@@ -80,7 +80,7 @@ int Spawn(const std::string& path, int input, int output, pid_t& process) {
   return error;
 }
 
-// Keeps SIGPIPE from this thread while a write can raise it, and takes back what the write raised.
+// Blocks SIGPIPE in this thread while a write can raise it, and discards one that the write raised.
 class WithoutBrokenPipeSignal {
  public:
   WithoutBrokenPipeSignal() {
@@ -105,7 +105,7 @@ class WithoutBrokenPipeSignal {
   bool mWasPending;
 };
 
-// Waits until the watched process has ended, at most that long.
+// Waits until the watched process has ended, for at most `patience`.
 void AwaitEnd(int watch, milliseconds patience) {
   const auto until = steady_clock::now() + patience;
   const auto left = [until] {
@@ -135,8 +135,8 @@ Result<ServiceProcess> ServiceProcess::Start(const std::string& path) {
     return Error{"the service " + path + " could not be started: " + MessageOf(error)};
   }
   int watch = static_cast<int>(syscall(SYS_pidfd_open, process, 0));
-  // A process of which there is nothing left has been waited for by somebody else in this program,
-  // who ignores the signal of a child's end, say. Its pipes tell that it has ended.
+  // A process that has vanished has been waited for elsewhere in this program, for example because
+  // it ignores SIGCHLD. Its pipes tell that it has ended.
   if (watch < 0 && errno != ESRCH) {
     const int error = errno;
     kill(process, SIGKILL);
@@ -158,7 +158,7 @@ ServiceProcess::ServiceProcess(ServiceProcess&& other) noexcept
       mRequests(std::exchange(other.mRequests, -1)),
       mResponses(std::exchange(other.mResponses, -1)) {}
 
-// The process is known by its watch alone: its id may be another's by now.
+// Identifies the process by its watch alone: its id may belong to another one by now.
 void ServiceProcess::End(std::chrono::milliseconds patience) {
   CloseIfOpen(mRequests);
   CloseIfOpen(mResponses);
@@ -191,7 +191,7 @@ Result<std::size_t> ServiceProcess::Read(char* bytes, std::size_t size) {
 }
 
 void ServiceProcess::Wait(bool forWriting, milliseconds longest) const {
-  // poll leaves out what is negative.
+  // poll ignores negative descriptors.
   std::array<pollfd, 2> awaited{
       {{mResponses, POLLIN, 0}, {forWriting ? mRequests : -1, POLLOUT, 0}}};
   poll(awaited.data(), awaited.size(), static_cast<int>(std::min(longest, kLongestPoll).count()));

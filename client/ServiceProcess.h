@@ -13,29 +13,29 @@ namespace tallowmere {
 
 class ServiceProcess {
  public:
-  // Starts the program at `path` with this process's id as its argument.
+  // Starts the program at `path`, passing this process's id as its argument.
   static Result<ServiceProcess> Start(const std::string& path);
 
   ServiceProcess(ServiceProcess&& other) noexcept;
-  // Closes the pipes, which ends the service as soon as it reads, and waits for it. A service that
-  // does not end by itself within a second is killed. A copy of this process that fork(2) made
-  // closes its ends and leaves the service alone.
+  // Closes the pipes, which ends the service at its next read, and waits for it. A service that has
+  // not ended within a second is killed. In a copy of this process made by fork(2), only closes
+  // that copy's ends and leaves the service alone.
   ~ServiceProcess() { End(kTimeToEnd); }
 
   // Ends the service at once, whatever it is doing, and waits for it.
   void Kill() { End(std::chrono::milliseconds(0)); }
 
-  // Writes as much as the pipe takes now and gives its size. Nothing is taken from the moment on in
-  // which the service has stopped reading; what it has sent can still be read. A broken pipe raises
-  // no signal in this process.
+  // Writes as much as the pipe accepts now; returns the number of bytes. Once the service has
+  // stopped reading, nothing is accepted any more; what it has sent can still be read. A broken
+  // pipe raises no signal in this process.
   Result<std::size_t> Write(std::string_view bytes);
 
-  // Reads what has arrived, at most `size` bytes, and gives its size. An error when the service has
-  // ended and everything has been read.
+  // Reads what has arrived, at most `size` bytes; returns the number of bytes. Returns an error
+  // when the service has ended and everything has been read.
   Result<std::size_t> Read(char* bytes, std::size_t size);
 
-  // Returns when there is something to read, or the service has ended, or, if so wished, something
-  // can be written, and at the latest after that time. REQUIRES: 0 or more.
+  // Returns when there is something to read, when the service has ended, with `forWriting` when
+  // something can be written, or after `longest` at the latest. REQUIRES: `longest` is 0 or more.
   void Wait(bool forWriting, std::chrono::milliseconds longest) const;
 
  private:
@@ -45,9 +45,9 @@ class ServiceProcess {
   static constexpr std::chrono::milliseconds kTimeToEnd{1000};
 
   pid_t mOwner;    // the process that started it
-  int mWatch;      // tells the process's end, and the process from a later one with its id
-  int mRequests;   // written to by us, not blocking; -1 when nobody reads
-  int mResponses;  // read from by us, not blocking
+  int mWatch;      // reports the process's end; unlike its id, never refers to another process
+  int mRequests;   // our writing end, non-blocking; -1 when nobody reads
+  int mResponses;  // our reading end, non-blocking
 };
 
 }  // namespace tallowmere

@@ -5,7 +5,7 @@
 
 namespace {
 
-// A block with the description of a sound, the caller's; null without memory for it.
+// A new block that describes a sound; the caller owns it. Null when there is not enough memory.
 Handle NewSoundDescription(unsigned long sampleRate, unsigned long sampleSize,
                            unsigned char channels, unsigned long dataFormat) {
   const Handle block = NewHandleClear(sizeof(SoundDescription));
@@ -39,7 +39,7 @@ OSStatus GetAIFFExportSettingsThroughIPC(char*** settings, unsigned long sampleR
     CloseComponent(exporter);
     return memFullErr;
   }
-  // Movie export answers in 32 bits; what travels has 16.
+  // Movie export returns 32 bits; the response carries 16.
   result = static_cast<OSErr>(MovieExportSetSampleDescription(
       exporter, reinterpret_cast<SampleDescriptionHandle>(description), SoundMediaType));
   DisposeHandle(description);
@@ -52,8 +52,8 @@ OSStatus GetAIFFExportSettingsThroughIPC(char*** settings, unsigned long sampleR
 
 namespace tallowmere::service {
 
-// The settings stay in memory, as does the instance that made them: nobody but the end of the
-// process gives them back.
+// The settings stay in memory, as does the instance that made them; only the end of the process
+// frees them.
 void GetAIFFExportSettings(Channel& channel) {
   const auto sampleRate = channel.Take<std::uint32_t>();
   const auto sampleSize = channel.Take<std::uint32_t>();

@@ -1,9 +1,8 @@
-// The commands, one function each, in three movements: take the fields, do the work, put the
-// answer.
+// The commands, one function each, in three steps: read the fields, do the work, write the answer.
 //
-// A command starts its work only after its last field has arrived: when the channel has failed by
-// then it returns at once. Work of several host calls is one moment, which ends before the answer
-// begins. The trailer is not the command's.
+// A command starts its work only after its last field has arrived; when the channel has failed by
+// then, it returns at once. Work that makes several host calls is done within one Moment, which
+// ends before the answer is written. The caller writes the trailer.
 #pragma once
 
 #include "service/Channel.h"

@@ -38,7 +38,7 @@ void GetHFSName(Channel& channel) {
   channel.PutString(name);
 }
 
-// The reference is one to a folder whatever the path names, unlike that of GetHFSName.
+// The reference is always that of a folder, whatever the path names, unlike in GetHFSName.
 void GetFSSpec(Channel& channel) {
   auto path = channel.TakeAllocated();
   if (channel.Failed()) return;
@@ -49,7 +49,7 @@ void GetFSSpec(Channel& channel) {
   FSSpec spec;
   const bool usable = CFileUtilGetDeprecatedFSSpecThroughIPC(item, &spec);
   moment.End();
-  // What a record holds behind its name is whatever was in memory.
+  // The bytes after the name in a record are uninitialised memory.
   std::fill(spec.name + 1 + spec.name[0], std::end(spec.name), 0);
 
   channel.PutFlag(usable);

@@ -10,7 +10,7 @@
 
 namespace tallowmere::service {
 
-// A size too small for the path keeps the service busy for ever; see CFileUtilMakeFullPath.
+// A size too small for the path keeps the service busy for ever: see CFileUtilMakeFullPath.
 void MakeFullPath(Channel& channel) {
   auto path = channel.TakeAllocated();
   const auto size = channel.Take<std::uint16_t>();
@@ -28,7 +28,7 @@ void MakeFullPath(Channel& channel) {
       CFileUtilMakeFullPath(item, size == 0 ? nullptr : fullPath, size, flag);
   moment.End();
 
-  // Behind the NUL is what was in memory, or without the flag the folders that were cut.
+  // After the NUL come uninitialised bytes or, without the flag, the folders that were cut off.
   std::fill(fullPath + std::strlen(fullPath), fullPath + size, '\0');
 
   channel.Put<std::uint16_t>(length);
@@ -36,7 +36,7 @@ void MakeFullPath(Channel& channel) {
 }
 
 void MakeFileRefFromPath(Channel& channel) {
-  // With the flag the folder is two strings. The second one ends too when it is not there.
+  // With the flag, the folder is two strings. A missing second one needs a NUL too.
   const auto folder = channel.TakeAllocated(2);
   std::uint16_t nameLength = 0;
   const auto name = channel.TakeAllocated(1, &nameLength);

@@ -1,7 +1,8 @@
 // What travels on the two pipes: the constants that the service and its clients share.
 //
-// All integers are in the byte order of the machine that runs both processes. A request is its code
-// (16 bits) and the fields of its command; a response is the command's fields and the trailer.
+// All integers are in the byte order of the machine that runs both processes. A request is a code
+// (16 bits), followed by the command's fields; a response is the command's fields, followed by the
+// trailer.
 #pragma once
 
 #include <cstddef>
@@ -41,15 +42,15 @@ inline constexpr std::size_t kLongestHFSPath = 255;
 // Separates the names of an HFS path.
 inline constexpr char kSeparator = ':';
 
-// An FSSpec record: the volume reference number (16 bits), the id of the holding folder (32 bits)
-// and the name, a length byte and room for 63 bytes; what lies behind the name is unspecified.
+// An FSSpec record: the volume reference number (16 bits), the id of the parent folder (32 bits)
+// and the name, a length byte and room for 63 bytes, of which those after the name are unspecified.
 inline constexpr std::size_t kFileSpecSize = 70;
 inline constexpr std::size_t kLongestSpecName = 63;
 
 // Stands for "no volume" where a volume reference number is expected.
 inline constexpr std::int16_t kNoVolume = 32767;
 
-// The result of kRequestGetAIFFExportSettings where there is no exporter for AIFF files.
+// The result of kRequestGetAIFFExportSettings when there is no exporter for AIFF files.
 inline constexpr std::int16_t kNoAIFFExporter = -2005;
 
 }  // namespace tallowmere::protocol

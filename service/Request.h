@@ -1,4 +1,4 @@
-// One request from its code to the trailer of its response.
+// Serves one request, from its code to the trailer of its response.
 #pragma once
 
 #include <MacTypes.h>
@@ -6,11 +6,15 @@
 namespace tallowmere::service {
 
 // Reads a request from standard input, carries it out and writes its response to standard output.
-// noErr: read whole and answered whole. ioErr: the channel failed, by the end of input, a read or
-// write error or a length out of its bound; a response can be left half written. The outcome of the
-// work is never an error here, it is in the response.
-// Does not return for the quit request, which ends the process with status 0, nor for a code that
-// no command has, which ends it with status 1; neither is answered.
+//
+//   Returns  noErr     the request was read and answered in full
+//            ioErr     the channel failed: end of input, a read or write error, or a length out of
+//                      its bounds; a response may be left half written
+//   Exits    status 0  the quit request
+//            status 1  a code that no command has
+//
+// The outcome of the work is part of the response and never an error here. Neither exit writes a
+// response.
 OSErr ServeOneRequest();
 
 }  // namespace tallowmere::service

@@ -15,13 +15,14 @@ int main(int argumentCount, char** arguments) {
     std::fputs("Tallowmere missing a parameter.\n", stderr);
     return EXIT_FAILURE;
   }
-  // The parent is trusted to know its own number; a text that is none gives 0, this process group.
+  // The parent is trusted to pass its own process id; text that is not a number gives 0, this
+  // process group.
   const pid_t parent = std::atoi(arguments[1]);  // NOLINT(cert-err34-c)
 
-  // It reads a file system that others write to, and only ever has to read.
+  // It reads a file system that others write to, and never needs to do more than read.
   tallowmere::process::LockIn();
 
-  // The parent is looked for after every request, answered or not, and never before the first one:
+  // The parent is checked for after every request, answered or not, and never before the first one:
   // a service without a parent ends when its input does.
   OSErr result = noErr;
   bool parentExists = true;

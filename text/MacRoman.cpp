@@ -8,8 +8,8 @@
 namespace tallowmere::text {
 namespace {
 
-// Bytes 0x80 to 0xFF; the lower half is ASCII. The mapping that the Unicode Consortium publishes
-// for Mac Roman, with 0xDB as the euro sign.
+// Bytes 0x80 to 0xFF; the lower half is ASCII. The mapping published by the Unicode Consortium for
+// Mac Roman, with 0xDB as the euro sign.
 constexpr std::array<char16_t, 128> kUpperHalf = {
     0x00C4, 0x00C5, 0x00C7, 0x00C9, 0x00D1, 0x00D6, 0x00DC, 0x00E1,  // 80
     0x00E0, 0x00E2, 0x00E4, 0x00E3, 0x00E5, 0x00E7, 0x00E9, 0x00E8,  // 88
@@ -35,7 +35,7 @@ struct AccentedLetter {
   char16_t mark;
 };
 
-// The letters above with their canonical decompositions, by code point.
+// The accented letters of kUpperHalf and their canonical decompositions, by code point.
 constexpr auto kAccentedLetters = std::to_array<AccentedLetter>({
     {0x00C0, u'A', 0x0300}, {0x00C1, u'A', 0x0301}, {0x00C2, u'A', 0x0302}, {0x00C3, u'A', 0x0303},
     {0x00C4, u'A', 0x0308}, {0x00C5, u'A', 0x030A}, {0x00C7, u'C', 0x0327}, {0x00C8, u'E', 0x0300},
@@ -57,7 +57,7 @@ struct ByteOfCharacter {
   std::uint8_t byte;
 };
 
-// kUpperHalf the other way round, by code point.
+// The inverse of kUpperHalf, by code point.
 constexpr auto kBytes = [] {
   std::array<ByteOfCharacter, kUpperHalf.size()> bytes{};
   for (std::size_t i = 0; i < bytes.size(); ++i) {
@@ -68,7 +68,7 @@ constexpr auto kBytes = [] {
   return bytes;
 }();
 
-// U+0300 to U+036F, the block that holds every mark of kAccentedLetters.
+// Whether the unit is in U+0300 to U+036F, the block of all marks of kAccentedLetters.
 bool IsCombiningMark(char16_t unit) {
   return unit >= 0x0300 && unit <= 0x036F;
 }

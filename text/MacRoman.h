@@ -12,20 +12,21 @@ namespace tallowmere::text {
 // The character of a byte, always precomposed.
 char16_t MacRomanToUnicode(std::uint8_t byte);
 
-// The byte of one character (a Basic Multilingual Plane code point), or none.
+// The byte of one character (a Basic Multilingual Plane code point). Nullopt when Mac Roman lacks
+// it.
 std::optional<std::uint8_t> MacRomanFromUnicode(char16_t character);
 
-// One step of encoding a text: the byte for what stands at its beginning and how many UTF-16 units
-// that took. A base letter followed by the combining mark of a Mac Roman letter is taken together
-// and gives the precomposed letter's byte. The byte is none for what Mac Roman lacks (a surrogate
-// pair is taken whole). REQUIRES: text is not empty.
+// One step of encoding a text: the byte for its beginning, and the number of UTF-16 units that this
+// takes. A base letter followed by the combining mark of a Mac Roman letter is taken together and
+// gives the precomposed letter's byte. The byte is nullopt for a character that Mac Roman lacks (a
+// surrogate pair is taken whole). REQUIRES: the text is not empty.
 struct MacRomanStep {
   std::optional<std::uint8_t> byte;
   std::size_t units;  // 1 or 2
 };
 MacRomanStep NextMacRoman(std::u16string_view text);
 
-// The whole text in Mac Roman, or none when any of it has no byte.
+// The whole text in Mac Roman. Nullopt when any part of it has no byte.
 std::optional<std::string> EncodeMacRoman(std::u16string_view text);
 
 // The text of Mac Roman bytes.

@@ -16,9 +16,9 @@ constexpr bool IsAscii(char16_t unit) {
   return unit < 0x80;
 }
 
-// Whether a text, in bytes or in UTF-16, is of ASCII alone, as most names are: then its characters
-// are the same in every encoding of a name. Looks at all of it, which the compiler makes several
-// characters at a time.
+// Whether a text, in bytes or in UTF-16, is pure ASCII, as most names are: its characters are then
+// the same in every encoding of a name. Examines the whole text, so that the compiler can process
+// several characters at a time.
 template <typename Char>
 constexpr bool IsAllAscii(std::basic_string_view<Char> text) {
   char32_t bits = 0;
@@ -42,13 +42,13 @@ constexpr bool IsEscapedByte(char32_t codePoint) {
   return codePoint >= kByteEscape + 0x80 && codePoint <= kByteEscape + 0xFF;
 }
 
-// The character that a text begins with. An unpaired surrogate is a character of its own.
+// The first character of a text. An unpaired surrogate is a character of its own.
 struct Utf16Character {
   char32_t codePoint;
   std::size_t units;  // 1 or 2
 };
 
-// REQUIRES: text is not empty.
+// REQUIRES: the text is not empty.
 constexpr Utf16Character NextUtf16(std::u16string_view text) {
   if (text.size() < 2 || !IsHighSurrogate(text[0]) || !IsLowSurrogate(text[1])) return {text[0], 1};
   const char32_t high = text[0] - char32_t{kFirstHighSurrogate};
@@ -56,7 +56,7 @@ constexpr Utf16Character NextUtf16(std::u16string_view text) {
   return {kFirstSupplementary + (high << 10 | low), 2};
 }
 
-// Adds a code point, which may be a surrogate, to a text.
+// Appends a code point, which may be a surrogate, to a text.
 inline void AppendUtf16(std::u16string& text, char32_t codePoint) {
   if (codePoint < kFirstSupplementary) {
     text.push_back(static_cast<char16_t>(codePoint));

@@ -11,7 +11,7 @@ std::uint8_t ByteAt(std::string_view bytes, std::size_t i) {
   return static_cast<std::uint8_t>(bytes[i]);
 }
 
-// The lead byte's or continuation byte's fixed bits and the value's bits.
+// Combines a lead or continuation byte's fixed bits with the value's bits.
 char Byte(char32_t fixed, char32_t value) {
   return static_cast<char>(fixed | value);
 }
@@ -22,7 +22,7 @@ char Continuation(char32_t codePoint, unsigned shift) {
 
 }  // namespace
 
-// Table 3-7 of the Unicode standard: the second byte's range is what rules out overlong forms,
+// Table 3-7 of the Unicode standard: the range of the second byte rules out overlong forms,
 // surrogates and code points above U+10FFFF.
 Utf8Character NextUtf8(std::string_view bytes) {
   const std::uint8_t lead = ByteAt(bytes, 0);

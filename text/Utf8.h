@@ -9,11 +9,11 @@ namespace tallowmere::text {
 
 struct Utf8Character {
   char32_t codePoint;
-  std::size_t length;  // bytes taken, 1 to 4; 0 when the bytes begin with no valid sequence
+  std::size_t length;  // 1 to 4 bytes; 0 when the bytes do not begin with a valid sequence
 };
 
-// The character that `bytes` begin with. Overlong forms, surrogates and code points above U+10FFFF
-// are not valid. REQUIRES: bytes is not empty.
+// The first character of `bytes`. Overlong forms, surrogates and code points above U+10FFFF are
+// invalid. REQUIRES: `bytes` is not empty.
 Utf8Character NextUtf8(std::string_view bytes);
 
 struct Utf8Sequence {
@@ -22,7 +22,7 @@ struct Utf8Sequence {
   std::string_view View() const { return {bytes.data(), length}; }
 };
 
-// REQUIRES: codePoint is at most U+10FFFF and no surrogate.
+// REQUIRES: the code point is at most U+10FFFF and not a surrogate.
 Utf8Sequence EncodeUtf8(char32_t codePoint);
 
 }  // namespace tallowmere::text

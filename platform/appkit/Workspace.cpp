@@ -17,7 +17,7 @@ using namespace tallowmere::foundation;
 
 // The extensions of registered document and bundle types that are folders.
 constexpr std::string_view kPackageExtensions[] = {
-    // programs and what extends them
+    // programs and their extensions
     "app", "appex", "bundle", "clr", "colorpicker", "component", "docset", "dsym", "ibplugin",
     "kext", "mdimporter", "plugin", "prefpane", "qlgenerator", "saver", "service", "slidesaver",
     "systemextension", "wdgt", "webplugin", "xpc",
@@ -32,7 +32,7 @@ constexpr std::string_view kPackageExtensions[] = {
     "scptd", "theater", "tvlibrary", "workflow", "xcassets", "xcdatamodel", "xcdatamodeld",
     "xcodeproj", "xcworkspace"};
 
-// Each of these files makes the folder that holds it a package.
+// A folder that holds one of these files is a package.
 constexpr std::string_view kPackageFiles[] = {"Contents/Info.plist", "Contents/PkgInfo"};
 
 bool IsPackageExtension(std::string_view extension) {

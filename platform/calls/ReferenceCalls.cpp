@@ -2,6 +2,7 @@
 
 #include <CoreServices/CoreServices.h>
 
+#include <cerrno>
 #include <optional>
 #include <string>
 
@@ -26,15 +27,22 @@ constexpr kernel::Error kOtherWay{ENOTDIR};
 // where that is not certain.
 kernel::Result<FSRef> ReferenceInMoment(catalog::Moment& moment, const std::string& path,
                                         bool isFolderMeant) {
-  if (isFolderMeant) {
-    if (const auto folder = moment.HoldFolder(path)) return ReferenceTo(moment, *folder);
+  catalog::Catalog& known = moment.Knowledge();
+  if (isFolderMeant && known.WasFolderMeantRightly()) {
+    const auto folder = moment.HoldFolder(path);
+    if (folder) return ReferenceTo(moment, *folder);
+    known.NoteFolderMeant(folder.Error() != kernel::Error{ENOTDIR});
   }
   if (path == "/" || !kernel::IsNormalized(path)) return kOtherWay;
   const auto holder = moment.HoldFolder(foundation::FolderOf(path));
   if (!holder) return holder.Error() == kernel::kNotThere ? kernel::kNotThere : kOtherWay;
   const auto look = moment.LookUp(*holder, std::string(*foundation::LastComponent(path)));
   if (!look) return look.Error();
-  return ReferenceTo(moment, *look);
+  if (!isFolderMeant || !kernel::IsFolder(look->Item())) return ReferenceTo(moment, *look);
+  // It serves the rest of the moment.
+  known.NoteFolderMeant(true);
+  const auto folder = moment.HoldFolderOf(*look);
+  return folder ? ReferenceTo(moment, *folder) : ReferenceTo(moment, *look);
 }
 
 // The path is without "/" at its end, so a link in the last place is read itself.

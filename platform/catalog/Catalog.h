@@ -37,6 +37,11 @@ class Catalog {
   // Where anything was last seen; empty when nothing is remembered.
   std::string_view LatestPlace() const { return mPlaces.Latest(); }
 
+  // A lead: whether what was last meant to be a folder was one. Most programs ask about many files
+  // or about many folders.
+  bool WasFolderMeantRightly() const { return mWasFolderMeantRightly; }
+  void NoteFolderMeant(bool rightly) { mWasFolderMeantRightly = rightly; }
+
   // A lead from a pass over a volume: the folder, or the item, with an id, or one very item.
   // Folders near `start` are read first.
   std::optional<std::string> SearchVolume(const volumes::VolumePointer& volume,
@@ -48,6 +53,7 @@ class Catalog {
   volumes::VolumeTable mTable;
   PlaceMemory mPlaces;
   std::vector<FolderIndex> mIndexes;  // by volume
+  bool mWasFolderMeantRightly = true;
 };
 
 }  // namespace tallowmere::catalog

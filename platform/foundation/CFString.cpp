@@ -21,7 +21,7 @@ namespace {
 
 using namespace tallowmere::foundation;
 
-// UTF-8 spends at most 3 bytes on a UTF-16 unit, an escaped byte 1.
+// UTF-8 takes at most 3 bytes for a UTF-16 unit, an escaped byte takes 1.
 constexpr CFIndex kFileNameBytesPerUnit = 3;
 
 CFIndex IndexOf(std::size_t count) {
@@ -32,7 +32,7 @@ std::size_t SizeOf(CFIndex index) {
   return static_cast<std::size_t>(std::max<CFIndex>(index, 0));
 }
 
-// The units of a range; none when it does not lie within the string.
+// The units of a range. Nullopt when it does not lie within the string.
 std::optional<std::u16string_view> Slice(CFStringRef string, CFRange range) {
   const std::u16string_view text = StringOf(string).Text();
   if (range.location < 0 || range.length < 0 || SizeOf(range.location) > text.size() ||
@@ -42,7 +42,7 @@ std::optional<std::u16string_view> Slice(CFStringRef string, CFRange range) {
   return text.substr(SizeOf(range.location), SizeOf(range.length));
 }
 
-// A new string of bytes; null when they are not valid in the encoding.
+// A new string decoded from bytes. Null when they are not valid in the encoding.
 CFStringRef CreateDecoded(std::string_view bytes, CFStringEncoding id) {
   const Encoding* const encoding = FindEncoding(id);
   if (encoding == nullptr) return nullptr;
@@ -50,7 +50,7 @@ CFStringRef CreateDecoded(std::string_view bytes, CFStringEncoding id) {
   return text ? CreateString(*std::move(text)) : nullptr;
 }
 
-// What "%@" stands for; none for an object that is no string.
+// The text that "%@" is replaced by. Nullopt for an object that is not a string.
 std::optional<std::u16string_view> Described(CFTypeRef object) {
   if (object == nullptr) return u"(null)";
   const auto* const string = dynamic_cast<const String*>(static_cast<const Object*>(object));
@@ -80,8 +80,8 @@ std::optional<std::u16string> Formatted(std::u16string_view format, va_list argu
   return text;
 }
 
-// Stores the bytes of a name and a NUL behind them. False, with the buffer untouched, when they do
-// not fit and when there is a NUL among them, which no name has.
+// Stores the bytes of a name and a terminating NUL. Returns false, with the buffer untouched, when
+// they do not fit or contain a NUL, which no name has.
 template <typename Char>
 bool StoreName(const std::basic_string<Char>& bytes, char* buffer, std::size_t capacity) {
   if (bytes.size() >= capacity || bytes.find(Char{}) != bytes.npos) return false;
@@ -111,7 +111,7 @@ CFIndex CFStringGetMaximumSizeForEncoding(CFIndex length, CFStringEncoding encod
 
 // --- Making -----------------------------------------------------------------------------------
 
-// A string holds a text this short in itself.
+// A short text lies within the string object itself, so it needs no memory.
 CFStringRef __CFStringMakeConstantString(const char* utf8, unsigned char* room) {
   static_assert(sizeof(String) <= __kCFConstantStringSize && alignof(String) <= alignof(void*));
   std::optional<std::u16string> text;

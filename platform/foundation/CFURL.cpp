@@ -23,13 +23,14 @@ using namespace tallowmere::foundation;
 
 using Bytes = std::optional<std::string>;
 
-// A new string of a file name or path, null for none and for one with a NUL, which no name has.
+// A new string of a file name or path. Null when `name` is nullopt or contains a NUL, which no name
+// does.
 CFStringRef CreateFileNameString(const Bytes& name) {
   if (!name || name->find('\0') != name->npos) return nullptr;
   return CreateString(tallowmere::text::TextOfFileName(*name));
 }
 
-// Of a path in another style than POSIX.
+// REQUIRES: the style is not POSIX.
 Bytes LinuxPath(const std::string& path, CFURLPathStyle style) {
   switch (style) {
     case kCFURLHFSPathStyle:
@@ -41,7 +42,7 @@ Bytes LinuxPath(const std::string& path, CFURLPathStyle style) {
   }
 }
 
-// In another style than POSIX.
+// REQUIRES: the style is not POSIX.
 Bytes PathInStyle(const std::string& path, bool folder, CFURLPathStyle style) {
   switch (style) {
     case kCFURLHFSPathStyle:
@@ -57,7 +58,7 @@ std::string_view EncodedPath(CFURLRef url) {
   return UrlOf(url).Parts().path;
 }
 
-// Another reference to the path of a URL; null when it has none.
+// Another reference to the path of a URL. Null when it has none.
 CFStringRef SharedPath(CFURLRef url) {
   const String* const path = UrlOf(url).Path();
   if (path == nullptr) return nullptr;
@@ -153,7 +154,7 @@ CFURLRef CFURLCreateCopyAppendingPathComponent(CFAllocatorRef, CFURLRef url, CFS
     const auto bytes = tallowmere::text::FileNameOfText(StringOf(component).Text());
     if (!bytes) return nullptr;
     const UrlParts& parts = UrlOf(url).Parts();
-    // Behind an authority, an empty path is the root's.
+    // After an authority, an empty path means the root.
     const std::string_view path = parts.path.empty() && parts.authority ? "/" : parts.path;
     std::string joined = JoinPath(path, "");
     AppendPercentEncodedPath(joined, *bytes, path.empty());

@@ -12,7 +12,7 @@
 
 namespace tallowmere::foundation {
 
-// One character of a text in an encoding.
+// The first character of a text, encoded.
 struct EncodedCharacter {
   std::size_t units;  // UTF-16 units taken from the text, 1 or 2
   std::size_t size;   // bytes used, 1 to 4; 0 when the encoding lacks the character
@@ -21,30 +21,30 @@ struct EncodedCharacter {
 
 struct Encoding {
   CFStringEncoding id;
-  std::size_t bytesPerUnit;  // at most, for each UTF-16 unit
+  std::size_t bytesPerUnit;  // upper bound, for each UTF-16 unit
 
-  // The character that a text begins with. REQUIRES: the text is not empty.
+  // Encodes the first character of a text. REQUIRES: the text is not empty.
   EncodedCharacter (*next)(std::u16string_view text);
 
-  // The text of bytes; none when they are not valid in the encoding.
+  // Decodes bytes. Nullopt when they are not valid in the encoding.
   std::optional<std::u16string> (*decode)(std::string_view bytes);
 };
 
-// The encoding with a number, or null when it is not available.
+// The encoding with this number, or null when it is not available.
 const Encoding* FindEncoding(CFStringEncoding id);
 
-// The numbers of all encodings, ended by kCFStringEncodingInvalidId.
+// The numbers of all encodings, terminated by kCFStringEncodingInvalidId.
 const CFStringEncoding* EncodingList();
 
-// How far an encoding of a text came.
+// How much of a text was encoded.
 struct EncodedLength {
-  std::size_t units;  // of the text, all of them when nothing stopped it
+  std::size_t units;  // of the text; all of them unless a character or a full buffer stopped it
   std::size_t bytes;  // written
 };
 
-// Encodes from the front into at most `capacity` bytes, a character wholly or not at all. A
-// character that the encoding lacks becomes `lossByte`, or stops it when that is 0. With a null
-// buffer nothing is written.
+// Encodes from the front into at most `capacity` bytes; no character is written in part. A
+// character that the encoding lacks becomes `lossByte`; when that is 0, encoding stops there. With
+// a null buffer nothing is written.
 EncodedLength Encode(std::u16string_view text, const Encoding& encoding, std::uint8_t lossByte,
                      std::uint8_t* buffer, std::size_t capacity);
 

@@ -1,4 +1,4 @@
-// The edge between C++ that may run out of memory and host calls that never throw.
+// The boundary between C++ that may run out of memory and host calls that never throw.
 #pragma once
 
 #include <MacTypes.h>
@@ -7,8 +7,8 @@
 
 namespace tallowmere::foundation {
 
-// What `body` returns, or a zero result (null, false, 0) when it throws: out of memory, or a text
-// longer than a string can be.
+// Returns what `body` returns, or a zero result (null, false, 0) when it throws: out of memory, or
+// a text longer than a string can be.
 template <typename Body>
 auto OrZero(Body&& body) noexcept -> decltype(body()) {
   try {
@@ -18,7 +18,7 @@ auto OrZero(Body&& body) noexcept -> decltype(body()) {
   }
 }
 
-// What `body` returns, or ioErr when it throws.
+// Returns what `body` returns, or ioErr when it throws.
 template <typename Body>
 OSErr OrError(Body&& body) noexcept {
   try {

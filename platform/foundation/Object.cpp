@@ -6,7 +6,7 @@ void Object::Retain() const noexcept {
   mCount.fetch_add(1, std::memory_order_relaxed);
 }
 
-// The releases of all other threads come before the deletion, so their uses do too.
+// Orders every other thread's release, and so its last use, before the deletion.
 void Object::Release() const noexcept {
   if (mCount.fetch_sub(1, std::memory_order_acq_rel) == 1) delete this;
 }

@@ -1,4 +1,4 @@
-// What every counted object of the platform is made of. A CF reference is the address of an
+// The base of every reference-counted object of the platform. A CF reference is the address of an
 // object's Object part.
 #pragma once
 
@@ -14,21 +14,21 @@ class Object {
   Object& operator=(const Object&) = delete;
 
   void Retain() const noexcept;
-  void Release() const noexcept;  // the last one deletes the object
+  void Release() const noexcept;  // the last reference deletes the object
   CFIndex RetainCount() const noexcept;
 
-  // The meaning of CFEqual.
+  // Implements CFEqual.
   virtual bool Equals(const Object& other) const noexcept = 0;
 
  protected:
-  Object() = default;  // with one reference, the maker's
+  Object() = default;  // with one reference, the creator's
   virtual ~Object() = default;
 
  private:
   mutable std::atomic<CFIndex> mCount{1};
 };
 
-// Gives back one reference at the end of the pointer that holds it.
+// Releases one reference when the pointer that holds it is destroyed.
 struct ReleaseObject {
   void operator()(const Object* object) const noexcept { object->Release(); }
 };

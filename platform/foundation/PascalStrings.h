@@ -1,4 +1,4 @@
-// The limit of a Pascal string: one length byte, then that many bytes of text.
+// The limit of a Pascal string: a length byte, followed by that many bytes of text.
 #pragma once
 
 #include <cstddef>

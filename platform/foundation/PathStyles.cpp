@@ -14,14 +14,15 @@ namespace {
 constexpr std::string_view kHere = ".";
 constexpr std::string_view kParent = "..";
 
-// Takes what stands before the first `separator` off the front, and the separator with it.
+// Removes from the front what precedes the first `separator`, and the separator, and returns the
+// former.
 std::string_view TakeComponent(std::string_view& path, char separator) {
   const std::string_view component = path.substr(0, path.find(separator));
   path.remove_prefix(std::min(path.size(), component.size() + 1));
   return component;
 }
 
-// The path without doubled "/", "." components and a "/" at its end. Empty for "." and the like.
+// The path without doubled "/", "." components or a trailing "/". Empty when nothing else is left.
 std::string Tidied(std::string_view path) {
   std::string tidied(path.starts_with('/') ? "/" : "");
   while (!path.empty()) {
@@ -31,7 +32,7 @@ std::string Tidied(std::string_view path) {
   return tidied;
 }
 
-// Whether a path begins with "C:" alone or followed by `separator`.
+// Whether a path begins with a drive such as "C:", followed by `separator` or by nothing.
 bool BeginsWithDrive(std::string_view path, char separator) {
   return path.size() >= 2 && IsAsciiLetter(path[0]) && path[1] == ':' &&
          (path.size() == 2 || path[2] == separator);

@@ -1,7 +1,7 @@
-// HFS and Windows paths to Linux paths and back, all as bytes of file names.
+// Converts HFS and Windows paths to Linux paths and back, all as the bytes of file names.
 //
-// A path that begins at a root stays so, a relative one stays relative. A path whose translation
-// would read back as another one has none. May throw std::bad_alloc.
+// An absolute path stays absolute, a relative one stays relative. A path that would not survive the
+// round trip has no translation. May throw std::bad_alloc.
 #pragma once
 
 #include <optional>
@@ -11,19 +11,19 @@
 namespace tallowmere::foundation {
 
 // "Volume:a:b" → mount point and "/a/b", ":a:b" → "a/b". In each component ':' and '/' are
-// exchanged; each colon more climbs one level ("Volume:a::b" → "…/a/../b"); a ':' at the end names
-// the same item. None when the volume is not mounted, when the path climbs above its root, when a
-// component is "." or "..", and for an empty path.
+// exchanged; each further adjacent colon climbs one level ("Volume:a::b" → "…/a/../b"); a trailing
+// ':' names the same item. Nullopt for an empty path, for a volume that is not mounted, for a path
+// that climbs above its root, and for a component "." or "..".
 std::optional<std::string> LinuxPathOfHfsPath(std::string_view hfs);
 
-// The reverse; a folder ends in ':', a volume's root always. None for a path that climbs above its
-// volume's root, and when no volume is known.
+// The reverse. A folder ends in ':', and so does every volume's root. Nullopt for a path that
+// climbs above its volume's root, and when no volume is known.
 std::optional<std::string> HfsPathOfLinuxPath(std::string_view path, bool folder);
 
 // "C:\a\b" → "/C:/a/b", "\a\b" → "/a/b", "a\b" → "a/b".
 std::string LinuxPathOfWindowsPath(std::string_view windows);
 
-// The reverse. None for a path with '\' in a name and for a relative one that begins with a drive.
+// The reverse. Nullopt for a name with '\' in it and for a relative path that begins with a drive.
 std::optional<std::string> WindowsPathOfLinuxPath(std::string_view path);
 
 }  // namespace tallowmere::foundation

@@ -7,14 +7,14 @@
 namespace tallowmere::foundation {
 namespace {
 
-// The path without "/" at its end; empty for one of "/" alone.
+// The path without "/" at its end. Empty when it consists of "/" alone.
 std::string_view WithoutTrailingSlashes(std::string_view path) {
   return path.substr(0, path.find_last_not_of('/') + 1);
 }
 
 constexpr std::string_view kLongestDotDot = "%2E%2E";
 
-// Whether a component of a URL's path is "." or "..", which "%2E" spells too (RFC 3986, section
+// Whether a component of a URL's path is "." or "..", with "%2E" read as "." (RFC 3986, section
 // 2.3).
 bool IsDotOrDotDot(std::string_view component) {
   if (component.size() > kLongestDotDot.size()) return false;

@@ -9,7 +9,7 @@
 namespace tallowmere::foundation {
 namespace {
 
-// Which bytes of a path stand for themselves in a URL.
+// The bytes of a path that a URL holds as they are.
 constexpr auto kStandsForItself = [] {
   std::array<bool, std::size_t{std::numeric_limits<std::uint8_t>::max()} + 1> does{};
   for (std::size_t byte = 0; byte < does.size(); ++byte) {

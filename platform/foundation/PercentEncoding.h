@@ -1,5 +1,5 @@
-// Paths between the bytes that Linux stores and the percent-encoded text of a URL (RFC 3986,
-// section 2.1).
+// Converts between the bytes of a path as Linux stores them and the percent-encoded text of a URL
+// (RFC 3986, section 2.1).
 #pragma once
 
 #include <string>
@@ -7,13 +7,14 @@
 
 namespace tallowmere::foundation {
 
-// Adds the text of a path's bytes. What may stand for itself in a path does, "/" among it; every
-// other byte becomes "%" and two capital hexadecimal digits. With `firstSegmentIsUrlStart` a ":"
-// before the first "/" is encoded too, so that a relative path does not read as a scheme.
+// Appends a path, percent-encoded. Bytes that a URL path may hold as they are, "/" included, are
+// copied; every other byte becomes "%" and two capital hexadecimal digits. With
+// `firstSegmentIsUrlStart` a ":" before the first "/" is encoded too, so that a relative path is
+// not read as a scheme.
 void AppendPercentEncodedPath(std::string& text, std::string_view bytes,
                               bool firstSegmentIsUrlStart);
 
-// The bytes of a text. A "%" without two hexadecimal digits behind it stands for itself.
+// Decodes a text. A "%" that two hexadecimal digits do not follow is kept.
 std::string PercentDecode(std::string_view text);
 
 }  // namespace tallowmere::foundation

@@ -1,4 +1,4 @@
-// What stands behind a CFStringRef and a CFMutableStringRef.
+// The objects behind CFStringRef and CFMutableStringRef.
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
@@ -17,7 +17,7 @@ class String final : public Object {
       : mText(std::move(text)), mIsMutable(isMutable) {}
 
   const std::u16string& Text() const noexcept { return mText; }
-  std::u16string& Text() noexcept { return mText; }  // of a mutable string alone
+  std::u16string& Text() noexcept { return mText; }  // REQUIRES: the string is mutable
   bool IsMutable() const noexcept { return mIsMutable; }
 
   bool Equals(const Object& other) const noexcept override;
@@ -27,7 +27,7 @@ class String final : public Object {
   const bool mIsMutable;
 };
 
-// One reference to a string, or none.
+// One reference to a string, or null.
 using OwnedString = std::unique_ptr<const String, ReleaseObject>;
 
 // The object behind a reference.

@@ -30,7 +30,7 @@ std::string UrlTextOfPath(std::string_view path, bool folder) {
   return text;
 }
 
-// The current directory, none when it has been removed or cannot be read.
+// The current directory. Nullopt when it has been removed or cannot be read.
 std::optional<std::string> CurrentDirectory() {
   std::string path(256, '\0');
   while (getcwd(path.data(), path.size()) == nullptr) {
@@ -56,7 +56,7 @@ CFURLRef ReferenceTo(const Url* url) noexcept {
   return reinterpret_cast<CFURLRef>(object);
 }
 
-// The path as Url keeps it; null for none and for one with a NUL.
+// The path as Url keeps it. Null for an empty path and for one with a NUL.
 OwnedString KeptPath(std::string_view path) {
   if (path.empty() || HasNul(path)) return nullptr;
   return OwnedString(new String(text::TextOfFileName(WithoutFolderMark(path)), false));
@@ -104,7 +104,8 @@ CFURLRef CreateUrlOfPath(std::string_view path, bool folder) {
   return path.empty() ? nullptr : CreateUrlOfPath(path, folder, KeptPath(path));
 }
 
-// A string of ASCII without NUL or mark is kept itself: what its bytes read as is the same.
+// An ASCII string without NUL or folder mark is kept as it is: decoding its bytes gives the same
+// text.
 CFURLRef CreateUrlOfPath(const String& path, bool folder) {
   const auto bytes = text::FileNameOfText(path.Text());
   if (!bytes || bytes->empty()) return nullptr;

@@ -21,12 +21,12 @@ constexpr bool IsSubDelimiter(char c) {
   return std::string_view("!$&'()*+,;=").find(c) != std::string_view::npos;
 }
 
-// What stands for itself in a segment of a path: pchar without percent-encodings.
+// Characters that a path segment holds as they are: pchar without percent-encodings.
 constexpr bool IsPathCharacter(char c) {
   return IsUnreserved(c) || IsSubDelimiter(c) || c == ':' || c == '@';
 }
 
-// The value of a hexadecimal digit of either case, or -1.
+// The value of a hexadecimal digit, upper or lower case, or -1.
 constexpr int HexValue(char c) {
   if (IsAsciiDigit(c)) return c - '0';
   if (c >= 'a' && c <= 'f') return c - 'a' + 10;

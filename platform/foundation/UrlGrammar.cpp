@@ -8,7 +8,7 @@
 namespace tallowmere::foundation {
 namespace {
 
-// *( characters that `isAllowed` admits / pct-encoded )
+// *( characters that `isAllowed` accepts / pct-encoded )
 template <typename Predicate>
 bool IsEncodedText(std::string_view text, Predicate isAllowed) {
   for (std::size_t i = 0; i < text.size(); ++i) {
@@ -64,7 +64,7 @@ bool IsIpv6Address(std::string_view text) {
 }
 
 bool IsHost(std::string_view text) {
-  if (!text.starts_with('[')) return IsRegisteredName(text);  // every IPv4 address is one, too
+  if (!text.starts_with('[')) return IsRegisteredName(text);  // covers every IPv4 address
   if (!text.ends_with(']')) return false;
   const std::string_view literal = text.substr(1, text.size() - 2);
   return IsIpv6Address(literal) || IsFutureAddress(literal);
@@ -75,7 +75,7 @@ bool IsAuthority(std::string_view text) {
     if (!IsUserInfo(text.substr(0, at))) return false;
     text.remove_prefix(at + 1);
   }
-  // A literal has colons of its own within its brackets.
+  // An IP literal has colons within its brackets.
   const auto hostEnd = text.find(':', text.starts_with('[') ? text.find(']') : 0);
   if (hostEnd != text.npos) {
     if (!IsPort(text.substr(hostEnd + 1))) return false;
@@ -94,9 +94,9 @@ bool IsQueryOrFragment(std::string_view text) {
 
 }  // namespace
 
-// The split leaves the rest of the grammar true: a path after an authority is empty or begins with
-// "/", one without does not begin with "//", and one without a scheme has no ":" in its first
-// segment.
+// The split itself ensures the rest of the grammar: a path after an authority is empty or begins
+// with "/", one without an authority does not begin with "//", and one without a scheme has no ":"
+// in its first segment.
 bool IsUrl(std::string_view text) {
   const UrlParts parts = SplitUrl(text);
   return !text.empty() && (!parts.scheme || IsScheme(*parts.scheme)) &&

@@ -33,14 +33,14 @@ enum : OSErr {
   noErr = 0,
   nsvErr = -35,                // no such volume
   ioErr = -36,                 // input or output failed
-  bdNamErr = -37,              // a name that cannot be
+  bdNamErr = -37,              // an impossible name
   fnfErr = -43,                // no such item
-  paramErr = -50,              // an argument that cannot be
-  memFullErr = -108,           // memory is short
+  paramErr = -50,              // an invalid argument
+  memFullErr = -108,           // not enough memory
   dirNFErr = -120,             // no such folder
   badFormat = -206,            // a sound format that is not supported
   errFSBadFSRef = -1401,       // a reference to no item
-  errFSNotAFolder = -1407,     // a folder was needed
+  errFSNotAFolder = -1407,     // not a folder
   errFSRefsDifferent = -1420,  // two references to different items
-  afpAccessDenied = -5000,     // the user has no right to that
+  afpAccessDenied = -5000,     // permission denied
 };

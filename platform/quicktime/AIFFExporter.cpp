@@ -10,7 +10,7 @@ namespace {
 
 struct Format {
   OSType code;
-  bool isCompressed;  // its name alone says how many bits there are to a sample
+  bool isCompressed;  // its name alone determines the bits per sample
 };
 
 constexpr Format kFormats[] = {
@@ -29,6 +29,7 @@ const Format* FindFormat(OSType code) {
   return found == std::end(kFormats) ? nullptr : found;
 }
 
+constexpr OSType kRootAtom = FourCharacterCode("sean");
 constexpr OSType kFormatAtom = FourCharacterCode("ssct");
 constexpr OSType kRateAtom = FourCharacterCode("ssrt");
 constexpr OSType kSampleSizeAtom = FourCharacterCode("ssss");
@@ -47,11 +48,17 @@ OSErr AIFFExporter::SetSound(const SoundDescription& sound) {
 }
 
 std::string AIFFExporter::Settings() const {
-  return AtomContainer({Parent(
-      SoundMediaType, {Leaf(kFormatAtom, BigEndian(mSound->dataFormat)),
-                       Leaf(kRateAtom, BigEndian(mSound->sampleRate)),
-                       Leaf(kSampleSizeAtom, BigEndian(static_cast<UInt16>(mSound->sampleSize))),
-                       Leaf(kChannelsAtom, BigEndian(static_cast<UInt16>(mSound->numChannels)))})});
+  constexpr UInt16 kLeaves = 4;
+  AtomContainer settings;
+  settings.Open(kRootAtom, 1);
+  settings.Open(SoundMediaType, kLeaves);
+  settings.AddLeaf(kFormatAtom, mSound->dataFormat);
+  settings.AddLeaf(kRateAtom, mSound->sampleRate);
+  settings.AddLeaf(kSampleSizeAtom, static_cast<UInt16>(mSound->sampleSize));
+  settings.AddLeaf(kChannelsAtom, static_cast<UInt16>(mSound->numChannels));
+  settings.Close();
+  settings.Close();
+  return settings.Bytes();
 }
 
 }  // namespace tallowmere::quicktime

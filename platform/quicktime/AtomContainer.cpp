@@ -1,52 +1,65 @@
 #include "quicktime/AtomContainer.h"
 
-#include "quicktime/FourCharacterCode.h"
-
 namespace tallowmere::quicktime {
 namespace {
 
-constexpr OSType kRootType = FourCharacterCode("sean");
 constexpr UInt32 kAtomID = 1;
-constexpr std::size_t kHeaderSize = 20;
 constexpr std::size_t kReservedBeforeLockCount = 10;
 constexpr UInt16 kLockCount = 0;
 
-std::string Atom(OSType type, std::size_t childCount, std::string_view content) {
-  std::string atom;
-  atom.reserve(kHeaderSize + content.size());
-  atom += BigEndian(static_cast<UInt32>(kHeaderSize + content.size()));
-  atom += BigEndian(type);
-  atom += BigEndian(kAtomID);
-  atom += BigEndian(UInt16{0});
-  atom += BigEndian(static_cast<UInt16>(childCount));
-  atom += BigEndian(UInt32{0});
-  return atom.append(content);
-}
+// Room for the settings of a sound.
+constexpr std::size_t kUsualSize = 144;
+constexpr std::size_t kUsualDepth = 3;
 
 }  // namespace
 
-std::string BigEndian(UInt16 number) {
-  return {static_cast<char>(number >> 8), static_cast<char>(number)};
+AtomContainer::AtomContainer() {
+  mBytes.reserve(kUsualSize);
+  mOpen.reserve(kUsualDepth);
+  mBytes.append(kReservedBeforeLockCount, '\0');
+  Append(kLockCount);
 }
 
-std::string BigEndian(UInt32 number) {
-  return {static_cast<char>(number >> 24), static_cast<char>(number >> 16),
-          static_cast<char>(number >> 8), static_cast<char>(number)};
+// The size is known when the atom is closed.
+void AtomContainer::Open(OSType type, UInt16 childCount) {
+  mOpen.push_back(mBytes.size());
+  Append(UInt32{0});
+  Append(type);
+  Append(kAtomID);
+  Append(UInt16{0});
+  Append(childCount);
+  Append(UInt32{0});
 }
 
-std::string Leaf(OSType type, std::string_view data) {
-  return Atom(type, 0, data);
+void AtomContainer::Close() {
+  const std::size_t begin = mOpen.back();
+  mOpen.pop_back();
+  const auto size = static_cast<UInt32>(mBytes.size() - begin);
+  for (std::size_t i = 0; i < sizeof size; ++i) {
+    mBytes[begin + i] = static_cast<char>(size >> (8 * (sizeof size - 1 - i)));
+  }
 }
 
-std::string Parent(OSType type, std::initializer_list<std::string_view> children) {
-  std::string content;
-  for (const std::string_view child : children) content += child;
-  return Atom(type, children.size(), content);
+void AtomContainer::AddLeaf(OSType type, UInt32 number) {
+  Open(type, 0);
+  Append(number);
+  Close();
 }
 
-std::string AtomContainer(std::initializer_list<std::string_view> children) {
-  return std::string(kReservedBeforeLockCount, '\0') + BigEndian(kLockCount) +
-         Parent(kRootType, children);
+void AtomContainer::AddLeaf(OSType type, UInt16 number) {
+  Open(type, 0);
+  Append(number);
+  Close();
+}
+
+void AtomContainer::Append(UInt32 number) {
+  Append(static_cast<UInt16>(number >> 16));
+  Append(static_cast<UInt16>(number));
+}
+
+void AtomContainer::Append(UInt16 number) {
+  mBytes.push_back(static_cast<char>(number >> 8));
+  mBytes.push_back(static_cast<char>(number));
 }
 
 }  // namespace tallowmere::quicktime

@@ -1,7 +1,7 @@
-// Which components there are, and which of their instances are open. There is one component, the
-// exporter of AIFF files.
+// The components that exist and their open instances. There is one component, the exporter of AIFF
+// files.
 //
-// An instance is open until it is closed or the process ends.
+// An instance stays open until it is closed or the process ends.
 #pragma once
 
 #include <QuickTime/QuickTime.h>
@@ -14,7 +14,7 @@ namespace tallowmere::quicktime {
 
 std::size_t OpenInstances();
 
-// The exporter that an instance is. Null when it is no open instance.
+// The exporter behind an instance. Null when the instance is not open.
 AIFFExporter* ExporterOf(ComponentInstance instance);
 
 }  // namespace tallowmere::quicktime

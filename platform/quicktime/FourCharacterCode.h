@@ -1,4 +1,4 @@
-// Four-character codes as they are written.
+// Four-character codes, spelled as characters.
 #pragma once
 
 #include <QuickTime/QuickTime.h>

@@ -9,13 +9,13 @@
 namespace tallowmere::quicktime {
 namespace {
 
-// The handle of a block is the address of `bytes`.
+// A block's handle is the address of its `bytes`.
 struct Block {
   explicit Block(std::size_t length)
       : memory(std::make_unique<char[]>(length)), bytes(memory.get()), size(length) {}
 
   std::unique_ptr<char[]> memory;
-  char* bytes;  // whoever has the handle can change this
+  char* bytes;  // the handle's owner can change this
   std::size_t size;
 };
 

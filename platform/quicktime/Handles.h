@@ -1,4 +1,4 @@
-// Memory handles as this process has them: which ones are alive, and blocks made of bytes.
+// The memory handles of this process: which are alive, and blocks made from bytes.
 //
 // A block lives until it is disposed of or the process ends.
 #pragma once
@@ -10,10 +10,10 @@
 
 namespace tallowmere::quicktime {
 
-// How many blocks have not been disposed of.
+// The number of blocks that have not been disposed of.
 std::size_t LiveHandles();
 
-// A new block with these bytes. Null when memory is short.
+// A new block with these bytes. Null when there is not enough memory.
 Handle NewHandleWith(std::string_view bytes);
 
 }  // namespace tallowmere::quicktime

@@ -244,7 +244,7 @@ TEST_F(IdentityOnAVolume, AnIdInTheUpperHalfIsNegativeWhereItIsSigned) {
   const CFileRef folder(mData->MakeFolder("folder").c_str(), true);
   const unsigned long id = folder.GetNodeID();
   ASSERT_GE(id, 0x80000000u);
-  ASSERT_LE(id, 0xFFFFFFEFu);
+  ASSERT_LE(id, 0xFFFFFFFEu);
   EXPECT_EQ(folder.GetDirectoryID(), static_cast<long>(id) - 0x100000000);
   EXPECT_EQ(mData->Ref("folder/missing").GetParentID(), folder.GetDirectoryID());
   FSSpec spec;

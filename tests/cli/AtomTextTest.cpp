@@ -4,19 +4,28 @@
 #include <cstdlib>
 
 #include "cli/AtomText.h"
-#include "quicktime/AtomContainer.h"
-#include "quicktime/FourCharacterCode.h"
 
 namespace tallowmere::cli {
 namespace {
 
-using quicktime::FourCharacterCode;
+// A number of so many bytes, big-endian.
+std::string Number(std::size_t number, std::size_t size) {
+  std::string bytes;
+  while (size-- > 0) bytes.push_back(static_cast<char>(number >> (8 * size)));
+  return bytes;
+}
+
+std::string Atom(const char* type, std::size_t childCount, const std::string& content) {
+  constexpr std::size_t kHead = 20;
+  return Number(kHead + content.size(), 4) + type + Number(1, 4) + Number(0, 2) +
+         Number(childCount, 2) + Number(0, 4) + content;
+}
 
 // A leaf within so many atoms, in a container.
 std::string Nested(std::size_t atoms) {
-  std::string atom = quicktime::Leaf(FourCharacterCode("leaf"), "\1");
+  std::string atom = Atom("leaf", 0, "\1");
   for (std::size_t i = 0; i < atoms; ++i) {
-    atom = quicktime::Parent(FourCharacterCode("fold"), {atom});
+    atom = Atom("fold", 1, atom);
   }
   return std::string(12, '\0') + atom;
 }
@@ -41,9 +50,9 @@ void ExitWith0IfNone(const std::string& container) {
 
 // A size of 0 leads to the same atom for ever.
 TEST(AtomText, OfAnAtomThatIsShorterThanItsHeadIsNone) {
-  for (const UInt32 size : {0U, 1U, 19U}) {
+  for (const std::size_t size : {0U, 1U, 19U}) {
     std::string container = Nested(0);
-    container.replace(12, 4, quicktime::BigEndian(size));
+    container.replace(12, 4, Number(size, 4));
     EXPECT_EXIT(ExitWith0IfNone(container), testing::ExitedWithCode(0), "") << size;
   }
 }
@@ -60,8 +69,8 @@ TEST(AtomText, OfAtomsAsDeepAsAnAnswerIsLongIsNone) {
   std::string container(12, '\0');
   for (std::size_t size = kLongestSettings - kLongestSettings % kAtomHead; size > 0;
        size -= kAtomHead) {
-    container += quicktime::BigEndian(static_cast<UInt32>(size)) + "fold" + std::string(6, '\0') +
-                 quicktime::BigEndian(UInt16{1}) + std::string(4, '\0');
+    container +=
+        Number(size, 4) + "fold" + std::string(6, '\0') + Number(1, 2) + std::string(4, '\0');
   }
   EXPECT_EQ(TextOfAtoms(container), std::nullopt);
 }

@@ -25,7 +25,8 @@ int main(int count, char** arguments) {
     std::printf("%d ", error);
     const CFOwned url(error == noErr ? CFURLCreateFromFSRef(kCFAllocatorDefault, &reference)
                                      : nullptr);
-    if (const auto path = tallowmere::foundation::test::PathOf(url)) {
+    const auto path = url ? tallowmere::foundation::test::PathOf(url) : std::nullopt;
+    if (path) {
       for (const char byte : *path) std::printf("%02x", static_cast<unsigned char>(byte));
     }
     std::printf("\n");

@@ -1,9 +1,9 @@
-// Many requests to one client, of which several are under way at a time. Handlers are called in the
+// Many requests to one client, several of them under way at a time. Handlers are called in the
 // order of the requests, within Add and Finish.
 //
-// A request that the service does not survive gets the error; those behind it are asked again of a
-// new service. At most 256 requests or 64 KiB are under way, whichever is less, so that neither
-// memory nor the pipes fill up; a request that is larger goes alone.
+// A request that the service does not survive gets the error; the requests after it are asked again
+// of a new service. At most 256 requests or 64 KiB are under way, whichever is less, so that
+// neither memory nor the pipes fill up; a larger request goes alone.
 #pragma once
 
 #include <tallowmere/Client.h>
@@ -15,15 +15,15 @@ namespace tallowmere {
 
 class Batch {
  public:
-  // REQUIRES: the client outlives the batch and is used for nothing else until it has finished.
+  // REQUIRES: the client outlives the batch and is not used otherwise until the batch has finished.
   explicit Batch(Client& client);
   Batch(const Batch&) = delete;
   Batch& operator=(const Batch&) = delete;
-  // What has not been answered never is, and its handlers are not called.
+  // Drops the requests that have not been answered; their handlers are not called.
   ~Batch();
 
-  // The handler may throw: what it throws leaves Add or Finish, and the requests behind it are
-  // still asked. It must not use the batch or its client.
+  // The handler may throw: the exception leaves Add or Finish, and the requests after it are still
+  // asked. It must not use the batch or its client.
   template <class T>
   void Add(const Request<T>& request, std::type_identity_t<std::function<void(Result<T>)>> handler);
 

@@ -1,9 +1,9 @@
-// A parent's side of the service: starts it, asks it, ends it.
+// The parent's side of the service: starts it, asks it, ends it.
 //
-// The service is started with the first request. When it has died, missed a deadline or answered
-// what the protocol does not know, the request in hand gives the error and the next one starts it
-// again. A client belongs to one thread at a time, and to the process that made it. POSIX paths are
-// absolute, as Request.h says.
+// The first request starts the service. When it has died, missed a deadline or violated the
+// protocol, the current request gets the error and the next one starts the service again. A client
+// belongs to one thread at a time, and to the process that made it. POSIX paths are absolute: see
+// Request.h.
 #pragma once
 
 #include <tallowmere/Request.h>
@@ -22,20 +22,22 @@ namespace tallowmere {
 class Conversation;
 
 struct ClientOptions {
-  // The service's program. Empty: "tallowmere" beside this process's own program, else on PATH.
+  // The service's program. Empty: "tallowmere" in the folder of this process's own program, else on
+  // PATH.
   std::string service;
-  // How long one request may take, from its first byte sent, or in a batch from the answer before
-  // it if that is later, to its last byte received. A service that takes longer is killed.
+  // How long one request may take. Starts when its first byte is sent, or in a batch when the
+  // answer before it arrives, if that is later; ends when its last byte is received. A service that
+  // takes longer is killed.
   std::chrono::milliseconds deadline{10'000};
 };
 
 class Client {
  public:
   explicit Client(ClientOptions options = {});
-  // REQUIRES: a client that was moved from is only assigned to or destroyed.
+  // REQUIRES: a moved-from client is only assigned to or destroyed.
   Client(Client&& other) noexcept;
   Client& operator=(Client&& other) noexcept;
-  // Ends the service and waits for it; one that does not end within a second is killed.
+  // Ends the service and waits for it; kills it when it has not ended within a second.
   ~Client();
 
   template <class T>
@@ -55,8 +57,8 @@ class Client {
   Result<ExportSettings> GetAIFFExportSettings(const SoundFormat& sound);
 
   // The full HFS path in a buffer of `size` bytes with the NUL, outer folders replaced by "...";
-  // without `keepFolders` the volume's name alone. The error says so when no shortening makes it
-  // fit: the volume's name needs 5 bytes more than it has.
+  // without `keepFolders`, the volume's name alone. Returns an error when no shortening makes it
+  // fit; a buffer that is 6 bytes larger than the volume's name always suffices.
   Result<std::string> MakeFullPath(std::string_view path, std::uint16_t size,
                                    bool keepFolders = true);
 

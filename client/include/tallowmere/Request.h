@@ -1,12 +1,12 @@
-// One question to the service, ready to be sent, and how its answer reads. A value: it can be made
-// anywhere, kept, and asked more than once, by Client::Ask or in a Batch.
+// One question to the service, ready to be sent, and how to read its answer. A value: it can be
+// made anywhere, kept, and asked more than once, by Client::Ask or in a Batch.
 //
-// POSIX paths are absolute: what is answered to others is not to be relied on. "~" or "~user" at
-// the beginning of one stands for the home folder of the service's user, or of that user.
+// POSIX paths are absolute; do not rely on the answers to others. A leading "~" or "~user" stands
+// for the home folder of the service's user, or of the named user.
 //
-// What the service cannot be asked (a NUL within a text, but for the name in SetFileRefFromFSSpec;
-// a name or path longer than the protocol or an HFS name can be) is not sent: such a request is
-// answered at once, with what each function says.
+// A question that cannot be put to the service is answered at once, without being sent, as each
+// function states: one with a NUL within a text (except the name in SetFileRefFromFSSpec), or with
+// a name or path longer than the protocol allows or an HFS name can be.
 #pragma once
 
 #include <tallowmere/Types.h>
@@ -43,48 +43,48 @@ class Request {
 
 namespace request {
 
-// The full HFS path of the folder at a POSIX path, or of the folder that holds the file there, with
-// a colon behind it: never above 767 bytes, as folders beyond 511 bytes are left out, the outermost
-// first. The volume's name and a colon where the path of a file has a link in the place of its
-// folder. A colon for what is on no volume, and for what cannot be asked.
+// The full HFS path of the folder at a POSIX path, or of the folder that holds the file there,
+// followed by a colon. At most 767 bytes: of more than 511 bytes of folders, the outermost are left
+// out. Just the volume's name and a colon when a link stands in the place of the file's folder.
+// Just a colon for an item that is on no volume, and for a question that cannot be put.
 Request<std::string> MakeFullPath(std::string_view path);
 
-// The POSIX path of the item with that HFS path, or none. More than 255 bytes are no HFS path.
+// The POSIX path of the item with an HFS path, or nullopt. No HFS path has more than 255 bytes.
 Request<std::optional<std::string>> MakeFileRefFromPath(std::string_view hfsPath);
 
-// The volume reference number of the first mounted volume with that HFS name, or none.
-// A name above 255 bytes is no volume's.
+// The volume reference number of the first mounted volume with an HFS name, or nullopt. No volume's
+// name has more than 255 bytes.
 Request<std::optional<std::int16_t>> GetVolRefnumByHFSName(std::string_view name);
 
-// The HFS name of the volume with that number, or none. 0 asks for the volume of "/".
+// The HFS name of the volume with a number, or nullopt. 0 is the volume of "/".
 Request<std::optional<std::string>> GetHFSVolumeName(std::int16_t number);
 
-// The HFS name of the item at a POSIX path, or none for an item that does not exist.
+// The HFS name of the item at a POSIX path. Nullopt for an item that does not exist.
 Request<std::optional<std::string>> GetHFSName(std::string_view path);
 
-// The POSIX path of the item with that HFS name (or HFS path) in the folder at a POSIX path, or the
-// path that it would have. Behind a path that is no folder the name's bytes are added as they are.
-// A name above 255 bytes has none.
+// The POSIX path that the item with an HFS name (or HFS path) in the folder at a POSIX path has, or
+// would have. After a path that is not a folder's, the name's bytes are added as they are. Nullopt
+// for a name above 255 bytes.
 Request<std::optional<std::string>> AddHFSName(std::string_view folder, std::string_view name);
 
-// The record of the item at a POSIX path, or none. A new item in an existing folder has one too. So
-// has one whose path has a file or a link, also one to a folder, in the place of its folder; that
-// record leads nowhere.
+// The record of the item at a POSIX path, or nullopt. A new item in an existing folder has one too.
+// So has an item whose path has a file, or a link (even one to a folder), in the place of its
+// folder; that record leads nowhere.
 Request<std::optional<FSSpec>> GetFSSpec(std::string_view path);
 
-// The POSIX path of the item with that HFS name (or HFS path) in the folder with the id parID, or
-// the path that it would have, or none. Looks on the other volumes too. `spec.name` may have 255
-// bytes here.
+// The POSIX path that the item with an HFS name (or HFS path) in the folder with the id parID has,
+// or would have; or nullopt. Searches the other volumes too. Here `spec.name` may have up to 255
+// bytes.
 Request<std::optional<std::string>> SetFileRefFromFSSpecData(const FSSpec& spec);
 
-// The POSIX path of the item with that record, or none. Where there is no such item, it is first
-// looked for on the other volumes if so wished, and is then the path that it would have. Where
-// there is no such folder either, it is none. A name above 63 bytes is no record's.
+// The POSIX path of the item with a record. When there is no such item, it is searched for on the
+// other volumes if `searchOtherVolumes` is set; failing that, the result is the path that it would
+// have. Nullopt when there is no such folder either. No record's name has more than 63 bytes.
 Request<std::optional<std::string>> SetFileRefFromFSSpec(const FSSpec& spec,
                                                          bool searchOtherVolumes);
 
-// The settings for the export of such sound to AIFF files, to be stored or passed on as they are.
-// The service keeps some 300 bytes of each success in memory until it ends.
+// The settings for exporting such a sound to AIFF files, to be stored or passed on unchanged. For
+// each success, the service keeps some 300 bytes in memory until it ends.
 Request<ExportSettings> GetAIFFExportSettings(const SoundFormat& sound);
 
 }  // namespace request

@@ -8,13 +8,13 @@
 namespace tallowmere {
 
 struct Error {
-  std::string message;  // one sentence for a person, without a final stop
+  std::string message;  // one sentence for a person, without a full stop
 };
 
 template <class T>
 class [[nodiscard]] Result {
  public:
-  // Implicit, so that a function returns either one as it stands.
+  // Implicit, so that a function can return either one directly.
   Result(T value) : mContent(std::move(value)) {}      // NOLINT(google-explicit-constructor)
   Result(Error error) : mContent(std::move(error)) {}  // NOLINT(google-explicit-constructor)
 

@@ -1,7 +1,7 @@
-// What requests and answers are made of.
+// The parts of requests and answers.
 //
-// HFS names and HFS paths are bytes in Mac Roman, as the service has them; POSIX paths are the
-// bytes that the kernel has.
+// HFS names and HFS paths are Mac Roman bytes, as the service uses them; POSIX paths are the
+// kernel's bytes.
 #pragma once
 
 #include <cstdint>
@@ -11,7 +11,7 @@
 
 namespace tallowmere {
 
-// An item by its volume, the id of the folder that holds it and its HFS name in that folder.
+// An item, identified by its volume, the id of its parent folder and its HFS name in that folder.
 struct FSSpec {
   std::int16_t vRefNum;  // volume reference number
   std::int32_t parID;    // 32 bits: an id from 0x80000000 on is negative here
@@ -20,13 +20,13 @@ struct FSSpec {
   bool operator==(const FSSpec&) const = default;
 };
 
-// The 70 bytes of a record as the protocol has them and old programs kept them, numbers in this
-// machine's byte order: volume reference number (16 bits), parent id (32 bits), length of the name,
-// name, zeros up to 63 bytes. REQUIRES: the name has at most 63 bytes.
+// The 70 bytes of a record as in the protocol and in old programs' data, numbers in this machine's
+// byte order: volume reference number (16 bits), parent id (32 bits), length of the name, name,
+// zeros up to 63 bytes. REQUIRES: the name has at most 63 bytes.
 std::string EncodeFSSpec(const FSSpec& spec);
 
-// The record in 70 bytes, whatever lies behind its name. None for any other number of bytes and for
-// a name that would be longer than 63.
+// The record in 70 bytes, ignoring what follows its name. Nullopt for any other number of bytes and
+// for a name length above 63.
 std::optional<FSSpec> DecodeFSSpec(std::string_view bytes);
 
 // How sound is stored.
@@ -34,10 +34,10 @@ struct SoundFormat {
   std::uint32_t rate;        // in hertz × 65536
   std::uint16_t sampleSize;  // in bits
   std::uint8_t channels;
-  std::uint32_t format;  // a four-character code, the first character in the highest byte
+  std::uint32_t format;  // a four-character code, its first character in the highest byte
 };
 
-// What the exporter of AIFF files has to say to a format.
+// The AIFF exporter's answer for a sound.
 struct ExportSettings {
   std::int16_t result;  // the platform's result code, 0 for success; -2005: there is no exporter
   std::string bytes;    // an atom container; empty when there are no settings

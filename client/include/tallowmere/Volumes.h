@@ -1,4 +1,4 @@
-// Which volumes there are.
+// Lists the volumes.
 #pragma once
 
 #include <tallowmere/Client.h>
@@ -12,12 +12,12 @@ namespace tallowmere {
 
 struct Volume {
   std::int16_t number;     // volume reference number
-  std::string name;        // in Mac Roman; several volumes can have one name
-  std::string mountPoint;  // where its root folder is
+  std::string name;        // in Mac Roman; not unique
+  std::string mountPoint;  // the path of its root folder
 };
 
-// The volumes that the service and this process can reach, the one of "/" first. The service is
-// asked about each mount point, which can mean to wait for the server of a file system, as long as
+// The volumes that both the service and this process can reach, the one of "/" first. Asks the
+// service about each mount point, which may have to wait for a file system's server, for as long as
 // the client's deadline; the error then begins with the mount point.
 Result<std::vector<Volume>> ListVolumes(Client& client);
 

@@ -1,4 +1,4 @@
-// The one question about documents that the desktop's workspace service answers.
+// The one query of the desktop's workspace service that is supported.
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
@@ -7,9 +7,9 @@ namespace Workspace {
 
 // Whether the item at a POSIX path is a package: a folder that the user sees as one document. Its
 // extension is a registered document or bundle type, whatever its letter case, or it holds a file
-// Contents/Info.plist or Contents/PkgInfo. The item itself counts: a link to a package is none, and
-// a "/" at the path's end is passed over. A relative path begins at the current directory. False
-// for null, for what does not exist and when memory is short.
+// Contents/Info.plist or Contents/PkgInfo. Links are not followed, so a link to a package is not
+// one; a "/" at the path's end is ignored. A relative path starts at the current directory. False
+// for null, for what does not exist and when there is not enough memory.
 bool IsFilePackageAtPath(CFStringRef path);
 
 }  // namespace Workspace

@@ -1,12 +1,13 @@
 // Reference-counted strings and URLs with their encodings, under the host's spelling.
 //
-// Ownership: what a call with Create or Copy in its name returns belongs to the caller, who gives
-// it back with CFRelease; a call with Get in its name lends. Null means that there is no such
-// object or no memory for it. No call throws. Immutable objects and all reference counts may be
-// used from several threads at once; a mutable string belongs to one thread at a time.
+// Ownership: what a call with Create or Copy in its name returns belongs to the caller, who
+// releases it with CFRelease; a call with Get in its name only lends. Null means that there is no
+// such object, or not enough memory for it. No call throws. Immutable objects and all reference
+// counts may be used from several threads at once; a mutable string belongs to one thread at a
+// time.
 //
-// An object argument is not null unless a call says that it may be. Every allocator argument is
-// ignored: all objects come from the C++ heap.
+// An object argument must not be null unless a call allows it. Every allocator argument is ignored:
+// all objects come from the C++ heap.
 #pragma once
 
 #include <MacTypes.h>
@@ -19,7 +20,7 @@ extern "C" {
 
 using CFIndex = long;                 // a count or a position
 using CFOptionFlags = unsigned long;  // a set of bits
-using CFTypeRef = const void*;        // any object below
+using CFTypeRef = const void*;        // any of the objects below
 using CFAllocatorRef = const struct __CFAllocator*;
 using CFDictionaryRef = const struct __CFDictionary*;
 using CFStringRef = const struct __CFString*;   // an immutable string, or a mutable one only read
@@ -43,10 +44,10 @@ inline CFRange CFRangeMake(CFIndex location, CFIndex length) {
 // Adds one reference and returns the object.
 CFTypeRef CFRetain(CFTypeRef object);
 
-// Gives back one reference; the last one ends the object.
+// Releases one reference; releasing the last one destroys the object.
 void CFRelease(CFTypeRef object);
 
-// The references held at this moment; only a test has a use for it.
+// The number of references at this moment. For tests only.
 CFIndex CFGetRetainCount(CFTypeRef object);
 
 // Whether two strings have the same UTF-16 units, or two URLs the same text and the same base.
@@ -55,7 +56,7 @@ Boolean CFEqual(CFTypeRef first, CFTypeRef second);
 
 // --- Encodings --------------------------------------------------------------------------------
 
-// Which 8-bit or Unicode encoding a run of bytes is in. The numbers are the published ones.
+// The 8-bit or Unicode encoding of a run of bytes. The numbers are the published ones.
 using CFStringEncoding = UInt32;
 enum : CFStringEncoding {
   kCFStringEncodingMacRoman = 0,    // in its euro-sign revision: 0xDB is U+20AC, 0xF0 is U+F8FF
@@ -67,23 +68,23 @@ enum : CFStringEncoding {
 };
 inline constexpr CFStringEncoding kCFStringEncodingInvalidId = 0xFFFFFFFF;
 
-// The encoding of 8-bit text whose origin says nothing: Mac Roman.
+// The encoding of 8-bit text that does not tell its encoding: Mac Roman.
 CFStringEncoding CFStringGetSystemEncoding();
 
-// The encodings above, each once, ended by kCFStringEncodingInvalidId. The list is static.
+// The encodings above, each once, terminated by kCFStringEncodingInvalidId. The list is static.
 const CFStringEncoding* CFStringGetListOfAvailableEncodings();
 
-// An upper bound, in bytes, of what `length` UTF-16 units need in an encoding; kCFNotFound for an
-// encoding that is not available or a bound beyond CFIndex.
+// An upper bound, in bytes, of what `length` UTF-16 units need in an encoding. kCFNotFound for an
+// encoding that is not available and for a bound beyond CFIndex.
 CFIndex CFStringGetMaximumSizeForEncoding(CFIndex length, CFStringEncoding encoding);
 
 // --- Strings: making --------------------------------------------------------------------------
 //
 // A string is a sequence of UTF-16 units. Unpaired surrogates are kept.
 
-// The string of a constant, made on its first use and never ended. REQUIRES: a literal of UTF-8
-// text. One of up to 7 UTF-16 units needs no memory; a process without memory for a longer one
-// ends.
+// A constant string, made on first use and never destroyed. REQUIRES: a literal of UTF-8 text. One
+// of up to 7 UTF-16 units needs no memory; for a longer one, a process that runs out of memory
+// terminates.
 #define CFSTR(literal)                                                                       \
   ([]() -> CFStringRef {                                                                     \
     alignas(void*) static unsigned char sRoom[__kCFConstantStringSize];                      \
@@ -105,13 +106,12 @@ CFStringRef CFStringCreateWithCString(CFAllocatorRef allocator, const char* byte
 CFStringRef CFStringCreateWithPascalString(CFAllocatorRef allocator, ConstStr255Param bytes,
                                            CFStringEncoding encoding);
 
-// The string of a NUL-terminated file name or path as Linux stores it. Any bytes have a string:
-// each byte that is not part of valid UTF-8 becomes the lone surrogate U+DC00 + byte. Nothing is
-// normalised.
+// The string of a NUL-terminated file name or path as Linux stores it. Accepts any bytes: each byte
+// that is not part of valid UTF-8 becomes the lone surrogate U+DC00 + byte. Nothing is normalised.
 CFStringRef CFStringCreateWithFileSystemRepresentation(CFAllocatorRef allocator, const char* name);
 
 // The format with each "%@" replaced by the next argument, a CFStringRef (null reads "(null)"), and
-// "%%" by "%". Null for any other directive or an argument that is no string.
+// each "%%" by "%". Null for any other directive and for an argument that is not a string.
 // `options` is ignored.
 CFStringRef CFStringCreateWithFormat(CFAllocatorRef allocator, CFDictionaryRef options,
                                      CFStringRef format, ...);
@@ -129,15 +129,15 @@ CFMutableStringRef CFStringCreateMutableCopy(CFAllocatorRef allocator, CFIndex c
 
 // --- Strings: changing ------------------------------------------------------------------------
 
-// Adds the text of `appended`, which may be `string` itself. Without memory the string keeps its
-// text.
+// Appends the text of `appended`, which may be `string` itself. When memory runs out, the string
+// keeps its text.
 void CFStringAppend(CFMutableStringRef string, CFStringRef appended);
 
 using CFStringCompareFlags = CFOptionFlags;
 
-// Replaces every occurrence of `wanted` that lies within `range`, from the front, without looking
-// into what it has put there; returns how many there were. Without memory, for an empty `wanted`
-// and for a range outside the string: 0 and no change. REQUIRES: no options.
+// Replaces every occurrence of `wanted` that lies within `range`, from front to back, without
+// searching the replacements; returns the number of occurrences. Returns 0 and changes nothing when
+// memory runs out, for an empty `wanted` and for a range outside the string. REQUIRES: no options.
 CFIndex CFStringFindAndReplace(CFMutableStringRef string, CFStringRef wanted,
                                CFStringRef replacement, CFRange range,
                                CFStringCompareFlags options);
@@ -153,30 +153,30 @@ void CFStringGetCharacters(CFStringRef string, CFRange range, UniChar* buffer);
 // Whether the string begins with the units of `prefix`. Every string begins with the empty one.
 Boolean CFStringHasPrefix(CFStringRef string, CFStringRef prefix);
 
-// Whether the units of `wanted` occur within `range`; the first place goes to `found` unless that
-// is null. An empty `wanted` is never found. REQUIRES: no options.
+// Whether the units of `wanted` occur within `range`; the first occurrence is stored in `found`
+// unless that is null. An empty `wanted` is never found. REQUIRES: no options.
 Boolean CFStringFindWithOptions(CFStringRef string, CFStringRef wanted, CFRange range,
                                 CFStringCompareFlags options, CFRange* found);
 
-// Converts the units of `range` from the front as long as whole characters fit into `capacity`
-// bytes; returns how many units were converted, and in `used` (unless null) how many bytes that
-// took. A character that the encoding lacks becomes `lossByte`, or ends the conversion when that is
-// 0. Mac Roman takes a letter and its combining mark together. A null `buffer` only counts, without
-// limit. `isExternalRepresentation` is ignored. 0 for an encoding that is not available and for a
-// range outside the string.
+// Converts the units of `range` from the front while whole characters fit into `capacity` bytes.
+// Returns the number of units converted and stores the number of bytes in `used` (unless null). A
+// character that the encoding lacks becomes `lossByte`; when that is 0, the conversion stops there.
+// Mac Roman converts a letter and its combining mark together. With a null `buffer` it only counts,
+// without limit. `isExternalRepresentation` is ignored. Returns 0 for an encoding that is not
+// available and for a range outside the string.
 CFIndex CFStringGetBytes(CFStringRef string, CFRange range, CFStringEncoding encoding,
                          UInt8 lossByte, Boolean isExternalRepresentation, UInt8* buffer,
                          CFIndex capacity, CFIndex* used);
 
-// Writes the whole string as a Pascal string into `capacity` bytes, the length byte among them.
-// False, with the buffer untouched, when a character is not representable or the text does not fit
-// (255 bytes at most).
+// Writes the whole string as a Pascal string into `capacity` bytes, the length byte included.
+// Returns false, with the buffer untouched, when the encoding lacks a character or the text does
+// not fit (255 bytes at most).
 Boolean CFStringGetPascalString(CFStringRef string, StringPtr buffer, CFIndex capacity,
                                 CFStringEncoding encoding);
 
-// Writes the string as the NUL-terminated file name or path that Linux stores. False, with the
-// buffer untouched, when that needs more than `capacity` bytes or the string has none: it contains
-// U+0000 or an unpaired surrogate other than U+DC80 to U+DCFF.
+// Writes the string as the NUL-terminated file name or path that Linux stores. Returns false, with
+// the buffer untouched, when that needs more than `capacity` bytes or the string is not a file
+// name: it contains U+0000 or an unpaired surrogate other than U+DC80 to U+DCFF.
 Boolean CFStringGetFileSystemRepresentation(CFStringRef string, char* buffer, CFIndex capacity);
 
 // An upper bound, in bytes with the NUL, of what CFStringGetFileSystemRepresentation needs.
@@ -184,9 +184,9 @@ CFIndex CFStringGetMaximumSizeOfFileSystemRepresentation(CFStringRef string);
 
 // --- URLs -------------------------------------------------------------------------------------
 //
-// A URL is an RFC 3986 reference. A URL of a path that is not absolute remembers the current
-// directory at creation as its base. The folder mark of a URL is a path that ends in "/" or whose
-// last component is "." or "..".
+// A URL is an RFC 3986 reference. The URL of a relative path keeps the directory that was current
+// at its creation as its base. A URL carries the folder mark when its path ends in "/" or its last
+// component is "." or "..".
 
 using CFURLPathStyle = CFIndex;
 enum : CFURLPathStyle {
@@ -196,49 +196,52 @@ enum : CFURLPathStyle {
 };
 
 // The URL of a path. With `isDirectory` it ends in "/"; without, trailing "/" are removed, except
-// for "/" itself. Nothing is looked up but, for the HFS style, the mounted volumes and, for a path
-// that is not absolute, the current directory. Null for an empty path, for an unpaired surrogate
-// that stands for no byte of a file name, for an HFS path on a volume that is not mounted, climbing
-// above a volume's root or with a component "." or "..", and for a current directory that no longer
-// exists.
+// for "/" itself. Nothing is looked up except the mounted volumes, for the HFS style, and the
+// current directory, for a relative path. Null for:
+//
+//   - an empty path;
+//   - an unpaired surrogate that stands for no byte of a file name;
+//   - an HFS path on a volume that is not mounted, one that climbs above a volume's root, or one
+//     with a component "." or "..";
+//   - a relative path when the current directory no longer exists.
 CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef allocator, CFStringRef path,
                                        CFURLPathStyle style, Boolean isDirectory);
 
-// The URL whose text the bytes are: exactly what the grammar of RFC 3986 admits, absolute or
-// relative, any scheme. Null for anything else, for no bytes and for bytes not valid in the
+// The URL with this text: exactly what the grammar of RFC 3986 accepts, absolute or relative, with
+// any scheme. Null for anything else, for no bytes and for bytes that are not valid in the
 // encoding. REQUIRES: `base` is null.
 CFURLRef CFURLCreateWithBytes(CFAllocatorRef allocator, const UInt8* bytes, CFIndex length,
                               CFStringEncoding encoding, CFURLRef base);
 
-// The path of a URL in a style, percent-decoded. A relative one stays relative. Folders are marked
-// in the HFS style alone ("/" and "\" are marked as they stand). Null when the URL has no path,
-// when its path contains an encoded NUL, and when the style cannot say it: an HFS path above a
-// volume's root, a Windows path with "\" in a name or with a drive for a first folder.
+// The path of a URL in a style, percent-decoded. A relative path stays relative. Only the HFS style
+// marks folders ("/" and "\" are marked as they are). Null when the URL has no path, when its path
+// contains an encoded NUL, and when the style cannot express it: an HFS path above a volume's root,
+// a Windows path with "\" in a name or with a drive as its first folder.
 CFStringRef CFURLCopyFileSystemPath(CFURLRef url, CFURLPathStyle style);
 
-// The POSIX path of a URL and, in `isAbsolute` unless null, whether it begins with "/".
+// The POSIX path of a URL. Stores in `isAbsolute`, unless null, whether it begins with "/".
 CFStringRef CFURLCopyStrictPath(CFURLRef url, Boolean* isAbsolute);
 
 // The last component, percent-decoded and without the folder mark: "/a/b/" → "b", "/" → "/". Null
 // when the URL has no path or the component contains an encoded NUL.
 CFStringRef CFURLCopyLastPathComponent(CFURLRef url);
 
-// What follows the last "." of the last component. Null when there is none, when it is empty and
-// when the only "." is the first character.
+// What follows the last "." of the last component. Null when there is no ".", when nothing follows
+// it, and when the only "." is the first character.
 CFStringRef CFURLCopyPathExtension(CFURLRef url);
 
 // Whether the URL carries the folder mark.
 Boolean CFURLHasDirectoryPath(CFURLRef url);
 
 // The URL of the containing folder: "/a/b" → "/a/", "/a" → "/", "/" → "/", "a" → "./"; a last
-// component "." or ".." gets "../" appended. Scheme, authority, query, fragment and base stay. Null
-// when the URL has no path.
+// component "." or ".." gets "../" appended. Scheme, authority, query, fragment and base are kept.
+// Null when the URL has no path.
 CFURLRef CFURLCreateCopyDeletingLastPathComponent(CFAllocatorRef allocator, CFURLRef url);
 
-// The URL with a component added literally ("/" in it adds several), percent-encoded where the
-// syntax needs it, with the folder mark as in CFURLCreateWithFileSystemPath. All else stays. Null
-// for a null component and for one with an unpaired surrogate that stands for no byte of a file
-// name.
+// The URL with a component appended literally (with "/" in it, several), percent-encoded where the
+// syntax requires it, with the folder mark as in CFURLCreateWithFileSystemPath. All else is kept.
+// Null for a null component and for one with an unpaired surrogate that stands for no byte of a
+// file name.
 CFURLRef CFURLCreateCopyAppendingPathComponent(CFAllocatorRef allocator, CFURLRef url,
                                                CFStringRef component, Boolean isDirectory);
 
@@ -246,11 +249,11 @@ CFURLRef CFURLCreateCopyAppendingPathComponent(CFAllocatorRef allocator, CFURLRe
 //
 // One thread at a time, together with the calls of <CoreServices/CoreServices.h>.
 
-// Whether a file URL names an existing item, whose FSRef is then written. A link in the last place
-// is not followed, so a dangling link has an FSRef; links on the way are followed.
+// Whether a file URL names an existing item; if so, its FSRef is written. A link as the last
+// component is not followed, so a dangling link has an FSRef; all other links are followed.
 Boolean CFURLGetFSRef(CFURLRef url, struct FSRef* item);
 
-// The URL of an item's canonical absolute path, with the folder mark exactly for a folder; null
+// The URL of an item's canonical absolute path, with the folder mark exactly for a folder. Null
 // when the item is gone.
 CFURLRef CFURLCreateFromFSRef(CFAllocatorRef allocator, const struct FSRef* item);
 }

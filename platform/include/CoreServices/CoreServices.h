@@ -1,6 +1,6 @@
 // The File Manager and its Pascal-string helpers, under the host's spelling.
 //
-// Every call answers with a platform result code and never throws. One thread at a time.
+// Every call returns a platform result code and never throws. One thread at a time.
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
@@ -13,7 +13,7 @@ extern "C" {
 // --- Pascal strings ---------------------------------------------------------------------------
 
 // Copies the C string `source` into the Pascal string `destination`, at most 255 bytes of it.
-// REQUIRES: `destination` has room for one byte more than the text, 256 in all at the most.
+// REQUIRES: `destination` has room for the text and one byte more, 256 bytes at most.
 void c2pstrcpy(StringPtr destination, const char* source);
 
 // Copies the Pascal string `source` into `destination` as a C string.
@@ -21,15 +21,15 @@ void c2pstrcpy(StringPtr destination, const char* source);
 void p2cstrcpy(char* destination, ConstStr255Param source);
 
 // Turns the Pascal string into a C string in place. REQUIRES: its buffer has one byte more than the
-// text, which every Str255 and Str63 has.
+// text, as every Str255 and Str63 has.
 void P2CStr(StringPtr string);
 
 // --- Volumes ----------------------------------------------------------------------------------
 //
-// A mounted volume is named by its volume reference number, a negative 16-bit number that it keeps
-// while it stays mounted; 0 as an input is the volume of "/".
+// A mounted volume is identified by its volume reference number, a negative 16-bit number that it
+// keeps while it stays mounted; as an input, 0 is the volume of "/".
 
-// What PBHGetVInfoSync takes and gives.
+// The input and output of PBHGetVInfoSync.
 struct HVolumeParam {
   StringPtr ioNamePtr;  // out: the volume's name as a Str255; null: the name is not wanted
   SInt16 ioVRefNum;     // in when ioVolIndex is 0; out: the volume's number
@@ -40,13 +40,13 @@ union HParamBlockRec {
 };
 using HParmBlkPtr = HParamBlockRec*;
 
-// Name and number of the volume at an index or with a number. nsvErr when there is none (past the
-// last index, an index below 0, an unknown number); the block is then unchanged.
-// Volume names have at most 63 bytes. Asking for index 1, 2, 3, … one after the other walks one
-// state of the list, even when something is mounted in between.
+// The name and number of the volume at an index or with a number. nsvErr when there is none (an
+// index past the last or below 0, an unknown number); the block is then unchanged. Volume names
+// have at most 63 bytes. Asking for index 1, 2, 3, … in sequence walks one snapshot of the list,
+// even when something is mounted in between.
 OSErr PBHGetVInfoSync(HParmBlkPtr paramBlock);
 
-// What PBGetVolumeInfoSync takes and gives.
+// The input and output of PBGetVolumeInfoSync.
 using FSVolumeInfoBitmap = UInt32;
 enum : FSVolumeInfoBitmap { kFSVolInfoNone = 0 };
 struct FSVolumeInfoParam {
@@ -61,8 +61,8 @@ OSErr PBGetVolumeInfoSync(FSVolumeInfoParamPtr paramBlock);
 
 // --- Files ------------------------------------------------------------------------------------
 
-// A reference to an existing item, taken by CFURLGetFSRef. It follows its item through a rename
-// within the process. All bytes zero: no item.
+// A reference to an existing item, obtained with CFURLGetFSRef. It follows its item through a
+// rename within the process. All bytes zero: no item.
 struct FSRef {
   UInt8 hidden[80];
 };
@@ -81,17 +81,17 @@ static_assert(sizeof(FSSpec) == 70);
 static_assert(offsetof(FSSpec, parID) == 2);
 static_assert(offsetof(FSSpec, name) == 6);
 
-// Whether two references are to the same item, by what they hold: noErr, or errFSRefsDifferent.
-// errFSBadFSRef when one of them is null or to no item.
+// Whether both references refer to the same item, judged by their content: noErr or
+// errFSRefsDifferent. errFSBadFSRef when one of them is null or refers to no item.
 OSErr FSCompareFSRefs(const FSRef* first, const FSRef* second);
 
-// A name as UTF-16 in the HFS view: '/' is ordinary, ':' does not occur.
+// A name as UTF-16 in the HFS view: '/' is an ordinary character, ':' does not occur.
 struct HFSUniStr255 {
   UInt16 length;  // in UTF-16 units
   UniChar unicode[255];
 };
 
-// Which catalog information is wanted.
+// Selects catalog information.
 using FSCatalogInfoBitmap = UInt32;
 enum : FSCatalogInfoBitmap {
   kFSCatInfoNone = 0,
@@ -104,11 +104,14 @@ struct FSCatalogInfo {
   UInt32 nodeID;
 };
 
-// What the catalog says of an existing item; each output may be null. `catalogInfo` has the fields
-// that `whichInfo` asks for, `outName` the item's name, `fsSpec` its record: the volume and the id
-// of the folder that really holds it, and its HFS name in it, or the volume's name under parent id
-// 1 for a volume's root. `parentRef` is the folder that holds it, all zero for a volume's root.
-// fnfErr for an item that is gone; nsvErr for one on no volume.
+// What the catalog says of an existing item. fnfErr for an item that is gone; nsvErr for one on no
+// volume. Each output may be null:
+//
+//   catalogInfo  the fields that `whichInfo` selects
+//   outName      the item's name
+//   fsSpec       the item's record: its volume, the id of the folder that really holds it and its
+//                HFS name there; for a volume's root, parent id 1 and the volume's name
+//   parentRef    the folder that holds it; all zero for a volume's root
 OSErr FSGetCatalogInfo(const FSRef* ref, FSCatalogInfoBitmap whichInfo, FSCatalogInfo* catalogInfo,
                        HFSUniStr255* outName, FSSpec* fsSpec, FSRef* parentRef);
 
@@ -121,21 +124,24 @@ OSErr FSResolveNodeID(SInt16 volume, UInt32 nodeID, FSRef* outRef);
 OSErr FSMakeFSRefUnicode(const FSRef* parentRef, UniCharCount nameLength, const UniChar* name,
                          TextEncoding textEncodingHint, FSRef* newRef);
 
-// The record of an item by a volume, a folder on it and a name or HFS path, a Str255: with a colon
-// inside and none in front a full path, for which volume and folder do not count; else relative to
-// the folder. Each further adjacent colon climbs one level, a colon at the end names the folder
-// itself, an empty name is the given folder. Volume 0 and folder 0 are the current directory;
-// folder 0 is else the volume's root. Links to folders on the way are followed. fnfErr with the
-// record filled when only the last name is missing; dirNFErr when a folder on the way is missing or
-// no folder; nsvErr for an unknown volume; bdNamErr for a missing last name that no record can
-// hold.
+// The record of an item, given a volume, a folder on it and a name or HFS path, a Str255. A colon
+// within the path, and none at its beginning, makes it a full path, for which volume and folder are
+// ignored; any other is relative to the folder. Each further adjacent colon climbs one level, a
+// trailing colon names the folder itself, an empty name the given folder. Volume 0 with folder 0 is
+// the current directory; with any other volume, folder 0 is the volume's root. Links to folders are
+// followed on the way.
+//
+//   fnfErr    only the last name is missing; the record is filled in
+//   dirNFErr  a folder on the way is missing or is not a folder
+//   nsvErr    unknown volume
+//   bdNamErr  the last name is missing and no record can hold it
 OSErr FSMakeFSSpec(SInt16 vRefNum, SInt32 dirID, ConstStr255Param fileName, FSSpec* spec);
 
 // The existing item that a record names. fnfErr when there is none, dirNFErr when its folder is
 // missing, nsvErr for an unknown volume.
 OSErr FSpMakeFSRef(const FSSpec* spec, FSRef* newRef);
 
-// What PBGetCatInfoSync takes and gives for a folder by its id.
+// The input and output of PBGetCatInfoSync for a folder given by its id.
 struct DirInfo {
   StringPtr ioNamePtr;  // out: the folder's name as a Str255; null: not wanted
   SInt16 ioVRefNum;     // in: the folder's volume
@@ -148,25 +154,25 @@ union CInfoPBRec {
 };
 using CInfoPBPtr = CInfoPBRec*;
 
-// Name and parent of the folder with an id. The name has at most 255 bytes. nsvErr for an unknown
-// volume; dirNFErr when no folder has the id; paramErr for another index than -1.
+// The name and the parent of the folder with an id. The name has at most 255 bytes. nsvErr for an
+// unknown volume; dirNFErr when no folder has the id; paramErr for any index but -1.
 OSErr PBGetCatInfoSync(CInfoPBPtr paramBlock);
 
 // --- Aliases ----------------------------------------------------------------------------------
 //
-// Only a Finder alias is an alias, and Linux has none: a symbolic link is not one.
+// Only a Finder alias is an alias, and Linux has none: a symbolic link is not an alias.
 
 enum : unsigned long { kResolveAliasFileNoUI = 1 };
 
-// Puts the target of the alias `item` in its place; with `resolveAliasChains` the last one of a
-// chain. Says, each unless null, whether the target is a folder and whether `item` was an alias at
-// all: never, so noErr leaves `item` as it is, without a look at whether it still exists. fnfErr
-// when `item` is null or no item; nothing is written then.
+// Replaces the alias `item` by its target; with `resolveAliasChains`, by the last target of a
+// chain. Stores, each unless null, whether the target is a folder and whether `item` was an alias.
+// It never is, so noErr leaves `item` as it is, without checking that it still exists. Returns
+// fnfErr and writes nothing when `item` is null or no item.
 OSErr FSResolveAliasFile(FSRef* item, Boolean resolveAliasChains, Boolean* targetIsFolder,
                          Boolean* wasAliased);
 
-// The same; `mountFlags` (0 or kResolveAliasFileNoUI) says whether volumes that have to be mounted
-// may ask the user.
+// The same; `mountFlags` (0 or kResolveAliasFileNoUI) determines whether mounting a volume may ask
+// the user.
 OSErr FSResolveAliasFileWithMountFlags(FSRef* item, Boolean resolveAliasChains,
                                        Boolean* targetIsFolder, Boolean* wasAliased,
                                        unsigned long mountFlags);

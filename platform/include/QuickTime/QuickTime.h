@@ -1,8 +1,8 @@
 // Memory handles, components and movie export, under the host's spelling.
 //
-// No call throws. Every call that answers with a result code gives noErr for success, and paramErr
-// for a null pointer where none is allowed and for a component or an open instance that is none.
-// One thread at a time.
+// No call throws. Every call that returns a result code returns noErr for success, and paramErr for
+// a null pointer where none is allowed and for an invalid component or instance. One thread at a
+// time.
 #pragma once
 
 #include <MacTypes.h>
@@ -18,17 +18,17 @@ using OSType = UInt32;
 
 using Size = long;  // in bytes
 
-// A block of memory through a pointer to the pointer to its bytes.
+// A block of memory, given as a pointer to the pointer to its bytes.
 using Handle = char**;
 
-// A new block of zeros, the caller's; also one of no bytes. Null for a size below 0 and when memory
-// is short.
+// A new zero-filled block, which may be empty and which the caller owns. Null for a negative size
+// and when there is not enough memory.
 Handle NewHandleClear(Size byteCount);
 
-// Frees a block. Nothing happens for null and for what is no block.
+// Frees a block. Does nothing for null and for a handle that is not a block's.
 void DisposeHandle(Handle handle);
 
-// 0 for null and for what is no block.
+// The block's size. 0 for null and for a handle that is not a block's.
 Size GetHandleSize(Handle handle);
 
 // --- Components -------------------------------------------------------------------------------
@@ -39,7 +39,7 @@ using Component = ComponentRecord*;
 struct ComponentInstanceRecord;
 using ComponentInstance = ComponentInstanceRecord*;
 
-// What a component is, or which ones are looked for.
+// Describes a component, or the ones to look for.
 struct ComponentDescription {
   OSType componentType;          // looking: 0 for any
   OSType componentSubType;       // looking: 0 for any
@@ -54,16 +54,16 @@ enum : OSType {
   SoundMediaType = 0x736F756E,   // 'soun', a media type and its components' manufacturer
 };
 
-// The first component behind `previous` (null: the first of all) that is like `looking`. Null when
-// there is none, for null and for a `previous` that is no component.
+// The first component after `previous` (null: the first of all) that matches `looking`. Null when
+// there is none, when `looking` is null and when `previous` is not a component.
 Component FindNextComponent(Component previous, ComponentDescription* looking);
 
-// Fills the description in. The three handles must be null: no component has a name, an information
+// Fills in the description. The three handles must be null: no component has a name, an information
 // text or an icon.
 OSErr GetComponentInfo(Component component, ComponentDescription* description, Handle name,
                        Handle info, Handle icon);
 
-// A new instance, the caller's to close; null beside every result but noErr. memFullErr.
+// A new instance, which the caller closes; null with every result but noErr. May return memFullErr.
 OSErr OpenAComponent(Component component, ComponentInstance* instance);
 
 OSErr CloseComponent(ComponentInstance instance);
@@ -72,16 +72,16 @@ OSErr CloseComponent(ComponentInstance instance);
 
 using ComponentResult = SInt32;
 using MovieExportComponent = ComponentInstance;
-using UnsignedFixed = UInt32;  // 16 bits before the point, 16 behind it
+using UnsignedFixed = UInt32;  // 16 bits before the point, 16 after it
 
-// The general form of every medium's description; only passed on here.
+// The general form of every medium's description; here only passed on.
 struct SampleDescription;
 using SampleDescriptionHandle = SampleDescription**;
 
-// How sound is stored, in the layout of the published movie file format, in this machine's byte
+// How sound is stored, in the layout of the published movie file format and in this machine's byte
 // order.
 struct SoundDescription {
-  SInt32 descSize;      // of all this, in bytes
+  SInt32 descSize;      // of the whole structure, in bytes
   OSType dataFormat;    // 'NONE', 'twos', …
   SInt32 resvd1;        // 0
   SInt16 resvd2;        // 0
@@ -99,18 +99,21 @@ static_assert(sizeof(SoundDescription) == 36);
 static_assert(offsetof(SoundDescription, numChannels) == 24);
 static_assert(offsetof(SoundDescription, sampleRate) == 32);
 
-// Tells an exporter the sound that it will be given, as a block that holds a SoundDescription; the
-// block stays the caller's. paramErr for another size or medium than a sound description's, for no
-// channels, a rate of 0, or a sample size of 0 in an uncompressed format; badFormat for a format
-// that the file cannot hold. What was told before holds unless the result is noErr.
+// Tells an exporter the sound that it will be given. The block holds a SoundDescription and stays
+// the caller's. Unless the result is noErr, the exporter keeps the sound it was told before.
+//
+//   paramErr   the size or the medium is not a sound description's, there are no channels, the rate
+//              is 0, or the sample size is 0 in an uncompressed format
+//   badFormat  a format that the file cannot hold
 ComponentResult MovieExportSetSampleDescription(MovieExportComponent exporter,
                                                 SampleDescriptionHandle description,
                                                 OSType mediaType);
 
 using QTAtomContainer = Handle;
 
-// The exporter's settings for the sound that it was told, as a new block, the caller's; null beside
-// every result but noErr. paramErr when it was told none; memFullErr.
+// The exporter's settings for the sound that it was told, as a new block that the caller owns; null
+// with every result but noErr. paramErr when it was told none; memFullErr when there is not enough
+// memory.
 ComponentResult MovieExportGetSettingsAsAtomContainer(MovieExportComponent exporter,
                                                       QTAtomContainer* settings);
 }

@@ -1,16 +1,16 @@
-// What a process asks of its platform beside the host's calls. Where the host's own frameworks are,
-// all of it does nothing.
+// What a process asks of its platform besides the host's calls. On the host's own frameworks, none
+// of this has any effect.
 #pragma once
 
 namespace tallowmere::process {
 
-// While one is open, the host's calls of this thread answer as at one moment: what one call has
-// looked at serves the next, and a change that others make meanwhile may or may not be seen. Without
-// one each call looks for itself.
+// While a Moment is open, the host's calls of this thread answer as if at one moment: a call reuses
+// what an earlier one has looked up, so a concurrent change by others may or may not be seen.
+// Without a Moment, each call looks everything up anew.
 //
-// A moment keeps a few folders open, so that their volumes cannot be unmounted: open it for one
-// request, not longer. Within another it is that one. It may be ended before its scope does; the
-// end of the scope ends it, by an exception too.
+// A Moment keeps a few folders open, so that their volumes cannot be unmounted: open it for one
+// request, no longer. One opened within another joins the outer one. It ends with its scope, also
+// when an exception leaves that, or earlier with End().
 class Moment {
  public:
   Moment() noexcept;
@@ -24,14 +24,14 @@ class Moment {
   bool mIsOutermost;
 };
 
-// Locks this process in, and what it starts from now on, for good: from then on it can read files,
-// use the descriptors that it has, and ask local sockets, but not write to files, make, move or
-// remove them, run programs, start processes, signal or trace others, mount, or reach a network
-// that the machine's user database does without. What is closed answers an error, mostly EPERM or
-// EACCES; it never ends the process. docs/reliability.md tells all of it.
+// Confines this process, and every process that it starts from then on, for good. It can still read
+// files, use its open descriptors and query local sockets. It can no longer write, create, move or
+// remove files, run programs, start processes, signal or trace others, mount, or reach a network
+// that the machine's user database does not need. A forbidden call returns an error, mostly EPERM
+// or EACCES; it never ends the process. docs/reliability.md has the details.
 //
-// What the kernel does not offer is left out without a word: this never fails. To be called once,
-// by a program with one thread, before its first request. A library does not lock its users in.
+// What the kernel does not support is left out silently: this never fails. Call it once, from a
+// program with one thread, before its first request. A library must not confine its users.
 void LockIn();
 
 }  // namespace tallowmere::process

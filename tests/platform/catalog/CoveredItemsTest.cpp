@@ -223,6 +223,17 @@ TEST_F(CoveredItemsInTheCurrentFolder, HaveNoRecordWhereTheirVolumeIsMountedOver
   ExpectRoundTrip(PathTo("volume/folder/below/x"));
 }
 
+TEST_F(CoveredItemsInTheCurrentFolder, AreNotTakenForWhatTheirPathLeadsToNow) {
+  Cover("volume/folder/below/x", PathTo("other"));
+  Cover("volume", PathTo("volume"));
+  mFolder.MakeLink("link", "/proc/self/cwd");
+  const FSCatalogInfo top = InfoOf(mFolder.Path());
+  FSSpec spec{};
+  EXPECT_EQ(
+      FSMakeFSSpec(top.volume, static_cast<SInt32>(top.nodeID), Str255Of(":link:x").bytes, &spec),
+      dirNFErr);
+}
+
 // --- A link on the way --------------------------------------------------------------------------
 
 // In a folder that may be searched and not read, so that only memory can tell where an item is.

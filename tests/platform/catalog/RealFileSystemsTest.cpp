@@ -333,9 +333,9 @@ std::string CallsOfResolving(const FSSpec& spec) {
   const std::string record = folder.MakeFile("record");
   std::ofstream(record, std::ios::binary).write(reinterpret_cast<const char*>(&spec), sizeof spec);
   const std::string calls = folder.Path() / "calls";
-  RunTool({"strace", "-E", "ASAN_OPTIONS=detect_leaks=0", "-e",
-           "trace=getdents64,open_by_handle_at", "-o", calls, "sh", "-c",
-           std::string("exec ") + TALLOWMERE_RESOLVE_SPEC + " <" + record});
+  EXPECT_TRUE(RunTool({"strace", "-E", "ASAN_OPTIONS=detect_leaks=0", "-e",
+                       "trace=getdents64,open_by_handle_at", "-o", calls, "sh", "-c",
+                       std::string("exec ") + TALLOWMERE_RESOLVE_SPEC + " <" + record}));
   std::ifstream file(calls);
   return {std::istreambuf_iterator<char>(file), {}};
 }
