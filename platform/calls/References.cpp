@@ -29,7 +29,12 @@ FSRef ReferenceTo(catalog::Moment& moment, const catalog::Look& look) {
 }
 
 FSRef ReferenceTo(catalog::Moment& moment, const catalog::HeldFolder& folder) {
-  return Pack(moment.Prove(folder));
+  const kernel::Item reference = moment.Prove(folder);
+  // What is proved by its place is remembered by it, not by its numbers as it was held.
+  if (catalog::IsProvedByPlace(reference)) {
+    moment.Knowledge().Remember(reference, folder.Path(), folder.Volume().get());
+  }
+  return Pack(reference);
 }
 
 FSRef ReferenceTo(catalog::Moment& moment, const catalog::Sighting& seen) {

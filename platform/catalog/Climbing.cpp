@@ -1,7 +1,9 @@
 #include "catalog/Climbing.h"
 
+#include <algorithm>
 #include <optional>
 #include <utility>
+#include <vector>
 
 #include "catalog/Finding.h"
 #include "catalog/NameLookup.h"
@@ -21,30 +23,50 @@ bool PathTellsNames(const Moment& moment, const HeldFolder& folder) {
          foundation::IsWithin(folder.Path(), volume.MountPoint());
 }
 
+// The path of the folder that holds the one at a path.
+std::string_view HolderOf(std::string_view path) {
+  return path.substr(0, std::max<std::size_t>(path.rfind('/'), 1));
+}
+
 // The remembered id of the folder that holds the one at a path; none when it is not remembered, or
 // from another place.
 std::optional<std::uint32_t> RememberedParent(Moment& moment, const volumes::Volume& volume,
                                               std::string_view path, std::uint32_t id) {
-  if (foundation::FolderOf(path) == volume.MountPoint()) return names::kRootFolderID;
+  if (HolderOf(path) == volume.MountPoint()) return names::kRootFolderID;
   const auto* const place = moment.Knowledge().LastPlaceOf(id, volume);
   const bool isKnown = place != nullptr && place->path == path && place->parent != 0 &&
                        place->parent != names::kRootFolderID;
   return isKnown ? std::optional(place->parent) : std::nullopt;
 }
 
-// One step along the path of a held folder, without a look.
-std::optional<ClimbedFolder> StepAlongPath(Moment& moment, Moment::Climb climb) {
-  const volumes::Volume& volume = *climb.folder.Volume();
-  const std::string_view path = std::string_view(climb.folder.Path()).substr(0, climb.length);
-  const std::string_view linuxName = *foundation::LastComponent(path);
-  auto name = names::UnmistakableHFSName(linuxName, names::kLongestStr255Name);
-  if (!name) return std::nullopt;
-  const auto parent = RememberedParent(moment, volume, path, climb.id);
-  if (!parent) return std::nullopt;
-  climb.length = foundation::FolderOf(path).size();
-  climb.id = *parent;
-  moment.OpenClimb() = std::move(climb);
-  return ClimbedFolder{*std::move(name), *parent};
+// What the path of a held folder tells of it and of every folder above it, the root's own last
+// child first; nothing unless all of it is told. A remembered parent can be another folder by now:
+// whoever looked for one by its id, half-way up, would leave the path.
+std::vector<ClimbedFolder> StepsAlongPath(Moment& moment, const HeldFolder& folder) {
+  if (!PathTellsNames(moment, folder)) return {};
+  const volumes::Volume& volume = *folder.Volume();
+  std::vector<ClimbedFolder> steps;
+  std::uint32_t id = folder.ID();
+  std::string_view path = folder.Path();
+  for (; id != names::kRootFolderID; path = HolderOf(path)) {
+    auto name =
+        names::UnmistakableHFSName(path.substr(path.rfind('/') + 1), names::kLongestStr255Name);
+    const auto parent = name ? RememberedParent(moment, volume, path, id) : std::nullopt;
+    if (!parent) return {};
+    steps.push_back({*std::move(name), *parent});
+    id = *parent;
+  }
+  std::reverse(steps.begin(), steps.end());
+  return steps;
+}
+
+// The next step; the climb ends with the last. REQUIRES: something is left.
+ClimbedFolder TakeStep(std::optional<Moment::Climb>& climb) {
+  ClimbedFolder step = std::move(climb->along.back());
+  climb->along.pop_back();
+  climb->id = step.parent;
+  if (climb->along.empty()) climb.reset();
+  return step;
 }
 
 // A folder and the folder that holds it.
@@ -94,7 +116,7 @@ kernel::Result<ClimbedFolder> StepByLook(Moment& moment, const HeldFolder& folde
   moment.Knowledge().RememberParent(step.folder.Place(), *holder.Volume(), holder.ID());
   moment.OpenClimb().reset();
   if (PathTellsNames(moment, holder)) {
-    moment.OpenClimb() = Moment::Climb{holder, holder.Path().size(), holder.ID()};
+    moment.OpenClimb() = Moment::Climb{holder, holder.ID(), {}};
   }
   return ClimbedFolder{*name, holder.ID()};
 }
@@ -103,18 +125,16 @@ kernel::Result<ClimbedFolder> StepByLook(Moment& moment, const HeldFolder& folde
 
 kernel::Result<ClimbedFolder> ClimbFrom(Moment& moment, volumes::VolumeNumber number,
                                         std::uint32_t id) {
-  const auto& climb = moment.OpenClimb();
+  auto& climb = moment.OpenClimb();
   const bool goesOn = climb && climb->id == id && climb->folder.Volume()->Number() == number;
-  if (goesOn) {
-    if (auto step = StepAlongPath(moment, *climb)) return *std::move(step);
-  }
-  const auto folder = HoldFolderWithID(moment, number, id);
+  if (goesOn && !climb->along.empty()) return TakeStep(climb);
+  const auto folder =
+      goesOn ? kernel::Result<HeldFolder>(climb->folder) : HoldFolderWithID(moment, number, id);
   if (!folder) return folder.Error();
-  if (PathTellsNames(moment, *folder)) {
-    auto step = StepAlongPath(moment, {*folder, folder->Path().size(), folder->ID()});
-    if (step) return *std::move(step);
-  }
-  return StepByLook(moment, *folder);
+  auto steps = StepsAlongPath(moment, *folder);
+  if (steps.empty()) return StepByLook(moment, *folder);
+  climb = Moment::Climb{*folder, id, std::move(steps)};
+  return TakeStep(climb);
 }
 
 }  // namespace tallowmere::catalog

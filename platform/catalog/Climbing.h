@@ -9,21 +9,15 @@
 
 namespace tallowmere::catalog {
 
-// A folder as a climb comes to it.
-struct ClimbedFolder {
-  std::string name;      // in HFS form, at most 255 bytes
-  std::uint32_t parent;  // id of the folder that holds it; kParentOfRootID at the top
-};
-
 // Name and parent of the folder with an id on the volume with a number. kNoVolume; kNoFolder when
 // no folder has the id.
 //
 // The names of a climb within one moment are those of one walk of the kernel: the one that led to
 // the folder where it began, along its path. That holds for a folder on the mount of the volume's
-// place, as long as every name is plain and the parents' ids are remembered; they are not verified,
-// and serve to ask for the next folder of this climb alone. Where it does not hold, each folder is
-// found by its id and looked up in the folder that holds it. Where the folder that holds it is on
-// another volume, the climb ends.
+// place, as long as every name up to the root is plain and the ids of all parents are remembered;
+// those are not verified, and serve to ask for the next folder of this climb alone. Where one of
+// them is missing, the folder is found by its id and looked up in the folder that holds it. Where
+// the folder that holds it is on another volume, the climb ends.
 kernel::Result<ClimbedFolder> ClimbFrom(Moment& moment, volumes::VolumeNumber number,
                                         std::uint32_t id);
 

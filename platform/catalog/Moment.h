@@ -57,6 +57,12 @@ class Look {
   std::shared_ptr<const State> mState;
 };
 
+// A folder as a climb comes to it.
+struct ClimbedFolder {
+  std::string name;      // in HFS form, at most 255 bytes
+  std::uint32_t parent;  // id of the folder that holds it; kParentOfRootID at the top
+};
+
 class Moment {
  public:
   // REQUIRES: `catalog` outlives the moment.
@@ -125,11 +131,11 @@ class Moment {
 
   // --- Climbs ---------------------------------------------------------------------------------
 
-  // How far the names of a path have been told from a folder upwards.
+  // Where a climb goes on.
   struct Climb {
-    HeldFolder folder;   // whose path tells the names
-    std::size_t length;  // of that path, up to and with the folder that is next
-    std::uint32_t id;    // of the folder that is next, from memory
+    HeldFolder folder;                 // where it began; while nothing is left, the next one itself
+    std::uint32_t id;                  // of the next folder
+    std::vector<ClimbedFolder> along;  // what the path tells of the folders left, the next one last
   };
   std::optional<Climb>& OpenClimb() { return mClimb; }
 

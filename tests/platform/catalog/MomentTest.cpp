@@ -54,6 +54,21 @@ class AMoment : public testing::Test {
     const OSErr error = FSGetCatalogInfo(&item, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr);
     return error == noErr ? NameOf(spec) : "(" + std::to_string(error) + ")";
   }
+  // The folders that a climb from the one of an item comes to, each with a colon.
+  std::string FoldersOf(const std::string& name) const {
+    const FSSpec spec = SpecOf(PathTo(name));
+    std::string folders;
+    std::uint32_t id = ParentOf(spec);
+    for (int steps = 0; id != 1 && steps < 10; ++steps) {
+      Str255 folder = {};
+      CInfoPBRec block{};
+      block.dirInfo = {folder, spec.vRefNum, -1, static_cast<SInt32>(id), 0};
+      if (PBGetCatInfoSync(&block) != noErr) return "(error):" + folders;
+      folders = std::string(names::TextOfPascal(folder)) + ":" + folders;
+      id = static_cast<std::uint32_t>(block.dirInfo.ioDrParID);
+    }
+    return folders;
+  }
   // What asking about an item once more costs, after a first time.
   std::optional<std::vector<long>> CallsOfTheSecondQuestion(bool inMoment) const {
     std::optional<Moment> moment;
@@ -113,18 +128,25 @@ TEST_F(AMoment, AnswersAsOutside) {
 
 TEST_F(AMoment, ClimbsFromAFolderToTheRoot) {
   const Moment moment;
-  const FSSpec spec = SpecOf(PathTo("first/a/b/x"));
-  std::string names;
-  std::uint32_t id = ParentOf(spec);
-  for (int steps = 0; id != 1 && steps < 10; ++steps) {
-    Str255 name = {};
-    CInfoPBRec block{};
-    block.dirInfo = {name, spec.vRefNum, -1, static_cast<SInt32>(id), 0};
-    ASSERT_EQ(PBGetCatInfoSync(&block), noErr);
-    names = std::string(names::TextOfPascal(name)) + ":" + names;
-    id = static_cast<std::uint32_t>(block.dirInfo.ioDrParID);
-  }
-  EXPECT_EQ(names, "first:a:b:");
+  EXPECT_EQ(FoldersOf("first/a/b/x"), "first:a:b:");
+}
+
+TEST_F(AMoment, ClimbsThroughTheFoldersThatHoldItNow) {
+  mFolder.MakeFolder("first/a/b/c");
+  mFolder.MakeFile("first/a/b/c/x");
+  const auto climb = [this](const std::string& name) {
+    const Moment moment;
+    return FoldersOf(name);
+  };
+  ASSERT_EQ(climb("first/a/b/c/x"), "first:a:b:c:");
+  ASSERT_EQ(climb("first/a/b/c/x"), "first:a:b:c:");
+  // The folder that held "c" goes elsewhere and is seen there; "c" stays where it was.
+  Rename("first/a/b", "first/elsewhere");
+  mFolder.MakeFolder("first/a/b");
+  Rename("first/elsewhere/c", "first/a/b/c");
+  mFolder.MakeFile("first/elsewhere/y");
+  ASSERT_EQ(climb("first/elsewhere/y"), "first:elsewhere:");
+  EXPECT_EQ(climb("first/a/b/c/x"), "first:a:b:c:");
 }
 
 // --- What does not ------------------------------------------------------------------------------

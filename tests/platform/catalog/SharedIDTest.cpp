@@ -1,5 +1,7 @@
 // Items whose numbers mix to one id, on a file system whose numbers tell items apart and on one
 // whose numbers are not relied on.
+#include <Tallowmere/Process.h>
+
 #include <chrono>
 #include <filesystem>
 #include <optional>
@@ -114,6 +116,25 @@ INSTANTIATE_TEST_SUITE_P(OnEachKind, ASharedID,
                            const bool isOnDisk = on.param == NumberedFileSystem::On::kBlockDevice;
                            return isOnDisk ? "WithTrustedNumbers" : "WithOthers";
                          });
+
+// The platform takes a folder that is asked for as one for itself, not for an item of another.
+TEST(FoldersWithTheSameNumbers, EachHaveARecord) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const NumberedFileSystem numbered;
+  if (!numbered.IsMounted()) GTEST_SKIP() << "no FUSE here";
+  constexpr std::uint64_t kNumber = 500;
+  const std::string first = numbered.MakeFolder("first", kNumber);
+  const std::string second = numbered.MakeFolder("second", kNumber);
+  for (const auto& [path, name] :
+       {std::pair(first, "first@500"), std::pair(second, "second@500")}) {
+    const process::Moment moment;
+    FSRef item{};
+    ASSERT_TRUE(CFURLGetFSRef(foundation::test::MakeUrl(path, true).Get(), &item));
+    FSSpec spec{};
+    EXPECT_EQ(FSGetCatalogInfo(&item, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr), noErr);
+    EXPECT_EQ(NameOf(spec), name);
+  }
+}
 
 }  // namespace
 }  // namespace tallowmere::test
