@@ -6,12 +6,11 @@
 // files. It is assumed to remember, at no cost, all that an earlier request has found out; the
 // mount table is read once. There are two floors:
 //
-// - The lean one makes the fewest calls that an answer can rest on if nothing changes between them:
-// one poll on the mount table where the answer depends on which volumes there are, and one look
-// (statx) at everything that the answer claims to exist.
-//
-// - The sound one makes the calls that an answer needs to be right whatever happens meanwhile,
-// about an item that is some seconds old on a disk.
+//   - The lean one makes the fewest calls that an answer can rest on if nothing changes between
+//     them: one poll on the mount table where the answer depends on which volumes there are, and
+//     one look (statx) at everything that the answer claims to exist.
+//   - The sound one makes the calls that an answer needs to be right whatever happens meanwhile,
+//     about an item that is some seconds old on a disk.
 //
 // ITEM, which the requests are about, is the canonical path of an existing item whose name is also
 // its HFS name.
