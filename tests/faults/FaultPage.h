@@ -37,8 +37,7 @@ struct FaultPage {
   // Set by the library.
   std::atomic<std::uint32_t> calls;
   std::atomic<std::uint32_t> allocations;
-  std::atomic<std::uint32_t>
-      rests;  // how often the service has begun to wait for a request; a futex
+  std::atomic<std::uint32_t> rests;  // how often the service began to wait for a request; a futex
   std::atomic<std::int64_t> liveAllocations;
   std::atomic<std::uint32_t> failed;       // whether the chosen one has failed
   SeenCall failedCall;                     // that call
