@@ -1,12 +1,12 @@
-// The floor of a pass over a volume.
+// The lower bound of a pass over a volume.
 #pragma once
 
 #include <filesystem>
 
 namespace tallowmere::benchmark {
 
-// How many entries there are below a folder: opens, reads to the end and closes each folder, and
-// looks at nothing.
+// Returns the number of entries below a folder. Opens, reads to the end and closes each folder, and
+// examines no item.
 long WalkBare(const std::filesystem::path& top);
 
 }  // namespace tallowmere::benchmark

@@ -14,10 +14,10 @@ namespace {
 constexpr long kFoldersInAHundred = 11;
 constexpr std::size_t kFoldersInAFolder = 8;
 
-// Without a limit on how much there can be in it; what is there takes memory.
+// No limit on the contents, which take memory only as they are made.
 constexpr const char* kNoLimit = "size=0,nr_inodes=0,mode=0755";
 
-// Memory's inode numbers count from 1, and those below this are not the node ids of their items.
+// Inode numbers in memory start at 1; those below this are not the node ids of their items.
 constexpr std::uint64_t kReservedInodes = 16;
 
 }  // namespace

@@ -1,4 +1,4 @@
-// Very many files and folders to look for something in.
+// Very many files and folders to search for something.
 #pragma once
 
 #include <filesystem>
@@ -14,23 +14,24 @@
 namespace tallowmere::benchmark {
 
 struct Tree {
-  std::vector<std::filesystem::path> folders;  // breadth first, the first is the top
+  std::vector<std::filesystem::path> folders;  // breadth first, starting with the top
   std::vector<std::filesystem::path> files;
 };
 
-// A new file.
+// Creates an empty file.
 void MakeEmptyFile(const std::filesystem::path& path);
 
-// So many entries below `top`, which is there: of 100 entries 11 are folders, each of which has up
-// to eight folders and, as nearly as can be, the same number of files.
+// Makes this many entries in `top`, an existing folder: of 100 entries, 11 are folders. Each folder
+// has up to eight folders, and as close as possible to the same number of files.
 Tree MakeTree(const std::filesystem::path& top, long entries);
 
-// A volume in memory, which ends with its object. Items in it have inode numbers that are node ids.
+// A volume in memory, which lives as long as its object. Its items have inode numbers that are node
+// ids.
 class MemoryVolume {
  public:
   MemoryVolume();
 
-  // Where mounting is not permitted it is a folder on the volume of temporary files.
+  // Where mounting is not permitted, it is a folder on the volume of temporary files.
   bool IsMounted() const { return mMount.IsMounted(); }
   const std::filesystem::path& Path() const { return mFolder.Path(); }
 
@@ -39,7 +40,7 @@ class MemoryVolume {
   test::ScopedMount mMount;
 };
 
-// A volume with a big tree, made when first asked for. Everybody can read it.
+// A volume with a big tree, made on first use. Everybody can read it.
 struct BigTree {
   MemoryVolume volume;
   Tree tree;

@@ -7,7 +7,7 @@
 namespace tallowmere::benchmark {
 namespace {
 
-// How many requests one server is asked before it is the next one's turn.
+// How many requests one server is asked before the next one has its turn.
 constexpr int kTurn = 50;
 
 }  // namespace
@@ -19,7 +19,7 @@ std::vector<Cost> Compete(const std::vector<Contestant>& contestants, int reques
     std::vector<double> processor;
   };
   std::vector<Times> times(contestants.size());
-  for (int asked = -turn; asked < requests; asked += turn) {  // the first turn is to warm up
+  for (int asked = -turn; asked < requests; asked += turn) {  // the first turn is a warm-up
     for (std::size_t i = 0; i < contestants.size(); ++i) {
       const auto& [server, request, answerSize] = contestants[i];
       const double usedBefore = server->ProcessorTime();

@@ -1,5 +1,5 @@
-// Several servers are asked one request after the other, in turn, so that whatever the machine does
-// meanwhile happens to all of them.
+// Asks several servers one request after the other, in turns, so that whatever else the machine
+// does affects them all alike.
 #pragma once
 
 #include <cstddef>
@@ -16,14 +16,14 @@ struct Contestant {
   std::size_t answerSize;  // in bytes
 };
 
-// For one request, in microseconds.
+// The cost of one request, in microseconds.
 struct Cost {
-  double roundTrip;  // from its first byte written to the last byte of its answer read
+  double roundTrip;  // from the first byte written to the last byte of the answer read
   double processor;  // user and system time of the server
 };
 
-// Asks each so many requests. Costs are medians: of all round trips, and of the processor time over
-// some dozens of requests.
+// Asks each server this many requests. Costs are medians: of all round trips, and of the processor
+// time over some dozens of requests.
 std::vector<Cost> Compete(const std::vector<Contestant>& contestants, int requests);
 
 }  // namespace tallowmere::benchmark

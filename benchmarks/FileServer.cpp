@@ -32,14 +32,14 @@ std::string Packet(char type, const std::string& fields) {
   return Number(static_cast<std::uint32_t>(1 + fields.size())) + type + fields;
 }
 
-// How many bytes follow on the length that begins an answer.
+// The number of bytes that follow the length at the beginning of an answer.
 std::size_t SizeOf(std::string_view length) {
   std::size_t size = 0;
   for (const char byte : length) size = size << 8 | static_cast<unsigned char>(byte);
   return size;
 }
 
-// With the size of the answer, found out by asking another server.
+// A question with the size of its answer, found by asking another server.
 Question Measured(std::string request) {
   FileServer server;
   const std::size_t size = SizeOf(server.Process().Ask(request, kLengthSize));

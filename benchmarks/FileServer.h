@@ -16,10 +16,10 @@ class FileServer {
  public:
   static bool IsInstalled();
 
-  // Started and initialised. REQUIRES: it is installed.
+  // Starts and initialises the server. REQUIRES: it is installed.
   FileServer();
 
-  // The attributes of an item, a link itself (LSTAT). REQUIRES: it exists.
+  // The attributes of an item, or of a link itself (LSTAT). REQUIRES: it exists.
   static Question Attributes(const std::string& path);
 
   // The canonical path of a canonical path (REALPATH).

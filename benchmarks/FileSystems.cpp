@@ -1,5 +1,5 @@
-// From a node id to its item on kinds of file systems, where what the kernel says of an item is not
-// the same proof everywhere.
+// From a node id to its item on various kinds of file systems, which differ in what proves an
+// item's identity.
 #include <sys/mount.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -28,12 +28,12 @@ using Path = std::filesystem::path;
 constexpr double kMicrosecondsInAMillisecond = 1000;
 constexpr std::uintmax_t kGigabyte = std::uintmax_t{1} << 30;
 
-// The way back from an item's record.
+// The question that leads from an item's record back to its path.
 Question WayBack(const Item& item) {
   return QuestionOf(protocol::kRequestSetFileRefFromFSSpec, item);
 }
 
-// In microseconds. Fails when the answer is not that path.
+// In microseconds. Fails when the answer is not the item's path.
 double TimeOfWayBack(Server& service, const Item& item) {
   const auto [request, answerSize] = WayBack(item);
   const double begin = Now();
@@ -52,7 +52,7 @@ double MedianOfWayBack(Server& service, const Item& item) {
 
 // --- Warm, by kind ------------------------------------------------------------------------------
 
-// Folders beside the one that is asked for, which a look at the whole volume would see.
+// Other folders beside the requested one; a pass over the whole volume would visit them.
 constexpr long kFoldersBeside = 6000;
 
 void MakeFolder(const Path& path) {
@@ -66,17 +66,17 @@ std::uint64_t InodeOf(const Path& path) {
 }
 
 struct Kind {
-  const char* type;                  // as mount calls it
-  const char* what;                  // is measured
-  std::vector<std::string> command;  // that fills an image; none for tmpfs
-  std::uintmax_t size;               // of the image, sparse
-  bool isSubvolume;    // which counts its inode numbers from where the volume's own does
-  std::uint64_t from;  // inode numbers of the folder that is asked for
-  std::uint64_t to;    // and beyond
+  const char* type;                  // as for mount(2)
+  const char* what;                  // what is measured
+  std::vector<std::string> command;  // fills an image; empty for tmpfs
+  std::uintmax_t size;               // of the sparse image
+  bool isSubvolume;                  // its inode numbers start where the volume's own do
+  std::uint64_t from;                // the lowest inode number of the requested folder
+  std::uint64_t to;                  // one above the highest
 };
 
-// The first is what the others are compared with. Two TiB of xfs have four allocation groups, the
-// third of which begins with the number 2^31.
+// The others are compared with the first. Two TiB of xfs have four allocation groups, the third of
+// which begins with the number 2^31.
 std::vector<Kind> Kinds() {
   constexpr std::uint64_t kFirst = 16;
   constexpr std::uint64_t kBit31 = std::uint64_t{1} << 31;
@@ -92,7 +92,7 @@ std::vector<Kind> Kinds() {
            2 * kBit31}};
 }
 
-// Makes "outer", and "inner" in it, on a new volume. New folders of xfs go to one allocation group
+// Makes "outer", and "inner" in it, on a new volume. xfs places new folders in one allocation group
 // after the other.
 void MakeInner(const Kind& kind, const Path& outer) {
   constexpr int kMostTries = 64;
@@ -112,7 +112,7 @@ void MakeInner(const Kind& kind, const Path& outer) {
   Fail(std::string("an inode number for ") + kind.what);
 }
 
-// A mounted volume of some kind with a file in "outer/inner" and many folders beside that.
+// A mounted volume of some kind with a file in "outer/inner" and many folders beside those.
 class KindVolume {
  public:
   KindVolume(const Kind& kind, long foldersBeside) {
@@ -125,7 +125,7 @@ class KindVolume {
     }
   }
 
-  // Why it cannot be; empty when it is there.
+  // Why the volume could not be made; empty when it was.
   const std::string& Obstacle() const { return mObstacle; }
   Path File() const { return mTop / "outer" / "inner" / "a track.aif"; }
 
@@ -158,7 +158,7 @@ class KindVolume {
   std::string mObstacle;
 };
 
-// One volume over another, by turns.
+// Measures one volume against another, in turns.
 std::vector<Figure> WarmBeside(const Settings& settings, const std::string& what, const Path& file,
                                const Path& reference) {
   const std::vector<Item> items{AskAbout(settings.service, file),
@@ -221,19 +221,19 @@ struct PrivilegedKind {
   double bar;
 };
 
-// With room for so many empty files, sparse.
+// Sparse, with room for this many empty files.
 std::vector<PrivilegedKind> PrivilegedKinds(long inodes) {
   return {{"ext4", {"mkfs.ext4", "-q", "-F", "-N", std::to_string(inodes)}, 3},
           {"btrfs", {"mkfs.btrfs", "-q", "-f", "-m", "single"}, 10},
           {"xfs", {"mkfs.xfs", "-q", "-f"}, 10}};
 }
 
-// Files in folders that are spread over the tree, each of another folder.
+// Files in different folders that are spread over the tree.
 std::vector<Path> SpreadFiles(const Tree& tree) {
   constexpr std::size_t kMost = 20;
   const std::size_t step = std::max<std::size_t>(tree.files.size() / kMost, 1);
   std::vector<Path> paths;
-  // Not the first ones, which are in the top.
+  // Skips the first files, which are in the top.
   for (std::size_t i = step - 1; i < tree.files.size(); i += step) {
     if (paths.empty() || tree.files[i].parent_path() != paths.back().parent_path()) {
       paths.push_back(tree.files[i]);
@@ -242,7 +242,7 @@ std::vector<Path> SpreadFiles(const Tree& tree) {
   return paths;
 }
 
-// Cold is the first question of a new service for another folder's id than the root's.
+// Cold means the first question to a new service about the id of a folder other than the root.
 std::vector<Figure> PrivilegedOn(const PrivilegedKind& kind, const Settings& settings) {
   const std::string what = std::string("node id, cold, privileged, ") + kind.type + " / warm";
   constexpr std::uintmax_t kBytesOfAFile = 8192;
@@ -285,7 +285,7 @@ std::vector<Figure> Privileged(const Settings& settings) {
 
 // --- Where numbers prove nothing ----------------------------------------------------------------
 
-// A folder shown a second time by a file system in user space, which ends with its object.
+// A folder shown a second time by a file system in user space, as long as the object lives.
 class UserSpaceMount {
  public:
   UserSpaceMount(const Path& source, Path place)

@@ -1,19 +1,19 @@
 // The floors: what no service for these requests can do without.
 //
-// tallowmere_floor PARENT_PROCESS_ID ITEM VOLUME_NAME [sound]: reads, field by field, a request (0
-// and unknown codes end it), writes an answer of constant content field by field, and looks for its
-// parent, with the very calls that the service makes for that. In between it makes calls on files,
-// given a memory without cost of everything that an earlier request has told; the mount table is
-// read once. There are two floors:
+// tallowmere_floor PARENT_PROCESS_ID ITEM VOLUME_NAME [sound]: reads a request field by field (0
+// and unknown codes end it), writes an answer of constant content field by field, and checks for
+// its parent, with exactly the calls that the service makes for that. In between it makes calls on
+// files. It is assumed to remember, at no cost, all that an earlier request has found out; the
+// mount table is read once. There are two floors:
 //
-// - The lean one makes the fewest calls that an answer can rest on if nothing changes between two
-//   of them: one poll on the mount table where the answer depends on which volumes there are, and
-//   one look (statx) at everything that the answer claims to exist.
-// - The sound one makes the calls that an answer needs which is right whatever happens meanwhile,
-//   about an item that is some seconds old on a disk.
+//   - The lean one makes the fewest calls that an answer can rest on if nothing changes between
+//     them: one poll on the mount table where the answer depends on which volumes there are, and
+//     one look (statx) at everything that the answer claims to exist.
+//   - The sound one makes the calls that an answer needs to be right whatever happens meanwhile,
+//     about an item that is some seconds old on a disk.
 //
-// ITEM is the canonical path of an existing item with a name that is its HFS name, the one that the
-// requests are about.
+// ITEM, which the requests are about, is the canonical path of an existing item whose name is also
+// its HFS name.
 #include <fcntl.h>
 #include <linux/openat2.h>
 #include <poll.h>
@@ -35,15 +35,15 @@ namespace {
 
 using namespace tallowmere::protocol;
 
-// What is done for a request, a character each. Fields: digits are so many bytes, 'r' a record, 's'
-// a counted string; in an answer 'i' is the path of the item, 'n' its name, 'v' the volume's, 'b'
-// as many bytes as the request's last 16-bit field says, and 'e' the settings. Looks:
+// The steps of a request, one character each. Fields: a digit is that many bytes, 'r' a record, 's'
+// a counted string; in an answer, 'i' is the path of the item, 'n' its name, 'v' the volume's name,
+// 'b' as many bytes as the request's last 16-bit field says, and 'e' the settings. Calls on files:
 //
-//   i  at the item, at its path                l  the same by lstat, as the host's logic asks
-//   f  at the item's folder, at its path       d  the same by lstat
-//   o  opens the folder, by a path without links; it is held
-//   h  at the folder that is held              n  at the item, by its name in that folder
-//   c  closes the folder                       p  the poll on the mount table
+//   i  statx of the item, by its path          l  the same by lstat, as the host's logic asks
+//   f  statx of the item's folder, by path     d  the same by lstat
+//   o  opens the folder by a path without links and holds it
+//   h  statx of the held folder                n  statx of the item, by its name in that folder
+//   c  closes the folder                       p  polls the mount table
 struct Steps {
   const char* fields;
   const char* lean;
@@ -51,31 +51,31 @@ struct Steps {
   const char* answer;
 };
 
-// Sound answers: "oh" finds out which folder it is and which mount it is on; "p" comes behind it,
-// as a mount keeps its number only while something on it is held; "n" is the item with the name in
-// that very folder; a path in the answer takes one look along all of it, "i", that finds that item.
+// Sound answers: "oh" finds out which folder it is and which mount it is on. "p" follows, as a
+// mount keeps its number only while something on it is held. "n" is the item with the name in that
+// folder. A path in the answer takes one look along all of it, "i", which must find that item.
 constexpr auto kSteps = std::to_array<Steps>({
     {},
     // Lean: what kind of item is there, and is its folder the one whose names are remembered?
-    // Sound: the host's logic asks whether each of both is a folder; the names are those of the
+    // Sound: the host's logic asks whether each of the two is a folder; the names are those of the
     // walk to the folder, and the item tells which volume it is on.
     {"s21", "ifp", "ldohpnc", "2b"},
-    // Plain names are the names of Linux: the kernel walks the whole path in one look.
+    // Plain names are the Linux names: the kernel walks the whole path in one look.
     {"ss1", "pi", "ohpnic", "2i"},
     {"s", "p", "p", "2"},
     {"2", "p", "p", "1v"},
-    // The kernel says too whether the item is a mounted root, which is called as its volume. The
-    // host's logic asks first whether the item exists.
+    // The kernel also tells whether the item is a mounted root, which has its volume's name. The
+    // host's logic first asks whether the item exists.
     {"s2", "ip", "lohpnc", "1n"},
-    // The item is there and so is its folder. Whether that is on a volume decides what a name is.
-    // The host's logic asks first whether the folder is one.
+    // The item is there and so is its folder. What a name means depends on whether that is on a
+    // volume. The host's logic first asks whether the folder is one.
     {"ss1", "ip", "dohpnic", "1i"},
-    // There is the item, and the record has the number of its folder.
+    // The item is there, and the record has the id of its folder.
     {"s", "ifp", "ohpnc", "1r"},
-    // The folder with the id is where it was, and has the item; the next one too.
+    // The folder with the id is where it was, and has the item; so does the next one.
     {"24s1", "pfi", "ohpnic", "1i"},
     {"r11", "pfi", "ohpnic", "1i"},
-    // Asks nobody.
+    // Makes no calls on files.
     {"4414", "", "", "2e"},
 });
 static_assert(kSteps.size() == kLastRequestCode + 1);
@@ -83,7 +83,7 @@ static_assert(kSteps.size() == kLastRequestCode + 1);
 constexpr std::uint32_t kExportSettingsSize = 144;
 
 char taken[1 << 16];   // the last field of a request
-char answer[1 << 16];  // what answers consist of
+char answer[1 << 16];  // the source of all answers
 
 void Take(std::size_t size) {
   for (std::size_t count = 0; count < size;) {

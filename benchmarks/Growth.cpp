@@ -25,7 +25,7 @@ std::string OwnID() {
   return std::to_string(getpid());
 }
 
-// Adds the round trip of each contestant to the series of the same place: the median of the runs.
+// Adds each contestant's round trip, the median of the runs, to the series with the same index.
 void AddRoundTrips(const Settings& settings, const std::vector<Contestant>& contestants,
                    double size, std::vector<Series>& series) {
   std::vector<std::vector<double>> times(contestants.size());
@@ -42,15 +42,15 @@ Contestant AskedOf(Server& server, const Question& question) {
   return {&server, question.request, question.answerSize};
 }
 
-// An item whose path has so many components: where the settings' folder is below that, one of the
-// folders on the way to it.
+// An item whose path has this many components. When the settings' folder is below that depth, one
+// of the folders on the way to it.
 std::filesystem::path ItemAtDepth(const Settings& settings, int depth) {
   std::filesystem::path item;
   for (const auto& part : settings.folder) {
     item /= part;
     if (std::distance(item.begin(), item.end()) > depth) return item;
   }
-  // Short names, so that a full HFS path has room for all of them.
+  // The names are short, so that a full HFS path has room for all of them.
   while (std::distance(item.begin(), item.end()) < depth) item /= "d";
   std::filesystem::create_directories(item);
   item /= "a track.aif";
@@ -105,7 +105,8 @@ Plot FolderSize(const Settings& settings) {
   return {"Cost by size of the folder", "entries in the folder", kRoundTripLabel, series};
 }
 
-// Among so many mounts more than the machine has, of which the last one is asked for by its name.
+// Measures with up to this many mounts more than the machine has, asking for the last one by its
+// name.
 Plot Mounts(const Settings& settings, long most) {
   std::vector<Series> series{{"code 3, last volume", {}}, {"code 4", {}}, {"code 7", {}}};
   const auto folder = settings.folder / "mounts";
@@ -167,7 +168,7 @@ void PlotGrowth(const Settings& settings, const std::filesystem::path& folder) {
   Write(Depth(settings), folder / "growth-depth.svg");
   Write(FolderSize(settings), folder / "growth-folder.svg");
   if (test::EnterOwnMountNamespace()) {
-    // At least two sizes, so that there is a curve.
+    // At least two sizes, to get a curve.
     Write(Mounts(settings, std::max(settings.entries / 1000, 10L)), folder / "growth-mounts.svg");
   } else {
     std::printf("Cost by number of mounts: skipped, mounting is not permitted\n");

@@ -49,7 +49,7 @@ std::vector<double> InAProcess(const std::function<std::vector<double>()>& measu
   const pid_t child = fork();
   if (child < 0) Fail("fork");
   if (child == 0) {
-    // Nothing that belongs to the parent may be cleaned up here, hence _exit.
+    // _exit, as nothing that belongs to the parent may be cleaned up here.
     try {
       const std::vector<double> values = measure();
       const auto size = static_cast<ssize_t>(values.size() * sizeof(double));

@@ -1,4 +1,4 @@
-// Measuring in a process of its own, and where and as whom a process runs.
+// Measuring in a process of its own; choosing a process's core and privileges.
 #pragma once
 
 #include <functional>
@@ -7,23 +7,23 @@
 
 namespace tallowmere::benchmark {
 
-// What `measure` gives in a forked process; what it throws fails here too. REQUIRES: this process
-// has one thread.
+// Returns what `measure` returns in a forked process; fails here too when it throws. REQUIRES: this
+// process has one thread.
 std::vector<double> InAProcess(const std::function<std::vector<double>()>& measure);
 
-// From now on this process may do no more than a user without any files of his own.
+// Takes from this process, for good, every right beyond those of a user without files.
 void DropPrivilege();
 
-// This process and what it starts: on the last core that it may use, where the fewest interrupts
-// are; and again on all that it could use before.
+// PinToOneCore keeps this process, and what it starts, on the last core that it may use, which has
+// the fewest interrupts. The other lets it use all its cores again.
 void PinToOneCore();
 void UseAllCores();
 
-// Runs a program to its end, its output thrown away, and gives the time that takes, in
-// microseconds. Fails when the program does.
+// Runs a program to its end, discarding its output; returns the time taken in microseconds. Fails
+// when the program does.
 double TimeOf(const std::vector<std::string>& command);
 
-// Whether PATH has a program.
+// Whether a program is on PATH.
 bool IsOnPath(const std::string& program);
 
 }  // namespace tallowmere::benchmark

@@ -1,4 +1,5 @@
-// What is measured: named measures, each of which gives one or more figures, lines of the table.
+// What is measured: named measures, each of which returns one or more figures, the lines of the
+// table.
 #pragma once
 
 #include <chrono>
@@ -10,29 +11,30 @@
 
 namespace tallowmere::benchmark {
 
-// What the measures share.
+// What all measures share.
 struct Settings {
   std::string service;               // the program
-  int runs;                          // of which a figure is the median
-  int requests;                      // of each server in a run
-  long entries;                      // in a big tree
-  std::chrono::milliseconds settle;  // how long a new file is left alone
-  std::filesystem::path folder;      // for whatever files are needed; removed by somebody else
+  int runs;                          // a figure is their median
+  int requests;                      // to each server in a run
+  long entries;                      // of a big tree
+  std::chrono::milliseconds settle;  // the time before a new file is used
+  std::filesystem::path folder;      // for all files needed; removed by the caller
 };
 
 // A line of the table.
 struct Figure {
   std::string what;
-  std::optional<double> value;  // none when it was skipped
+  std::optional<double> value;  // nullopt when it was skipped
   std::string unit;             // empty for a ratio
-  std::string remark;           // what the ratio is of, or why it was skipped
-  std::optional<double> bar;    // none where the figure is only shown
-  bool isLeast = false;         // the bar is the least that the value may be, not the most
+  std::string remark;           // what the ratio relates, or why it was skipped
+  std::optional<double> bar;    // nullopt when the figure is only shown
+  bool isLeast = false;         // the bar is a minimum, not a maximum
 
   bool IsMet() const;
 };
 
-// The median of the ratios of each run; `unit` is that of the two. REQUIRES: as many of both.
+// The median of the ratios of each run; `unit` is that of the two series. REQUIRES: both series
+// have the same length.
 Figure RatioOf(const std::string& what, const std::vector<double>& firsts,
                const std::vector<double>& seconds, const std::string& unit);
 Figure Skipped(const std::string& what, const std::string& why);
@@ -40,26 +42,27 @@ Figure AtMost(double bar, Figure figure);
 Figure AtLeast(double bar, Figure figure);
 
 struct Measure {
-  std::string name;  // to choose it by
+  std::string name;  // selects it on the command line
   std::function<std::vector<Figure>(const Settings&)> take;
 };
 
-// Each request against the floor, "code1" to "code10".
+// Each request compared with the floor: "code1" to "code10".
 std::vector<Measure> RoundTripMeasures();
 
-// The service as a process, "start", "batch" and "memory".
+// The service as a process: "start", "batch" and "memory".
 std::vector<Measure> ProcessMeasures();
 
-// From a node id to its item, "warm" and "cold".
+// From a node id to its item: "warm" and "cold".
 std::vector<Measure> NodeIDMeasures();
 
-// The same on kinds of file systems, "kinds", "privileged" and "untrusted".
+// The same on various kinds of file systems: "kinds", "privileged" and "untrusted".
 std::vector<Measure> FileSystemMeasures();
 
-// The middle one; of an even number the upper one of two. REQUIRES: there is one.
+// The middle value; of an even number of values, the upper of the two. REQUIRES: at least one
+// value.
 double Median(std::vector<double> values);
 
-// In microseconds, since some moment.
+// The time in microseconds since a fixed moment.
 double Now();
 
 }  // namespace tallowmere::benchmark

@@ -53,7 +53,7 @@ bool MayRunWithoutPrivilege(const std::string& program) {
          })[0] == 1.0;
 }
 
-// In milliseconds: the answer about the item; in MiB: what the service has more behind it.
+// The time to the answer about the item, in milliseconds, and the service's memory growth, in MiB.
 std::vector<double> FindCold(const Settings& settings, const Item& item) {
   DropPrivilege();
   Server service(settings.service, {std::to_string(getpid())});
@@ -69,7 +69,7 @@ std::vector<double> FindCold(const Settings& settings, const Item& item) {
           (service.Memory("VmRSS") - memoryBefore) / 1024};
 }
 
-// A file in a folder, one in the first of its own folders where it has any.
+// A file in a folder; if possible, one in the first of its subfolders.
 std::filesystem::path FileBelow(const std::filesystem::path& folder) {
   const auto folders = FoldersIn(folder);
   for (const auto& entry :
@@ -79,8 +79,8 @@ std::filesystem::path FileBelow(const std::filesystem::path& folder) {
   Fail("no file below " + folder.string());
 }
 
-// The folder that a pass finds last, whatever its order: down from the top, always into the folder
-// below which a new service takes longest to find something.
+// The last folder that a pass visits, whatever its order: descends from the top, always into the
+// folder below which a new service takes longest to find something.
 std::filesystem::path LastFolder(const Settings& settings, const std::filesystem::path& top) {
   std::filesystem::path last = top;
   for (auto folders = FoldersIn(top); !folders.empty(); folders = FoldersIn(last)) {

@@ -21,7 +21,7 @@ using benchmark::State;
 constexpr const char* kPlainName = "Mix 1 (final).aif";
 constexpr const char* kAccentedName = "Été à Genève.aif";
 
-// A new file and what the host calls it.
+// A new file and its identities on the host.
 struct File {
   explicit File(const char* name = kPlainName) : path(folder.MakeFile(name)) {
     if (!CFileRef(path.c_str(), false).GetFSRef(&reference) ||
@@ -59,8 +59,8 @@ void AllVolumes(State& state) {
 }
 BENCHMARK(AllVolumes);
 
-// Files are asked for in turn; beyond some thousands the places of the first are forgotten
-// meanwhile.
+// Asks for files in turn; with more than some thousands of them, the places of the first are
+// forgotten meanwhile.
 void ReferenceOfAPath(State& state) {
   const test::TemporaryFolder folder;
   std::vector<std::string> paths;

@@ -21,7 +21,7 @@ constexpr double kLineOfText = 18;
 
 constexpr std::array<const char*, 4> kColours{"#3b82c4", "#d9772b", "#3f9b57", "#b0569e"};
 
-// One axis: from values to pixels, its ends at powers of ten.
+// One axis: maps values to pixels, with its ends at powers of ten.
 class Axis {
  public:
   Axis(double least, double most, double begin, double end)
@@ -30,7 +30,7 @@ class Axis {
         mBegin(begin),
         mEnd(end) {}
 
-  // As powers of ten.
+  // Exponents of ten.
   int Low() const { return mLow; }
   int High() const { return mHigh; }
   double At(double value) const {

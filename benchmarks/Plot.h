@@ -1,5 +1,5 @@
-// A small plot of how cost grows, as SVG: both axes logarithmic, colours that are seen on light and
-// on dark ground.
+// A small plot of how cost grows, as SVG: both axes logarithmic, colours visible on light and dark
+// backgrounds.
 #pragma once
 
 #include <filesystem>
@@ -13,7 +13,7 @@ struct Point {
   double cost;
 };
 
-// Points in the order of their size, at least two of different size; everything is above 0.
+// Points in order of size, at least two of them of different size; all values are above 0.
 struct Series {
   std::string name;
   std::vector<Point> points;
@@ -27,10 +27,10 @@ struct Plot {
 };
 
 // The exponent b of cost = a · size^b, fitted by least squares of the logarithms over the larger
-// half of the points, where what the cost begins with counts least.
+// half of the points, where constant costs count least.
 double Exponent(const Series& series);
 
-// The exponent of each series stands beside its name.
+// Writes the plot, with the exponent of each series beside its name.
 void WritePlot(const Plot& plot, const std::filesystem::path& file);
 
 }  // namespace tallowmere::benchmark

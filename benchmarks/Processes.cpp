@@ -13,7 +13,7 @@
 namespace tallowmere::benchmark {
 namespace {
 
-// From nothing to the answer to a first request, in microseconds.
+// From no process to the answer to the first request, in microseconds.
 double TimeToStart(const std::string& program, const std::vector<std::string>& arguments,
                    const Question& question) {
   const double begin = Now();
@@ -22,7 +22,7 @@ double TimeToStart(const std::string& program, const std::vector<std::string>& a
   return Now() - begin;
 }
 
-// The first request reads the mount table, for both.
+// The first request reads the mount table, in both programs.
 std::vector<Figure> Start(const Settings& settings) {
   const Item item = AskAbout(settings.service, SettledFile(settings, 6));
   const Question question = QuestionOf(protocol::kRequestGetFSSpec, item);
@@ -45,7 +45,7 @@ std::vector<Figure> Start(const Settings& settings) {
                  RatioOf("start, to the answer of a first request / floor", service, floor, "µs"))};
 }
 
-// Times of requests asked one at a time and in one batch, in microseconds for each, by turns.
+// The time per request in microseconds, asked one at a time and in one batch, in turns.
 std::vector<double> TimesOfBatch(const Settings& settings, const std::string& path) {
   Client client(ClientOptions{settings.service});
   const auto request = request::GetFSSpec(path);
@@ -85,7 +85,7 @@ std::vector<Figure> InBatches(const Settings& settings) {
 
 constexpr int kMixedRequests = 10'000;
 
-// Of all codes in turn, about items in several folders.
+// Asks requests of all codes in turn, about items in several folders.
 std::vector<Figure> Memory(const Settings& settings) {
   constexpr double kKiBInAMiB = 1024;
   const std::filesystem::path top = settings.folder / "mixed";

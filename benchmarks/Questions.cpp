@@ -17,7 +17,7 @@ using namespace tallowmere::test;
 
 constexpr std::size_t kSettingsSize = 144;
 
-// The answer to one question of a service of its own, its trailer looked for and taken off.
+// The answer of a new service to one question, without its trailer, which is checked.
 std::string AnswerTo(Server& service, const Question& question) {
   std::string answer(service.Ask(question.request, question.answerSize));
   if (!answer.ends_with(kTrailer)) Fail("an answer of an unexpected size");
@@ -36,7 +36,7 @@ Number NumberAt(const std::string& bytes, std::size_t offset) {
   return number;
 }
 
-// The name is as long as it is said to be in the answer.
+// The answer tells the length of the name.
 std::string NameOfVolume(Server& service, int number) {
   const std::size_t head = 1 + sizeof(std::uint16_t);
   const std::string size(service.Ask(VolumeNameRequest(number), head));
@@ -53,7 +53,7 @@ Item ItemWithRecord(Server& service, const std::filesystem::path& path) {
   return item;
 }
 
-// Of the fields of an answer, in bytes.
+// The size of an answer's fields in bytes.
 std::size_t SizeOfAnswer(protocol::RequestCode code, const Item& item) {
   switch (code) {
     case protocol::kRequestQuit:
@@ -84,7 +84,7 @@ std::size_t SizeOfAnswer(protocol::RequestCode code, const Item& item) {
 
 std::filesystem::path SettledFile(const Settings& settings, int components) {
   std::filesystem::path path = settings.folder;
-  // The root directory counts as a component here, the file does not yet.
+  // The root directory counts as a component here; the file does not yet.
   for (auto depth = std::distance(path.begin(), path.end()); depth < components; ++depth) {
     path /= "folder " + std::to_string(depth);
   }

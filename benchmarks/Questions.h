@@ -1,4 +1,4 @@
-// The requests about one real item, and how long their answers are.
+// The requests about one real item, and the sizes of their answers.
 #pragma once
 
 #include <cstddef>
@@ -14,15 +14,15 @@ namespace tallowmere::benchmark {
 
 using test::Item;
 
-// The path of an empty file in the settings' folder that has so many components, or the fewest that
-// there can be; made unless it is there, and left alone until it is as any old file.
+// The path of an empty file in the settings' folder with this many components, or the fewest
+// possible. Makes the file unless it exists, and waits until it is treated as any old file.
 std::filesystem::path SettledFile(const Settings& settings, int components);
 
-// Asks the service at `program` about an existing item. Fails where its answers are not those for
-// an item with a plain name.
+// Asks the service at `program` about an existing item. Fails when the answers are not those for an
+// item with a plain name.
 Item AskAbout(const std::string& program, const std::filesystem::path& path);
 
-// Existing items with their paths and records alone, told by the service at `program`.
+// Existing items with only their paths and records, as told by the service at `program`.
 std::vector<Item> RecordsOf(const std::string& program,
                             const std::vector<std::filesystem::path>& paths);
 
@@ -31,7 +31,7 @@ struct Question {
   std::size_t answerSize;  // in bytes
 };
 
-// REQUIRES: any code but kRequestQuit.
+// REQUIRES: the code is not kRequestQuit.
 Question QuestionOf(protocol::RequestCode code, const Item& item);
 
 }  // namespace tallowmere::benchmark

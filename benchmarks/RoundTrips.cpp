@@ -13,7 +13,7 @@ namespace {
 
 struct Row {
   protocol::RequestCode code;
-  int components;  // of the path that is asked about
+  int components;  // of the requested path
   double barOfRoundTrip;
   double barOfProcessor;
 };
@@ -31,13 +31,13 @@ constexpr auto kRows = std::to_array<Row>({
     {protocol::kRequestGetAIFFExportSettings, 6, 1.10, 1.20},
 });
 
-// Of the processor time over that of the sound floor, for every code.
+// For the processor time relative to the sound floor, for every code.
 constexpr double kBarOverSoundFloor = 1.25;
 
 // The contestants, in their order.
 enum : std::size_t { kService, kFloor, kSoundFloor, kPeer };
 
-// One contestant over another in each run.
+// The ratio of one contestant to another in each run.
 Figure RatioIn(const std::vector<std::vector<Cost>>& runs, const std::string& what,
                std::size_t first, std::size_t second, double Cost::*kind) {
   std::vector<double> firsts;
@@ -49,7 +49,7 @@ Figure RatioIn(const std::vector<std::vector<Cost>>& runs, const std::string& wh
   return RatioOf(what, firsts, seconds, "µs");
 }
 
-// The question of the file server that comes next to a request.
+// The file server's question that comes closest to a request.
 std::optional<Question> PeerQuestion(protocol::RequestCode code, const std::string& path) {
   switch (code) {
     case protocol::kRequestGetFSSpec:
@@ -85,7 +85,7 @@ std::vector<Figure> Take(const Row& row, const Settings& settings) {
   Server service(settings.service, {parent});
   Server floor(TALLOWMERE_FLOOR, {parent, item.path, item.volumeName});
   Server soundFloor(TALLOWMERE_FLOOR, {parent, item.path, item.volumeName, "sound"});
-  // From then on the folder is a remembered one.
+  // From here on the folder is a remembered one.
   const Question record = QuestionOf(protocol::kRequestGetFSSpec, item);
   service.Ask(record.request, record.answerSize);
 

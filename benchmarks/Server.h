@@ -1,4 +1,4 @@
-// A program under measurement: a process that answers requests on its standard input and output.
+// A program being measured: a process that answers requests on its standard input and output.
 #pragma once
 
 #include <sys/types.h>
@@ -16,17 +16,17 @@ class Server {
   Server(const std::string& program, const std::vector<std::string>& arguments);
   Server(const Server&) = delete;
   Server& operator=(const Server&) = delete;
-  // Closes the pipes and waits for the end of the process.
+  // Closes the pipes and waits for the process to end.
   ~Server();
 
-  // Writes a request and reads an answer of so many bytes, which is valid until the next one. Fails
+  // Writes a request and reads an answer of this size, which is valid until the next call. Fails
   // when there is none.
   std::string_view Ask(std::string_view request, std::size_t answerSize);
 
-  // What the process has used so far, user and system, in microseconds.
+  // The processor time of the process so far, user and system, in microseconds.
   double ProcessorTime() const;
 
-  // A line of /proc/PID/status in KiB: "VmHWM" is the most memory it ever had, "VmRSS" what it has.
+  // A line of /proc/PID/status in KiB: "VmHWM" is its peak memory, "VmRSS" its current memory.
   double Memory(std::string_view line) const;
 
  private:
@@ -37,7 +37,7 @@ class Server {
   std::string mAnswer;
 };
 
-// Throws std::system_error: what the benchmark needs has failed; errno tells why.
+// Throws std::system_error with errno: the benchmark lacks something that it needs.
 [[noreturn]] void Fail(const std::string& what);
 
 }  // namespace tallowmere::benchmark

@@ -1,4 +1,4 @@
-// tallowmere_bench: takes the measures in one run and prints them as one table, in Markdown.
+// tallowmere_bench: takes the measures in one run and prints them as one Markdown table.
 
 #include <signal.h>
 #include <sys/utsname.h>
@@ -19,7 +19,7 @@
 namespace tallowmere::benchmark {
 namespace {
 
-// A newborn item has to be told by more than its time of birth for two seconds.
+// For two seconds, a newborn item's time of birth is not enough to identify it.
 constexpr std::chrono::milliseconds kTimeToSettle{3'200};
 
 std::string Format(const char* format, double value) {
@@ -43,7 +43,7 @@ std::string VerdictOf(const Figure& figure) {
   return figure.IsMet() ? "met" : "NOT MET";
 }
 
-// Where every character of UTF-8 is one column wide.
+// Assumes that every character of UTF-8 is one column wide.
 std::string Padded(std::string text, std::size_t width) {
   for (const char byte : std::string(text)) width += (byte & 0xC0) == 0x80 ? 1 : 0;
   if (text.size() < width) text.resize(width, ' ');
@@ -86,11 +86,11 @@ std::vector<Measure> AllMeasures() {
   return all;
 }
 
-// What is asked for on the command line.
+// The command line's choices.
 struct Choices {
   Settings settings{TALLOWMERE_SERVICE, 5, 5000, 1'000'000, kTimeToSettle, {}};
   bool isTrial = false;
-  std::vector<std::string> measures;  // none: all
+  std::vector<std::string> measures;  // empty: all
   std::string json;
   std::string plots;
 

@@ -22,10 +22,10 @@ Result<std::vector<Volume>> ListVolumes(Client& client) {
     if (!record && mountPoint == kRoot) return record.Failure();
     if (!record) return Error{mountPoint + ": " + record.Failure().message};
     if (!*record || (*record)->parID != kParentOfRoots) continue;
-    auto& [number, parent, name] = **record;
+    FSSpec& root = **record;
     const bool isKnown = std::any_of(volumes.begin(), volumes.end(),
-                                     [&](const Volume& one) { return one.number == number; });
-    if (!isKnown) volumes.push_back({number, std::move(name), std::move(mountPoint)});
+                                     [&](const Volume& one) { return one.number == root.vRefNum; });
+    if (!isKnown) volumes.push_back({root.vRefNum, std::move(root.name), std::move(mountPoint)});
   }
   return volumes;
 }

@@ -15,7 +15,8 @@ constexpr std::size_t kLongestInput = 4096;
 
 enum Kind { kFullPath, kPathByResult, kStringByFlag, kVolumeNumber, kSpec, kSettings, kKinds };
 
-// The bytes at the very end of a block, which is never reallocated: one byte too far is outside.
+// The bytes at the very end of a block that is never reallocated, so that reading one byte too far
+// leaves the block.
 std::string_view AtTheEndOfABlock(std::string_view bytes) {
   static const auto block = std::make_unique<char[]>(kLongestInput);
   char* const begin = block.get() + kLongestInput - bytes.size();
@@ -23,15 +24,15 @@ std::string_view AtTheEndOfABlock(std::string_view bytes) {
   return {begin, bytes.size()};
 }
 
-// The number of two bytes at a place, the low one first.
+// The number in two bytes at an offset, the low byte first.
 std::uint16_t NumberAt(std::string_view bytes, std::size_t at) {
   const auto low = static_cast<unsigned char>(bytes[at]);
   const auto high = static_cast<unsigned char>(bytes[at + 1]);
   return static_cast<std::uint16_t>(low | high << 8);
 }
 
-// Whether the text stands where the answer has its string, with its NUL and its count. None is
-// given when there is to be none, and for an empty one.
+// Whether the text is the string at this place of the answer, without its NUL and count. A string
+// that is absent or empty must give no text.
 void CheckString(std::string_view answer, std::size_t at, bool isThere,
                  const std::optional<std::string>& text) {
   const std::uint16_t count = NumberAt(answer, at);
@@ -42,7 +43,7 @@ void CheckString(std::string_view answer, std::size_t at, bool isThere,
   Check(answer.substr(at + 2, count) == std::string_view(text->c_str(), text->size() + 1));
 }
 
-// Reads an answer of a kind and compares what it gives with the bytes.
+// Reads an answer of a kind and compares the results with the bytes.
 void ReadAndCompare(AnswerReader& answer, std::string_view bytes, unsigned kind,
                     std::uint16_t size) {
   const auto isWhole = [&answer] {
@@ -99,11 +100,11 @@ void ReadAndCompare(AnswerReader& answer, std::string_view bytes, unsigned kind,
   }
 }
 
-// What a reader has made of some bytes.
+// What a reader made of some bytes.
 struct Outcome {
   std::string_view fault;
-  std::size_t size = 0;    // of the whole answer, else 0
-  std::size_t needed = 0;  // of an answer that goes on, else 0
+  std::size_t size = 0;    // of a whole answer; otherwise 0
+  std::size_t needed = 0;  // of an incomplete answer; otherwise 0
 };
 
 Outcome Read(std::string_view bytes, unsigned kind, std::uint16_t size) {
@@ -119,7 +120,7 @@ Outcome Read(std::string_view bytes, unsigned kind, std::uint16_t size) {
   return {{}, answer.Size(), 0};
 }
 
-// Whether the outcome for the first `count` bytes says nothing else than that for all of them.
+// Checks that the outcome for the first `count` bytes does not contradict that for all of them.
 void CheckBeginning(std::string_view all, const Outcome& outcome, std::size_t count, unsigned kind,
                     std::uint16_t size) {
   const Outcome beginning = Read(AtTheEndOfABlock(all.substr(0, count)), kind, size);
@@ -137,7 +138,7 @@ void CheckBeginning(std::string_view all, const Outcome& outcome, std::size_t co
 }  // namespace
 }  // namespace tallowmere::fuzz
 
-// The kind, the buffer's size for a full path, where to cut, and then the answer.
+// The input: the kind, the buffer's size for a full path, where to cut, then the answer.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t dataSize) {
   using namespace tallowmere::fuzz;
   if (dataSize > kLongestInput) return 0;

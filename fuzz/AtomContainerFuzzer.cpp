@@ -13,8 +13,8 @@
 namespace tallowmere::fuzz {
 namespace {
 
-// Any bytes are read to the end or refused. What the strict reader takes the lenient one shows, a
-// line for each atom, unless it is too deep.
+// Any bytes are read to the end or refused. What the strict reader accepts, the lenient one shows
+// with a line for each atom, unless it is too deep.
 std::size_t CountAtoms(const test::Atom& atom) {
   std::size_t count = 1;
   for (const test::Atom& child : atom.children) count += CountAtoms(child);
@@ -38,7 +38,7 @@ void CheckReading(std::string_view container) {
   Check(static_cast<std::size_t>(lines) == CountAtoms(*root));
 }
 
-// The settings for a sound that is taken hold that sound, and nothing less than all of them is a
+// The settings for an accepted sound contain that sound, and no proper beginning of them is a
 // container.
 void CheckExport(const SoundDescription& sound, std::size_t cut) {
   quicktime::AIFFExporter exporter;
@@ -74,7 +74,7 @@ void CheckWriting(std::string_view data) {
 }  // namespace
 }  // namespace tallowmere::fuzz
 
-// What the rest is, and then that: a container, the fields of a sound, or data for atoms.
+// The input: a kind, then a container, the fields of a sound, or data for atoms.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   using namespace tallowmere::fuzz;
   Input input(data, size);

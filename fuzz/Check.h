@@ -1,4 +1,4 @@
-// What a target says of its finding, and how it takes its input apart.
+// How a target reports a finding, and how it takes its input apart.
 #pragma once
 
 #include <cstdint>
@@ -8,10 +8,10 @@
 
 namespace tallowmere::fuzz {
 
-// What there is to do before the engine stores a finding.
+// Called before the engine stores a finding.
 inline void (*gBeforeFinding)() = [] {};
 
-// Ends the program, which makes the input a finding, where what must be true is not.
+// Ends the program, which makes the input a finding, unless `isTrue`.
 inline void Check(bool isTrue, const char* file = __builtin_FILE(), int line = __builtin_LINE()) {
   if (isTrue) return;
   std::fprintf(stderr, "%s:%d: this must be true and is not\n", file, line);
@@ -19,8 +19,8 @@ inline void Check(bool isTrue, const char* file = __builtin_FILE(), int line = _
   std::abort();
 }
 
-// The bytes of one execution. The engine gives them in a block of their exact size, so a read
-// behind the end of Rest() is one behind the block, which the sanitizer sees.
+// The bytes of one execution. The engine passes them in a block of exactly their size, so a read
+// past the end of Rest() leaves the block, which the sanitizer detects.
 class Input {
  public:
   Input(const std::uint8_t* data, std::size_t size)
@@ -34,7 +34,7 @@ class Input {
     return byte;
   }
 
-  // Two bytes, the lower one first.
+  // Two bytes, the low one first.
   unsigned TakeTwoBytes() {
     const unsigned low = TakeByte();
     return low | TakeByte() << 8;

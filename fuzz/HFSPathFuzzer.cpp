@@ -1,4 +1,4 @@
-// The text of HFS and Windows paths to Linux paths and back: any bytes as each of the three.
+// Converts HFS and Windows paths to Linux paths and back: any bytes as each of the three.
 #include <optional>
 #include <string>
 
@@ -48,7 +48,7 @@ void CheckWindowsPath(std::string_view bytes) {
 }  // namespace
 }  // namespace tallowmere::fuzz
 
-// What the path is, and then the path.
+// The input: the kind of path, then the path.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   using namespace tallowmere::fuzz;
   Input input(data, size);

@@ -14,7 +14,7 @@ namespace {
 
 using volumes::Mount;
 
-// As the kernel escapes a field.
+// Escapes a field as the kernel does.
 void AppendEscaped(std::string& line, std::string_view field) {
   for (const char c : field) {
     if (std::string_view(" \t\n\\#").find(c) == std::string_view::npos) {
@@ -43,7 +43,7 @@ bool IsSame(const Mount& a, const Mount& b) {
          a.mountPoint == b.mountPoint && a.type == b.type;
 }
 
-// Whether the mounts are all read from their lines.
+// Checks that all mounts are read from their lines.
 void CheckLinesOf(const std::vector<Mount>& mounts) {
   std::string table;
   for (const Mount& mount : mounts) AppendLine(table, mount);
@@ -58,7 +58,8 @@ void CheckMounts(const std::vector<Mount>& mounts) {
   CheckLinesOf(mounts);
 }
 
-// Whether two mounts are read whose places have the text, which the kernel could tell.
+// Checks that two mounts whose mount points contain the text are read, if the kernel could report
+// them.
 void CheckMountsAt(std::string_view text) {
   const std::string path = "/" + std::string(text.substr(0, text.find('\0')));
   CheckLinesOf(
@@ -91,7 +92,7 @@ void CheckVolumes(const std::vector<Mount>& mounts, std::size_t root) {
 }  // namespace
 }  // namespace tallowmere::fuzz
 
-// Which mount the process's root is in, and then the table.
+// The input: the mount that contains the process's root, then the table.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   using namespace tallowmere::fuzz;
   Input input(data, size);

@@ -1,5 +1,5 @@
-// Names between Linux, text and Pascal strings, in both directions: any bytes as the one and as the
-// other.
+// Converts names between Linux, text and Pascal strings, in both directions: any bytes as each of
+// them.
 #include <LegacyHFSBridge.h>
 #include <tallowmere/Types.h>
 
@@ -21,7 +21,7 @@ namespace {
 using names::kLongestSpecName;
 using names::kLongestStr255Name;
 
-// Any bytes are text, and Mac Roman text at that, and come back.
+// Any bytes are text, and also Mac Roman text, and survive the round trip.
 void CheckText(std::string_view bytes) {
   Check(text::FileNameOfText(foundation::TextOfFileName(bytes)) == bytes);
   const std::u16string text = text::DecodeMacRoman(bytes);
@@ -30,7 +30,7 @@ void CheckText(std::string_view bytes) {
   Check(HFSNameOfUtf8(Utf8OfHFSName(bytes)) == bytes);
 }
 
-// A Linux name's HFS names are within their bounds, and the plain one is that of a Linux name that
+// A Linux name's HFS names are within their limits, and the plain one belongs to a Linux name that
 // it can stand for.
 void CheckLinuxName(std::string_view name, std::uint32_t id, std::size_t marks) {
   for (const std::size_t limit : {kLongestSpecName, kLongestStr255Name}) {
@@ -52,7 +52,7 @@ void CheckLinuxName(std::string_view name, std::uint32_t id, std::size_t marks) 
   }));
 }
 
-// What an HFS name can stand for is called so.
+// Each name that an HFS name can stand for has that HFS name.
 void CheckHFSName(std::string_view name) {
   const auto spelled = names::SpellHFSName(name);
   if (spelled.precomposed.empty()) return;
@@ -63,7 +63,7 @@ void CheckHFSName(std::string_view name) {
   Check(names::PlainHFSName(spelled.decomposed, name.size()) == name);
 }
 
-// C strings to Pascal strings and back.
+// Converts C strings to Pascal strings and back.
 void CheckPascalStrings(std::string_view bytes) {
   const std::string text(bytes.substr(0, bytes.find('\0')));
   Str255 pascal;
@@ -77,8 +77,8 @@ void CheckPascalStrings(std::string_view bytes) {
   Check(reinterpret_cast<const char*>(pascal) == kept);
 }
 
-// A string as a Pascal name in a buffer of that size, and back. A ':' of the string becomes a '/',
-// and every '/' comes back as ':'.
+// Converts a string to a Pascal name in a buffer of this size, and back. Each ':' of the string
+// becomes a '/', and every '/' is turned back into ':'.
 void CheckBridge(std::string_view bytes, SInt32 bufferSize) {
   const std::u16string text = text::TextOfFileName(bytes);
   const CFOwned<CFStringRef> string(CFStringCreateWithCharacters(
@@ -106,7 +106,7 @@ void CheckBridge(std::string_view bytes, SInt32 bufferSize) {
   Check(std::equal(expected.begin(), expected.end(), units));
 }
 
-// With so many, short inputs reach the longest names.
+// With this many, short inputs reach the longest names.
 constexpr unsigned kMostTimes = 4;
 
 std::string Repeated(std::string_view bytes, unsigned times) {
@@ -118,8 +118,8 @@ std::string Repeated(std::string_view bytes, unsigned times) {
 }  // namespace
 }  // namespace tallowmere::fuzz
 
-// Which way, how many times the name stands in a longer one, a buffer's size, how many marks, a
-// node id, and then the name.
+// The input: the direction, how many times the name is repeated, a buffer's size, the number of
+// marks, a node id, then the name.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   using namespace tallowmere::fuzz;
   Input input(data, size);

@@ -40,7 +40,7 @@ void CheckItem(const FSSpec& spec) {
   std::array<char, 1024> buffer;
   const std::size_t length = CFileUtilMakeFullPath(reference, buffer.data(), buffer.size(), 1);
   Check(length == std::strlen(buffer.data()));
-  // A path that leaves folders out, or has to be cut, is not the item's.
+  // A path that leaves out folders, or has to be cut, is not the item's.
   std::string path(buffer.data());
   if (!reference.IsFolder()) path += names::TextOfPascal(spec.name);
   if (path.size() > sizeof(Str255) - 1) return;
@@ -48,7 +48,7 @@ void CheckItem(const FSSpec& spec) {
   Check(IsSame(again, spec));
 }
 
-// The record of what is not there leads nowhere, and is its own record.
+// The record of a missing item leads nowhere, and is its own record.
 void CheckNewItem(const FSSpec& spec) {
   FSRef item;
   Check(FSpMakeFSRef(&spec, &item) == fnfErr);
@@ -74,7 +74,7 @@ extern "C" int LLVMFuzzerInitialize(int*, char***) {
   return 0;
 }
 
-// The volume, the folder's id, and then the path.
+// The input: the volume, the folder's id, then the path.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   using namespace tallowmere::fuzz;
   Input input(data, size);

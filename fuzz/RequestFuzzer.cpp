@@ -1,7 +1,7 @@
-// The whole request step: any bytes as what a parent sends, over a small tree.
+// The whole request step: any bytes as a parent's input, over a small tree.
 //
-// Left out is what ends the process (the code 0 and those above 10) and the buffer sizes for which
-// a path is shortened for ever.
+// Excluded are the codes that end the process (0 and those above 10) and the buffer sizes for which
+// shortening a path never ends.
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
@@ -29,8 +29,8 @@ namespace {
 
 constexpr std::size_t kCodeSize = sizeof(std::uint16_t);
 
-// With a buffer of this size the volume's name, of 63 bytes at most, leaves room for what a
-// shortened path is made of.
+// In a buffer of this size, a volume's name of up to 63 bytes leaves enough room for a shortened
+// path.
 constexpr std::uint16_t kSmallestBuffer = 69;
 
 template <class Number>
@@ -45,8 +45,8 @@ void PutNumberAt(std::string& bytes, std::size_t at, Number number) {
   std::memcpy(bytes.data() + at, &number, sizeof number);
 }
 
-// How far a request reaches, field by field; no further than the first field that is cut off or
-// announces more than is allowed.
+// How far a request extends, field by field, up to the first field that is cut off or announces
+// more than is allowed.
 class Extent {
  public:
   explicit Extent(std::string_view bytes) : mBytes(bytes) { Pass(kCodeSize); }
@@ -72,8 +72,8 @@ class Extent {
   bool mIsWhole = true;
 };
 
-// The size of the request that the bytes begin with; none where the service answers nothing.
-// REQUIRES: they begin with a code from 1 to 10.
+// The size of the request at the beginning of the bytes. Nullopt when the service does not answer.
+// REQUIRES: the bytes begin with a code from 1 to 10.
 std::optional<std::size_t> RequestSize(std::string_view bytes) {
   Extent extent(bytes);
   switch (NumberAt<std::uint16_t>(bytes, 0)) {
@@ -109,12 +109,12 @@ std::optional<std::size_t> RequestSize(std::string_view bytes) {
   }
 }
 
-// Where a full path's buffer size stands in its request. REQUIRES: the request is whole.
+// The offset of a full path's buffer size in its request. REQUIRES: the request is whole.
 std::size_t BufferSizeOffset(std::string_view request) {
   return 2 * kCodeSize + NumberAt<std::uint16_t>(request, kCodeSize);
 }
 
-// Puts this machine's volume number, and a buffer size that is large enough, into a request.
+// Puts this machine's volume number, and a large enough buffer size, into a request.
 void MakeServable(std::string& request) {
   switch (NumberAt<std::uint16_t>(request, 0)) {
     case protocol::kRequestMakeFullPath: {
@@ -137,15 +137,15 @@ void MakeServable(std::string& request) {
 
 constexpr std::size_t kLongestAnswer = 1 << 17;
 
-// Stands for a pipe: a file in memory in the place of a descriptor.
+// Replaces a descriptor by a file in memory, which stands for a pipe.
 void PutFileInPlaceOf(int descriptor) {
   const int file = memfd_create("pipe", MFD_CLOEXEC);
   Check(file >= 0 && dup2(file, descriptor) == descriptor);
   close(file);
 }
 
-// Serves the request that the bytes begin with and gives its answer, which is valid until the next
-// call. The service must read exactly `size` bytes, and answer exactly when that is given.
+// Serves the first request in the bytes and returns its answer, which is valid until the next call.
+// The service must read exactly `size` bytes, and must answer if and only if `size` has a value.
 std::string_view Serve(std::string_view bytes, std::optional<std::size_t> size) {
   static const auto answer = std::make_unique<char[]>(kLongestAnswer);
   Check(ftruncate(STDIN_FILENO, 0) == 0 && ftruncate(STDOUT_FILENO, 0) == 0);
@@ -166,7 +166,7 @@ std::string Ask(const std::string& request) {
 
 // --- Answers ----------------------------------------------------------------------------------
 
-// A string of an answer: none for the count 0.
+// A string of an answer; nullopt for the count 0.
 std::optional<std::string> TakeText(AnswerReader& answer, std::string_view bytes, std::size_t at) {
   const bool isThere = NumberAt<std::uint16_t>(bytes, at) != 0;
   auto text = answer.TakeString();
@@ -177,7 +177,7 @@ bool IsAbsoluteOrNone(const std::optional<std::string>& path) {
   return !path || path->starts_with('/');
 }
 
-// What the protocol says of an answer beyond its framing. `bytes` are the answer.
+// Checks what the protocol promises of an answer beyond its framing. `bytes` is the answer.
 void CheckFields(AnswerReader& answer, std::string_view request, std::string_view bytes) {
   constexpr unsigned kLongestFullPath = 767;
   constexpr unsigned kSettingsSize = 144;
@@ -266,7 +266,7 @@ void CheckAgainstEarlierAnswer(std::string_view request, std::string_view answer
 
 // --- There and back ---------------------------------------------------------------------------
 
-// Whether the path spells an item folder by folder, and the way to it has no link.
+// Whether the path spells out an item folder by folder, without links on the way.
 bool IsPlain(const std::string& path) {
   if (!path.starts_with('/') || path.size() > 4000 || path.ends_with('/')) return false;
   const std::filesystem::path whole(path);
@@ -279,7 +279,7 @@ bool IsPlain(const std::string& path) {
   return whole.filename() != "." && whole.filename() != "..";
 }
 
-// An item's record leads back to that very item.
+// An item's record leads back to exactly that item.
 void CheckWayBack(const std::string& path) {
   struct stat item;
   if (!IsPlain(path) || lstat(path.c_str(), &item) != 0) return;
@@ -296,7 +296,7 @@ void CheckWayBack(const std::string& path) {
   Check(found.st_dev == item.st_dev && found.st_ino == item.st_ino);
 }
 
-// The path that a request or its answer is about, where there is one.
+// The path that a request or its answer is about; nullopt when there is none.
 std::optional<std::string> PathIn(std::string_view request, std::string_view answer) {
   const auto text = [](std::string_view bytes, std::size_t at) {
     const std::string_view counted =
@@ -321,14 +321,15 @@ std::optional<std::string> PathIn(std::string_view request, std::string_view ans
 
 // --- The process ------------------------------------------------------------------------------
 
-// Every descriptor that stays open, or is closed by mistake, makes it another one.
+// Changes with every descriptor that stays open or is closed by mistake.
 int LowestFreeDescriptor() {
   const int descriptor = dup(STDIN_FILENO);
   Check(descriptor >= 0 && close(descriptor) == 0);
   return descriptor;
 }
 
-// Serves what the bytes begin with; its size, or none when that was the last thing to be served.
+// Serves the first request in the bytes and returns its size; nullopt when it was the last one to
+// be served.
 std::optional<std::size_t> ServeOne(const std::string& bytes) {
   if (bytes.size() >= kCodeSize) {
     const auto code = NumberAt<std::uint16_t>(bytes, 0);
@@ -355,11 +356,11 @@ extern "C" int LLVMFuzzerInitialize(int*, char***) {
   PutFileInPlaceOf(STDIN_FILENO);
   PutFileInPlaceOf(STDOUT_FILENO);
   const InsideSmallTree inside;
-  VolumeNumberHere(-1);  // the table of mounts stays open from now on
+  VolumeNumberHere(-1);  // the mount table stays open from now on
   return 0;
 }
 
-// One request behind the other.
+// The input: requests one after the other.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   using namespace tallowmere::fuzz;
   std::string bytes(reinterpret_cast<const char*>(data), size);

@@ -17,13 +17,13 @@
 namespace tallowmere::fuzz {
 namespace {
 
-// Numbers below 16 are no ids of their own.
+// Inode numbers below 16 are not ids themselves.
 constexpr int kSpentInodes = 20;
 
 constexpr int kDepth = 12;
 constexpr std::size_t kDeepNameLength = 60;
 
-// The places to return to, and the tree's root. Open as long as the process lives.
+// The places to return to, and the tree's root. They stay open as long as the process lives.
 struct Folders {
   int outside;
   int current;
@@ -41,7 +41,7 @@ void ChangeRoot(int root, int current) {
   Check(fchdir(root) == 0 && chroot(".") == 0 && fchdir(current) == 0);
 }
 
-// A finding is stored outside.
+// Leaves the tree, as a finding is stored outside.
 void LeaveSmallTree() {
   if (fchdir(gFolders.outside) != 0 || chroot(".") != 0 || fchdir(gFolders.current) != 0) {
     std::fputs("The way out of the tree is lost, and with it the finding.\n", stderr);
@@ -91,7 +91,7 @@ void MakeSecondVolume(const test::TemporaryFolder& tree) {
   tree.MakeLink("Second/out", "/folder");
 }
 
-// The table of mounts is all of /proc that the tree has: nothing else there stays the same.
+// Shows only the mount table of /proc in the tree: nothing else there stays the same.
 bool ShowMountTable(const test::TemporaryFolder& tree) {
   tree.MakeFolder("proc/self");
   const std::string table = tree.MakeFile("proc/self/mountinfo");
@@ -139,7 +139,7 @@ std::int16_t VolumeNumberHere(std::int16_t number) {
 
 }  // namespace tallowmere::fuzz
 
-// Called by the sanitizers before they end the program.
+// The sanitizers call this before they end the program.
 extern "C" void __asan_on_error() {
   tallowmere::fuzz::gBeforeFinding();
 }

@@ -1,4 +1,4 @@
-// URLs: any bytes as a URL's text, and as the path or the component of one.
+// URLs: any bytes as a URL's text, and as a path or component of one.
 #include <CoreFoundation/CoreFoundation.h>
 
 #include <optional>
@@ -32,7 +32,7 @@ std::optional<std::string> PathOf(CFURLRef url) {
   return BytesOf(OwnedString(CFURLCopyFileSystemPath(url, kCFURLPOSIXPathStyle)));
 }
 
-// Any text is made of its parts.
+// Any text can be put together from its parts.
 void CheckParts(std::string_view text) {
   const foundation::UrlParts parts = foundation::SplitUrl(text);
   std::string whole;
@@ -62,7 +62,7 @@ void CheckPath(CFURLRef url) {
   }
 }
 
-// The folder and the name of a URL are URLs and their own again.
+// A URL's folder, and the folder with the name added, are URLs; the latter has that name again.
 void CheckComponents(CFURLRef url) {
   const auto name = BytesOf(OwnedString(CFURLCopyLastPathComponent(url)));
   const auto extension = BytesOf(OwnedString(CFURLCopyPathExtension(url)));
@@ -91,7 +91,7 @@ void CheckUrl(std::string_view text) {
   CheckComponents(url.Get());
 }
 
-// Any bytes have a percent-encoded text, and a URL as an absolute path.
+// Any bytes can be percent-encoded, and have a URL as an absolute path.
 void CheckBytes(std::string_view bytes) {
   Check(foundation::PercentDecode(bytes).size() <= bytes.size());
   for (const bool isStart : {false, true}) {
@@ -110,7 +110,7 @@ void CheckBytes(std::string_view bytes) {
 }  // namespace
 }  // namespace tallowmere::fuzz
 
-// What the bytes are, and then those.
+// The input: a kind, then the bytes.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   using namespace tallowmere::fuzz;
   Input input(data, size);

@@ -1,7 +1,8 @@
-# Sourced by the scripts beside it: sees to the Debian packages that they need.
+# Sourced by the scripts in this folder: ensures that the Debian packages that they need are
+# installed.
 
-# need PACKAGE…: installs what is missing. Where that takes another user's rights, names the command
-# to run and stops.
+# need PACKAGE…: installs missing packages. Where that takes another user's rights, prints the
+# command to run and stops.
 need() {
   local missing=() package
   for package in "$@"; do
@@ -26,21 +27,21 @@ need() {
 
 to_build=(g++ cmake ninja-build libcli11-dev nlohmann-json3-dev)
 to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf python3 strace)
-# Tests on file systems that these make, on the manual pages and the completions.
+# For tests on file systems made by these tools, and of the manual pages and completions.
 to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools)
 to_test+=(mandoc zsh fish)
-# Tests on a real HFS volume in a machine of its own, and on the Debian packages.
+# For tests on a real HFS volume in an emulated machine, and of the Debian packages.
 to_emulate=(hfsutils qemu-system-x86 busybox-static cpio)
 to_package=(dpkg-dev file python3)
-# What the benchmarks compare with, and their pieces in one process.
+# What the benchmarks compare with, and the library for their pieces in one process.
 to_measure=(libbenchmark-dev openssh-sftp-server bfs e2fsprogs btrfs-progs xfsprogs bindfs)
 to_format=(clang-format)
 to_lint=(clang-tidy)
 to_fuzz=(clang libclang-rt-dev)
 to_cover=(clang libclang-rt-dev llvm)
 
-# unpack_kernel FOLDER: puts Debian's kernel there, without installing it. Without one the test that
-# starts it is skipped.
+# unpack_kernel FOLDER: puts Debian's kernel there, without installing it. Without one, the test
+# that boots it is skipped.
 unpack_kernel() {
   [ -d "$1" ] && return
   local package
@@ -58,7 +59,7 @@ unpack_kernel() {
   rm -f "$1"/*.deb
 }
 
-# build PRESET [TARGET…]: configures where that has not been done, and builds.
+# build PRESET [TARGET…]: configures if that has not been done, then builds.
 build() {
   local preset=$1
   shift
@@ -71,8 +72,8 @@ configure() {
   [ -f "build/$1/build.ninja" ] || cmake --preset "$1" >/dev/null
 }
 
-# lint CHECKS: what the linter says of the product's sources, by these of the checks in .clang-tidy. Longest first,
-# so that no processor waits for the last one.
+# lint CHECKS: runs the linter on the product's sources, with these of the checks in .clang-tidy.
+# Starts with the longest source, so that no processor waits for the last one.
 lint() {
   configure dev
   find . -path ./build -prune -o -path ./tests -prune -o -path ./fuzz -prune -o -name '*.cpp' -printf '%s %p\n' |

@@ -33,7 +33,7 @@ void VolumeWalk::LookAtKnown() {
     const auto held = HoldAt(path);
     if (!held || !mTree.IsSame(number, held->item)) continue;
     const kernel::Spot spot = kernel::AtOpen(held->descriptor.Get());
-    mQuestion.Offer(held->item, mTree[number].id, spot, [&] { return path; });
+    mQuestion.Offer(held->item, mTree[number].id, spot, [&path] { return std::string(path); });
   }
 }
 
@@ -235,7 +235,7 @@ VolumeWalk::Seen VolumeWalk::SeeEntry(FolderNumber folder, const kernel::Spot& s
   if (!isOfMount) mQuestion.NoteHidden();
   const auto id = isOfMount ? IDOf(status->item, folder, spot) : std::nullopt;
   if (!id) return Seen::kHidden;
-  mQuestion.Offer(status->item, *id, spot, [&] { return path; });
+  mQuestion.Offer(status->item, *id, spot, [&path] { return std::string(path); });
   return kernel::IsFolder(status->item) ? Seen::kFolder : Seen::kOther;
 }
 
@@ -280,7 +280,7 @@ bool VolumeWalk::CheckUnchanged(FolderNumber number) {
   if (!status || !mTree.IsSame(number, status->item) || status->change != folder.change) {
     return false;
   }
-  mQuestion.Offer(status->item, folder.id, spot, [&] { return path; });
+  mQuestion.Offer(status->item, folder.id, spot, [&path] { return std::string(path); });
   MarkAsSeen(number);
   return true;
 }

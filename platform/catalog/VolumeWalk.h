@@ -80,14 +80,14 @@ class VolumeWalk {
   kernel::Result<kernel::Descriptor> OpenAgain(const Visited& visited);
   Reading ReadEntries(FolderNumber folder, const kernel::Descriptor& descriptor);
   Seen SeeEntry(FolderNumber folder, const kernel::Spot& spot);
-  bool CheckUnchanged(FolderNumber folder);
+  bool CheckUnchanged(FolderNumber number);
   void ForgetIfGone(FolderNumber folder);
 
   std::optional<std::uint32_t> IDOf(kernel::Item& item, FolderNumber parent,
                                     const kernel::Spot& spot) const;
   bool IsSeen(FolderNumber folder) const { return mTree[folder].checked == mKnown.walks; }
   void MarkAsSeen(FolderNumber folder) { mTree[folder].checked = mKnown.walks; }
-  void MarkAsRead(FolderNumber folder, kernel::Nanoseconds change, kernel::Nanoseconds now);
+  void MarkAsRead(FolderNumber number, kernel::Nanoseconds change, kernel::Nanoseconds now);
   void Invalidate(FolderNumber folder);
 
   kernel::Result<kernel::Descriptor> OpenToRead(const kernel::Spot& spot);

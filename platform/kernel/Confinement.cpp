@@ -14,16 +14,17 @@
 namespace tallowmere::kernel {
 namespace {
 
-// struct landlock_ruleset_attr of every version of the interface: an older kernel takes a longer
-// one whose rest is 0. Signals are never scoped, or the process could not look for its parent.
+// struct landlock_ruleset_attr of every version of the interface: an older kernel accepts a longer
+// one whose rest is 0. Signals are never scoped, as the process must be able to check for its
+// parent.
 struct Ruleset {
   std::uint64_t files = 0;    // version 1
   std::uint64_t network = 0;  // version 4
   std::uint64_t scopes = 0;   // version 6
 };
 
-// The rights on files that came with each version and can be taken away: landlock(7). Reading stays
-// out of it, so that what is open or opened by its handle is read wherever it is.
+// The file rights that each version added and that can be taken away: landlock(7). Reading is not
+// among them, so that what is open, or opened by its handle, can be read wherever it is.
 struct Rights {
   int version;
   std::uint64_t files;
@@ -53,8 +54,8 @@ Ruleset RulesetOf(int version, bool needsNetwork) {
   return ruleset;
 }
 
-// Landlock: nothing but reading. Whether no file can be opened to write or truncated since.
-// REQUIRES: no new privileges.
+// Landlock: allows nothing but reading. Returns whether files can no longer be opened for writing
+// or truncated. REQUIRES: no new privileges.
 bool CloseFiles(bool needsNetwork) {
   const long version =
       syscall(SYS_landlock_create_ruleset, nullptr, 0, LANDLOCK_CREATE_RULESET_VERSION);

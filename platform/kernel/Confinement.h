@@ -1,11 +1,11 @@
-// Taking from this process what it never needs, for good and for all that it starts.
+// Takes from this process what it never needs, for good and for every process that it starts.
 #pragma once
 
 namespace tallowmere::kernel {
 
-// No new privileges, Landlock with nothing but reading, and a filter of system calls: each where
-// the kernel has it. Changes nothing else of the process: no descriptor stays open. Never fails.
-// REQUIRES: the process has one thread.
+// Sets no new privileges, Landlock with nothing but reading, and a filter of system calls, each
+// where the kernel supports it. Changes nothing else of the process: no descriptor stays open.
+// Never fails. REQUIRES: the process has one thread.
 void LockIn();
 
 }  // namespace tallowmere::kernel

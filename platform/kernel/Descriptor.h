@@ -1,4 +1,4 @@
-// An open file descriptor and its end.
+// An open file descriptor, closed when its owner is destroyed.
 #pragma once
 
 #include <unistd.h>
@@ -10,7 +10,7 @@ namespace tallowmere::kernel {
 class Descriptor {
  public:
   Descriptor() = default;
-  explicit Descriptor(int descriptor) : mDescriptor(descriptor) {}  // takes it over; -1 is none
+  explicit Descriptor(int descriptor) : mDescriptor(descriptor) {}  // takes ownership; -1 is none
   Descriptor(Descriptor&& other) noexcept : mDescriptor(std::exchange(other.mDescriptor, -1)) {}
   Descriptor& operator=(Descriptor&& other) noexcept {
     if (this != &other) {
@@ -23,7 +23,7 @@ class Descriptor {
 
   int Get() const { return mDescriptor; }
   bool IsOpen() const { return mDescriptor >= 0; }
-  int Release() { return std::exchange(mDescriptor, -1); }  // to who closes it from now on
+  int Release() { return std::exchange(mDescriptor, -1); }  // to the caller, who closes it
   void Close() {
     if (mDescriptor >= 0) ::close(std::exchange(mDescriptor, -1));
   }

@@ -8,10 +8,10 @@
 namespace tallowmere::kernel {
 namespace {
 
-// Asks for a handle that only identifies. The number is from <linux/fcntl.h>.
+// Asks for a handle that only identifies an item. The number is from <linux/fcntl.h>.
 constexpr int kOnlyToIdentify = 0x200;
 
-// Forms of handles, as enum fid_type in the kernel's <linux/exportfs.h> describes them, and their
+// Types of handles, as enum fid_type in the kernel's <linux/exportfs.h> describes them, and their
 // sizes. Numbers are in the machine's byte order.
 constexpr std::int32_t kInode32 = 1;       // FILEID_INO32_GEN: inode, generation (32 bits)
 constexpr std::int32_t kInode64 = 0x81;    // FILEID_INO64_GEN: inode (64 bits), generation
@@ -32,7 +32,7 @@ Number Get(const FileHandle& handle, std::size_t offset) {
   return number;
 }
 
-// Puts numbers one behind the other.
+// Concatenates the bytes of numbers.
 template <class... Numbers>
 FileHandle MakeHandle(std::int32_t type, std::uint32_t size, Numbers... numbers) {
   FileHandle handle{type, size, {}};

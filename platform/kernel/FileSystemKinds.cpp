@@ -11,13 +11,13 @@ namespace {
 
 using names::UpperIDs;
 
-// The types that <linux/magic.h> does not have: that of hfs is in statfs(2), hfsplus answers its
-// volume's signature (TN1150), and bcachefs a number of its own (the kernel's fs/bcachefs).
+// The types that <linux/magic.h> lacks: that of hfs is in statfs(2), hfsplus reports its volume's
+// signature (TN1150), and bcachefs a number of its own (the kernel's fs/bcachefs).
 constexpr std::uint32_t kBcachefs = 0xCA451A4E;
 constexpr std::uint32_t kHFS = 0x4244;
 constexpr std::uint32_t kHFSPlus = 0x482B;
 
-// Where one type stands for several kinds.
+// For a type that stands for several kinds.
 enum class Only : std::uint8_t {
   kAlways,
   kOnDisk,         // its device is a block device
@@ -30,11 +30,11 @@ struct Row {
   FileSystemKind kind;
 };
 
-// Documents are those of Linux 6.12, below Documentation/filesystems; "seen" is what an experiment
-// showed on Linux 6.18. The first row that fits.
+// Documents are those of Linux 6.12, below Documentation/filesystems; "seen" marks the result of an
+// experiment on Linux 6.18. The first row that matches counts.
 constexpr auto kRows = std::to_array<Row>({
-    // ext2, ext3 and ext4 have one type. Inode numbers are an index into the inode tables, of 32
-    // bits, and are in the entries: ext4/inodes.rst, ext4/directory.rst. Links: ext4/inodes.rst,
+    // ext2, ext3 and ext4 share one type. Inode numbers index the inode tables, have 32 bits, and
+    // are in the entries: ext4/inodes.rst, ext4/directory.rst. Links: ext4/inodes.rst,
     // i_links_count. Handles: seen, also after the caches were dropped.
     {EXT4_SUPER_MAGIC,
      Only::kAlways,
@@ -49,7 +49,8 @@ constexpr auto kRows = std::to_array<Row>({
       .byNumber = ByNumber::kInode}},
 
     // An inode number is the inode's position on the disk, with inode64 of more than 32 bits:
-    // admin-guide/xfs.rst, inode64. Generations by ioctl_xfs_bulkstat(2), and all else: seen.
+    // admin-guide/xfs.rst, inode64. Generations by ioctl_xfs_bulkstat(2), and everything else:
+    // seen.
     {XFS_SUPER_MAGIC,
      Only::kAlways,
      {.name = "xfs",
@@ -61,8 +62,8 @@ constexpr auto kRows = std::to_array<Row>({
       .findsAllByHandle = true,
       .byNumber = ByNumber::kInodeAndGeneration}},
 
-    // Numbers are a subvolume's own, and each subvolume has a device of its own: seen. Folders have
-    // one link whatever is in them: seen.
+    // Each subvolume has inode numbers and a device of its own: seen. Folders have one link
+    // whatever they contain: seen.
     {BTRFS_SUPER_MAGIC,
      Only::kAlways,
      {.name = "btrfs",
@@ -85,7 +86,7 @@ constexpr auto kRows = std::to_array<Row>({
       .findsAllByHandle = true}},
 
     // squashfs.rst: "Real inode numbers: yes"; of 32 bits, as the handles carry them: seen. Without
-    // an export table there are only handles that open nothing: seen.
+    // an export table, handles open nothing: seen.
     {SQUASHFS_MAGIC,
      Only::kAlways,
      {.name = "squashfs",
@@ -104,7 +105,8 @@ constexpr auto kRows = std::to_array<Row>({
       .entriesTellNumbers = true,
       .keepsNumbers = true}},
 
-    // f2fs.rst: the node address table has an inode's place by its number, an entry has the number.
+    // f2fs.rst: the node address table maps an inode's number to its place; an entry has the
+    // number.
     {F2FS_SUPER_MAGIC,
      Only::kAlways,
      {.name = "f2fs",
@@ -112,7 +114,7 @@ constexpr auto kRows = std::to_array<Row>({
       .entriesTellNumbers = true,
       .keepsNumbers = true}},
 
-    // Catalog node ids, of 32 bits, are not given twice: Inside Macintosh: Files, "Catalog Files".
+    // Catalog node ids, of 32 bits, are never reused: Inside Macintosh: Files, "Catalog Files".
     {kHFS,
      Only::kAlways,
      {.name = "hfs",
@@ -122,8 +124,8 @@ constexpr auto kRows = std::to_array<Row>({
       .entriesTellNumbers = true,
       .keepsNumbers = true}},
 
-    // Likewise: Technical Note TN1150, "Catalog File". The entry of a hard link has a number of its
-    // own there ("Hard Links").
+    // Likewise: Technical Note TN1150, "Catalog File". The entry of a hard link has its own number
+    // there ("Hard Links").
     {kHFSPlus,
      Only::kAlways,
      {.name = "hfsplus",
@@ -132,9 +134,9 @@ constexpr auto kRows = std::to_array<Row>({
       .upperIDs = UpperIDs::kFolded,
       .keepsNumbers = true}},
 
-    // Inodes are numbered as they are met and lose the number when they leave the memory: vfat.rst,
-    // nfs=stale_rw. With nfs=nostale_ro it is a position on the disk, of 40 bits: FILEID_FAT in
-    // <linux/exportfs.h>.
+    // Inodes are numbered as they are encountered and lose the number when they leave memory:
+    // vfat.rst, nfs=stale_rw. With nfs=nostale_ro it is a position on the disk, of 40 bits:
+    // FILEID_FAT in <linux/exportfs.h>.
     {MSDOS_SUPER_MAGIC,
      Only::kAlways,
      {.name = "vfat", .numbersTellItemsApart = true, .upperIDs = UpperIDs::kFolded}},
@@ -162,7 +164,7 @@ constexpr auto kRows = std::to_array<Row>({
 
     // overlayfs.rst, "Inode properties": st_dev and st_ino together are unique, and those of files
     // are in the entries. Over several file systems folders are numbered in memory. Seen: not
-    // unique where the layers are on several subvolumes of btrfs; f_files is that of the uppermost
+    // unique when the layers are on several subvolumes of btrfs; f_files is that of the uppermost
     // layer, 0 on btrfs.
     {OVERLAYFS_SUPER_MAGIC,
      Only::kCountedInodes,
@@ -180,21 +182,21 @@ constexpr auto kRows = std::to_array<Row>({
       .entriesTellNumbers = true,
       .keepsNumbers = true}},
 
-    // fuse.rst: fuseblk is a file system of a disk, served by a process. Numbers are its own.
+    // fuse.rst: fuseblk is a file system on a disk, served by a process. Numbers are its own.
     {FUSE_SUPER_MAGIC, Only::kOnDisk, {.name = "fuseblk", .numbersTellItemsApart = true}},
 
-    // Numbers are the server's, which can show several file systems as one: seen with bindfs over
-    // subvolumes of btrfs. virtiofs is FUSE: virtiofs.rst.
+    // Numbers are the server's, which can present several file systems as one: seen with bindfs
+    // over subvolumes of btrfs. virtiofs is FUSE: virtiofs.rst.
     {FUSE_SUPER_MAGIC, Only::kAlways, {.name = "fuse"}},
 
-    // The server's as well. admin-guide/cifs/usage.rst, serverino: "the server does not guarantee
-    // that the inode numbers are unique".
+    // Also the server's. admin-guide/cifs/usage.rst, serverino: "the server does not guarantee that
+    // the inode numbers are unique".
     {V9FS_MAGIC, Only::kAlways, {.name = "9p"}},
     {SMB_SUPER_MAGIC, Only::kAlways, {.name = "smb"}},
     {CIFS_SUPER_MAGIC, Only::kAlways, {.name = "smb"}},
     {SMB2_SUPER_MAGIC, Only::kAlways, {.name = "smb"}},
 
-    // Subvolumes share one device, and numbers are a subvolume's own: FILEID_BCACHEFS in
+    // Subvolumes share one device but have inode numbers of their own: FILEID_BCACHEFS in
     // <linux/exportfs.h>.
     {kBcachefs, Only::kAlways, {.name = "bcachefs"}},
 });
@@ -213,7 +215,7 @@ bool Fits(Only only, std::uint64_t fileCount, std::uint64_t device) {
   return true;
 }
 
-// Sorted. A file system that is missing here is taken for one that holds files.
+// Sorted. A file system that is missing here is assumed to hold files.
 constexpr auto kKernelInterfaces = std::to_array<std::string_view>({
     "anon_inodefs", "apparmorfs", "autofs",     "bdev",       "binder",     "binfmt_misc",
     "bpf",          "cgroup",     "cgroup2",    "configfs",   "cpuset",     "debugfs",
@@ -226,7 +228,7 @@ constexpr auto kKernelInterfaces = std::to_array<std::string_view>({
 });
 static_assert(std::is_sorted(kKernelInterfaces.begin(), kKernelInterfaces.end()));
 
-// Sorted; FUSE has many names of its own, all beginning so.
+// Sorted. The names of FUSE file systems all begin with its own.
 constexpr auto kServed = std::to_array<std::string_view>({
     "9p",
     "afs",

@@ -1,4 +1,4 @@
-// The entries of an open folder, one after the other: getdents64(2).
+// Reads the entries of an open folder one by one: getdents64(2).
 #pragma once
 
 #include <array>
@@ -10,16 +10,16 @@
 
 namespace tallowmere::kernel {
 
-// One entry, valid until the next is asked for.
+// One entry, valid until the next one is read.
 struct Entry {
   enum class Kind { kFolder, kOther, kUnknown };
 
   std::uint64_t inode;  // the item's, unless something is mounted there; see FileSystemKinds.h
-  Kind kind;            // kUnknown: the file system does not say
+  Kind kind;            // kUnknown when the file system does not say
   const char* name;
 };
 
-// Reads a folder from where the descriptor stands to its end, without "." and "..".
+// Reads a folder from the descriptor's position to its end, skipping "." and "..".
 class FolderReader {
  public:
   // REQUIRES: `folder` is open for reading and outlives the reader.
@@ -30,7 +30,7 @@ class FolderReader {
   // The next entry, or null at the end and after an error.
   const Entry* Next();
 
-  // Whether the end was reached by an error, and which; number 0 for none.
+  // The error that ended the reading; number 0 for none.
   Error FailedBy() const { return mError; }
 
  private:

@@ -7,7 +7,7 @@
 namespace tallowmere::kernel {
 namespace {
 
-// Longer than the coarsest tick of a stored time of birth, one second.
+// Longer than the coarsest resolution of a stored time of birth, one second.
 constexpr std::int64_t kNewbornSeconds = 2;
 constexpr std::int64_t kNanosecondsInASecond = 1'000'000'000;
 
@@ -19,12 +19,12 @@ bool HasHandle(const Item& item) {
   return item.handle.size != 0;
 }
 
-// True also for a birth in the future, by a clock that is not ours.
+// Also true for a birth in the future, by another machine's clock.
 bool IsNewborn(const Item& item) {
   return item.birthSeconds + kNewbornSeconds >= Now() / kNanosecondsInASecond;
 }
 
-// Devices without hardware, as those of overlays, have the major number 0.
+// Devices without hardware, such as those of overlays, have the major number 0.
 bool IsProvedByBirth(const Item& item) {
   return HasBirth(item) && major(item.device) != 0 && !IsNewborn(item);
 }
@@ -70,7 +70,7 @@ Result<Status> ReadStatus(const Spot& spot) {
   const bool hasBirth = (about.stx_mask & STATX_BTIME) != 0;
   item.birthSeconds = hasBirth ? about.stx_btime.tv_sec : 0;
   item.birthNanoseconds = hasBirth ? about.stx_btime.tv_nsec : kNoBirth;
-  // An emulator can report 0, which no mount has.
+  // An emulator may report 0, which is no mount's id.
   const bool hasMount = (about.stx_mask & STATX_MNT_ID) != 0 && about.stx_mnt_id != 0;
   item.mount = hasMount ? static_cast<std::int32_t>(about.stx_mnt_id) : kNoMount;
   item.type = about.stx_mode & S_IFMT;

@@ -14,7 +14,7 @@ namespace {
 
 constexpr int kWithoutWaiting = AT_STATX_DONT_SYNC | AT_NO_AUTOMOUNT;
 
-// What ioctl(2) answers where a file system has no labels.
+// What ioctl(2) returns where a file system has no labels.
 bool MeansNoLabels(Error error) {
   return error.number == ENOTTY || error.number == EOPNOTSUPP || error.number == EINVAL ||
          error.number == ENOSYS;

@@ -1,4 +1,4 @@
-// The kernel's table of mounted file systems as a file: proc(5), /proc/[pid]/mountinfo.
+// The file with the kernel's table of mounts: proc(5), /proc/[pid]/mountinfo.
 #pragma once
 
 #include <sys/types.h>
@@ -15,12 +15,12 @@ class MountTableFile {
  public:
   explicit MountTableFile(std::string path = "/proc/self/mountinfo") : mPath(std::move(path)) {}
 
-  // The whole text. It comes in several pieces: a mount made between two of them can be missing or
-  // shift others out, which HasChanged() then signals.
+  // The whole text. It is read in several pieces: a mount made between two of them may be missing
+  // or displace others, which HasChanged() then reports.
   Result<std::string> Read();
 
-  // Whether the kernel has signalled a change since the last time that it was asked, or cannot be
-  // asked: poll(2), POLLPRI. One system call.
+  // Whether the kernel has signalled a change since the last call, or cannot be asked: poll(2),
+  // POLLPRI. One system call.
   bool HasChanged() const;
 
  private:
@@ -28,19 +28,19 @@ class MountTableFile {
   Descriptor mDescriptor;
 };
 
-// The mount that the process's root is in, as the kernel tells without the table.
+// The mount that contains the process's root, found without the table.
 struct RootMount {
-  int id;  // 0: not told
+  int id;  // 0: not known
   dev_t device;
 };
 RootMount ReadRootMount();
 
-// Whether a mount point is a folder, from what the kernel has: neither a dead server nor an
-// automounter is waited for.
+// Whether a mount point is a folder, from what the kernel has in memory: waits for neither a dead
+// server nor an automounter.
 bool IsFolderByMemory(const std::string& mountPoint);
 
-// The label of the file system of "/", which takes the right to read "/". Empty for a file system
-// that has none; EACCES, EPERM, EIO and others where it cannot be told now.
+// The label of the file system of "/", which requires permission to read "/". Empty for a file
+// system without one; returns EACCES, EPERM, EIO and others when it cannot be read now.
 Result<std::string> ReadRootLabel();
 
 }  // namespace tallowmere::kernel

@@ -22,7 +22,7 @@ Result<Descriptor> AsResult(int descriptor) {
   return Descriptor(descriptor);
 }
 
-// Folder by folder: an open link has nothing in it.
+// Opens folder by folder; an open link has nothing in it, so a link on the way fails.
 Result<Descriptor> HoldStepByStep(std::string_view path, int flags) {
   if (path.size() >= PATH_MAX) return Error{ENAMETOOLONG};
   auto item = AsResult(open("/", kHeld));
@@ -41,7 +41,7 @@ Result<Descriptor> Hold(const std::string& path, int flags) {
   how.flags = static_cast<unsigned>(flags);
   how.resolve = RESOLVE_NO_SYMLINKS;
   const long descriptor = syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how);
-  // Before Linux 5.6 there is no such call, and some sandboxes forbid it: openat2(2).
+  // The call is missing before Linux 5.6, and some sandboxes forbid it: openat2(2).
   const bool isCallMissing = descriptor < 0 && (errno == ENOSYS || errno == EPERM);
   return isCallMissing ? HoldStepByStep(path, flags) : AsResult(static_cast<int>(descriptor));
 }
@@ -53,7 +53,7 @@ bool IsNormalized(std::string_view path) {
   if (!path.starts_with('/')) return false;
   const std::size_t size = path.size();
   for (std::size_t slash = 0; slash < size; slash = path.find('/', slash + 1)) {
-    // What begins behind the slash is neither empty nor "." nor "..".
+    // The component after the slash must not be empty, "." or "..".
     const auto isEnd = [&](std::size_t at) { return at == size || path[at] == '/'; };
     if (isEnd(slash + 1)) return false;
     if (path[slash + 1] != '.') continue;
@@ -105,7 +105,7 @@ Result<std::string> PathOfDescriptor(const Descriptor& descriptor) {
   std::array<char, PATH_MAX> text{};
   const ssize_t length = readlink(link.c_str(), text.data(), text.size());
   if (length < 0) return Error::OfLastCall();
-  // What no path leads to has a text without "/" in front.
+  // The text for an item that no path leads to does not begin with "/".
   if (length == 0 || text[0] != '/') return kNotThere;
   return std::string(text.data(), static_cast<std::size_t>(length));
 }

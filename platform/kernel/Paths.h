@@ -1,7 +1,7 @@
-// Paths opened and read: every way from a path to an open item, and back.
+// Opens and reads paths: every way from a path to an open item, and back.
 //
-// What is opened for its path alone (O_PATH) is held, not read: nothing waits for a device or a
-// server, and no right to read is needed.
+// What is opened for its path alone (O_PATH) is held, not read: it waits for no device or server
+// and needs no permission to read.
 #pragma once
 
 #include <string>
@@ -13,34 +13,34 @@
 
 namespace tallowmere::kernel {
 
-// Whether a path is absolute and has no empty component, "." or "..": canonical unless there are
+// Whether a path is absolute without empty components, "." or "..": canonical unless there are
 // links on its way.
 bool IsNormalized(std::string_view path);
 
-// Holds the item at a path, which may itself be a link. ELOOP or ENOTDIR where a link is on the
-// way. REQUIRES: the path is normalized.
+// Holds the item at a path, which may itself be a link. ELOOP or ENOTDIR when there is a link on
+// the way. REQUIRES: the path is normalized.
 Result<Descriptor> HoldWithoutLinks(const std::string& path);
 
 // The same for a folder; ENOTDIR for anything else.
 Result<Descriptor> HoldFolderWithoutLinks(const std::string& path);
 
-// Holds the folder with a name in an open folder. ENOTDIR for anything else, a link among it.
+// Holds the folder with a name in an open folder. ENOTDIR for anything else, including a link.
 Result<Descriptor> HoldFolderIn(const Spot& spot);
 
-// Holds the folder to which a spot leads, links followed. No automounter is asked at its end.
+// Holds the folder that a spot leads to, following links. Triggers no automounter at its end.
 Result<Descriptor> HoldFollowing(const Spot& spot);
 
-// A folder opened for reading its entries; a link in the last place is not followed.
+// Opens a folder for reading its entries; does not follow a link as the last component.
 Result<Descriptor> OpenForReading(const Spot& spot);
 
-// The canonical path of what a path leads to, all links followed.
+// The canonical path of what a path leads to, following all links.
 Result<std::string> RealPath(const std::string& path);
 
-// The same, but a link in the last place is not followed.
+// The same, without following a link as the last component.
 Result<std::string> CanonicalPath(const std::string& path);
 
 // The path at which the kernel shows an open item. It is not verified: a removed item has one too,
-// with " (deleted)" behind it.
+// followed by " (deleted)".
 Result<std::string> PathOfDescriptor(const Descriptor& descriptor);
 
 }  // namespace tallowmere::kernel

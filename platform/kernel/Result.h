@@ -1,5 +1,5 @@
-// A value, or why there is none: the one way in which the platform says that something failed.
-// Result codes of the host are made of it at the calls alone.
+// A value, or the reason why there is none: the one way in which the platform reports a failure.
+// Only the host's calls turn it into result codes.
 #pragma once
 
 #include <cerrno>
@@ -9,11 +9,11 @@
 
 namespace tallowmere::kernel {
 
-// Why there is no value: an error number of the kernel, or one of the platform's own below 0.
+// Why there is no value: an error number of the kernel, or a negative one of the platform's own.
 struct Error {
   int number;
 
-  // What the last system call of this thread left in errno.
+  // The errno of this thread's last system call.
   static Error OfLastCall() { return {errno}; }
 
   bool operator==(const Error&) const = default;
@@ -21,17 +21,17 @@ struct Error {
 
 // The item or folder in question is on no volume, or there is no such volume.
 inline constexpr Error kNoVolume{-1};
-// A folder on the way is missing, or is no folder, while the item was asked for.
+// A folder on the way to the requested item is missing or is not a folder.
 inline constexpr Error kNoFolder{-2};
 inline constexpr Error kNotThere{ENOENT};
 
-// Whether the kernel says that nothing is there, or that no path leads there. Permission and input
-// errors only hide what may be there.
+// Whether the kernel reports that nothing is there, or that no path leads there. Permission and
+// input errors only hide what may be there.
 inline bool MeansGone(Error error) {
   return error.number == ENOENT || error.number == ENOTDIR || error.number == ELOOP;
 }
 
-// Whether the kernel refuses for lack of permission.
+// Whether the kernel reports a lack of permission.
 inline bool MeansRefused(Error error) {
   return error.number == EACCES || error.number == EPERM;
 }
@@ -39,7 +39,7 @@ inline bool MeansRefused(Error error) {
 template <class T>
 class Result {
  public:
-  // From a value or an error, so that both can be returned as they are.
+  // Implicit, so that a function can return a value or an error directly.
   Result(T value) : mValue(std::move(value)) {}   // NOLINT(google-explicit-constructor)
   Result(kernel::Error error) : mError(error) {}  // NOLINT(google-explicit-constructor)
 

@@ -31,7 +31,7 @@ constexpr std::uint32_t kArchitecture = AUDIT_ARCH_AARCH64;
 #endif
 
 #if defined(__SANITIZE_ADDRESS__)
-constexpr bool kLooksForLeaks = true;  // at the end, from a process that traces this one
+constexpr bool kLooksForLeaks = true;  // at exit, from a process that traces this one
 #elif defined(__has_feature)
 #if __has_feature(address_sanitizer)
 constexpr bool kLooksForLeaks = true;
@@ -47,39 +47,39 @@ constexpr bool kLooksForLeaks = false;
 enum class Rule : std::uint8_t {
   kAllow,
   kRefuse,       // EPERM
-  kUnknown,      // ENOSYS, as a kernel answers that does not have the call
-  kNoSignal,     // kill: the look for a process alone
-  kThisProcess,  // tgkill: to end itself, as abort(3) does
-  kItsOwn,       // prlimit64: by 0 or its own id
+  kUnknown,      // ENOSYS, as from a kernel that lacks the call
+  kNoSignal,     // kill: only the check for a process
+  kThisProcess,  // tgkill: only to end itself, as abort(3) does
+  kItsOwn,       // prlimit64: only for 0 or its own id
   kThread,       // clone
-  kSocket,       // socket, socketpair: of which family
-  kNetwork,      // what only sockets of networks are for
-  kFlagsSecond,  // open: not to write
+  kSocket,       // socket, socketpair: by family
+  kNetwork,      // calls that only network sockets need
+  kFlagsSecond,  // open: not for writing
   kFlagsThird,   // openat, open_by_handle_at: the same
-  kRequest,      // ioctl: those that only ask
+  kRequest,      // ioctl: only requests that read
 };
 
-// The last call that these lists were made with; since 424 all architectures number alike. Newer
-// ones may open what is closed here. The numbers of x86_64's x32 are above it too.
+// The last call known when these lists were made; since 424 all architectures use the same numbers.
+// Newer calls may open what is closed here. The numbers of x86_64's x32 are above it too.
 constexpr unsigned kLastKnownCall = 450;  // set_mempolicy_home_node, Linux 5.17
 constexpr unsigned kNumberOfCalls = kLastKnownCall + 1;
 
-// To run programs; to trace, read and signal other processes; to leave their surroundings. What
-// takes a descriptor of a process is closed by closing pidfd_open.
+// Running programs; tracing, reading and signalling other processes; leaving their surroundings.
+// Calls that take a process's descriptor are closed by closing pidfd_open.
 constexpr unsigned kOfProcesses[] = {
     SYS_execve,  SYS_execveat,        SYS_process_vm_readv,  SYS_process_vm_writev, SYS_kcmp,
     SYS_tkill,   SYS_rt_sigqueueinfo, SYS_rt_tgsigqueueinfo, SYS_pidfd_send_signal, SYS_pidfd_open,
     SYS_unshare, SYS_setns,           SYS_migrate_pages,     SYS_move_pages,
 };
 
-// To change what is mounted, and which folder is the root.
+// Changing what is mounted, and which folder is the root.
 constexpr unsigned kOfMounts[] = {
     SYS_mount,   SYS_umount2,  SYS_pivot_root,  SYS_chroot, SYS_open_tree,     SYS_move_mount,
     SYS_fsopen,  SYS_fsconfig, SYS_fsmount,     SYS_fspick, SYS_mount_setattr, SYS_swapon,
     SYS_swapoff, SYS_quotactl, SYS_quotactl_fd, SYS_acct,   SYS_nfsservctl,
 };
 
-// To make, change, move and remove files and what is known of them.
+// Creating, changing, moving and removing files and their metadata.
 constexpr unsigned kOfFiles[] = {
     SYS_truncate,  SYS_ftruncate,   SYS_unlinkat,     SYS_renameat2,    SYS_linkat,
     SYS_symlinkat, SYS_mkdirat,     SYS_mknodat,      SYS_fchmod,       SYS_fchmodat,
@@ -88,21 +88,21 @@ constexpr unsigned kOfFiles[] = {
 #ifdef SYS_renameat
     SYS_renameat,
 #endif
-#ifdef SYS_open  // the calls that take paths alone, which newer architectures do without
+#ifdef SYS_open  // calls that take only paths, which newer architectures lack
     SYS_creat,     SYS_unlink,      SYS_rename,       SYS_link,         SYS_symlink,
     SYS_mkdir,     SYS_rmdir,       SYS_mknod,        SYS_chmod,        SYS_chown,
     SYS_lchown,    SYS_utime,       SYS_utimes,       SYS_futimesat,
 #endif
 };
 
-// To share memory and messages with other processes, and to be called by them.
+// Sharing memory and messages with other processes, and being called by them.
 constexpr unsigned kOfSharing[] = {
     SYS_shmget,       SYS_shmat,           SYS_shmctl,    SYS_shmdt,         SYS_msgget,
     SYS_msgsnd,       SYS_msgrcv,          SYS_msgctl,    SYS_mq_open,       SYS_mq_unlink,
     SYS_mq_timedsend, SYS_mq_timedreceive, SYS_mq_notify, SYS_mq_getsetattr, SYS_listen,
 };
 
-// To change the kernel, the clock and the machine, and parts of the kernel with a history of holes.
+// Changing the kernel, the clock and the machine, and parts of the kernel with a history of holes.
 constexpr unsigned kOfTheMachine[] = {
     SYS_init_module,
     SYS_finit_module,
@@ -130,7 +130,7 @@ constexpr unsigned kOfTheMachine[] = {
 #ifdef SYS_kexec_file_load
     SYS_kexec_file_load,
 #endif
-#ifdef SYS_iopl  // of the x86 processors
+#ifdef SYS_iopl  // only on x86 processors
     SYS_iopl,
     SYS_ioperm,
     SYS_modify_ldt,
@@ -138,8 +138,8 @@ constexpr unsigned kOfTheMachine[] = {
 #endif
 };
 
-// Harmless ones that nobody asks for, between others on x86_64: the filter is shorter with them,
-// and the process starts faster.
+// Harmless calls that nobody needs, numbered between others on x86_64: including them makes the
+// filter shorter and the process start faster.
 constexpr unsigned kInBetween[] = {
     SYS_sync,
     SYS_syncfs,
@@ -170,8 +170,8 @@ constexpr unsigned kInBetween[] = {
 };
 
 #ifdef __i386__
-// The same once more, for longer numbers and from before there were others. Its socketcall stays
-// open: the family of a socket is behind a pointer there.
+// The same calls again, for longer numbers and from before the others existed. This architecture's
+// socketcall stays open: there, a socket's family is behind a pointer.
 constexpr unsigned kOfThisArchitecture[] = {
     SYS_truncate64,
     SYS_ftruncate64,
@@ -193,9 +193,9 @@ constexpr unsigned kOfThisArchitecture[] = {
 constexpr std::span<const unsigned> kOfThisArchitecture;
 #endif
 
-// Which ioctl requests pass: the label of a file system; the geometry of xfs and the generations of
-// its items (XFS_IOC_FSGEOMETRY, XFS_IOC_BULKSTAT); what the C library asks of a stream and a
-// socket. By kind and number, whatever their size.
+// The ioctl requests that pass: the label of a file system; the geometry of xfs and the generations
+// of its items (XFS_IOC_FSGEOMETRY, XFS_IOC_BULKSTAT); what the C library asks of a stream and a
+// socket. Compared by kind and number, whatever their size.
 constexpr unsigned KindAndNumber(unsigned request) {
   return request & (_IOC_TYPEMASK << _IOC_TYPESHIFT | _IOC_NRMASK << _IOC_NRSHIFT);
 }
@@ -203,7 +203,7 @@ constexpr unsigned kRequests[] = {KindAndNumber(FS_IOC_GETFSLABEL), _IOC(0U, 'X'
                                   _IOC(0U, 'X', 127U, 0U),          KindAndNumber(TCGETS),
                                   KindAndNumber(FIONREAD),          KindAndNumber(FIONBIO)};
 
-// Families of sockets: of this machine, and of networks.
+// Families of sockets: local ones, and those of networks.
 constexpr unsigned kLocalFamilies[] = {AF_UNIX};
 constexpr unsigned kAllFamilies[] = {AF_UNIX, AF_INET, AF_INET6, AF_NETLINK};
 
@@ -226,7 +226,7 @@ constexpr Rules MakeRules() {
         std::span<const unsigned>(kOfThisArchitecture)}) {
     Refuse(rules, calls);
   }
-  rules[SYS_clone3] = Rule::kUnknown;  // its flags are behind a pointer; clone is asked instead
+  rules[SYS_clone3] = Rule::kUnknown;  // its flags are behind a pointer; callers fall back to clone
   rules[SYS_kill] = Rule::kNoSignal;
   rules[SYS_tgkill] = Rule::kThisProcess;
   rules[SYS_prlimit64] = Rule::kItsOwn;
@@ -251,13 +251,13 @@ constexpr Rule kRulesWithLooks[] = {Rule::kNoSignal,   Rule::kThisProcess, Rule:
 
 // --- The program --------------------------------------------------------------------------------
 
-// Neighbouring calls with one rule.
+// A run of neighbouring calls with the same rule.
 struct Run {
   unsigned first;
   Rule rule;
 };
 
-// Where the low half of an argument is: all that are looked at are no wider.
+// The offset of an argument's low half: none that are examined are wider.
 constexpr unsigned Argument(unsigned index) {
   return static_cast<unsigned>(offsetof(seccomp_data, args) + index * sizeof(std::uint64_t));
 }
@@ -265,8 +265,8 @@ constexpr unsigned Argument(unsigned index) {
 // Stands for this process's id, which only the running process knows.
 constexpr unsigned kSelf = ~0U;
 
-// Where a step leads: to the one for a rule, which comes behind all that look for it, since the
-// kernel only takes ways forward.
+// Writes the filter's steps. The steps for a rule come after all jumps to it, since the kernel only
+// allows forward jumps.
 class Writer {
  public:
   constexpr explicit Writer(const Openings& openings) : mOpenings(openings) { Write(); }
@@ -319,17 +319,17 @@ class Writer {
     Add(BPF_JUMP(static_cast<unsigned short>(BPF_JMP | how | BPF_K), with, 0, 0));
   }
 
-  // The way from a comparison with that outcome to the next step.
+  // Makes a comparison with this outcome jump to the next step.
   constexpr void LeadOn(unsigned short from, Outcome outcome) {
     const auto distance = static_cast<std::uint8_t>(mFilter.size - from - 1);
     (outcome == kYes ? mFilter.steps.at(from).jt : mFilter.steps.at(from).jf) = distance;
   }
-  // The way from the last step to that of a rule.
+  // Makes the last step jump to a rule's steps.
   constexpr void LeadTo(Rule rule, Outcome outcome) { LeadTo(rule, outcome, Last()); }
   constexpr void LeadTo(Rule rule, Outcome outcome, unsigned short from) {
     mWays.at(mWayCount++) = {from, outcome, rule};
   }
-  // All ways to a rule lead to the next step. False if there are none.
+  // Makes all jumps to a rule lead to the next step. Returns false when there are none.
   constexpr bool Arrive(Rule rule) {
     bool isAwaited = false;
     for (const Way& way : std::span(mWays).first(mWayCount)) {
@@ -341,7 +341,7 @@ class Writer {
   }
   constexpr unsigned short Last() const { return static_cast<unsigned short>(mFilter.size - 1); }
 
-  // From the number to its rule.
+  // Maps the call's number to its rule.
   constexpr void WriteChoice() {
     std::array<Run, kNumberOfCalls + 1> runs{};
     std::size_t count = 0;
@@ -352,7 +352,7 @@ class Writer {
     Choose(std::span(runs).first(count));
   }
 
-  // By halves, so that what runs for each call is short.
+  // A binary search, so that few steps run for each call.
   constexpr void Choose(std::span<const Run> runs) {
     const std::size_t half = runs.size() / 2;
     Compare(BPF_JGE, runs[half].first);
@@ -366,7 +366,7 @@ class Writer {
     Choose(runs);
   }
 
-  // From an argument to the answer.
+  // Examines an argument and decides.
   constexpr void WriteLook(Rule rule) {
     switch (rule) {
       case Rule::kNoSignal:
@@ -414,12 +414,12 @@ class Writer {
 };
 
 #ifdef TALLOWMERE_COVERAGE
-// Made anew each time, so that what makes it is counted.
+// Built on each use, so that coverage counts the code that builds it.
 SystemCallFilter FilterFor(const Openings& openings) {
   return Writer(openings).Filter();
 }
 #else
-// Made by the compiler: a process that starts only copies the one that it needs.
+// Built by the compiler: a starting process only copies the one that it needs.
 constexpr SystemCallFilter kFilters[2][2] = {
     {Writer({false, false}).Filter(), Writer({false, true}).Filter()},
     {Writer({true, false}).Filter(), Writer({true, true}).Filter()},

@@ -14,11 +14,12 @@ using std::string_view;
 
 constexpr string_view kBlanks = " \t\r";
 
-// Services that open files or ask a daemon of this machine.
+// Services that open files or ask a daemon on this machine.
 constexpr auto kLocalServices = std::to_array<string_view>(
     {"files", "db", "systemd", "sss", "winbind", "mymachines", "extrausers", "altfiles", "cache"});
 
-// Takes off the front of a text what is in front of the first of these characters, and that one.
+// Removes what precedes the first of these characters, and that character, from the front of a
+// text; returns the former.
 string_view TakeUpTo(string_view characters, string_view& text) {
   const std::size_t end = std::min(text.find_first_of(characters), text.size());
   const string_view taken = text.substr(0, end);
@@ -30,7 +31,7 @@ bool IsLocal(string_view service) {
   return std::find(kLocalServices.begin(), kLocalServices.end(), service) != kLocalServices.end();
 }
 
-// Of what stands behind the colon: words, and actions in brackets between them.
+// The text after the colon: services, with actions in brackets between them.
 bool AreLocal(string_view services) {
   while (!services.empty()) {
     if (services.front() == '[') {
@@ -65,7 +66,7 @@ bool UserDatabaseNeedsNetwork() {
   if (!file.IsOpen()) return false;
   std::array<char, 4096> text;
   const ssize_t size = read(file.Get(), text.data(), text.size());
-  // What does not fit may name anything.
+  // A file that does not fit may name anything.
   if (size < 0 || size == static_cast<ssize_t>(text.size())) return true;
   return NeedsNetwork({text.data(), static_cast<std::size_t>(size)});
 }

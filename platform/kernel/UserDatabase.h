@@ -5,11 +5,11 @@
 
 namespace tallowmere::kernel {
 
-// Whether a text like that of /etc/nsswitch.conf names a service for "passwd" that is not known to
-// do with files and local sockets. "compat" is none of those that are: it may ask NIS.
+// Whether a text like that of /etc/nsswitch.conf names a service for "passwd" that may need more
+// than files and local sockets. "compat" is such a service: it may ask NIS.
 bool NeedsNetwork(std::string_view nameServiceSwitch);
 
-// The same of this machine's. Not where it has none: the C library then looks into files.
+// The same for this machine's file. False when there is none: the C library then reads files.
 bool UserDatabaseNeedsNetwork();
 
 }  // namespace tallowmere::kernel

@@ -1,4 +1,4 @@
-// What the kernel says of a mounted file system as a whole.
+// What the kernel reports about a mounted file system as a whole.
 #pragma once
 
 #include <cstdint>
@@ -9,8 +9,8 @@
 
 namespace tallowmere::kernel {
 
-// The kind of the file system at a mount point whose root folder is on that device: statfs(2).
-// Valid for the life of the process.
+// The kind of the file system at a mount point whose root folder is on this device: statfs(2). The
+// result is valid for the life of the process.
 Result<const FileSystemKind*> ReadKind(const std::string& mountPoint, std::uint64_t device);
 
 // The highest inode number that the file system at a mount point can have now. It may grow.

@@ -7,13 +7,13 @@
 namespace tallowmere::kernel {
 namespace {
 
-// The records of ioctl_xfs_bulkstat(2) and ioctl_xfs_fsgeometry(2); `others` stands for the fields
-// that nobody here needs.
+// The records of ioctl_xfs_bulkstat(2) and ioctl_xfs_fsgeometry(2); `others` stands for fields that
+// are not needed here.
 struct BulkHeader {
   std::uint64_t inode;  // the first to look for
   std::uint32_t flags;
-  std::uint32_t room;   // for so many records
-  std::uint32_t count;  // of those filled in
+  std::uint32_t room;   // in records
+  std::uint32_t count;  // records filled in
   std::uint32_t group;
   std::uint64_t reserved[5];
 };
@@ -40,13 +40,14 @@ struct Geometry {
 };
 static_assert(sizeof(Geometry) == 256);
 
-// XFS_IOC_BULKSTAT and XFS_IOC_FSGEOMETRY of <xfs/xfs_fs.h>. The size in the first is the header's.
+// XFS_IOC_BULKSTAT and XFS_IOC_FSGEOMETRY of <xfs/xfs_fs.h>. The former is defined with the
+// header's size.
 constexpr unsigned long kBulkStat = _IOR('X', 127, BulkHeader);
 constexpr unsigned long kGeometry = _IOR('X', 126, Geometry);
 
 }  // namespace
 
-// Bulkstat looks for the first item that has the number or a higher one.
+// Bulkstat finds the first item with this number or a higher one.
 Result<std::uint32_t> ReadXfsGeneration(int onVolume, std::uint64_t inode) {
   struct {
     BulkHeader header;
@@ -59,7 +60,7 @@ Result<std::uint32_t> ReadXfsGeneration(int onVolume, std::uint64_t inode) {
   return request.record.generation;
 }
 
-// A number is made of those of a group, of a block in it and of an inode in the block.
+// A number consists of the group, the block in the group, and the inode in the block.
 Result<std::uint64_t> ReadHighestXfsInode(int onVolume) {
   Geometry geometry{};
   if (ioctl(onVolume, kGeometry, &geometry) != 0) return Error::OfLastCall();

@@ -1,6 +1,6 @@
-// What xfs tells of itself beyond the calls that all file systems answer.
+// What xfs reports about itself beyond the calls that all file systems support.
 //
-// ENOTTY: the volume is of another kind.
+// Returns ENOTTY when the volume is not xfs.
 #pragma once
 
 #include <cstdint>
@@ -9,13 +9,14 @@
 
 namespace tallowmere::kernel {
 
-// The generation of an inode number, which its handle needs. `onVolume` is open for reading.
+// The generation of an inode number, which its handle needs. REQUIRES: `onVolume` is open for
+// reading.
 //
 //   EPERM    the process lacks CAP_SYS_ADMIN
 //   ENOENT   no item has the number
 Result<std::uint32_t> ReadXfsGeneration(int onVolume, std::uint64_t inode);
 
-// No inode number of the volume is higher, until the volume grows. No privilege needed.
+// The highest inode number that the volume can have until it grows. Needs no privilege.
 Result<std::uint64_t> ReadHighestXfsInode(int onVolume);
 
 }  // namespace tallowmere::kernel

@@ -26,7 +26,7 @@ std::u16string ExchangedText(std::string_view linuxName) {
   return foundation::ExchangeColonsAndSlashes(text::TextOfFileName(linuxName));
 }
 
-// ".aif" of "a.aif", or nothing.
+// The extension with its dot, ".aif" of "a.aif"; empty when there is none to keep.
 std::string KeptExtension(std::u16string_view text) {
   const std::size_t dot = text.rfind(u'.');
   if (dot == std::u16string_view::npos || dot == 0) return {};
@@ -55,7 +55,7 @@ std::string CapitalHexadecimal(std::uint32_t number) {
   return text;
 }
 
-// What a short name without its extension says.
+// Reads a short name without its extension.
 std::optional<ShortNameParts> ReadShortStem(std::string_view stem) {
   const std::size_t mark = stem.rfind(kMark);
   if (mark == std::string_view::npos) return std::nullopt;

@@ -5,21 +5,21 @@
 namespace tallowmere::names {
 namespace {
 
-// The lower half: inode numbers as they are. HFS reserves the ids below 16.
+// The lower half: inode numbers themselves. HFS reserves the ids below 16.
 constexpr std::uint64_t kLowestOwnNumber = 16;
 constexpr std::uint64_t kHighestOwnNumber = 0x7FFFFFFF;
 
 constexpr std::uint32_t kLowestUpper = 0x80000000;
 constexpr std::uint32_t kHighestUpper = 0xFFFFFFEF;
 
-// Above them stand the numbers 1 to 15: 0xFFFFFFF0 to 0xFFFFFFFE.
+// The top of the upper half: the numbers 1 to 15 as 0xFFFFFFF0 to 0xFFFFFFFE.
 constexpr std::uint64_t kHighestSmallNumber = kLowestOwnNumber - 1;
 constexpr std::uint32_t kHighestID = kHighestUpper + kHighestSmallNumber;
 
-// Folding keeps the lowest 31 bits, but for each 2^31 in the number beyond the first it shifts
-// them: the groups of a large xfs volume begin at multiples of 2^31 and number their items alike.
-// The shift is the golden ratio of 2^31, which keeps any few of them well apart. Then what would be
-// among the numbers 1 to 15 is moved down.
+// Folding keeps the lowest 31 bits, shifted once for each 2^31 in the number beyond the first: the
+// groups of a large xfs volume begin at multiples of 2^31 and number their items alike. The shift
+// is the golden ratio of 2^31, which keeps any few of them well apart. A result among the ids of
+// the numbers 1 to 15 is then moved down.
 constexpr std::uint64_t kFold = std::uint64_t{1} << 31;
 constexpr std::uint64_t kShift = 0x1E3779B1;
 constexpr std::uint32_t kMovedDown = 0x10;
@@ -33,7 +33,7 @@ constexpr std::uint32_t kLowestMixedOfSubvolumes = 0xE0000000;
 static_assert(kLowestUpper + ((kHighestSubvolume - kLowestSubvolume + 1) << kSubvolumeShift) ==
               kLowestMixedOfSubvolumes);
 
-// The finishing step of SplitMix64: every bit of the input moves every bit of the result.
+// The finalizer of SplitMix64: every input bit affects every output bit.
 std::uint64_t Mix(std::uint64_t value) {
   value = (value ^ value >> 30) * 0xBF58476D1CE4E5B9;
   value = (value ^ value >> 27) * 0x94D049BB133111EB;
@@ -64,7 +64,7 @@ std::uint32_t Fold(std::uint64_t inode) {
   return folded > kHighestUpper ? folded - kMovedDown : folded;
 }
 
-// The number that has those 31 bits after its shift.
+// The number whose 31 bits these are after its shift.
 std::uint64_t Unfold(std::uint64_t kept, std::uint64_t fold) {
   return fold * kFold + (kept - ShiftOf(fold)) % kFold;
 }
@@ -82,8 +82,8 @@ std::uint32_t UpperIDInSubvolumes(const ItemNumbers& item, const NodeIDRule& rul
   return static_cast<std::uint32_t>(kLowestUpper + place + item.inode);
 }
 
-// The device of the root folder differs from mount to mount on file systems without a disk of their
-// own, so ids on it do without it.
+// The root folder's device differs from mount to mount on file systems without a disk of their own,
+// so its ids do not depend on it.
 std::uint32_t UpperID(const ItemNumbers& item, const NodeIDRule& rule) {
   if (rule.upper == UpperIDs::kSubvolumes) return UpperIDInSubvolumes(item, rule);
   if (rule.upper == UpperIDs::kFolded && item.inode > kHighestOwnNumber) return Fold(item.inode);
@@ -92,10 +92,10 @@ std::uint32_t UpperID(const ItemNumbers& item, const NodeIDRule& rule) {
 
 using Candidates = std::vector<Candidate>;
 
-// The numbers on the root folder's device up to the highest that are folded into the id.
+// The numbers on the root folder's device, up to the highest one, that fold into the id.
 std::optional<Candidates> FoldedInto(std::uint32_t id, std::uint64_t rootInode,
                                      std::uint64_t highestInode) {
-  const std::uint64_t folds = highestInode / kFold;  // each with two candidates at most
+  const std::uint64_t folds = highestInode / kFold;  // each with at most two candidates
   if (folds > kMostCandidates / 2) return std::nullopt;
   std::vector<std::uint64_t> inodes;
   for (std::uint64_t fold = 1; fold <= folds; ++fold) {

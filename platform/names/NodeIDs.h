@@ -23,22 +23,22 @@
 
 namespace tallowmere::names {
 
-inline constexpr std::uint32_t kParentOfRootID = 1;  // what every root folder has for its parent
+inline constexpr std::uint32_t kParentOfRootID = 1;  // the parent of every root folder
 inline constexpr std::uint32_t kRootFolderID = 2;
-inline constexpr std::uint32_t kNoVolumeID = 3;  // of what is on no volume; never an item's
+inline constexpr std::uint32_t kNoVolumeID = 3;  // of an item on no volume; never an item's own
 
-// How a kind of file systems fills the upper half of the ids.
+// How a kind of file system fills the upper half of the ids.
 enum class UpperIDs : std::uint8_t {
   kMixed,       // by device and number
-  kFolded,      // by the number: those that share an id can be listed
+  kFolded,      // by number: the numbers that share an id can be listed
   kSubvolumes,  // by subvolume and number, as on btrfs
 };
 
 // What the kernel says of an item.
 struct ItemNumbers {
-  std::uint64_t inode;  // 0 is no item's where numbers tell items apart
+  std::uint64_t inode;  // never 0 where numbers tell items apart
   std::uint64_t device;
-  std::uint64_t subvolume;  // 0 where nobody asked; see NeedsSubvolume
+  std::uint64_t subvolume;  // 0 when not asked for: see NeedsSubvolume
 
   bool operator==(const ItemNumbers&) const = default;
 };
@@ -58,11 +58,11 @@ std::uint32_t NodeIDOf(const ItemNumbers& item, const NodeIDRule& rule);
 // Whether an item of some volume can have the id.
 bool CanBeNodeID(std::uint32_t id);
 
-// Whether the id is the inode number of the only item that can have it, which is on the root
-// folder's device.
+// Whether the id is an inode number itself, so that only the item with that number on the root
+// folder's device can have it.
 bool IsInodeNumber(std::uint32_t id);
 
-// An inode number of a volume. `subvolume` is 0 for that of the root folder.
+// An inode number of a volume. `subvolume` is 0 for the root folder's own.
 struct Candidate {
   std::uint64_t inode;
   std::uint64_t subvolume;
@@ -70,19 +70,19 @@ struct Candidate {
   bool operator==(const Candidate&) const = default;
 };
 
-// Longer lists of candidates are not made.
+// Longer lists of candidates are never built.
 inline constexpr std::size_t kMostCandidates = 1024;
 
-// The numbers that have the id, lowest first: at most one of them for most ids, and none for an id
-// that no item of the volume can have. Nullopt where they cannot be listed: of mixed ids, and where
-// there could be more than kMostCandidates.
+// The numbers that have the id, lowest first: at most one for most ids, none for an id that no item
+// of the volume can have. Nullopt when they cannot be listed: for mixed ids, and when there could
+// be more than kMostCandidates.
 //
 // `highestInode` is the highest inode number that the volume can have.
 std::optional<std::vector<Candidate>> CandidatesOf(std::uint32_t id, const NodeIDRule& rule,
                                                    std::uint64_t highestInode);
 
-// Whether at most one number of the volume has the id. That is one item's on a kind of file systems
-// whose numbers tell items apart.
+// Whether at most one number of the volume has the id. Where numbers tell items apart, at most one
+// item then has it.
 bool IsCertain(std::uint32_t id, const NodeIDRule& rule, std::uint64_t highestInode);
 
 }  // namespace tallowmere::names

@@ -9,7 +9,8 @@
 namespace tallowmere::volumes {
 namespace {
 
-// Takes the text up to the next `separator` off the front of `rest`.
+// Removes the text up to the next `separator`, and the separator, from the front of `rest`; returns
+// the text.
 std::string_view TakeUntil(std::string_view& rest, char separator) {
   const std::size_t end = rest.find(separator);
   const std::string_view taken = rest.substr(0, end);
@@ -29,7 +30,7 @@ bool IsOctalDigit(char c) {
   return c >= '0' && c <= '7';
 }
 
-// The kernel writes space, tab, newline, backslash and '#' as \ and three octal digits.
+// The kernel writes space, tab, newline, backslash and '#' as a backslash and three octal digits.
 std::string Unescape(std::string_view text) {
   std::string plain;
   plain.reserve(text.size());
@@ -53,8 +54,8 @@ std::optional<dev_t> ParseDevice(std::string_view text) {
   return makedev(*majorNumber, *minorNumber);
 }
 
-// "36 35 98:0 /mnt1 /mnt2 rw,noatime master:1 - ext3 /dev/root rw,errors=continue": between the
-// mount options and the lone "-" stand any number of optional fields.
+// "36 35 98:0 /mnt1 /mnt2 rw,noatime master:1 - ext3 /dev/root rw,errors=continue": any number of
+// optional fields stand between the mount options and the lone "-".
 std::optional<Mount> ParseLine(std::string_view line) {
   const auto id = ParseNumber<int>(TakeUntil(line, ' '));
   const auto parent = ParseNumber<int>(TakeUntil(line, ' '));

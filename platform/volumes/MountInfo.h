@@ -1,4 +1,4 @@
-// The text of the kernel's table of mounts: proc(5), /proc/[pid]/mountinfo. Pure.
+// Parses the kernel's table of mounts: proc(5), /proc/[pid]/mountinfo. Pure.
 #pragma once
 
 #include <sys/types.h>
@@ -11,15 +11,15 @@ namespace tallowmere::volumes {
 
 // One line of the table.
 struct Mount {
-  int id;            // unique while mounted
-  int parent;        // the mount that this one is mounted on
-  dev_t device;      // of the file system; what stat reports can differ (subvolumes, overlays)
-  std::string root;  // the folder of the file system that is shown at the mount point
+  int id;                  // unique while mounted
+  int parent;              // the mount that this one is mounted on
+  dev_t device;            // of the file system; stat may report another (subvolumes, overlays)
+  std::string root;        // the folder of the file system that is shown at the mount point
   std::string mountPoint;  // absolute, as this process sees it
   std::string type;        // of the file system: "ext4", "tmpfs", …
 };
 
-// The lines in the kernel's order, escapes undone. A malformed line is passed over.
+// The lines in the kernel's order, with escapes undone. Malformed lines are skipped.
 std::vector<Mount> ParseMountInfo(std::string_view text);
 
 }  // namespace tallowmere::volumes

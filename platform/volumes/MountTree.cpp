@@ -11,7 +11,7 @@ MountTree::MountTree(const std::vector<Mount>& mounts, int rootID)
   for (std::size_t i = 0; i < mounts.size(); ++i) {
     mByID.emplace(mounts[i].id, i);
     if (mounts[i].mountPoint == "/") continue;
-    // Of two mounts on one place of one parent the kernel finds the later one.
+    // Of two mounts at the same place on the same parent, the kernel finds the later one.
     mByPlace.insert_or_assign({mounts[i].parent, mounts[i].mountPoint}, i);
   }
 }
@@ -62,7 +62,7 @@ bool MountTree::IsEntered(std::size_t index) {
       isEntered = mState[index] == State::kEntered;
       break;
     }
-    mState[index] = State::kHidden;  // ends the climb where mounts are each other's ancestors
+    mState[index] = State::kHidden;  // ends the climb when mounts are each other's ancestors
     chain.push_back(index);
     const auto parent = mByID.find(mMounts[index].parent);
     if (IsRoot(index) || parent == mByID.end()) break;

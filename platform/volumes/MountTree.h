@@ -1,4 +1,4 @@
-// Which mounts are reachable, and which of them make one volume. Pure but for the caller's
+// Which mounts are reachable, and which of them form one volume. Pure except for the caller's
 // `isFolder`.
 #pragma once
 
@@ -14,29 +14,31 @@
 
 namespace tallowmere::volumes {
 
-// The mounts of a table by what they are mounted on.
+// The mounts of a table, arranged by what they are mounted on.
 //
-// Reachable: not covered by another mount at its own mount point, nor by one further up. What is
-// mounted over the process's root is unreachable: path lookup starts below it. Parents that are
-// missing from the table count as reachable.
+// A mount is reachable when it is not covered by another mount, at its own mount point or further
+// up. What is mounted over the process's root is unreachable: path lookup starts below it. Parents
+// that are missing from the table count as reachable.
 class MountTree {
  public:
-  // `rootID` is the id of the mount that the process's root is in. REQUIRES: it is among the
-  // mounts, which outlive the tree.
+  // `rootID` is the id of the mount that contains the process's root. REQUIRES: it is among
+  // `mounts`, which outlive the tree.
   MountTree(const std::vector<Mount>& mounts, int rootID);
 
-  // The mounts that make each volume, by index, its place in front; the volumes in their order: the
-  // one of "/" first, then the kernel's order of places. Mounts of one file system are one volume.
+  // Groups mounts of the same file system into volumes. Each volume is a list of mount indexes: its
+  // place, then its other reachable mounts. The volume of "/" comes first, the others in the
+  // kernel's order of their places. A volume's place is the first of these that exists:
   //
-  // A volume's place is the mount at the process's root if it is one of its own, else its first
-  // reachable mount of the file system's root folder, else its first reachable mount of a folder (a
-  // file can be mounted alone); behind the place stand its other reachable mounts. `isFolder` is
-  // asked only where no mount shows the root folder and MayBeFile().
+  //   1. the mount at the process's root
+  //   2. the first reachable mount of the file system's root folder
+  //   3. the first reachable mount of a folder (a file can be mounted alone)
+  //
+  // `isFolder` is called only where no mount shows the root folder, and only where MayBeFile().
   std::vector<std::vector<std::size_t>> GroupIntoVolumes(
       const std::function<bool(const Mount&)>& isFolder);
 
-  // Whether a mount can be a single file's, as far as can be told without waiting for a server:
-  // behind one it counts as a folder. REQUIRES: the mount is reachable.
+  // Whether a mount may be that of a single file, as far as can be told without waiting for a
+  // server: one that needs a server counts as a folder. REQUIRES: the mount is reachable.
   bool MayBeFile(std::size_t index) const;
 
  private:

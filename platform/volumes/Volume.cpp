@@ -11,10 +11,10 @@
 namespace tallowmere::volumes {
 namespace {
 
-// What the volume of "/" is called when its file system has no label.
+// The name of the volume of "/" when its file system has no label.
 constexpr const char* kUnlabelledRoot = "Root";
 
-// What a path has behind a folder that it is within, without "/" in front; empty for the folder.
+// The path relative to a folder that contains it; empty for the folder itself.
 std::string_view BehindFolder(std::string_view path, std::string_view folder) {
   path.remove_prefix(folder == "/" ? 0 : folder.size());
   if (path.starts_with('/')) path.remove_prefix(1);
@@ -25,8 +25,8 @@ std::string Below(const std::string& folder, std::string_view path) {
   return path.empty() ? folder : foundation::JoinPath(folder, path);
 }
 
-// Whether an error says that this process may not read the label, or that the device does not give
-// it: the next process may be told more.
+// Whether an error means that this process may not read the label, or that the device does not
+// return it: another process may succeed.
 bool HidesLabel(kernel::Error error) {
   return kernel::MeansRefused(error) || error.number == EIO;
 }
@@ -36,12 +36,12 @@ std::string HFSNameOfVolume(const std::string& linuxName) {
   return plain ? *std::move(plain) : names::ShortHFSName(linuxName, names::kRootFolderID);
 }
 
-// 0 for an item that has no handle, or is in none.
+// 0 for an item without a handle, or without a subvolume.
 std::uint64_t SubvolumeOfItem(const kernel::Item& item) {
   return kernel::SubvolumeOf(item.handle).value_or(0);
 }
 
-// Whether the item that was found at a mount point is not what is mounted there.
+// Whether the item found at a mount point is not what is mounted there.
 bool IsMoved(const kernel::Result<kernel::Status>& found, int mount) {
   if (!found) return found.Error().number == ENOENT || found.Error().number == ENOTDIR;
   return found->item.mount != kernel::kNoMount && found->item.mount != mount;
@@ -97,7 +97,7 @@ kernel::Result<std::string_view> ListedVolume::Name() const {
   auto label = kernel::ReadRootLabel();
   if (!label && !HidesLabel(label.Error())) return label.Error();
   const bool isLabelled = label && !label->empty();
-  // A label may hold what no name of an item can.
+  // A label may contain characters that no item's name can.
   if (isLabelled) std::replace(label->begin(), label->end(), '/', ':');
   mName = HFSNameOfVolume(isLabelled ? *label : kUnlabelledRoot);
   mIsNameKnown = static_cast<bool>(label);
@@ -113,7 +113,7 @@ kernel::Result<VolumePointer> ListedVolume::Enter() const {
     const auto kind = kernel::ReadKind(MountPoint(), root->item.device);
     if (!kind) return kind.Error();
     kernel::Item item = root->item;
-    // Subvolumes are told by handles.
+    // Subvolumes are known from handles.
     if ((*kind)->upperIDs == names::UpperIDs::kSubvolumes) item.handle = kernel::HandleAt(place);
     mEntered.emplace(*this, item, **kind);
   }

@@ -11,8 +11,8 @@ namespace {
 
 constexpr VolumeNumber kLowestNumber = std::numeric_limits<VolumeNumber>::min();
 
-// How often a table that changes while it is read is read again before it is taken as it is. The
-// next question finds the change signalled.
+// How often a table that changes while it is being read is read again before it is used as it is.
+// The next query finds the change signalled.
 constexpr int kReadAttempts = 8;
 
 bool HasMount(const std::vector<Mount>& mounts, int id) {
@@ -20,7 +20,7 @@ bool HasMount(const std::vector<Mount>& mounts, int id) {
                      [id](const Mount& mount) { return mount.id == id; });
 }
 
-// The table's own mount at "/", where the kernel reports no mount ids: the lowest of a stack.
+// The lowest mount of the stack at "/" in the table, for kernels that report no mount ids.
 std::optional<int> LowestRoot(const std::vector<Mount>& mounts) {
   for (const Mount& mount : mounts) {
     const bool isLowest = mount.parent == mount.id || !HasMount(mounts, mount.parent);
@@ -29,8 +29,8 @@ std::optional<int> LowestRoot(const std::vector<Mount>& mounts) {
   return std::nullopt;
 }
 
-// The id of the mount at the process's root, which is then among the mounts: there may be no table,
-// or "/" is a folder inside a mount (chroot), or the kernel reports no ids.
+// The id of the mount that contains the process's root. Adds that mount where it is missing: there
+// may be no table, "/" may be a folder inside a mount (chroot), or the kernel may report no ids.
 int FindRoot(std::vector<Mount>& mounts, const kernel::RootMount& root) {
   if (HasMount(mounts, root.id)) return root.id;
   const auto lowest = root.id == 0 ? LowestRoot(mounts) : std::nullopt;
@@ -116,7 +116,8 @@ void VolumeTable::Read() {
     const auto text = mFile.Read();
     if (!text) break;
     mounts = ParseMountInfo(*text);
-    // A mount made between two pieces of the text is signalled by now, and signalled only once.
+    // A mount made between two pieces of the text has been signalled by now, and is signalled only
+    // once.
     isWhole = !mFile.HasChanged();
   }
   const int rootID = FindRoot(mounts, mReadRoot());
@@ -149,7 +150,7 @@ VolumesPointer VolumeTable::VolumesOf(const std::vector<Mount>& mounts, int root
                                          std::move(mountPoints));
 }
 
-// Null when no number is left for it.
+// Null when every number is taken.
 ListedVolumePointer VolumeTable::ListVolume(const std::vector<Mount>& mounts,
                                             const std::vector<std::size_t>& indexes,
                                             const MountTree& tree,

@@ -1,10 +1,10 @@
 // The fault library, for LD_PRELOAD: makes one system call or one allocation of a service fail.
 //
-// A filter of the kernel's turns every system call, also those that the C library makes inside,
-// into a signal, except those from one instruction of this file. The signal's handler carries the
-// call out from there, or writes the error into the registers that the call returns with.
-// Allocations go through the functions below on their way to the C library's. The clock is some
-// time ahead, so that no item is so new that a service looks at it more often.
+// A kernel filter turns every system call, including those inside the C library, into a signal,
+// except those from one instruction of this file. The signal's handler makes the call from there,
+// or writes the error into the registers that the call returns with. Allocations pass through the
+// functions below on their way to the C library's. The clock is set some time ahead, so that no
+// item is so new that a service examines it more often.
 #include <linux/audit.h>
 #include <linux/filter.h>
 #include <linux/futex.h>
@@ -25,8 +25,8 @@
 
 #include "faults/FaultPage.h"
 
-// The system call of that number with those six arguments; the kernel's result, an error negative.
-// The only one in the process that the filter lets pass, told by the address behind it.
+// Makes a system call with six arguments; returns the kernel's result, with errors negative. The
+// only call in the process that the filter lets pass, recognised by its return address.
 extern "C" long FaultLibraryCall(long number, long first, long second, long third, long fourth,
                                  long fifth, long sixth);
 extern "C" const char kFaultLibraryCallReturn[];
@@ -49,7 +49,7 @@ __asm__(R"(
     ret
 )");
 
-// The C library's own.
+// The C library's own functions.
 extern "C" void* __libc_malloc(std::size_t size);
 extern "C" void* __libc_calloc(std::size_t count, std::size_t size);
 extern "C" void* __libc_realloc(void* block, std::size_t size);
@@ -59,11 +59,11 @@ extern "C" void __libc_free(void* block);
 namespace tallowmere::test {
 namespace {
 
-// What is counted before the page is there, and where there is none.
+// Holds the counts before the page is there, and where there is none.
 FaultPage gOwnPage;
 FaultPage* gPage = &gOwnPage;
 
-// Whether the service has not begun to read a request since the last one.
+// Whether the service has not begun to read another request yet.
 bool gIsBetweenRequests = true;
 
 // --- System calls -----------------------------------------------------------------------------
@@ -84,7 +84,7 @@ struct Call {
 };
 
 long RunShortened(Call call) {
-  // A folder's entry has to fit.
+  // There must be room for one folder entry.
   const long least = call.number == SYS_getdents64 ? 512 : 1;
   call.arguments[2] = std::max(call.arguments[2] / 2, least);
   return call.Run();
@@ -92,17 +92,17 @@ long RunShortened(Call call) {
 
 long Fail(const Call& call, std::int32_t effect) {
   switch (call.number) {
-    case SYS_close:  // the kernel closes also when it tells of an error
+    case SYS_close:  // the kernel closes even when it reports an error
       call.Run();
       return -effect;
-    case SYS_brk:  // tells of no error but leaves the end where it is
+    case SYS_brk:  // reports no error, but leaves the break where it is
       return FaultLibraryCall(SYS_brk, 0, 0, 0, 0, 0, 0);
     default:
       return -effect;
   }
 }
 
-// Tells whoever waits for the service to wait.
+// Wakes whoever waits for the service to be waiting.
 void NoteRest() {
   ++gPage->rests;
   FaultLibraryCall(SYS_futex, reinterpret_cast<long>(&gPage->rests), FUTEX_WAKE, INT_MAX, 0, 0, 0);
@@ -146,7 +146,7 @@ void CatchCalls() {
   const auto pass = reinterpret_cast<std::uintptr_t>(kFaultLibraryCallReturn);
   sock_filter program[] = {
       {kLoad, 0, 0, static_cast<std::uint32_t>(offsetof(seccomp_data, nr))},
-      {kIfEqual, 4, 0, SYS_rt_sigreturn},  // by which the handler returns
+      {kIfEqual, 4, 0, SYS_rt_sigreturn},  // used by the handler to return
       {kLoad, 0, 0, kAddress},
       {kIfEqual, 0, 3, static_cast<std::uint32_t>(pass)},
       {kLoad, 0, 0, kAddress + 4},

@@ -1,5 +1,4 @@
-// What a test and a service with the fault library tell each other, in a piece of memory that both
-// see.
+// What a test and a service with the fault library tell each other through shared memory.
 //
 // The library counts the service's system calls and its allocations, each from 1, and makes one of
 // them fail as the page says. The test resets the counts while the service waits for a request.
@@ -11,15 +10,15 @@
 
 namespace tallowmere::test {
 
-// The environment variable with the descriptor of the page. Without it the library does nothing.
+// The environment variable with the page's descriptor. Without it the library does nothing.
 inline constexpr char kFaultPageVariable[] = "TALLOWMERE_FAULT_PAGE";
 
-// The exit status of a service in which the library cannot do its work.
+// The exit status of a service in which the library cannot work.
 inline constexpr int kCannotCatchCalls = 121;
 
-// What happens to the call instead of failing with an error, which is a number above 0.
-inline constexpr std::int32_t kShortened = -1;    // carried out for fewer bytes than wanted
-inline constexpr std::int32_t kWithoutBytes = 0;  // not carried out, and 0 returned
+// Effects on the call other than an error, which is a number above 0.
+inline constexpr std::int32_t kShortened = -1;    // carried out for fewer bytes than requested
+inline constexpr std::int32_t kWithoutBytes = 0;  // not carried out; returns 0
 
 inline constexpr std::size_t kMostCalls = 8192;
 
@@ -30,7 +29,7 @@ struct SeenCall {
 };
 
 struct FaultPage {
-  // Set by the test. 0 for none.
+  // Set by the test; 0 for none.
   std::atomic<std::uint32_t> failingCall;
   std::atomic<std::int32_t> effect;  // an error number, or one of the above
   std::atomic<std::uint32_t> failingAllocation;
@@ -40,9 +39,9 @@ struct FaultPage {
   std::atomic<std::uint32_t> allocations;
   std::atomic<std::uint32_t> rests;  // how often the service began to wait for a request; a futex
   std::atomic<std::int64_t> liveAllocations;
-  std::atomic<std::uint32_t> failed;       // whether the one to fail has
-  SeenCall failedCall;                     // which call that was
-  std::atomic<std::uint32_t> callsBefore;  // how many calls were before an allocation that failed
+  std::atomic<std::uint32_t> failed;       // whether the chosen one has failed
+  SeenCall failedCall;                     // that call
+  std::atomic<std::uint32_t> callsBefore;  // the number of calls before the failed allocation
   SeenCall seen[kMostCalls];
 };
 

@@ -1,7 +1,7 @@
-// Every request with every system call and every allocation of the service failing in turn, each
-// call with each error that it can have: what is answered is right or says that it is not known, or
-// the service ends as the protocol tells; the same question is answered rightly right after, and
-// nothing is left behind.
+// Sends every request with every system call and every allocation of the service failing in turn,
+// each call with each error that it can have. The answer must be right or say that it is not known,
+// or the service must end as the protocol says; the same question must be answered correctly right
+// after, and nothing may be left behind.
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/syscall.h>
@@ -61,8 +61,8 @@ bool IsReadOfInput(const SeenCall& call) {
   return call.number == SYS_read && call.first == STDIN_FILENO;
 }
 
-// Whether an allocation behind so many calls is for a field of the request: it follows the read of
-// the field's length, and the field is read next.
+// Whether an allocation after this many calls is for a field of the request: it comes after the
+// read of the field's length and before the read of the field.
 bool IsForField(std::size_t callsBefore, const std::vector<SeenCall>& calls) {
   if (callsBefore == 0 || callsBefore >= calls.size()) return false;
   const SeenCall& length = calls[callsBefore - 1];
@@ -70,8 +70,8 @@ bool IsForField(std::size_t callsBefore, const std::vector<SeenCall>& calls) {
          IsReadOfInput(calls[callsBefore]);
 }
 
-// Whether a service may end so, which makes these calls when nothing fails, up to the one that
-// waits for the next request.
+// Whether a service may end this way. `calls` are those that it makes when nothing fails, including
+// the one that waits for the next request.
 bool IsDocumentedEnd(const Fault& fault, const Outcome& outcome, const std::vector<SeenCall>& calls,
                      const std::string& right) {
   if (outcome.status != 0) return false;
@@ -81,7 +81,7 @@ bool IsDocumentedEnd(const Fault& fault, const Outcome& outcome, const std::vect
   }
   switch (outcome.failedCall.number) {
     case SYS_read: {
-      // No bytes are the end of the input.
+      // Zero bytes mean the end of the input.
       const bool hasEnded = fault.effect >= kWithoutBytes;
       const bool isWait = fault.number == calls.size();
       return IsReadOfInput(outcome.failedCall) && hasEnded && response == (isWait ? right : "");
@@ -96,20 +96,20 @@ bool IsDocumentedEnd(const Fault& fault, const Outcome& outcome, const std::vect
   }
 }
 
-// Without the trailer, and the zeros in front of it.
+// Leaves out the trailer, and the zeros before it.
 std::string Readable(std::string response) {
   if (response.ends_with(kTrailer)) response.resize(response.size() - kTrailer.size());
   return testing::PrintToString(response.substr(0, response.find_last_not_of('\0') + 1));
 }
 
-// What leaves memory behind once may have been learned; what does so again is a leak.
+// Memory that stays once may hold something learned; memory that stays twice is a leak.
 constexpr int kMostAttempts = 2;
 
-// How often a new service is asked once it has answered rightly after a fault.
+// How often a new service is asked again after its first right answer following a fault.
 constexpr int kMoreAnswers = 3;
 
-// Whether what the services reach is counted, by clang. A fault at their start then decides whether
-// the file of counts is open.
+// Whether clang counts what the services reach. A fault at their start then determines whether the
+// file of counts is open.
 bool IsCounted() {
   return getenv("LLVM_PROFILE_FILE") != nullptr;
 }
@@ -124,7 +124,8 @@ class Trial {
     mAnswers.insert(mRight);
   }
 
-  // A new service for each fault. Of so many allocations that fail, each may end it with SIGSEGV.
+  // Uses a new service for each fault. Each of this many failing allocations may end it with
+  // SIGSEGV.
   void FailNewServices(int deadlyAllocations) {
     mDeadlyAllocations = deadlyAllocations;
     FaultyService sound;
@@ -140,7 +141,8 @@ class Trial {
     }
   }
 
-  // One service that has answered the question before, as long as it lives and is as it was.
+  // Uses one service that has answered the question before, for as long as it lives and stays
+  // unchanged.
   void FailAnOldService() {
     auto service = OldService();
     const Holdings known = service->Holds();
@@ -150,7 +152,7 @@ class Trial {
     mKept = service->Holds().allocations - known.allocations;
     for (const Fault& fault : FaultsIn(mEffort)) {
       bool survives = false;
-      // What a service learns when it has to look for something, it keeps.
+      // The service keeps what it learns when it has to search.
       bool isLevel = false;
       for (int attempt = 0; attempt < kMostAttempts && !isLevel; ++attempt) {
         isLevel = FailOnce(*service, fault, survives) || !survives;
@@ -162,7 +164,7 @@ class Trial {
   }
 
  private:
-  // Without a fault. Else nothing would be tried.
+  // Asks without a fault; otherwise nothing would be tested.
   bool IsAnswered(FaultyService& service) {
     const std::string response = service.Ask(mRequest).response;
     EXPECT_TRUE(response == mRight && !mRight.empty())
@@ -177,15 +179,16 @@ class Trial {
     return service;
   }
 
-  // Whether the last answer took what the first one took: only then is the next fault reached.
+  // Whether the last answer took as many calls and allocations as the first one; only then is the
+  // next fault reached.
   bool TakesAsMuch(const FaultyService& service) const {
     const Effort effort = service.EffortSoFar();
     return effort.calls.size() == mEffort.calls.size() && effort.allocations == mEffort.allocations;
   }
 
-  // What the fault made it learn in other ways than without it, it keeps: a path that it came by,
-  // folders that are still to be read. But only once: then it takes no more for each answer than
-  // one to which nothing has happened.
+  // The service keeps what only the fault made it learn, such as a path that it visited or folders
+  // still to be read. It does so only once: afterwards it takes no more for each answer than a
+  // service without faults.
   void FailANewService(const Fault& fault) {
     FaultyService service(fault);
     if (!Survives(service, fault)) return;
@@ -200,7 +203,7 @@ class Trial {
     }
   }
 
-  // Whether it holds as much memory afterwards as before, but for what the right answers make it
+  // Whether it uses as much memory afterwards as before, except for what right answers make it
   // keep.
   bool FailOnce(FaultyService& service, const Fault& fault, bool& survives) {
     const Holdings before = service.Holds();
@@ -209,13 +212,13 @@ class Trial {
     if (!survives) return false;
     AskAgain(service, fault);
     const Holdings after = service.Holds();
-    // What the answers keep, one that is not right as much at the most.
+    // Whatever answers make it keep, a wrong one may keep at most as much as a right one.
     const std::int64_t grown = after.allocations - before.allocations - mKept;
     if (after.descriptors != before.descriptors) Report(fault, "leaves a descriptor open");
     return mIsRight ? grown == mKept : grown >= 0 && grown <= mKept;
   }
 
-  // False when it has ended.
+  // Returns false when the service has ended.
   bool Survives(FaultyService& service, const Fault& fault) {
     const Outcome outcome = service.Ask(mRequest);
     if (outcome.hasFailed) {
@@ -261,11 +264,11 @@ class Trial {
   std::string mRequest;
   std::string mRight;
   Answers mAnswers;
-  Effort mEffort{};              // for the right answer, in the state in which things fail
-  std::int64_t mKept = 0;        // allocations that stay for each right answer
-  std::size_t mDescriptors = 0;  // of a new service to which nothing has happened
-  bool mIsRight = false;         // the last one while something failed
-  int mDeadlyAllocations = 0;    // that are still expected
+  Effort mEffort{};              // of the right answer, in the state in which things fail
+  std::int64_t mKept = 0;        // allocations kept for each right answer
+  std::size_t mDescriptors = 0;  // of a new service without faults
+  bool mIsRight = false;         // whether the last answer while something failed was right
+  int mDeadlyAllocations = 0;    // how many are still expected
   int mFindings = 0;
 };
 
@@ -275,8 +278,8 @@ std::string LongName() {
   return std::string(100, 'l') + ".aif";
 }
 
-// Two items whose HFS names would be the same bytes, far from each other in their folder: neither
-// is found by them.
+// Two items whose HFS names would be the same bytes, far apart in their folder: neither is found by
+// that name.
 constexpr char kOneOfTwins[] = "/Disk/twins/e\u0301t\u00E9";
 
 void Make(const std::string& path) {
@@ -284,7 +287,7 @@ void Make(const std::string& path) {
   std::ofstream{path, std::ios::app};
 }
 
-// Longer than what a reference has on its stack.
+// Longer than a reference's buffer on the stack.
 std::string DeepPath() {
   std::string path = "/Disk/";
   for (int i = 0; i < 6; ++i) path += std::string(200, 'd') + "/";
@@ -294,8 +297,8 @@ std::string DeepPath() {
 struct Item {
   const char* name;  // of the test
   Subject (*learn)();
-  std::vector<unsigned> codes;         // asked of an old service
-  std::vector<unsigned> codesWhenNew;  // and of new ones, which is slower
+  std::vector<unsigned> codes;         // sent to an old service
+  std::vector<unsigned> codesWhenNew;  // sent to new services, which is slower
   bool asksForUsers = false;
 };
 
@@ -315,7 +318,7 @@ const std::vector<Item> kItems{
      [] { return Subject("/Disk/folder/日本.aif", "", "??.aif"); },
      kCodesOfPaths,
      {9}},
-    // The first accent is a mark of its own, the second one is not.
+    // The first accent is a separate mark, the second one is not.
     {"Accented",
      [] { return Subject("/Disk/folder/e\u0301t\u00E9", "\u00E9t\u00E9"); },
      kCodesOfPaths,
@@ -337,12 +340,12 @@ const std::vector<Item> kItems{
     {"RootOfAVolume", [] { return Subject("/Disk"); }, {1, 2, 5, 7, 8, 9}, {7, 9}},
 };
 
-// A small root with all the items on its volumes.
+// A small root with all items on its volumes.
 class Tree {
  public:
   Tree() : mRoot({TALLOWMERE_SERVICE, TALLOWMERE_FAULT_LIBRARY}) {
     if (!mRoot.IsEntered()) return;
-    // The first inodes are too low for ids.
+    // The first inode numbers are too low for ids.
     Make("/Disk/early/a track.aif");
     for (int i = 0; i < 20; ++i) Make("/Disk/fill/" + std::to_string(i) + "/file");
     for (const char* const name :
@@ -405,8 +408,8 @@ class FaultsOfNewServices : public Faults {};
 class FaultsOfOldServices : public Faults {};
 
 TEST_P(FaultsOfNewServices, AreAnsweredHonestlyAndNotRemembered) {
-  // Without memory for what it keeps of its first look at the users, one block, the C library
-  // itself ends the process. Only here is that block alone refused.
+  // When the C library has no memory for one block that its first lookup of users keeps, it ends
+  // the process itself. Only here is just that block refused.
   MakeTrial().FailNewServices(GetParam().item->asksForUsers ? 1 : 0);
 }
 

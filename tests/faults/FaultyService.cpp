@@ -20,7 +20,7 @@ namespace {
 constexpr std::chrono::seconds kPatience(10);
 constexpr timespec kOneLook{0, 2'000'000};
 
-// One page for all services of this program, of which one runs at a time.
+// One page for all services of this program, which run one at a time.
 struct SharedPage {
   SharedPage() {
     file = memfd_create("faults", 0);
@@ -44,7 +44,7 @@ FaultPage& Page() {
   return *Shared().page;
 }
 
-// The library in the environment of what is started during its life.
+// Puts the library into the environment of processes started during its life.
 class LibraryInTheEnvironment {
  public:
   LibraryInTheEnvironment() {

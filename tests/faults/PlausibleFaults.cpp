@@ -42,7 +42,7 @@ std::vector<std::int32_t> PlausibleEffects(const SeenCall& call) {
       return EffectsOnBytes(call);
     case SYS_getdents64:
       return {EINTR, EIO, EACCES, ENOMEM, ESTALE, kShortened};
-    default:  // what finds or opens something by its name, or tells of it
+    default:  // calls that find or open something by its name, or report on it
       return {EINTR, EIO, EACCES, EMFILE, ENOMEM, ELOOP, ENAMETOOLONG, ESTALE, EAGAIN};
   }
 }

@@ -1,4 +1,4 @@
-// What can go wrong with a system call.
+// The ways in which a system call can fail.
 #pragma once
 
 #include <cstdint>

@@ -18,10 +18,10 @@ constexpr int kNoVolume = 32767;
 constexpr int kNoFolder = -1;
 constexpr int kParentOfRoots = 1;
 constexpr int kRootFolder = 2;
-// The name of the volume of "/" for whoever may not read that folder, and of one without a label.
+// The name of the volume of "/" without a label, and for a process that may not read that folder.
 const std::string kUnknownLabel = "Root";
 
-// An HFS name without other letters than those of ASCII and this one.
+// Converts an HFS name whose only letters are those of ASCII and this one.
 std::string InUtf8(std::string name) {
   for (std::size_t at = 0; (at = name.find('\x8E', at)) != std::string::npos;) {
     name.replace(at, 1, "\u00E9");
@@ -33,7 +33,7 @@ std::string WithTrailer(std::string fields) {
   return fields.append(kTrailer);
 }
 
-// An error on the way up leaves out the folders further up, and a volume can be without its name.
+// An error on the way up leaves out the folders further up, and the volume's name may be missing.
 void AddShortened(const std::string& fullPath, Answers& answers) {
   const std::size_t end = fullPath.find(':') + 1;
   for (std::size_t from = end; from != 0; from = fullPath.find(':', from) + 1) {
@@ -43,8 +43,8 @@ void AddShortened(const std::string& fullPath, Answers& answers) {
   }
 }
 
-// The settings for a sound as the exporter has them, which are no matter of the item. Empty when
-// they are not those of the sound.
+// The exporter's settings for a sound, which do not depend on the item. Empty when they are not
+// those of the sound.
 std::string Settings(const std::string& request, const Atom& settings) {
   Service service;
   std::string head = service.Ask(request, sizeof(std::int16_t) + sizeof(std::uint32_t));
@@ -55,7 +55,7 @@ std::string Settings(const std::string& request, const Atom& settings) {
   return ReadAtomContainer(container) == settings ? WithTrailer(head + container) : "";
 }
 
-// A path that begins in the home folder, spelled out.
+// A path with the home folder in place of "~".
 std::filesystem::path SpelledOut(const std::string& path) {
   return path.starts_with('~') ? TwoVolumeRoot::kHome + path.substr(path.find('/')) : path;
 }
@@ -86,7 +86,7 @@ void Subject::Learn() {
       << "the record leads elsewhere than to " << mPath;
 }
 
-// By the path alone: the names of the folders that full paths are asked about are HFS names too.
+// From the path alone: the names of the folders in the requested full paths are also HFS names.
 void Subject::LearnFullPaths() {
   const std::string top = IsOnDisk() ? TwoVolumeRoot::kDisk : "/";
   const std::string label = IsOnDisk() ? top.substr(1) : TwoVolumeRoot::kLabel;
@@ -141,7 +141,7 @@ Question Subject::Ask(unsigned code) const {
   }
 }
 
-// A volume has no folder that holds it, and is asked for without a name.
+// A volume has no parent folder, and is requested without a name.
 Question Subject::AskForPathOfHFSPath() const {
   const bool isRoot = mFullPathOfFolder.empty();
   const std::string folder = isRoot ? mFullPath : mFullPathOfFolder;
@@ -150,12 +150,12 @@ Question Subject::AskForPathOfHFSPath() const {
           PathsOfHFSPath()};
 }
 
-// Where a new item with the same HFS name would be.
+// The path of a new item with the same HFS name.
 std::string Subject::NewItem() const {
   return Folder() + "/" + mCreated;
 }
 
-// A folder that is not seen to be one has the full path of the folder that holds it.
+// A folder that is not recognised as one has the full path of its parent.
 Answers Subject::FullPaths() const {
   Answers answers;
   AddShortened(mFullPath, answers);
@@ -186,7 +186,7 @@ Answers Subject::Paths() const {
   return {kNoPathResponse, kNoItemResponse, PathResponse(NewItem())};
 }
 
-// The root of a volume that is not known to be one is an item of the folder that holds it.
+// The root of a volume that is not recognised as one counts as an item in its parent.
 Answers Subject::Records() const {
   Answers answers{RecordResponse(0, kEmptyRecord), RecordResponse(0, Record(mVolume, mParent, "")),
                   RecordResponse(0, Record(kNoVolume, kNoFolder, mLossy)),

@@ -1,4 +1,4 @@
-// An item for requests to be about, and what may be answered to them while something fails.
+// An item for requests to be about, and the answers that are allowed while something fails.
 #pragma once
 
 #include <cstdint>
@@ -12,16 +12,16 @@ using Answers = std::set<std::string>;
 
 struct Question {
   std::string request;
-  std::string right;  // the answer when nothing fails: a success, and about that very item
-  Answers honest;     // what may be answered else
+  std::string right;  // the answer when nothing fails: a success, about exactly this item
+  Answers honest;     // the other answers that are allowed
 };
 
 class Subject {
  public:
-  // The path may begin with "~/". What a service says of the item that all requests are made of,
-  // its record and its volume, is checked against the path. `created` is what an item is called
-  // that is made by the HFS name of this one, `lossy` the HFS name that is told of something that
-  // is not there. Where they are empty, both are the HFS name.
+  // The path may begin with "~/". What a service reports about the item for use in all requests,
+  // its record and its volume, is checked against the path. `created` is the Linux name of an item
+  // made by this one's HFS name, `lossy` the HFS name reported for an item that does not exist.
+  // Where empty, both are the HFS name.
   explicit Subject(std::string path, std::string created = "", std::string lossy = "");
 
   // The request with a code from 1 to 10.
@@ -40,7 +40,7 @@ class Subject {
   Answers Paths() const;
   Answers Records() const;
 
-  std::string mSpelling;  // of the path, in requests
+  std::string mSpelling;  // the path as requests spell it
   std::filesystem::path mPath;
   std::string mCreated;
   std::string mLossy;
@@ -51,7 +51,7 @@ class Subject {
   std::int16_t mVolumeAbove = 0;  // that of "/"
   std::string mVolumeName;
   std::string mFullPath;
-  std::string mFullPathOfFolder;  // that holds it
+  std::string mFullPathOfFolder;  // of its parent
 };
 
 }  // namespace tallowmere::test

@@ -1,6 +1,6 @@
-// A root folder with two volumes and nothing on them but what a service needs, which the process
-// leaves again: so that the machine's volumes are no part of what is tested, and its files can be
-// removed afterwards.
+// A root folder with two volumes that contain only what a service needs. The process leaves it
+// again. So the machine's volumes are not part of the test, and the files can be removed
+// afterwards.
 #pragma once
 
 #include <filesystem>
@@ -16,18 +16,18 @@ namespace tallowmere::test {
 
 class TwoVolumeRoot {
  public:
-  // With these programs and libraries at their places, all that they need, /proc, a home folder
-  // kHome for this process's user, and a volume in memory at kDisk. It is an ext4 volume called
-  // kLabel where one can be mounted, else one in memory. The process stays outside where all that
-  // is not permitted. REQUIRES: it is in a mount namespace of its own.
+  // Enters a root with these programs and libraries at their paths, all that they need, /proc, a
+  // home folder kHome for this process's user, and a volume in memory at kDisk. It is an ext4
+  // volume named kLabel where one can be mounted, else one in memory. Where any of this is not
+  // permitted, the process stays outside. REQUIRES: the process is in a mount namespace of its own.
   explicit TwoVolumeRoot(const std::vector<std::string>& files);
   TwoVolumeRoot(const TwoVolumeRoot&) = delete;
   TwoVolumeRoot& operator=(const TwoVolumeRoot&) = delete;
-  ~TwoVolumeRoot();  // the process is back
+  ~TwoVolumeRoot();  // brings the process back
 
   static constexpr char kDisk[] = "/Disk";
   static constexpr char kHome[] = "/Home";
-  static constexpr char kUser[] = "user";  // whose that is
+  static constexpr char kUser[] = "user";  // the owner of kHome
   static constexpr char kLabel[] = "System";
 
   bool IsEntered() const { return mIsEntered; }
@@ -36,7 +36,7 @@ class TwoVolumeRoot {
  private:
   void Furnish(const std::vector<std::string>& files);
 
-  // Where a path inside is outside.
+  // The outside path of a path inside.
   std::filesystem::path Outside(const std::string& path) const { return mTop / path.substr(1); }
 
   TemporaryFolder mFolder;

@@ -13,7 +13,7 @@ namespace {
 
 using namespace tallowmere::test;
 
-// The name that the record of a new item has.
+// The name in the record of a new item.
 std::string NameOfNew(NameIndex name) {
   return std::string(NameAt(name).hfsName).substr(0, kLongestRecordName);
 }
@@ -65,7 +65,7 @@ class Evaluation : private Walk {
     std::string hfsPath;
   };
 
-  // A folder is at several only when it was moved.
+  // A folder is at more than one place only when it was moved.
   std::vector<FolderPlace> PlacesOf(Node folder) {
     if (folder == kMainRoot) return {{mPlace.path, mPlace.name + ":"}};
     std::vector<FolderPlace> places;
@@ -97,7 +97,7 @@ class Evaluation : private Walk {
     return paths;
   }
 
-  // The names under which an item may be told: in one state the one by which it was reached.
+  // The names by which an item may be reported: in one state, the one by which it was reached.
   std::vector<const Entry*> EntriesOf(const Item& item) const {
     if (mGraph.IsOfOneState() || item.isRoot) return {item.entry};
     std::vector<const Entry*> entries;
@@ -109,7 +109,7 @@ class Evaluation : private Walk {
 
   // --- Answers that lead nowhere
 
-  // Names that an item can have been given, whatever it is called at last.
+  // Names that an item may have had, whatever its final name.
   std::set<std::string> NamesGiven(const std::vector<Item>& items) const {
     std::set<std::string> names;
     for (const Item& item : items) {
@@ -139,7 +139,7 @@ class Evaluation : private Walk {
     }
   }
 
-  // The records of the items in those folders that have no such items.
+  // Records with the items' names in those of the folders that have no such item.
   void NoteRecordsOfNothing(const Outcome& outcome, std::vector<Node> folders) {
     if (mGraph.IsOfOneState()) return;
     for (const Item& item : outcome.items) {
@@ -147,7 +147,7 @@ class Evaluation : private Walk {
     }
     const auto names = NamesGiven(outcome.items);
     NoteRecordsByMadeUpID(names);
-    // What was missing at the first look is a new item by the name that is asked for.
+    // An item that was missing at the first look-up is a new one with the requested name.
     if (outcome.canMiss) NoteRecordsByMadeUpID({NameOfNew(mRequest.path.Last())});
     for (const std::string& name : names) {
       for (const Node folder : folders) {
@@ -166,7 +166,7 @@ class Evaluation : private Walk {
                               : mRequest.hfsName == NameAt(name).hfsName;
   }
 
-  // The paths of new items in the folder, called like those that are or were there.
+  // The paths of new items in the folder, with the names of items that are or were there.
   void NotePathsOfNothing(Node folder, const Outcome& outcome) {
     if (mGraph.IsOfOneState()) return;
     auto names = NamesGiven(outcome.items);
@@ -183,7 +183,7 @@ class Evaluation : private Walk {
             return entry.folder == folder && newName == NameAt(entry.name).linuxName;
           });
       const std::string asAsked = TextOf(mRequest.path, mPlace) + "/" + newName;
-      // The item itself, by the path that was given: the folder could not be told at one step.
+      // The item itself, by the given path: at one step the folder could not be identified.
       if (isThere && mRequest.code == 6 && name == mRequest.hfsName) {
         mTruth.responses.insert(PathResponse(asAsked));
       }
@@ -210,7 +210,7 @@ class Evaluation : private Walk {
     return U16(static_cast<unsigned>(path.size())) + text.append(kTrailer);
   }
 
-  // Without the outermost folder each path of this tree has room.
+  // Without the outermost folder, each path of this tree fits.
   std::string Shortened(const std::string& path) const {
     const std::size_t volumeEnd = path.find(':');
     if (!mRequest.flag) return path.substr(0, volumeEnd);
@@ -221,7 +221,7 @@ class Evaluation : private Walk {
 
   // --- Errors
 
-  // The path leads onto the other volume, which came or went.
+  // The path leads onto the other volume, which was mounted or unmounted.
   bool CanLoseVolume() const { return mMeetsOther && mGraph.Others().size() > 1; }
 
   std::set<std::string> HonestErrors() const {
@@ -229,14 +229,15 @@ class Evaluation : private Walk {
     std::set<std::string> errors;
     switch (mRequest.code) {
       case 1:
-        // A colon is no volume and no folder: the item went before it was asked for its volume.
+        // A colon stands for no volume and no folder: the item went before its volume was looked
+        // up.
         errors = {FullPathResponse(":"), FullPathResponse(mPlace.name + ":")};
         if (mMeetsOther)
           errors.insert(FullPathResponse(std::string(NameAt(kVolumePlace).hfsName) + ":"));
         return errors;
       case 2:
-        // The result is that of the look-up. Where the item went before it was asked for its path,
-        // there is none, and nothing is told in its place.
+        // The result is that of the look-up. When the item went before its path was looked up,
+        // there is no result, and nothing is reported instead.
         return {ResultResponse(0), ResultResponse(kResultNoItem), ResultResponse(kResultNoFolder),
                 ResultResponse(kResultNoVolume), ResultResponse(kResultImpossibleName)};
       case 5:
@@ -325,7 +326,7 @@ class Evaluation : private Walk {
   }
 
   // The climb from a folder ends at one that is being moved, and what is above that is left out. A
-  // volume that is unmounted before it is asked for its name has none.
+  // volume that is unmounted before its name is looked up has none.
   void NoteCutPaths(const std::string& hfsPath) {
     if (mGraph.IsOfOneState()) return;
     const std::size_t volumeEnd = hfsPath.find(':') + 1;
@@ -458,7 +459,7 @@ class Evaluation : private Walk {
     return volumes;
   }
 
-  // Whether the item was found for certain on the volume.
+  // Returns whether the item was certainly found on the volume.
   bool SayItemsOn(const Volume& volume) {
     if (mRequest.folder == kParentOfRoots) {
       SayRoot(volume);

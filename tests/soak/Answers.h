@@ -1,4 +1,4 @@
-// What is to be answered while the tree is like that.
+// The right answers while the tree is in a given state.
 #pragma once
 
 #include <set>
@@ -11,16 +11,16 @@ namespace tallowmere::soak {
 
 struct Truth {
   std::set<std::string> responses;
-  // For several states, where it is for the judge to see that they lead nowhere:
+  // For several states, where the judge must check that they lead nowhere:
   std::set<std::string> nowhere;       // those that lead to no item
-  std::set<std::string> byMadeUpID;    // records by a made-up id, which is 0 here
-  std::set<std::string> honestErrors;  // that there is none, or that it cannot be told
-  std::string trace;                   // differs when any of the items that were met is another
+  std::set<std::string> byMadeUpID;    // records with a made-up id, which is 0 here
+  std::set<std::string> honestErrors;  // that there is no item, or that it cannot be determined
+  std::string trace;                   // differs when any item that was visited differs
 };
 
-// What is to be answered while the tree is like that: one response for one state. For several,
-// every response of which each step was true in one of them, though perhaps not in the same: the
-// item was moved while it was asked for.
+// The right answers while the tree is in this state; for one state, one response. For several
+// states, all responses each of whose steps was true in one of them, though perhaps not in the same
+// one: the item was moved during the request.
 Truth Answers(const Graph& graph, const Place& place, const Request& request);
 
 }  // namespace tallowmere::soak

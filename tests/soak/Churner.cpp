@@ -16,7 +16,7 @@
 namespace tallowmere::soak {
 namespace {
 
-// Node ids below are made up by the service; the tree has none of them.
+// Node ids below this are made up by the service; the tree has none of them.
 constexpr int kFirstInodes = 20;
 
 constexpr std::size_t kMostFolders = 6;
@@ -32,7 +32,7 @@ std::uint64_t InodeOf(const std::string& path) {
   return about.st_ino;
 }
 
-// Minus the id of the mount.
+// The volume's number: minus the id of the mount.
 int NumberOf(const std::string& place) {
   struct statx about {};
   if (statx(AT_FDCWD, place.c_str(), 0, STATX_MNT_ID, &about) != 0) StopFor(place);
@@ -145,8 +145,8 @@ void Churner::Change(const State& next, const std::function<int()>& call) {
   mHistory.Reach();
 }
 
-// Its inode number is known before the state counts as reached. REQUIRES: the new entry is the
-// last.
+// The inode number is known before the state counts as reached. REQUIRES: the new entry is the last
+// one.
 void Churner::Make(const State& next, const std::string& path, const std::function<int()>& call) {
   State& state = mHistory.Begin(next);
   if (call() != 0) StopFor(path);
@@ -233,7 +233,7 @@ bool Churner::RemoveFile() {
   return RemoveAny(Kind::kFile);
 }
 
-// A rename between two names of one item does nothing.
+// A rename between two names of the same item does nothing.
 bool Churner::MoveFile() {
   const State& now = Now();
   const Entry* const entry = AnyEntry([](const Entry& e) { return e.kind == Kind::kFile; });
@@ -280,7 +280,7 @@ bool Churner::LinkFile() {
   return true;
 }
 
-// A link's place is made with its inode number known only then, as that of a file.
+// A link's place gets its inode number only when it is made, like a file's.
 bool Churner::MakeInnerLink() {
   if (!HasRoom()) return false;
   const Entry* const into =
@@ -313,7 +313,7 @@ bool Churner::MoveFolder() {
   return true;
 }
 
-// Also a folder and a link, where that leaves the link behind its target.
+// Also exchanges a folder and a link, where the link stays after its target.
 bool Churner::ExchangeFolders() {
   const Entry* const first = AnyEntry([](const Entry& e) { return IsOuter(e); });
   if (first == nullptr) return false;
@@ -339,7 +339,7 @@ bool Churner::ExchangeFolders() {
   return true;
 }
 
-// The folder goes to an earlier slot, and a link to it comes into its place.
+// Moves the folder to an earlier slot and puts a link to it in its place.
 bool Churner::ReplaceFolderByLink() {
   if (!HasRoom()) return false;
   const Entry* const found =
@@ -419,7 +419,7 @@ bool Churner::MakeFolder() {
   return true;
 }
 
-// Empties it first.
+// Empties the folder first.
 bool Churner::RemoveFolder() {
   if (Below(8) != 0) return false;
   const Entry* const found = AnyEntry([&](const Entry& e) {

@@ -1,4 +1,4 @@
-// Whoever changes the tree while the service is asked, and keeps its history.
+// Changes the tree while the service is asked, and records its history.
 #pragma once
 
 #include <atomic>
@@ -15,10 +15,10 @@
 
 namespace tallowmere::soak {
 
-// The tree in a folder that is a volume's root, and a thread that changes it.
+// The tree in the root folder of a volume, and a thread that changes it.
 class Churner {
  public:
-  // REQUIRES: a file system of its own is mounted at `folder`, and the process is in a mount
+  // REQUIRES: a separate file system is mounted at `folder`, and the process is in a mount
   // namespace of its own.
   Churner(std::string folder, std::uint64_t seed, unsigned pause);
   Churner(const Churner&) = delete;

@@ -28,7 +28,7 @@ class Graph {
 
   std::vector<const Entry*> In(Node folder, NameIndex name) const;
 
-  // Whether the folder is without the name, in one of the states.
+  // Whether the folder lacks the name in at least one of the states.
   bool CanMiss(Node folder, NameIndex name) const;
 
  private:
@@ -47,13 +47,13 @@ struct Item {
   bool isRoot;  // of the other volume
 };
 
-// What a name or a path leads to: one item or none in one state.
+// What a name or a path leads to: in one state, one item or none.
 struct Outcome {
   std::vector<Item> items;
-  bool canMiss = false;  // also where the folder is missing
+  bool canMiss = false;  // also when the folder is missing
 };
 
-// Looks names and ids up in a graph, and notes what it meets.
+// Looks up names and ids in a graph, and records what it visits.
 class Walk {
  public:
   // REQUIRES: the graph outlives the walk and its outcomes.
@@ -62,13 +62,13 @@ class Walk {
   Outcome LookUp(Node folder, NameIndex name);
   Outcome LookUpHFS(Node folder, std::string_view hfsName);
 
-  // A link in the last place is not followed. Nothing without a name.
+  // Does not follow a link as the last component. Returns nothing for no names.
   Outcome At(std::span<const NameIndex> names);
 
-  // The folders that an item is or leads to. False in `always` when it can be none.
+  // The folders that an item is or leads to. Sets `always` to false when it may lead to none.
   std::vector<Node> FoldersAt(const Outcome& outcome, bool& always);
 
-  // Whether a link can lead somewhere, and nowhere.
+  // Whether a link can lead somewhere, and whether it can lead nowhere.
   std::pair<bool, bool> Leads(const Entry& link);
 
   std::vector<Node> FoldersWithID(const Volume& volume, std::uint32_t id);
@@ -81,8 +81,8 @@ class Walk {
   static void Merge(const Outcome& more, Outcome& outcome);
 
   const Graph& mGraph;
-  bool mMeetsOther = false;  // the root folder of the other volume has been met
-  std::string mTrace;        // of the items that were met: differs when any of them is another
+  bool mMeetsOther = false;  // whether the root folder of the other volume was visited
+  std::string mTrace;        // of the visited items: differs when any of them differs
 
  private:
   Outcome TargetOf(const Entry& link);

@@ -1,4 +1,4 @@
-// What the tree has been like.
+// The history of the tree.
 #pragma once
 
 #include <atomic>
@@ -9,7 +9,7 @@
 
 namespace tallowmere::soak {
 
-// The states of the tree in their order. One thread writes, others read; the latest kKept are kept.
+// The states of the tree in order. One thread writes, others read; the latest kKept are kept.
 class History {
  public:
   using Version = std::uint64_t;
@@ -17,15 +17,15 @@ class History {
 
   explicit History(const State& first);
 
-  // The state that is certainly reached; later ones may be too.
+  // The latest state that has certainly been reached; later ones may have been too.
   Version Reached() const { return mReached.load(std::memory_order_seq_cst); }
-  // The last state that may be reached.
+  // The latest state that may have been reached.
   Version Begun() const { return mBegun.load(std::memory_order_seq_cst); }
   // Valid until kKept more have begun.
   const State& At(Version version) const { return mStates[version % kKept]; }
 
-  // For the writer: the next state begins; what is not known of it before it is reached is written
-  // into it until then.
+  // For the writer: begins the next state. Facts that are not known before it is reached are filled
+  // in until then.
   State& Begin(const State& next);
   void Reach();
 

@@ -16,7 +16,7 @@ namespace {
 
 constexpr std::size_t kGraphsKept = 256;
 
-// With other bytes than printable ones in hexadecimal, and no more zeros at the end than one.
+// Shows bytes that are not printable in hexadecimal, and at most one of the zeros at the end.
 std::string Readable(std::string bytes) {
   std::string text;
   for (std::size_t i = 0; i < bytes.size(); ++i) {
@@ -35,9 +35,9 @@ std::string Readable(std::string bytes) {
   return text;
 }
 
-// The record with 0 for an id that the service makes up: what was taken away in mid-question has
-// the id of an item that is not on the volume that is named. The tree has no such ids. Empty where
-// the record has none.
+// The record with 0 in place of an id that the service made up: an item removed in mid-question
+// gets the id of one that is not on the named volume. The tree has no such ids. Empty where the
+// record has none.
 std::string WithoutMadeUpID(std::string response) {
   constexpr std::size_t kIDStart = sizeof(std::uint8_t) + sizeof(std::int16_t);
   constexpr std::uint32_t kFirstMadeUpID = 0x80000000;
@@ -54,8 +54,8 @@ bool Has(const State& state, const Entry& entry) {
   return std::find(state.begin(), state.end(), entry) != state.end();
 }
 
-// A request and what it becomes on its way: once code 8 has found a record, it goes on as code 9
-// with the search of the other volumes, which have items with that number and name of their own.
+// A request and what it turns into: once code 8 has found a record, it continues as code 9 with a
+// search of the other volumes, which have items of their own with that number and name.
 std::vector<Request> StagesOf(const Request& request) {
   std::vector<Request> stages{request};
   if (request.code == 8 && request.hfsName.size() <= kLongestRecordName) {
@@ -109,7 +109,7 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
   return Verdict::kWrong;
 }
 
-// What is meant in a state is what the answer that is exact there leads to.
+// The item meant in a state is the one that the exact answer in that state leads to.
 Judge::Destination Judge::DestinationOf(const std::vector<const State*>& states,
                                         const Request& request, const std::string& response) const {
   std::set<Node> reached;

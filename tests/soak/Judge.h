@@ -1,4 +1,4 @@
-// Whether an answer was true at some moment between question and answer.
+// Judges whether an answer was true at some moment between question and answer.
 #pragma once
 
 #include <map>
@@ -15,7 +15,7 @@ enum class Verdict {
   kExact,  // true in one of the states
   kMoved,  // each of its steps was true in one of them: what was asked for was moved. It leads
            // to what could be meant in one of them, or to no item in any
-  kHonestError,  // none, or not to be told, and what was asked for changed
+  kHonestError,  // none, or undetermined, and what was asked for changed
   kNowhere,      // leads to no item in any of the states, and what was asked for changed
   kWrong,
 };
@@ -33,7 +33,7 @@ class Judge {
                      History::Version last);
 
  private:
-  // The items, in all the states, to which an answer leads.
+  // The items, over all the states, that an answer leads to.
   enum class Destination { kNone, kMeant, kAnother };
 
   Destination DestinationOf(const std::vector<const State*>& states, const Request& request,
@@ -42,7 +42,7 @@ class Judge {
 
   const History& mHistory;
   Place mPlace;
-  std::map<History::Version, Graph> mGraphs;  // of the latest states asked for
+  std::map<History::Version, Graph> mGraphs;  // of the states that were used last
 };
 
 }  // namespace tallowmere::soak

@@ -1,4 +1,4 @@
-// The judge of the soak, before histories made by hand.
+// Tests the soak's judge on histories made by hand.
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -46,7 +46,7 @@ State StateOf(const std::vector<Entry>& entries, Volume other = {kNoNode, kOther
 
 const Entry kPlaceEntry = EntryIn(kMainRoot, kVolumePlace, kPlaceFolder, Kind::kFolder);
 
-// F2 goes from B to C, and then X over Z in it.
+// F2 moves from B to C, then X replaces Z in it.
 std::vector<State> FolderAndThenFileMoved() {
   const Entry x = EntryIn(kF2, kTrack1, kX, Kind::kFile);
   const Entry z = EntryIn(kF2, kTrack2, kZ, Kind::kFile);
@@ -56,13 +56,13 @@ std::vector<State> FolderAndThenFileMoved() {
           StateOf({kPlaceEntry, atC, EntryIn(kF2, kTrack2, kX, Kind::kFile)})};
 }
 
-// The volume goes, with its one folder.
+// The volume is unmounted, with its one folder.
 std::vector<State> VolumeUnmounted() {
   const Entry sub = EntryIn(kOtherRoot, kSubfolder, kSubOfOther, Kind::kFolder);
   return {StateOf({kPlaceEntry, sub}, {kOtherRoot, kOtherNumber}), StateOf({kPlaceEntry})};
 }
 
-// The folder that holds "sub" goes from B to C.
+// The folder that holds "sub" moves from B to C.
 std::vector<State> OuterFolderMoved(bool rootHasSub) {
   std::vector<State> states;
   for (const NameIndex slot : {kSoakB, kSoakC}) {
@@ -175,7 +175,7 @@ TEST(Judge, FullPathOnAVolumeThatWentIsNowhere) {
 }
 
 TEST(Judge, ItemThatIsReachedByNamesLookedUpInTurnIsMeant) {
-  // F2 is at B until another folder is; then its file gets the name that is asked for.
+  // F2 is at B until another folder takes the place; then its file gets the requested name.
   const Entry file = EntryIn(kF2, kTrack1, kX, Kind::kFile);
   Entry renamed = file;
   renamed.name = kTrack2;
@@ -209,7 +209,7 @@ TEST(Judge, FullPathWithoutRoomIsExactOnlyAsItIsShortened) {
   EXPECT_EQ(VerdictOn(states, request, response("soaked:")), Verdict::kWrong);
 }
 
-// Between the two, code 8 finds its record and searches the other volumes for it.
+// In between, code 8 finds its record and searches the other volumes for it.
 TEST(Judge, ItemOfAnotherVolumeIsMeantOnlyWhereTheVolumesAreSearched) {
   const Entry ofMain = EntryIn(kMainRoot, kTrack1, kX, Kind::kFile);
   const Entry ofOther = EntryIn(kOtherRoot, kTrack1, kZ, Kind::kFile);

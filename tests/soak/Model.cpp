@@ -48,7 +48,7 @@ std::string NewName(std::string_view hfsName) {
   for (const Name& name : kNames) {
     if (name.hfsName == hfsName) return name.newName;
   }
-  std::string name(hfsName);  // a short form, with the one accent that there is
+  std::string name(hfsName);  // a short form, with the only accent
   const std::size_t accented = name.find('\x8E');
   if (accented != std::string::npos) name.replace(accented, 1, "\xC3\xA9");
   return name;

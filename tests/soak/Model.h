@@ -1,5 +1,5 @@
-// What a soak's tree looks like: two volumes of a few dozen items, as plain data that is copied
-// with each change.
+// The tree of a soak: two volumes with a few dozen items, as plain data that is copied with each
+// change.
 #pragma once
 
 #include <array>
@@ -13,15 +13,15 @@ namespace tallowmere::soak {
 
 struct Name {
   const char* linuxName;
-  const char* hfsName;  // whole; a record has a short form of what is too long for it
-  const char* newName;  // what a new item by that HFS name is called on Linux
+  const char* hfsName;  // in full; a record has a short form of a name that is too long for it
+  const char* newName;  // the Linux name of a new item with this HFS name
 };
 
 using NameIndex = std::uint8_t;
 
-// In the main volume's root folder. A link stands only where a name before its own is its target,
-// so that no links go round in a circle.
-inline constexpr NameIndex kVolumePlace = 0;  // the folder at which the other volume is mounted
+// In the main volume's root folder. A link's target is always a name before its own, so that no
+// links form a cycle.
+inline constexpr NameIndex kVolumePlace = 0;  // the mount point of the other volume
 inline constexpr NameIndex kFirstSlot = 1;
 inline constexpr NameIndex kEndOfSlots = 7;
 // In folders.
@@ -33,18 +33,18 @@ inline constexpr NameIndex kNoName = 255;
 
 const Name& NameAt(NameIndex index);
 
-// What a new item by an HFS name is called on Linux; it may be a short form.
+// The Linux name of a new item with an HFS name, which may be a short form.
 std::string NewName(std::string_view hfsName);
 
-// The most bytes of a name in a record.
+// The longest name in a record, in bytes.
 inline constexpr std::size_t kLongestRecordName = 63;
 
-// Whether the name is too long for a record, which has a short form of it.
+// Whether the name is too long for a record, which then has a short form of it.
 bool HasShortForm(NameIndex name);
 
 // --- Items ------------------------------------------------------------------------------------
 
-// Items are numbered as they are made; a number is never given to another item.
+// Items are numbered as they are made; numbers are never reused.
 using Node = std::uint32_t;
 inline constexpr Node kNoNode = 0;
 inline constexpr Node kMainRoot = 1;
@@ -59,17 +59,17 @@ struct Entry {
   Kind kind;
   NameIndex name;
   NameIndex target;       // of a link: a name in the main volume's root folder
-  NameIndex innerTarget;  // and one in that, or kNoName
+  NameIndex innerTarget;  // a name in that, or kNoName
 
   bool operator==(const Entry&) const = default;
 };
 
-// Whether it is the folder at which the other volume is mounted.
+// Whether it is the mount point of the other volume.
 bool IsVolumePlace(const Entry& entry);
 
 std::string ShortForm(const Entry& entry);
 
-// The HFS name that a record has for the entry.
+// The entry's HFS name in a record.
 std::string RecordName(const Entry& entry);
 
 std::string TextOf(const Entry& entry);
@@ -77,8 +77,8 @@ std::string TextOf(const Entry& entry);
 inline constexpr int kUnknownVolume = 32767;
 
 struct Volume {
-  Node root;   // kNoNode when it is not mounted
-  int number;  // the last one
+  Node root;   // kNoNode when not mounted
+  int number;  // the most recent one
   bool operator==(const Volume&) const = default;
 };
 

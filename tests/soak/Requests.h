@@ -1,4 +1,4 @@
-// What a soak asks, and the bytes of it.
+// The requests of a soak, and their bytes.
 #pragma once
 
 #include <array>
@@ -11,7 +11,7 @@
 
 namespace tallowmere::soak {
 
-// Names from the main volume's root folder on.
+// Names, starting at the main volume's root folder.
 struct Path {
   std::array<NameIndex, 3> names{};
   std::size_t count = 0;
@@ -22,9 +22,9 @@ struct Path {
   bool operator==(const Path&) const = default;
 };
 
-// The most bytes that a full path may be asked to have, with its NUL.
+// The longest full path that may be requested, in bytes with its NUL.
 inline constexpr std::uint16_t kMostRoom = 1024;
-// The least that is safe for this tree beside none: the longest name of a volume and six more.
+// The shortest that is safe for this tree, other than 0: the longest name of a volume and six more.
 inline constexpr std::uint16_t kLeastRoom = 17;
 
 struct Request {
@@ -34,12 +34,12 @@ struct Request {
   std::uint32_t folder = 0;
   std::string hfsName;             // of codes 6, 8, 9
   bool search = false;             // of code 9
-  bool byOther = false;            // of code 2: the first name is the other volume's
-  std::uint16_t room = kMostRoom;  // of code 1: none, or from kLeastRoom on
-  bool flag = false;               // the last one of codes 1, 2, 6, 8, 9
+  bool byOther = false;            // for code 2: the first name is the other volume's
+  std::uint16_t room = kMostRoom;  // for code 1: 0, or from kLeastRoom on
+  bool flag = false;               // the last field of codes 1, 2, 6, 8, 9
 };
 
-// Where the main volume is mounted and what it is called.
+// The mount point and the name of the main volume.
 struct Place {
   std::string path;
   std::string name;
@@ -47,13 +47,13 @@ struct Place {
 
 std::string VolumeName(const Volume& volume, const Place& place);
 
-// What stands for the folders that a full path (code 1) has no room for.
+// Stands for the folders that a full path (code 1) has no room for.
 inline constexpr std::string_view kAnyFolders = "...";
 
-// The path on Linux.
+// The Linux path.
 std::string TextOf(const Path& path, const Place& place);
 
-// The request as bytes.
+// The bytes of a request.
 std::string BytesOf(const Request& request, const Place& place);
 
 std::string TextOf(const Request& request);

@@ -1,6 +1,6 @@
-// tallowmere_soak: asks one service very many questions of every kind about a tree that is changed
-// all the time, and holds each answer against what the tree was like between question and answer.
-// docs/reliability.md tells how it judges.
+// tallowmere_soak: asks one service very many questions of every kind about a tree that changes all
+// the time, and compares each answer with the states of the tree between question and answer.
+// docs/reliability.md explains how it judges.
 
 #include <dirent.h>
 #include <fcntl.h>
@@ -40,9 +40,9 @@ namespace {
 using namespace tallowmere::test;
 using Clock = std::chrono::steady_clock;
 
-// What ctest takes for "skipped".
+// The exit status that ctest takes for "skipped".
 constexpr int kSkipped = 77;
-// As other programs have it where they cannot make out what they are to do.
+// The usual exit status for invalid arguments.
 constexpr int kMisused = 2;
 
 using tallowmere::test::kRateOfACD;
@@ -50,7 +50,7 @@ constexpr unsigned kExport = 10;
 constexpr unsigned kCodes = 11;
 constexpr std::size_t kMostReports = 20;
 constexpr int kProgressLines = 20;
-// A question is about the latest state or one of those shortly before it.
+// A question is about the latest state or one shortly before it.
 constexpr std::size_t kStatesAskedAbout = 40;
 
 struct Options {
@@ -59,8 +59,8 @@ struct Options {
   std::string service = TALLOWMERE_SERVICE;
   std::string on = "tmpfs";
   unsigned pause = 300;  // microseconds between changes, on average
-  unsigned group = 24;   // most requests written ahead
-  long slack = 1024;     // KiB that the memory may grow after the first tenth
+  unsigned group = 24;   // the most requests written ahead
+  long slack = 1024;     // KiB that memory use may grow after the first tenth
 };
 
 // --- The service ------------------------------------------------------------------------------
@@ -69,7 +69,7 @@ class Asked : public ChildProgram {
  public:
   explicit Asked(const std::string& service) : ChildProgram(service, {std::to_string(getpid())}) {}
 
-  // The response to the request; `onRead` is called whenever bytes have come.
+  // Reads the response to the request; calls `onRead` whenever bytes have arrived.
   template <class OnRead>
   std::string Response(const Request& request, OnRead onRead) {
     std::optional<std::size_t> size;
@@ -103,7 +103,7 @@ class Asked : public ChildProgram {
   }
 
  private:
-  // None until enough of it has come.
+  // Nullopt until enough of it has arrived.
   std::optional<std::size_t> SizeOfResponse(const Request& request) const {
     constexpr std::size_t kRecord = 1 + 70;
     constexpr std::size_t kSettingsSize = 2;
@@ -143,11 +143,11 @@ class Asker {
 
   std::size_t Below(std::size_t end) { return mRandom() % end; }
 
-  // About what the tree is like, or was not long ago.
+  // A request about the tree's present or recent state.
   Request AnyRequest(const State& state) {
     static constexpr std::array<unsigned, 24> kCodesByWeight{1, 1, 2, 2, 2, 3, 4, 5, 5, 5, 6, 6,
                                                              7, 7, 7, 7, 7, 8, 8, 8, 9, 9, 9, 9};
-    // Paths of 17 to 19 bytes are the only ones of this tree that are shortened.
+    // Only paths of 17 to 19 bytes are shortened in this tree.
     static constexpr std::array<std::uint16_t, 8> kRooms{
         0, kLeastRoom, kLeastRoom + 1, kLeastRoom + 2, kLeastRoom + 3, 768, kMostRoom, kMostRoom};
     Request request{};
@@ -206,7 +206,7 @@ class Asker {
     std::string whole = NameAt(name).hfsName;
     const bool isWhole = code != 9 && Below(2) == 0;
     if (isWhole || whole.size() <= kLongestRecordName) return whole;
-    // A short form, of an item that there is.
+    // A short form, of an existing item.
     const std::size_t start = Below(state.count);
     for (std::size_t i = 0; i < state.count; ++i) {
       const Entry& entry = state.entries[(start + i) % state.count];
@@ -240,7 +240,7 @@ class Asker {
     }
     if (request.folder == 0) request.folder = 2;
     request.hfsName = AnyHFSName(state, request.code);
-    // Mostly a name that there is.
+    // Mostly an existing name.
     for (std::size_t i = 0; Below(3) != 0 && i < state.count; ++i) {
       const Entry& entry = state.entries[(start + i) % state.count];
       if (entry.inode == request.folder && entry.kind == Kind::kFolder) {
@@ -262,7 +262,7 @@ struct Counts {
   std::array<std::array<std::uint64_t, 5>, kCodes> ofVerdict{};
   std::uint64_t asked = 0;
   std::uint64_t wrong = 0;
-  std::uint64_t states = 0;  // judged by, in all
+  std::uint64_t states = 0;  // states used by judgements, in all
 };
 
 class Run {
@@ -355,7 +355,7 @@ class Run {
     }
   }
 
-  // Between two groups the service has nothing open for a request.
+  // Between two groups, the service has nothing open for a request.
   bool WatchLevel() {
     const long memory = mService.KiBInUse();
     const int descriptors = mService.OpenDescriptors();
@@ -371,7 +371,7 @@ class Run {
       mDescriptors = descriptors;
       mExports = Exports();
     }
-    // What the service keeps for an export, as documented, is less than half a KiB.
+    // For an export, as documented, the service keeps less than half a KiB.
     const long allowed = *mMemory + mOptions.slack + static_cast<long>(Exports() - mExports) / 2;
     if (memory > allowed)
       std::printf("the memory is not level: %ld KiB, at most %ld\n", memory, allowed);
@@ -414,7 +414,7 @@ class Run {
 
 constexpr const char* kFolder = "/soaked";
 
-// Whether the main volume is mounted, in a root folder of its own.
+// Whether the main volume could be mounted, in a root folder of its own.
 bool IsPrepared(FileSystemImage* image, const std::string& service) {
   if (!EnterOwnMountNamespace()) return false;
   if (image == nullptr) {
@@ -422,7 +422,7 @@ bool IsPrepared(FileSystemImage* image, const std::string& service) {
     std::filesystem::create_directory(kFolder);
     return mount("none", kFolder, "tmpfs", 0, "") == 0;
   }
-  // A mount of the old root folder, which is taken along.
+  // Mounted from the old root folder, from which it is moved along.
   if (!image->Mount()) return false;
   const int tree = static_cast<int>(
       syscall(SYS_open_tree, AT_FDCWD, image->Path().c_str(), OPEN_TREE_CLONE | OPEN_TREE_CLOEXEC));
@@ -456,7 +456,7 @@ int Main(Options options) {
       return kSkipped;
     }
   }
-  // Who removes the image afterwards keeps the machine's root folder.
+  // The process that removes the image afterwards keeps the machine's root folder.
   const pid_t child = fork();
   if (child == 0) {
     int status = 1;

@@ -1,4 +1,4 @@
-// The words of a command as exec(3) and posix_spawn(3) take them.
+// A command's words in the form that exec(3) and posix_spawn(3) take.
 #pragma once
 
 #include <string>
@@ -6,7 +6,7 @@
 
 namespace tallowmere::test {
 
-// Pointers into `words`, which has to outlive them, and a null behind them.
+// Pointers into `words`, which must outlive them, followed by a null pointer.
 inline std::vector<char*> ArgumentVector(const std::vector<std::string>& words) {
   std::vector<char*> pointers;
   pointers.reserve(words.size() + 1);

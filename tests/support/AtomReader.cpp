@@ -20,7 +20,7 @@ std::string FourBytes(std::uint32_t number) {
   return TwoBytes(number / 65536) + TwoBytes(number % 65536);
 }
 
-// The atom that `bytes` begin with; they are then what is behind it.
+// Removes the first atom from the front of `bytes` and returns it.
 std::optional<Atom> ReadAtom(std::string_view& bytes) {
   if (bytes.size() < kHeader) return std::nullopt;
   const std::size_t size = Number(bytes.substr(0, 4));

@@ -1,8 +1,8 @@
-// Preloaded into a service, attempts from inside, after its first request, all that a service never
-// does, and some of what it may: a line each on standard error, a name and the error number, 0 for
-// success. $TALLOWMERE_ATTEMPTS is a folder with files "file", "old file" and "old name", a folder
-// "old folder" and a local socket "socket" that is listened to. What could do harm is asked for
-// with arguments that lead nowhere.
+// Preloaded into a service: after the service's first request, attempts from inside all that a
+// service never does, and some of what it may. Prints a line for each attempt on standard error, a
+// name and the error number, 0 for success. $TALLOWMERE_ATTEMPTS is a folder with files "file",
+// "old file" and "old name", a folder "old folder" and a listening local socket "socket". Attempts
+// that could do harm have arguments that lead nowhere.
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <linux/fs.h>
@@ -28,7 +28,7 @@
 
 namespace {
 
-constexpr int kNoProcess = 0x7FFFFFF0;  // above the highest that a kernel gives
+constexpr int kNoProcess = 0x7FFFFFF0;  // above the highest id that a kernel assigns
 constexpr int kNoDescriptor = -1;
 
 void Tell(const char* name, long result) {
@@ -70,7 +70,7 @@ void AttemptFiles() {
   Tell("attributes/removexattr", removexattr("file", "user.y"));
 }
 
-// To a process that has ended at once.
+// Forks a process that ends at once.
 long Fork() {
   const long process = syscall(SYS_clone, SIGCHLD, 0, 0, 0, 0);
   if (process == 0) syscall(SYS_exit, 0);
@@ -109,7 +109,7 @@ void AttemptMounts() {
   Tell("calls/mount_setattr", syscall(SYS_mount_setattr, kNoDescriptor, "", 0, nullptr, 0));
 }
 
-// Where there is no such socket, that is what is told.
+// Reports a failure to create the socket instead.
 void AttemptTCP(const char* name, int (*call)(int, const sockaddr*, socklen_t)) {
   sockaddr_in here{};
   here.sin_family = AF_INET;
@@ -151,7 +151,7 @@ void AttemptTheMachine() {
 #ifdef __x86_64__
 sigjmp_buf beforeTheOtherKind;
 
-// getpid by the calls of 32-bit programs.
+// Calls getpid as 32-bit programs do.
 void AttemptCallsOfAnotherKind() {
   constexpr long kGetPid = 20;
   const auto former = signal(SIGSEGV, [](int) { siglongjmp(beforeTheOtherKind, 1); });
@@ -161,7 +161,7 @@ void AttemptCallsOfAnotherKind() {
     errno = static_cast<int>(-result);
     Tell("calls/32-bit", result);
   } else {
-    errno = EPERM;  // the kernel does without them
+    errno = EPERM;  // the kernel is built without them
     Tell("absent/32-bit", -1);
   }
   signal(SIGSEGV, former);
@@ -206,7 +206,7 @@ void AttemptAll() {
 
 }  // namespace
 
-// With it the service looks for its parent, after each request.
+// The service calls this after each request, to check for its parent.
 extern "C" int kill(pid_t process, int signal) noexcept {
   static bool isFirst = true;
   if (isFirst) AttemptAll();

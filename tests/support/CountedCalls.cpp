@@ -16,7 +16,7 @@ bool IsForMemory(long call) {
          call == SYS_madvise;
 }
 
-// One call, by which the parent knows where the child is.
+// Makes a call that tells the parent where the child is.
 void Stop(pid_t self) {
   kill(self, SIGSTOP);
 }
@@ -32,14 +32,14 @@ void Stop(pid_t self) {
   _exit(0);
 }
 
-// The signal by which a child was stopped; none when it has ended.
+// The signal that stopped a child; nullopt when the child has ended.
 std::optional<int> WaitForStop(pid_t child) {
   int status = 0;
   if (waitpid(child, &status, 0) != child || !WIFSTOPPED(status)) return std::nullopt;
   return WSTOPSIG(status);
 }
 
-// The call at whose beginning a child stands; none at its end.
+// The call that a child is about to make; nullopt at the end of one.
 std::optional<long> CallBegun(pid_t child) {
   __ptrace_syscall_info info{};
   if (ptrace(PTRACE_GET_SYSCALL_INFO, child, sizeof info, &info) <= 0 ||
@@ -49,7 +49,7 @@ std::optional<long> CallBegun(pid_t child) {
   return static_cast<long>(info.entry.nr);
 }
 
-// The calls up to and with the next Stop().
+// The calls up to and including the next Stop().
 std::vector<long> CallsToNextStop(pid_t child) {
   constexpr int kAtACall = SIGTRAP | 0x80;
   std::vector<long> calls;
@@ -69,7 +69,7 @@ std::optional<std::vector<long>> Trace(pid_t child) {
   if (!isTraced) return std::nullopt;
   CallsToNextStop(child);
   auto calls = CallsToNextStop(child);
-  calls.pop_back();  // the stop itself
+  calls.pop_back();  // the call of Stop() itself
   return calls;
 }
 

@@ -1,4 +1,4 @@
-// The system calls that a piece of work makes.
+// The system calls that a piece of code makes.
 #pragma once
 
 #include <functional>
@@ -7,8 +7,8 @@
 
 namespace tallowmere::test {
 
-// The numbers of the calls that `work` makes after `prepare`, but those for memory: both run in a
-// child process, traced. None where nothing can be traced; throws when they end the child.
+// The numbers of the calls that `work` makes after `prepare`, except those for memory. Both run in
+// a traced child process. Nullopt where tracing is not possible; throws when they end the child.
 std::optional<std::vector<long>> CallsOf(const std::function<void()>& prepare,
                                          const std::function<void()>& work);
 

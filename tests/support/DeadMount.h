@@ -1,4 +1,4 @@
-// A file system whose server never answers: whoever asks it for anything waits.
+// A file system whose server never answers: whoever accesses it waits.
 #pragma once
 
 #include <optional>
@@ -15,10 +15,10 @@ class DeadMount {
   DeadMount& operator=(const DeadMount&) = delete;
   ~DeadMount();
 
-  // Not without FUSE and the right to mount.
+  // False without FUSE or the right to mount.
   bool IsMounted() const { return mServer >= 0 && mMount->IsMounted(); }
 
-  // The server ends: whoever waits gets an error.
+  // Ends the server: all who wait get an error.
   void End();
 
  private:

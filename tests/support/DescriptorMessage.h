@@ -1,5 +1,5 @@
-// The message by which a descriptor goes through a socket, unix(7): one byte, and with it room for
-// one descriptor.
+// The message that passes a descriptor through a socket, unix(7): one byte, and room for one
+// descriptor.
 #pragma once
 
 #include <sys/socket.h>
@@ -19,7 +19,7 @@ struct DescriptorMessage {
   DescriptorMessage(const DescriptorMessage&) = delete;
   DescriptorMessage& operator=(const DescriptorMessage&) = delete;
 
-  // To be sent or received, as a message of one byte.
+  // The message to send or receive, of one byte.
   msghdr message{};
 
  private:

@@ -1,5 +1,5 @@
-// enter_root FOLDER PROGRAM ARGUMENTS…: makes FOLDER, at which something is mounted, the root of
-// this mount namespace, leaves nothing of the former root in it, and becomes the program.
+// enter_root FOLDER PROGRAM ARGUMENTS…: makes FOLDER, a mount point, the root of this mount
+// namespace, leaves nothing of the former root in it, and executes the program.
 #include <unistd.h>
 
 #include <cstdio>

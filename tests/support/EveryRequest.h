@@ -1,4 +1,4 @@
-// One request of every code about one item, for counting what each of them takes.
+// One request of every code about one item, for counting their costs.
 #pragma once
 
 #include <cstdint>
@@ -18,8 +18,8 @@ namespace tallowmere::test {
 // An existing item as the service knows it.
 struct Item {
   std::string path;
-  std::string folder;  // that holds it
-  std::string name;    // which is its HFS name too
+  std::string folder;  // its parent
+  std::string name;    // also its HFS name
   std::string record;  // 70 bytes
   std::int16_t volume;
   std::int32_t folderID;
@@ -27,13 +27,13 @@ struct Item {
   std::string fullPath;  // of the folder, in HFS form
 };
 
-// What the requests ask for: bytes for a full path, bytes of a name, a rate in hertz × 65536.
+// The requests' parameters: bytes for a full path, bytes of a name, a rate in hertz × 65536.
 inline constexpr unsigned kRoomForAFullPath = 1024;
 inline constexpr unsigned kRoomForAName = 64;
 inline constexpr std::uint32_t kRateOfACD = 44100u << 16;
 
-// The request with a code from 1, made of the fields of the item that it is about; the others need
-// not be known.
+// The request with a code from 1 on, made from the fields of the item; fields that it does not use
+// need not be known.
 inline std::string RequestAbout(const Item& item, unsigned code) {
   const std::vector<std::string> requests{
       FullPathRequest(item.path, kRoomForAFullPath, 1),
@@ -50,8 +50,8 @@ inline std::string RequestAbout(const Item& item, unsigned code) {
   return requests.at(code - 1);
 }
 
-// The right answer to it. REQUIRES: the item is a file; the code is not 10, whose answer is not
-// about the item.
+// The right answer to it. REQUIRES: the item is a file; the code is not 10, whose answer does not
+// depend on the item.
 inline std::string AnswerAbout(const Item& item, unsigned code) {
   const std::vector<std::string> answers{
       FullPathResponse(item.fullPath, kRoomForAFullPath),
@@ -67,8 +67,8 @@ inline std::string AnswerAbout(const Item& item, unsigned code) {
   return answers.at(code - 1);
 }
 
-// What a service knows of the item at a path, whose name is its HFS name too; the record is empty
-// when it has none.
+// Asks a service about the item at a path. The item's name is also its HFS name; the record is
+// empty when it has none.
 inline Item LearnItem(Service& service, const std::string& path) {
   Item item{};
   item.path = path;
@@ -85,7 +85,7 @@ inline Item LearnItem(Service& service, const std::string& path) {
   return item;
 }
 
-// The number of components of the item's path: some requests cost by it.
+// The number of components of the item's path, which some requests' costs depend on.
 inline constexpr int kComponents = 6;
 
 class EveryRequest {
@@ -97,7 +97,7 @@ class EveryRequest {
     mItem = LearnItem(service, mItem.path);
   }
 
-  // Not where the folder for temporary files is too deep.
+  // False where the folder for temporary files is too deep.
   bool IsMade() const { return !mItem.path.empty(); }
 
   const std::string& Path() const { return mItem.path; }
@@ -106,8 +106,8 @@ class EveryRequest {
   std::string Of(unsigned code) const { return RequestAbout(mItem, code); }
 
  private:
-  // "/" counts as one element of a path here, so that the folder has as many as the file is to
-  // have.
+  // "/" counts as an element of the path here, so the folder has as many elements as the file is to
+  // have components.
   static std::string MakeFile(std::filesystem::path folder) {
     while (std::distance(folder.begin(), folder.end()) < kComponents) folder /= "folder";
     if (std::distance(folder.begin(), folder.end()) > kComponents) return {};

@@ -20,7 +20,7 @@ bool RunTool(const std::vector<std::string>& command) {
       dup2(nothing, standard);
     }
     const auto arguments = ArgumentVector(command);
-    // The tools of file systems are not on every user's path.
+    // Tools for file systems are not on every user's path.
     setenv("PATH", "/usr/sbin:/sbin:/usr/bin:/bin", 1);
     execvp(arguments[0], arguments.data());
     _exit(127);
@@ -55,7 +55,7 @@ bool FileSystemImage::Mount(const std::string& options) {
   return mIsMounted;
 }
 
-// Waits for the end of what still uses it, so that the image can be mounted again.
+// Waits for the last users to finish, so that the image can be mounted again.
 void FileSystemImage::Unmount() {
   if (mIsMounted && !RunTool({"umount", "-n", Path().string()})) {
     umount2(Path().c_str(), MNT_DETACH);

@@ -11,27 +11,28 @@
 
 namespace tallowmere::test {
 
-// Runs a program to its end, its output thrown away. False when it fails or is not installed.
+// Runs a program to its end, discarding its output. Returns false when it fails or is not
+// installed.
 bool RunTool(const std::vector<std::string>& command);
 
-// Whether the kernel has a file system, loading its module if it can.
+// Whether the kernel supports a file system; loads its module if possible.
 bool KernelHas(const std::string& fileSystem);
 
 class FileSystemImage {
  public:
-  // An image of so many bytes; `makeCommand` is the tool that fills it, the image's path goes
-  // behind its arguments.
+  // Makes an image of this size; `makeCommand` is the tool that fills it, to which the image's path
+  // is passed as the last argument.
   FileSystemImage(std::string type, std::vector<std::string> makeCommand, std::uintmax_t bytes);
   ~FileSystemImage() { Unmount(); }
 
-  // Whether there is an image. Not without the tool.
+  // Whether there is an image. False when the tool is not installed.
   bool IsMade() const { return mIsMade; }
 
   // Mounts it through a loop device. REQUIRES: the test is in a mount namespace of its own.
   bool Mount(const std::string& options = "");
   void Unmount();
 
-  // Where it is mounted.
+  // The mount point.
   std::filesystem::path Path() const { return mFolder.Path() / "mounted"; }
 
  private:

@@ -13,7 +13,7 @@ bool EnterOwnMountNamespace() {
   return entered;
 }
 
-// The former root goes on top of the new one at the same place, and away from there.
+// Stacks the former root on the new one, then unmounts it from there.
 bool MakeRootOfMounts(const std::string& folder) {
   return chdir(folder.c_str()) == 0 && syscall(SYS_pivot_root, ".", ".") == 0 &&
          umount2(".", MNT_DETACH) == 0 && chdir("/") == 0;

@@ -1,20 +1,20 @@
-// Mounting for a test, out of sight of everything else on the machine.
+// Mounting for a test, invisible to the rest of the machine.
 #pragma once
 
 #include <string>
 
 namespace tallowmere::test {
 
-// Puts this process, and what it starts from now on, into a mount namespace of its own in which
-// nothing spreads to or from the outside. False where that is not permitted. For good: a test
-// program that continues afterwards stays in it.
+// Moves this process, and what it starts afterwards, into a new mount namespace from and to which
+// no mount propagates. Returns false where that is not permitted. For good: a test program that
+// continues afterwards stays in it.
 bool EnterOwnMountNamespace();
 
-// Makes a folder, at which something is mounted, the root of this mount namespace and leaves
-// nothing of the former root in it. False with errno when it cannot.
+// Makes a folder, a mount point, the root of this mount namespace, leaving nothing of the former
+// root in it. Returns false and sets errno when that fails.
 bool MakeRootOfMounts(const std::string& folder);
 
-// A mount that ends with its object.
+// A mount that lasts as long as its object.
 class ScopedMount {
  public:
   ScopedMount(const std::string& source, const std::string& place, const char* type,

@@ -1,4 +1,4 @@
-// Takes the place of the platform's in a service that is to be compared with one that is locked in.
+// Replaces the platform's function in a service that is compared with a confined one.
 #include <Tallowmere/Process.h>
 
 void tallowmere::process::LockIn() {}

@@ -1,6 +1,5 @@
-// Linked into a test program, it keeps the program and the services that it starts on one
-// processor: where they only wait for each other, waking each other across processors takes half of
-// the time.
+// Linked into a test program, keeps the program and the services that it starts on one processor.
+// They mostly wait for each other, and waking each other across processors takes half of the time.
 #include <gtest/gtest.h>
 #include <sched.h>
 
@@ -9,7 +8,8 @@ namespace {
 
 class OneProcessor : public testing::Environment {
  public:
-  // On the one that the kernel has chosen. Where that is not permitted it is only slower.
+  // Uses the processor that the kernel has chosen. Where pinning is not permitted, the tests are
+  // just slower.
   void SetUp() override {
     cpu_set_t one;
     CPU_ZERO(&one);

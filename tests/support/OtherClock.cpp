@@ -1,5 +1,5 @@
-// Preloaded into a program, shows it another time of day: $TALLOWMERE_CLOCK seconds since 1970 at
-// its first look and at each further one $TALLOWMERE_CLOCK_STEP seconds more, which may be
+// Preloaded into a program, shows it another time of day: $TALLOWMERE_CLOCK seconds since 1970 on
+// its first call, and on each further call $TALLOWMERE_CLOCK_STEP seconds more, which may be
 // negative.
 #include <dlfcn.h>
 #include <sys/time.h>

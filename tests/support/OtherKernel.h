@@ -1,6 +1,6 @@
-// Shows the program that it is linked into another kernel than the real one, where a test asks for
+// Makes the kernel look different to the program that this is linked into, where a test asks for
 // it: another time of day, entries without types, a missing call, something that happens between
-// two calls. Each for as long as its object lives; nothing is changed otherwise.
+// two calls. Each lasts as long as its object; nothing else is changed.
 #pragma once
 
 #include <chrono>
@@ -8,7 +8,7 @@
 
 namespace tallowmere::test {
 
-// The time of day (CLOCK_REALTIME) is shown that much later, or earlier.
+// Shifts the time of day (CLOCK_REALTIME) by this much, forwards or backwards.
 class OtherTime {
  public:
   explicit OtherTime(std::chrono::nanoseconds later);
@@ -17,7 +17,7 @@ class OtherTime {
   ~OtherTime();
 };
 
-// No entry of a folder has a type: DT_UNKNOWN, as on file systems that do not store it.
+// Hides the type of every folder entry: DT_UNKNOWN, as on file systems that do not store it.
 class UntypedEntries {
  public:
   UntypedEntries();
@@ -26,7 +26,7 @@ class UntypedEntries {
   ~UntypedEntries();
 };
 
-// openat2 fails with that error: EPERM in a sandbox, ENOSYS before Linux 5.6.
+// Makes openat2 fail with this error: EPERM in a sandbox, ENOSYS before Linux 5.6.
 class RefusedOpenat2 {
  public:
   explicit RefusedOpenat2(int error);
@@ -35,8 +35,7 @@ class RefusedOpenat2 {
   ~RefusedOpenat2();
 };
 
-// Something happens whenever entries of a folder are about to be read: getdents64 of that
-// descriptor.
+// Does something whenever entries of a folder are about to be read: getdents64 of this descriptor.
 class BeforeEntries {
  public:
   explicit BeforeEntries(std::function<void(int folder)> happens);
@@ -45,8 +44,8 @@ class BeforeEntries {
   ~BeforeEntries();
 };
 
-// Waits until the kernel's clock for time stamps has moved on, so that what is changed from now on
-// has another time than what was changed before: some milliseconds.
+// Waits until the kernel's clock for time stamps has advanced, some milliseconds, so that later
+// changes get another time than earlier ones.
 void WaitForTheNextTick();
 
 }  // namespace tallowmere::test

@@ -1,5 +1,5 @@
-// Puts a whole test program into a mount namespace of its own, where that is permitted, before its
-// first look at the mounts: the list of mounts that a process has read is one of a namespace.
+// Moves a whole test program into a mount namespace of its own, where that is permitted, before it
+// first reads the mounts: the list of mounts that a process has read is that of a namespace.
 #pragma once
 
 #include <gtest/gtest.h>

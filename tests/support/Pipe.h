@@ -1,4 +1,4 @@
-// A pipe of the test's own.
+// A pipe for a test.
 #pragma once
 
 #include <fcntl.h>
@@ -9,8 +9,8 @@
 
 namespace tallowmere::test {
 
-// The end to read from and the end to write to, which programs that are started do not inherit. To
-// be closed by who asked.
+// The reading end and the writing end, which started programs do not inherit. The caller closes
+// them.
 inline std::array<int, 2> MakePipe() {
   std::array<int, 2> ends{};
   if (pipe2(ends.data(), O_CLOEXEC) != 0) std::abort();

@@ -1,4 +1,4 @@
-// What holds for a process that has fewer privileges than the test.
+// Running code in a process with fewer privileges than the test.
 #pragma once
 
 #include <linux/capability.h>
@@ -9,7 +9,7 @@
 
 namespace tallowmere::test {
 
-// Whether `work` says true in a child process, after `prepare` did.
+// Whether `prepare`, then `work`, return true in a child process.
 template <class Prepare, class Work>
 bool HoldsInChild(Prepare prepare, Work work) {
   const pid_t child = fork();
@@ -18,14 +18,15 @@ bool HoldsInChild(Prepare prepare, Work work) {
   return waitpid(child, &status, 0) == child && WIFEXITED(status) && WEXITSTATUS(status) == 0;
 }
 
-// Whether `work` says true in a child process that has no privileges.
+// Whether `work` returns true in a child process without privileges.
 template <class Work>
 bool HoldsForNobody(Work work) {
   constexpr uid_t kNobody = 65534;
   return HoldsInChild([] { return setresuid(kNobody, kNobody, kNobody) == 0; }, work);
 }
 
-// Whether `work` says true in a child process that lacks a privilege below 32: CAP_SYS_ADMIN, ….
+// Whether `work` returns true in a child process that lacks a privilege below 32, such as
+// CAP_SYS_ADMIN.
 template <class Work>
 bool HoldsWithout(unsigned capability, Work work) {
   const auto giveUp = [capability] {

@@ -12,10 +12,10 @@
 namespace tallowmere::test {
 namespace {
 
-// Refuses what passes all of the checks: each leaves the rest to be allowed when it does not hold.
+// Refuses the calls that pass all checks; a check that fails allows the call.
 bool Install(std::vector<sock_filter> checks, int error) {
   for (std::size_t i = 0; i < checks.size(); ++i) {
-    // Over the checks behind it and the refusal.
+    // Jumps over the remaining checks and the refusal.
     if (BPF_CLASS(checks[i].code) == BPF_JMP) {
       checks[i].jf = static_cast<std::uint8_t>(checks.size() - i);
     }
@@ -29,7 +29,7 @@ bool Install(std::vector<sock_filter> checks, int error) {
 }
 
 constexpr std::uint32_t kNumber = offsetof(seccomp_data, nr);
-// The lower half on machines of this byte order.
+// The lower half on machines with this byte order.
 constexpr std::uint32_t kSecondArgument = offsetof(seccomp_data, args[1]);
 
 }  // namespace

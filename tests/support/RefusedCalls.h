@@ -1,10 +1,9 @@
-// System calls that the kernel refuses from now on, as a sandbox does: for processes of a test's
-// own, for good.
+// Makes the kernel refuse system calls, as a sandbox does: for a test's own processes, for good.
 #pragma once
 
 namespace tallowmere::test {
 
-// Lets a system call fail with that error. False where that cannot be arranged.
+// Makes a system call fail with this error. Returns false where that is not possible.
 bool RefuseCall(long call, int error);
 
 // The same for one request of ioctl(2).

@@ -1,7 +1,7 @@
-// resolve_spec: reads one FSSpec of 70 bytes after the other from its input and answers each with a
-// line: the result code and the path of the item in hexadecimal, in a process that knows nothing of
-// where the records came from. With the argument "unprivileged" it gives up the superuser's rights
-// first.
+// resolve_spec: reads FSSpecs of 70 bytes from standard input and prints a line for each: the
+// result code and the path of the item in hexadecimal. It runs in a process that knows nothing of
+// where the records came from. With the argument "unprivileged" it first gives up the superuser's
+// rights.
 #include <CoreFoundation/CoreFoundation.h>
 #include <CoreServices/CoreServices.h>
 #include <grp.h>

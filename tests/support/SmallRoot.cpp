@@ -15,7 +15,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// A folder that every machine has and no program is in.
+// A folder that every machine has and that contains no programs.
 const std::string kPlace = "/sys";
 
 std::string OutputOf(const std::string& command) {
@@ -27,7 +27,7 @@ std::string OutputOf(const std::string& command) {
   return text;
 }
 
-// The programs and all libraries.
+// The programs and all their libraries.
 std::set<std::string> FilesOf(const std::vector<std::string>& programs) {
   std::set<std::string> files;
   for (const std::string& program : programs) {

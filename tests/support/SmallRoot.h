@@ -1,5 +1,5 @@
-// A root folder with nothing in it but some programs and what they need to start, so that what else
-// is mounted on the machine takes no part in a test, and no search goes over its disks.
+// A root folder with just some programs and what they need to start, so that other mounts of the
+// machine do not affect a test and no search visits its disks.
 #pragma once
 
 #include <filesystem>
@@ -8,13 +8,13 @@
 
 namespace tallowmere::test {
 
-// Copies programs and libraries, and the libraries that ldd names for them, to their paths below a
+// Copies programs and libraries, and the libraries that ldd lists for them, to their paths below a
 // folder.
 void CopyPrograms(const std::vector<std::string>& programs, const std::filesystem::path& root);
 
-// Puts this process into a mount namespace of its own with such a root folder, in memory: the
-// programs at their paths, the libraries that ldd names, /proc, and an empty folder for temporary
-// files. False where that is not permitted. For good.
+// Moves this process into a mount namespace of its own with such a root folder, in memory: the
+// programs at their paths, the libraries that ldd lists, /proc, and an empty folder for temporary
+// files. Returns false where that is not permitted. For good.
 bool EnterSmallRoot(const std::vector<std::string>& programs);
 
 }  // namespace tallowmere::test

@@ -1,6 +1,6 @@
-// stop_at_calls SOCKET PROGRAM ARGUMENTS…: becomes the program, which then stops at every system
-// call but those of waiting, memory and the two pipes until whoever holds the descriptor that comes
-// out of the socket lets it go on. Exit status 2 where that is not permitted.
+// stop_at_calls SOCKET PROGRAM ARGUMENTS…: executes the program, which then stops at every system
+// call, except those for waiting, memory and the two pipes, until the holder of the descriptor that
+// is sent through the socket lets it continue. Exits with status 2 where that is not permitted.
 #include <linux/filter.h>
 #include <linux/seccomp.h>
 #include <sys/prctl.h>

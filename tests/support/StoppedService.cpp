@@ -16,7 +16,7 @@
 namespace tallowmere::test {
 namespace {
 
-// The descriptor that comes out of a socket; -1 when none does.
+// Receives a descriptor from a socket; -1 when there is none.
 int Receive(int socket) {
   DescriptorMessage received;
   if (recvmsg(socket, &received.message, MSG_CMSG_CLOEXEC) != 1) return -1;
@@ -61,7 +61,7 @@ bool StoppedService::HasChanged() {
   return mHasChanged;
 }
 
-// Until the service is gone.
+// Runs until the service has ended.
 void StoppedService::Supervise() {
   pollfd awaited{mListener, POLLIN, 0};
   while (poll(&awaited, 1, -1) == 1 && (awaited.revents & POLLIN) != 0) {

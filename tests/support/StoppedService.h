@@ -21,14 +21,14 @@ class StoppedService {
   // Whether the kernel lets us stop it.
   bool CanStop() const { return mListener >= 0; }
 
-  // The service's streams; it runs on as long as nothing is to happen.
+  // The service's streams. It does not stop unless a change is pending.
   ChildProgram& Streams() { return *mProgram; }
 
-  // `change` is to be made when the service is about to make its call number `call` from now on,
-  // the next one being 0.
+  // Calls `change` when the service is about to make its system call number `call`, counted from
+  // now, the next one being 0.
   void ChangeAt(int call, std::function<void()> change);
 
-  // Nothing is to happen any more. Whether it has happened.
+  // Cancels a pending change. Returns whether the change was made.
   bool HasChanged();
 
  private:
@@ -38,7 +38,7 @@ class StoppedService {
   int mListener = -1;
   std::unique_ptr<ChildProgram> mProgram;
   std::thread mSupervisor;
-  std::mutex mMutex;  // of all below
+  std::mutex mMutex;  // guards everything below
   int mCallsToGo = 0;
   std::function<void()> mChange;
   bool mHasChanged = false;

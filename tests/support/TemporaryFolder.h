@@ -1,4 +1,4 @@
-// A folder of its own for one test, removed with all that is in it.
+// A folder for one test, removed with all its contents.
 #pragma once
 
 #include <cstdlib>
@@ -23,22 +23,22 @@ class TemporaryFolder {
     std::filesystem::remove_all(mPath, ignored);
   }
 
-  // Canonical.
+  // The canonical path.
   const std::filesystem::path& Path() const { return mPath; }
 
-  // The path of a new folder in it.
+  // Makes a folder in it and returns the path.
   std::filesystem::path MakeFolder(std::string_view name) const {
     std::filesystem::create_directories(mPath / name);
     return mPath / name;
   }
 
-  // The path of a new file in it.
+  // Makes a file in it and returns the path.
   std::filesystem::path MakeFile(std::string_view name, std::string_view content = "") const {
     std::ofstream(mPath / name, std::ios::binary) << content;
     return mPath / name;
   }
 
-  // The path of a new symbolic link in it.
+  // Makes a symbolic link in it and returns the path.
   std::filesystem::path MakeLink(std::string_view name, const std::string& target) const {
     std::filesystem::create_symlink(target, mPath / name);
     return mPath / name;

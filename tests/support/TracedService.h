@@ -1,4 +1,4 @@
-// The service under strace, for counting its system calls.
+// Runs the service under strace to count its system calls.
 #pragma once
 
 #include <optional>
@@ -7,26 +7,26 @@
 
 namespace tallowmere::test {
 
-// What it answered and the calls that it made, a line each as strace writes them.
+// The answers and the system calls, one line each as strace writes them.
 struct TracedRun {
   std::string responses;
   int status;
   std::vector<std::string> calls;
 };
 
-// Runs the service with these requests and nothing behind them, with this process for its parent.
-// `calls` names the system calls, separated by commas. None where strace cannot trace.
+// Runs the service with exactly these requests, with this process as its parent. `calls` names the
+// system calls, separated by commas. Nullopt where strace cannot trace.
 std::optional<TracedRun> RunTraced(const std::string& calls, const std::string& requests);
 
-// The same with another program that serves requests, and its arguments behind the parent's id.
+// The same with another program that serves requests, with its arguments after the parent's id.
 std::optional<TracedRun> RunTraced(const std::string& calls, const std::string& requests,
                                    const std::string& program,
                                    const std::vector<std::string>& arguments);
 
-// Whether a line is a call by that name.
+// Whether a line is a call with this name.
 bool IsCall(const std::string& line, const std::string& name);
 
-// The calls between the last two looks for the parent. REQUIRES: there were two.
+// The calls between the last two checks for the parent. REQUIRES: there were two.
 std::vector<std::string> CallsOfLastRequest(const TracedRun& run);
 
 }  // namespace tallowmere::test

@@ -1,4 +1,4 @@
-// A program that has chosen Turkish, in which "I" and "i" are not one letter in two cases.
+// Sets a Turkish locale, in which "I" and "i" are not the same letter in two cases.
 #pragma once
 
 #include <cctype>
@@ -10,8 +10,7 @@
 
 namespace tallowmere::test {
 
-// Chooses Turkish for the program until its end, made anew from the sources of the C library's
-// locales.
+// Sets Turkish for the rest of the program, built from the sources of the C library's locales.
 class TurkishLocale {
  public:
   TurkishLocale() {
@@ -25,7 +24,7 @@ class TurkishLocale {
   TurkishLocale& operator=(const TurkishLocale&) = delete;
   ~TurkishLocale() { std::setlocale(LC_ALL, "C"); }
 
-  // Not where those sources are not installed.
+  // False where those sources are not installed.
   bool IsChosen() const { return mIsChosen; }
 
  private:

@@ -1,4 +1,4 @@
-// Requests and responses as bytes, written down field by field: the tests' own reading of the
+// Requests and responses as bytes, written field by field: the tests' own implementation of the
 // protocol, independent of the client's.
 #pragma once
 
@@ -30,12 +30,12 @@ inline std::string I16(int value) {
   return Bytes(static_cast<std::int16_t>(value));
 }
 
-// A 16-bit count and the bytes as they are.
+// A 16-bit count, followed by the bytes.
 inline std::string Counted(std::string_view bytes) {
   return U16(static_cast<unsigned>(bytes.size())).append(bytes);
 }
 
-// A text as a counted string, its NUL inside the count.
+// A text as a counted string, whose count includes the NUL.
 inline std::string CString(std::string_view text) {
   return Counted(std::string(text).append(1, '\0'));
 }
@@ -54,7 +54,7 @@ inline std::string Flag(unsigned value) {
 inline std::string FullPathRequest(std::string_view path, unsigned size, unsigned flag) {
   return U16(1) + CString(path) + U16(size) + Flag(flag);
 }
-// `folder` and `name` with whatever NULs they are to have.
+// `folder` and `name` include any NULs they are to have.
 inline std::string PathOfHFSPathRequest(std::string_view folder, std::string_view name,
                                         unsigned flag) {
   return U16(2) + Counted(folder) + Counted(name) + Flag(flag);
@@ -76,7 +76,7 @@ inline std::string PathOfRecordRequest(std::string_view record, unsigned search,
   return U16(9).append(record) + Flag(search) + Flag(flag);
 }
 
-// A record of 70 bytes, zero behind the name.
+// A record of 70 bytes, zero after the name.
 inline std::string Record(int volume, std::int32_t folder, std::string_view name) {
   std::string record = I16(volume) + Bytes(folder) + Flag(static_cast<unsigned>(name.size()));
   record.append(name).resize(70);
@@ -84,7 +84,7 @@ inline std::string Record(int volume, std::int32_t folder, std::string_view name
 }
 inline const std::string kEmptyRecord = Record(32767, -1, "");
 
-// The format as it is read, "twos".
+// The format is given as it is read, "twos".
 inline std::string ExportSettingsRequest(std::uint32_t rate, std::uint32_t sampleSize,
                                          std::uint8_t channels, std::string_view format) {
   return U16(10) + U32(rate) + U32(sampleSize) + Bytes(channels) +
@@ -103,21 +103,21 @@ inline std::string NameResponse(unsigned flag, std::string_view name) {
 inline std::string RecordResponse(unsigned flag, std::string_view record) {
   return Flag(flag).append(record).append(kTrailer);
 }
-// To codes 6, 8 and 9.
+// The response to codes 6, 8 and 9.
 inline std::string PathResponse(std::string_view path) {
   return (Flag(1) + CString(path)).append(kTrailer);
 }
 inline const std::string kNoPathResponse = (Flag(0) + U16(0)).append(kTrailer);
-// To code 9, about what cannot be found.
+// The response to code 9 about an item that cannot be found.
 inline const std::string kNoItemResponse = (Flag(1) + U16(0)).append(kTrailer);
-// To code 1, about a full path with less than `room` bytes.
+// The response to code 1 about a full path with fewer than `room` bytes.
 inline std::string FullPathResponse(std::string fullPath, unsigned room) {
   const auto length = static_cast<unsigned>(fullPath.size());
   fullPath.resize(room);
   return U16(length).append(fullPath).append(kTrailer);
 }
 
-// Of code 2, but for the last one, which is of code 10.
+// Results of code 2, except the last one, which is of code 10.
 inline constexpr int kResultNoItem = -43;
 inline constexpr int kResultNoFolder = -120;
 inline constexpr int kResultNoVolume = -35;
@@ -126,7 +126,7 @@ inline constexpr int kResultNotPermitted = -5000;
 inline constexpr int kResultSystemError = -36;
 inline constexpr int kResultNoMemory = -108;
 
-// To code 2.
+// The response to code 2.
 inline std::string ResultResponse(int result, std::string_view path) {
   return (I16(result) + CString(path)).append(kTrailer);
 }
@@ -135,7 +135,7 @@ inline std::string ResultResponse(int result) {
 }
 inline const std::string kNoVolumeNameResponse = std::string("\0\1\0\0MWLT", 8);
 
-// A request that any service answers, and the answer.
+// A request that any service answers, and its answer.
 inline const std::string kAnyRequest = VolumeNameRequest(32767);
 inline const std::string& kItsResponse = kNoVolumeNameResponse;
 
@@ -146,9 +146,9 @@ class Service : public ChildProgram {
                    BrokenPipe brokenPipe = BrokenPipe::kEnds)
       : ChildProgram(TALLOWMERE_SERVICE, {parent}, brokenPipe) {}
 
-  // Started by a command, which gets the service's program and its argument as its own last words:
-  // {"setpriv", "--clear-groups"}. The argument stands for the service's own process group, which
-  // lives as long as it does.
+  // Starts the service by a command to which the service's program and its argument are appended:
+  // {"setpriv", "--clear-groups"}. The argument is the service's own process group, which lives as
+  // long as the service does.
   explicit Service(const std::vector<std::string>& command)
       : ChildProgram(command.front(), WithService(command)) {}
 
@@ -157,7 +157,7 @@ class Service : public ChildProgram {
     return Read(responseSize);
   }
 
-  // Whether the response is this one and nothing more.
+  // Whether the response is exactly this one.
   bool Answers(std::string_view request, const std::string& response) {
     Write(request);
     Write(kAnyRequest);

@@ -1,5 +1,5 @@
-// without_walls landlock|filters|both PROGRAM ARGUMENTS…: becomes the program, on a kernel that
-// answers as one without Landlock, without filters of system calls, or without both.
+// without_walls landlock|filters|both PROGRAM ARGUMENTS…: executes the program on a kernel that
+// appears to lack Landlock, filters of system calls, or both.
 #include <linux/filter.h>
 #include <linux/seccomp.h>
 #include <sys/prctl.h>
@@ -20,7 +20,7 @@ using Filter = std::vector<sock_filter>;
 constexpr unsigned kCall = offsetof(seccomp_data, nr);
 constexpr unsigned kFirstArgument = offsetof(seccomp_data, args);
 
-// Where what is at an offset has a value, these steps; the others go on behind them.
+// Adds steps that run only where the value at an offset equals `value`.
 void Where(Filter& filter, unsigned offset, long value, const Filter& steps) {
   filter.push_back(BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offset));
   filter.push_back(BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, static_cast<unsigned>(value), 0,
