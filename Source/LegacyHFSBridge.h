@@ -41,7 +41,7 @@ FSSpec BoundedFSSpec(FSSpec const& spec);
 
 // --- Records and references -------------------------------------------------------------------
 
-// Makes `ref` name the first of these that exists:
+// Makes `ref` name the first of these that applies:
 //
 //   1. the existing item that the record names;
 //   2. with `searchOtherVolumes`, the existing item with the same folder id and name on another

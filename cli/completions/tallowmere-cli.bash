@@ -14,8 +14,8 @@ _tallowmere_cli() {
     [census]='--json'
     [serve-check]='--json'
   )
-  # The command is the first word that is neither an option nor the value of one. In "--option=value"
-  # the "=" is a word of its own.
+  # The command is the first word that is neither an option nor the value of one. In "--option=value",
+  # "=" is a separate word.
   local i command=
   for ((i = 1; i < COMP_CWORD; i++)); do
     case ${COMP_WORDS[i]} in
@@ -23,7 +23,7 @@ _tallowmere_cli() {
         [[ ${COMP_WORDS[i + 1]} == = ]] && ((i++))
         ((i++))
         ;;
-      --) [[ -n $command ]] && return ;;  # items alone are behind it
+      --) [[ -n $command ]] && return ;;  # only items follow
       -*) ;;
       *) command=${command:-${COMP_WORDS[i]}} ;;
     esac
@@ -48,10 +48,10 @@ _tallowmere_cli() {
       fi
       ;;
   esac
-  # What is listed here is no file.
+  # The words listed here are not files.
   compopt +o default 2>/dev/null
   mapfile -t COMPREPLY < <(compgen -W "$words" -- "$word")
 }
 
-# Where nothing is listed, files.
+# Completes files where nothing is listed.
 complete -o default -F _tallowmere_cli tallowmere-cli
