@@ -8,12 +8,12 @@
 
 #include "CFOwned.h"
 #include "foundation/ColonsAndSlashes.h"
-#include "text/FileNameText.h"
-#include "text/MacRoman.h"
 #include "fuzz/Check.h"
 #include "names/HFSNames.h"
 #include "names/NodeIDs.h"
 #include "names/PascalNames.h"
+#include "text/FileNameText.h"
+#include "text/MacRoman.h"
 
 namespace tallowmere::fuzz {
 namespace {

@@ -5,10 +5,10 @@
 #include <cerrno>
 #include <utility>
 
-#include "text/FileNameText.h"
 #include "foundation/LetterCase.h"
 #include "foundation/PathText.h"
 #include "foundation/PercentEncoding.h"
+#include "text/FileNameText.h"
 #include "text/Utf16.h"
 
 namespace tallowmere::foundation {
