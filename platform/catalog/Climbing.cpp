@@ -29,13 +29,14 @@ std::string_view HolderOf(std::string_view path) {
 }
 
 // The remembered id of the folder that holds the one at a path; none when it is not remembered, or
-// from another place.
+// from another place. That the root holds it is remembered as well: the mount point can have been
+// renamed.
 std::optional<std::uint32_t> RememberedParent(Moment& moment, const volumes::Volume& volume,
                                               std::string_view path, std::uint32_t id) {
-  if (HolderOf(path) == volume.MountPoint()) return names::kRootFolderID;
   const auto* const place = moment.Knowledge().LastPlaceOf(id, volume);
+  const bool isInRoot = HolderOf(path) == volume.MountPoint();
   const bool isKnown = place != nullptr && place->path == path && place->parent != 0 &&
-                       place->parent != names::kRootFolderID;
+                       (place->parent == names::kRootFolderID) == isInRoot;
   return isKnown ? std::optional(place->parent) : std::nullopt;
 }
 

@@ -255,7 +255,8 @@ kernel::Result<HeldFolder> HoldFolderWithID(Moment& moment, volumes::VolumeNumbe
   const auto place = FindItem(moment, *volume, id, true);
   if (!place) return kernel::kNoFolder;
   auto held = moment.HoldFolder(place->path);
-  const bool isIt = held && kernel::HaveSameNumbers(held->Item(), place->item) &&
+  const bool isIt = held && held->ID() == id &&
+                    kernel::HaveSameNumbers(held->Item(), place->item) &&
                     held->Item().mount == place->item.mount;
   if (!isIt) return kernel::kNoFolder;
   return held;

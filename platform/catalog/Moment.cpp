@@ -23,6 +23,22 @@ bool MayBeALink(kernel::Error error) {
   return error.number == ELOOP || error.number == ENOTDIR;
 }
 
+// How often the item of a name may be replaced between a look at it and the reading of its handle.
+constexpr int kMostReadings = 8;
+
+// The item at a spot, with its handle where its id follows from it. ENOENT where it has none.
+kernel::Result<kernel::Item> ReadForID(const volumes::Volume& volume, const kernel::Spot& spot) {
+  for (int reading = 0; reading < kMostReadings; ++reading) {
+    auto status = kernel::ReadStatus(spot);
+    if (!status) return status.Error();
+    if (!volume.NeedsHandleForID(status->item)) return status->item;
+    kernel::ReadProof(status->item, spot);
+    if (!volume.NeedsHandleForID(status->item)) return status->item;
+    if (status->item.handle.size == 0) break;
+  }
+  return kernel::kNotThere;
+}
+
 }  // namespace
 
 Look::Look(HeldFolder folder, Sighting seen) {
@@ -206,13 +222,9 @@ kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, std::string_view n
     if (isSame) return look;
   }
   const kernel::Spot spot = folder.SpotOf(path.c_str() + path.size() - name.size());
-  auto status = kernel::ReadStatus(spot);
-  if (!status) return status.Error();
-  if (folder.Volume()->NeedsHandleForID(status->item)) {
-    kernel::ReadProof(status->item, spot);
-    if (status->item.handle.size == 0) return kernel::kNotThere;
-  }
-  Look look(folder, {std::move(path), status->item});
+  auto item = ReadForID(*folder.Volume(), spot);
+  if (!item) return item.Error();
+  Look look(folder, {std::move(path), *std::move(item)});
   if (mLooks.size() < kMostLooks) mLooks.push_back({look, std::nullopt});
   return look;
 }
@@ -248,7 +260,9 @@ const Look* Moment::LookFor(const kernel::Item& reference) const {
 kernel::Item Moment::Prove(const Look& look) {
   const kernel::Item reference = Proved(look.Seen(), *look.Folder().Volume(), look.Spot());
   for (auto& known : mLooks) {
-    if (known.fact.Path() == look.Path()) known.reference = reference;
+    const bool isIt =
+        known.fact.Path() == look.Path() && kernel::HaveSameNumbers(known.fact.Item(), look.Item());
+    if (isIt) known.reference = reference;
   }
   return reference;
 }
@@ -256,7 +270,9 @@ kernel::Item Moment::Prove(const Look& look) {
 kernel::Item Moment::Prove(const HeldFolder& folder) {
   const kernel::Item reference = Proved(folder.Place(), *folder.Volume(), folder.OwnSpot());
   for (auto& known : mHeld) {
-    if (known.fact.Path() == folder.Path()) known.reference = reference;
+    const bool isIt = known.fact.Path() == folder.Path() &&
+                      kernel::HaveSameNumbers(known.fact.Item(), folder.Item());
+    if (isIt) known.reference = reference;
   }
   return reference;
 }

@@ -75,6 +75,7 @@ bool ShortFormSearch::FindByNumber(const names::ShortNameParts& parts) {
   for (const HeldFolder& view : mViews) {
     auto look = mMoment.LookUp(view, NameOf(*item));
     if (!look || !AreSame(*volume, look->Seen(), *item)) continue;
+    if (IDInShortForm(mMoment, *look) != parts.nodeID) return false;
     if (!IsShortFormOf(parts, *look)) return false;
     mFound.push_back(*std::move(look));
     return true;

@@ -104,4 +104,9 @@ std::optional<std::uint64_t> SubvolumeOf(const FileHandle& handle) {
   return Get<std::uint64_t>(handle, sizeof(std::uint64_t));
 }
 
+std::optional<std::uint64_t> SubvolumeOf(const FileHandle& handle, std::uint64_t inode) {
+  const auto subvolume = SubvolumeOf(handle);
+  return subvolume && Get<std::uint64_t>(handle, 0) == inode ? subvolume : std::nullopt;
+}
+
 }  // namespace tallowmere::kernel

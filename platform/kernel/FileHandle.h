@@ -62,4 +62,8 @@ std::optional<FileHandle> HandleOf(const HandleNumbers& numbers, const FileHandl
 // handle.
 std::optional<std::uint64_t> SubvolumeOf(const FileHandle& handle);
 
+// The same for an item with a number; none either from the handle of an item with another number,
+// which came to its place before the handle was read.
+std::optional<std::uint64_t> SubvolumeOf(const FileHandle& handle, std::uint64_t inode);
+
 }  // namespace tallowmere::kernel

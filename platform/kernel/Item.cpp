@@ -74,8 +74,10 @@ Result<Status> ReadStatus(const Spot& spot) {
   const bool hasMount = (about.stx_mask & STATX_MNT_ID) != 0 && about.stx_mnt_id != 0;
   item.mount = hasMount ? static_cast<std::int32_t>(about.stx_mnt_id) : kNoMount;
   item.type = about.stx_mode & S_IFMT;
+  const bool isBelowTop = (about.stx_attributes_mask & ~about.stx_attributes &
+                           static_cast<std::uint64_t>(STATX_ATTR_MOUNT_ROOT)) != 0;
   return Status{item, NanosecondsOf(about.stx_ctime.tv_sec, about.stx_ctime.tv_nsec),
-                about.stx_nlink};
+                about.stx_nlink, !isBelowTop};
 }
 
 Result<Item> ReadItem(const Spot& spot) {

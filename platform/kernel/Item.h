@@ -48,11 +48,13 @@ bool IsLink(const Item& item);
 // Whether both have the same device and inode number.
 bool HaveSameNumbers(const Item& first, const Item& second);
 
-// An item without its handle, the time of its last change, and its number of names.
+// An item without its handle, the time of its last change, its number of names, and whether it is
+// what its mount shows at the mount point; true before Linux 5.8, which does not tell: statx(2).
 struct Status {
   Item item;
   Nanoseconds change;
   std::uint32_t links;
+  bool isTopOfMount;
 };
 
 // Where to find an item, as in openat(2): a name in an open folder; an absolute path, with

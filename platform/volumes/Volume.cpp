@@ -36,14 +36,16 @@ std::string HFSNameOfVolume(const std::string& linuxName) {
   return plain ? *std::move(plain) : names::ShortHFSName(linuxName, names::kRootFolderID);
 }
 
-// 0 for an item without a handle, or without a subvolume.
+// 0 for an item in no subvolume, or whose handle was not read.
 std::uint64_t SubvolumeOfItem(const kernel::Item& item) {
-  return kernel::SubvolumeOf(item.handle).value_or(0);
+  return kernel::SubvolumeOf(item.handle, item.inode).value_or(0);
 }
 
-// Whether the item found at a mount point is not what is mounted there.
-bool IsMoved(const kernel::Result<kernel::Status>& found, int mount) {
+// Whether the item found at a mount point is not what is mounted there, but something else or
+// something in it.
+bool IsMoved(const kernel::Result<kernel::Status>& found, int mount, bool isProcessRoot) {
   if (!found) return found.Error().number == ENOENT || found.Error().number == ENOTDIR;
+  if (!found->isTopOfMount && !isProcessRoot) return true;
   return found->item.mount != kernel::kNoMount && found->item.mount != mount;
 }
 
@@ -108,7 +110,7 @@ kernel::Result<VolumePointer> ListedVolume::Enter() const {
   if (!mEntered) {
     const kernel::Spot place = kernel::AtPath(MountPoint().c_str());
     const auto root = kernel::ReadStatus(place);
-    if (IsMoved(root, mPlaces.front().mount.id)) return kMoved;
+    if (IsMoved(root, mPlaces.front().mount.id, MountPoint() == "/")) return kMoved;
     if (!root) return root.Error();
     const auto kind = kernel::ReadKind(MountPoint(), root->item.device);
     if (!kind) return kind.Error();
@@ -136,7 +138,7 @@ const std::string& Volume::MountPoint() const {
 }
 
 bool Volume::NeedsHandleForID(const kernel::Item& item) const {
-  return item.handle.size == 0 && names::NeedsSubvolume({item.inode, item.device, 0}, mRule);
+  return SubvolumeOfItem(item) == 0 && names::NeedsSubvolume({item.inode, item.device, 0}, mRule);
 }
 
 std::uint32_t Volume::IDOf(const kernel::Item& item) const {

@@ -149,6 +149,51 @@ TEST_F(AMoment, ClimbsThroughTheFoldersThatHoldItNow) {
   EXPECT_EQ(climb("first/a/b/c/x"), "first:a:b:c:");
 }
 
+// "t/m/z/m" is a mount point, and becomes "t/m": what the table calls the mount point is then a
+// folder in the volume.
+class AMomentAfterARename : public AMoment {
+ protected:
+  void SetUp() override {
+    AMoment::SetUp();
+    if (IsSkipped()) return;
+    mThird.emplace("none", mFolder.MakeFolder("t/m/z/m"), "tmpfs");
+    ASSERT_TRUE(mThird->IsMounted());
+    for (const char* name : {"z/m/x", "x"}) mFolder.MakeFolder("t/m/z/m/" + std::string(name));
+    mFolder.MakeFile("t/m/z/m/z/m/x/y");
+    VolumeAt(1);
+  }
+  void TearDown() override {
+    if (mIsRenamed) {
+      Rename("t", "former/m/z");
+      Rename("former", "t");
+    }
+  }
+  void RenameAboveTheMountPoint() {
+    Rename("t", "former");
+    Rename("former/m/z", "t");
+    mIsRenamed = true;
+  }
+  std::string FoldersInAMoment(const std::string& name) const {
+    const Moment moment;
+    return FoldersOf(name);
+  }
+
+  std::optional<ScopedMount> mThird;
+  bool mIsRenamed = false;
+};
+
+TEST_F(AMomentAfterARename, ClimbsToTheRootThatItKnew) {
+  ASSERT_EQ(FoldersInAMoment("t/m/z/m/z/m/x/y"), "m:z:m:x:");
+  RenameAboveTheMountPoint();
+  EXPECT_EQ(FoldersInAMoment("t/m/z/m/x/y"), "m:z:m:x:");
+  EXPECT_EQ(FoldersInAMoment("t/m/z/m/x/y"), "m:z:m:x:");
+}
+
+TEST_F(AMomentAfterARename, TakesNoFolderInAVolumeForItsRoot) {
+  RenameAboveTheMountPoint();
+  EXPECT_EQ(FoldersInAMoment("t/m/z/m/x/y"), "m:z:m:x:");
+}
+
 // --- What does not ------------------------------------------------------------------------------
 
 TEST_F(AMoment, KeepsNothingNegative) {
