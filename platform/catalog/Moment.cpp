@@ -147,14 +147,19 @@ const HeldFolder* Moment::HeldFor(const kernel::Item& reference) const {
   return nullptr;
 }
 
+// Without descriptors a new moment begins.
+template <class Call>
+kernel::Result<kernel::Descriptor> Moment::Open(const Call& call) {
+  auto descriptor = call();
+  if (descriptor || !MeansNoDescriptors(descriptor.Error())) return descriptor;
+  Restart();
+  return call();
+}
+
 kernel::Result<HeldFolder> Moment::HoldFolder(const std::string& path) {
   if (!kernel::IsNormalized(path)) return kernel::Error{ELOOP};
   if (const HeldFolder* const held = HeldAt(path)) return *held;
-  auto descriptor = kernel::HoldFolderWithoutLinks(path);
-  if (!descriptor && MeansNoDescriptors(descriptor.Error()) && !mHeld.empty()) {
-    Restart();
-    descriptor = kernel::HoldFolderWithoutLinks(path);
-  }
+  auto descriptor = Open([&] { return kernel::HoldFolderWithoutLinks(path); });
   if (!descriptor) return descriptor.Error();
   return Keep(path, *std::move(descriptor));
 }
@@ -179,18 +184,20 @@ kernel::Result<HeldFolder> Moment::HoldHolderOf(const std::string& path) {
   const std::string folder = foundation::FolderOf(path);
   auto held = HoldFolder(folder);
   if (held || !MayBeALink(held.Error())) return held;
-  return HoldAtRealPath(kernel::HoldFollowing(kernel::AtPath(folder.c_str())), folder);
+  auto found = Open([&] { return kernel::HoldFollowing(kernel::AtPath(folder.c_str())); });
+  return HoldAtRealPath(std::move(found), folder);
 }
 
 kernel::Result<HeldFolder> Moment::HoldFolderOf(const Look& folder) {
   if (const HeldFolder* const held = HeldAt(folder.Path())) return *held;
-  auto descriptor = kernel::HoldFolderIn(folder.Spot());
+  auto descriptor = Open([&] { return kernel::HoldFolderIn(folder.Spot()); });
   if (!descriptor) return descriptor.Error();
   return Keep(folder.Path(), *std::move(descriptor));
 }
 
 kernel::Result<HeldFolder> Moment::HoldTargetOf(const Look& link) {
-  return HoldAtRealPath(kernel::HoldFollowing(link.Spot()), link.Path());
+  auto found = Open([&] { return kernel::HoldFollowing(link.Spot()); });
+  return HoldAtRealPath(std::move(found), link.Path());
 }
 
 // The folder that was found by following an absolute path, at its canonical path. A path that leads
@@ -231,13 +238,14 @@ kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, std::string_view n
 
 kernel::Result<Sighting> Moment::See(const std::string& path) {
   std::string canonical = path;
-  auto item = kernel::IsNormalized(path) ? kernel::HoldWithoutLinks(path)
+  const auto hold = [&] { return kernel::HoldWithoutLinks(canonical); };
+  auto item = kernel::IsNormalized(path) ? Open(hold)
                                          : kernel::Result<kernel::Descriptor>(kernel::Error{ELOOP});
   if (!item) {
     auto real = kernel::CanonicalPath(path);
     if (!real) return real.Error();
     canonical = *std::move(real);
-    item = kernel::HoldWithoutLinks(canonical);
+    item = Open(hold);
   }
   if (!item) return item.Error();
   const auto status = kernel::ReadStatus(kernel::AtOpen(item->Get()));

@@ -153,6 +153,8 @@ class Moment {
   void Poll();
   kernel::Result<volumes::VolumePointer> FindVolume(const Sighting& seen);
   bool IsMountHeld(int mount) const;
+  template <class Call>
+  kernel::Result<kernel::Descriptor> Open(const Call& call);
   kernel::Result<HeldFolder> Keep(std::string path, kernel::Descriptor descriptor);
   const HeldFolder* HeldAt(const std::string& path) const;
   kernel::Result<HeldFolder> HoldAtRealPath(kernel::Result<kernel::Descriptor> found,

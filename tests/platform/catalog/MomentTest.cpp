@@ -362,6 +362,14 @@ TEST_F(AMoment, LetsGoOfWhatItHoldsWhenAVolumeIsSearched) {
   EXPECT_TRUE(CanUnmount("first"));
 }
 
+// Has no more than so many descriptors opened from now on.
+bool LeaveDescriptors(int count) {
+  const kernel::Descriptor lowest(dup(STDIN_FILENO));
+  const auto end = static_cast<rlim_t>(lowest.Get() + count);
+  const rlimit tight{end, end};
+  return setrlimit(RLIMIT_NOFILE, &tight) == 0;
+}
+
 TEST_F(AMoment, GoesOnWhenNoMoreDescriptorsCanBeOpened) {
   constexpr int kFolders = 6;
   for (int i = 0; i <= kFolders; ++i) {
@@ -370,19 +378,31 @@ TEST_F(AMoment, GoesOnWhenNoMoreDescriptorsCanBeOpened) {
   }
   const auto pathIn = [this](int i) { return PathTo("first/" + std::to_string(i) + " folder/x"); };
   const FSSpec wanted = SpecOf(pathIn(kFolders));
-  const auto leaveNoDescriptors = [] {
-    const kernel::Descriptor lowest(dup(STDIN_FILENO));
-    const rlimit tight{static_cast<rlim_t>(lowest.Get()), static_cast<rlim_t>(lowest.Get())};
-    return setrlimit(RLIMIT_NOFILE, &tight) == 0;
-  };
   EXPECT_TRUE(HoldsInChild([] { return true; },
                            [&] {
                              const Moment moment;
                              for (int i = 0; i < kFolders; ++i) SpecOf(pathIn(i));
-                             if (!leaveNoDescriptors() || dup(STDIN_FILENO) != -1) return false;
+                             if (!LeaveDescriptors(0) || dup(STDIN_FILENO) != -1) return false;
                              const FSSpec spec = SpecOf(pathIn(kFolders));
                              return ParentOf(spec) == ParentOf(wanted) && NameOf(spec) == "x" &&
                                     ItemOf(spec) == pathIn(kFolders);
+                           }));
+}
+
+TEST_F(AMoment, FollowsAPathOfMoreStepsThanItHasDescriptors) {
+  mFolder.MakeFolder("first/a/1/2/3/4/5/6");
+  mFolder.MakeFile("first/a/1/2/3/4/5/6/x");
+  std::filesystem::create_symlink("a", PathTo("first/link"));
+  const auto find = [](FSSpec& spec) {
+    const Moment moment;
+    return FSMakeFSSpec(0, 0, Str255Of("first:link:1:2:3:4:5:6:x").bytes, &spec);
+  };
+  FSSpec wanted{};
+  ASSERT_EQ(find(wanted), noErr);
+  EXPECT_TRUE(HoldsInChild([] { return LeaveDescriptors(3); },
+                           [&] {
+                             FSSpec spec{};
+                             return find(spec) == noErr && ParentOf(spec) == ParentOf(wanted);
                            }));
 }
 
