@@ -38,6 +38,13 @@ void CheckReading(std::string_view container) {
   Check(static_cast<std::size_t>(lines) == CountAtoms(*root));
 }
 
+// The lowest bytes of a number, the highest of them first.
+std::string Bytes(UInt32 number, int count) {
+  std::string bytes;
+  while (count-- > 0) bytes.push_back(static_cast<char>(number >> (8 * count)));
+  return bytes;
+}
+
 // The settings for an accepted sound contain that sound, and no proper beginning of them is a
 // container.
 void CheckExport(const SoundDescription& sound, std::size_t cut) {
@@ -48,7 +55,7 @@ void CheckExport(const SoundDescription& sound, std::size_t cut) {
   if (result != noErr) return;
   const std::string settings = exporter.Settings();
   const auto root = test::ReadAtomContainer(settings);
-  Check(root == test::SettingsOf(quicktime::BigEndian(sound.dataFormat), sound.sampleRate,
+  Check(root == test::SettingsOf(Bytes(sound.dataFormat, 4), sound.sampleRate,
                                  static_cast<UInt16>(sound.sampleSize),
                                  static_cast<UInt16>(sound.numChannels)));
   CheckReading(settings);
@@ -56,25 +63,28 @@ void CheckExport(const SoundDescription& sound, std::size_t cut) {
   Check(!test::ReadAtomContainer(beginning));
 }
 
-// A tree of three atoms with any data is read as it was written.
-void CheckWriting(std::string_view data) {
-  constexpr OSType kLeaf = quicktime::FourCharacterCode("leaf");
-  constexpr OSType kFolder = quicktime::FourCharacterCode("fold");
-  const std::string_view first = data.substr(0, data.size() / 2);
-  const std::string_view second = data.substr(first.size());
-  const std::string container =
-      quicktime::AtomContainer({quicktime::Leaf(kLeaf, first),
-                                quicktime::Parent(kFolder, {quicktime::Leaf(kLeaf, second)})});
-  const test::Atom firstLeaf{"leaf", 1, {}, std::string(first)};
-  const test::Atom secondLeaf{"leaf", 1, {}, std::string(second)};
-  const test::Atom folder{"fold", 1, {secondLeaf}, ""};
-  Check(test::ReadAtomContainer(container) == test::Atom{"sean", 1, {firstLeaf, folder}, ""});
+// A tree of four atoms with any numbers is read as it was written.
+void CheckWriting(Input& input) {
+  const auto word = static_cast<UInt32>(input.TakeByte() << 24 | input.TakeByte());
+  const auto half = static_cast<UInt16>(input.TakeByte() << 8 | input.TakeByte());
+  quicktime::AtomContainer container;
+  container.Open(quicktime::FourCharacterCode("sean"), 2);
+  container.AddLeaf(quicktime::FourCharacterCode("leaf"), word);
+  container.Open(quicktime::FourCharacterCode("fold"), 1);
+  container.AddLeaf(quicktime::FourCharacterCode("leaf"), half);
+  container.Close();
+  container.Close();
+  const test::Atom wordLeaf{"leaf", 1, {}, Bytes(word, 4)};
+  const test::Atom halfLeaf{"leaf", 1, {}, Bytes(half, 2)};
+  const test::Atom folder{"fold", 1, {halfLeaf}, ""};
+  Check(test::ReadAtomContainer(container.Bytes()) ==
+        test::Atom{"sean", 1, {wordLeaf, folder}, ""});
 }
 
 }  // namespace
 }  // namespace tallowmere::fuzz
 
-// The input: a kind, then a container, the fields of a sound, or data for atoms.
+// The input: a kind, then a container, the fields of a sound, or numbers for atoms.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   using namespace tallowmere::fuzz;
   Input input(data, size);
@@ -91,7 +101,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
       break;
     }
     default:
-      CheckWriting(input.Rest());
+      CheckWriting(input);
   }
   return 0;
 }

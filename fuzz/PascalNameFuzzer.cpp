@@ -23,10 +23,10 @@ using names::kLongestStr255Name;
 
 // Any bytes are text, and also Mac Roman text, and survive the round trip.
 void CheckText(std::string_view bytes) {
-  Check(text::FileNameOfText(foundation::TextOfFileName(bytes)) == bytes);
+  Check(text::FileNameOfText(text::TextOfFileName(bytes)) == bytes);
   const std::u16string text = text::DecodeMacRoman(bytes);
   Check(text::EncodeMacRoman(text) == bytes);
-  Check(text::EncodeMacRoman(foundation::DecomposeMacRoman(text)) == bytes);
+  Check(text::EncodeMacRoman(text::DecomposeMacRoman(text)) == bytes);
   Check(HFSNameOfUtf8(Utf8OfHFSName(bytes)) == bytes);
 }
 
