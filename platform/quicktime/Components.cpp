@@ -25,7 +25,8 @@ auto gComponents = std::to_array<ComponentRecord>({
 using Instances = std::unordered_map<ComponentInstance, std::unique_ptr<ComponentInstanceRecord>>;
 
 Instances& LiveInstances() {
-  static Instances instances;
+  // Never destroyed: exit handlers may still ask.
+  static Instances& instances = *new Instances;
   return instances;
 }
 

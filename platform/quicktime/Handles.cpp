@@ -22,7 +22,8 @@ struct Block {
 using Blocks = std::unordered_map<Handle, std::unique_ptr<Block>>;
 
 Blocks& LiveBlocks() {
-  static Blocks blocks;
+  // Never destroyed: exit handlers may still ask.
+  static Blocks& blocks = *new Blocks;
   return blocks;
 }
 
