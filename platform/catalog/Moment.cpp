@@ -231,7 +231,7 @@ kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, std::string_view n
   const kernel::Spot spot = folder.SpotOf(path.c_str() + path.size() - name.size());
   auto item = ReadForID(*folder.Volume(), spot);
   if (!item) return item.Error();
-  Look look(folder, {std::move(path), *std::move(item)});
+  Look look(folder, {std::move(path), *item});
   if (mLooks.size() < kMostLooks) mLooks.push_back({look, std::nullopt});
   return look;
 }
