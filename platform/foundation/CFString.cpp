@@ -158,7 +158,11 @@ CFStringRef CFStringCreateWithFormat(CFAllocatorRef, CFDictionaryRef, CFStringRe
 }
 
 CFStringRef CFStringCreateCopy(CFAllocatorRef, CFStringRef string) {
-  return OrZero([&] { return ReferenceTo(CopyOf(StringOf(string)).release()); });
+  return OrZero([&]() -> CFStringRef {
+    const String& original = StringOf(string);
+    if (original.IsMutable()) return CreateString(original.Text());
+    return static_cast<CFStringRef>(CFRetain(string));
+  });
 }
 
 CFStringRef CFStringCreateWithSubstring(CFAllocatorRef, CFStringRef string, CFRange range) {

@@ -62,8 +62,7 @@ std::string_view EncodedPath(CFURLRef url) {
 CFStringRef SharedPath(CFURLRef url) {
   const String* const path = UrlOf(url).Path();
   if (path == nullptr) return nullptr;
-  path->Retain();
-  return ReferenceTo(path);
+  return static_cast<CFStringRef>(CFRetain(ReferenceTo(path)));
 }
 
 Bytes DecodedLastComponent(CFURLRef url) {
