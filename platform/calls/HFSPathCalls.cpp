@@ -60,7 +60,7 @@ kernel::Result<HeldFolder> CurrentFolder(Moment& moment) {
 kernel::Result<HeldFolder> StartingFolder(Moment& moment, SInt16 vRefNum, SInt32 dirID,
                                           std::string_view volumeName) {
   if (!volumeName.empty()) {
-    const auto volume = moment.Volumes().WithName(volumeName);
+    const auto volume = moment.Volumes()->WithName(volumeName);
     if (!volume) return volume.Error();
     return catalog::HoldFolderWithID(moment, (*volume)->Number(), names::kRootFolderID);
   }
@@ -105,14 +105,14 @@ std::string LinuxPathOf(const std::string& mountPoint, const std::vector<std::st
 // several mounts, where a name can be that of an item which one of them hides.
 std::optional<HeldFolder> HoldFolderAtOnce(Moment& moment, const Steps& steps) {
   if (steps.volume.empty() || steps.folders.empty()) return std::nullopt;
-  const auto lead = moment.LastVolumes().WithName(steps.volume);
+  const auto lead = moment.LastVolumes()->WithName(steps.volume);
   if (!lead) return std::nullopt;
   const std::string path = LinuxPathOf((*lead)->MountPoint(), steps.folders);
   auto folder =
       path.empty() ? kernel::Result<HeldFolder>(kernel::kNotThere) : moment.HoldFolder(path);
   if (!folder || !catalog::HasOneView(*folder)) return std::nullopt;
   // The table may be another one by now.
-  const auto volume = moment.Volumes().WithName(steps.volume);
+  const auto volume = moment.Volumes()->WithName(steps.volume);
   const bool isIt = volume && (*volume)->IsMountedAs(folder->Item().mount) &&
                     foundation::IsWithin(path, (*volume)->MountPoint()) &&
                     (*volume)->MountPoint() == (*lead)->MountPoint();
@@ -157,7 +157,7 @@ OSErr RecordOfName(Moment& moment, const HeldFolder& folder, std::string_view na
 
 // The record of a name in the parent that every root has, where only the volume's own is.
 OSErr RecordInParentOfRoot(Moment& moment, SInt16 vRefNum, std::string_view name, FSSpec& spec) {
-  const auto volume = moment.Volumes().WithNumber(vRefNum);
+  const auto volume = moment.Volumes()->WithNumber(vRefNum);
   if (!volume) return nsvErr;
   if (name.empty()) return dirNFErr;
   if (name.size() > names::kLongestSpecName) return bdNamErr;

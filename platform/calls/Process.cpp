@@ -3,29 +3,17 @@
 #include <Tallowmere/Process.h>
 
 #include <new>
-#include <thread>
 
 namespace tallowmere::calls {
-namespace {
-
-struct State : Process {
-  std::thread::id owner;  // whose moment is open; no thread's where none is
-};
-
-State& ThisState() {
-  static State& state = *new State;
-  return state;
-}
-
-}  // namespace
 
 Process& ThisProcess() {
-  return ThisState();
+  static Process& process = *new Process;
+  return process;
 }
 
 catalog::Moment* OpenMoment() {
-  State& state = ThisState();
-  return state.owner == std::this_thread::get_id() ? &state.moment : nullptr;
+  Process& process = ThisProcess();
+  return process.momentOwner == std::this_thread::get_id() ? &process.moment : nullptr;
 }
 
 }  // namespace tallowmere::calls
@@ -35,9 +23,9 @@ namespace tallowmere::process {
 // Without memory for the state of the process there is no moment, and each call looks for itself.
 Moment::Moment() noexcept : mIsOutermost(false) {
   try {
-    calls::State& state = calls::ThisState();
-    if (state.owner != std::thread::id()) return;
-    state.owner = std::this_thread::get_id();
+    calls::Process& process = calls::ThisProcess();
+    if (process.momentOwner != std::thread::id()) return;
+    process.momentOwner = std::this_thread::get_id();
     mIsOutermost = true;
   } catch (const std::bad_alloc&) {
     return;
@@ -46,8 +34,8 @@ Moment::Moment() noexcept : mIsOutermost(false) {
 
 void Moment::End() noexcept {
   if (!mIsOutermost) return;
-  calls::ThisState().moment.Restart();
-  calls::ThisState().owner = {};
+  calls::ThisProcess().moment.Restart();
+  calls::ThisProcess().momentOwner = {};
   mIsOutermost = false;
 }
 

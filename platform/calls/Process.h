@@ -4,7 +4,8 @@
 
 #include <CoreServices/CoreServices.h>
 
-#include <exception>
+#include <cstddef>
+#include <thread>
 
 #include "catalog/Catalog.h"
 #include "catalog/Moment.h"
@@ -13,15 +14,16 @@ namespace tallowmere::calls {
 
 // A walk over the volumes by index: it sees one state of the table from index 1 to its end,
 // whatever else is asked meanwhile.
-struct VolumeWalk {
+struct WalkByIndex {
   volumes::VolumesPointer volumes;
   std::size_t next = 0;  // the index, from 0, that goes on with the walk
 };
 
 struct Process {
   catalog::Catalog catalog;
-  VolumeWalk walk;
+  WalkByIndex walk;
   catalog::Moment moment{catalog};  // of a request; restarted with each
+  std::thread::id momentOwner;      // whose moment is open; no thread's where none is
 };
 
 Process& ThisProcess();

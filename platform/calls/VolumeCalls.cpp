@@ -14,7 +14,7 @@ namespace {
 
 // The next volume of the walk, or the first of a new one. Null past the last.
 volumes::ListedVolumePointer VolumeAt(std::size_t index) {
-  VolumeWalk& walk = ThisProcess().walk;
+  WalkByIndex& walk = ThisProcess().walk;
   const bool goesOn = walk.volumes && index > 0 && index == walk.next;
   if (!goesOn) walk.volumes = ThisProcess().catalog.Table().Now();
   walk.next = index + 1;
@@ -26,7 +26,7 @@ volumes::ListedVolumePointer FindVolume(long index, SInt16 number) {
   if (index < 0) return nullptr;
   if (index > 0) return VolumeAt(static_cast<std::size_t>(index - 1));
   return InMoment(
-      [number](catalog::Moment& moment) { return moment.Volumes().WithNumber(number); });
+      [number](catalog::Moment& moment) { return moment.Volumes()->WithNumber(number); });
 }
 
 }  // namespace

@@ -10,7 +10,7 @@
 namespace tallowmere::catalog {
 
 std::string LastPathOf(Moment& moment, const kernel::Item& reference) {
-  const auto listed = moment.LastVolumes().WithMount(reference.mount);
+  const auto listed = moment.LastVolumes()->WithMount(reference.mount);
   const auto volume =
       listed ? listed->Enter() : kernel::Result<volumes::VolumePointer>(kernel::kNoVolume);
   const auto* const place =
@@ -37,19 +37,13 @@ namespace {
 constexpr int kMostPasses = 3;
 
 // The canonical path if this very item is there.
-std::optional<std::string> Verified(const kernel::Item& reference, const std::string& path) {
-  auto item = kernel::IsNormalized(path) ? kernel::HoldWithoutLinks(path)
-                                         : kernel::Result<kernel::Descriptor>(kernel::Error{ELOOP});
-  std::string canonical = path;
-  if (!item) {
-    auto real = kernel::CanonicalPath(path);
-    if (!real) return std::nullopt;
-    canonical = *std::move(real);
-    item = kernel::HoldWithoutLinks(canonical);
-  }
-  const bool isThere = item && IsItemAt(reference, kernel::AtOpen(item->Get()), canonical);
+std::optional<std::string> Verified(Moment& moment, const kernel::Item& reference,
+                                    const std::string& path) {
+  auto held = moment.HoldItem(path);
+  const bool isThere =
+      held && IsItemAt(reference, kernel::AtOpen(held->descriptor.Get()), held->path);
   if (!isThere) return std::nullopt;
-  return canonical;
+  return std::move(held->path);
 }
 
 // Whether the item is the one with the id, now.
@@ -75,12 +69,12 @@ std::optional<Sighting> SeeWithID(Moment& moment, const volumes::Volume& volume,
 // link, is not looked at: that one may not answer.
 std::string NearestFolder(Moment& moment, const volumes::Volume& volume,
                           const std::string& formerPlace) {
-  const auto& volumes = moment.Volumes();
-  const auto former = volumes.OfPath(formerPlace);
+  const auto volumes = moment.Volumes();
+  const auto former = volumes->OfPath(formerPlace);
   const bool isNear =
       former && former->Number() == volume.Number() && kernel::IsNormalized(formerPlace);
   for (std::string path = formerPlace; isNear; path = foundation::FolderOf(path)) {
-    if (volumes.IsReachable(*former, path)) {
+    if (volumes->IsReachable(*former, path)) {
       const auto held = moment.HoldFolder(path);
       if (held && held->Volume()->Number() == volume.Number()) return path;
     }
@@ -136,13 +130,13 @@ std::optional<std::string> SearchFor(Moment& moment, const kernel::Item& referen
   if (!located) return std::nullopt;
   const HandleAnswer answer = AskForReference(*located->volume, reference);
   for (const Sighting& opened : answer.opened) {
-    if (auto found = Verified(reference, opened.path)) return found;
+    if (auto found = Verified(moment, reference, opened.path)) return found;
   }
   if (answer.isComplete && answer.opened.empty()) return std::nullopt;
   const SearchedItem wanted{located->volume->IDOf(reference), &reference,
                             kernel::IsFolder(reference)};
   return FindByPass(moment, located->volume, wanted, former,
-                    [&](const std::string& path) { return Verified(reference, path); });
+                    [&](const std::string& path) { return Verified(moment, reference, path); });
 }
 
 void Remember(Moment& moment, const Sighting& seen) {
@@ -205,7 +199,7 @@ std::optional<Sighting> LocateItem(Moment& moment, const volumes::VolumePointer&
 // it.
 std::optional<HeldFolder> HoldAtRememberedPlace(Moment& moment, volumes::VolumeNumber number,
                                                 std::uint32_t id) {
-  const auto listed = moment.LastVolumes().WithNumber(number);
+  const auto listed = moment.LastVolumes()->WithNumber(number);
   const auto volume =
       listed ? listed->Enter() : kernel::Result<volumes::VolumePointer>(kernel::kNoVolume);
   if (!volume) return std::nullopt;
@@ -222,7 +216,7 @@ std::optional<HeldFolder> HoldAtRememberedPlace(Moment& moment, volumes::VolumeN
 
 kernel::Result<std::string> FindPathOf(Moment& moment, const kernel::Item& reference) {
   const std::string former = LastPathOf(moment, reference);
-  auto path = former.empty() ? std::nullopt : Verified(reference, former);
+  auto path = former.empty() ? std::nullopt : Verified(moment, reference, former);
   if (!path) path = SearchFor(moment, reference, former);
   if (!path) return kernel::kNotThere;
   Remember(moment, {*path, reference});

@@ -62,14 +62,14 @@ void Moment::Poll() {
   mIsTableNew = mIsTableNew || mVolumes != before;
 }
 
-const volumes::Volumes& Moment::Volumes() {
+volumes::VolumesPointer Moment::Volumes() {
   if (!mVolumes) Poll();
-  return *mVolumes;
+  return mVolumes;
 }
 
-const volumes::Volumes& Moment::LastVolumes() {
+volumes::VolumesPointer Moment::LastVolumes() {
   const auto& last = mCatalog.Table().AsLastRead();
-  return last ? *last : Volumes();
+  return last ? last : Volumes();
 }
 
 void Moment::InvalidateVolumes() {
@@ -81,7 +81,7 @@ void Moment::InvalidateVolumes() {
 // once more.
 kernel::Result<volumes::VolumePointer> Moment::VolumeWithNumber(volumes::VolumeNumber number) {
   for (const bool isLast : {false, true}) {
-    const auto listed = Volumes().WithNumber(number);
+    const auto listed = Volumes()->WithNumber(number);
     if (!listed) return kernel::kNoVolume;
     auto entered = listed->Enter();
     if (entered || isLast || entered.Error() != volumes::ListedVolume::kMoved) return entered;
@@ -236,21 +236,28 @@ kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, std::string_view n
   return look;
 }
 
-kernel::Result<Sighting> Moment::See(const std::string& path) {
-  std::string canonical = path;
-  const auto hold = [&] { return kernel::HoldWithoutLinks(canonical); };
+kernel::Result<Moment::HeldItem> Moment::HoldItem(const std::string& path) {
+  HeldItem held{path, {}};
+  const auto hold = [&] { return kernel::HoldWithoutLinks(held.path); };
   auto item = kernel::IsNormalized(path) ? Open(hold)
                                          : kernel::Result<kernel::Descriptor>(kernel::Error{ELOOP});
   if (!item) {
-    auto real = kernel::CanonicalPath(path);
-    if (!real) return real.Error();
-    canonical = *std::move(real);
+    auto canonical = kernel::CanonicalPath(path);
+    if (!canonical) return canonical.Error();
+    held.path = *std::move(canonical);
     item = Open(hold);
   }
   if (!item) return item.Error();
-  const auto status = kernel::ReadStatus(kernel::AtOpen(item->Get()));
+  held.descriptor = *std::move(item);
+  return kernel::Result<HeldItem>(std::move(held));
+}
+
+kernel::Result<Sighting> Moment::See(const std::string& path) {
+  auto held = HoldItem(path);
+  if (!held) return held.Error();
+  const auto status = kernel::ReadStatus(kernel::AtOpen(held->descriptor.Get()));
   if (!status) return status.Error();
-  return Sighting{std::move(canonical), status->item};
+  return Sighting{std::move(held->path), status->item};
 }
 
 const Look* Moment::LookFor(const kernel::Item& reference) const {

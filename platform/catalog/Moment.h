@@ -17,8 +17,9 @@
 // another: nothing is carried over.
 #pragma once
 
-#include <array>
 #include <cstddef>
+#include <cstdint>
+#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -77,11 +78,12 @@ class Moment {
 
   // --- Volumes --------------------------------------------------------------------------------
 
-  // The volumes as they were at some time in this moment.
-  const volumes::Volumes& Volumes();
+  // The volumes as they were at some time in this moment, never null. A later question may have
+  // others.
+  volumes::VolumesPointer Volumes();
 
   // The volumes as last read, a lead: what they say is verified by a folder held on them.
-  const volumes::Volumes& LastVolumes();
+  volumes::VolumesPointer LastVolumes();
 
   // The volume with a number, its root folder seen. 0 is the volume of "/". kNoVolume when none has
   // the number; the kernel's error where the root folder cannot be seen.
@@ -122,6 +124,14 @@ class Moment {
   // The item with a name in a held folder, its handle read where its id follows from it.
   // ENAMETOOLONG where no path could tell where it is.
   kernel::Result<Look> LookUp(const HeldFolder& folder, std::string_view name);
+
+  // Holds the item at a path, links on the way followed, at its canonical path; for as long as the
+  // caller keeps it.
+  struct HeldItem {
+    std::string path;
+    kernel::Descriptor descriptor;
+  };
+  kernel::Result<HeldItem> HoldItem(const std::string& path);
 
   // The item at a path, links on the way followed, at its canonical path.
   kernel::Result<Sighting> See(const std::string& path);

@@ -28,7 +28,7 @@ std::string NameOf(const Sighting& item) {
 bool EntriesMayDiffer(Moment& moment, const HeldFolder& folder) {
   if (!folder.Volume()->Kind().entriesTellNumbers) return true;
   const auto seen = moment.See(folder.Path());
-  return !seen || moment.Volumes().HoldsMountPoint(seen->path);
+  return !seen || moment.Volumes()->HoldsMountPoint(seen->path);
 }
 
 }  // namespace

@@ -16,9 +16,9 @@ std::string CanonicalPathOf(Moment& moment, const HeldFolder& folder) {
 }
 
 bool HidesSomething(Moment& moment, const std::vector<std::string>& paths) {
-  const auto& volumes = moment.Volumes();
+  const auto volumes = moment.Volumes();
   return std::any_of(paths.begin(), paths.end(),
-                     [&](const std::string& path) { return volumes.HoldsMountPoint(path); });
+                     [&](const std::string& path) { return volumes->HoldsMountPoint(path); });
 }
 
 }  // namespace

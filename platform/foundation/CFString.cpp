@@ -158,11 +158,7 @@ CFStringRef CFStringCreateWithFormat(CFAllocatorRef, CFDictionaryRef, CFStringRe
 }
 
 CFStringRef CFStringCreateCopy(CFAllocatorRef, CFStringRef string) {
-  return OrZero([&]() -> CFStringRef {
-    const String& original = StringOf(string);
-    if (original.IsMutable()) return CreateString(original.Text());
-    return static_cast<CFStringRef>(CFRetain(string));
-  });
+  return OrZero([&] { return CreateReference(CopyOf(StringOf(string))); });
 }
 
 CFStringRef CFStringCreateWithSubstring(CFAllocatorRef, CFStringRef string, CFRange range) {

@@ -29,6 +29,10 @@ CFStringRef ReferenceTo(const String* string) noexcept {
   return reinterpret_cast<CFStringRef>(object);
 }
 
+CFStringRef CreateReference(OwnedString string) noexcept {
+  return ReferenceTo(string.release());
+}
+
 OwnedString CopyOf(const String& string) {
   if (string.IsMutable()) return OwnedString(new String(string.Text(), false));
   string.Retain();

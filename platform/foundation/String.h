@@ -41,6 +41,9 @@ CFMutableStringRef CreateMutableString(std::u16string text);
 // A string as the caller knows it.
 CFStringRef ReferenceTo(const String* string) noexcept;
 
+// The reference to a string given away, which the caller owns.
+CFStringRef CreateReference(OwnedString string) noexcept;
+
 // A string with the text that this one has now: another reference to it unless it can change.
 // Throws std::bad_alloc.
 OwnedString CopyOf(const String& string);
