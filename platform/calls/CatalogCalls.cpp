@@ -28,8 +28,7 @@ namespace {
 
 constexpr std::size_t kLongestUnicodeName = 255;
 
-// An item seen now: in the folder that holds it, or alone, as "/" is and what is in a folder on no
-// volume.
+// An item seen now: in its parent, or on its own if it is "/" or its parent is on no volume.
 class Subject {
  public:
   explicit Subject(catalog::Look look) : mLook(std::move(look)) {}
@@ -43,7 +42,7 @@ class Subject {
   catalog::Sighting mAlone{};
 };
 
-// What was asked of an item, where one is told.
+// The answers that the caller asked for.
 struct Description {
   FSCatalogInfoBitmap whichInfo;
   FSCatalogInfo* info;
@@ -56,7 +55,7 @@ struct Description {
   }
 };
 
-// An item of another volume than its folder's is looked at once more where its id takes the handle.
+// Reads an item of another volume than its folder's once more if its id depends on its handle.
 UInt32 IDOnVolume(const volumes::Volume& volume, const catalog::Sighting& seen) {
   if (!volume.NeedsHandleForID(seen.item)) return catalog::IDOf(volume, seen);
   catalog::Sighting proved = seen;
@@ -64,9 +63,8 @@ UInt32 IDOnVolume(const volumes::Volume& volume, const catalog::Sighting& seen) 
   return catalog::IDOf(volume, proved);
 }
 
-// The volume and the id of an item. A file that is mounted alone, and the folder at which a kernel
-// interface is mounted, are on no volume: they count to that of their folder, with an id that leads
-// nowhere.
+// The volume and the id of an item. A file mounted by itself, and the mount point of a kernel
+// interface, are on no volume: they get their folder's volume and an id that leads nowhere.
 OSErr FillInfo(catalog::Moment& moment, const Subject& item, FSCatalogInfo& info) {
   const auto volume = moment.VolumeOf(item.Seen());
   if (volume) {
@@ -128,7 +126,7 @@ OSErr Describe(catalog::Moment& moment, const Subject& item, const Description& 
   return error;
 }
 
-// The item of a reference at a path, links on the way followed.
+// A reference's item at a path, following links on the way.
 kernel::Result<Subject> SeeAt(catalog::Moment& moment, const kernel::Item& reference,
                               const std::string& path) {
   const auto look = catalog::LookAgain(moment, reference, path);
@@ -143,7 +141,7 @@ kernel::Result<Subject> SeeAt(catalog::Moment& moment, const kernel::Item& refer
   return Subject(*seen);
 }
 
-// What this moment knows of the item already.
+// The item as this moment has seen it already.
 std::optional<Subject> Known(const catalog::Moment& moment, const kernel::Item& reference,
                              const Description& wanted) {
   if (const catalog::Look* const look = moment.LookFor(reference)) {
@@ -157,13 +155,13 @@ std::optional<Subject> Known(const catalog::Moment& moment, const kernel::Item& 
 kernel::Result<Subject> FindSubject(catalog::Moment& moment, const kernel::Item& reference,
                                     const Description& wanted) {
   if (auto known = Known(moment, reference, wanted)) return *std::move(known);
-  // Where the kernel does not tell the mount, only the canonical path tells the volume.
+  // If the kernel does not report the mount, only the canonical path gives the volume.
   const std::string last = catalog::LastPathOf(moment, reference);
   if (reference.mount != kernel::kNoMount && kernel::IsNormalized(last)) {
     auto subject = SeeAt(moment, reference, last);
     if (subject) return subject;
   }
-  // It has moved; or a link of /proc led to it, and only other paths tell where it is.
+  // It has moved, or its path led through a link of /proc, and another path has to be found.
   const auto path = catalog::FindPathOf(moment, reference);
   if (!path) return path.Error();
   return SeeAt(moment, reference, *path);
@@ -189,7 +187,7 @@ OSErr MakeReference(catalog::Moment& moment, const FSSpec& spec, FSRef& referenc
   return noErr;
 }
 
-// The Linux name that a UTF-16 name stands for; empty when no item can be called so.
+// The Linux name for a UTF-16 name; empty when no item can have it.
 std::string LinuxNameOf(UniCharCount length, const UniChar* name) {
   if (length > kLongestUnicodeName) return {};
   const auto bytes = text::FileNameOfText(

@@ -27,12 +27,12 @@ namespace {
 
 constexpr char kSeparator = ':';
 
-// A path as steps from a folder to the folders on its way: each a name, or empty for a climb to the
-// folder above.
+// An HFS path, parsed: the steps from its first folder, each the name of a folder, or empty for the
+// parent.
 struct Steps {
-  std::string_view volume;  // of a full path, else empty
+  std::string_view volume;  // of a full path, otherwise empty
   std::vector<std::string_view> folders;
-  std::string_view item;  // empty when the path ends in a folder, with a colon behind its name
+  std::string_view item;  // empty when the path ends in a colon
 };
 
 Steps ReadPath(std::string_view path) {
@@ -71,7 +71,7 @@ kernel::Result<HeldFolder> StartingFolder(Moment& moment, SInt16 vRefNum, SInt32
 
 kernel::Result<HeldFolder> StepUp(Moment& moment, const HeldFolder& folder) {
   if (folder.IsRoot()) return kernel::kNoFolder;
-  auto above = moment.HoldHolderOf(folder.Path());
+  auto above = moment.HoldParentOf(folder.Path());
   if (!above) return above;
   const auto look = moment.LookUp(*above, std::string(*foundation::LastComponent(folder.Path())));
   const bool isStillThere =
@@ -80,7 +80,7 @@ kernel::Result<HeldFolder> StepUp(Moment& moment, const HeldFolder& folder) {
   return above;
 }
 
-// Into the folder with a name, a link to it followed, or with an empty name to the folder above.
+// Enters the folder with a name, following a link, or for an empty name the parent.
 kernel::Result<HeldFolder> Step(Moment& moment, const HeldFolder& folder, std::string_view name) {
   if (name.empty()) return StepUp(moment, folder);
   const auto item = catalog::LookUpHFSName(moment, folder, name);
@@ -88,8 +88,7 @@ kernel::Result<HeldFolder> Step(Moment& moment, const HeldFolder& folder, std::s
   return kernel::IsLink(item->Item()) ? moment.HoldTargetOf(*item) : moment.HoldFolderOf(*item);
 }
 
-// The path to the folder of steps from a volume's root, when each has its name in Linux; else
-// empty.
+// The path of the steps below a volume's root if each has the same name in Linux; otherwise empty.
 std::string LinuxPathOf(const std::string& mountPoint, const std::vector<std::string_view>& names) {
   std::string path = mountPoint;
   for (const std::string_view name : names) {
@@ -100,9 +99,9 @@ std::string LinuxPathOf(const std::string& mountPoint, const std::vector<std::st
   return path;
 }
 
-// The folder that steps from a volume's root lead to, when one walk tells it: what has their names
-// in Linux is on the very mount of the root, without a link on the way. Not on a volume with
-// several mounts, where a name can be that of an item which one of them hides.
+// The folder at the end of the steps from a volume's root, found by one walk of the kernel:
+// possible if every folder has the same name in Linux, on the root's mount, without links. Not on a
+// volume with several mounts, where a name can be that of an item that one of them hides.
 std::optional<HeldFolder> HoldFolderAtOnce(Moment& moment, const Steps& steps) {
   if (steps.volume.empty() || steps.folders.empty()) return std::nullopt;
   const auto lead = moment.LastVolumes()->WithName(steps.volume);
@@ -111,7 +110,7 @@ std::optional<HeldFolder> HoldFolderAtOnce(Moment& moment, const Steps& steps) {
   auto folder =
       path.empty() ? kernel::Result<HeldFolder>(kernel::kNotThere) : moment.HoldFolder(path);
   if (!folder || !catalog::HasOneView(*folder)) return std::nullopt;
-  // The table may be another one by now.
+  // The mount table may have changed by now.
   const auto volume = moment.Volumes()->WithName(steps.volume);
   const bool isIt = volume && (*volume)->IsMountedAs(folder->Item().mount) &&
                     foundation::IsWithin(path, (*volume)->MountPoint()) &&
@@ -155,7 +154,7 @@ OSErr RecordOfName(Moment& moment, const HeldFolder& folder, std::string_view na
   return fnfErr;
 }
 
-// The record of a name in the parent that every root has, where only the volume's own is.
+// The record of a name in kParentOfRootID, which holds the volume's root folder only.
 OSErr RecordInParentOfRoot(Moment& moment, SInt16 vRefNum, std::string_view name, FSSpec& spec) {
   const auto volume = moment.Volumes()->WithNumber(vRefNum);
   if (!volume) return nsvErr;

@@ -20,7 +20,7 @@ catalog::Moment* OpenMoment() {
 
 namespace tallowmere::process {
 
-// Without memory for the state of the process there is no moment, and each call looks for itself.
+// Without memory for the process's state no moment opens, and each call looks for itself.
 Moment::Moment() noexcept : mIsOutermost(false) {
   try {
     calls::Process& process = calls::ThisProcess();

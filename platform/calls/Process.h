@@ -1,5 +1,5 @@
-// The state of a process: what it knows, and the moment that is open. It is never destroyed, so
-// that calls from static destructors and exit handlers find it whole.
+// The platform's state in this process: the catalog and the open moment. It is never destroyed, so
+// that calls from static destructors and exit handlers still work.
 #pragma once
 
 #include <CoreServices/CoreServices.h>
@@ -12,26 +12,26 @@
 
 namespace tallowmere::calls {
 
-// A walk over the volumes by index: it sees one state of the table from index 1 to its end,
-// whatever else is asked meanwhile.
+// A walk over the volumes by index. It sees one state of the mount table from index 1 to its end,
+// whatever else is called meanwhile.
 struct WalkByIndex {
   volumes::VolumesPointer volumes;
-  std::size_t next = 0;  // the index, from 0, that goes on with the walk
+  std::size_t next = 0;  // the index, from 0, that continues the walk
 };
 
 struct Process {
   catalog::Catalog catalog;
   WalkByIndex walk;
-  catalog::Moment moment{catalog};  // of a request; restarted with each
-  std::thread::id momentOwner;      // whose moment is open; no thread's where none is
+  catalog::Moment moment{catalog};  // of the current request
+  std::thread::id momentOwner;      // whose moment is open; no thread's if none is
 };
 
 Process& ThisProcess();
 
-// The moment that this thread has open; null when it has none.
+// This thread's open moment, or null.
 catalog::Moment* OpenMoment();
 
-// What `body` answers in the open moment, or in one of its own.
+// Calls `body` with this thread's open moment, or with one of its own.
 template <class Body>
 auto InMoment(Body&& body) {
   if (catalog::Moment* const open = OpenMoment()) return body(*open);

@@ -19,19 +19,19 @@ using namespace tallowmere::calls;
 
 namespace {
 
-// A link is on the way, or the folder is on no volume: the path has to be looked at by itself.
+// There is a link on the way, or the folder is on no volume: the path has to be examined by itself.
 constexpr kernel::Error kOtherWay{ENOTDIR};
 
-// Looks at the item so that what is seen serves the rest of the moment: holds the folder that is
-// meant, or the one that holds the item. ENOENT when it is missing; kOtherWay or another error
-// where that is not certain.
+// Examines the item in a way that serves the rest of the moment: holds it if it is a folder,
+// otherwise its parent. Returns ENOENT when it is missing, and kOtherWay or another error when that
+// is uncertain.
 kernel::Result<FSRef> ReferenceInMoment(catalog::Moment& moment, const std::string& path,
                                         bool isFolderMeant) {
   catalog::Catalog& known = moment.Knowledge();
-  if (isFolderMeant && known.WasFolderMeantRightly()) {
+  if (isFolderMeant && known.WasFolderMarkRight()) {
     const auto folder = moment.HoldFolder(path);
     if (folder) return ReferenceTo(moment, *folder);
-    known.NoteFolderMeant(folder.Error() != kernel::Error{ENOTDIR});
+    known.NoteFolderMark(folder.Error() != kernel::Error{ENOTDIR});
   }
   if (path == "/" || !kernel::IsNormalized(path)) return kOtherWay;
   const auto holder = moment.HoldFolder(foundation::FolderOf(path));
@@ -39,13 +39,13 @@ kernel::Result<FSRef> ReferenceInMoment(catalog::Moment& moment, const std::stri
   const auto look = moment.LookUp(*holder, std::string(*foundation::LastComponent(path)));
   if (!look) return look.Error();
   if (!isFolderMeant || !kernel::IsFolder(look->Item())) return ReferenceTo(moment, *look);
-  // It serves the rest of the moment.
-  known.NoteFolderMeant(true);
+  // The look serves the rest of the moment.
+  known.NoteFolderMark(true);
   const auto folder = moment.HoldFolderOf(*look);
   return folder ? ReferenceTo(moment, *folder) : ReferenceTo(moment, *look);
 }
 
-// The path is without "/" at its end, so a link in the last place is read itself.
+// The path has no trailing "/", so a link at its end is not followed.
 std::optional<FSRef> ReferenceAt(const std::string& path, bool isFolderMeant) {
   if (catalog::Moment* const moment = OpenMoment()) {
     const auto reference = ReferenceInMoment(*moment, path, isFolderMeant);
@@ -59,7 +59,7 @@ std::optional<FSRef> ReferenceAt(const std::string& path, bool isFolderMeant) {
   });
 }
 
-// The path by which this moment has seen the item, if it still leads to it.
+// The path by which this moment saw the item, if it still leads there.
 std::optional<std::string> PathSeen(const catalog::Moment& moment, const kernel::Item& reference) {
   const catalog::Look* const look = moment.LookFor(reference);
   const catalog::HeldFolder* const held = look == nullptr ? moment.HeldFor(reference) : nullptr;
@@ -102,5 +102,5 @@ OSErr FSCompareFSRefs(const FSRef* first, const FSRef* second) {
   const auto firstItem = Unpack(first);
   const auto secondItem = Unpack(second);
   if (!firstItem || !secondItem) return errFSBadFSRef;
-  return catalog::AreToSameItem(*firstItem, *secondItem) ? noErr : errFSRefsDifferent;
+  return catalog::ReferToSameItem(*firstItem, *secondItem) ? noErr : errFSRefsDifferent;
 }

@@ -30,7 +30,7 @@ FSRef ReferenceTo(catalog::Moment& moment, const catalog::Look& look) {
 
 FSRef ReferenceTo(catalog::Moment& moment, const catalog::HeldFolder& folder) {
   const kernel::Item reference = moment.Prove(folder);
-  // What is proved by its place is remembered by it, not by its numbers as it was held.
+  // An item proved by its place is remembered by place, not by number.
   if (catalog::IsProvedByPlace(reference)) {
     moment.Knowledge().Remember(reference, folder.Path(), folder.Volume().get());
   }
@@ -43,7 +43,7 @@ FSRef ReferenceTo(catalog::Moment& moment, const catalog::Sighting& seen) {
   kernel::Item reference = seen.item;
   if (!volume) {
     kernel::ReadProof(reference, spot);
-  } else if ((*volume)->NumbersTellItemsApart()) {
+  } else if ((*volume)->NumbersIdentifyItems()) {
     reference = catalog::Proved(seen, **volume, spot);
   } else if (const auto canonical = moment.See(seen.path)) {
     reference = catalog::Proved(*canonical, **volume, spot);

@@ -1,4 +1,4 @@
-// The host's result codes for what failed below: the one place where errors become codes.
+// The host's result codes for the platform's errors: the one place where errors become codes.
 #pragma once
 
 #include <CoreServices/CoreServices.h>
@@ -16,7 +16,7 @@ namespace tallowmere::calls {
 //   any other                                   ioErr
 OSErr ResultCodeOf(kernel::Error error);
 
-// The code for a folder on the way: one that is missing is a missing folder.
+// The code for a folder on the way: if nothing is there, dirNFErr.
 OSErr ResultCodeOfFolder(kernel::Error error);
 
 }  // namespace tallowmere::calls

@@ -12,7 +12,7 @@ using namespace tallowmere::calls;
 
 namespace {
 
-// The next volume of the walk, or the first of a new one. Null past the last.
+// Returns the next volume of the walk, or the first of a new walk. Null past the last.
 volumes::ListedVolumePointer VolumeAt(std::size_t index) {
   WalkByIndex& walk = ThisProcess().walk;
   const bool goesOn = walk.volumes && index > 0 && index == walk.next;

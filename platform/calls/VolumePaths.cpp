@@ -10,7 +10,7 @@ std::optional<std::string> MountPointOfVolume(std::u16string_view name) {
   if (!bytes) return std::nullopt;
   const auto& volumes = calls::ThisProcess().catalog.Table().Now();
   const auto volume = volumes->WithName(*bytes);
-  // Names are compared as text: one that only encodes like a volume's name is not it.
+  // Compares text: a name that merely has the same bytes in HFS form is not the volume's.
   if (!volume || text::DecodeMacRoman(*bytes) != name) return std::nullopt;
   return (*volume)->MountPoint();
 }

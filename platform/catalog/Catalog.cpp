@@ -5,23 +5,24 @@
 namespace tallowmere::catalog {
 namespace {
 
-// Some five thousand places with paths of usual length, in bytes.
+// In bytes: some five thousand places with paths of usual length.
 constexpr std::size_t kPlacesLimit = 1 << 20;
 
-// Spaces of device numbers, which have fewer bits, for what has no node id of its own.
+// Mark the spaces of items without a node id, on top of their device number, which has fewer bits.
 constexpr std::uint64_t kByInode = std::uint64_t{1} << 63;
 constexpr std::uint64_t kByPlace = std::uint64_t{1} << 62;
 
-// On a volume an item is remembered by its node id, so that its record finds it too.
+// On a volume, items are remembered by node id, so that records find them too.
 PlaceKey KeyOf(const kernel::Item& item, const volumes::Volume* volume) {
   if (IsProvedByPlace(item)) return {kByPlace | item.device, PlaceDigest(item)};
   const bool hasID =
-      volume != nullptr && volume->NumbersTellItemsApart() && !volume->NeedsHandleForID(item);
+      volume != nullptr && volume->NumbersIdentifyItems() && !volume->NeedsHandleForID(item);
   if (!hasID) return {kByInode | item.device, item.inode};
   return {volume->Root().device, volume->IDOf(item)};
 }
 
-// What was learned hangs on the places where the volume was mounted, and on what was hidden.
+// Whether an index made for one listing of a volume fits another: it depends on where the volume is
+// mounted and on what is hidden.
 bool IsSeenAlike(const volumes::ListedVolume& first, const volumes::ListedVolume& second) {
   return first.MountPoints() == second.MountPoints() && first.Covers() == second.Covers();
 }
@@ -46,7 +47,7 @@ const PlaceMemory::Place* Catalog::LastPlaceOf(const kernel::Item& item,
 }
 
 const PlaceMemory::Place* Catalog::LastPlaceOf(std::uint32_t id, const volumes::Volume& volume) {
-  return volume.NumbersTellItemsApart() ? mPlaces.Recall({volume.Root().device, id}) : nullptr;
+  return volume.NumbersIdentifyItems() ? mPlaces.Recall({volume.Root().device, id}) : nullptr;
 }
 
 std::optional<std::string> Catalog::SearchVolume(const volumes::VolumePointer& volume,
@@ -55,7 +56,7 @@ std::optional<std::string> Catalog::SearchVolume(const volumes::VolumePointer& v
   return IndexOf(volume).Find(item, start, *mTable.AsLastRead());
 }
 
-// Indexes of volumes that are gone go with the next new one.
+// Creating an index drops those of volumes that are gone.
 FolderIndex& Catalog::IndexOf(const volumes::VolumePointer& volume) {
   for (FolderIndex& index : mIndexes) {
     const volumes::Volume& known = *index.OfVolume();

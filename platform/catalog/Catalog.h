@@ -1,6 +1,6 @@
-// What a process knows of its volumes from one question to the next: the table of mounts, where
-// items were seen, and what passes over volumes have learned. All of it is verified before it
-// counts, so that it can be lost at any time.
+// What a process remembers between questions: the mount table, where items were last seen, and what
+// passes over volumes have learned. All of it is verified before use, so any of it may be dropped
+// at any time.
 //
 // One thread. Everything may throw std::bad_alloc.
 #pragma once
@@ -29,21 +29,21 @@ class Catalog {
   // Remembers which folder held an item at its place.
   void RememberParent(const Sighting& seen, const volumes::Volume& volume, std::uint32_t parent);
 
-  // Leads: where an item was last seen, null when that is not remembered. Valid until the next
+  // Leads: where an item was last seen, or null when that is not remembered. Valid until the next
   // Remember.
   const PlaceMemory::Place* LastPlaceOf(const kernel::Item& item, const volumes::Volume* volume);
   const PlaceMemory::Place* LastPlaceOf(std::uint32_t id, const volumes::Volume& volume);
 
-  // Where anything was last seen; empty when nothing is remembered.
+  // The path most recently remembered or recalled; empty when nothing is remembered.
   std::string_view LatestPlace() const { return mPlaces.Latest(); }
 
-  // A lead: whether what was last meant to be a folder was one. Most programs ask about many files
-  // or about many folders.
-  bool WasFolderMeantRightly() const { return mWasFolderMeantRightly; }
-  void NoteFolderMeant(bool rightly) { mWasFolderMeantRightly = rightly; }
+  // A lead: whether the last path with a folder mark was indeed a folder's. Programs tend to ask
+  // about many files in a row, or about many folders.
+  bool WasFolderMarkRight() const { return mWasFolderMarkRight; }
+  void NoteFolderMark(bool isRight) { mWasFolderMarkRight = isRight; }
 
-  // A lead from a pass over a volume: the folder, or the item, with an id, or one very item.
-  // Folders near `start` are read first.
+  // Searches a volume for the item that `item` describes and returns its path as a lead. Reads
+  // folders near `start` first.
   std::optional<std::string> SearchVolume(const volumes::VolumePointer& volume,
                                           const SearchedItem& item, const std::string& start);
 
@@ -53,7 +53,7 @@ class Catalog {
   volumes::VolumeTable mTable;
   PlaceMemory mPlaces;
   std::vector<FolderIndex> mIndexes;  // by volume
-  bool mWasFolderMeantRightly = true;
+  bool mWasFolderMarkRight = true;
 };
 
 }  // namespace tallowmere::catalog

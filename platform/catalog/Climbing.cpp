@@ -14,42 +14,41 @@
 namespace tallowmere::catalog {
 namespace {
 
-// Whether the path by which a folder was held tells the names of all folders above it up to the
-// volume's root: the walk stayed on the mount of the root, which the table places above it.
+// Whether a held folder's path gives the names of all folders above it: the walk along it stayed on
+// the mount of the volume's root.
 bool PathTellsNames(const Moment& moment, const HeldFolder& folder) {
   const volumes::Volume& volume = *folder.Volume();
   return moment.IsTableAsBefore() && !folder.IsRoot() && HasOneView(folder) &&
-         volume.NumbersTellItemsApart() && folder.Item().mount == volume.Root().mount &&
+         volume.NumbersIdentifyItems() && folder.Item().mount == volume.Root().mount &&
          foundation::IsWithin(folder.Path(), volume.MountPoint());
 }
 
-// The path of the folder that holds the one at a path.
-std::string_view HolderOf(std::string_view path) {
+// The path without its last component.
+std::string_view ParentOf(std::string_view path) {
   return path.substr(0, std::max<std::size_t>(path.rfind('/'), 1));
 }
 
-// The remembered id of the folder that holds the one at a path; none when it is not remembered, or
-// from another place. That the root holds it is remembered as well: the mount point can have been
-// renamed.
+// The remembered id of a folder's parent. Nullopt when it is not remembered, or for another path.
+// The root must be remembered as a parent too, since the mount point can have been renamed.
 std::optional<std::uint32_t> RememberedParent(Moment& moment, const volumes::Volume& volume,
                                               std::string_view path, std::uint32_t id) {
   const auto* const place = moment.Knowledge().LastPlaceOf(id, volume);
-  const bool isInRoot = HolderOf(path) == volume.MountPoint();
+  const bool isInRoot = ParentOf(path) == volume.MountPoint();
   const bool isKnown = place != nullptr && place->path == path && place->parent != 0 &&
                        (place->parent == names::kRootFolderID) == isInRoot;
   return isKnown ? std::optional(place->parent) : std::nullopt;
 }
 
-// What the path of a held folder tells of it and of every folder above it, the root's own last
-// child first; nothing unless all of it is told. A remembered parent can be another folder by now:
-// whoever looked for one by its id, half-way up, would leave the path.
+// The steps of a climb from a held folder, the one below the root first, or nothing unless all are
+// known. All or nothing, because a remembered parent can be another folder by now: looking that one
+// up by its id, half-way, would leave the path.
 std::vector<ClimbedFolder> StepsAlongPath(Moment& moment, const HeldFolder& folder) {
   if (!PathTellsNames(moment, folder)) return {};
   const volumes::Volume& volume = *folder.Volume();
   std::vector<ClimbedFolder> steps;
   std::uint32_t id = folder.ID();
   std::string_view path = folder.Path();
-  for (; id != names::kRootFolderID; path = HolderOf(path)) {
+  for (; id != names::kRootFolderID; path = ParentOf(path)) {
     auto name =
         names::UnmistakableHFSName(path.substr(path.rfind('/') + 1), names::kLongestStr255Name);
     const auto parent = name ? RememberedParent(moment, volume, path, id) : std::nullopt;
@@ -61,7 +60,7 @@ std::vector<ClimbedFolder> StepsAlongPath(Moment& moment, const HeldFolder& fold
   return steps;
 }
 
-// The next step; the climb ends with the last. REQUIRES: something is left.
+// Takes the next step; the climb ends with the last. REQUIRES: a step is left.
 ClimbedFolder TakeStep(std::optional<Moment::Climb>& climb) {
   ClimbedFolder step = std::move(climb->along.back());
   climb->along.pop_back();
@@ -70,7 +69,7 @@ ClimbedFolder TakeStep(std::optional<Moment::Climb>& climb) {
   return step;
 }
 
-// A folder and the folder that holds it.
+// A folder, and the look at it in its parent.
 struct Step {
   HeldFolder folder;
   Look look;
@@ -82,8 +81,8 @@ kernel::Result<Step> LookInHolder(Moment& moment, const HeldFolder& folder) {
   return Step{folder, *look};
 }
 
-// Of the places of a folder one where its own volume holds it, if there is one: a part of a volume
-// can be mounted by itself.
+// Prefers a place of the folder where its parent is on the same volume, if there is one: a part of
+// a volume can be mounted by itself.
 Step PreferItsVolume(Moment& moment, Step step) {
   const volumes::Volume& volume = *step.folder.Volume();
   if (step.look.Folder().Volume()->Number() == volume.Number()) return step;

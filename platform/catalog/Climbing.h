@@ -9,15 +9,15 @@
 
 namespace tallowmere::catalog {
 
-// Name and parent of the folder with an id on the volume with a number. kNoVolume; kNoFolder when
-// no folder has the id.
+// The name and parent of the folder with an id. Returns kNoVolume when no volume has the number,
+// and kNoFolder when no folder has the id.
 //
-// The names of a climb within one moment are those of one walk of the kernel: the one that led to
-// the folder where it began, along its path. That holds for a folder on the mount of the volume's
-// place, as long as every name up to the root is plain and the ids of all parents are remembered;
-// those are not verified, and serve to ask for the next folder of this climb alone. Where one of
-// them is missing, the folder is found by its id and looked up in the folder that holds it. Where
-// the folder that holds it is on another volume, the climb ends.
+// Within one moment, a climb takes its names from a single walk of the kernel: the walk along the
+// path to the folder where the climb began. This requires that the folder is on the mount of the
+// volume's place, that every name up to the root is plain, and that the ids of all parents are
+// remembered. Remembered ids are not verified; they only identify the next step of this climb. If
+// an id is missing, the folder is found by its own id and looked up in its parent. The climb ends
+// where the parent is on another volume.
 kernel::Result<ClimbedFolder> ClimbFrom(Moment& moment, volumes::VolumeNumber number,
                                         std::uint32_t id);
 

@@ -20,7 +20,7 @@ std::string LastPathOf(Moment& moment, const kernel::Item& reference) {
 
 kernel::Result<Look> LookAgain(Moment& moment, const kernel::Item& reference,
                                const std::string& path) {
-  const auto holder = moment.HoldHolderOf(path);
+  const auto holder = moment.HoldParentOf(path);
   if (!holder) return holder.Error();
   const std::string name(*foundation::LastComponent(path));
   auto look = moment.LookUp(*holder, name);
@@ -33,10 +33,10 @@ kernel::Result<Look> LookAgain(Moment& moment, const kernel::Item& reference,
 
 namespace {
 
-// How often what a pass has found may be gone, or elsewhere, when it is looked at again.
+// How many passes to make when the item that a pass found has moved before it was verified.
 constexpr int kMostPasses = 3;
 
-// The canonical path if this very item is there.
+// The canonical path of a reference's item, if it is at `path`.
 std::optional<std::string> Verified(Moment& moment, const kernel::Item& reference,
                                     const std::string& path) {
   auto held = moment.HoldItem(path);
@@ -46,7 +46,7 @@ std::optional<std::string> Verified(Moment& moment, const kernel::Item& referenc
   return std::move(held->path);
 }
 
-// Whether the item is the one with the id, now.
+// Whether an item has the id now.
 bool HasID(Moment& moment, const volumes::Volume& volume, std::uint32_t id, bool foldersOnly,
            Sighting& seen) {
   if (foldersOnly && !kernel::IsFolder(seen.item)) return false;
@@ -56,7 +56,7 @@ bool HasID(Moment& moment, const volumes::Volume& volume, std::uint32_t id, bool
   return volume.IDOf(seen.item) == id && moment.IsOnVolume(volume, seen);
 }
 
-// The item at a path if it is the one with the id.
+// The item at a path, if it has the id.
 std::optional<Sighting> SeeWithID(Moment& moment, const volumes::Volume& volume, std::uint32_t id,
                                   bool foldersOnly, const std::string& path) {
   auto seen = moment.See(path);
@@ -64,9 +64,9 @@ std::optional<Sighting> SeeWithID(Moment& moment, const volumes::Volume& volume,
   return *std::move(seen);
 }
 
-// The nearest folder to a former place, that place among them, that is still there and on the
-// volume; else the volume's root folder. What is on another volume, by the spelling or behind a
-// link, is not looked at: that one may not answer.
+// The innermost folder of a former place, that place included, that still exists on the volume;
+// otherwise the volume's root folder. Never looks at other volumes, by spelling or through links:
+// their servers may not answer.
 std::string NearestFolder(Moment& moment, const volumes::Volume& volume,
                           const std::string& formerPlace) {
   const auto volumes = moment.Volumes();
@@ -83,8 +83,8 @@ std::string NearestFolder(Moment& moment, const volumes::Volume& volume,
   return volume.MountPoint();
 }
 
-// What `check` makes of the path to an item that a pass finds; none when it finds none. The folders
-// near a former place, of this item or another, are read first. A new moment begins with each pass.
+// Makes passes until `check` accepts the path that one finds, and returns its result. Reads folders
+// near `near` first. Each pass restarts the moment.
 template <class Check>
 auto FindByPass(Moment& moment, const volumes::VolumePointer& volume, const SearchedItem& item,
                 const std::string& near, const Check& check) -> decltype(check(near)) {
@@ -98,14 +98,14 @@ auto FindByPass(Moment& moment, const volumes::VolumePointer& volume, const Sear
   return std::nullopt;
 }
 
-// A volume and its root folder, where they are now.
+// A volume and its root folder, at their present place.
 struct LocatedVolume {
   volumes::VolumePointer volume;
   Sighting root;
 };
 
-// The kernel does not signal that a folder above a mount point was renamed, which can have left a
-// link.
+// Reads the table once more if needed: the kernel does not signal that a folder above a mount point
+// was renamed, perhaps leaving a link.
 std::optional<LocatedVolume> LocateRoot(Moment& moment, volumes::VolumeNumber number) {
   for (const bool isLast : {false, true}) {
     const auto volume = moment.VolumeWithNumber(number);
@@ -122,7 +122,7 @@ std::optional<LocatedVolume> LocateRoot(Moment& moment, volumes::VolumeNumber nu
   return std::nullopt;
 }
 
-// Where the item of a reference is, when it is not where it was.
+// Finds a reference's item that is no longer at its former place.
 std::optional<std::string> SearchFor(Moment& moment, const kernel::Item& reference,
                                      const std::string& former) {
   const auto volume = moment.VolumeOf({former, reference});
@@ -144,7 +144,7 @@ void Remember(Moment& moment, const Sighting& seen) {
   moment.Knowledge().Remember(seen.item, seen.path, volume ? volume->get() : nullptr);
 }
 
-// Of an id that only one item can have the place where it was seen last, if it is still there.
+// The item with an id at its remembered place, for ids that only one item can have.
 std::optional<Sighting> AtRememberedPlace(Moment& moment, const volumes::Volume& volume,
                                           std::uint32_t id) {
   if (!volume.IsCertain(id)) return std::nullopt;
@@ -153,13 +153,13 @@ std::optional<Sighting> AtRememberedPlace(Moment& moment, const volumes::Volume&
                           : SeeWithID(moment, volume, id, false, std::string(place->path));
 }
 
-// What a file system said of the items that have an id.
+// The file system's answer about an id.
 struct FoundByID {
-  std::optional<Sighting> item;  // the only one
-  bool isSettled;                // what is not told here is nowhere
+  std::optional<Sighting> item;  // if exactly one
+  bool isSettled;                // an item not given does not exist
 };
 
-// A file that was opened settles a question about folders.
+// With `foldersOnly`, a file that has the id settles the question too.
 FoundByID AskFileSystem(Moment& moment, const volumes::Volume& volume, std::uint32_t id,
                         bool foldersOnly) {
   const HandleAnswer answer = AskForID(volume, id);
@@ -195,8 +195,8 @@ std::optional<Sighting> LocateItem(Moment& moment, const volumes::VolumePointer&
                     });
 }
 
-// The folder with an id where it was last seen, by what the table said last: one folder held proves
-// it.
+// The folder with an id at its remembered place, by the mount table as last read: holding the
+// folder verifies both.
 std::optional<HeldFolder> HoldAtRememberedPlace(Moment& moment, volumes::VolumeNumber number,
                                                 std::uint32_t id) {
   const auto listed = moment.LastVolumes()->WithNumber(number);

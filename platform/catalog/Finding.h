@@ -1,11 +1,11 @@
-// Where is an item: by the reference that was taken of it, or by its node id on a volume.
+// Finds an item, either by a reference to it or by its node id on a volume.
 //
-// The first that applies: a folder held in this moment; a remembered place, verified; where the
-// process may, the file system's own handle; a pass over the volume's folders, which begins another
-// moment. REQUIRES of callers: what they hold may be let go of.
+// Tries in this order: a folder held in this moment; a remembered place, verified; the file
+// system's own handle, if the process is privileged; a pass over the volume's folders. A pass
+// restarts the moment, so callers must not rely on what they held before.
 //
-// An id that several items could share is answered only when one has it: each of the numbers that
-// share it was asked for, or the whole volume was seen.
+// An id that several items could share is resolved only when exactly one item has it: every number
+// that maps to the id was asked for, or the whole volume was read.
 #pragma once
 
 #include <cstdint>
@@ -17,29 +17,30 @@
 
 namespace tallowmere::catalog {
 
-// A lead: the path at which an item was last seen, with links on the way perhaps. Empty when that
-// is not remembered.
+// A lead: the path at which an item was last seen, possibly through links. Empty when that is not
+// remembered.
 std::string LastPathOf(Moment& moment, const kernel::Item& reference);
 
-// The item of a reference as the folder at the end of an absolute path holds it now, links on the
-// way followed. ENOENT when another item or none is there; kNoVolume for a folder on none.
+// Looks for a reference's item at an absolute path, following links on the way. Returns ENOENT when
+// another item or none is there, and kNoVolume when its folder is on no volume.
 kernel::Result<Look> LookAgain(Moment& moment, const kernel::Item& reference,
                                const std::string& path);
 
-// The canonical path of this very item now.
+// The current canonical path of a reference's item.
 kernel::Result<std::string> FindPathOf(Moment& moment, const kernel::Item& reference);
 
-// The item with a node id on a volume; with `foldersOnly` nothing but a folder. ENOENT when there
-// is none and when it is not certain which item that is.
+// The item with a node id on a volume, or only a folder if `foldersOnly`. Returns ENOENT when there
+// is none and when it is uncertain which one is meant.
 kernel::Result<Sighting> FindItem(Moment& moment, const volumes::VolumePointer& volume,
                                   std::uint32_t id, bool foldersOnly);
 
-// An item as FindItem gives it, without a pass: ENOENT as well when the item has no remembered
-// place and cannot be opened by its number.
+// Like FindItem, but never makes a pass: also returns ENOENT when the item has no remembered place
+// and cannot be opened by its number.
 kernel::Result<Sighting> FindItemWithoutPass(Moment& moment, const volumes::VolumePointer& volume,
                                              std::uint32_t id);
 
-// The folder with a node id on the volume with a number. kNoVolume, kNoFolder.
+// Holds the folder with a node id. Returns kNoVolume when no volume has the number, and kNoFolder
+// when no folder has the id.
 kernel::Result<HeldFolder> HoldFolderWithID(Moment& moment, volumes::VolumeNumber number,
                                             std::uint32_t id);
 

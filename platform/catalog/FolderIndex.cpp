@@ -7,24 +7,24 @@
 namespace tallowmere::catalog {
 namespace {
 
-FolderTree::TellApart HowToTellApart(const volumes::Volume& volume) {
-  return volume.NumbersTellItemsApart() ? FolderTree::TellApart::kNumbers
-                                        : FolderTree::TellApart::kPlaces;
+FolderTree::Identity IdentityOn(const volumes::Volume& volume) {
+  return volume.NumbersIdentifyItems() ? FolderTree::Identity::kByNumbers
+                                       : FolderTree::Identity::kByPlace;
 }
 
-// How often a volume that changes while it is looked at is looked at again.
+// How many walks to make while the volume keeps changing.
 constexpr int kMostLooks = 3;
 
-// Whether what is known of a folder holds until its change time moves. A server that promises
-// nothing can show several folders as one, with the time of one of them.
+// Whether a known folder stays valid until its change time moves. A server that promises nothing
+// can show several folders as one, with one change time.
 bool HoldsUntilChange(const volumes::Volume& volume) {
-  return volume.NumbersTellItemsApart() || volume.Kind().keepsNumbers;
+  return volume.NumbersIdentifyItems() || volume.Kind().keepsNumbers;
 }
 
 }  // namespace
 
 FolderIndex::FolderIndex(volumes::VolumePointer volume)
-    : mVolume(std::move(volume)), mKnown{FolderTree(HowToTellApart(*mVolume)), {}} {}
+    : mVolume(std::move(volume)), mKnown{FolderTree(IdentityOn(*mVolume)), {}} {}
 
 std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std::string& start,
                                              const volumes::Volumes& volumes) {
@@ -45,17 +45,17 @@ std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std
   return std::nullopt;
 }
 
-// Whether the answer of the question is one. That there is only one place takes a volume that
-// stayed as it was while it was looked at.
+// Returns whether the question has an answer. That only one place has the id is certain only if the
+// volume did not change during the walk.
 bool FolderIndex::Run(Question& question, const std::string& start,
                       const volumes::Volumes& volumes) {
   VolumeWalk walk(*mVolume, volumes, mKnown, question);
-  if (question.IsCertain()) walk.LookAtKnown();
+  if (question.IsCertain()) walk.CheckKnownWithID();
   if (question.IsSettled()) return true;
   if (!mKnown.isWhole || !mKnown.waiting.empty() || question.HasToReadAll()) walk.Walk(start);
   walk.CheckKnown();
   if (!question.IsSettled() && question.IsMissed()) NoteMissing(question.ID());
-  return mVolume->NumbersTellItemsApart() || !question.Answer() || walk.IsSteady();
+  return mVolume->NumbersIdentifyItems() || !question.Answer() || walk.IsSteady();
 }
 
 std::size_t FolderIndex::Size() const {
@@ -65,7 +65,7 @@ std::size_t FolderIndex::Size() const {
   return size;
 }
 
-// Gives the memory back, too.
+// Releases the memory too.
 void FolderIndex::Clear() {
   mKnown.tree.Clear();
   mKnown.waiting = {};
@@ -80,8 +80,8 @@ WalkNumber FolderIndex::LastMissed(std::uint32_t id) const {
   return noted == mMissing.end() ? kNoWalk : noted->walk;
 }
 
-// What the walk did not see is not marked as read. Nothing is noted where a file can get the id
-// without a change of its folder.
+// Notes nothing where a file can get the id without a change of its folder. Folders that the walk
+// could not read are not marked as read, so the next question reads them.
 void FolderIndex::NoteMissing(std::uint32_t id) {
   if (!mVolume->Kind().keepsNumbers) return;
   std::erase_if(mMissing, [id](const Missing& missing) { return missing.id == id; });

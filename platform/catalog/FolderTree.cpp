@@ -48,7 +48,7 @@ FolderNumber FolderTree::Learn(const FolderPlace& place, const kernel::Item& ite
   }
   const bool isSeenAlike = IsInRegion(item, RegionOf(index));
   if (isSeenAlike && IsKnownAt(index, place)) return index;
-  if (mTellApart == TellApart::kPlaces) {
+  if (mIdentity == Identity::kByPlace) {
     Replace(mFolders[index], item, id);
   } else if (mFolders[index].parent != place.parent || NameOf(index) != place.name) {
     mUnusedNames += NameOf(index).size() + 1;
@@ -58,17 +58,17 @@ FolderNumber FolderTree::Learn(const FolderPlace& place, const kernel::Item& ite
   return index;
 }
 
-// What is at the place of a folder now.
+// Updates the folder that is known at a place.
 void FolderTree::Replace(Folder& folder, const kernel::Item& item, std::uint32_t id) {
   if (folder.inode != item.inode || folder.id != id) folder.isRead = false;
   folder.inode = item.inode;
   folder.id = id;
 }
 
-// Whether nothing is to be noted. A folder under its parent is told by one step, which follows when
-// the parent moves, so it stays there when it is come upon by its whole path.
+// Whether a folder met by its whole path is already known there under its parent. It then stays so,
+// and follows when the parent moves.
 bool FolderTree::IsKnownAt(FolderNumber index, const FolderPlace& place) const {
-  return mTellApart == TellApart::kNumbers && place.parent == kNoParent &&
+  return mIdentity == Identity::kByNumbers && place.parent == kNoParent &&
          mFolders[index].parent != kNoParent && PathOf(index) == place.name;
 }
 
@@ -99,7 +99,7 @@ std::vector<FolderNumber> FolderTree::WithID(std::uint32_t id) const {
 FolderNumber FolderTree::Find(const FolderPlace& place, const kernel::Item& item,
                               std::uint32_t id) const {
   if (mTable.empty()) return kNoParent;
-  const bool byNumbers = mTellApart == TellApart::kNumbers;
+  const bool byNumbers = mIdentity == Identity::kByNumbers;
   const std::uint32_t hash = byNumbers ? id : HashOfPlace(place.parent, place.name);
   const std::size_t mask = mTable.size() - 1;
   for (std::size_t slot = FirstSlot(hash, mTable.size()); mTable[slot] != kNoParent;
@@ -111,7 +111,7 @@ FolderNumber FolderTree::Find(const FolderPlace& place, const kernel::Item& item
 
 bool FolderTree::IsIt(const Folder& folder, const FolderPlace& place, const kernel::Item& item,
                       std::uint32_t id) const {
-  if (mTellApart == TellApart::kNumbers) {
+  if (mIdentity == Identity::kByNumbers) {
     return folder.id == id && folder.inode == item.inode &&
            mRegions[folder.region].device == item.device;
   }
@@ -125,7 +125,7 @@ void FolderTree::NoteRegion(FolderNumber index, const kernel::Item& item) {
     mFolders[index].region = mFolders[parent].region;
     return;
   }
-  // A device number can be given to another subvolume.
+  // A device number can be reused for another subvolume.
   const auto found = std::find_if(mRegions.begin(), mRegions.end(), [&](const auto& region) {
     return IsInRegion(item, region) &&
            kernel::SubvolumeOf(item.handle) == kernel::SubvolumeOf(region.handle);
@@ -136,11 +136,11 @@ void FolderTree::NoteRegion(FolderNumber index, const kernel::Item& item) {
 }
 
 std::uint32_t FolderTree::HashOf(const Folder& folder) const {
-  if (mTellApart == TellApart::kNumbers) return folder.id;
+  if (mIdentity == Identity::kByNumbers) return folder.id;
   return HashOfPlace(folder.parent, mNames.data() + folder.name);
 }
 
-// Three quarters full at the most. A folder that is gone keeps its slot until then.
+// Grows the table at three quarters, which also drops the slots of folders that are gone.
 void FolderTree::Insert(FolderNumber index) {
   if (mFolders.size() * 4 <= mTable.size() * 3) return Put(index);
   mTable.assign(std::max(kSmallestTable, mTable.size() * 2), kNoParent);
@@ -176,7 +176,7 @@ std::string FolderTree::PathOf(const FolderPlace& place) const {
 }
 
 void FolderTree::Clear() {
-  *this = FolderTree(mTellApart);
+  *this = FolderTree(mIdentity);
 }
 
 std::size_t FolderTree::Size() const {

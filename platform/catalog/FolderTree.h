@@ -1,10 +1,10 @@
-// The folders of one volume, as far as they are known: each under its parent, or at a whole path.
-// Pure, 40 bytes and the name for each.
+// The known folders of one volume, each by its name in its parent or by a whole path. Pure; 40
+// bytes plus the name each.
 //
-// | Numbers               | A folder is known by    | What comes to its place             |
-// |-----------------------|-------------------------|-------------------------------------|
-// | tell items apart      | numbers, and can move   | is another folder                   |
-// | do not tell them      | its parent and its name | is the same one, to be read again   |
+//   numbers             a folder is known by     another folder at its place
+//   ---------------------------------------------------------------------------------------------
+//   identify items      its numbers; it moves    is a different folder
+//   do not              its parent and name      counts as the same one, to be read again
 #pragma once
 
 #include <cstddef>
@@ -18,7 +18,7 @@
 
 namespace tallowmere::catalog {
 
-// Which folder of a tree.
+// The index of a folder in its tree.
 using FolderNumber = std::uint32_t;
 inline constexpr FolderNumber kNoParent = 0xFFFFFFFF;
 
@@ -28,62 +28,61 @@ struct FolderPlace {
   std::string name;
 };
 
-// Which walk over the volume, from 1 on.
+// The number of a walk over the volume, from 1.
 using WalkNumber = std::uint32_t;
 inline constexpr WalkNumber kNoWalk = 0;
 
 class FolderTree {
  public:
-  enum class TellApart { kNumbers, kPlaces };
+  enum class Identity { kByNumbers, kByPlace };
 
   struct Folder {
     std::uint64_t inode;
     kernel::Nanoseconds change;  // its change time when it was last looked at
     std::uint32_t id;            // 0: it is gone
     FolderNumber parent;
-    std::uint32_t name;  // where it begins among the names
+    std::uint32_t name;  // its offset in the names
     std::uint32_t region : 31;
-    std::uint32_t isRead : 1;  // everything in it was seen and is known until its change time moves
-    WalkNumber checked;        // the last walk that has seen it as it is
-    WalkNumber read;           // the walk that first read it as it is
+    std::uint32_t isRead : 1;  // its content is known until its change time moves
+    WalkNumber checked;        // the last walk that saw it in its present state
+    WalkNumber read;           // the walk that first read it in its present state
   };
   static_assert(sizeof(Folder) == 40);
 
-  explicit FolderTree(TellApart tellApart) : mTellApart(tellApart) {}
+  explicit FolderTree(Identity identity) : mIdentity(identity) {}
 
-  // Numbers are below this; folders that are gone keep theirs.
+  // All folder numbers are below this. Folders that are gone keep theirs.
   FolderNumber Count() const { return static_cast<FolderNumber>(mFolders.size()); }
 
   Folder& operator[](FolderNumber index) { return mFolders[index]; }
   const Folder& operator[](FolderNumber index) const { return mFolders[index]; }
 
-  // A folder of the mount and on the device that a folder is on, as it was learned: with its
-  // handle, if it had one.
+  // A folder of the same mount and device, as it was learned, with its handle if it had one.
   const kernel::Item& RegionOf(FolderNumber index) const;
 
-  // Whether an item has the numbers of a known folder, on the same mount.
+  // Whether an item has the same mount, device and inode number as a known folder.
   bool IsSame(FolderNumber index, const kernel::Item& item) const;
 
-  // The folder that was found at a place. One that was known elsewhere has moved here.
+  // Records the folder found at a place. A folder known elsewhere has moved there.
   FolderNumber Learn(const FolderPlace& place, const kernel::Item& item, std::uint32_t id);
 
-  // Takes a folder for gone. What is known below it stays.
+  // Marks a folder as gone. Folders below it stay known.
   void Forget(FolderNumber index);
 
-  // The folders that are known to have an id. REQUIRES: TellApart::kNumbers.
+  // The known folders with an id. REQUIRES: Identity::kByNumbers.
   std::vector<FolderNumber> WithID(std::uint32_t id) const;
 
   std::string_view NameOf(FolderNumber index) const { return mNames.data() + mFolders[index].name; }
 
-  // Empty for folders that seem to hold each other: they changed places, and half of it was
-  // noticed.
+  // Empty for folders that seem to contain each other: they were exchanged, and only half of that
+  // was noticed.
   std::string PathOf(FolderNumber index) const;
   std::string PathOf(const FolderPlace& place) const;
 
-  // Whether most of the names in memory are of folders that were renamed or are gone.
+  // Whether most name bytes belong to folders that were renamed or are gone.
   bool IsMostlyWaste() const { return mUnusedNames > mNames.size() / 2; }
 
-  // Forgets everything and gives the memory back.
+  // Forgets everything and releases the memory.
   void Clear();
 
   // Bytes in use.
@@ -103,15 +102,16 @@ class FolderTree {
 
   static constexpr std::uint32_t kMostRegions = 0x7FFFFFFF;
 
-  TellApart mTellApart;
+  Identity mIdentity;
   std::vector<Folder> mFolders;
   std::vector<FolderNumber> mTable;    // open addressing
-  std::string mNames;                  // each with a NUL behind it
+  std::string mNames;                  // each followed by a NUL
   std::vector<kernel::Item> mRegions;  // few
   std::size_t mUnusedNames = 0;        // bytes in mNames
 };
 
-// Containers double when they are full. Those that hold something for every folder grow by less.
+// Reserves room, growing by a quarter at a time: containers double otherwise, which is much for one
+// that holds every folder.
 template <class Container>
 void ReserveFor(Container& container, std::size_t more) {
   const std::size_t size = container.size() + more;

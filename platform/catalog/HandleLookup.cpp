@@ -10,10 +10,10 @@
 namespace tallowmere::catalog {
 namespace {
 
-// What a file system said of one item.
-enum class Said { kOpened, kGone, kNothing };
+// The file system's answer about one handle.
+enum class Reply { kOpened, kGone, kUnknown };
 
-// Questions to one file system, through its root folder.
+// Asks one file system, through its root folder.
 class Questions {
  public:
   explicit Questions(const volumes::Volume& volume)
@@ -21,32 +21,32 @@ class Questions {
         mSpot(kernel::AtPath(volume.MountPoint().c_str())),
         mRoot(kernel::OpenForReading(mSpot)) {}
 
-  // What no process below the mount may see is refused, not gone.
+  // An item outside the mount is refused, which does not mean that it is gone.
   bool CanBeComplete() const { return mVolume.Listed().MountPoints().size() == 1; }
 
-  Said Open(const kernel::FileHandle& handle, std::vector<Sighting>& opened) const {
-    if (!mRoot) return Said::kNothing;
+  Reply Open(const kernel::FileHandle& handle, std::vector<Sighting>& opened) const {
+    if (!mRoot) return Reply::kUnknown;
     const auto item = kernel::OpenByHandle(mRoot->Get(), handle);
-    if (!item) return item.Error().number == ESTALE ? Said::kGone : Said::kNothing;
+    if (!item) return item.Error().number == ESTALE ? Reply::kGone : Reply::kUnknown;
     const auto status = kernel::ReadStatus(kernel::AtOpen(item->Get()));
     const auto path = kernel::PathOfDescriptor(*item);
-    if (!status || !path) return Said::kNothing;
+    if (!status || !path) return Reply::kUnknown;
     opened.push_back({*path, status->item});
-    return Said::kOpened;
+    return Reply::kOpened;
   }
 
-  Said OpenByNumber(const names::Candidate& candidate, std::vector<Sighting>& opened) {
+  Reply OpenByNumber(const names::Candidate& candidate, std::vector<Sighting>& opened) {
     kernel::HandleNumbers numbers{candidate.inode, SubvolumeOf(candidate), 0};
     if (mVolume.Kind().byNumber == kernel::ByNumber::kInodeAndGeneration) {
-      if (!mRoot) return Said::kNothing;
+      if (!mRoot) return Reply::kUnknown;
       const auto generation = kernel::ReadXfsGeneration(mRoot->Get(), candidate.inode);
       if (!generation) {
-        return generation.Error() == kernel::kNotThere ? Said::kGone : Said::kNothing;
+        return generation.Error() == kernel::kNotThere ? Reply::kGone : Reply::kUnknown;
       }
       numbers.generation = *generation;
     }
     const auto handle = HandleOf(numbers);
-    return handle ? Open(*handle, opened) : Said::kNothing;
+    return handle ? Open(*handle, opened) : Reply::kUnknown;
   }
 
  private:
@@ -71,16 +71,16 @@ HandleAnswer AskForReference(const volumes::Volume& volume, const kernel::Item& 
   HandleAnswer answer{};
   if (IsProvedByPlace(reference)) return answer;
   Questions questions(volume);
-  Said said = Said::kNothing;
+  Reply reply = Reply::kUnknown;
   if (reference.handle.size != 0) {
-    said = questions.Open(reference.handle, answer.opened);
+    reply = questions.Open(reference.handle, answer.opened);
     answer.isComplete = volume.Kind().findsAllByHandle;
   } else if (volume.Kind().byNumber != kernel::ByNumber::kNone &&
              reference.device == volume.Root().device) {
-    said = questions.OpenByNumber({reference.inode, 0}, answer.opened);
+    reply = questions.OpenByNumber({reference.inode, 0}, answer.opened);
     answer.isComplete = true;
   }
-  answer.isComplete = answer.isComplete && said != Said::kNothing && questions.CanBeComplete();
+  answer.isComplete = answer.isComplete && reply != Reply::kUnknown && questions.CanBeComplete();
   return answer;
 }
 
@@ -90,9 +90,9 @@ HandleAnswer AskForID(const volumes::Volume& volume, std::uint32_t id) {
   const auto candidates = names::CandidatesOf(id, volume.IDRule(), volume.HighestInode());
   if (!candidates) return answer;
   Questions questions(volume);
-  answer.isComplete = volume.NumbersTellItemsApart() && questions.CanBeComplete();
+  answer.isComplete = volume.NumbersIdentifyItems() && questions.CanBeComplete();
   for (const names::Candidate& candidate : *candidates) {
-    if (questions.OpenByNumber(candidate, answer.opened) == Said::kNothing) {
+    if (questions.OpenByNumber(candidate, answer.opened) == Reply::kUnknown) {
       answer.isComplete = false;
       break;
     }

@@ -1,5 +1,5 @@
-// Where is an item: asked of the file system itself, by handle, in constant time. For a process
-// with the privilege (CAP_DAC_READ_SEARCH; on XFS CAP_SYS_ADMIN as well).
+// Opens items by file handle, in constant time: open_by_handle_at(2). Needs CAP_DAC_READ_SEARCH,
+// and on xfs CAP_SYS_ADMIN as well.
 #pragma once
 
 #include <cstdint>
@@ -12,17 +12,16 @@
 namespace tallowmere::catalog {
 
 struct HandleAnswer {
-  // The items that were opened, and as leads the paths at which the kernel shows them; a file that
-  // nobody has looked up yet is shown at "/".
+  // The items that were opened. Their paths are leads, as the kernel shows them; a file that nobody
+  // has looked up yet is shown at "/".
   std::vector<Sighting> opened;
 
-  // Whether the file system was asked for everything that could be meant: what was not found does
-  // not exist.
+  // Whether every candidate was asked for, so that what was not found does not exist.
   bool isComplete;
 };
 
-// A process that has the privilege only in a user namespace is refused what is not below the mount
-// that it asks through, so that nothing is complete on a volume with several mounts.
+// A process privileged only in a user namespace is refused items that are not below the mount it
+// asks through, so no answer is complete on a volume with several mounts.
 HandleAnswer AskForReference(const volumes::Volume& volume, const kernel::Item& reference);
 
 // Every item that has the id.

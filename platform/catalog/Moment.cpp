@@ -10,7 +10,7 @@
 namespace tallowmere::catalog {
 namespace {
 
-// More are not kept beyond the call that holds them.
+// How many are kept for the rest of the moment.
 constexpr std::size_t kMostHeld = 8;
 constexpr std::size_t kMostLooks = 8;
 
@@ -18,15 +18,15 @@ bool MeansNoDescriptors(kernel::Error error) {
   return error.number == EMFILE || error.number == ENFILE;
 }
 
-// Whether an error of a path without links says that there may be one.
+// Whether opening a path without links failed perhaps because of one.
 bool MayBeALink(kernel::Error error) {
   return error.number == ELOOP || error.number == ENOTDIR;
 }
 
-// How often the item of a name may be replaced between a look at it and the reading of its handle.
+// How often an item may be replaced between reading its status and its handle.
 constexpr int kMostReadings = 8;
 
-// The item at a spot, with its handle where its id follows from it. ENOENT where it has none.
+// The item at a spot, with its handle if its id depends on it. Returns ENOENT when it has none.
 kernel::Result<kernel::Item> ReadForID(const volumes::Volume& volume, const kernel::Spot& spot) {
   for (int reading = 0; reading < kMostReadings; ++reading) {
     auto status = kernel::ReadStatus(spot);
@@ -77,8 +77,8 @@ void Moment::InvalidateVolumes() {
   mVolumes = nullptr;
 }
 
-// The kernel does not signal that a folder above a mount point was renamed: then the table is read
-// once more.
+// Reads the table once more on a mismatch: the kernel does not signal that a folder above a mount
+// point was renamed.
 kernel::Result<volumes::VolumePointer> Moment::VolumeWithNumber(volumes::VolumeNumber number) {
   for (const bool isLast : {false, true}) {
     const auto listed = Volumes()->WithNumber(number);
@@ -96,7 +96,7 @@ bool Moment::IsMountHeld(int mount) const {
                      [mount](const auto& held) { return held.fact.Item().mount == mount; });
 }
 
-// As VolumeWithNumber reads the table once more.
+// Reads the table once more, as VolumeWithNumber does.
 kernel::Result<volumes::VolumePointer> Moment::FindVolume(const Sighting& seen) {
   for (const bool isLast : {false, true}) {
     const auto listed = mVolumes->OfItem(seen.item, seen.path);
@@ -147,7 +147,7 @@ const HeldFolder* Moment::HeldFor(const kernel::Item& reference) const {
   return nullptr;
 }
 
-// Without descriptors a new moment begins.
+// Restarts the moment to get descriptors back.
 template <class Call>
 kernel::Result<kernel::Descriptor> Moment::Open(const Call& call) {
   auto descriptor = call();
@@ -179,7 +179,7 @@ kernel::Result<HeldFolder> Moment::Keep(std::string path, kernel::Descriptor des
   return held;
 }
 
-kernel::Result<HeldFolder> Moment::HoldHolderOf(const std::string& path) {
+kernel::Result<HeldFolder> Moment::HoldParentOf(const std::string& path) {
   if (path == "/") return kernel::kNotThere;
   const std::string folder = foundation::FolderOf(path);
   auto held = HoldFolder(folder);
@@ -200,8 +200,8 @@ kernel::Result<HeldFolder> Moment::HoldTargetOf(const Look& link) {
   return HoldAtRealPath(std::move(found), link.Path());
 }
 
-// The folder that was found by following an absolute path, at its canonical path. A path that leads
-// through a link of /proc can spell another folder than the one it leads to.
+// The folder found along an absolute path, with its canonical path. A path through a link of /proc
+// can name another folder than it leads to, so the result is compared.
 kernel::Result<HeldFolder> Moment::HoldAtRealPath(kernel::Result<kernel::Descriptor> found,
                                                   const std::string& path) {
   if (!found) return found.Error();

@@ -1,20 +1,20 @@
-// One question, or all questions of one request, as one moment: what was looked at once serves all
-// of it, and the answer is one that a single walk of the kernel could have given meanwhile.
+// The observations behind one answer, shared by all host calls of one request. The answer is one
+// that a single walk of the kernel could have given during the moment.
 //
-//   fact                                           serves
+//   fact                                             may be reused
 //   ---------------------------------------------------------------------------------------------
-//   held: device, number and mount of a folder     as long as the folder is held
-//   timed: a path led to that folder; that         with the held folder as the pivot; a path in an
-//   folder had that item under that name           answer takes one more look along the whole path
-//   that nothing was there                         never: it is looked again
+//   device, number and mount of a held folder        as long as the folder is held
+//   a path led to a folder; a folder had an item     with other facts about that held folder; a
+//   under a name                                     path in an answer is walked once more, whole
+//   nothing was there                                never
 //
-// The table of mounts is polled after the first folder is held: the kernel does not give a mount id
-// away while something on that mount is held, but at once afterwards. A mount that is met later is
-// looked up by a poll of its own, made after its folder is held, or after what is not held was
-// seen.
+// The mount table is polled after the first folder is held: the kernel does not reuse a mount id
+// while something on that mount is held, but may at once afterwards. A mount met later is looked up
+// after a poll of its own, which follows the holding of its folder, or the look at an item that is
+// not held.
 //
-// A pass over a volume ends a moment, since held folders keep umount(2) from working, and begins
-// another: nothing is carried over.
+// Held folders keep umount(2) from working, so a pass over a volume restarts the moment: nothing is
+// carried over.
 #pragma once
 
 #include <cstddef>
@@ -32,10 +32,10 @@
 
 namespace tallowmere::catalog {
 
-// An item seen under a name in a held folder. Copies share it.
+// An item seen under a name in a held folder. Copies share their state.
 class Look {
  public:
-  // REQUIRES: the path of `seen` is that of the folder and one component more.
+  // REQUIRES: the path of `seen` is the folder's path plus one component.
   Look(HeldFolder folder, Sighting seen);
 
   const HeldFolder& Folder() const { return mState->folder; }
@@ -58,7 +58,7 @@ class Look {
   std::shared_ptr<const State> mState;
 };
 
-// A folder as a climb comes to it.
+// One step of a climb.
 struct ClimbedFolder {
   std::string name;      // in HFS form, at most 255 bytes
   std::uint32_t parent;  // id of the folder that holds it; kParentOfRootID at the top
@@ -73,89 +73,88 @@ class Moment {
 
   Catalog& Knowledge() { return mCatalog; }
 
-  // Lets go of everything, as a new moment begins.
+  // Releases everything and begins a new moment.
   void Restart();
 
   // --- Volumes --------------------------------------------------------------------------------
 
-  // The volumes as they were at some time in this moment, never null. A later question may have
+  // The volumes as they were at some time in this moment, never null. A later call may return
   // others.
   volumes::VolumesPointer Volumes();
 
-  // The volumes as last read, a lead: what they say is verified by a folder held on them.
+  // The volumes as last read, as a lead: holding a folder on one verifies it.
   volumes::VolumesPointer LastVolumes();
 
-  // The volume with a number, its root folder seen. 0 is the volume of "/". kNoVolume when none has
-  // the number; the kernel's error where the root folder cannot be seen.
+  // The volume with a number, its root folder seen. 0 is the volume of "/". Returns kNoVolume when
+  // none has the number, and the kernel's error when the root folder cannot be seen.
   kernel::Result<volumes::VolumePointer> VolumeWithNumber(volumes::VolumeNumber number);
 
-  // The volume of an item seen just now; kNoVolume for one of a kernel interface. REQUIRES: the
-  // path is canonical, or the kernel told the mount.
+  // The volume of an item seen just now. Returns kNoVolume for an item of a kernel interface.
+  // REQUIRES: the path is canonical, or the kernel reported the mount.
   kernel::Result<volumes::VolumePointer> VolumeOf(const Sighting& seen);
 
-  // Whether an item seen just now is on that volume, whatever the table says of it by now.
+  // Whether an item seen just now is on a volume, even if that has since left the mount table.
   bool IsOnVolume(const volumes::Volume& volume, const Sighting& seen);
 
-  // Makes the next question read the table of mounts anew.
+  // Makes the next call that needs the mount table read it anew.
   void InvalidateVolumes();
 
   // --- Folders --------------------------------------------------------------------------------
 
-  // The folder at a path without links on the way. ELOOP or ENOTDIR where there is a link, or no
-  // folder; kNoVolume.
+  // The folder at a path without links. Returns ELOOP or ENOTDIR when there is a link or no folder,
+  // and kNoVolume.
   kernel::Result<HeldFolder> HoldFolder(const std::string& path);
 
-  // The folder in which the kernel finds the last component of an absolute path, links on the way
-  // followed, at its own canonical path. ENOENT for "/".
-  kernel::Result<HeldFolder> HoldHolderOf(const std::string& path);
+  // The folder in which the kernel looks up the last component of an absolute path, following links
+  // on the way. It has its own canonical path. Returns ENOENT for "/".
+  kernel::Result<HeldFolder> HoldParentOf(const std::string& path);
 
-  // The folder of a look. ENOTDIR for anything else.
+  // The folder that a look saw. Returns ENOTDIR for anything else.
   kernel::Result<HeldFolder> HoldFolderOf(const Look& folder);
 
-  // The folder to which a link leads, at its own canonical path.
+  // The folder to which a link leads, with its own canonical path.
   kernel::Result<HeldFolder> HoldTargetOf(const Look& link);
 
-  // A folder held in this moment; null when there is none.
+  // A folder held in this moment, or null.
   const HeldFolder* HeldWithID(volumes::VolumeNumber volume, std::uint32_t id) const;
   const HeldFolder* HeldFor(const kernel::Item& reference) const;
 
   // --- Items ----------------------------------------------------------------------------------
 
-  // The item with a name in a held folder, its handle read where its id follows from it.
-  // ENAMETOOLONG where no path could tell where it is.
+  // The item with a name in a held folder, with its handle if its id depends on it. Returns
+  // ENAMETOOLONG when its path would be too long.
   kernel::Result<Look> LookUp(const HeldFolder& folder, std::string_view name);
 
-  // Holds the item at a path, links on the way followed, at its canonical path; for as long as the
-  // caller keeps it.
+  // Holds the item at a path, following links on the way, for as long as the caller keeps it.
+  // `path` is canonical.
   struct HeldItem {
     std::string path;
     kernel::Descriptor descriptor;
   };
   kernel::Result<HeldItem> HoldItem(const std::string& path);
 
-  // The item at a path, links on the way followed, at its canonical path.
+  // The item at a path, following links on the way, with its canonical path.
   kernel::Result<Sighting> See(const std::string& path);
 
-  // A look of this moment that saw the item of a reference; null when there is none.
+  // A look of this moment that saw a reference's item, or null.
   const Look* LookFor(const kernel::Item& reference) const;
 
   // --- Climbs ---------------------------------------------------------------------------------
 
-  // Where a climb goes on.
+  // Where a climb continues.
   struct Climb {
-    HeldFolder folder;                 // where it began; while nothing is left, the next one itself
+    HeldFolder folder;                 // where it began; if `along` is empty, the next folder
     std::uint32_t id;                  // of the next folder
-    std::vector<ClimbedFolder> along;  // what the path tells of the folders left, the next one last
+    std::vector<ClimbedFolder> along;  // the steps left, by the path; the next one last
   };
   std::optional<Climb>& OpenClimb() { return mClimb; }
 
-  // Whether the table of mounts is still the one that was known before the first folder was held.
+  // Whether the mount table is still the one known before the first folder was held.
   bool IsTableAsBefore() const { return !mIsTableNew; }
 
   // --- References -----------------------------------------------------------------------------
 
-  // The item of a look, or a held folder, with its proof: what is known of it when the moment is
-  // over.
+  // The item of a look, or a held folder, with what proves its identity after the moment.
   kernel::Item Prove(const Look& look);
   kernel::Item Prove(const HeldFolder& folder);
 
@@ -170,7 +169,7 @@ class Moment {
   kernel::Result<HeldFolder> HoldAtRealPath(kernel::Result<kernel::Descriptor> found,
                                             const std::string& path);
 
-  // A fact of this moment and the reference that was made of its item, if any was.
+  // A fact of this moment, with the reference made to its item, if any.
   template <class Fact>
   struct Noted {
     Fact fact;
@@ -179,7 +178,7 @@ class Moment {
 
   Catalog& mCatalog;
   volumes::VolumesPointer mVolumes;      // null until polled
-  std::vector<Noted<HeldFolder>> mHeld;  // few: they keep volumes from being unmounted
+  std::vector<Noted<HeldFolder>> mHeld;  // few, as each keeps its volume from being unmounted
   std::vector<Noted<Look>> mLooks;
   std::optional<Climb> mClimb;
   bool mIsTableNew = false;

@@ -18,17 +18,17 @@ kernel::Result<Look> LookUpInViews(Moment& moment, const std::vector<HeldFolder>
   return IsMissing(look) ? ShortFormSearch(moment, views, name).Find() : look;
 }
 
-// Whether a short form can be no other item's, so that it need not be looked up: no two items have
-// the id, and nothing is really called so.
-bool IsItsAlone(Moment& moment, const std::vector<HeldFolder>& views, std::uint32_t id,
-                std::string_view shortForm) {
+// Whether only one item can have a short form, so that it need not be looked up: the id is one
+// item's, and no item's own name is the same.
+bool IsUnambiguous(Moment& moment, const std::vector<HeldFolder>& views, std::uint32_t id,
+                   std::string_view shortForm) {
   if (views.size() > 1 || !names::IsInodeNumber(id)) return false;
-  if (!views.front().Volume()->NumbersTellItemsApart()) return false;
+  if (!views.front().Volume()->NumbersIdentifyItems()) return false;
   const names::SpelledNames spelled = names::SpellHFSName(shortForm);
   return spelled.decomposed.empty() && IsMissing(moment.LookUp(views.front(), spelled.precomposed));
 }
 
-// The first short form by which the item is found.
+// The first short form that finds the item.
 kernel::Result<std::string> ShortFormOf(Moment& moment, const std::vector<HeldFolder>& views,
                                         const Look& item) {
   const volumes::Volume& volume = *item.Folder().Volume();
@@ -36,10 +36,10 @@ kernel::Result<std::string> ShortFormOf(Moment& moment, const std::vector<HeldFo
   const std::uint32_t id = IDInShortForm(moment, item);
   for (std::size_t marks = 1; marks <= names::kMostMarks; ++marks) {
     std::string name = names::ShortHFSName(linuxName, id, marks);
-    if (IsItsAlone(moment, views, id, name)) return name;
+    if (IsUnambiguous(moment, views, id, name)) return name;
     const auto found = LookUpInViews(moment, views, name);
     if (found && AreSame(volume, found->Seen(), item.Seen())) return name;
-    // Another short form would be one for now.
+    // On any other error, a later short form would be valid only for now.
     if (!found && !IsMissing(found)) return found.Error();
   }
   return kernel::kNotThere;

@@ -1,6 +1,6 @@
-// What an item is called in HFS terms in its folder, and which item of a folder has an HFS name.
+// The HFS name of an item in its folder, and the item of a folder with an HFS name.
 //
-// A plain ASCII name costs one look at the folder, present or missing.
+// A plain ASCII name takes one system call, whether the item exists or not.
 #pragma once
 
 #include <cstddef>
@@ -13,13 +13,13 @@
 
 namespace tallowmere::catalog {
 
-// The item with an HFS name in a folder, in this order: the precomposed name; the decomposed one;
-// the one entry whose HFS form is the same; the entry without a name of its own whose short form it
-// is. ENOENT when there is none, or no single one; else the error of the look.
+// The item with an HFS name in a folder. Tries in this order: the precomposed name; the decomposed
+// one; the only entry with that HFS form; the entry without a name of its own that has that short
+// form. Returns ENOENT when there is none or more than one, otherwise the error of the look.
 kernel::Result<Look> LookUpHFSName(Moment& moment, const HeldFolder& folder, std::string_view name);
 
-// The HFS name of the item of a look, at most `limit` bytes: by it LookUpHFSName finds this very
-// item. ENOENT when no name does.
+// The HFS name, of at most `limit` bytes, by which LookUpHFSName finds this very item. Returns
+// ENOENT when there is none.
 kernel::Result<std::string> HFSNameOf(Moment& moment, const Look& item, std::size_t limit);
 
 }  // namespace tallowmere::catalog

@@ -11,7 +11,7 @@
 namespace tallowmere::catalog {
 namespace {
 
-// The one entry of a folder whose HFS form is `name`.
+// The only entry of a folder whose HFS form is `name`.
 kernel::Result<Look> FindByForm(Moment& moment, const HeldFolder& folder, std::string_view name) {
   const auto open = kernel::OpenForReading(folder.SpotOf("."));
   if (!open) return open.Error();

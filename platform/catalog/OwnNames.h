@@ -1,4 +1,4 @@
-// Names that items have of their own in HFS terms, as against short forms that stand for them.
+// Own names: HFS names that are the item's Linux name in HFS form, as opposed to short forms.
 #pragma once
 
 #include <cstddef>
@@ -13,11 +13,11 @@ namespace tallowmere::catalog {
 // Whether a look found nothing, rather than failed.
 bool IsMissing(const kernel::Result<Look>& look);
 
-// The item that has a name of its own: the precomposed name; the decomposed one; the one entry
-// whose HFS form is the same.
+// The item with an own name. Tries the precomposed name, the decomposed one, then the only entry
+// with that HFS form.
 kernel::Result<Look> FindByOwnName(Moment& moment, const HeldFolder& folder, std::string_view name);
 
-// Whether an item of a folder has a name of its own, of at most `limit` bytes, that finds it.
+// Whether an item has an own name, of at most `limit` bytes, that finds it.
 bool HasOwnName(Moment& moment, const HeldFolder& folder, const Sighting& item, std::size_t limit);
 
 }  // namespace tallowmere::catalog

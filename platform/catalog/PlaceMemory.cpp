@@ -5,7 +5,7 @@
 namespace tallowmere::catalog {
 namespace {
 
-// What the heap and the two containers add to a place and its path.
+// In bytes: what the heap and the two containers add to a place and its path.
 constexpr std::size_t kOverhead = 96;
 
 }  // namespace

@@ -1,7 +1,7 @@
-// Where items were last seen, in bounded memory: leads, which whoever uses one verifies first. Asks
-// nothing of the disk.
+// Remembers where items were last seen, in bounded memory. Its answers are leads, which the caller
+// verifies. Never touches the disk.
 //
-// Of an item with several names, the place is the one last remembered.
+// An item with several names has the place last remembered.
 #pragma once
 
 #include <cstddef>
@@ -13,38 +13,36 @@
 
 namespace tallowmere::catalog {
 
-// What an item is remembered by.
+// The key under which an item is remembered.
 struct PlaceKey {
-  std::uint64_t space;   // a volume, or the items of one device that are on none
-  std::uint64_t number;  // the item's in that space
+  std::uint64_t space;   // a volume, or a device whose items are on no volume
+  std::uint64_t number;  // of the item in that space
 
   bool operator==(const PlaceKey&) const = default;
 };
 
 class PlaceMemory {
  public:
-  // `limit` is in bytes, for everything remembered; about 200 a place. A limit below what one place
-  // takes remembers none.
+  // `limit` is in bytes, for everything remembered; a place takes about 200. A limit too small for
+  // one place remembers none.
   explicit PlaceMemory(std::size_t limit);
 
   struct Place {
     std::string path;
-    std::uint32_t parent;  // node id of the folder that held it there; 0: not known
+    std::uint32_t parent;  // node id of the folder that held it; 0: not known
   };
 
-  // The item's place is `path` from now on; its parent is forgotten if the path is another one.
-  // Forgets the places least recently used when the limit is passed. Without memory the exception
-  // leaves everything as it was.
+  // Sets the item's place; a different path also clears its parent. Drops the least recently used
+  // places beyond the limit. Strong exception guarantee.
   void Remember(const PlaceKey& item, std::string_view path);
 
-  // Adds the parent to a place, if it is still remembered.
+  // Adds the parent to a place if that is still remembered.
   void RememberParent(const PlaceKey& item, std::string_view path, std::uint32_t parent);
 
-  // The item's place, which counts as a use; null when none is remembered. Valid until the next
-  // Remember.
+  // The item's place, or null. Counts as a use. Valid until the next Remember.
   const Place* Recall(const PlaceKey& item);
 
-  // The path last remembered or recalled, empty when there is none.
+  // The path most recently remembered or recalled; empty when there is none.
   std::string_view Latest() const;
 
   // Bytes in use, never above the limit.

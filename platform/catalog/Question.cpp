@@ -9,7 +9,7 @@ Question::Question(const SearchedItem& item, const volumes::Volume& volume, Walk
     : mItem(item), mVolume(volume), mLastMissed(lastMissed) {}
 
 bool Question::IsCertain() const {
-  if (!mVolume.NumbersTellItemsApart()) return false;
+  if (!mVolume.NumbersIdentifyItems()) return false;
   return mItem.reference != nullptr || mVolume.IsCertain(mItem.id);
 }
 
@@ -26,13 +26,13 @@ bool Question::IsMeant(const kernel::Item& item, std::uint32_t id, const kernel:
   return mItem.reference == nullptr || IsReferred(item, spot);
 }
 
-// Where numbers do not tell items apart, whoever asks compares the places.
+// Where numbers do not identify items, the caller compares places.
 bool Question::IsReferred(const kernel::Item& item, const kernel::Spot& spot) const {
-  if (mVolume.NumbersTellItemsApart()) return kernel::IsAt(*mItem.reference, spot);
+  if (mVolume.NumbersIdentifyItems()) return kernel::IsAt(*mItem.reference, spot);
   return kernel::HaveSameNumbers(item, *mItem.reference) && item.type == mItem.reference->type;
 }
 
-// A volume may grow, so that what is certain is asked after the look.
+// Certainty is asked for after the item was seen, since the volume may have grown.
 void Question::Take(const kernel::Item& item, std::string path) {
   Found taken{item, std::move(path)};
   const bool isKnown = std::any_of(mFound.begin(), mFound.end(),
@@ -42,26 +42,27 @@ void Question::Take(const kernel::Item& item, std::string path) {
 }
 
 bool Question::AreSame(const Found& first, const Found& second) const {
-  if (mVolume.NumbersTellItemsApart()) return kernel::HaveSameNumbers(first.item, second.item);
+  if (mVolume.NumbersIdentifyItems()) return kernel::HaveSameNumbers(first.item, second.item);
   return ShowsAt(first, second.path) && ShowsAt(second, first.path);
 }
 
-// Whether one of the volume's mounts shows what was found at that path as well.
+// Whether one of the volume's mounts shows the found item at `path` too.
 bool Question::ShowsAt(const Found& found, const std::string& path) const {
   const auto paths = mVolume.Listed().PathsOf(found.path, found.item.mount);
   return std::find(paths.begin(), paths.end(), path) != paths.end();
 }
 
-// What is gone cannot be found. What this process may not read, and what has no path, is not looked
-// for where numbers tell items apart: that just there a second item has the same id takes chance.
+// Items that are gone do not matter. Where numbers identify items, neither do folders that this
+// process may not read and items without a path: a second item with the same id just there would be
+// a coincidence.
 void Question::NoteError(kernel::Error error) {
   if (kernel::MeansGone(error)) return;
   const bool isPassedOver = kernel::MeansRefused(error) || error.number == ENAMETOOLONG;
-  if (!isPassedOver || !mVolume.NumbersTellItemsApart()) mIsHidden = true;
+  if (!isPassedOver || !mVolume.NumbersIdentifyItems()) mIsHidden = true;
 }
 
 void Question::NoteHidden() {
-  if (!mVolume.NumbersTellItemsApart()) mIsHidden = true;
+  if (!mVolume.NumbersIdentifyItems()) mIsHidden = true;
 }
 
 std::optional<std::string> Question::Answer() const {

@@ -1,10 +1,10 @@
-// What a search over a volume looks for, what it has found of it, and when it is settled.
+// What a search over a volume looks for, what it has found so far, and when it is settled.
 //
-//   numbers of the volume    looked for                   a find is    settled by
+//   the volume's numbers    sought                       a match is    settled by
 //   ---------------------------------------------------------------------------------------------
-//   tell items apart         a reference, a certain id    that item    the first
-//   tell items apart         another id                   an item      two, or all being seen
-//   do not tell them         an id, or numbers            a place      two, or all being seen
+//   identify items          a reference, a certain id    that item     the first match
+//   identify items          another id                   an item       two matches, or the end
+//   do not                  an id, or numbers            a place       two matches, or the end
 #pragma once
 
 #include <cstdint>
@@ -22,51 +22,50 @@ namespace tallowmere::catalog {
 // What a search looks for.
 struct SearchedItem {
   std::uint32_t id;                         // its node id on the volume
-  const kernel::Item* reference = nullptr;  // or this very item alone
+  const kernel::Item* reference = nullptr;  // if given, only this very item
   bool foldersOnly = false;
 };
 
 class Question {
  public:
-  // `lastMissed` is the last walk that looked for files too and met no item with the id. REQUIRES:
-  // item and volume outlive the question.
+  // `lastMissed` is the latest walk that looked for files too and met no item with the id.
+  // REQUIRES: item and volume outlive the question.
   Question(const SearchedItem& item, const volumes::Volume& volume, WalkNumber lastMissed);
 
   std::uint32_t ID() const { return mItem.id; }
   bool WantsFoldersOnly() const { return mItem.foldersOnly; }
 
-  // Whether one find settles it.
+  // Whether the first match settles it.
   bool IsCertain() const;
 
-  // Whether nothing that could still be found changes the answer.
+  // Whether no further match could change the answer.
   bool IsSettled() const { return mIsSettled; }
 
-  // Whether files have to be looked for in a folder that a walk was the first to read as it is; and
-  // whether in all folders, then.
+  // Whether a folder first read in its present state by walk `read` has to be searched for files;
+  // HasToReadAll: whether every folder has to be.
   bool HasToRead(WalkNumber read) const { return !mItem.foldersOnly && read > mLastMissed; }
   bool HasToReadAll() const { return HasToRead(kNoWalk + 1); }
 
-  // Whether an entry of a folder is worth a look at its item.
+  // Whether a folder's entry could be the sought item, judged by its inode number.
   bool IsWorthALook(std::uint64_t inode, const kernel::Item& folder, bool isFolder) const;
 
-  // Takes an item that was just seen at a spot, if it is one that is looked for. `path` tells its
-  // canonical path.
+  // Records an item just seen at a spot if it is a match. `path` returns its canonical path.
   template <class Path>
   void Offer(const kernel::Item& item, std::uint32_t id, const kernel::Spot& spot,
              const Path& path) {
     if (IsMeant(item, id, spot)) Take(item, path());
   }
 
-  // Takes note of what could not be seen: for an error; because something is mounted there, or what
-  // was there is no more.
+  // Record what could not be seen: because of an error; because something is mounted over it, or it
+  // has gone.
   void NoteError(kernel::Error error);
   void NoteHidden();
   bool HasSeenAll() const { return !mIsHidden; }
 
-  // Whether no item with the id was met, files included.
+  // Whether no item with the id was met and files were searched too.
   bool IsMissed() const { return !mItem.foldersOnly && !mHasMet; }
 
-  // Where the item is that is the answer. REQUIRES: it is settled, or all was seen that can be.
+  // The path of the sought item. REQUIRES: the question is settled, or the walk has ended.
   std::optional<std::string> Answer() const;
 
  private:
@@ -87,7 +86,7 @@ class Question {
   bool mIsSettled = false;
   bool mHasMet = false;
   bool mIsHidden = false;
-  std::vector<Found> mFound;  // different ones
+  std::vector<Found> mFound;  // no two the same
 };
 
 }  // namespace tallowmere::catalog

@@ -11,7 +11,7 @@
 namespace tallowmere::catalog {
 namespace {
 
-// Whether a short form, read in one way, stands for an item that is called `linuxName`.
+// Whether a short form, read in one way, is that of an item called `linuxName`.
 bool StandsFor(const names::ShortNameParts& parts, std::string_view name, const char* linuxName) {
   for (std::size_t marks = 1; marks <= parts.marks; ++marks) {
     if (names::ShortHFSName(linuxName, parts.nodeID, marks) == name) return true;
@@ -23,8 +23,8 @@ std::string NameOf(const Sighting& item) {
   return std::string(*foundation::LastComponent(item.path));
 }
 
-// Whether entries of the folder can have another number than their items: by the kind of the file
-// system, and where something is mounted.
+// Whether entries of the folder can have other inode numbers than their items: on some kinds of
+// file system, and where something is mounted.
 bool EntriesMayDiffer(Moment& moment, const HeldFolder& folder) {
   if (!folder.Volume()->Kind().entriesTellNumbers) return true;
   const auto seen = moment.See(folder.Path());
@@ -56,7 +56,7 @@ kernel::Result<Look> ShortFormSearch::Find() {
   return mFound.front();
 }
 
-// Only what has no name of its own has a short form.
+// Whether any item without an own name could have this short form.
 bool ShortFormSearch::CanStandForOne() const {
   return mViews.size() > 1 || names::CanBeShortForm(mName) ||
          !names::SpellHFSName(mName).decomposed.empty();
@@ -67,7 +67,7 @@ bool ShortFormSearch::IsShortFormOf(const names::ShortNameParts& parts, const Lo
          !HasOwnName(mMoment, mViews.front(), item.Seen(), names::kLongestSpecName);
 }
 
-// Without reading the folder.
+// Tries to find the item without reading the folder.
 bool ShortFormSearch::FindByNumber(const names::ShortNameParts& parts) {
   const auto volume = mViews.front().Volume();
   const auto item = FindItemWithoutPass(mMoment, volume, parts.nodeID);
@@ -83,7 +83,7 @@ bool ShortFormSearch::FindByNumber(const names::ShortNameParts& parts) {
   return false;
 }
 
-// Error number 0 when all was read.
+// Returns error number 0 when the whole folder was read.
 kernel::Error ShortFormSearch::SearchFolder(const HeldFolder& view) {
   const auto open = kernel::OpenForReading(view.SpotOf("."));
   if (!open) return open.Error();
@@ -99,7 +99,7 @@ kernel::Error ShortFormSearch::SearchFolder(const HeldFolder& view) {
   return reader.FailedBy();
 }
 
-// By the number of an entry that is its item's.
+// Whether an entry with its item's inode number has the id.
 bool ShortFormSearch::MayBeMeant(const HeldFolder& view, std::uint64_t inode,
                                  const names::ShortNameParts& parts) const {
   return view.Volume()->IDOfEntry(inode, view.Item()) == parts.nodeID;

@@ -1,4 +1,4 @@
-// Short forms, which stand for items without an HFS name of their own: looked up in a folder.
+// Looks up short forms, the names of items that have no own HFS name, in a folder.
 #pragma once
 
 #include <cstdint>
@@ -12,18 +12,17 @@
 
 namespace tallowmere::catalog {
 
-// The id that a short form has for an item of a folder: kNoVolumeID for what is mounted there and
-// on no volume.
+// The id in an item's short form: kNoVolumeID for a mount point of something that is no volume.
 std::uint32_t IDInShortForm(Moment& moment, const Look& item);
 
-// One look-up of a short form in the views of a folder.
+// One lookup of a short form in the views of a folder.
 class ShortFormSearch {
  public:
   // REQUIRES: all outlive the search.
   ShortFormSearch(Moment& moment, const std::vector<HeldFolder>& views, std::string_view name);
 
-  // ENOENT when the name is no short form, and when none or several items are meant; EIO when an
-  // item that could be meant cannot be looked at; else the error of reading the folder.
+  // Returns ENOENT when the name is no short form and when it fits no item or several, EIO when an
+  // item that it could fit cannot be examined, otherwise the error of reading the folder.
   kernel::Result<Look> Find();
 
  private:
@@ -39,8 +38,8 @@ class ShortFormSearch {
   const std::vector<HeldFolder>& mViews;
   std::string_view mName;
   std::vector<names::ShortNameParts> mReadings;
-  std::vector<Look> mFound;  // different items
-  bool mIsHidden = false;    // an entry that could be meant cannot be looked at
+  std::vector<Look> mFound;  // no two of one item
+  bool mIsHidden = false;    // an entry that could fit cannot be examined
 };
 
 }  // namespace tallowmere::catalog

@@ -6,14 +6,14 @@
 namespace tallowmere::catalog {
 namespace {
 
-// Of no file system: the kernel's types are positive (FILEID_INVALID is 0xFF).
+// A handle type that no file system uses: the kernel's types are positive (FILEID_INVALID is 0xFF).
 constexpr std::int32_t kPlaceProof = -2;
 
 struct Digest {
   std::uint64_t words[2];
 };
 
-// FNV-1a, 64 bits, from two different beginnings: the published one and its complement.
+// FNV-1a, 64 bits, with two offset bases: the published one and its complement.
 Digest DigestOf(std::string_view path) {
   constexpr std::uint64_t kBegin = 0xCBF29CE484222325;
   constexpr std::uint64_t kPrime = 0x100000001B3;
@@ -50,12 +50,12 @@ std::uint32_t IDOf(const volumes::Volume& volume, const Sighting& seen) {
 
 bool AreSame(const volumes::Volume& volume, const Sighting& first, const Sighting& second) {
   return kernel::HaveSameNumbers(first.item, second.item) &&
-         (volume.NumbersTellItemsApart() || first.path == second.path);
+         (volume.NumbersIdentifyItems() || first.path == second.path);
 }
 
 kernel::Item Proved(const Sighting& seen, const volumes::Volume& volume, const kernel::Spot& spot) {
   kernel::Item item = seen.item;
-  if (!volume.NumbersTellItemsApart()) {
+  if (!volume.NumbersIdentifyItems()) {
     ProveByPlace(item, seen.path);
   } else if (item.handle.size == 0) {
     kernel::ReadProof(item, spot);
@@ -67,7 +67,7 @@ bool IsProvedByPlace(const kernel::Item& item) {
   return item.handle.type == kPlaceProof && item.handle.size == sizeof(Digest);
 }
 
-bool AreToSameItem(const kernel::Item& first, const kernel::Item& second) {
+bool ReferToSameItem(const kernel::Item& first, const kernel::Item& second) {
   if (!kernel::HaveSameNumbers(first, second)) return false;
   const bool isByPlace = IsProvedByPlace(first) || IsProvedByPlace(second);
   return !isByPlace || first.handle == second.handle;

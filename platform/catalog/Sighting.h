@@ -1,13 +1,13 @@
-// How sure the catalog is of a place, as types:
+// How certain the catalog is of an item's place, as types:
 //
 //   type         what is known
 //   ---------------------------------------------------------------------------------------------
-//   a lead       a path that somebody remembers or found in passing: just a std::string
-//   Sighting     the item was at that path, at one moment
-//   HeldFolder   the folder is open, so that device, number and mount stay its own; its volume
+//   a lead       an unverified path, remembered or found in passing: a plain std::string
+//   Sighting     the item was at that path at one moment
+//   HeldFolder   the folder is open, so its device, number and mount cannot be reused; its volume
 //
-// That a path led to a folder, or that a folder had an item under a name, is true of one moment
-// only. Two such facts are put together only when the held folder or the item is the pivot.
+// That a path led to a folder, or that a folder had an item under a name, holds for one moment
+// only. Two such facts may be combined only if both are about the same held folder or item.
 #pragma once
 
 #include <cstdint>
@@ -21,19 +21,18 @@
 
 namespace tallowmere::catalog {
 
-// An item and its absolute path, the item itself not followed when it is a link. Where nothing else
-// is said the path is canonical, as it was when the item was seen there. The item need not have its
-// handle.
+// An item and its absolute path; if the item is a link, it is not followed. Unless said otherwise,
+// the path was canonical when the item was seen. The item need not have its handle.
 struct Sighting {
   std::string path;
   kernel::Item item;
 };
 
-// A folder on a volume, held for its path alone (O_PATH): names are looked up in this very folder,
-// whatever is at its place by then. Copies share the descriptor.
+// A folder on a volume, held by an O_PATH descriptor: names are looked up in this very folder even
+// after it has moved. Copies share the descriptor.
 class HeldFolder {
  public:
-  // REQUIRES: `place` is the folder's, and `volume` the one that its mount belongs to.
+  // REQUIRES: `place` is the folder's, and its mount belongs to `volume`.
   HeldFolder(Sighting place, kernel::Descriptor descriptor, volumes::VolumePointer volume);
 
   const Sighting& Place() const { return mState->place; }
@@ -45,7 +44,7 @@ class HeldFolder {
 
   bool IsRoot() const { return mState->isRoot; }
 
-  // Where to look for a name in the folder, and for the folder itself.
+  // The spots of a name in the folder, and of the folder itself.
   kernel::Spot SpotOf(const char* name) const { return {mState->descriptor.Get(), name}; }
   kernel::Spot OwnSpot() const { return kernel::AtOpen(mState->descriptor.Get()); }
 
@@ -60,31 +59,31 @@ class HeldFolder {
   std::shared_ptr<const State> mState;
 };
 
-// The node id of an item of a volume, seen at its canonical path. Where numbers do not tell items
-// apart, one that shares the root folder's without being the root gets kNoVolumeID.
+// The node id of an item of a volume. Where numbers do not identify items, an item with the root
+// folder's number that is not the root gets kNoVolumeID. REQUIRES: the path of `seen` is canonical.
 std::uint32_t IDOf(const volumes::Volume& volume, const Sighting& seen);
 
-// Whether two sightings are of one item.
+// Whether two sightings are of the same item.
 bool AreSame(const volumes::Volume& volume, const Sighting& first, const Sighting& second);
 
-// The item of a sighting, just seen at a spot, with what proves its identity from now on: birth,
-// the handle, or on a volume whose numbers do not tell items apart its place, as a digest of the
-// canonical path where else is the handle. Such a reference does not survive a rename.
+// The item of a sighting just made at a spot, with what proves its identity from now on: its birth,
+// its handle, or, on a volume whose numbers do not identify items, its place: a digest of the
+// canonical path, stored instead of the handle. A reference proved by place does not survive a
+// rename.
 kernel::Item Proved(const Sighting& seen, const volumes::Volume& volume, const kernel::Spot& spot);
 bool IsProvedByPlace(const kernel::Item& item);
 
-// Whether two references are to one item: by number, and where both are proved by it by their
+// Whether two references refer to the same item: by number, and by place if both are proved by
 // place.
-bool AreToSameItem(const kernel::Item& first, const kernel::Item& second);
+bool ReferToSameItem(const kernel::Item& first, const kernel::Item& second);
 
-// The digest of an item that is proved by its place.
+// The digest in an item that is proved by its place.
 std::uint64_t PlaceDigest(const kernel::Item& item);
 
-// Whether an item seen just now at a spot is that of a reference. REQUIRES: its path is canonical.
+// Whether an item seen just now at a spot is a reference's. REQUIRES: its path is canonical.
 bool IsItemOf(const kernel::Item& reference, const Sighting& seen, const kernel::Spot& spot);
 
-// Whether the item of a reference is at a spot now. REQUIRES: `path` is the canonical path of the
-// spot.
+// Whether a reference's item is at a spot now. REQUIRES: `path` is the canonical path of the spot.
 bool IsItemAt(const kernel::Item& reference, const kernel::Spot& spot, std::string_view path);
 
 }  // namespace tallowmere::catalog

@@ -6,8 +6,8 @@
 namespace tallowmere::catalog {
 namespace {
 
-// The path by which the table of mounts knows the folder: links can have come on its way since it
-// was held.
+// The folder's path in the mount table: since it was held, folders on its path can have become
+// links.
 std::string CanonicalPathOf(Moment& moment, const HeldFolder& folder) {
   const auto seen = moment.See(folder.Path());
   const bool isStillThere = seen && kernel::HaveSameNumbers(seen->item, folder.Item()) &&

@@ -1,5 +1,5 @@
-// A volume can show one folder at several places, and in one of them something can be mounted over
-// one of its items, so that one name can be that of several items.
+// The places at which a volume shows one folder. Something can be mounted over an item in one of
+// them, so that a name means different items in different places.
 #pragma once
 
 #include <vector>
@@ -9,12 +9,12 @@
 
 namespace tallowmere::catalog {
 
-// Whether the volume shows each of its folders at one place, known without a look there.
+// Whether the volume shows each of its folders at one place only, as far as the mount table tells.
 bool HasOneView(const HeldFolder& folder);
 
-// The folder at all its places on the volume when in one of them something is mounted; else the
-// folder alone. The names of their own count in the first place, where every process sees the
-// folder alike; what cannot be seen there has short forms.
+// The folder at each of its places if something is mounted in one of them, otherwise the folder
+// alone. Own names count at the first place, which is the same in every process; items hidden there
+// have short forms.
 std::vector<HeldFolder> ViewsOf(Moment& moment, const HeldFolder& folder);
 
 }  // namespace tallowmere::catalog

@@ -11,8 +11,8 @@
 namespace tallowmere::catalog {
 namespace {
 
-// A change this recent may be followed by another with the same time: file systems count in ticks,
-// of two seconds at the coarsest (FAT).
+// In nanoseconds. A change this recent may be followed by another with the same time: file systems
+// count time in ticks, the coarsest (FAT) of two seconds.
 constexpr std::uint64_t kCoarsestTick = 2'000'000'000;
 
 constexpr std::size_t kMostOpenFolders = 16;
@@ -27,7 +27,7 @@ VolumeWalk::VolumeWalk(const volumes::Volume& volume, const volumes::Volumes& vo
   ++mKnown.walks;
 }
 
-void VolumeWalk::LookAtKnown() {
+void VolumeWalk::CheckKnownWithID() {
   for (const FolderNumber number : mTree.WithID(mQuestion.ID())) {
     const std::string path = mTree.PathOf(number);
     const auto held = HoldAt(path);
@@ -37,11 +37,11 @@ void VolumeWalk::LookAtKnown() {
   }
 }
 
-// `start`, the folders above it, and the volume's places. Those alone where folders are known by
-// their places: a whole path would be another one.
+// `start`, the folders above it, and the volume's places. Only the volume's places where folders
+// are known by place: a whole path would count as another place.
 std::vector<std::string> VolumeWalk::StartsFrom(const std::string& start) const {
   const auto& mountPoints = mVolume.Listed().MountPoints();
-  if (!mVolume.NumbersTellItemsApart()) return mountPoints;
+  if (!mVolume.NumbersIdentifyItems()) return mountPoints;
   const auto isMountPoint = [&](const std::string& path) {
     return std::find(mountPoints.begin(), mountPoints.end(), path) != mountPoints.end();
   };
@@ -66,8 +66,8 @@ void VolumeWalk::Walk(const std::string& start) {
   if (!mQuestion.IsSettled() && mQuestion.HasSeenAll()) mKnown.isWhole = true;
 }
 
-// After a walk that stopped: what was left before still waits, and what was found in folders that
-// were read anew, once. The rest is known.
+// After a walk that stopped early: keeps the folders that waited before, and adds those found in
+// folders first read by this walk. The rest is known already.
 void VolumeWalk::PutBack(std::vector<FolderPlace> left) {
   const auto isNews = [this](const FolderPlace& place) {
     return place.parent != kNoParent && mTree[place.parent].read == mKnown.walks;
@@ -110,8 +110,8 @@ void VolumeWalk::Visit(const FolderPlace& place) {
   VisitFolder({place, *spot, std::move(descriptor), *status});
 }
 
-// Where to look for the folder. Nullopt where something is mounted, and where the parent cannot be
-// entered.
+// The spot of a folder. Nullopt when something is mounted there, and when its parent cannot be
+// held.
 std::optional<kernel::Spot> VolumeWalk::SpotOf(const FolderPlace& place) {
   if (place.parent == kNoParent) return kernel::AtPath(place.name.c_str());
   if (!EnterFolder(place.parent)) return std::nullopt;
@@ -123,8 +123,8 @@ std::optional<kernel::Spot> VolumeWalk::SpotOf(const FolderPlace& place) {
   return kernel::Spot{parent.descriptor.Get(), place.name.c_str()};
 }
 
-// Whether a folder that was come upon belongs to the walk: at a start it is on the volume, further
-// down on the mount of its parent. What is mounted on the way has starts of its own.
+// Whether a folder belongs to the walk: a start is on the volume, any other folder on its parent's
+// mount. Mounts further down have starts of their own.
 bool VolumeWalk::IsOfVolume(const kernel::Item& item, const FolderPlace& place) const {
   if (place.parent == kNoParent) {
     const auto volume = mVolumes.OfItem(item, place.name);
@@ -161,7 +161,7 @@ void VolumeWalk::ReadFolder(FolderNumber folder, Visited visited) {
   if (!visited.descriptor.IsOpen()) {
     auto opened = OpenAgain(visited);
     if (!opened) {
-      // Another server, or a new ticket, can let it be read without a change.
+      // Permission can come without a change of the folder, from a server or with a new ticket.
       if (kernel::MeansRefused(opened.Error())) MarkAsSeen(folder);
       mTree[folder].isRead = false;
       return;
@@ -181,7 +181,7 @@ void VolumeWalk::ReadFolder(FolderNumber folder, Visited visited) {
   if (waiting.size() > before) KeepOpen(folder, std::move(visited.descriptor));
 }
 
-// Opens the folder that was seen there. Another one may have come in the meantime.
+// Opens the folder that was seen. Another one may have taken its place meanwhile.
 kernel::Result<kernel::Descriptor> VolumeWalk::OpenAgain(const Visited& visited) {
   auto opened = OpenToRead(visited.spot);
   const auto status = opened ? kernel::ReadStatus(kernel::AtOpen(opened->Get()))
@@ -195,7 +195,7 @@ kernel::Result<kernel::Descriptor> VolumeWalk::OpenAgain(const Visited& visited)
   return kernel::kNotThere;
 }
 
-// Stops when the question is settled.
+// Reads a folder's entries until the question is settled.
 VolumeWalk::Reading VolumeWalk::ReadEntries(FolderNumber folder,
                                             const kernel::Descriptor& descriptor) {
   const bool isNew = !mTree[folder].isRead || mQuestion.HasToReadAll();
@@ -210,7 +210,7 @@ VolumeWalk::Reading VolumeWalk::ReadEntries(FolderNumber folder,
       if (mQuestion.IsSettled()) return Reading::kStopped;
     }
     if (seen == Seen::kHidden) reading = Reading::kPartly;
-    // What an earlier reading found is known or waits already.
+    // Subfolders found by an earlier reading are known or waiting already.
     if (seen == Seen::kFolder && isNew) mKnown.waiting.push_back({folder, entry->name});
   }
   if (reader.FailedBy().number == 0) return reading;
@@ -218,8 +218,8 @@ VolumeWalk::Reading VolumeWalk::ReadEntries(FolderNumber folder,
   return Reading::kPartly;
 }
 
-// Offers the item at an entry of an open folder. Hidden when something covers it and when it cannot
-// be looked at.
+// Offers the item at an entry of an open folder. Returns kHidden when something is mounted over it
+// and when it cannot be examined.
 VolumeWalk::Seen VolumeWalk::SeeEntry(FolderNumber folder, const kernel::Spot& spot) {
   const std::string path = foundation::JoinPath(mTree.PathOf(folder), spot.name);
   if (mVolumes.IsMountPoint(path)) {
@@ -239,7 +239,8 @@ VolumeWalk::Seen VolumeWalk::SeeEntry(FolderNumber folder, const kernel::Spot& s
   return kernel::IsFolder(status->item) ? Seen::kFolder : Seen::kOther;
 }
 
-// A folder is gone when it is not there even after all others have been looked at.
+// A folder counts as gone only when it is still missing after all others have been checked: it may
+// have moved.
 void VolumeWalk::CheckKnown() {
   for (const bool isLast : {false, true}) {
     for (FolderNumber number = 0; number < mTree.Count() && !mQuestion.IsSettled(); ++number) {
@@ -266,12 +267,12 @@ bool VolumeWalk::IsSteady() const {
   return true;
 }
 
-// Whether the folder is where it is known to be, as it was when it was read, and need not be read
-// for this question. It then counts as seen.
+// Whether the folder is at its known place, unchanged since it was read, and need not be read for
+// this question. If so, marks it as seen.
 bool VolumeWalk::CheckUnchanged(FolderNumber number) {
   const FolderTree::Folder& folder = mTree[number];
   if (!folder.isRead || mQuestion.HasToRead(folder.read)) return false;
-  // Unless its parent is where it was, the path may lead through a link.
+  // If its parent has moved, the path may lead through a link.
   if (folder.parent != kNoParent && !IsSeen(folder.parent)) return false;
   const std::string path = mTree.PathOf(number);
   if (path.empty() || !mVolumes.IsReachable(mVolume.Listed(), path)) return false;
@@ -285,8 +286,8 @@ bool VolumeWalk::CheckUnchanged(FolderNumber number) {
   return true;
 }
 
-// A folder that no walk can see. One that is merely covered, or not to be looked at, may come back
-// without a change.
+// Forgets a folder that does not exist any more. One that is only covered, or cannot be examined,
+// may come back unchanged.
 void VolumeWalk::ForgetIfGone(FolderNumber folder) {
   mTree[folder].isRead = false;
   const std::string path = mTree.PathOf(folder);
@@ -298,7 +299,8 @@ void VolumeWalk::ForgetIfGone(FolderNumber folder) {
   mTree.Forget(folder);
 }
 
-// Nullopt where it cannot be told. What is in another subvolume than its parent gets its handle.
+// Nullopt when the handle that the id needs cannot be read. An item in another subvolume than its
+// parent gets its handle.
 std::optional<std::uint32_t> VolumeWalk::IDOf(kernel::Item& item, FolderNumber parent,
                                               const kernel::Spot& spot) const {
   if (parent != kNoParent && mTree.RegionOf(parent).device == item.device) {
@@ -310,7 +312,7 @@ std::optional<std::uint32_t> VolumeWalk::IDOf(kernel::Item& item, FolderNumber p
   return std::nullopt;
 }
 
-// `change` and `now` as they were before it was read.
+// `change` and `now` are the times before it was read.
 void VolumeWalk::MarkAsRead(FolderNumber number, kernel::Nanoseconds change,
                             kernel::Nanoseconds now) {
   MarkAsSeen(number);
@@ -322,8 +324,8 @@ void VolumeWalk::MarkAsRead(FolderNumber number, kernel::Nanoseconds change,
   folder.isRead = !mayChangeUnseen;
 }
 
-// Something in the folder was not seen that may be seen later though the folder does not change, or
-// at another mount.
+// Has the folder read again next time, because something in it was not seen that may become visible
+// without a change of the folder.
 void VolumeWalk::Invalidate(FolderNumber folder) {
   if (folder == kNoParent) return;
   mTree[folder].isRead = false;
@@ -335,8 +337,8 @@ kernel::Result<kernel::Descriptor> VolumeWalk::OpenToRead(const kernel::Spot& sp
   return kernel::OpenForReading(spot);
 }
 
-// The folder at the known path of one, no links on the way. kNoVolume where something else is
-// mounted.
+// The folder at a known path, without links. Returns kNoVolume when something else is mounted
+// there.
 kernel::Result<VolumeWalk::HeldItem> VolumeWalk::HoldAt(const std::string& path) const {
   const bool isReachable = !path.empty() && mVolumes.IsReachable(mVolume.Listed(), path);
   if (!isReachable) return kernel::kNoVolume;
@@ -347,8 +349,8 @@ kernel::Result<VolumeWalk::HeldItem> VolumeWalk::HoldAt(const std::string& path)
   return HeldItem{*std::move(held), status->item};
 }
 
-// Makes a folder the last of the open ones. False when it cannot be held, and when another is in
-// its place.
+// Makes a folder the innermost open one. Returns false when it cannot be held, and when another has
+// taken its place.
 bool VolumeWalk::EnterFolder(FolderNumber folder) {
   while (!mOpen.empty() && mOpen.back().number != folder) mOpen.pop_back();
   if (!mOpen.empty()) return true;

@@ -1,8 +1,8 @@
-// One walk over the folders of a volume for one question. It goes on where the last one stopped,
-// and reads again only what has changed since.
+// One walk over the folders of a volume, for one question. It resumes where the last walk stopped,
+// and rereads only what has changed since.
 //
-// It never leaves its volume, waits for no server and no automounter, and passes over what it may
-// not read. When it ends, nothing is open.
+// A walk never leaves its volume, triggers no automounter, waits for no other volume's server, and
+// skips what it may not read. Nothing stays open when it ends.
 #pragma once
 
 #include <cstdint>
@@ -19,34 +19,35 @@
 
 namespace tallowmere::catalog {
 
-// What the walks over a volume have learned so far.
+// What the walks over a volume have learned.
 struct KnownFolders {
   FolderTree tree;
-  std::vector<FolderPlace> waiting;  // to be visited, the last one first
-  bool isWhole = false;              // every start has been walked from
-  WalkNumber walks = kNoWalk;        // how many there were
-  std::uint64_t opened = 0;          // how many folders they opened
+  std::vector<FolderPlace> waiting;  // to be visited, from the back
+  bool isWhole = false;              // walked from every start
+  WalkNumber walks = kNoWalk;        // number of the latest
+  std::uint64_t opened = 0;          // folders opened so far
 };
 
 class VolumeWalk {
  public:
-  // REQUIRES: all outlive the walk. After an exception `known` is of no use any more.
+  // REQUIRES: all outlive the walk. After an exception, `known` is unusable.
   VolumeWalk(const volumes::Volume& volume, const volumes::Volumes& volumes, KnownFolders& known,
              Question& question);
 
-  // Looks at the known folders that have the id.
-  void LookAtKnown();
+  // Checks the known folders with the id.
+  void CheckKnownWithID();
 
-  // Visits folders near `start` first, then those that earlier walks have left, then the rest of
-  // the volume.
+  // Visits folders near `start` first, then those left by earlier walks, then the rest of the
+  // volume.
   void Walk(const std::string& start);
 
-  // Looks at every known folder that this walk has not seen: those that have changed are read
-  // again, and those that have moved are found where they are now.
+  // Checks every known folder that this walk has not seen: rereads those that have changed, and
+  // finds those that have moved.
   void CheckKnown();
 
-  // Whether every folder still is as this walk has seen it, by its change time: all of it was so at
-  // one time, when the walk ended, and nothing moved from where it had not looked to where it had.
+  // Whether every folder still has the change time that this walk saw. If so, the whole volume was
+  // in that state when the walk ended, and nothing moved from a folder not yet read into one
+  // already read.
   bool IsSteady() const;
 
  private:
@@ -100,7 +101,7 @@ class VolumeWalk {
   KnownFolders& mKnown;
   FolderTree& mTree;
   Question& mQuestion;
-  std::vector<OpenFolder> mOpen;  // the way to the folder in hand, its last part
+  std::vector<OpenFolder> mOpen;  // the innermost folders on the way to the current one
 };
 
 }  // namespace tallowmere::catalog

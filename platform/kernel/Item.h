@@ -6,7 +6,6 @@
 // before it was read: file systems reuse a freed number at once, and time advances in ticks.
 // Without a device, birth proves nothing: an overlay gives an item another birth when it is first
 // renamed or written to.
-// renamed or written to.
 //
 //   birth    handle    proved by                   not noticed
 //   ---------------------------------------------------------------------------------------------

@@ -36,7 +36,7 @@ enum class UpperIDs : std::uint8_t {
 
 // What the kernel says of an item.
 struct ItemNumbers {
-  std::uint64_t inode;  // never 0 where numbers tell items apart
+  std::uint64_t inode;  // never 0 where numbers identify items
   std::uint64_t device;
   std::uint64_t subvolume;  // 0 when not asked for: see NeedsSubvolume
 
@@ -81,7 +81,7 @@ inline constexpr std::size_t kMostCandidates = 1024;
 std::optional<std::vector<Candidate>> CandidatesOf(std::uint32_t id, const NodeIDRule& rule,
                                                    std::uint64_t highestInode);
 
-// Whether at most one number of the volume has the id. Where numbers tell items apart, at most one
+// Whether at most one number of the volume has the id. Where numbers identify items, at most one
 // item then has it.
 bool IsCertain(std::uint32_t id, const NodeIDRule& rule, std::uint64_t highestInode);
 

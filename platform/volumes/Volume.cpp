@@ -154,7 +154,7 @@ std::uint64_t Volume::HighestInode() const {
 }
 
 bool Volume::IsCertain(std::uint32_t id) const {
-  if (!NumbersTellItemsApart()) return false;
+  if (!NumbersIdentifyItems()) return false;
   return names::IsInodeNumber(id) || id == names::kRootFolderID ||
          names::IsCertain(id, mRule, HighestInode());
 }
@@ -162,7 +162,7 @@ bool Volume::IsCertain(std::uint32_t id) const {
 bool Volume::IsRoot(const kernel::Item& item, const std::string& path) const {
   if (!kernel::HaveSameNumbers(item, mRoot)) return false;
   const auto& mountPoints = mListed.MountPoints();
-  return NumbersTellItemsApart() ||
+  return NumbersIdentifyItems() ||
          std::find(mountPoints.begin(), mountPoints.end(), path) != mountPoints.end();
 }
 

@@ -41,7 +41,7 @@ class Volume {
 
   // Whether device and inode number identify one item while the volume is mounted. Where they do
   // not, only their places tell two items apart.
-  bool NumbersTellItemsApart() const { return mKind.numbersTellItemsApart; }
+  bool NumbersIdentifyItems() const { return mKind.numbersTellItemsApart; }
 
   // Whether an item read without its handle needs it for IDOf, because the id depends on the
   // subvolume, which only the handle tells.

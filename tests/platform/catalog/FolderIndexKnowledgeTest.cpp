@@ -704,7 +704,7 @@ TEST_F(AnIndex, FindsAFileInAnOverlayOfTwoFileSystemsByItsOwnNumber) {
   EXPECT_EQ(FindAny(ID("a/y")), PathTo("a/y"));
 }
 
-// An id that two items could have, on a volume whose numbers tell items apart.
+// An id that two items could have, on a volume whose numbers identify items.
 class AnIndexOfMixedIDs : public AnIndex {
  protected:
   void SetUp() override {

@@ -25,7 +25,7 @@ class AFolderTree : public testing::Test {
     return LearnIn(mTree, parent, name, number);
   }
 
-  FolderTree mTree{FolderTree::TellApart::kNumbers};
+  FolderTree mTree{FolderTree::Identity::kByNumbers};
   FolderNumber mTop = Learn(kNoParent, "/v", 100);
 };
 
@@ -37,7 +37,7 @@ TEST_F(AFolderTree, TellsThePathOfAFolder) {
 }
 
 TEST_F(AFolderTree, TellsThePathOfAFolderInTheRoot) {
-  FolderTree tree(FolderTree::TellApart::kNumbers);
+  FolderTree tree(FolderTree::Identity::kByNumbers);
   EXPECT_EQ(tree.PathOf(LearnIn(tree, LearnIn(tree, kNoParent, "/", 2), "a", 101)), "/a");
 }
 
@@ -63,7 +63,7 @@ TEST_F(AFolderTree, FindsTheFoldersWithAnID) {
   const FolderNumber same = mTree.Learn({mTop, "b"}, FolderWith(102), 101);
   EXPECT_EQ(mTree.WithID(101), (std::vector{a, same}));
   EXPECT_TRUE(mTree.WithID(999).empty());
-  EXPECT_TRUE(FolderTree(FolderTree::TellApart::kNumbers).WithID(101).empty());
+  EXPECT_TRUE(FolderTree(FolderTree::Identity::kByNumbers).WithID(101).empty());
 }
 
 TEST_F(AFolderTree, FindsEachOfManyFolders) {
@@ -128,12 +128,12 @@ TEST_F(AFolderTree, IsEmptyWhenItIsCleared) {
   Learn(mTop, "a", 101);
   mTree.Clear();
   EXPECT_EQ(mTree.Count(), 0u);
-  EXPECT_EQ(mTree.Size(), FolderTree(FolderTree::TellApart::kNumbers).Size());
+  EXPECT_EQ(mTree.Size(), FolderTree(FolderTree::Identity::kByNumbers).Size());
 }
 
 class AFolderTreeByPlaces : public AFolderTree {
  protected:
-  AFolderTreeByPlaces() : mPlaces(FolderTree::TellApart::kPlaces) {
+  AFolderTreeByPlaces() : mPlaces(FolderTree::Identity::kByPlace) {
     mRoot = LearnIn(mPlaces, kNoParent, "/v", 100);
   }
 

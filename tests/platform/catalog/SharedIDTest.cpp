@@ -1,4 +1,4 @@
-// Items whose numbers mix to one id, on a file system whose numbers tell items apart and on one
+// Items whose numbers mix to one id, on a file system whose numbers identify items and on one
 // whose numbers are not relied on.
 #include <Tallowmere/Process.h>
 

@@ -34,7 +34,7 @@ class AnUntrustedVolume : public AnIndex {
     std::filesystem::permissions(mNumbered->Path().parent_path(), std::filesystem::perms(0755));
     mTop = mNumbered->Path();
     UseVolumeOf(mTop);
-    ASSERT_FALSE(mVolume->NumbersTellItemsApart());
+    ASSERT_FALSE(mVolume->NumbersIdentifyItems());
     for (const char* name : {"a", "b", "c"}) Make(name);
   }
   std::string MakeShared(const std::string& name) { return mNumbered->MakeFolder(name, kShared); }
@@ -285,7 +285,7 @@ class AnOverlayOfSubvolumes : public ABtrfsVolume {
     if (!mOverlay->IsMounted()) GTEST_SKIP() << "no overlay here";
     mTop = place;
     UseVolumeOf(mTop);
-    ASSERT_FALSE(mVolume->NumbersTellItemsApart());
+    ASSERT_FALSE(mVolume->NumbersIdentifyItems());
     ASSERT_TRUE(mVolume->Kind().keepsNumbers);
   }
 
