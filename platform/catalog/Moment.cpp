@@ -272,12 +272,19 @@ const Look* Moment::LookFor(const kernel::Item& reference) const {
 
 // --- References ---------------------------------------------------------------------------------
 
+// Keeps the look first, so that LookFor finds the name last asked for of an item with several.
 kernel::Item Moment::Prove(const Look& look) {
   const kernel::Item reference = Proved(look.Seen(), *look.Folder().Volume(), look.Spot());
-  for (auto& known : mLooks) {
-    const bool isIt =
-        known.fact.Path() == look.Path() && kernel::HaveSameNumbers(known.fact.Item(), look.Item());
-    if (isIt) known.reference = reference;
+  const auto known = std::find_if(mLooks.begin(), mLooks.end(), [&](const auto& noted) {
+    return noted.fact.Path() == look.Path() &&
+           kernel::HaveSameNumbers(noted.fact.Item(), look.Item());
+  });
+  if (known != mLooks.end()) {
+    known->reference = reference;
+    std::rotate(mLooks.begin(), known, known + 1);
+  } else {
+    if (mLooks.size() == kMostLooks) mLooks.pop_back();
+    mLooks.insert(mLooks.begin(), {look, reference});
   }
   return reference;
 }

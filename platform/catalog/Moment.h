@@ -136,7 +136,8 @@ class Moment {
   // The item at a path, following links on the way, with its canonical path.
   kernel::Result<Sighting> See(const std::string& path);
 
-  // A look of this moment that saw a reference's item, or null.
+  // A look of this moment that saw a reference's item, or null. Of several, by different names, the
+  // one last proved.
   const Look* LookFor(const kernel::Item& reference) const;
 
   // --- Climbs ---------------------------------------------------------------------------------

@@ -116,6 +116,25 @@ TEST_F(AMoment, HoldsAFolderOnceForAllItsItems) {
   EXPECT_LT(known->size(), unknown->size());
 }
 
+TEST_F(AMoment, GivesThePathByWhichAnItemWithTwoNamesWasFound) {
+  const std::string path = PathTo("first/a/b/" + std::string(80, 'x') + ".aif");
+  std::filesystem::create_hard_link(PathTo("first/a/b/x"), path);
+  const FSSpec spec = SpecOf(path);
+  const Moment moment;
+  ReferenceTo(PathTo("first/a/b/x"));
+  EXPECT_EQ(ItemOf(spec), path);
+}
+
+TEST_F(AMoment, GivesThePathByWhichAnItemWasFoundAfterManyOthers) {
+  const std::string path = PathTo("first/a/b/y");
+  std::filesystem::create_hard_link(PathTo("first/a/b/x"), path);
+  const FSSpec spec = SpecOf(path);
+  const Moment moment;
+  ReferenceTo(PathTo("first/a/b/x"));
+  for (int i = 0; i < 20; ++i) ReferenceTo(PathTo("first/" + std::to_string(i)));
+  EXPECT_EQ(ItemOf(spec), path);
+}
+
 TEST_F(AMoment, AnswersAsOutside) {
   const FSSpec outside = SpecOf(PathTo("first/a/b/x"));
   const Moment moment;
