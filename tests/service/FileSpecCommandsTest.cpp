@@ -136,7 +136,7 @@ TEST_F(FileSpecCommands, ARecordGivesThePath) {
   }
 }
 
-TEST_F(FileSpecCommands, TheRecordOfAnotherVolumeIsLookedForOnAllIfSoWished) {
+TEST_F(FileSpecCommands, TheRecordOfAnotherVolumeIsSearchedForOnAllIfRequested) {
   const std::string elsewhere = Record(-32768, mParent, "file");
   for (const unsigned search : {1u, 2u, 255u}) {
     EXPECT_TRUE(mService.Answers(PathOfRecordRequest(elsewhere, search, 0), PathResponse(mFile)));

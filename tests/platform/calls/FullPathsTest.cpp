@@ -88,7 +88,7 @@ TEST_F(HFSPathsToRecords, AboveTheRootThereIsNoFolder) {
   EXPECT_TRUE(IsUntouched());
 }
 
-TEST_F(HFSPathsToRecords, AFullPathDoesNotMindVolumeAndFolder) {
+TEST_F(HFSPathsToRecords, AFullPathIgnoresVolumeAndFolder) {
   const std::string full = Full(mTop + "/a/b/file");
   EXPECT_EQ(From(full), "a/b/file");
   EXPECT_EQ(From(32767, 0xFFFFFFFF, full), "a/b/file");
@@ -103,7 +103,7 @@ TEST_F(HFSPathsToRecords, AVolumeAloneIsItsRoot) {
   EXPECT_EQ(From(root + "::"), "(-120)");
 }
 
-TEST_F(HFSPathsToRecords, AnUnknownVolumeIsSaid) {
+TEST_F(HFSPathsToRecords, AnUnknownVolumeIsReported) {
   EXPECT_EQ(From("no such volume:x"), "(-35)");
   EXPECT_EQ(From(32767, 2, "x"), "(-35)");
   EXPECT_EQ(From(32767, 0, ""), "(-35)");
@@ -156,7 +156,7 @@ TEST_F(HFSPathsToRecords, ALongNameThatExistsGetsAShortRecord) {
   EXPECT_LE(mSpec.name[0], 31);
 }
 
-TEST_F(HFSPathsToRecords, AMissingFolderOnTheWayIsSaid) {
+TEST_F(HFSPathsToRecords, AMissingFolderOnTheWayIsReported) {
   EXPECT_EQ(From(":missing:x"), "(-120)");
   EXPECT_EQ(From(":file:x"), "(-120)");
   EXPECT_EQ(From(":file:"), "(-120)");
@@ -243,7 +243,7 @@ TEST_F(HFSPathsToRecords, NamesExchangeSlashesAndColons) {
   EXPECT_EQ(From(":::a:b:x/y"), "a/b/x:y");
 }
 
-TEST_F(HFSPathsToRecords, AFolderThatMayNotBeEnteredIsSaid) {
+TEST_F(HFSPathsToRecords, AFolderThatMayNotBeEnteredIsReported) {
   chmod(mTop.c_str(), 0755);
   chmod((mTop + "/a/b").c_str(), 0700);
   EXPECT_TRUE(HoldsForNobody([&] { return From("file") == "(-5000)"; }));

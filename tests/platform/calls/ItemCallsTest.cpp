@@ -168,7 +168,7 @@ TEST_F(ItemCalls, IDsThatNoItemHasAreNotFound) {
   }
 }
 
-TEST_F(ItemCalls, AnUnknownVolumeIsSaidFirst) {
+TEST_F(ItemCalls, AnUnknownVolumeIsReportedFirst) {
   FSRef reference{};
   EXPECT_EQ(FSResolveNodeID(kNoVolume, 2, &reference), nsvErr);
   EXPECT_EQ(ItemOf(MakeRecord(kNoVolume, 2, "x")), "(-35)");
@@ -186,7 +186,7 @@ TEST_F(ItemCalls, ARecordOfARootNeedsTheVolumesName) {
   EXPECT_EQ(ItemOf(FSSpec{}), "(-120)");
 }
 
-TEST_F(ItemCalls, ARecordWhoseNameIsLongerThanItsRoomIsNoItem) {
+TEST_F(ItemCalls, ARecordWithANameLongerThanItsFieldIsNoItem) {
   FSSpec spec = SpecOf(mFile);
   spec.name[0] = 64;
   EXPECT_EQ(ItemOf(spec), "(-43)");
@@ -252,7 +252,7 @@ TEST_F(ItemCalls, AFoldersNameAndParentAreThoseOfTheCatalog) {
   EXPECT_EQ(static_cast<std::uint32_t>(block.dirInfo.ioDrParID), IDOf(mFolder.Path()));
 }
 
-TEST_F(ItemCalls, AFoldersNameIsNotWrittenWhenItIsNotWanted) {
+TEST_F(ItemCalls, AFoldersNameIsNotWrittenUnlessRequested) {
   auto block = Block(mInfo.nodeID);
   EXPECT_EQ(CatalogInfo(block), noErr);
 }
@@ -350,7 +350,7 @@ TEST_F(ItemCalls, ItemsOfAKernelInterfaceAreOnNoVolume) {
   EXPECT_EQ(PathOf(reference), "/proc/version");
 }
 
-TEST_F(ItemCalls, TheIDOfWhatIsOnNoVolumeIsNotSearchedFor) {
+TEST_F(ItemCalls, TheIDOfAnItemOnNoVolumeIsNotSearchedFor) {
   const auto calls = CallsOf([] {},
                              [&] {
                                ItemOf(MakeRecord(mInfo.volume, 3, "x"));
@@ -369,7 +369,7 @@ TEST_F(ItemCalls, AFileThatIsMountedAloneComesBack) {
   EXPECT_EQ(ItemOf(SpecOf(mFile)), mFile);
 }
 
-TEST_F(ItemCalls, PermissionRefusedIsSaid) {
+TEST_F(ItemCalls, RefusedPermissionIsReported) {
   std::filesystem::permissions(mFolder.Path(), std::filesystem::perms(0755));
   const FSRef closed = ReferenceTo(mPath);
   chmod(mPath.c_str(), 0600);

@@ -68,7 +68,7 @@ TEST(VolumeCalls, AnUnknownNumberLeavesTheBlockAndTheNameUnchanged) {
   EXPECT_EQ(0, std::memcmp(name, "\3old", 4));
 }
 
-TEST(VolumeCalls, ANameThatIsNotWantedIsNotWritten) {
+TEST(VolumeCalls, ANameThatIsNotRequestedIsNotWritten) {
   HParamBlockRec block{};
   EXPECT_EQ(PBHGetVInfoSync(&block), noErr);
   EXPECT_LT(block.volumeParam.ioVRefNum, 0);
@@ -182,7 +182,7 @@ TEST_F(AWalkOverTheVolumes, SeesOneStateByEitherCallAtEachOfItsSteps) {
   EXPECT_EQ(during, mBefore);
 }
 
-TEST_F(AWalkOverTheVolumes, ThatIsContinuedByNoIndexSeesTheVolumesOfNow) {
+TEST_F(AWalkOverTheVolumes, AskedForAnIndexThatIsNotTheNextSeesTheCurrentVolumes) {
   const auto pastTheLast = static_cast<SInt16>(mBefore.size() + 1);
   VolumeAt(1);
   std::optional<ScopedMount> appearing;

@@ -138,7 +138,7 @@ TEST_F(NumbersThatAreTakenAgain, AreNotAnsweredWithARememberedPlace) {
   EXPECT_EQ(ItemOf(MakeRecord(info.volume, info.nodeID, "x")), "(-120)");
 }
 
-TEST_F(NumbersThatAreTakenAgain, DoNotMakeAReferenceOneToTheNewItem) {
+TEST_F(NumbersThatAreTakenAgain, DoNotLeadAReferenceToTheNewItem) {
   std::ofstream(PathTo("file")) << "old";
   const FSRef old = ReferenceTo(PathTo("file"));
   const std::uint32_t id = IDOf(PathTo("file"));

@@ -170,7 +170,7 @@ TEST_F(AnIndex, FindsEverythingInFoldersThatChangedPlaces) {
   for (const char* name : {"a", "b", "a/x", "b/x", "a/x/below", "b/x/below"}) ExpectFound(name);
 }
 
-TEST_F(AnIndex, FindsFoldersThatHaveTakenEachOthersPlaceInTheWay) {
+TEST_F(AnIndex, FindsFoldersExchangedOnTheWay) {
   Make("a/b");
   ExpectFound("a/b");
   const std::uint32_t outer = ID("a");
@@ -220,7 +220,7 @@ TEST_F(AnIndex, StopsAsSoonAsTheAnswerIsCertain) {
   EXPECT_LT(mIndex->OpenedFolders(), 10u);
 }
 
-TEST_F(AnIndex, GoesOnWhereItStopped) {
+TEST_F(AnIndex, ResumesWhereItStopped) {
   for (int i = 0; i < 200; ++i) Make("a/b" + std::to_string(i) + "/c/d");
   LetChangesAge();
   for (int i = 0; i < 200; ++i) ExpectFound("a/b" + std::to_string(i) + "/c/d");
@@ -375,7 +375,7 @@ TEST_F(AnIndex, ReadsEachFolderOnceForAFileHoweverRecentItIs) {
   EXPECT_EQ(OpenedForAny(0x1234567B, "a/b/c"), kFolders);
 }
 
-TEST_F(AnIndex, KeepsTheFoldersThatItKnowsWhileItLooksForAFile) {
+TEST_F(AnIndex, KeepsItsFoldersWhileItSearchesForAFile) {
   for (int i = 0; i < 20; ++i) Make("a/b" + std::to_string(i) + "/c/d");
   MakeFile("a/x");
   KnowEverything();
@@ -394,7 +394,7 @@ TEST_F(AnIndex, LooksForAFileNearItsStartFirst) {
   EXPECT_LE(OpenedForAny(ID("near/y/x"), "near"), 2u);
 }
 
-TEST_F(AnIndex, GoesOnWhereItStoppedAfterALookForAFile) {
+TEST_F(AnIndex, ResumesWhereItStoppedAfterASearchForAFile) {
   for (int i = 0; i < 200; ++i) Make("a/b" + std::to_string(i) + "/c/d");
   MakeFile("a/b99/x");
   const std::uint32_t file = ID("a/b99/x");
@@ -413,7 +413,7 @@ TEST_F(AnIndex, GoesOnWhereItStoppedAfterALookForAFile) {
   EXPECT_LE(opened(true), opened(false));
 }
 
-TEST_F(AnIndex, KeepsWhatWaitedWhenALookForAFileStops) {
+TEST_F(AnIndex, KeepsWaitingFoldersWhenASearchForAFileStops) {
   for (int i = 0; i < 100; ++i) Make("a/b" + std::to_string(i) + "/c/d");
   MakeFile("a/b50/x");
   const std::uint32_t file = ID("a/b50/x");
@@ -428,7 +428,7 @@ TEST_F(AnIndex, KeepsWhatWaitedWhenALookForAFileStops) {
   }
 }
 
-TEST_F(AnIndex, DoesNotGrowWithLooksForFiles) {
+TEST_F(AnIndex, DoesNotGrowWithSearchesForFiles) {
   for (int i = 0; i < 300; ++i) Make("a/a folder of some length " + std::to_string(i) + "/c");
   for (int i = 0; i < 300; i += 10) {
     MakeFile("a/a folder of some length " + std::to_string(i) + "/x");
@@ -764,13 +764,13 @@ TEST_F(AnIndexOfMixedIDs, FindsNoneWhenAFolderCannotBeReadToItsEnd) {
   EXPECT_EQ(Find(mID), mSmall);
 }
 
-TEST_F(AnIndexOfMixedIDs, PassesOverFoldersWithoutPermission) {
+TEST_F(AnIndexOfMixedIDs, SkipsFoldersWithoutPermission) {
   chmod(PathTo("deep/1/2").c_str(), 0700);
   EXPECT_TRUE(HoldsForNobody(
       [&] { return Find(mID) == mSmall && FindAny(mID) == mSmall && Find(mID) == mSmall; }));
 }
 
-TEST_F(AnIndexOfMixedIDs, PassesOverFoldersThatHaveNoPath) {
+TEST_F(AnIndexOfMixedIDs, SkipsFoldersThatHaveNoPath) {
   kernel::Descriptor folder(open(PathTo("deep").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   const std::string name(250, 'd');
   for (int depth = 0; depth < 40; ++depth) {

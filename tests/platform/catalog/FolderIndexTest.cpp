@@ -79,7 +79,7 @@ TEST_F(AFolderIndex, FollowsNoLinkToAFolder) {
   ExpectFoundFrom("a", "b/x");
 }
 
-TEST_F(AFolderIndex, PassesOverFoldersThatCannotBeNamedFromTheRoot) {
+TEST_F(AFolderIndex, SkipsFoldersWithoutAPathFromTheRoot) {
   mFolder.MakeFolder("a");
   mFolder.MakeFolder("b");
   mFolder.MakeFile("b/x");

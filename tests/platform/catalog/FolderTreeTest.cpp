@@ -29,14 +29,14 @@ class AFolderTree : public testing::Test {
   FolderNumber mTop = Learn(kNoParent, "/v", 100);
 };
 
-TEST_F(AFolderTree, TellsThePathOfAFolder) {
+TEST_F(AFolderTree, KnowsThePathOfAFolder) {
   const FolderNumber inner = Learn(Learn(mTop, "a", 101), "b", 102);
   EXPECT_EQ(mTree.PathOf(inner), "/v/a/b");
   EXPECT_EQ(mTree.PathOf({inner, "c"}), "/v/a/b/c");
   EXPECT_EQ(mTree.PathOf({kNoParent, "/x"}), "/x");
 }
 
-TEST_F(AFolderTree, TellsThePathOfAFolderInTheRoot) {
+TEST_F(AFolderTree, KnowsThePathOfAFolderInTheRoot) {
   FolderTree tree(FolderTree::Identity::kByNumbers);
   EXPECT_EQ(tree.PathOf(LearnIn(tree, LearnIn(tree, kNoParent, "/", 2), "a", 101)), "/a");
 }
@@ -49,7 +49,7 @@ TEST_F(AFolderTree, KnowsAFolderAgainWhereverItHasMoved) {
   EXPECT_EQ(mTree.PathOf(below), "/v/a/c/below");
 }
 
-TEST_F(AFolderTree, LeavesAFolderUnderItsParentThatIsComeUponByItsPath) {
+TEST_F(AFolderTree, KeepsAFolderUnderItsParentWhenItIsMetByItsPath) {
   const FolderNumber a = Learn(mTop, "a", 101);
   EXPECT_EQ(Learn(kNoParent, "/v/a", 101), a);
   Learn(kNoParent, "/w", 100);
@@ -93,14 +93,14 @@ TEST_F(AFolderTree, IsMostlyWasteWhenMostNamesAreOfFoldersThatAreGone) {
   EXPECT_TRUE(mTree.IsMostlyWaste());
 }
 
-TEST_F(AFolderTree, HasNoPathForFoldersThatSeemToHoldEachOther) {
+TEST_F(AFolderTree, HasNoPathForFoldersThatSeemToContainEachOther) {
   const FolderNumber a = Learn(mTop, "a", 101);
   const FolderNumber b = Learn(a, "b", 102);
   Learn(b, "a", 101);
   EXPECT_EQ(mTree.PathOf(a), "");
 }
 
-TEST_F(AFolderTree, TellsFoldersOfTwoDevicesApart) {
+TEST_F(AFolderTree, DistinguishesFoldersOfTwoDevices) {
   const FolderNumber here = mTree.Learn({mTop, "a"}, FolderWith(101, 1), 101);
   const FolderNumber there = mTree.Learn({mTop, "b"}, FolderWith(101, 2), 101);
   EXPECT_NE(here, there);
@@ -141,7 +141,7 @@ class AFolderTreeByPlaces : public AFolderTree {
   FolderNumber mRoot;
 };
 
-TEST_F(AFolderTreeByPlaces, TellsFoldersWithOneNumberApart) {
+TEST_F(AFolderTreeByPlaces, DistinguishesFoldersWithTheSameNumber) {
   const FolderNumber a = LearnIn(mPlaces, mRoot, "a", 101);
   const FolderNumber b = LearnIn(mPlaces, mRoot, "b", 101);
   const FolderNumber inner = LearnIn(mPlaces, a, "b", 101);
@@ -159,7 +159,7 @@ TEST_F(AFolderTreeByPlaces, KnowsAFolderAgainAtItsPlace) {
   EXPECT_TRUE(mPlaces[a].isRead);
 }
 
-TEST_F(AFolderTreeByPlaces, HasToReadWhatHasComeToAPlace) {
+TEST_F(AFolderTreeByPlaces, ReadsAnewWhatHasTakenAPlace) {
   const FolderNumber a = LearnIn(mPlaces, mRoot, "a", 101);
   mPlaces[a].isRead = true;
   EXPECT_EQ(LearnIn(mPlaces, mRoot, "a", 102), a);

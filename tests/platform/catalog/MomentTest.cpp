@@ -305,7 +305,7 @@ TEST_F(AMoment, EndsByAnException) {
   EXPECT_TRUE(CanUnmount("first"));
 }
 
-TEST_F(AMoment, LeavesNothingToTheNext) {
+TEST_F(AMoment, CarriesNothingOverToTheNext) {
   FSRef item{};
   {
     const Moment moment;
@@ -317,7 +317,7 @@ TEST_F(AMoment, LeavesNothingToTheNext) {
   EXPECT_EQ(NameOfItem(item), "y");
 }
 
-TEST_F(AMoment, ThatWasEndedServesNoLongerThoughItsScopeGoesOn) {
+TEST_F(AMoment, OnceEndedServesNoLongerInItsScope) {
   Moment moment;
   const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   ASSERT_EQ(NameOfItem(item), "x");
@@ -326,7 +326,7 @@ TEST_F(AMoment, ThatWasEndedServesNoLongerThoughItsScopeGoesOn) {
   EXPECT_EQ(NameOfItem(item), "y");
 }
 
-TEST_F(AMoment, WithinAnotherIsThatOne) {
+TEST_F(AMoment, WithinAnotherIsTheSame) {
   Moment outer;
   SpecOf(PathTo("first/a/b/x"));
   {

@@ -51,7 +51,7 @@ TEST(MountInfo, ABackslashThatBeginsNoEscapeStaysAsItIs) {
   }
 }
 
-TEST(MountInfo, MalformedLinesArePassedOverAndTheRestIsKept) {
+TEST(MountInfo, MalformedLinesAreSkippedAndTheRestIsKept) {
   EXPECT_THAT(MountPointsIn("1 0 8:1 / / rw - ext4 /dev/a rw\n"
                             "\n"
                             "x 1 8:2 / /no-id rw - ext4 /dev/b rw\n"

@@ -150,7 +150,7 @@ TEST(MountTree, MountsOnACoveredMountAreHidden) {
               ElementsAre("/", "/mnt"));
 }
 
-TEST(MountTree, WhatIsMountedOverTheRootIsComeUponByNobody) {
+TEST(MountTree, WhatIsMountedOverTheRootIsUnreachable) {
   EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
                        "26 25 0:40 / /mnt rw - tmpfs none rw\n"
                        "27 25 0:41 / / rw - tmpfs none rw\n"
@@ -159,7 +159,7 @@ TEST(MountTree, WhatIsMountedOverTheRootIsComeUponByNobody) {
               ElementsAre("/", "/mnt", "/under"));
 }
 
-TEST(MountTree, OfTwoMountsOnOnePlaceOfOneParentTheLaterIsComeUpon) {
+TEST(MountTree, OfTwoMountsAtOnePlaceTheLaterIsReached) {
   const auto mounts = ParseMountInfo(
       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
       "26 25 0:40 / /mnt rw - tmpfs none rw\n"
@@ -168,7 +168,7 @@ TEST(MountTree, OfTwoMountsOnOnePlaceOfOneParentTheLaterIsComeUpon) {
               ElementsAre(ElementsAre(0), ElementsAre(2)));
 }
 
-TEST(MountTree, NobodyIsAskedForAFolderWhereAServerIsOnTheWay) {
+TEST(MountTree, NoFolderIsExaminedBehindAServer) {
   std::vector<std::string> asked;
   const auto mounts = ParseMountInfo(
       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
