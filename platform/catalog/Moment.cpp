@@ -26,14 +26,24 @@ bool MayBeALink(kernel::Error error) {
 // How often the item of a name may be replaced between a look at it and the reading of its handle.
 constexpr int kMostReadings = 8;
 
-// The item at a spot, with its handle where its id follows from it. ENOENT where it has none.
-kernel::Result<kernel::Item> ReadForID(const volumes::Volume& volume, const kernel::Spot& spot) {
+// Whether an item of the folder shows another file system than the folder's: then its handle tells
+// nothing of an id on the folder's volume, and it may have none.
+bool IsOfAnother(const HeldFolder& folder, const kernel::Item& item) {
+  const bool isMountedThere = item.mount == kernel::kNoMount || item.mount != folder.Item().mount;
+  return isMountedThere && !kernel::SubvolumeOf(item.handle);
+}
+
+// The item at a spot in a folder, with its handle where its id follows from it. ENOENT where it has
+// none.
+kernel::Result<kernel::Item> ReadForID(const HeldFolder& folder, const kernel::Spot& spot) {
+  const volumes::Volume& volume = *folder.Volume();
   for (int reading = 0; reading < kMostReadings; ++reading) {
     auto status = kernel::ReadStatus(spot);
     if (!status) return status.Error();
     if (!volume.NeedsHandleForID(status->item)) return status->item;
     kernel::ReadProof(status->item, spot);
     if (!volume.NeedsHandleForID(status->item)) return status->item;
+    if (IsOfAnother(folder, status->item)) return status->item;
     if (status->item.handle.size == 0) break;
   }
   return kernel::kNotThere;
@@ -229,7 +239,7 @@ kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, std::string_view n
     if (isSame) return look;
   }
   const kernel::Spot spot = folder.SpotOf(path.c_str() + path.size() - name.size());
-  auto item = ReadForID(*folder.Volume(), spot);
+  auto item = ReadForID(folder, spot);
   if (!item) return item.Error();
   Look look(folder, {std::move(path), *item});
   if (mLooks.size() < kMostLooks) mLooks.push_back({look, std::nullopt});
