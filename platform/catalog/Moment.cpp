@@ -26,14 +26,24 @@ bool MayBeALink(kernel::Error error) {
 // How often an item may be replaced between reading its status and its handle.
 constexpr int kMostReadings = 8;
 
-// The item at a spot, with its handle if its id depends on it. Returns ENOENT when it has none.
-kernel::Result<kernel::Item> ReadForID(const volumes::Volume& volume, const kernel::Spot& spot) {
+// Whether an item in the folder belongs to another file system, mounted there: its handle then says
+// nothing about ids on the folder's volume, and it may have none.
+bool IsOfAnother(const HeldFolder& folder, const kernel::Item& item) {
+  const bool isMountedThere = item.mount == kernel::kNoMount || item.mount != folder.Item().mount;
+  return isMountedThere && !kernel::SubvolumeOf(item.handle);
+}
+
+// The item at a spot in a folder, with its handle if its id depends on it. Returns ENOENT when it
+// has none.
+kernel::Result<kernel::Item> ReadForID(const HeldFolder& folder, const kernel::Spot& spot) {
+  const volumes::Volume& volume = *folder.Volume();
   for (int reading = 0; reading < kMostReadings; ++reading) {
     auto status = kernel::ReadStatus(spot);
     if (!status) return status.Error();
     if (!volume.NeedsHandleForID(status->item)) return status->item;
     kernel::ReadProof(status->item, spot);
     if (!volume.NeedsHandleForID(status->item)) return status->item;
+    if (IsOfAnother(folder, status->item)) return status->item;
     if (status->item.handle.size == 0) break;
   }
   return kernel::kNotThere;
@@ -229,7 +239,7 @@ kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, std::string_view n
     if (isSame) return look;
   }
   const kernel::Spot spot = folder.SpotOf(path.c_str() + path.size() - name.size());
-  auto item = ReadForID(*folder.Volume(), spot);
+  auto item = ReadForID(folder, spot);
   if (!item) return item.Error();
   Look look(folder, {std::move(path), *item});
   if (mLooks.size() < kMostLooks) mLooks.push_back({look, std::nullopt});

@@ -185,6 +185,34 @@ TEST_F(ARealFileSystem, BtrfsTellsASubvolumeInTheIDsOfItsItems) {
   EXPECT_EQ(IDOf(top + "/two/folder"), 0x80000000 + (1 << 22) + 257);
 }
 
+// With handles, without, and as no volume.
+TEST_F(ARealFileSystem, BtrfsShowsWhatIsMountedOnItsFolders) {
+  MakeImage("btrfs", {"mkfs.btrfs", "-q", "-f"}, 128 * kMegabyte);
+  if (IsSkipped()) return;
+  const std::string top = mImage->Path();
+  ASSERT_TRUE(RunTool({"btrfs", "subvolume", "create", top + "/subvolume"}));
+  for (const std::string name : {"/memory", "/below", "/kernel", "/again"}) {
+    std::filesystem::create_directory(top + name);
+  }
+  MakeItems(top + "/subvolume", true);
+  const ScopedMount memory("memory", top + "/memory", "tmpfs");
+  const ScopedMount below("below", top + "/subvolume/folder 0", "tmpfs");
+  const ScopedMount again(top + "/subvolume", top + "/again", "", MS_BIND);
+  for (const ScopedMount* const mounted : {&memory, &below, &again}) {
+    ASSERT_TRUE(mounted->IsMounted());
+  }
+  for (const std::string name : {"/memory", "/subvolume/folder 0"}) {
+    const std::string path = top + name;
+    EXPECT_EQ(IDOf(path), 2u);
+    EXPECT_EQ(ParentOf(SpecOf(path)), 1u) << path;
+    ExpectRoundTrip(path, {});
+  }
+  EXPECT_EQ(IDOf(top + "/again"), IDOf(top + "/subvolume"));
+  const ScopedMount kernel("none", top + "/kernel", "proc");
+  ASSERT_TRUE(kernel.IsMounted());
+  EXPECT_EQ(IDOf(top + "/kernel"), 3u);
+}
+
 TEST_F(ARealFileSystem, ASubvolumeMountedAloneKeepsThePromises) {
   MakeImage("btrfs", {"mkfs.btrfs", "-q", "-f"}, 128 * kMegabyte);
   if (IsSkipped()) return;
