@@ -22,8 +22,13 @@ FullPath ReadFullPath(AnswerReader& answer, std::uint16_t size) {
 }
 
 std::optional<std::string> ReadPathByResult(AnswerReader& answer) {
-  const bool isThere = answer.Take<std::int16_t>() == 0;
-  return NoneIfEmpty(isThere, answer.TakeString());
+  auto [code, path] = ReadPathAndResult(answer);
+  return NoneIfEmpty(code == 0, std::move(path));
+}
+
+PathByResult ReadPathAndResult(AnswerReader& answer) {
+  const auto code = answer.Take<std::int16_t>();
+  return {code, answer.TakeString()};
 }
 
 std::optional<std::string> ReadStringByFlag(AnswerReader& answer) {

@@ -22,6 +22,13 @@ FullPath ReadFullPath(AnswerReader& answer, std::uint16_t size);
 // A result code and a string. Nullopt unless the code is 0.
 std::optional<std::string> ReadPathByResult(AnswerReader& answer);
 
+// The same with the code, and an empty path where there is none.
+struct PathByResult {
+  std::int16_t code;
+  std::string path;
+};
+PathByResult ReadPathAndResult(AnswerReader& answer);
+
 // A flag and a string. Nullopt when the flag is 0 or the string is empty.
 std::optional<std::string> ReadStringByFlag(AnswerReader& answer);
 

@@ -32,17 +32,38 @@ class QuestionWithHandler final : public Question {
 Batch::Batch(Client& client) : mConversation(*client.mConversation) {}
 
 Batch::~Batch() {
+  if (!mHasTurn) return;
   mConversation.Abandon();
+  mConversation.GetTurn().Release();
+}
+
+bool Batch::TakeTurn() {
+  if (!mHasTurn) mHasTurn = mConversation.GetTurn().Take();
+  return mHasTurn;
 }
 
 template <class T>
 void Batch::Add(const Request<T>& request,
                 std::type_identity_t<std::function<void(Result<T>)>> handler) {
+  if (!TakeTurn()) {
+    return handler(Error{Outcome::kServiceFailed, "this thread uses the client already"});
+  }
   mConversation.Put(request.mBytes, std::make_unique<QuestionWithHandler<T>>(
                                         request.mReader, request.mAnswer, std::move(handler)));
 }
 
 void Batch::Finish() {
+  if (!mHasTurn) return;
+  // A handler's exception ends the turn as well when its request was the last one.
+  struct EndOfTurn {
+    Batch& batch;
+    ~EndOfTurn() {
+      if (!batch.mConversation.IsFinished()) return;
+      batch.mHasTurn = false;
+      batch.mConversation.GetTurn().Release();
+    }
+  };
+  const EndOfTurn end{*this};
   mConversation.Finish();
 }
 
@@ -68,5 +89,6 @@ TALLOWMERE_ANSWERED_WITH(std::optional<std::int16_t>);
 TALLOWMERE_ANSWERED_WITH(std::optional<FSSpec>);
 TALLOWMERE_ANSWERED_WITH(ExportSettings);
 TALLOWMERE_ANSWERED_WITH(answer::FullPath);
+TALLOWMERE_ANSWERED_WITH(answer::PathByResult);
 
 }  // namespace tallowmere

@@ -33,23 +33,24 @@ Client::Client(Client&& other) noexcept = default;
 Client& Client::operator=(Client&& other) noexcept = default;
 Client::~Client() = default;
 
-Result<std::string> Client::MakeFullPath(std::string_view path) {
+Result<std::string> Client::MakeFullPath(PathView path) {
   return Ask(request::MakeFullPath(path));
 }
 
-Result<std::string> Client::MakeFullPath(std::string_view path, std::uint16_t size,
-                                         bool keepFolders) {
+Result<std::string> Client::MakeFullPath(PathView path, std::uint16_t size, bool keepFolders) {
   if (size == 0 || size > request::kLongestFullPathBuffer) {
-    return Error{"a full path is asked for in 1 to 1024 bytes, not in " + std::to_string(size)};
+    return Error{Outcome::kInvalid,
+                 "a full path is asked for in 1 to 1024 bytes, not in " + std::to_string(size)};
   }
-  auto whole = Ask(request::FullPathInBuffer(path, request::kLongestFullPathBuffer, true));
+  auto whole = Ask(request::FullPathInBuffer(path.Text(), request::kLongestFullPathBuffer, true));
   if (!whole) return whole.Failure();
   if (!CanBeShortened(*whole, size)) {
-    return Error{"the full path cannot be shortened to " + std::to_string(size) + " bytes"};
+    return Error{Outcome::kInvalid,
+                 "the full path cannot be shortened to " + std::to_string(size) + " bytes"};
   }
   if (!keepFolders) return std::string(VolumeNameOf(whole->text));
   if (whole->wholeLength < size) return std::move(whole->text);
-  auto shortened = Ask(request::FullPathInBuffer(path, size, true));
+  auto shortened = Ask(request::FullPathInBuffer(path.Text(), size, true));
   if (!shortened) return shortened.Failure();
   return std::move(shortened->text);
 }
@@ -66,16 +67,15 @@ Result<std::optional<std::string>> Client::GetHFSVolumeName(std::int16_t number)
   return Ask(request::GetHFSVolumeName(number));
 }
 
-Result<std::optional<std::string>> Client::GetHFSName(std::string_view path) {
+Result<std::optional<std::string>> Client::GetHFSName(PathView path) {
   return Ask(request::GetHFSName(path));
 }
 
-Result<std::optional<std::string>> Client::AddHFSName(std::string_view folder,
-                                                      std::string_view name) {
+Result<std::optional<std::string>> Client::AddHFSName(PathView folder, std::string_view name) {
   return Ask(request::AddHFSName(folder, name));
 }
 
-Result<std::optional<FSSpec>> Client::GetFSSpec(std::string_view path) {
+Result<std::optional<FSSpec>> Client::GetFSSpec(PathView path) {
   return Ask(request::GetFSSpec(path));
 }
 

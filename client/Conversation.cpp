@@ -8,6 +8,8 @@
 
 #include "client/AnswerReader.h"
 #include "client/FindService.h"
+#include "client/Mounts.h"
+#include "client/RequestText.h"
 
 namespace tallowmere {
 namespace {
@@ -29,8 +31,21 @@ constexpr std::size_t kPieceToReceive = 16384;
 constexpr std::size_t kManyQuestions = kMostQuestions / 2;
 constexpr std::chrono::microseconds kTimeToGather{200};
 
-Error NotInTime() {
-  return {"the service did not answer in time"};
+Error NoAnswer(std::string reason) {
+  return {Outcome::kServiceFailed, std::move(reason)};
+}
+
+Error NotInTime(std::string_view request) {
+  std::string message = "the service did not answer in time";
+  if (request.empty()) return NoAnswer(std::move(message));
+  message += ", asked for " + WhatIsAsked(request);
+  if (!SearchesOtherVolumes(request)) return NoAnswer(std::move(message));
+  std::string separator = "; the search of the other volumes may wait for ";
+  for (const Mount& mount : ReadMounts()) {
+    if (!HasServer(mount)) continue;
+    message += std::exchange(separator, ", ") + mount.point + " (" + mount.kind + ')';
+  }
+  return NoAnswer(std::move(message));
 }
 
 }  // namespace
@@ -73,9 +88,10 @@ void Conversation::Advance() {
 // The same without waiting; returns false when there is nothing to do but wait. The owner of a
 // question is called last, so an exception from it leaves nothing half done.
 bool Conversation::Step() {
+  if (mGeneration != ProcessGeneration()) LeaveServiceToParent();
   if (HandOver()) return true;
   if (mOptions.deadline.count() <= 0) {
-    FailFirst(NotInTime());
+    FailFirst(NotInTime(mRequests.View().substr(0, mPending.front().size)));
     return true;
   }
   if (!mService) {
@@ -96,14 +112,14 @@ bool Conversation::HandOver() {
   }
   if (received.size() < mNeeded) return false;
   if (mSent < first.size) {
-    FailFirst({"the service answered what it had not been asked"});
+    FailFirst(NoAnswer("the service answered what it had not been asked"));
     return true;
   }
   AnswerReader answer(received);
   first.question->Read(answer);
   answer.TakeTrailer();
   if (!answer.Fault().empty()) {
-    FailFirst({std::string(answer.Fault())});
+    FailFirst(NoAnswer(std::string(answer.Fault())));
     return true;
   }
   if (!answer.IsWhole()) {
@@ -145,7 +161,7 @@ void Conversation::Wait() {
   const auto waited = std::chrono::duration_cast<milliseconds>(steady_clock::now() - mFirstSince);
   const milliseconds left = mOptions.deadline - waited;
   if (left.count() <= 0) {
-    FailFirst(NotInTime());
+    FailFirst(NotInTime(mRequests.View().substr(0, mPending.front().size)));
   } else {
     mService->Wait(mSent < mRequests.View().size(), left);
   }
@@ -154,7 +170,7 @@ void Conversation::Wait() {
 void Conversation::Start() {
   const std::string path = mOptions.service.empty() ? FindService() : mOptions.service;
   if (path.empty()) {
-    FailFirst({"the service \"tallowmere\" is neither beside this program nor on PATH"});
+    FailFirst(NoAnswer("the service \"tallowmere\" is neither beside this program nor on PATH"));
     return;
   }
   auto service = ServiceProcess::Start(path);
@@ -178,6 +194,12 @@ Conversation::Pending Conversation::TakeFirst() {
 void Conversation::FailFirst(const Error& error) {
   EndService();
   TakeFirst().question->Fail(error);
+}
+
+// In a child made by fork(2): the service is the parent's, as are its answers.
+void Conversation::LeaveServiceToParent() {
+  EndService();
+  mGeneration = ProcessGeneration();
 }
 
 void Conversation::EndService() {

@@ -10,6 +10,7 @@
 
 #include <chrono>
 #include <cstddef>
+#include <cstdint>
 #include <deque>
 #include <memory>
 #include <optional>
@@ -18,6 +19,7 @@
 
 #include "client/ByteQueue.h"
 #include "client/ServiceProcess.h"
+#include "client/Turn.h"
 
 namespace tallowmere {
 
@@ -44,6 +46,9 @@ class Conversation {
  public:
   explicit Conversation(ClientOptions options) : mOptions(std::move(options)) {}
 
+  // Who may use the conversation: each of the functions below REQUIRES it to be taken.
+  Turn& GetTurn() { return mTurn; }
+
   // Queues a question. One without bytes is not sent: it has its answer already. When enough are
   // under way, hands over answers until half of them are left. An exception from that leaves Put,
   // with the question queued nevertheless.
@@ -51,6 +56,8 @@ class Conversation {
 
   // Waits for all answers and hands them over.
   void Finish();
+
+  bool IsFinished() const { return mPending.empty(); }
 
   // Drops every question that has not been answered.
   void Abandon();
@@ -70,9 +77,12 @@ class Conversation {
   void Start();
   Pending TakeFirst();
   void FailFirst(const Error& error);
+  void LeaveServiceToParent();
   void EndService();
 
+  Turn mTurn;
   ClientOptions mOptions;
+  std::uint32_t mGeneration = ProcessGeneration();  // of the process that started the service
   std::optional<ServiceProcess> mService;
   std::deque<Pending> mPending;  // not answered yet
   ByteQueue mRequests;           // their requests

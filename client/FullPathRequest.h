@@ -1,4 +1,5 @@
-// The request for a full path in a buffer of any size.
+// Requests whose answers the client looks into: a full path in a buffer of any size, and a path
+// with its result code.
 #pragma once
 
 #include <tallowmere/Request.h>
@@ -18,5 +19,8 @@ inline constexpr std::uint16_t kLongestFullPathBuffer = protocol::kLongestHFSNam
 // busy with it for ever; at most kLongestFullPathBuffer.
 Request<answer::FullPath> FullPathInBuffer(std::string_view path, std::uint16_t size,
                                            bool keepFolders);
+
+// MakeFileRefFromPath, with the result code. REQUIRES: at most 255 bytes, and no NUL.
+Request<answer::PathByResult> PathAndResult(std::string_view hfsPath);
 
 }  // namespace tallowmere::request

@@ -20,7 +20,9 @@ Result<std::vector<Volume>> ListVolumes(Client& client) {
   for (std::string& mountPoint : ReadMountPoints()) {
     auto record = client.GetFSSpec(mountPoint);
     if (!record && mountPoint == kRoot) return record.Failure();
-    if (!record) return Error{mountPoint + ": " + record.Failure().message};
+    if (!record) {
+      return Error{record.Failure().outcome, mountPoint + ": " + record.Failure().message};
+    }
     if (!*record || (*record)->parID != kParentOfRoots) continue;
     FSSpec& root = **record;
     const bool isKnown = std::any_of(volumes.begin(), volumes.end(),
@@ -28,6 +30,39 @@ Result<std::vector<Volume>> ListVolumes(Client& client) {
     if (!isKnown) volumes.push_back({root.vRefNum, std::move(root.name), std::move(mountPoint)});
   }
   return volumes;
+}
+
+Result<Volume> VolumeWithName(const std::vector<Volume>& volumes, std::string_view name) {
+  const auto hasName = [name](const Volume& volume) { return volume.name == name; };
+  const auto first = std::find_if(volumes.begin(), volumes.end(), hasName);
+  const std::string text = '"' + Utf8OfHFSName(name) + '"';
+  if (first == volumes.end()) return Error{Outcome::kNotAVolume, "no volume is called " + text};
+  const auto second = std::find_if(first + 1, volumes.end(), hasName);
+  if (second == volumes.end()) return *first;
+  return Error{Outcome::kAmbiguous, "several volumes are called " + text + ", at " +
+                                        first->mountPoint + " and " + second->mountPoint};
+}
+
+Result<Volume> VolumeAt(Client& client, PathView mountPoint) {
+  std::string path(mountPoint.Text());
+  auto record = client.RecordOf(mountPoint);
+  if (!record) return record.Failure();
+  FSSpec& root = record->value;
+  if (record->outcome == Outcome::kFound && root.parID == kParentOfRoots) {
+    return Volume{root.vRefNum, std::move(root.name), std::move(path)};
+  }
+  return Error{Outcome::kNotAVolume, "no volume is mounted at \"" + path + '"'};
+}
+
+Result<Volume> FindVolume(Client& client, std::string_view mountPointOrName) {
+  if (mountPointOrName.starts_with('/')) return VolumeAt(client, mountPointOrName);
+  const auto name = HFSNameOfUtf8(mountPointOrName);
+  if (!name) {
+    return Error{Outcome::kNotAVolume,
+                 "no volume is called \"" + std::string(mountPointOrName) + '"'};
+  }
+  auto volumes = ListVolumes(client);
+  return volumes ? VolumeWithName(*volumes, *name) : volumes.Failure();
 }
 
 }  // namespace tallowmere

@@ -41,29 +41,64 @@ std::string Unescape(std::string_view text) {
   return plain;
 }
 
+// What follows the separator of a line's optional fields, " - ", is the kind of file system.
+std::string KindIn(std::string_view line) {
+  constexpr std::string_view kEndOfOptionalFields = " - ";
+  const std::size_t end = line.find(kEndOfOptionalFields);
+  if (end == std::string_view::npos) return {};
+  line.remove_prefix(end + kEndOfOptionalFields.size());
+  return Unescape(TakeUntil(line, ' '));
+}
+
+std::string ReadTable() {
+  std::ifstream table("/proc/self/mountinfo");
+  return {std::istreambuf_iterator<char>(table), {}};
+}
+
 }  // namespace
 
-std::vector<std::string> MountPointsIn(std::string_view mountInfo) {
-  std::vector<std::string> all;
+std::vector<Mount> MountsIn(std::string_view mountInfo) {
+  std::vector<Mount> all;
   while (!mountInfo.empty()) {
     std::string_view line = TakeUntil(mountInfo, '\n');
     for (std::size_t field = 0; field < kFieldOfMountPoint; ++field) TakeUntil(line, ' ');
-    std::string mountPoint = Unescape(TakeUntil(line, ' '));
-    if (mountPoint.starts_with('/')) all.push_back(std::move(mountPoint));
+    std::string point = Unescape(TakeUntil(line, ' '));
+    if (point.starts_with('/')) all.push_back({std::move(point), KindIn(line)});
   }
-  std::unordered_set<std::string> met{"/"};
-  std::vector<std::string> last;
-  for (auto mountPoint = all.rbegin(); mountPoint != all.rend(); ++mountPoint) {
-    if (met.insert(*mountPoint).second) last.push_back(std::move(*mountPoint));
+  // The last mount at "/" is the first of the list.
+  Mount root{"/", {}};
+  std::unordered_set<std::string> met;
+  std::vector<Mount> last;
+  for (auto mount = all.rbegin(); mount != all.rend(); ++mount) {
+    if (!met.insert(mount->point).second) continue;
+    (mount->point == root.point ? root : last.emplace_back()) = std::move(*mount);
   }
-  last.emplace_back("/");
+  last.push_back(std::move(root));
   std::reverse(last.begin(), last.end());
   return last;
 }
 
+std::vector<std::string> MountPointsIn(std::string_view mountInfo) {
+  std::vector<std::string> points;
+  for (Mount& mount : MountsIn(mountInfo)) points.push_back(std::move(mount.point));
+  return points;
+}
+
 std::vector<std::string> ReadMountPoints() {
-  std::ifstream table("/proc/self/mountinfo");
-  return MountPointsIn(std::string(std::istreambuf_iterator<char>(table), {}));
+  return MountPointsIn(ReadTable());
+}
+
+std::vector<Mount> ReadMounts() {
+  return MountsIn(ReadTable());
+}
+
+// The kinds as proc_filesystems(5) names them; a FUSE server's has a name of its own behind a dot.
+bool HasServer(const Mount& mount) {
+  constexpr std::string_view kKinds[] = {"9p",   "afs",   "autofs",  "ceph", "cifs",
+                                         "coda", "fuse",  "nfs",     "nfs4", "orangefs",
+                                         "smb3", "smbfs", "virtiofs"};
+  return mount.kind.starts_with("fuse.") ||
+         std::find(std::begin(kKinds), std::end(kKinds), mount.kind) != std::end(kKinds);
 }
 
 }  // namespace tallowmere

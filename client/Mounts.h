@@ -7,12 +7,24 @@
 
 namespace tallowmere {
 
+struct Mount {
+  std::string point;
+  std::string kind;  // of its file system, such as "ext4"; empty when it is not told
+};
+
+// Every mount, in the order and with the omissions of MountPointsIn.
+std::vector<Mount> MountsIn(std::string_view mountInfo);
+
 // Every path at which something is mounted, once each: "/" first, then in the kernel's order. Of
 // several mounts at one path the last one counts, as it covers the others. Malformed lines are
 // skipped. Just "/" for an empty text.
 std::vector<std::string> MountPointsIn(std::string_view mountInfo);
 
-// The mount points of this process; just "/" where there is no /proc.
+// Those of this process; just "/" where there is no /proc. Nothing but the table is touched.
 std::vector<std::string> ReadMountPoints();
+std::vector<Mount> ReadMounts();
+
+// Whether looking at the mount may wait for a program or another machine.
+bool HasServer(const Mount& mount);
 
 }  // namespace tallowmere

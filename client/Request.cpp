@@ -19,6 +19,8 @@ bool CanBeText(std::string_view text, std::size_t longest = kLongestText) {
   return text.size() <= longest && text.find('\0') == std::string_view::npos;
 }
 
+constexpr std::size_t kUsualSize = 128;  // of a request, so that its memory is allocated once
+
 // The full path of an item that is on no volume.
 std::string NoFullPath() {
   return {protocol::kSeparator};
@@ -31,7 +33,10 @@ Request<std::optional<T>> None() {
 
 class RequestWriter {
  public:
-  explicit RequestWriter(protocol::RequestCode code) { Put<std::uint16_t>(code); }
+  explicit RequestWriter(protocol::RequestCode code) {
+    mBytes.reserve(kUsualSize);
+    Put<std::uint16_t>(code);
+  }
 
   template <class Number>
   RequestWriter& Put(Number number) {
@@ -68,6 +73,14 @@ std::string FullPathBytes(std::string_view path, std::uint16_t size, bool keepFo
       .Bytes();
 }
 
+std::string FileRefBytes(std::string_view hfsPath) {
+  return RequestWriter(protocol::kRequestMakeFileRefFromPath)
+      .PutString("")
+      .PutString(hfsPath)
+      .PutFlag(false)
+      .Bytes();
+}
+
 }  // namespace
 
 Request<answer::FullPath> FullPathInBuffer(std::string_view path, std::uint16_t size,
@@ -77,9 +90,9 @@ Request<answer::FullPath> FullPathInBuffer(std::string_view path, std::uint16_t 
           [size](AnswerReader& answer) { return answer::ReadFullPath(answer, size); }};
 }
 
-Request<std::string> MakeFullPath(std::string_view path) {
-  if (!CanBeText(path)) return Request(NoFullPath());
-  return {FullPathBytes(path, kLongestFullPathBuffer, true), [](AnswerReader& answer) {
+Request<std::string> MakeFullPath(PathView path) {
+  if (!CanBeText(path.Text())) return Request(NoFullPath());
+  return {FullPathBytes(path.Text(), kLongestFullPathBuffer, true), [](AnswerReader& answer) {
             return answer::ReadFullPath(answer, kLongestFullPathBuffer).text;
           }};
 }
@@ -88,12 +101,11 @@ Request<std::optional<std::string>> MakeFileRefFromPath(std::string_view hfsPath
   if (!CanBeText(hfsPath, protocol::kLongestHFSPath)) {
     return None<std::string>();
   }
-  return {RequestWriter(protocol::kRequestMakeFileRefFromPath)
-              .PutString("")
-              .PutString(hfsPath)
-              .PutFlag(false)
-              .Bytes(),
-          answer::ReadPathByResult};
+  return {FileRefBytes(hfsPath), answer::ReadPathByResult};
+}
+
+Request<answer::PathByResult> PathAndResult(std::string_view hfsPath) {
+  return {FileRefBytes(hfsPath), answer::ReadPathAndResult};
 }
 
 Request<std::optional<std::int16_t>> GetVolRefnumByHFSName(std::string_view name) {
@@ -109,30 +121,31 @@ Request<std::optional<std::string>> GetHFSVolumeName(std::int16_t number) {
           answer::ReadStringByFlag};
 }
 
-Request<std::optional<std::string>> GetHFSName(std::string_view path) {
-  if (!CanBeText(path)) return None<std::string>();
+Request<std::optional<std::string>> GetHFSName(PathView path) {
+  if (!CanBeText(path.Text())) return None<std::string>();
   return {RequestWriter(protocol::kRequestGetHFSName)
-              .PutString(path)
+              .PutString(path.Text())
               .Put<std::uint16_t>(protocol::kLongestHFSName)
               .Bytes(),
           answer::ReadStringByFlag};
 }
 
-Request<std::optional<std::string>> AddHFSName(std::string_view folder, std::string_view name) {
-  if (!CanBeText(folder) || !CanBeText(name, protocol::kLongestHFSPath)) {
+Request<std::optional<std::string>> AddHFSName(PathView folder, std::string_view name) {
+  if (!CanBeText(folder.Text()) || !CanBeText(name, protocol::kLongestHFSPath)) {
     return None<std::string>();
   }
   return {RequestWriter(protocol::kRequestAddHFSName)
-              .PutString(folder)
+              .PutString(folder.Text())
               .PutString(name)
               .PutFlag(false)
               .Bytes(),
           answer::ReadStringByFlag};
 }
 
-Request<std::optional<FSSpec>> GetFSSpec(std::string_view path) {
-  if (!CanBeText(path)) return None<FSSpec>();
-  return {RequestWriter(protocol::kRequestGetFSSpec).PutString(path).Bytes(), answer::ReadSpec};
+Request<std::optional<FSSpec>> GetFSSpec(PathView path) {
+  if (!CanBeText(path.Text())) return None<FSSpec>();
+  return {RequestWriter(protocol::kRequestGetFSSpec).PutString(path.Text()).Bytes(),
+          answer::ReadSpec};
 }
 
 Request<std::optional<std::string>> SetFileRefFromFSSpecData(const FSSpec& spec) {

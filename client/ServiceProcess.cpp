@@ -26,6 +26,10 @@ std::string MessageOf(int errorNumber) {
   return std::generic_category().message(errorNumber);
 }
 
+Error NoAnswer(std::string reason) {
+  return {Outcome::kServiceFailed, std::move(reason)};
+}
+
 void CloseIfOpen(int& descriptor) {
   if (descriptor >= 0) close(std::exchange(descriptor, -1));
 }
@@ -128,11 +132,11 @@ Result<ServiceProcess> ServiceProcess::Start(const std::string& path) {
   Pipe responses;
   if (!requests.Open() || !responses.Open() || !SetNonBlocking(requests.writeEnd) ||
       !SetNonBlocking(responses.readEnd)) {
-    return Error{"no pipe to the service: " + MessageOf(errno)};
+    return NoAnswer("no pipe to the service: " + MessageOf(errno));
   }
   pid_t process = -1;
   if (const int error = Spawn(path, requests.readEnd, responses.writeEnd, process)) {
-    return Error{"the service " + path + " could not be started: " + MessageOf(error)};
+    return NoAnswer("the service " + path + " could not be started: " + MessageOf(error));
   }
   int watch = static_cast<int>(syscall(SYS_pidfd_open, process, 0));
   // A process that has vanished has been waited for elsewhere in this program, for example because
@@ -142,7 +146,7 @@ Result<ServiceProcess> ServiceProcess::Start(const std::string& path) {
     kill(process, SIGKILL);
     while (waitpid(process, nullptr, 0) < 0 && errno == EINTR) {
     }
-    return Error{"the service could not be watched: " + MessageOf(error)};
+    return NoAnswer("the service could not be watched: " + MessageOf(error));
   }
   if (watch >= 0) MoveUp(watch);
   return ServiceProcess(watch, std::exchange(requests.writeEnd, -1),
@@ -177,7 +181,7 @@ Result<std::size_t> ServiceProcess::Write(std::string_view bytes) {
   const WithoutBrokenPipeSignal guard;
   const ssize_t sent = write(mRequests, bytes.data(), bytes.size());
   if (sent >= 0) return static_cast<std::size_t>(sent);
-  if (errno != EPIPE && !WouldBlock(errno)) return Error{"writing failed: " + MessageOf(errno)};
+  if (errno != EPIPE && !WouldBlock(errno)) return NoAnswer("writing failed: " + MessageOf(errno));
   if (errno == EPIPE) CloseIfOpen(mRequests);
   return std::size_t{0};
 }
@@ -185,8 +189,8 @@ Result<std::size_t> ServiceProcess::Write(std::string_view bytes) {
 Result<std::size_t> ServiceProcess::Read(char* bytes, std::size_t size) {
   const ssize_t got = read(mResponses, bytes, size);
   if (got > 0) return static_cast<std::size_t>(got);
-  if (got == 0) return Error{"the service ended before it answered"};
-  if (!WouldBlock(errno)) return Error{"reading failed: " + MessageOf(errno)};
+  if (got == 0) return NoAnswer("the service ended before it answered");
+  if (!WouldBlock(errno)) return NoAnswer("reading failed: " + MessageOf(errno));
   return std::size_t{0};
 }
 

@@ -15,7 +15,8 @@ namespace tallowmere {
 
 class Batch {
  public:
-  // REQUIRES: the client outlives the batch and is not used otherwise until the batch has finished.
+  // REQUIRES: the client outlives the batch. From its first request on until it has finished, the
+  // batch has the client to itself: see Client.h. A batch belongs to one thread at a time.
   explicit Batch(Client& client);
   Batch(const Batch&) = delete;
   Batch& operator=(const Batch&) = delete;
@@ -31,7 +32,10 @@ class Batch {
   void Finish();
 
  private:
+  bool TakeTurn();
+
   Conversation& mConversation;
+  bool mHasTurn = false;
 };
 
 }  // namespace tallowmere

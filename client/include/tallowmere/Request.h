@@ -1,6 +1,9 @@
 // One question to the service, ready to be sent, and how to read its answer. A value: it can be
 // made anywhere, kept, and asked more than once, by Client::Ask or in a Batch.
 //
+// The service is sent what is given here, and its answer is handed over as it is. The conversions
+// of Client and Converter are made of these and refuse what would lead elsewhere; prefer them.
+//
 // POSIX paths are absolute; do not rely on the answers to others. A leading "~" or "~user" stands
 // for the home folder of the service's user, or of the named user.
 //
@@ -9,6 +12,7 @@
 // a name or path longer than the protocol allows or an HFS name can be.
 #pragma once
 
+#include <tallowmere/PathView.h>
 #include <tallowmere/Types.h>
 
 #include <cstdint>
@@ -47,7 +51,7 @@ namespace request {
 // followed by a colon. At most 767 bytes: of more than 511 bytes of folders, the outermost are left
 // out. Just the volume's name and a colon when a link stands in the place of the file's folder.
 // Just a colon for an item that is on no volume, and for a question that cannot be put.
-Request<std::string> MakeFullPath(std::string_view path);
+Request<std::string> MakeFullPath(PathView path);
 
 // The POSIX path of the item with an HFS path, or nullopt. No HFS path has more than 255 bytes.
 Request<std::optional<std::string>> MakeFileRefFromPath(std::string_view hfsPath);
@@ -60,17 +64,17 @@ Request<std::optional<std::int16_t>> GetVolRefnumByHFSName(std::string_view name
 Request<std::optional<std::string>> GetHFSVolumeName(std::int16_t number);
 
 // The HFS name of the item at a POSIX path. Nullopt for an item that does not exist.
-Request<std::optional<std::string>> GetHFSName(std::string_view path);
+Request<std::optional<std::string>> GetHFSName(PathView path);
 
 // The POSIX path that the item with an HFS name (or HFS path) in the folder at a POSIX path has, or
 // would have. After a path that is not a folder's, the name's bytes are added as they are. Nullopt
 // for a name above 255 bytes.
-Request<std::optional<std::string>> AddHFSName(std::string_view folder, std::string_view name);
+Request<std::optional<std::string>> AddHFSName(PathView folder, std::string_view name);
 
 // The record of the item at a POSIX path, or nullopt. A new item in an existing folder has one too.
 // So has an item whose path has a file, or a link (even one to a folder), in the place of its
 // folder; that record leads nowhere.
-Request<std::optional<FSSpec>> GetFSSpec(std::string_view path);
+Request<std::optional<FSSpec>> GetFSSpec(PathView path);
 
 // The POSIX path that the item with an HFS name (or HFS path) in the folder with the id parID has,
 // or would have; or nullopt. Searches the other volumes too. Here `spec.name` may have up to 255

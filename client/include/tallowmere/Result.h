@@ -1,6 +1,8 @@
 // A value, or the reason why there is none.
 #pragma once
 
+#include <tallowmere/Outcome.h>
+
 #include <string>
 #include <utility>
 #include <variant>
@@ -8,6 +10,7 @@
 namespace tallowmere {
 
 struct Error {
+  Outcome outcome;
   std::string message;  // one sentence for a person, without a full stop
 };
 
@@ -27,6 +30,10 @@ class [[nodiscard]] Result {
   const T& operator*() const& { return std::get<T>(mContent); }
   T* operator->() { return &std::get<T>(mContent); }
   const T* operator->() const { return &std::get<T>(mContent); }
+
+  // The value, or `otherwise` when there is none.
+  T ValueOr(T otherwise) const& { return HasValue() ? **this : std::move(otherwise); }
+  T ValueOr(T otherwise) && { return HasValue() ? *std::move(*this) : std::move(otherwise); }
 
   // REQUIRES: !HasValue().
   const Error& Failure() const { return std::get<Error>(mContent); }

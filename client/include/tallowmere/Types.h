@@ -29,6 +29,14 @@ std::string EncodeFSSpec(const FSSpec& spec);
 // for a name length above 63.
 std::optional<FSSpec> DecodeFSSpec(std::string_view bytes);
 
+// A record as text: "volume:parent:name", such as "-27:19:hostname", with the name in UTF-8.
+std::string TextOfFSSpec(const FSSpec& spec);
+
+// The record in such a text. The numbers are decimal; a parent id may be signed or unsigned.
+// Nullopt for anything else, for a name above 63 bytes and for one with a character that Mac Roman
+// lacks.
+std::optional<FSSpec> FSSpecOfText(std::string_view text);
+
 // How sound is stored.
 struct SoundFormat {
   std::uint32_t rate;        // in hertz × 65536

@@ -1,4 +1,4 @@
-// Lists the volumes.
+// Lists the volumes, and finds one of them.
 #pragma once
 
 #include <tallowmere/Client.h>
@@ -6,6 +6,7 @@
 
 #include <cstdint>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace tallowmere {
@@ -20,5 +21,17 @@ struct Volume {
 // service about each mount point, which may have to wait for a file system's server, for as long as
 // the client's deadline; the error then begins with the mount point.
 Result<std::vector<Volume>> ListVolumes(Client& client);
+
+// The one volume of a list with a name, in Mac Roman, letter case included. kAmbiguous for a name
+// that several have, kNotAVolume for one that none has.
+Result<Volume> VolumeWithName(const std::vector<Volume>& volumes, std::string_view name);
+
+// The volume whose root folder is at a path, which becomes its mount point here also where it is
+// not its first one. kNotAVolume for any other path.
+Result<Volume> VolumeAt(Client& client, PathView mountPoint);
+
+// The volume that a person means: by its mount point, for a text that begins with '/', otherwise by
+// its name in UTF-8.
+Result<Volume> FindVolume(Client& client, std::string_view mountPointOrName);
 
 }  // namespace tallowmere

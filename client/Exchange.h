@@ -1,0 +1,87 @@
+// The questions of one converter, in line, and their requests to the service.
+#pragma once
+
+#include <tallowmere/Batch.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <deque>
+#include <map>
+#include <memory>
+#include <optional>
+#include <utility>
+
+#include "client/Places.h"
+
+namespace tallowmere::conversion {
+
+class Exchange;
+
+// What somebody has asked, in line with others until it is its turn to be told.
+class Question {
+ public:
+  Question() = default;
+  Question(const Question&) = delete;
+  Question& operator=(const Question&) = delete;
+  virtual ~Question() = default;
+
+  // Whether every request that was put for it has been answered.
+  bool IsAnswered() const { return mAwaited == 0; }
+
+  // Tells the answer. May ask more first, and wait for it. REQUIRES: IsAnswered(), and all before
+  // it have been told.
+  virtual void Tell(Exchange& exchange) = 0;
+
+ private:
+  friend class Exchange;
+
+  std::size_t mAwaited = 0;  // requests under way
+};
+
+// The questions of one converter, and their way to the service.
+class Exchange {
+ public:
+  Exchange(Client& client, bool resolves) : places(resolves), mBatch(client) {}
+
+  // Puts a request for a question; `store` keeps its answer.
+  template <class T>
+  void Put(const Request<T>& request, Question& question, std::optional<Result<T>>& store) {
+    ++question.mAwaited;
+    mBatch.Add(request, [&question, &store](Result<T> answer) {
+      store.emplace(std::move(answer));
+      --question.mAwaited;
+    });
+  }
+
+  // Asks at once, and waits for the answer, and for those of all requests before.
+  template <class T>
+  Result<T> AskNow(const Request<T>& request) {
+    std::optional<Result<T>> answer;
+    mBatch.Add(request, [&answer](Result<T> result) { answer.emplace(std::move(result)); });
+    mBatch.Finish();
+    return *std::move(answer);
+  }
+
+  // Takes a question in whose requests have been put; tells those whose turn it is.
+  void Take(std::unique_ptr<Question> question);
+
+  // Waits for all answers and tells them.
+  void Finish();
+
+  // Asks for a folder's full path, unless that has been done; the answer is in the folder.
+  void PutFullPathOf(const std::shared_ptr<Folder>& folder);
+
+  // Whether a volume with the number is mounted; asked once.
+  Result<bool> IsVolume(std::int16_t number);
+
+  Places places;
+
+ private:
+  void TellFirst();
+
+  Batch mBatch;
+  std::deque<std::unique_ptr<Question>> mQuestions;
+  std::map<std::int16_t, bool> mVolumes;
+};
+
+}  // namespace tallowmere::conversion

@@ -1,0 +1,176 @@
+// The conversions of the path of an item, which all begin with its record: that tells its HFS name,
+// and whether it is on a volume.
+#include <utility>
+
+#include "client/Conversions.h"
+#include "client/NewNames.h"
+#include "service/Protocol.h"
+
+namespace tallowmere::conversion {
+namespace {
+
+constexpr std::int32_t kParentOfRoots = 1;     // the parent id of a volume's root folder
+constexpr std::int32_t kParentOnNoVolume = 3;  // that of what leads nowhere
+
+// Of a full path, the service leaves the outermost folders out that do not fit into this.
+constexpr std::size_t kMostBytesOfFolders = 511;
+
+std::string Quoted(std::string_view text) {
+  return '"' + std::string(text) + '"';
+}
+
+Error OnNoVolume(const std::string& path) {
+  return {Outcome::kNotAVolume, Quoted(path) + " is on no volume"};
+}
+
+Error CannotComeBack(const std::string& path, const std::string& reason) {
+  return {Outcome::kInvalid, "the name of the new item " + Quoted(path) + ' ' + reason};
+}
+
+Error IsAnothers(const std::string& path) {
+  return {Outcome::kAmbiguous,
+          "the new item " + Quoted(path) + " would have the HFS name of another item"};
+}
+
+// Why a new item would not be found again under its HFS name, as far as its name tells.
+std::optional<Error> WhyNotNew(const Place& place) {
+  const auto name = HFSNameOfLinuxName(place.Name());
+  if (!name) return CannotComeBack(place.path, "has a character that HFS names cannot have");
+  if (name->size() > protocol::kLongestSpecName) {
+    return CannotComeBack(place.path, "is longer than the 63 characters of HFS names");
+  }
+  const std::string back = LinuxNameOfHFSName(*name);
+  if (back == place.Name()) return std::nullopt;
+  const auto other = LookAt(*place.folder, back);
+  if (other && other->exists) return IsAnothers(place.path);
+  return CannotComeBack(place.path, "comes back with its accents written otherwise");
+}
+
+template <class T>
+class ItemQuestion : public Question {
+ public:
+  ItemQuestion(Exchange& exchange, std::string_view path, Handler<T> handler)
+      : mPlace(exchange.places.Find(path)), mHandler(std::move(handler)) {
+    if (mPlace && !mPlace->exists) {
+      if (auto error = WhyNotNew(*mPlace)) mPlace = *std::move(error);
+    }
+    if (mPlace) exchange.Put(request::GetFSSpec(mPlace->path), *this, mRecord);
+  }
+
+  void Tell(Exchange& exchange) override {
+    auto record = Record(exchange);
+    if (!record) return mHandler(record.Failure());
+    const Outcome outcome = mPlace->exists ? Outcome::kFound : Outcome::kNew;
+    auto value = ValueOf(exchange, *std::move(record));
+    if (!value) return mHandler(value.Failure());
+    mHandler(Converted<T>{*std::move(value), outcome});
+  }
+
+ protected:
+  // REQUIRES: it has been found.
+  const Place& GetPlace() const { return *mPlace; }
+  bool HasPlace() const { return mPlace.HasValue(); }
+
+  virtual Result<T> ValueOf(Exchange& exchange, FSSpec record) = 0;
+
+ private:
+  Result<FSSpec> Record(Exchange& exchange) {
+    if (!mPlace) return mPlace.Failure();
+    if (!*mRecord) return mRecord->Failure();
+    auto& record = **mRecord;
+    if (!record || record->parID == kParentOnNoVolume) return OnNoVolume(mPlace->path);
+    if (!mPlace->exists && MayBeAnothersName(mPlace->Name())) {
+      const auto wayBack = exchange.AskNow(request::SetFileRefFromFSSpec(*record, false));
+      if (!wayBack) return wayBack.Failure();
+      if (!*wayBack) return OnNoVolume(mPlace->path);
+      if (LastNameOf(**wayBack) != mPlace->Name()) return IsAnothers(mPlace->path);
+    }
+    return *std::move(record);
+  }
+
+  Result<Place> mPlace;
+  std::optional<Result<std::optional<FSSpec>>> mRecord;
+  Handler<T> mHandler;
+};
+
+class RecordQuestion final : public ItemQuestion<FSSpec> {
+ public:
+  using ItemQuestion::ItemQuestion;
+
+ private:
+  Result<FSSpec> ValueOf(Exchange& /*exchange*/, FSSpec record) override { return record; }
+};
+
+class NameQuestion final : public ItemQuestion<std::string> {
+ public:
+  using ItemQuestion::ItemQuestion;
+
+ private:
+  Result<std::string> ValueOf(Exchange& /*exchange*/, FSSpec record) override {
+    return std::move(record.name);
+  }
+};
+
+class HFSPathQuestion final : public ItemQuestion<std::string> {
+ public:
+  HFSPathQuestion(Exchange& exchange, std::string_view path, Handler<std::string> handler)
+      : ItemQuestion(exchange, path, std::move(handler)) {
+    if (!HasPlace()) return;
+    exchange.PutFullPathOf(GetPlace().folder);
+    if (GetPlace().isFolder) exchange.Put(request::MakeFullPath(GetPlace().path), *this, mOwn);
+  }
+
+ private:
+  Result<std::string> ValueOf(Exchange& exchange, FSSpec record) override {
+    const auto& folder = *GetPlace().folder->fullPath;
+    if (!folder) return folder.Failure();
+    if (mOwn && !*mOwn) return mOwn->Failure();
+    // For a folder at which a kernel interface is mounted, the service tells that of its holder.
+    const bool isItsOwn = mOwn && (record.parID == kParentOfRoots || **mOwn != *folder);
+    std::string path = isItsOwn ? **mOwn : *folder + record.name;
+    if (mOwn && !isItsOwn) path.push_back(protocol::kSeparator);
+    return Whole(exchange, std::move(path), isItsOwn ? **mOwn : *folder);
+  }
+
+  // The path, unless the service has left something out of that of the folder in it.
+  Result<std::string> Whole(Exchange& exchange, std::string path, std::string folder) {
+    const Error tooLong{Outcome::kInvalid,
+                        "the HFS path of " + Quoted(GetPlace().path) + " is longer than 511 bytes"};
+    if (path.size() > kMostBytesOfFolders) return tooLong;
+    std::string_view place = GetPlace().path;
+    if (folder.size() == path.size()) place = FolderOf(place);
+    while (LengthOfFolders(folder) > kMostBytesOfFolders - protocol::kLongestSpecName - 1) {
+      place = FolderOf(place);
+      auto outer = exchange.AskNow(request::MakeFullPath(place.empty() ? "/" : place));
+      if (!outer) return outer.Failure();
+      if (!folder.starts_with(*outer)) return tooLong;
+      folder = *std::move(outer);
+    }
+    return path;
+  }
+
+  static std::size_t LengthOfFolders(std::string_view fullPath) {
+    return fullPath.size() - fullPath.find(protocol::kSeparator) - 1;
+  }
+
+  std::optional<Result<std::string>> mOwn;  // of a folder: its own full path
+};
+
+}  // namespace
+
+std::unique_ptr<Question> RecordOf(Exchange& exchange, std::string_view path,
+                                   Handler<FSSpec> handler) {
+  return std::make_unique<RecordQuestion>(exchange, path, std::move(handler));
+}
+
+std::unique_ptr<Question> HFSNameOf(Exchange& exchange, std::string_view path,
+                                    Handler<std::string> handler) {
+  return std::make_unique<NameQuestion>(exchange, path, std::move(handler));
+}
+
+std::unique_ptr<Question> HFSPathOf(Exchange& exchange, std::string_view path,
+                                    Handler<std::string> handler) {
+  return std::make_unique<HFSPathQuestion>(exchange, path, std::move(handler));
+}
+
+}  // namespace tallowmere::conversion
