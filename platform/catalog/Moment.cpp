@@ -242,7 +242,8 @@ kernel::Result<Look> Moment::LookUp(const HeldFolder& folder, std::string_view n
   auto item = ReadForID(folder, spot);
   if (!item) return item.Error();
   Look look(folder, {std::move(path), *item});
-  if (mLooks.size() < kMostLooks) mLooks.push_back({look, std::nullopt});
+  if (mLooks.size() == kMostLooks) mLooks.pop_back();
+  mLooks.push_back({look, std::nullopt});
   return look;
 }
 
@@ -284,10 +285,13 @@ const Look* Moment::LookFor(const kernel::Item& reference) const {
 
 kernel::Item Moment::Prove(const Look& look) {
   const kernel::Item reference = Proved(look.Seen(), *look.Folder().Volume(), look.Spot());
-  for (auto& known : mLooks) {
-    const bool isIt =
-        known.fact.Path() == look.Path() && kernel::HaveSameNumbers(known.fact.Item(), look.Item());
-    if (isIt) known.reference = reference;
+  const auto known = std::find_if(mLooks.begin(), mLooks.end(), [&](const auto& noted) {
+    return noted.fact.Path() == look.Path() &&
+           kernel::HaveSameNumbers(noted.fact.Item(), look.Item());
+  });
+  if (known != mLooks.end()) {
+    known->reference = reference;
+    std::rotate(mLooks.begin(), known, known + 1);
   }
   return reference;
 }

@@ -136,7 +136,8 @@ class Moment {
   // The item at a path, links on the way followed, at its canonical path.
   kernel::Result<Sighting> See(const std::string& path);
 
-  // A look of this moment that saw the item of a reference; null when there is none.
+  // The look of this moment that saw the item of a reference, by the name for which a reference was
+  // made last; null when there is none.
   const Look* LookFor(const kernel::Item& reference) const;
 
   // --- Climbs ---------------------------------------------------------------------------------
@@ -180,7 +181,7 @@ class Moment {
   Catalog& mCatalog;
   volumes::VolumesPointer mVolumes;      // null until polled
   std::vector<Noted<HeldFolder>> mHeld;  // few: they keep volumes from being unmounted
-  std::vector<Noted<Look>> mLooks;
+  std::vector<Noted<Look>> mLooks;  // those with references first, the last one made before all
   std::optional<Climb> mClimb;
   bool mIsTableNew = false;
 };
