@@ -45,8 +45,15 @@ int MakeFileAt(const std::string& path) {
 }
 
 // Uses up the numbers that cannot be node ids.
+std::string UsedUp(const std::string& folder, int number) {
+  return folder + "/used up " + std::to_string(number);
+}
 void UseUpFirstInodes(const std::string& folder) {
-  for (int i = 0; i < kFirstInodes; ++i) MakeFileAt(folder + "/used up " + std::to_string(i));
+  for (int i = 0; i < kFirstInodes; ++i) MakeFileAt(UsedUp(folder, i));
+}
+
+int Exchange(const std::string& first, const std::string& second) {
+  return renameat2(AT_FDCWD, first.c_str(), AT_FDCWD, second.c_str(), RENAME_EXCHANGE);
 }
 
 void Remove(State& state, const Entry& entry) {
@@ -84,6 +91,7 @@ Churner::~Churner() {
 
 State Churner::FirstState() {
   UseUpFirstInodes(mFolder);
+  mCanExchange = Exchange(UsedUp(mFolder, 0), UsedUp(mFolder, 1)) == 0;
   State state;
   state.main = {kMainRoot, NumberOf(mFolder)};
   const std::string place = mFolder + "/" + NameAt(kVolumePlace).linuxName;
@@ -315,6 +323,7 @@ bool Churner::MoveFolder() {
 
 // Also exchanges a folder and a link, where the link stays after its target.
 bool Churner::ExchangeFolders() {
+  if (!mCanExchange) return false;
   const Entry* const first = AnyEntry([](const Entry& e) { return IsOuter(e); });
   if (first == nullptr) return false;
   const Entry* const second =
@@ -334,8 +343,7 @@ bool Churner::ExchangeFolders() {
   Add(next, movedSecond);
   const std::string one = PathOf(kMainRoot, movedFirst.name);
   const std::string two = PathOf(kMainRoot, movedSecond.name);
-  Change(next,
-         [&] { return renameat2(AT_FDCWD, one.c_str(), AT_FDCWD, two.c_str(), RENAME_EXCHANGE); });
+  Change(next, [&] { return Exchange(one, two); });
   return true;
 }
 

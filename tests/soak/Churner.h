@@ -70,6 +70,7 @@ class Churner {
   std::string mFolder;
   std::mt19937_64 mRandom;
   unsigned mPause;
+  bool mCanExchange = false;  // not every server can
   Node mNextNode = kMainRoot + 1;
   History mHistory;
   std::vector<std::uint64_t> mCounts;

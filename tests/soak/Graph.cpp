@@ -178,6 +178,7 @@ std::vector<Node> Walk::FoldersWithID(const Volume& volume, std::uint32_t id) {
       folders.push_back(entry.node);
     }
   }
+  if (mGraph.IsOfOneState() && folders.size() > 1) return {};
   return folders;
 }
 

@@ -71,6 +71,7 @@ class Walk {
   // Whether a link can lead somewhere, and whether it can lead nowhere.
   std::pair<bool, bool> Leads(const Entry& link);
 
+  // In one state an id that several folders share is nobody's.
   std::vector<Node> FoldersWithID(const Volume& volume, std::uint32_t id);
   std::uint32_t IDOf(Node folder) const;
   std::vector<Volume> VolumesOf(Node folder) const;

@@ -10,6 +10,7 @@
 
 #include "Answers.h"
 #include "Leads.h"
+#include "support/Wire.h"
 
 namespace tallowmere::soak {
 namespace {
@@ -54,6 +55,20 @@ bool Has(const State& state, const Entry& entry) {
   return std::find(state.begin(), state.end(), entry) != state.end();
 }
 
+// Whether some folder cannot be told by its number: something covers it, or another one has it.
+bool HidesFolders(const State& state) {
+  std::set<std::uint64_t> numbers;
+  const auto isShared = [&](const Entry& entry) {
+    return entry.kind == Kind::kFolder && !numbers.insert(entry.inode).second;
+  };
+  return state.other.root != kNoNode || std::any_of(state.begin(), state.end(), isShared);
+}
+
+// ESTALE, which a server may say of what has moved.
+bool IsServersError(const Request& request, const std::string& response) {
+  return request.code == 2 && response == test::ResultResponse(test::kResultSystemError);
+}
+
 // A request and what it turns into: once code 8 has found a record, it continues as code 9 with a
 // search of the other volumes, which have items of their own with that number and name.
 std::vector<Request> StagesOf(const Request& request) {
@@ -87,13 +102,17 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
     }
     before = std::move(truth);
   }
-  if (!hasChanged) return Verdict::kWrong;
+  const bool canBeUndetermined = mIsUntrusted && (first < last || HidesFolders(mHistory.At(first)));
+  if (!hasChanged && !canBeUndetermined) return Verdict::kWrong;
   std::vector<const State*> states;
   for (History::Version version = first; version <= last; ++version) {
     states.push_back(&mHistory.At(version));
   }
+  // What cannot be determined is answered in steps as well.
+  if (first == last) states.push_back(states.front());
   const Truth inSteps = Answers(Graph(states), mPlace, request);
   if (inSteps.honestErrors.contains(response)) return Verdict::kHonestError;
+  if (mIsUntrusted && IsServersError(request, response)) return Verdict::kHonestError;
   switch (DestinationOf(states, request, response)) {
     case Destination::kMeant:
       return inSteps.responses.contains(response) ? Verdict::kMoved : Verdict::kWrong;

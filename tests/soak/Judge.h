@@ -1,6 +1,7 @@
 // Judges whether an answer was true at some moment between question and answer.
 #pragma once
 
+#include <cstddef>
 #include <map>
 #include <string>
 #include <vector>
@@ -19,10 +20,14 @@ enum class Verdict {
   kNowhere,      // leads to no item in any of the states, and what was asked for changed
   kWrong,
 };
+inline constexpr std::size_t kVerdicts = 5;
 
 class Judge {
  public:
-  Judge(const History& history, Place place) : mHistory(history), mPlace(std::move(place)) {}
+  // On an untrusted volume, where any two items could have one number, any change and anything
+  // that is mounted in it can make an id undetermined.
+  Judge(const History& history, Place place, bool isUntrusted = false)
+      : mHistory(history), mPlace(std::move(place)), mIsUntrusted(isUntrusted) {}
 
   // REQUIRES: all states from the first to the last one are reached and kept.
   Verdict Of(const Request& request, const std::string& response, History::Version first,
@@ -42,6 +47,7 @@ class Judge {
 
   const History& mHistory;
   Place mPlace;
+  bool mIsUntrusted;
   std::map<History::Version, Graph> mGraphs;  // of the states that were used last
 };
 

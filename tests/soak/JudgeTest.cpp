@@ -76,13 +76,14 @@ std::vector<State> OuterFolderMoved(bool rootHasSub) {
 }
 
 Verdict VerdictOn(const std::vector<State>& states, const Request& request,
-                  const std::string& response) {
+                  const std::string& response, bool isUntrusted = false) {
   History history(states.front());
   for (std::size_t i = 1; i < states.size(); ++i) {
     history.Begin(states[i]);
     history.Reach();
   }
-  return Judge(history, {"/soaked", "soaked"}).Of(request, response, 0, history.Reached());
+  return Judge(history, {"/soaked", "soaked"}, isUntrusted)
+      .Of(request, response, 0, history.Reached());
 }
 
 Request RequestAbout(unsigned code, const std::vector<NameIndex>& names) {
@@ -304,6 +305,47 @@ TEST(Judge, NameOfAVolumeThatThePathDoesNotLeadToIsWrong) {
 TEST(Judge, FullPathCutShortThatLeadsToAnotherFolderIsWrong) {
   EXPECT_EQ(VerdictOn(OuterFolderMoved(true), RequestAbout(1, {kSoakB, kSubfolder}),
                       FullPathResponse("soaked:sub:")),
+            Verdict::kWrong);
+}
+
+// --- Untrusted numbers --------------------------------------------------------------------------
+
+// Two folders with one number, each with an X.
+State TwoFoldersWithOneNumber() {
+  Entry second = EntryIn(kMainRoot, kSoakC, kZ, Kind::kFolder);
+  const Entry first = EntryIn(kMainRoot, kSoakB, kF2, Kind::kFolder);
+  second.inode = first.inode;
+  return StateOf({kPlaceEntry, first, second, EntryIn(kF2, kTrack1, kX, Kind::kFile)});
+}
+
+TEST(JudgeOfAnUntrustedVolume, TakesAnErrorWhenSomethingElseHasChanged) {
+  State before = FolderAndThenFileMoved().front();
+  State after = before;
+  after.entries.at(after.count++) = EntryIn(kMainRoot, kTrack1, kSub, Kind::kFile);
+  EXPECT_EQ(VerdictOn({before, after}, RequestAboutRecordOfX(), kNoItemResponse), Verdict::kWrong);
+  EXPECT_EQ(VerdictOn({before, after}, RequestAboutRecordOfX(), kNoItemResponse, true),
+            Verdict::kHonestError);
+}
+
+TEST(JudgeOfAnUntrustedVolume, TakesNoErrorWhenNothingHasChanged) {
+  const State state = FolderAndThenFileMoved().front();
+  EXPECT_EQ(VerdictOn({state}, RequestAboutRecordOfX(), kNoItemResponse, true), Verdict::kWrong);
+}
+
+TEST(JudgeOfAnUntrustedVolume, TakesOnlyAnErrorAboutANumberThatTwoFoldersHave) {
+  const State state = TwoFoldersWithOneNumber();
+  EXPECT_EQ(VerdictOn({state}, RequestAboutRecordOfX(), kNoItemResponse, true), Verdict::kExact);
+  EXPECT_EQ(
+      VerdictOn({state}, RequestAboutRecordOfX(), PathResponse("/soaked/soak B/track 1.aif"), true),
+      Verdict::kWrong);
+}
+
+TEST(JudgeOfAnUntrustedVolume, TakesNoOtherItem) {
+  const State state = FolderAndThenFileMoved().front();
+  State after = state;
+  after.entries.at(after.count++) = EntryIn(kMainRoot, kTrack1, kSub, Kind::kFile);
+  EXPECT_EQ(VerdictOn({state, after}, RequestAboutRecordOfX(),
+                      PathResponse("/soaked/soak B/track 2.aif"), true),
             Verdict::kWrong);
 }
 

@@ -25,11 +25,11 @@
 
 #include "Churner.h"
 #include "Judge.h"
+#include "MainVolume.h"
 #include "Requests.h"
 #include "support/AtomReader.h"
 #include "support/ChildProgram.h"
 #include "support/EveryRequest.h"
-#include "support/FileSystemImage.h"
 #include "support/MountNamespace.h"
 #include "support/SmallRoot.h"
 #include "support/Wire.h"
@@ -259,7 +259,7 @@ class Asker {
 // --- The run ----------------------------------------------------------------------------------
 
 struct Counts {
-  std::array<std::array<std::uint64_t, 5>, kCodes> ofVerdict{};
+  std::array<std::array<std::uint64_t, kVerdicts>, kCodes> ofVerdict{};
   std::uint64_t asked = 0;
   std::uint64_t wrong = 0;
   std::uint64_t states = 0;  // states used by judgements, in all
@@ -267,12 +267,12 @@ struct Counts {
 
 class Run {
  public:
-  Run(const Options& options, const std::string& folder)
+  Run(const Options& options, const std::string& folder, bool isUntrusted)
       : mOptions(options),
         mChurner(folder, options.seed, options.pause),
         mService(options.service),
         mPlace{folder, NameOfMainVolume(folder)},
-        mJudge(mChurner.Changes(), mPlace),
+        mJudge(mChurner.Changes(), mPlace, isUntrusted),
         mAsker(options.seed + 1) {}
 
   bool Everything() {
@@ -414,54 +414,57 @@ class Run {
 
 constexpr const char* kFolder = "/soaked";
 
-// Whether the main volume could be mounted, in a root folder of its own.
-bool IsPrepared(FileSystemImage* image, const std::string& service) {
-  if (!EnterOwnMountNamespace()) return false;
-  if (image == nullptr) {
-    if (!EnterSmallRoot({service})) return false;
-    std::filesystem::create_directory(kFolder);
-    return mount("none", kFolder, "tmpfs", 0, "") == 0;
-  }
-  // Mounted from the old root folder, from which it is moved along.
-  if (!image->Mount()) return false;
-  const int tree = static_cast<int>(
-      syscall(SYS_open_tree, AT_FDCWD, image->Path().c_str(), OPEN_TREE_CLONE | OPEN_TREE_CLOEXEC));
-  if (tree < 0 || !EnterSmallRoot({service})) return false;
-  std::filesystem::create_directory(kFolder);
-  const bool isMoved =
-      syscall(SYS_move_mount, tree, "", AT_FDCWD, kFolder, MOVE_MOUNT_F_EMPTY_PATH) == 0;
-  close(tree);
-  return isMoved;
-}
+// The main volume at kFolder, in a small root folder of its own.
+class Stage {
+ public:
+  Stage(MainVolume& volume, const std::string& service)
+      : mIsSet(EnterOwnMountNamespace() && IsSet(volume, service)) {}
+  Stage(const Stage&) = delete;
+  Stage& operator=(const Stage&) = delete;
+  // A server ends when nothing shows its file system any more.
+  ~Stage() { umount2(kFolder, MNT_DETACH); }
 
-int RunIn(FileSystemImage* image, const Options& options) {
-  if (!IsPrepared(image, options.service)) {
-    std::printf("mounting is not permitted here\n");
+  bool IsSet() const { return mIsSet; }
+
+ private:
+  // Mounted from the old root folder, from which it is moved along.
+  static bool IsSet(MainVolume& volume, const std::string& service) {
+    const auto place = volume.Mount();
+    if (!place) return false;
+    const int tree = static_cast<int>(
+        syscall(SYS_open_tree, AT_FDCWD, place->c_str(), OPEN_TREE_CLONE | OPEN_TREE_CLOEXEC));
+    if (tree < 0 || !EnterSmallRoot({service})) return false;
+    std::filesystem::create_directory(kFolder);
+    const bool isMoved =
+        syscall(SYS_move_mount, tree, "", AT_FDCWD, kFolder, MOVE_MOUNT_F_EMPTY_PATH) == 0;
+    close(tree);
+    return isMoved;
+  }
+
+  bool mIsSet;
+};
+
+int RunOn(MainVolume& volume, const Options& options) {
+  const Stage stage(volume, options.service);
+  if (!stage.IsSet()) {
+    std::printf("%s cannot be mounted here\n", options.on.c_str());
     return kSkipped;
   }
   std::printf("seed %llu, on %s\n", static_cast<unsigned long long>(options.seed),
               options.on.c_str());
   std::fflush(stdout);
-  return Run(options, kFolder).Everything() ? 0 : 1;
+  return Run(options, kFolder, volume.IsUntrusted()).Everything() ? 0 : 1;
 }
 
 int Main(Options options) {
   options.service = std::filesystem::absolute(options.service);
-  std::optional<FileSystemImage> image;
-  if (options.on == "ext4") {
-    constexpr std::uintmax_t kImageSize = 64 << 20;
-    image.emplace("ext4", std::vector<std::string>{"mkfs.ext4", "-q", "-F"}, kImageSize);
-    if (!image->IsMade()) {
-      std::printf("there is no mkfs.ext4\n");
-      return kSkipped;
-    }
-  }
-  // The process that removes the image afterwards keeps the machine's root folder.
+  MainVolume volume(options.on);
+  // The process that removes the volume's files afterwards keeps the machine's root folder.
   const pid_t child = fork();
   if (child == 0) {
     int status = 1;
     try {
-      status = RunIn(image ? &*image : nullptr, options);
+      status = RunOn(volume, options);
     } catch (const std::exception& error) {
       std::printf("tallowmere_soak: %s\n", error.what());
     }
@@ -486,10 +489,7 @@ std::optional<Options> ReadOptions(int count, char** words) {
     } else if (name == "--service") {
       options.service = value;
     } else if (name == "--on") {
-      if (value != "tmpfs" && value != "ext4") {
-        std::fprintf(stderr, "tallowmere_soak: --on tmpfs or ext4, not %s\n", value.c_str());
-        return std::nullopt;
-      }
+      if (!MainVolume::IsKind(value)) return std::nullopt;
       options.on = value;
     } else if (name == "--pause") {
       options.pause = static_cast<unsigned>(std::stoul(value));
@@ -513,8 +513,12 @@ int main(int count, char** words) {
     if (options) return tallowmere::soak::Main(*options);
     std::fprintf(stderr,
                  "usage: tallowmere_soak [--requests N] [--seed N] [--service PROGRAM]\n"
-                 "                       [--on tmpfs|ext4] [--pause MICROSECONDS] [--group N]\n"
-                 "                       [--slack KIB]\n");
+                 "                       [--on FILESYSTEM] [--pause MICROSECONDS] [--group N]\n"
+                 "                       [--slack KIB]\nfile systems:");
+    for (const std::string& kind : tallowmere::soak::MainVolume::Kinds()) {
+      std::fprintf(stderr, " %s", kind.c_str());
+    }
+    std::fprintf(stderr, "\n");
     return tallowmere::soak::kMisused;
   } catch (const std::exception& error) {
     std::fprintf(stderr, "tallowmere_soak: %s\n", error.what());

@@ -1,5 +1,6 @@
 // The same promises on real file systems: identity, and the way from path to record to path in
 // another process.
+#include <Tallowmere/Process.h>
 #include <fcntl.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
@@ -129,6 +130,28 @@ TEST_F(ARealFileSystem, Ext4KeepsThePromises) {
   MakeItems(mImage->Path(), true);
   ExpectPromises(mImage->Path());
   ExpectTheSameIDsAfterMountingAgain();
+}
+
+// The item is known by either of its names, one of which has a short form. It is no newborn, so that
+// both names are seen to be one item's.
+TEST_F(ARealFileSystem, Ext4TellsAnItemByTheNameThatIsMeant) {
+  MakeImage("ext4", {"mkfs.ext4", "-q", "-F"}, 32 * kMegabyte);
+  if (IsSkipped()) return;
+  const std::string plain = mImage->Path() / "plain.aif";
+  const std::string longer = mImage->Path() / (std::string(70, 'x') + ".aif");
+  std::ofstream(plain) << "item";
+  std::filesystem::create_hard_link(plain, longer);
+  const OtherTime later(std::chrono::hours(1));
+  for (const std::string& meant : {plain, longer}) {
+    const FSSpec spec = SpecOf(meant);
+    for (const std::string& known : {plain, longer}) {
+      ReferenceTo(known);
+      const process::Moment moment;
+      FSRef item{};
+      ASSERT_EQ(FSpMakeFSRef(&spec, &item), noErr);
+      EXPECT_EQ(PathOf(item), meant) << "known as " << known;
+    }
+  }
 }
 
 TEST_F(ARealFileSystem, XfsKeepsThePromises) {

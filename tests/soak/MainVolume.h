@@ -1,0 +1,44 @@
+// The file systems on which a soak can run.
+#pragma once
+
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "support/FileSystemImage.h"
+#include "support/TemporaryFolder.h"
+
+namespace tallowmere::soak {
+
+// One of them, not mounted at first. Its files are removed with it.
+class MainVolume {
+ public:
+  static std::vector<std::string> Kinds();
+  static bool IsKind(const std::string& kind);
+
+  // REQUIRES: it is one of the kinds.
+  explicit MainVolume(const std::string& kind);
+
+  // Whether two items can have one inode number as far as the service knows, so that nearly
+  // nothing can be told of an id while the tree changes.
+  bool IsUntrusted() const { return mIsUntrusted; }
+
+  // Mounts it. Returns the mount point; nullopt where a tool or the kernel's support is missing.
+  // REQUIRES: this process is in a mount namespace of its own.
+  std::optional<std::string> Mount();
+
+ private:
+  std::string FolderFor(const std::string& name) const { return mFolder.MakeFolder(name); }
+  bool MountImage(const std::string& place);
+  bool MountOverlay(const std::string& place);
+  bool MountServed(const std::string& place);
+
+  test::TemporaryFolder mFolder;
+  std::string mKind;
+  bool mIsUntrusted;
+  std::optional<test::FileSystemImage> mImage;
+};
+
+}  // namespace tallowmere::soak
