@@ -1,5 +1,5 @@
-// The state of a process: what it knows, and the moment that is open. It is never destroyed, so
-// that calls from static destructors and exit handlers find it whole.
+// The state of a process: what it knows, the moment that is open, and what its callers own. It is
+// never destroyed, so that calls from static destructors and exit handlers find it whole.
 #pragma once
 
 #include <CoreServices/CoreServices.h>
@@ -9,6 +9,8 @@
 
 #include "catalog/Catalog.h"
 #include "catalog/Moment.h"
+#include "quicktime/Components.h"
+#include "quicktime/Handles.h"
 
 namespace tallowmere::calls {
 
@@ -24,6 +26,8 @@ struct Process {
   WalkByIndex walk;
   catalog::Moment moment{catalog};  // of a request; restarted with each
   std::thread::id momentOwner;      // whose moment is open; no thread's where none is
+  quicktime::Handles handles;
+  quicktime::Components components;
 };
 
 Process& ThisProcess();
