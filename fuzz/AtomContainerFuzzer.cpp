@@ -68,17 +68,16 @@ void CheckWriting(Input& input) {
   const auto word = static_cast<UInt32>(input.TakeByte() << 24 | input.TakeByte());
   const auto half = static_cast<UInt16>(input.TakeByte() << 8 | input.TakeByte());
   quicktime::AtomContainer container;
-  container.Open(quicktime::FourCharacterCode("sean"), 2);
+  const std::size_t root = container.Open(quicktime::FourCharacterCode("sean"), 2);
   container.AddLeaf(quicktime::FourCharacterCode("leaf"), word);
-  container.Open(quicktime::FourCharacterCode("fold"), 1);
+  const std::size_t fold = container.Open(quicktime::FourCharacterCode("fold"), 1);
   container.AddLeaf(quicktime::FourCharacterCode("leaf"), half);
-  container.Close();
-  container.Close();
+  container.Close(fold);
+  container.Close(root);
   const test::Atom wordLeaf{"leaf", 1, {}, Bytes(word, 4)};
   const test::Atom halfLeaf{"leaf", 1, {}, Bytes(half, 2)};
   const test::Atom folder{"fold", 1, {halfLeaf}, ""};
-  Check(test::ReadAtomContainer(container.Bytes()) ==
-        test::Atom{"sean", 1, {wordLeaf, folder}, ""});
+  Check(test::ReadAtomContainer(container.Take()) == test::Atom{"sean", 1, {wordLeaf, folder}, ""});
 }
 
 }  // namespace

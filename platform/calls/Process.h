@@ -1,5 +1,5 @@
-// The platform's state in this process: the catalog and the open moment. It is never destroyed, so
-// that calls from static destructors and exit handlers still work.
+// The platform's state in this process: the catalog, the open moment, and what callers own. It is
+// never destroyed, so that calls from static destructors and exit handlers still work.
 #pragma once
 
 #include <CoreServices/CoreServices.h>
@@ -9,6 +9,8 @@
 
 #include "catalog/Catalog.h"
 #include "catalog/Moment.h"
+#include "quicktime/Components.h"
+#include "quicktime/Handles.h"
 
 namespace tallowmere::calls {
 
@@ -24,6 +26,8 @@ struct Process {
   WalkByIndex walk;
   catalog::Moment moment{catalog};  // of the current request
   std::thread::id momentOwner;      // whose moment is open; no thread's if none is
+  quicktime::Handles handles;
+  quicktime::Components components;
 };
 
 Process& ThisProcess();

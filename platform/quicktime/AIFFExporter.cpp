@@ -50,15 +50,15 @@ OSErr AIFFExporter::SetSound(const SoundDescription& sound) {
 std::string AIFFExporter::Settings() const {
   constexpr UInt16 kLeaves = 4;
   AtomContainer settings;
-  settings.Open(kRootAtom, 1);
-  settings.Open(SoundMediaType, kLeaves);
+  const std::size_t root = settings.Open(kRootAtom, 1);
+  const std::size_t sound = settings.Open(SoundMediaType, kLeaves);
   settings.AddLeaf(kFormatAtom, mSound->dataFormat);
   settings.AddLeaf(kRateAtom, mSound->sampleRate);
   settings.AddLeaf(kSampleSizeAtom, static_cast<UInt16>(mSound->sampleSize));
   settings.AddLeaf(kChannelsAtom, static_cast<UInt16>(mSound->numChannels));
-  settings.Close();
-  settings.Close();
-  return settings.Bytes();
+  settings.Close(sound);
+  settings.Close(root);
+  return settings.Take();
 }
 
 }  // namespace tallowmere::quicktime

@@ -10,7 +10,7 @@
 
 #include <cstddef>
 #include <string>
-#include <vector>
+#include <utility>
 
 namespace tallowmere::quicktime {
 
@@ -18,23 +18,19 @@ class AtomContainer {
  public:
   AtomContainer();
 
-  // Begins an atom with so many children, which follow; Close ends it.
-  void Open(OSType type, UInt16 childCount);
-  void Close();
+  // Begins an atom with so many children, which follow. Returns where it begins, for Close.
+  std::size_t Open(OSType type, UInt16 childCount);
+  void Close(std::size_t begin);
 
   // An atom with a number for its data.
   void AddLeaf(OSType type, UInt32 number);
   void AddLeaf(OSType type, UInt16 number);
 
-  // REQUIRES: every atom is closed.
-  const std::string& Bytes() const { return mBytes; }
+  // The container's bytes, which it gives up. REQUIRES: every atom is closed.
+  std::string Take() { return std::move(mBytes); }
 
  private:
-  void Append(UInt32 number);
-  void Append(UInt16 number);
-
   std::string mBytes;
-  std::vector<std::size_t> mOpen;  // where the open atoms begin
 };
 
 }  // namespace tallowmere::quicktime

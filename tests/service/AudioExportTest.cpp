@@ -1,16 +1,12 @@
 // What a request for export settings leaves behind in the process.
 #include <gtest/gtest.h>
 
-#include "quicktime/Components.h"
-#include "quicktime/Handles.h"
 #include "service/AudioCommands.h"
 #include "support/AtomReader.h"
+#include "support/OwnedByCallers.h"
 
 namespace tallowmere::test {
 namespace {
-
-using quicktime::LiveHandles;
-using quicktime::OpenInstances;
 
 constexpr unsigned long kRate = 44100ul << 16;
 constexpr unsigned long kTwos = 0x74776F73;

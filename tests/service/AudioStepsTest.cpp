@@ -10,10 +10,10 @@
 #include <string>
 #include <vector>
 
-#include "quicktime/Handles.h"
 #include "service/AudioCommands.h"
 #include "service/Commands.h"
 #include "service/Request.h"
+#include "support/OwnedByCallers.h"
 #include "support/Pipe.h"
 #include "support/Wire.h"
 
@@ -97,8 +97,6 @@ ComponentResult MovieExportGetSettingsAsAtomContainer(MovieExportComponent expor
 namespace tallowmere::test {
 namespace {
 
-using quicktime::LiveHandles;
-using quicktime::NewHandleWith;
 using testing::ElementsAre;
 
 class AudioSteps : public testing::Test {

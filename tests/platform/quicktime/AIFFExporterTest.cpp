@@ -5,14 +5,14 @@
 #include <string>
 
 #include "ExporterFixture.h"
-#include "quicktime/Components.h"
-#include "quicktime/Handles.h"
 #include "support/AtomReader.h"
+#include "support/OwnedByCallers.h"
 
 namespace tallowmere::quicktime::test {
 namespace {
 
 using tallowmere::test::Atom;
+using tallowmere::test::LiveHandles;
 using tallowmere::test::ReadAtomContainer;
 using tallowmere::test::SettingsOf;
 

@@ -1,10 +1,12 @@
+#include <QuickTime/QuickTime.h>
 #include <gtest/gtest.h>
 
-#include "quicktime/Components.h"
-#include "quicktime/Handles.h"
+#include "support/OwnedByCallers.h"
 
 namespace tallowmere::quicktime::test {
 namespace {
+
+using tallowmere::test::OpenInstances;
 
 constexpr OSType kSpit = 0x73706974;
 constexpr OSType kAIFF = 0x41494646;

@@ -1,13 +1,18 @@
+#include <QuickTime/QuickTime.h>
 #include <gtest/gtest.h>
 
 #include <cstring>
 #include <limits>
 #include <string>
+#include <vector>
 
-#include "quicktime/Handles.h"
+#include "support/OwnedByCallers.h"
 
 namespace tallowmere::quicktime::test {
 namespace {
+
+using tallowmere::test::LiveHandles;
+using tallowmere::test::NewHandleWith;
 
 TEST(Handles, ANewBlockIsZeroAndHasItsSize) {
   // What was in memory before is no zeros.
@@ -41,6 +46,38 @@ TEST(Handles, EachBlockIsItsOwn) {
   DisposeHandle(first);
   EXPECT_EQ(std::string(*second, 5), "abcde");
   DisposeHandle(second);
+}
+
+TEST(Handles, AmongThousandsEachBlockIsItsOwnAndStaysWhereItIs) {
+  const auto before = LiveHandles();
+  std::vector<Handle> handles;
+  std::vector<char*> bytes;
+  for (int i = 0; i < 5000; ++i) {
+    handles.push_back(NewHandleWith("block " + std::to_string(i)));
+    bytes.push_back(*handles.back());
+  }
+  for (std::size_t i = 0; i < handles.size(); i += 2) DisposeHandle(handles[i]);
+  for (std::size_t i = 0; i < handles.size(); ++i) {
+    const std::string content = "block " + std::to_string(i);
+    const bool isLive = i % 2 == 1;
+    ASSERT_EQ(GetHandleSize(handles[i]), isLive ? static_cast<Size>(content.size()) : 0);
+    if (!isLive) continue;
+    ASSERT_EQ(*handles[i], bytes[i]);
+    ASSERT_EQ(std::string(*handles[i], content.size()), content);
+  }
+  for (std::size_t i = 1; i < handles.size(); i += 2) DisposeHandle(handles[i]);
+  EXPECT_EQ(LiveHandles(), before);
+}
+
+TEST(Handles, APointerBesideABlocksIsNoHandle) {
+  const Handle handle = NewHandleClear(1);
+  const auto before = LiveHandles();
+  for (const int away : {-1, 1, 2}) {
+    EXPECT_EQ(GetHandleSize(handle + away), 0) << away;
+    DisposeHandle(handle + away);
+  }
+  EXPECT_EQ(LiveHandles(), before);
+  DisposeHandle(handle);
 }
 
 TEST(Handles, ABlockIsAliveUntilItIsDisposedOf) {
