@@ -9,7 +9,9 @@
 #include <map>
 #include <memory>
 #include <optional>
+#include <string>
 #include <utility>
+#include <vector>
 
 #include "client/Places.h"
 
@@ -25,8 +27,8 @@ class Question {
   Question& operator=(const Question&) = delete;
   virtual ~Question() = default;
 
-  // Whether every request that was put for it has been answered.
-  bool IsAnswered() const { return mAwaited == 0; }
+  // Whether everything that was asked for it has been answered.
+  virtual bool IsAnswered() const { return mAwaited == 0; }
 
   // Tells the answer. May ask more first, and wait for it. REQUIRES: IsAnswered(), and all before
   // it have been told.
@@ -68,8 +70,15 @@ class Exchange {
   // Waits for all answers and tells them.
   void Finish();
 
-  // Asks for a folder's full path, unless that has been done; the answer is in the folder.
+  // Asks for a folder's full path, unless that has been done, and whether it leads back to the
+  // folder; the answer is in the folder. It may not lead back where the folders above cannot be
+  // looked at, and where two volumes have one name. One that is too long to be asked about is taken
+  // as it is.
   void PutFullPathOf(const std::shared_ptr<Folder>& folder);
+
+  // Why the full HFS path of the folder at a path does not lead back to it, asked at once; nullopt
+  // when it does, and when it is too long to be asked about.
+  std::optional<Error> WhyNotBack(const std::string& fullPath, const std::string& path);
 
   // Whether a volume with the number is mounted; asked once.
   Result<bool> IsVolume(std::int16_t number);
@@ -77,9 +86,16 @@ class Exchange {
   Places places;
 
  private:
-  void TellFirst();
+  struct FullPath {
+    std::shared_ptr<Folder> folder;
+    std::string text;
+  };
+
+  void PutChecks();
+  void TellThoseInTurn();
 
   Batch mBatch;
+  std::vector<FullPath> mUnchecked;
   std::deque<std::unique_ptr<Question>> mQuestions;
   std::map<std::int16_t, bool> mVolumes;
 };

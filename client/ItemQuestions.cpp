@@ -120,31 +120,39 @@ class HFSPathQuestion final : public ItemQuestion<std::string> {
     if (GetPlace().isFolder) exchange.Put(request::MakeFullPath(GetPlace().path), *this, mOwn);
   }
 
+  bool IsAnswered() const override {
+    return ItemQuestion::IsAnswered() && (!HasPlace() || GetPlace().folder->fullPath);
+  }
+
  private:
   Result<std::string> ValueOf(Exchange& exchange, FSSpec record) override {
     const auto& folder = *GetPlace().folder->fullPath;
     if (!folder) return folder.Failure();
     if (mOwn && !*mOwn) return mOwn->Failure();
-    // For a folder at which a kernel interface is mounted, the service tells that of its holder.
-    const bool isItsOwn = mOwn && (record.parID == kParentOfRoots || **mOwn != *folder);
-    std::string path = isItsOwn ? **mOwn : *folder + record.name;
-    if (mOwn && !isItsOwn) path.push_back(protocol::kSeparator);
-    return Whole(exchange, std::move(path), isItsOwn ? **mOwn : *folder);
+    std::string path = *folder + record.name;
+    if (!mOwn) return Whole(exchange, std::move(path), *folder, FolderOf(GetPlace().path));
+    path.push_back(protocol::kSeparator);
+    // Of a folder at which a kernel interface is mounted, the service tells that of its holder.
+    if (record.parID != kParentOfRoots && **mOwn == *folder) return path;
+    if (**mOwn != path) {
+      if (auto error = exchange.WhyNotBack(**mOwn, GetPlace().path)) return *std::move(error);
+    }
+    return Whole(exchange, **mOwn, **mOwn, GetPlace().path);
   }
 
-  // The path, unless the service has left something out of that of the folder in it.
-  Result<std::string> Whole(Exchange& exchange, std::string path, std::string folder) {
+  // The path, unless the service has left something out of the full path of `folder`, with which it
+  // begins.
+  Result<std::string> Whole(Exchange& exchange, std::string path, std::string fullPath,
+                            std::string_view folder) {
     const Error tooLong{Outcome::kInvalid,
                         "the HFS path of " + Quoted(GetPlace().path) + " is longer than 511 bytes"};
     if (path.size() > kMostBytesOfFolders) return tooLong;
-    std::string_view place = GetPlace().path;
-    if (folder.size() == path.size()) place = FolderOf(place);
-    while (LengthOfFolders(folder) > kMostBytesOfFolders - protocol::kLongestSpecName - 1) {
-      place = FolderOf(place);
-      auto outer = exchange.AskNow(request::MakeFullPath(place.empty() ? "/" : place));
+    while (LengthOfFolders(fullPath) > kMostBytesOfFolders - protocol::kLongestSpecName - 1) {
+      folder = FolderOf(folder);
+      auto outer = exchange.AskNow(request::MakeFullPath(folder.empty() ? "/" : folder));
       if (!outer) return outer.Failure();
-      if (!folder.starts_with(*outer)) return tooLong;
-      folder = *std::move(outer);
+      if (!fullPath.starts_with(*outer)) return tooLong;
+      fullPath = *std::move(outer);
     }
     return path;
   }

@@ -108,6 +108,14 @@ Result<Looked> LookAt(const std::string& path) {
   return LookFrom(AT_FDCWD, path.c_str(), path);
 }
 
+bool IsSameItem(const std::string& one, const std::string& other) {
+  if (one == other) return true;
+  struct stat first {};
+  struct stat second {};
+  return lstat(one.c_str(), &first) == 0 && lstat(other.c_str(), &second) == 0 &&
+         IsSame(first, second);
+}
+
 std::string_view LastNameOf(std::string_view path) {
   return path.substr(path.rfind('/') + 1);
 }

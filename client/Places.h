@@ -31,7 +31,7 @@ class Folder {
   // Whether a path, without following a link at its end, leads to this folder.
   bool IsAt(const std::string& path) const;
 
-  // The folder's full HFS path, where somebody has asked for it.
+  // The folder's full HFS path, once somebody has asked for it and it has been checked.
   bool hasBeenAsked = false;
   std::optional<Result<std::string>> fullPath;
 
@@ -60,6 +60,9 @@ Result<Looked> LookAt(const Folder& folder, std::string_view name);
 
 // The same for a whole path.
 Result<Looked> LookAt(const std::string& path);
+
+// Whether two paths, links at their ends not followed, lead to one item.
+bool IsSameItem(const std::string& one, const std::string& other);
 
 // The last name of a path, and what is in front of it and its slash.
 std::string_view LastNameOf(std::string_view path);

@@ -10,8 +10,11 @@
 namespace tallowmere {
 namespace {
 
+constexpr std::size_t kMostQuoted = 1000;  // bytes; no more helps a person
+
 std::string Quoted(const std::string& text) {
-  return '"' + text + '"';
+  if (text.size() <= kMostQuoted) return '"' + text + '"';
+  return '"' + text.substr(0, kMostQuoted) + "...\"";
 }
 
 std::string QuotedHFS(const std::string& name) {

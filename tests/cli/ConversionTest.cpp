@@ -374,7 +374,9 @@ TEST_F(Conversion, AServiceThatDoesNotAnswerIsSaidWhenTheDeadlineHasPassed) {
   const std::string script = mFolder.MakeFile("silent", "#!/bin/sh\nexec sleep 60\n");
   chmod(script.c_str(), 0755);
   const Output output = Cli({"--service", script, "--deadline", "0.2", "name", "/"});
-  EXPECT_EQ(output.errors, "tallowmere-cli: the service did not answer in time\n");
+  EXPECT_EQ(
+      output.errors,
+      "tallowmere-cli: the service did not answer in time, asked for the name of the volume 0\n");
   EXPECT_EQ(output.status, 1);
 }
 

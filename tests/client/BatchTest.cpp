@@ -185,7 +185,7 @@ TEST(Batch, NoMoreThan64KiBAreSentBeforeAnAnswer) {
   Batch batch(client);
   const auto add = [&] {
     batch.Add(request::GetHFSName(std::string(60000, 'x')), [&](const auto& answer) {
-      EXPECT_EQ(MessageOf(answer), test::kNotInTime);
+      EXPECT_THAT(MessageOf(answer), testing::StartsWith(test::kNotInTime));
       throw std::runtime_error("full");
     });
   };
@@ -272,7 +272,7 @@ TEST(Batch, AMissedDeadlineCostsOneAnswer) {
   Batch batch(client);
   const auto messages = AskedIn(batch, 1000);
   ASSERT_EQ(messages.size(), 1000u);
-  EXPECT_EQ(messages[0], test::kNotInTime);
+  EXPECT_THAT(messages[0], testing::StartsWith(test::kNotInTime));
   EXPECT_THAT(std::vector(messages.begin() + 1, messages.end()), Each(""));
 }
 

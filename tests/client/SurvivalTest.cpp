@@ -161,7 +161,7 @@ TEST(Client, AServiceThatNeverAnswersIsKilledAtTheDeadlineAndStartedAgain) {
   Client client({.service = ImpostorOnce(folder, "trap '' PIPE TERM; exec sleep 60"),
                  .deadline = milliseconds(1500)});
   const auto start = steady_clock::now();
-  EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kNotInTime);
+  EXPECT_THAT(MessageOf(client.GetHFSVolumeName(0)), testing::StartsWith(kNotInTime));
   const auto taken = steady_clock::now() - start;
   EXPECT_GE(taken, milliseconds(1500));
   // Without the second in which one may end by itself.
@@ -176,13 +176,14 @@ TEST(Client, AServiceThatAnswersAByteAtATimeMissesTheDeadlineToo) {
                                                  "printf '\\001\\377\\000'\n"
                                                  "while printf x; do sleep 0.01; done"),
                  .deadline = milliseconds(300)});
-  EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kNotInTime);
+  EXPECT_THAT(MessageOf(client.GetHFSVolumeName(0)), testing::StartsWith(kNotInTime));
 }
 
 TEST(Client, AServiceThatNoLongerReadsMissesTheDeadline) {
   const TemporaryFolder folder;
   Client client({.service = Impostor(folder, "exec sleep 60 <&-"), .deadline = milliseconds(600)});
-  EXPECT_EQ(MessageOf(client.GetHFSName(std::string(65534, 'x'))), kNotInTime);
+  EXPECT_THAT(MessageOf(client.GetHFSName(std::string(65534, 'x'))),
+              testing::StartsWith(kNotInTime));
 }
 
 TEST(Client, WaitingForAServiceThatNoLongerReadsTakesNoProcessorTime) {
@@ -201,7 +202,7 @@ TEST(Client, AServiceThatTakesNothingOfARequestMissesTheDeadline) {
        .deadline = milliseconds(500)});
   EXPECT_TRUE(client.GetHFSVolumeName(0));
   std::this_thread::sleep_for(milliseconds(100));
-  EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kNotInTime);
+  EXPECT_THAT(MessageOf(client.GetHFSVolumeName(0)), testing::StartsWith(kNotInTime));
 }
 
 TEST(Client, TheDeadlineCountsFromARequestThatNobodyTakes) {
@@ -240,14 +241,14 @@ TEST(Client, TheLongestDeadlineIsNone) {
 TEST(Client, ADeadlineOfNothingIsMissedAtOnce) {
   for (const milliseconds deadline : {milliseconds(0), milliseconds(-1), milliseconds::min()}) {
     Client client({.service = TALLOWMERE_SERVICE, .deadline = deadline});
-    EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kNotInTime);
+    EXPECT_THAT(MessageOf(client.GetHFSVolumeName(0)), testing::StartsWith(kNotInTime));
     EXPECT_TRUE(test::HasNoChild());
   }
 }
 
 TEST(Client, ADeadlineOfNothingStartsNoService) {
   Client client({.service = "/nonexistent/tallowmere", .deadline = milliseconds(0)});
-  EXPECT_EQ(MessageOf(client.GetHFSVolumeName(0)), kNotInTime);
+  EXPECT_THAT(MessageOf(client.GetHFSVolumeName(0)), testing::StartsWith(kNotInTime));
 }
 
 TEST(Client, ACopyOfThisProcessLeavesTheServiceAlone) {
