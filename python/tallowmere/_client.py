@@ -1,149 +1,65 @@
-"""The client: one service process, and the requests that are under way to it."""
+"""The client for threads: one service process, and the requests that are under way to it."""
 
 from __future__ import annotations
 
-import contextlib
-import fcntl
 import math
 import os
 import select
-import shutil
-import signal
-import subprocess
-import sys
+import threading
 import time
 import weakref
-from collections import deque
-from typing import IO, Any, Generic, Iterable, Iterator, TypeVar
+from typing import Any, Callable, Iterable, Iterator, TypeVar, overload
 
-from . import request
-from ._wire import FSSpec, Incomplete, Malformed, Reader
-from .request import ALWAYS_ENOUGH_BYTES, MOST_FULL_PATH_BYTES, ExportSettings, HFSText, Path, Request
+from . import conversion, request
+from ._conversation import UNANSWERED, Conversation, Waiting, Window, given, missed
+from ._outcome import ConversionError, Converted, ServiceError
+from ._process import CHUNK, GRACE, Process, ServiceEnded, write
+from ._volumes import Volume, list_volumes
+from ._wire import FSSpec
+from .conversion import Conversion
+from .request import MOST_FULL_PATH_BYTES, ExportSettings, HFSText, Path, Planned, Request
 
 T = TypeVar("T")
-
-MOST_REQUESTS_UNDER_WAY = 256
-MOST_BYTES_UNDER_WAY = 65536
-_CHUNK = 65536
-_GRACE = 1.0  # seconds that a service has to end by itself
+A = TypeVar("A")
 
 
-class ServiceError(Exception):
-    """No answer, for the reason in the message; also that no service could be started."""
-
-
-class ServiceEnded(ServiceError):
-    """The service ended, or closed its output, before it had answered."""
-
-
-class DeadlineMissed(ServiceError):
-    """The service did not answer in time, and was killed."""
-
-
-class ProtocolError(ServiceError):
-    """The service answered what the protocol does not know, and was killed."""
-
-
-class _Process:
-    """A running service, and this process's ends of its two pipes."""
-
-    def __init__(self, program: str) -> None:
-        self.owner = os.getpid()
-        try:
-            self._child = subprocess.Popen(
-                [program, str(self.owner)], bufsize=0, stdin=subprocess.PIPE, stdout=subprocess.PIPE
-            )
-            assert self._child.stdin and self._child.stdout
-            self.input, self.output = _own(self._child.stdin), _own(self._child.stdout)
-        except OSError as error:
-            raise ServiceError(f"The service could not be started: {error}.") from error
-
-    def end(self, grace: float) -> str:
-        """Closes the pipes, lets the service end within grace seconds, then kills it; tells how it ended."""
-        os.close(self.input)
-        os.close(self.output)
-        try:
-            status = self._child.wait(grace)
-        except subprocess.TimeoutExpired:
-            self._child.kill()
-            with contextlib.suppress(subprocess.TimeoutExpired):
-                self._child.wait(_GRACE)
-            return "closed its output"
-        return f"ended with status {status}" if status >= 0 else f"was ended by signal {-status}"
-
-
-def _own(pipe: IO[bytes]) -> int:
-    """Takes pipe over, without blocking and never as descriptor 0, 1 or 2, which the program may have closed
-    and still write to."""
-    with pipe:
-        descriptor = fcntl.fcntl(pipe, fcntl.F_DUPFD_CLOEXEC, 3)
-    os.set_blocking(descriptor, False)
-    return descriptor
-
-
-def _write(descriptor: int, data: bytearray) -> int:
-    """Writes what there is room for. A SIGPIPE of it does not reach a program that has none pending."""
-    before = signal.pthread_sigmask(signal.SIG_BLOCK, ())
-    try:
-        signal.pthread_sigmask(signal.SIG_BLOCK, {signal.SIGPIPE})
-        was_pending = signal.SIGPIPE in signal.sigpending()
-        return os.write(descriptor, data)
-    except BlockingIOError:
-        return 0
-    except BrokenPipeError:
-        if not was_pending:
-            signal.sigtimedwait({signal.SIGPIPE}, 0)
-        return len(data)  # nobody reads it; the end of the service's output is what counts
-    finally:
-        signal.pthread_sigmask(signal.SIG_SETMASK, before)
-
-
-def _find_service() -> str:
-    """The service beside the running script, beside the interpreter, or on PATH."""
-    script = getattr(sys.modules.get("__main__"), "__file__", None)
-    folders = [os.path.dirname(os.path.realpath(script))] if script else []
-    folders += [os.path.dirname(sys.executable)] if sys.executable else []
-    found = shutil.which("tallowmere", path=os.pathsep.join(folders)) or shutil.which("tallowmere")
-    if found is None:
-        raise ServiceError("There is no service tallowmere beside the program, nor on PATH.")
-    return found
-
-
-_UNANSWERED: Any = object()
-
-
-class _Waiting(Generic[T]):
-    """A request that was submitted, and its answer once there is one."""
-
-    def __init__(self, request: Request[T]) -> None:
-        self.request = request
-        self.answer: T | ServiceError = request.otherwise if request.payload is None else _UNANSWERED
+def checked_deadline(deadline: float) -> float:
+    if not isinstance(deadline, (int, float)):
+        raise TypeError(f"a deadline is a number of seconds, not {type(deadline).__name__}")
+    if not deadline > 0:
+        raise ValueError("a deadline is a number of seconds above 0")
+    return deadline
 
 
 class Client:
-    """Asks the service, which it starts with the first request. For one thread at a time.
+    """Asks the service, which it starts with the first request.
 
     service:  the program; None looks for tallowmere beside the running script, beside the interpreter and on PATH.
     deadline: seconds that the service has for each answer.
 
-    A request raises ServiceError when the service cannot be started, has ended, misses the deadline or answers
-    what the protocol does not know; the next request starts another one. Paths are absolute POSIX paths (what is
-    answered to others is not to be relied on), and answered as str (os.fsdecode). A str for an HFS name or path is
-    sent in Mac Roman, and answers are bytes in it (hfs_name_to_str). What does not exist is None.
+    The conversions (record_of, path_of, hfs_path_of, path_of_hfs_path, hfs_name_of, path_in_folder) look whether the
+    item exists and raise a ConversionError instead of an answer that would not lead back; module conversion has their
+    contract. The requests, by the protocol's names, are the raw way: paths are absolute (what is answered to others is
+    not to be relied on), and what does not exist is None.
+
+    All raise a ServiceError when the service cannot be started, has ended, misses the deadline or answers what the
+    protocol does not know; the next request starts another one. Paths are answered as str (os.fsdecode), HFS names and
+    paths as bytes in Mac Roman (hfs_name_to_str). A str for one of these is sent in Mac Roman.
+
+    Threads may share a client: a request waits until it is its turn, and each gets its own answers, also while batches
+    of other threads are open. After a fork the child's copy starts a service of its own and leaves the parent's alone;
+    a batch that is open goes on in both. A signal handler must not use the client that it interrupts: RuntimeError.
     """
 
     def __init__(self, service: str | os.PathLike[str] | None = None, deadline: float = 10.0) -> None:
-        if not deadline > 0:
-            raise ValueError("a deadline is a number of seconds above 0")
+        self._deadline = checked_deadline(deadline)
         self._program = None if service is None else os.fspath(service)
-        self._deadline = deadline
-        self._process: _Process | None = None
+        self._process: Process | None = None
         self._finalizer: Any = None
-        self._pending: deque[_Waiting[Any]] = deque()  # unanswered; their answers come in this order
-        self._outgoing = bytearray()  # of these, what was not written yet
-        self._silent = True  # nothing was written yet that could be answered
-        self._received = b""
-        self._offset = 0  # in _received, of the next answer
+        self._conversation = Conversation()
+        self._lock = threading.Lock()
+        self._user: int | None = None  # the thread that has the lock
+        _clients.add(self)
 
     def __enter__(self) -> Client:
         return self
@@ -152,120 +68,115 @@ class Client:
         self.close()
 
     def close(self) -> None:
-        """Ends the service. A later request starts another one."""
-        self._stop(_GRACE)
+        """Ends the service, when the request of another thread has its answer. A later request starts another one."""
+        self._in_turn(self._stop, GRACE)
 
-    def ask(self, request: Request[T]) -> T:
-        """The answer to one request."""
-        [answer] = self.batch([request])
-        if isinstance(answer, ServiceError):
-            raise answer
-        return answer
+    @overload
+    def ask(self, question: Planned[T]) -> T: ...
 
-    def batch(self, requests: Iterable[Request[T]]) -> Iterator[T | ServiceError]:
-        """The answers in order, while up to 256 requests or 64 KiB of them are under way.
+    @overload
+    def ask(self, question: Request[T]) -> T: ...
 
-        requests may be without end: it is read that far ahead. A request that failed gives its ServiceError as
-        a value, and those behind it are asked of another service. Other requests may be asked meanwhile.
+    def ask(self, question: Any) -> Any:
+        """The answer to one request or conversion."""
+        [answer] = self.batch([question])
+        return given(answer)
+
+    @overload
+    def batch(self, questions: Iterable[Conversion[T]]) -> Iterator[Converted[T] | ConversionError | ServiceError]: ...
+
+    @overload
+    def batch(self, questions: Iterable[Request[T]]) -> Iterator[T | ServiceError]: ...
+
+    def batch(self, questions: Any) -> Iterator[Any]:
+        """The answers to requests or conversions in order, while up to 256 of them or 64 KiB are under way.
+
+        questions may be without end: it is read that far ahead. What failed gives its error as a value, and what is
+        behind it is asked of another service. Other requests may be asked meanwhile.
         """
-        waiting: deque[_Waiting[T]] = deque()
-        size = 0
+        return self._batch(questions)
 
-        def first_answer() -> T | ServiceError:
-            nonlocal size
-            self._await(waiting[0])
-            first = waiting.popleft()
-            size -= len(first.request.payload or b"")
-            return first.answer
-
+    def _batch(self, questions: Iterable[Any]) -> Iterator[Any]:
+        window = Window(self._submit)
         try:
-            for each in requests:
-                waiting.append(_Waiting(each))
-                self._submit(waiting[-1])
-                size += len(each.payload or b"")
-                while len(waiting) >= MOST_REQUESTS_UNDER_WAY or size >= MOST_BYTES_UNDER_WAY:
-                    yield first_answer()
-            while waiting:
-                yield first_answer()
+            for each in questions:
+                window.add(each)
+                while window.is_full:
+                    yield self._first(window)
+            while window:
+                yield self._first(window)
         finally:
-            for rest in waiting:  # nobody wants these answers any more
-                rest.answer = rest.request.otherwise
+            window.abandon()
 
-    def _submit(self, waiting: _Waiting[Any]) -> None:
-        if waiting.request.payload is None:
-            return
-        self._silent = self._silent or not self._pending
+    def _first(self, window: Window) -> Any:
+        waiting = window.awaited()
+        while waiting is not None:
+            self._in_turn(self._converse, waiting)
+            waiting = window.awaited()
+        return window.take()
+
+    def _in_turn(self, act: Callable[[A], object], argument: A) -> None:
+        """Calls act when no other thread does."""
+        if self._user == threading.get_ident() and self._lock.locked():
+            raise RuntimeError("the client is in the middle of a request of this very thread")
+        # In one line, as an interrupt in front of the second line's end would leave the lock taken.
+        with self._lock: self._alone(act, argument)  # fmt: skip
+
+    def _alone(self, act: Callable[[A], object], argument: A) -> None:
         try:
-            self._pending.append(waiting)
-            self._outgoing += waiting.request.payload
-        except BaseException:  # what waits and what is written may differ; the next service gets both anew
+            self._user = threading.get_ident()
+            act(argument)
+        except BaseException:  # half a request may have been written; the next service gets all anew
             self._stop()
             raise
+        finally:
+            self._user = None
 
-    def _await(self, waiting: _Waiting[Any]) -> None:
+    def _submit(self, request: Request[Any]) -> Waiting[Any]:
+        waiting: Waiting[Any] = Waiting(request)
+        self._in_turn(self._conversation.submit, waiting)
+        return waiting
+
+    def _converse(self, waiting: Waiting[Any]) -> None:
         """Exchanges bytes until waiting has its answer or its error."""
+        pending = self._conversation.pending
         limit = time.monotonic() + self._deadline
-        while waiting.answer is _UNANSWERED:
-            head = self._pending[0]
+        while waiting.answer is UNANSWERED:
+            head = pending[0]
             try:
                 self._exchange(limit)
             except ServiceError as error:
                 self._stop()
-                culprit = self._pending.popleft() if self._pending else head
-                culprit.answer = error
-            except BaseException:  # half a request may have been written
-                self._stop()
-                raise
-            if not self._pending or self._pending[0] is not head:
+                self._conversation.fail(head, error)
+            if not pending or pending[0] is not head:
                 limit = time.monotonic() + self._deadline
 
     def _exchange(self, limit: float) -> None:
         """Writes and reads once, as soon as there is something to write or read."""
-        process = self._running()
+        process, conversation = self._running(), self._conversation
         poller = select.poll()
         poller.register(process.output, select.POLLIN)
-        if self._outgoing:
+        if conversation.outgoing:
             poller.register(process.input, select.POLLOUT)
         ready = dict(poller.poll(math.ceil(1000 * min(max(limit - time.monotonic(), 0), 1e6))))
         if not ready:
-            raise DeadlineMissed(f"The service did not answer within {self._deadline:g} seconds.")
+            raise missed(self._deadline, conversation.pending[0].request)
         if process.output in ready:
-            self._receive(process)
+            chunk = os.read(process.output, CHUNK)
+            if not chunk:
+                raise ServiceEnded(f"The service {self._stop(GRACE)} before it had answered.")
+            conversation.receive(chunk)
         if process.input in ready:
-            del self._outgoing[: _write(process.input, self._outgoing)]
-            self._silent = False
+            conversation.wrote(write(process.input, conversation.outgoing))
 
-    def _receive(self, process: _Process) -> None:
-        chunk = os.read(process.output, _CHUNK)
-        if not chunk:
-            raise ServiceEnded(f"The service {self._stop(_GRACE)} before it had answered.")
-        self._received = self._received[self._offset :] + chunk
-        self._offset = 0
-        try:
-            while self._pending and not self._silent:
-                reader = Reader(self._received, self._offset)
-                answer = self._pending[0].request.decode(reader)
-                reader.trailer()
-                self._pending.popleft().answer = answer
-                self._offset = reader.offset
-        except Incomplete:
-            return
-        except Malformed as error:
-            raise ProtocolError(f"The service answered what the protocol does not know: {error}.") from error
-        if self._offset < len(self._received):
-            raise ProtocolError("The service answered what it was not asked.")
-
-    def _running(self) -> _Process:
+    def _running(self) -> Process:
         """The service of this process, started where there is none."""
         if self._process is not None and self._process.owner != os.getpid():
-            self._stop()  # after a fork it is the parent's, and so are its pipes
+            self._stop()
         if self._process is None:
-            self._process = _Process(self._program or _find_service())
-            self._finalizer = weakref.finalize(self, self._process.end, _GRACE)
-            self._pending = deque(waiting for waiting in self._pending if waiting.answer is _UNANSWERED)
-            self._outgoing = bytearray().join(waiting.request.payload or b"" for waiting in self._pending)
-            self._silent = True
-            self._received, self._offset = b"", 0
+            self._process = Process(self._program)
+            self._finalizer = weakref.finalize(self, self._process.end, GRACE)
+            self._conversation.restart()
         return self._process
 
     def _stop(self, grace: float = 0) -> str | None:
@@ -276,19 +187,53 @@ class Client:
         self._finalizer.detach()
         return process.end(grace)
 
+    def _begin_anew(self) -> None:
+        """In a child after a fork: the service is the parent's, and another thread may have had the lock."""
+        self._lock, self._user = threading.Lock(), None
+        if self._process is not None:
+            self._process = None
+            self._finalizer.detach()
+
+    def record_of(self, path: Path, *, resolve: bool = True) -> Converted[FSSpec]:
+        """The record of an item, also of a new one in an existing folder."""
+        return self.ask(conversion.record_of(path, resolve=resolve))
+
+    def path_of(self, spec: FSSpec, *, search_other_volumes: bool = False) -> Converted[str]:
+        """The path of a record's item, also of a new one in an existing folder; looked for on other volumes if so
+        asked, where it can be another item of the same name in a folder with the same id."""
+        return self.ask(conversion.path_of(spec, search_other_volumes=search_other_volumes))
+
+    def hfs_path_of(self, path: Path, *, resolve: bool = True) -> Converted[bytes]:
+        """The full HFS path of the item itself; that of a folder ends with a colon."""
+        return self.ask(conversion.hfs_path_of(path, resolve=resolve))
+
+    def path_of_hfs_path(self, hfs_path: HFSText) -> Converted[str]:
+        """The path of the item with a full HFS path of at most 255 bytes, also of a new one in an existing folder."""
+        return self.ask(conversion.path_of_hfs_path(hfs_path))
+
+    def hfs_name_of(self, path: Path, *, resolve: bool = True) -> Converted[bytes]:
+        """The HFS name of an item, also of a new one in an existing folder."""
+        return self.ask(conversion.hfs_name_of(path, resolve=resolve))
+
+    def path_in_folder(self, folder: Path, name: HFSText, *, resolve: bool = True) -> Converted[str]:
+        """The path of the item with that HFS name in a folder, also of a new one."""
+        return self.ask(conversion.path_in_folder(folder, name, resolve=resolve))
+
+    def volumes(self) -> list[Volume]:
+        """The volumes that both the service and this process can reach, the one of "/" first.
+
+        Each mount point is asked about, and the server of one may keep the service waiting until the deadline: the
+        error names it.
+        """
+        return self.ask(list_volumes())
+
     def make_full_path(self, path: Path, size: int = MOST_FULL_PATH_BYTES, keep_folders: bool = True) -> bytes:
         """The full HFS path of an item, with its folders shortened to size bytes, NUL included: 1 to 1024.
 
         keep_folders False gives the name of the volume alone. b":" is the path of what is on no volume.
         ValueError for a size in which the path does not fit however it is shortened.
         """
-        if not 0 < size <= MOST_FULL_PATH_BYTES:
-            raise ValueError("a full path is asked for in 1 to 1024 bytes")
-        if size < ALWAYS_ENOUGH_BYTES:
-            length, volume = self.ask(request.full_path_and_length(path, MOST_FULL_PATH_BYTES, False))
-            if length >= size and len(volume) > size - 6:
-                raise ValueError(f"the full path does not fit in {size} bytes, however it is shortened")
-        return self.ask(request.full_path_and_length(path, size, keep_folders))[1]
+        return self.ask(request.full_path_in_any_size(path, size, keep_folders))
 
     def make_file_ref_from_path(self, hfs_path: HFSText) -> str | None:
         """The path of a full HFS path of at most 255 bytes. Relative ones begin at the service's current folder."""
@@ -334,3 +279,14 @@ class Client:
         """The settings that export a sound to AIFF files: rate in hertz, sample_size in bits, and a data format of
         four characters."""
         return self.ask(request.get_aiff_export_settings(rate, sample_size, channels, data_format))
+
+
+_clients: weakref.WeakSet[Client] = weakref.WeakSet()
+
+
+def _after_fork() -> None:
+    for client in list(_clients):
+        client._begin_anew()
+
+
+os.register_at_fork(after_in_child=_after_fork)

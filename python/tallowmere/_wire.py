@@ -2,7 +2,9 @@
 
 from __future__ import annotations
 
+import re
 import struct
+import sys
 import unicodedata
 from dataclasses import dataclass
 
@@ -12,7 +14,9 @@ MOST_TEXT_BYTES = 65534  # in a path, without the NUL
 MOST_SETTINGS_BYTES = 65536  # far more than any settings have
 
 U8, U16, I16, U32 = (struct.Struct("=" + code) for code in "BHhI")
-_RECORD = struct.Struct("=hiB63s")
+_RECORDS = {"little": struct.Struct("<hiB63s"), "big": struct.Struct(">hiB63s")}
+RECORD_SIZE = 70
+_TEXT_OF_RECORD = re.compile(r"(-?[0-9]+):(-?[0-9]+):(.*)", re.DOTALL)
 
 
 class Incomplete(Exception):
@@ -41,7 +45,7 @@ class FSSpec:
     par_id:    node id of the folder, 32 bits with a sign; 2 is the volume's root folder.
     name:      HFS name in Mac Roman, at most 63 bytes.
 
-    Anything else is a ValueError.
+    Other types are a TypeError, and values that no record can hold a ValueError.
     """
 
     v_ref_num: int
@@ -50,7 +54,7 @@ class FSSpec:
 
     def __post_init__(self) -> None:
         if not (isinstance(self.v_ref_num, int) and isinstance(self.par_id, int) and isinstance(self.name, bytes)):
-            raise ValueError("a record holds two whole numbers and the bytes of a name")
+            raise TypeError("a record holds two whole numbers and the bytes of a name")
         if not (-0x8000 <= self.v_ref_num < 0x8000 and -0x80000000 <= self.par_id < 0x80000000):
             raise ValueError("a record holds a number of 16 bits and an id of 32 bits, with a sign")
         if len(self.name) > MOST_NAME_BYTES:
@@ -60,19 +64,47 @@ class FSSpec:
     def name_text(self) -> str:
         return hfs_name_to_str(self.name)
 
-    def to_bytes(self) -> bytes:
-        """The record of 70 bytes, in the machine's byte order."""
-        return _RECORD.pack(self.v_ref_num, self.par_id, len(self.name), self.name)
+    @property
+    def text(self) -> str:
+        """volume:parent:name, as the command line writes it."""
+        return f"{self.v_ref_num}:{self.par_id}:{self.name_text}"
 
     @classmethod
-    def from_bytes(cls, record: bytes) -> FSSpec:
+    def from_text(cls, text: str) -> FSSpec:
+        """The record that is written volume:parent:name; an id may be written without a sign. ValueError for others."""
+        if not isinstance(text, str):
+            raise TypeError(f"a record is read from a str, not {type(text).__name__}")
+        parts = _TEXT_OF_RECORD.fullmatch(text)
+        if parts is None:
+            raise ValueError("a record is written volume:parent:name")
+        parent = int(parts[2])
+        return cls(int(parts[1]), parent - (1 << 32) if 1 << 31 <= parent < 1 << 32 else parent,
+                   hfs_name_from_str(parts[3]))  # fmt: skip
+
+    def to_bytes(self, byte_order: str = sys.byteorder) -> bytes:
+        """The record of 70 bytes, its numbers "little" or "big" endian; by default as this machine has them."""
+        return _record_in(byte_order).pack(self.v_ref_num, self.par_id, len(self.name), self.name)
+
+    @classmethod
+    def from_bytes(cls, record: bytes | bytearray | memoryview, byte_order: str = sys.byteorder) -> FSSpec:
         """What to_bytes() wrote; bytes behind the name are ignored. ValueError for what is no record."""
-        if len(record) != _RECORD.size:
-            raise ValueError("a record has 70 bytes")
-        v_ref_num, par_id, length, name = _RECORD.unpack(record)
+        if not isinstance(record, (bytes, bytearray, memoryview)):
+            raise TypeError(f"a record is read from bytes, not {type(record).__name__}")
+        form = _record_in(byte_order)
+        if len(record) != RECORD_SIZE:
+            raise ValueError(f"a record has {RECORD_SIZE} bytes, not {len(record)}")
+        v_ref_num, par_id, length, name = form.unpack(record)
         if length > MOST_NAME_BYTES:
             raise ValueError("a record holds a name of at most 63 bytes")
         return cls(v_ref_num, par_id, name[:length])
+
+
+def _record_in(byte_order: str) -> struct.Struct:
+    if not isinstance(byte_order, str):
+        raise TypeError(f'a byte order is "little" or "big", not {type(byte_order).__name__}')
+    if byte_order not in _RECORDS:
+        raise ValueError(f'a byte order is "little" or "big", not "{byte_order}"')
+    return _RECORDS[byte_order]
 
 
 def text(value: bytes) -> bytes:
@@ -122,7 +154,7 @@ class Reader:
         return value
 
     def record(self) -> FSSpec:
-        record = self.take(_RECORD.size)
+        record = self.take(RECORD_SIZE)
         try:
             spec = FSSpec.from_bytes(record)
         except ValueError as error:

@@ -81,3 +81,28 @@ def kill_child(number: int = signal.SIGKILL) -> None:
     os.kill(child, number)
     while number == signal.SIGKILL and not has_ended(child):
         time.sleep(0.001)
+
+
+def in_own_mounts(test: FolderTest, code: str) -> str:
+    """What a program says that has a client and may mount, in a mount namespace of its own."""
+    prologue = f"""
+        import os, subprocess
+        from tallowmere import *
+        def mount(*arguments): subprocess.run(["mount", *arguments], check=True)
+        client = Client({SERVICE!r})
+        """
+    enter = ["unshare", "--mount", *([] if os.getuid() == 0 else ["--map-root-user"])]
+    try:
+        permitted = subprocess.run([*enter, "mount", "-t", "tmpfs", "none", test.folder], capture_output=True)
+    except FileNotFoundError:
+        test.skipTest("there is no unshare")
+    if permitted.returncode != 0:
+        test.skipTest(f"it may not mount here: {permitted.stderr.decode().strip()}")
+    program = textwrap.dedent(prologue) + textwrap.dedent(code)
+    host = subprocess.run(
+        [*enter, sys.executable, "-W", "error", "-c", program],
+        env={**os.environ, "PYTHONPATH": str(PACKAGE), "PYTHONIOENCODING": "utf-8"},
+        cwd=test.folder, capture_output=True, text=True, timeout=60,
+    )  # fmt: skip
+    test.assertEqual(host.stderr, "")
+    return host.stdout

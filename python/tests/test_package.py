@@ -22,7 +22,8 @@ class Package(unittest.TestCase):
 
     def test_its_version_is_the_projects(self) -> None:
         [project] = re.findall(r"^project\(tallowmere VERSION (\S+)", (PROJECT / "CMakeLists.txt").read_text(), re.M)
-        self.assertIn(f'\nversion = "{project}"\n', (PACKAGE / "pyproject.toml").read_text())
+        self.assertEqual(tallowmere.__version__, project)
+        self.assertIn('version = { attr = "tallowmere.__version__" }\n', (PACKAGE / "pyproject.toml").read_text())
 
     def test_it_has_what_it_says(self) -> None:
         for name in tallowmere.__all__:

@@ -48,10 +48,54 @@ class Records(unittest.TestCase):
     def test_numbers_and_names_that_do_not_fit_are_errors(self) -> None:
         for fields in (
             (0x8000, 2, b""), (-0x8001, 2, b""), (0, 0x80000000, b""), (0, -0x80000001, b""), (0, 2, b"a" * 64),
-            (0.0, 2, b"a"), (0, 1.5, b"a"), ("0", 2, b"a"), (0, None, b"a"), (0, 2, "a"), (0, 2, [97]),
         ):  # fmt: skip
             with self.subTest(fields), self.assertRaises(ValueError):
                 FSSpec(*fields)
+
+    def test_other_types_are_type_errors(self) -> None:
+        for fields in (
+            (0.0, 2, b"a"), (0, 1.5, b"a"), ("0", 2, b"a"), (0, None, b"a"), (0, 2, "a"), (0, 2, [97]),
+        ):  # fmt: skip
+            with self.subTest(fields), self.assertRaises(TypeError):
+                FSSpec(*fields)
+        for what in ("a" * 70, 70, None):
+            with self.subTest(what), self.assertRaises(TypeError):
+                FSSpec.from_bytes(what)
+        for what in (b"0:2:a", FSSpec(0, 2, b"a"), None):
+            with self.subTest(what), self.assertRaises(TypeError):
+                FSSpec.from_text(what)
+        with self.assertRaises(TypeError):
+            FSSpec(0, 2, b"a").to_bytes(1)
+
+    def test_a_record_of_another_machine_has_its_byte_order(self) -> None:
+        spec = FSSpec(-2, 0x01020304, b"ab")
+        tail = b"\2ab" + bytes(61)
+        for order, numbers in (("big", b"\xff\xfe\1\2\3\4"), ("little", b"\xfe\xff\4\3\2\1")):
+            self.assertEqual(spec.to_bytes(order), numbers + tail)
+            for record in (numbers + tail, bytearray(numbers + tail), memoryview(numbers + tail)):
+                self.assertEqual(FSSpec.from_bytes(record, byte_order=order), spec)
+        self.assertEqual(spec.to_bytes(), spec.to_bytes(sys.byteorder))
+        with self.assertRaises(ValueError):
+            FSSpec.from_bytes(bytes(70), byte_order="middle")
+
+    def test_a_record_as_text_comes_back(self) -> None:
+        for spec, text in (
+            (FSSpec(-27, 19, b"hostname"), "-27:19:hostname"), (FSSpec(0, -4, b""), "0:-4:"),
+            (FSSpec(-1, 2, b"\x8e/:\n"), "-1:2:é/:\n"),
+        ):  # fmt: skip
+            self.assertEqual(spec.text, text)
+            self.assertEqual(FSSpec.from_text(text), spec)
+
+    def test_a_text_may_have_an_id_without_a_sign_and_decomposed_accents(self) -> None:
+        self.assertEqual(FSSpec.from_text("-1:4294967292:e\u0301"), FSSpec(-1, -4, b"\x8e"))
+
+    def test_what_is_no_text_of_a_record_is_an_error(self) -> None:
+        for text in (
+            "", "1", "1:2", "a:2:b", "1:b:c", " 1:2:a", "+1:2:a", "1_0:2:a", "١:2:a", "40000:2:a", "1:4294967296:a",
+            "1:-2147483649:a", "1:2:日本", "1:2:" + "a" * 64,
+        ):  # fmt: skip
+            with self.subTest(text), self.assertRaises(ValueError):
+                FSSpec.from_text(text)
 
     def test_the_name_as_text(self) -> None:
         self.assertEqual(FSSpec(1, 2, b"\x8e/").name_text, "é/")

@@ -1,0 +1,298 @@
+"""The conversions as values, for Client.ask and Client.batch. Each is what the Client's method of that name does.
+
+A conversion resolves the way to an item, looks once whether the item is there, and is a ConversionError instead of an
+answer that would not lead back. It is looked at when its turn comes, not when the value is made.
+
+Paths may be relative, and links in front of the last name are followed; the last name is the item itself, a link or
+not. With resolve=False a path has to be absolute, is taken as it is, and has nothing where a link is in the place of
+the item's folder. '~' is a plain character. A value of a wrong type is a TypeError.
+"""
+
+from __future__ import annotations
+
+import os
+from typing import Any, List, NoReturn, Tuple, TypeVar
+
+from . import request
+from ._outcome import Converted, Outcome, quoted
+from ._place import Place, exists, fail, look_at, real_folder
+from ._wire import MOST_NAME_BYTES, FSSpec, hfs_name_from_str, hfs_name_to_str
+from .request import MOST_HFS_BYTES, HFSText, Path, Plan, Planned, Request
+
+T = TypeVar("T")
+
+PARENT_OF_ROOTS = 1  # the parent id of every volume's root folder
+NOWHERE = 3  # the node id of what is on no volume
+_MOST_FULL_PATH = 511  # bytes of an HFS path
+_CERTAINLY_WHOLE = _MOST_FULL_PATH - MOST_NAME_BYTES - 1  # bytes of folders, to which one more could have been added
+_NO_ITEM, _NO_FOLDER, _NO_VOLUME, _NOT_PERMITTED = -43, -120, -35, -5000  # result codes
+
+
+class Conversion(Planned[Converted[T]]):
+    """A conversion to be asked."""
+
+
+def record_of(path: Path, *, resolve: bool = True) -> Conversion[FSSpec]:
+    """The record of an item, also of a new one in an existing folder."""
+    _check_path(path)
+
+    def plan() -> Plan[Converted[FSSpec]]:
+        place = look_at(path, resolve)
+        spec, _ = yield from _record(place)
+        if place.is_mount and spec.par_id != PARENT_OF_ROOTS:
+            [back] = yield [request.set_file_ref_from_fsspec(spec)]
+            if back is None:
+                _fail_on_no_volume(place)
+        return Converted(spec, place.outcome)
+
+    return Conversion(plan)
+
+
+def path_of(spec: FSSpec, *, search_other_volumes: bool = False) -> Conversion[str]:
+    """The path of a record's item, also of a new one in an existing folder.
+
+    With search_other_volumes, what is not on the record's volume is looked for on all others, in the folder with the
+    same id: that can be another item that happens to be called the same.
+    """
+    asked = request.set_file_ref_from_fsspec(spec, search_other_volumes)
+
+    def plan() -> Plan[Converted[str]]:
+        _check_name(spec.name)
+        [answer] = yield [asked]
+        if answer is None:
+            yield from _fail_without_path(spec)
+        path = _single_slash(answer)
+        if spec.name.startswith(b"~"):
+            yield from _check_tilde(spec, path, search_other_volumes)
+        return Converted(path, _outcome_of(path))
+
+    return Conversion(plan)
+
+
+def hfs_path_of(path: Path, *, resolve: bool = True) -> Conversion[bytes]:
+    """The full HFS path of the item itself, in Mac Roman: that of a folder ends with a colon."""
+    _check_path(path)
+
+    def plan() -> Plan[Converted[bytes]]:
+        place = look_at(path, resolve)
+        spec, [full] = yield from _record(place, request.make_full_path(place.path))
+        if place.is_mount and spec.par_id != PARENT_OF_ROOTS:
+            return Converted((yield from _mounted_path(place, spec, full)), place.outcome)
+        yield from _check_whole(place, full)
+        full = full if place.is_folder else full + spec.name
+        if len(full) > _MOST_FULL_PATH:
+            _fail_too_long(place)
+        yield from _check_volume(place, spec, full)
+        return Converted(full, place.outcome)
+
+    return Conversion(plan)
+
+
+def path_of_hfs_path(hfs_path: HFSText) -> Conversion[str]:
+    """The path of the item with a full HFS path, of at most 255 bytes; also of a new one in an existing folder.
+
+    Of several volumes with one name, the first is meant.
+    """
+    _check_hfs(hfs_path)
+
+    def plan() -> Plan[Converted[str]]:
+        full = _encoded(hfs_path)
+        if len(full) > MOST_HFS_BYTES:
+            fail(Outcome.INVALID, f"The HFS path {_quoted(full)} has more than {MOST_HFS_BYTES} bytes.")
+        if full.find(b":") < 1:
+            fail(Outcome.INVALID, f"The HFS path {_quoted(full)} does not begin with a volume and a colon.")
+        [(result, path)] = yield [request.result_and_path(full)]
+        if result == 0 and path is not None:
+            return Converted(_single_slash(path), _outcome_of(path))
+        folder, colon, name = full.rpartition(b":")
+        if result == _NO_ITEM and name:
+            [(result, path)] = yield [request.result_and_path(folder + colon)]
+            if path is not None:
+                return (yield from _in_folder(os.fsencode(_single_slash(path)), name))
+        _fail_by_result(result, full)
+
+    return Conversion(plan)
+
+
+def hfs_name_of(path: Path, *, resolve: bool = True) -> Conversion[bytes]:
+    """The HFS name of an item, in Mac Roman, as its record has it; also of a new one in an existing folder."""
+    _check_path(path)
+
+    def plan() -> Plan[Converted[bytes]]:
+        place = look_at(path, resolve)
+        spec, _ = yield from _record(place)
+        return Converted(spec.name, place.outcome)
+
+    return Conversion(plan)
+
+
+def path_in_folder(folder: Path, name: HFSText, *, resolve: bool = True) -> Conversion[str]:
+    """The path of the item with that HFS name in a folder, to which a link may lead; also of a new one."""
+    _check_path(folder)
+    _check_hfs(name)
+
+    def plan() -> Plan[Converted[str]]:
+        return (yield from _in_folder(real_folder(folder, resolve), _encoded(name)))
+
+    return Conversion(plan)
+
+
+def _check_path(path: Path) -> None:
+    if not isinstance(path, (str, bytes)):
+        os.fspath(path)  # TypeError for what is no path
+
+
+def _check_hfs(name: HFSText) -> None:
+    if not isinstance(name, (str, bytes)):
+        raise TypeError(f"an HFS name or path is bytes or str, not {type(name).__name__}")
+
+
+def _encoded(name: HFSText) -> bytes:
+    try:
+        return hfs_name_from_str(name) if isinstance(name, str) else name
+    except UnicodeEncodeError:
+        fail(Outcome.INVALID, f"{quoted(_printable(str(name)))} has a character that HFS names cannot have.")
+
+
+def _printable(text: str) -> str:
+    return text.encode("utf-8", "backslashreplace").decode()
+
+
+def _quoted(name: bytes) -> str:
+    return quoted(hfs_name_to_str(name))
+
+
+def _single_slash(path: str) -> str:
+    """The path of a new item in "/", which the service writes with two slashes."""
+    return path[1:] if path.startswith("//") else path
+
+
+def _outcome_of(path: str) -> Outcome:
+    return Outcome.FOUND if exists(path) else Outcome.NEW
+
+
+def _check_name(name: bytes) -> None:
+    """A name that an item of a folder can have, and that leads to no other one."""
+    if not name or name in (b".", b".."):
+        fail(Outcome.INVALID, f"An item cannot be called {_quoted(name)}.")
+    if b":" in name or b"\0" in name:
+        fail(Outcome.INVALID, f"The HFS name {_quoted(name)} has a character that HFS names cannot have.")
+    if len(name) > MOST_NAME_BYTES:
+        fail(Outcome.INVALID, f"The HFS name {_quoted(name)} has more than {MOST_NAME_BYTES} bytes.")
+
+
+def _record(place: Place, *others: Request[Any]) -> Plan[Tuple[FSSpec, List[Any]]]:
+    """The record of what is there, or of what can be there and leads back; and the answers to other requests."""
+    spec, *rest = yield [request.get_fsspec(place.path), *others]
+    if spec is None or spec.par_id == NOWHERE:
+        _fail_on_no_volume(place)
+    if place.is_new and not _is_plain(place.name):
+        [back] = yield [request.set_file_ref_from_fsspec(spec)]
+        if back is None or os.fsencode(os.path.basename(back)) != place.name:
+            _fail_elsewhere(place, back)
+    return spec, rest
+
+
+def _is_plain(name: bytes) -> bool:
+    """Whether a name stays as it is on the way to HFS and back, and is nothing else's: with accents it could be that
+    of an item in another normal form, and with '#' the short form of one."""
+    return name.isascii() and b"#" not in name and len(name) <= MOST_NAME_BYTES
+
+
+def _fail_on_no_volume(place: Place) -> NoReturn:
+    fail(Outcome.NOT_A_VOLUME, f"{quoted(place.path)} is on no volume.")
+
+
+def _fail_elsewhere(place: Place, back: str | None) -> NoReturn:
+    if back is not None and exists(back):
+        fail(Outcome.AMBIGUOUS, f"{quoted(place.path)} does not exist, and its HFS name is that of {quoted(back)}.")
+    fail(Outcome.INVALID, f"{quoted(place.path)} does not exist, and no HFS name would lead back to it.")
+
+
+def _fail_without_path(spec: FSSpec) -> Plan[NoReturn]:
+    [volume] = yield [request.get_hfs_volume_name(spec.v_ref_num)]
+    if volume is None:
+        fail(Outcome.NOT_A_VOLUME, f"No volume has the number {spec.v_ref_num}, of the record {quoted(spec.text)}.")
+    fail(Outcome.NOTHING, f"There is no item with the record {quoted(spec.text)}, nor a folder for it.")
+
+
+def _check_tilde(spec: FSSpec, path: str, search_other_volumes: bool) -> Plan[None]:
+    """A name with '~' in front is answered as a home folder where the record's folder is not found."""
+    [back] = yield [request.get_fsspec(path)]
+    is_it = back is not None and (back.par_id, back.name) == (spec.par_id, spec.name)
+    if not is_it or not (search_other_volumes or spec.v_ref_num in (0, back.v_ref_num)):
+        yield from _fail_without_path(spec)
+
+
+def _check_whole(place: Place, full: bytes) -> Plan[None]:
+    """Folders that did not fit are left out of a full path, which then leads elsewhere: it is compared with one that
+    certainly has all its folders, further up."""
+    path, tail = place.path if place.is_folder else place.folder, b""
+    upper = full
+    while len(upper.partition(b":")[2]) > _CERTAINLY_WHOLE:
+        spec, upper = yield [request.get_fsspec(path), request.make_full_path(os.path.dirname(path))]
+        if spec is None:
+            _fail_on_no_volume(place)
+        path, tail = os.path.dirname(path), spec.name + b":" + tail
+    if upper + tail != full:
+        _fail_too_long(place)
+
+
+def _fail_too_long(place: Place) -> NoReturn:
+    fail(Outcome.INVALID, f"The HFS path of {quoted(place.path)} would have more than {_MOST_FULL_PATH} bytes.")
+
+
+def _mounted_path(place: Place, spec: FSSpec, full: bytes) -> Plan[bytes]:
+    """The path of an item on another device than its folder: a subvolume, a folder of another volume, a file mounted
+    by itself, or a kernel interface, whose full path is that of an outer folder. Only the way back tells them apart."""
+    [outer] = yield [request.make_full_path(place.folder)]
+    for own in ([full] if place.is_folder else []) + [outer + spec.name]:
+        [(_, back)] = yield [request.result_and_path(own)]
+        if back is not None and _is_same(back, place):
+            return bytes(own)
+    if len(full) <= MOST_HFS_BYTES or not full.endswith(b":" + spec.name + b":"):
+        _fail_on_no_volume(place)
+    yield from _check_whole(place, full)  # too long to be led back by
+    return full
+
+
+def _is_same(path: str, place: Place) -> bool:
+    try:
+        return os.path.samestat(os.lstat(path), os.lstat(place.path))
+    except OSError:
+        return False
+
+
+def _check_volume(place: Place, spec: FSSpec, full: bytes) -> Plan[None]:
+    name = full.partition(b":")[0]
+    [first] = yield [request.get_vol_refnum_by_hfs_name(name)]
+    if first != spec.v_ref_num:
+        fail(Outcome.AMBIGUOUS, f"{quoted(place.path)} is on another volume than the first that is called "
+             f"{_quoted(name)}.")  # fmt: skip
+
+
+def _in_folder(folder: bytes, name: bytes) -> Plan[Converted[str]]:
+    """The item with an HFS name in a folder, whose path has no links."""
+    _check_name(name)
+    plain = hfs_name_to_str(name).translate({ord("/"): ":", ord(":"): "/"}).encode()
+    answer, spec = yield [request.add_hfs_name(folder, name), request.get_fsspec(os.path.join(folder, plain))]
+    if answer is None:
+        fail(Outcome.NOTHING, f"There is no item called {_quoted(name)} in {quoted(folder)}, and there cannot be one.")
+    if spec is None or spec.par_id == NOWHERE:
+        fail(Outcome.NOT_A_VOLUME, f"{quoted(folder)} is on no volume.")
+    path = _single_slash(answer)
+    if os.path.dirname(os.fsencode(path)) != folder:
+        fail(Outcome.AMBIGUOUS, f"The HFS name {_quoted(name)} leads out of {quoted(folder)}.")
+    return Converted(path, _outcome_of(path))
+
+
+def _fail_by_result(result: int, full: bytes) -> NoReturn:
+    if result == _NO_VOLUME:
+        fail(Outcome.NOT_A_VOLUME, f"No volume is called {_quoted(full.partition(b':')[0])}.")
+    if result == _NOT_PERMITTED:
+        fail(Outcome.REFUSED, f"The item with the HFS path {_quoted(full)} may not be looked at.")
+    if result in (_NO_ITEM, _NO_FOLDER):
+        fail(Outcome.NOTHING, f"There is no item with the HFS path {_quoted(full)}, nor a folder for it.")
+    if result == request.IMPOSSIBLE_NAME:
+        fail(Outcome.INVALID, f"No item can have the HFS path {_quoted(full)}.")
+    fail(Outcome.REFUSED, f"The item with the HFS path {_quoted(full)} cannot be looked at: error {result}.")
