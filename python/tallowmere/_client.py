@@ -190,6 +190,7 @@ class Client:
     def _begin_anew(self) -> None:
         """In a child after a fork: the service is the parent's, and another thread may have had the lock."""
         self._lock, self._user = threading.Lock(), None
+        self._conversation.restart()  # what that thread was writing cannot be changed any more
         if self._process is not None:
             self._process = None
             self._finalizer.detach()
