@@ -139,16 +139,16 @@ class Client:
 
     def _converse(self, waiting: Waiting[Any]) -> None:
         """Exchanges bytes until waiting has its answer or its error."""
-        pending = self._conversation.pending
+        conversation = self._conversation
         limit = time.monotonic() + self._deadline
         while waiting.answer is UNANSWERED:
-            head = pending[0]
+            head = conversation.pending[0]
             try:
                 self._exchange(limit)
             except ServiceError as error:
                 self._stop()
-                self._conversation.fail(head, error)
-            if not pending or pending[0] is not head:
+                conversation.fail(head, error)
+            if not conversation.pending or conversation.pending[0] is not head:
                 limit = time.monotonic() + self._deadline
 
     def _exchange(self, limit: float) -> None:

@@ -48,7 +48,7 @@ class Conversation:
 
     def wrote(self, count: int) -> None:
         del self.outgoing[:count]
-        self._silent = False
+        self._silent = self._silent and count == 0
 
     def receive(self, chunk: bytes) -> None:
         """Settles what chunk answers; ProtocolError for what is no answer."""

@@ -132,6 +132,12 @@ class Bounds(BatchTest):
         self.assertEqual(next(batch), b"0")
         self.assertEqual(client.get_hfs_volume_name(99), b"99")
 
+    def test_the_deadline_is_for_each_answer_of_another_service_too(self) -> None:
+        client = self.client("sys.exit(5) if number == 0 else time.sleep(0.1)", deadline=1.5)
+        batch = client.batch(numbers(18))
+        self.assertIsInstance(next(batch), ServiceEnded)
+        self.assertEqual(client.get_hfs_volume_name(99), b"99")
+
 
 class Failures(BatchTest):
     def test_only_the_request_in_hand_fails_when_the_service_dies(self) -> None:
