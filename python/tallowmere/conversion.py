@@ -39,10 +39,6 @@ def record_of(path: Path, *, resolve: bool = True) -> Conversion[FSSpec]:
     def plan() -> Plan[Converted[FSSpec]]:
         place = look_at(path, resolve)
         spec, _ = yield from _record(place)
-        if place.is_mount and spec.par_id != PARENT_OF_ROOTS:
-            [back] = yield [request.set_file_ref_from_fsspec(spec)]
-            if back is None:
-                _fail_on_no_volume(place)
         return Converted(spec, place.outcome)
 
     return Conversion(plan)

@@ -83,10 +83,13 @@ def kill_child(number: int = signal.SIGKILL) -> None:
         time.sleep(0.001)
 
 
-def in_own_mounts(test: FolderTest, code: str) -> str:
-    """What a program says that has a client and may mount, in a mount namespace of its own."""
+def in_own_mounts(test: FolderTest, code: str, needs: str = "/") -> str:
+    """What a program says that has a client and may mount, in a mount namespace of its own. Skipped where that is not
+    permitted, or what it needs is not there."""
+    if not os.path.exists(needs):
+        test.skipTest(f"there is no {needs}")
     prologue = f"""
-        import os, subprocess
+        import os, subprocess, sys
         from tallowmere import *
         def mount(*arguments): subprocess.run(["mount", *arguments], check=True)
         client = Client({SERVICE!r})
