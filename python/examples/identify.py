@@ -1,9 +1,10 @@
-import os
 import sys
-from tallowmere import Client, hfs_name_to_str
+from tallowmere import Client, ConversionError
 
 with Client() as client:
-    for path in map(os.path.abspath, sys.argv[1:]):
-        spec, place = client.get_fsspec(path), client.make_full_path(path)
-        name = spec.name if spec and not os.path.isdir(path) else b""
-        print(path, spec, hfs_name_to_str(place + name) if spec else "no HFS path", sep="\n    ")
+    for path in sys.argv[1:]:
+        try:
+            record, hfs_path = client.record_of(path), client.hfs_path_of(path)
+            print(path, record.outcome.value, record.text, hfs_path.text, sep="\n    ")
+        except ConversionError as error:
+            print(path, error.outcome.value, error, sep="\n    ")

@@ -1,15 +1,17 @@
-"""What is shipped: its language, its version, its example."""
+"""What is shipped: its language, its types, its version."""
 
 from __future__ import annotations
 
 import ast
 import os
 import re
+import shutil
+import subprocess
 import unittest
 
 import tallowmere
 
-from .support import PACKAGE, PROJECT, SERVICE, FolderTest
+from .support import PACKAGE, PROJECT
 
 
 class Package(unittest.TestCase):
@@ -19,6 +21,16 @@ class Package(unittest.TestCase):
         for source in sources:
             with self.subTest(source.name):
                 ast.parse(source.read_text(), feature_version=(3, 9))
+
+    def test_its_types_are_right_by_mypy(self) -> None:
+        mypy = shutil.which("mypy")
+        if mypy is None:
+            self.skipTest("there is no mypy")
+        sources = ["tallowmere", "tests/typed.py", *map(str, PACKAGE.glob("examples/*.py"))]
+        checked = subprocess.run(
+            [mypy, "--strict", "--cache-dir", os.devnull, *sources], cwd=PACKAGE, capture_output=True, text=True
+        )
+        self.assertEqual((checked.returncode, checked.stderr), (0, ""), checked.stdout)
 
     def test_its_version_is_the_projects(self) -> None:
         [project] = re.findall(r"^project\(tallowmere VERSION (\S+)", (PROJECT / "CMakeLists.txt").read_text(), re.M)
@@ -34,22 +46,3 @@ class Package(unittest.TestCase):
         self.assertEqual(len(requests), 10)
         for name in requests:
             self.assertTrue(callable(getattr(tallowmere.Client, name)), name)
-
-
-class Example(FolderTest):
-    def test_identify_prints_records_and_full_paths_in_ten_lines(self) -> None:
-        example = PACKAGE / "examples/identify.py"
-        self.assertLessEqual(len(example.read_text().splitlines()), 10)
-        path = os.path.join(self.folder, "a:é")
-        open(path, "w").close()
-        said = self.run_python(
-            [str(example), "a:é", "/nowhere/file", self.folder],
-            environment={"PATH": os.path.dirname(SERVICE), "PYTHONIOENCODING": "utf-8"},
-        )
-        with tallowmere.Client(SERVICE) as client:
-            folder = client.make_full_path(self.folder).decode("mac_roman")
-            expected = [
-                path, f"    {client.get_fsspec(path)}", f"    {folder}a/é", "/nowhere/file", "    None",
-                "    no HFS path", self.folder, f"    {client.get_fsspec(self.folder)}", f"    {folder}",
-            ]  # fmt: skip
-        self.assertEqual(said.splitlines(), expected)
