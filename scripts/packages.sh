@@ -30,6 +30,8 @@ to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf python
 # For tests on file systems made by these tools, and of the manual pages and completions.
 to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools)
 to_test+=(mandoc zsh fish)
+# For the types of the Python client.
+to_test+=(mypy)
 # For tests on a real HFS volume in an emulated machine, and of the Debian packages.
 to_emulate=(hfsutils qemu-system-x86 busybox-static cpio)
 to_package=(dpkg-dev file python3)

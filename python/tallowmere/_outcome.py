@@ -9,7 +9,7 @@ from typing import Generic, TypeVar, Union
 
 from ._wire import FSSpec, hfs_name_to_str
 
-T = TypeVar("T")
+T_co = TypeVar("T_co", covariant=True)
 
 _MOST_QUOTED = 200  # characters of a text in a message
 
@@ -43,10 +43,10 @@ class ServiceError(Exception):
 
 
 @dataclass(frozen=True)
-class Converted(Generic[T]):
+class Converted(Generic[T_co]):
     """A conversion that succeeded; outcome is FOUND or NEW."""
 
-    value: T
+    value: T_co
     outcome: Outcome
 
     @property

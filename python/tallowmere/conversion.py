@@ -19,7 +19,7 @@ from ._place import Place, exists, fail, look_at, real_folder
 from ._wire import MOST_NAME_BYTES, FSSpec, hfs_name_from_str, hfs_name_to_str
 from .request import MOST_HFS_BYTES, HFSText, Path, Plan, Planned, Request
 
-T = TypeVar("T")
+T_co = TypeVar("T_co", covariant=True)
 
 PARENT_OF_ROOTS = 1  # the parent id of every volume's root folder
 NOWHERE = 3  # the node id of what is on no volume
@@ -28,7 +28,7 @@ _CERTAINLY_WHOLE = _MOST_FULL_PATH - MOST_NAME_BYTES - 1  # bytes of folders, to
 _NO_ITEM, _NO_FOLDER, _NO_VOLUME, _NOT_PERMITTED = -43, -120, -35, -5000  # result codes
 
 
-class Conversion(Planned[Converted[T]]):
+class Conversion(Planned[Converted[T_co]]):
     """A conversion to be asked."""
 
 

@@ -17,6 +17,7 @@ from ._outcome import quoted
 from ._wire import I16, MOST_TEXT_BYTES, U8, U16, U32, FSSpec, Reader, hfs_name_from_str, hfs_name_to_str, text
 
 T = TypeVar("T")
+T_co = TypeVar("T_co", covariant=True)
 Number = TypeVar("Number", int, float)
 Path = Union[str, bytes, "os.PathLike[str]", "os.PathLike[bytes]"]
 HFSText = Union[str, bytes]
@@ -38,12 +39,12 @@ class ExportSettings(NamedTuple):
 
 
 @dataclass(frozen=True)
-class Request(Generic[T]):
+class Request(Generic[T_co]):
     """payload is None for what cannot be asked: the answer is then otherwise."""
 
     payload: Optional[bytes]
-    decode: Callable[[Reader], T]
-    otherwise: T
+    decode: Callable[[Reader], T_co]
+    otherwise: T_co
     describe: Callable[[], str] = lambda: "an answer"  # what is asked for
     searches: bool = False  # all volumes are looked at where the first has no such item
 
@@ -52,10 +53,10 @@ Plan = Generator[Sequence[Request[Any]], List[Any], T]  # asks some requests at 
 
 
 @dataclass(frozen=True)
-class Planned(Generic[T]):
+class Planned(Generic[T_co]):
     """What takes several requests. Each plan that start() makes is used once."""
 
-    start: Callable[[], Plan[T]]
+    start: Callable[[], Plan[T_co]]
 
 
 def _path(path: Path) -> bytes | None:
