@@ -17,7 +17,7 @@ need() {
   echo "== Installing ${missing[*]}"
   export DEBIAN_FRONTEND=noninteractive
   mkdir -p build
-  if ! { apt-get update -qq && apt-get install -qq -y --no-install-recommends "${missing[@]}"; } \
+  if ! { apt-get update -qq && apt-get install -qq -y --no-install-recommends --no-remove "${missing[@]}"; } \
        >build/apt.log 2>&1; then
     cat build/apt.log >&2
     echo "apt-get could not install the packages." >&2
@@ -28,19 +28,26 @@ need() {
 to_build=(g++ cmake ninja-build libcli11-dev nlohmann-json3-dev)
 to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf python3 strace)
 # For tests on file systems made by these tools, and of the manual pages and completions.
-to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools)
-to_test+=(mandoc zsh fish)
+to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools bindfs fuse-overlayfs)
+to_test+=(mandoc zsh fish jq inotify-tools)
+# A language with letters of its own for i and I.
+to_test+=(locales)
 # For the types of the Python client.
 to_test+=(mypy)
 # For tests on a real HFS volume in an emulated machine, and of the Debian packages.
 to_emulate=(hfsutils qemu-system-x86 busybox-static cpio)
 to_package=(dpkg-dev file python3)
+# Checks packages.
+to_check_packages=(lintian)
 # What the benchmarks compare with, and the library for their pieces in one process.
 to_measure=(libbenchmark-dev openssh-sftp-server bfs e2fsprogs btrfs-progs xfsprogs bindfs)
 to_format=(clang-format)
 to_lint=(clang-tidy)
 to_fuzz=(clang libclang-rt-dev)
 to_cover=(clang libclang-rt-dev llvm)
+# To build for other machines, and to run what was built.
+to_make_i386=(g++-i686-linux-gnu libc6-i386 lib32stdc++6)
+to_make_arm64=(g++-aarch64-linux-gnu qemu-user-static)
 
 # unpack_kernel FOLDER: puts Debian's kernel there, without installing it. Without one, the test
 # that boots it is skipped.

@@ -2,6 +2,8 @@
 
 #include <CoreServices/CoreServices.h>
 
+#include <cstdint>
+
 #include "calls/Process.h"
 #include "calls/ResultCodes.h"
 #include "foundation/NoThrow.h"
@@ -22,7 +24,7 @@ volumes::ListedVolumePointer VolumeAt(std::size_t index) {
   return index < volumes.size() ? volumes[index] : nullptr;
 }
 
-volumes::ListedVolumePointer FindVolume(long index, SInt16 number) {
+volumes::ListedVolumePointer FindVolume(std::int64_t index, SInt16 number) {
   if (index < 0) return nullptr;
   if (index > 0) return VolumeAt(static_cast<std::size_t>(index - 1));
   return InMoment(

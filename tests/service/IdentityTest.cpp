@@ -123,7 +123,7 @@ class IdentityWithMounts : public Identity {
   static ChildProgram ServiceAfter(const std::string& command) {
     return {"unshare",
             {"--mount", "--propagation", "private", "sh", "-c", command + " && exec \"$0\" \"$1\"",
-             TALLOWMERE_SERVICE, std::to_string(getpid())}};
+             ServiceToTest(), std::to_string(getpid())}};
   }
 };
 

@@ -36,7 +36,7 @@ std::string IDOfNoProcess() {
 }
 
 TEST(Lifetime, WithoutAnArgumentTheServiceSaysSoAndReadsNothing) {
-  ChildProgram service(TALLOWMERE_SERVICE, {});
+  ChildProgram service(ServiceToTest(), {});
   service.Write(kAnyRequest);
   EXPECT_EQ(service.ReadErrorsToEnd(), "Tallowmere missing a parameter.\n");
   EXPECT_EQ(service.ReadToEnd(), "");
@@ -45,7 +45,7 @@ TEST(Lifetime, WithoutAnArgumentTheServiceSaysSoAndReadsNothing) {
 }
 
 TEST(Lifetime, FurtherArgumentsAreIgnored) {
-  ChildProgram service(TALLOWMERE_SERVICE, {std::to_string(getpid()), "0", "x"});
+  ChildProgram service(ServiceToTest(), {std::to_string(getpid()), "0", "x"});
   service.Write(kAnyRequest + kAnyRequest + kQuit);
   EXPECT_EQ(service.ReadToEnd(), kItsResponse + kItsResponse);
   EXPECT_EQ(service.Wait(), 0);

@@ -1,8 +1,6 @@
 // What is asked about changes in mid-question: at each system call that an answer takes, in turn.
 // The answer is then the one from before or the one from after, or says that there is none, or
 // leads nowhere; it never leads to another item. A change to something else changes no answer.
-//
-// TALLOWMERE_SERVICE_TO_RACE in the environment names another service to be tried.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <stdlib.h>
@@ -34,11 +32,6 @@ constexpr std::size_t kRecordResponseSize = 75;
 constexpr const char* kName = "item.aif";
 constexpr const char* kLongName =
     "an item with a name of more than the sixty-three bytes that there is room for.aif";
-
-std::string ServiceToRace() {
-  const char* const other = getenv("TALLOWMERE_SERVICE_TO_RACE");
-  return other != nullptr ? other : TALLOWMERE_SERVICE;
-}
 
 using Identity = std::pair<dev_t, ino_t>;
 
@@ -74,7 +67,7 @@ std::string Answer(ChildProgram& service, unsigned code, const std::string& requ
 // A service that is not stopped, for what is true while nothing changes.
 class Bystander : public ChildProgram {
  public:
-  Bystander() : ChildProgram(ServiceToRace(), {std::to_string(getpid())}) {}
+  Bystander() : ChildProgram(ServiceToTest(), {std::to_string(getpid())}) {}
 };
 
 // The path in a response to code 2, 6, 8 or 9; empty when there is none.
@@ -231,7 +224,7 @@ class Truth {
 class InSmallRoot : public testing::Test {
  protected:
   void SetUp() override {
-    static const bool isThere = EnterSmallRoot({ServiceToRace(), TALLOWMERE_STOP_AT_CALLS});
+    static const bool isThere = EnterSmallRoot({ServiceToTest(), TALLOWMERE_STOP_AT_CALLS});
     if (!isThere) GTEST_SKIP() << "mounting is not permitted here";
   }
 };
@@ -248,7 +241,7 @@ TEST_P(Races, ChangeNoAnswerIntoThatOfAnotherItem) {
     Bystander before;
     const Tree tree(before, name);
     const std::string request = tree.Request(code);
-    StoppedService service(ServiceToRace());
+    StoppedService service(ServiceToTest());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     if (knowledge == Knowledge::kOfTheItem) Answer(service.Streams(), 7, tree.Request(7));
     Truth truth(tree, code);
@@ -309,7 +302,7 @@ TEST_P(RacesOnAWay, LeadIntoNoFolderThatWasNeverOnIt) {
     }
     fs::create_symlink(top.Path() / "targets/1", top.Path() / "first/link");
     fs::create_symlink(top.Path() / "targets/2", top.Path() / "second/link");
-    StoppedService service(ServiceToRace());
+    StoppedService service(ServiceToTest());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     const Item asked = ItemAt(service.Streams(), top.Path() / way.asked / kName);
     const auto expected =
@@ -344,7 +337,7 @@ TEST_F(InSmallRoot, TheNumberOfAFileIsNoFoldersInItsPlace) {
     for (int i = 0; i < 20; ++i) fs::remove(top.MakeFile("for a number that is an id"));
     const fs::path file = top.MakeFile("file");
     const fs::path folder = top.MakeFolder("folder");
-    StoppedService service(ServiceToRace());
+    StoppedService service(ServiceToTest());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     ItemAt(service.Streams(), file);
     Item asked = ItemAt(service.Streams(), folder / kName);
@@ -391,7 +384,7 @@ TEST_P(RacesBesideTheItem, ALinkToItsFolderGoesAndNoAnswerChanges) {
     top.MakeFolder("first/inner");
     std::ofstream(first / "inner" / names.item) << "item";
     fs::create_hard_link(first / "inner" / names.item, top.Path() / "another name.aif");
-    StoppedService service(ServiceToRace());
+    StoppedService service(ServiceToTest());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     const Item known = ItemAt(service.Streams(), first / "inner" / names.item);
     fs::rename(first / "inner", folder / "inner");
@@ -430,7 +423,7 @@ TEST_P(RacesBesideTheItem, ALinkToItsVolumeGoesAndNoAnswerChanges) {
     for (int i = 0; i < 20; ++i) fs::remove(top.MakeFile("folder/volume/first"));
     top.MakeFolder("folder/volume/inner");
     std::ofstream(inner / "inner" / names.item) << "item";
-    StoppedService service(ServiceToRace());
+    StoppedService service(ServiceToTest());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     const Item known = ItemAt(service.Streams(), inner / "inner" / names.item);
     if (knowledge == Knowledge::kOfAPass) PassOver(service.Streams(), known);

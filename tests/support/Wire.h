@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <cstdint>
+#include <cstdlib>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -139,12 +140,19 @@ inline const std::string kNoVolumeNameResponse = std::string("\0\1\0\0MWLT", 8);
 inline const std::string kAnyRequest = VolumeNameRequest(32767);
 inline const std::string& kItsResponse = kNoVolumeNameResponse;
 
+// The service that is tested: the one of this build, or the one that TALLOWMERE_SERVICE_TO_TEST in
+// the environment names, as one of another machine.
+inline std::string ServiceToTest() {
+  const char* const other = std::getenv("TALLOWMERE_SERVICE_TO_TEST");
+  return other != nullptr ? other : TALLOWMERE_SERVICE;
+}
+
 // A running service whose parent is this process.
 class Service : public ChildProgram {
  public:
   explicit Service(const std::string& parent = std::to_string(getpid()),
                    BrokenPipe brokenPipe = BrokenPipe::kEnds)
-      : ChildProgram(TALLOWMERE_SERVICE, {parent}, brokenPipe) {}
+      : ChildProgram(ServiceToTest(), {parent}, brokenPipe) {}
 
   // Starts the service by a command to which the service's program and its argument are appended:
   // {"setpriv", "--clear-groups"}. The argument is the service's own process group, which lives as
@@ -184,7 +192,7 @@ class Service : public ChildProgram {
  private:
   static std::vector<std::string> WithService(const std::vector<std::string>& command) {
     std::vector<std::string> arguments(command.begin() + 1, command.end());
-    arguments.insert(arguments.end(), {TALLOWMERE_SERVICE, "0"});
+    arguments.insert(arguments.end(), {ServiceToTest(), "0"});
     return arguments;
   }
 };
