@@ -45,8 +45,9 @@ FSRef ReferenceTo(catalog::Moment& moment, const catalog::Sighting& seen) {
     kernel::ReadProof(reference, spot);
   } else if ((*volume)->NumbersIdentifyItems()) {
     reference = catalog::Proved(seen, **volume, spot);
-  } else if (const auto canonical = moment.See(seen.path)) {
-    reference = catalog::Proved(*canonical, **volume, spot);
+  } else {
+    const auto canonical = moment.See(seen.path);
+    reference = catalog::Proved(canonical ? *canonical : seen, **volume, spot);
   }
   moment.Knowledge().Remember(reference, seen.path, volume ? volume->get() : nullptr);
   return Pack(reference);

@@ -63,7 +63,8 @@ void VolumeWalk::Walk(const std::string& start) {
   }
   mKnown.waiting = std::move(left);
   VisitWaiting();
-  if (!mQuestion.IsSettled() && mQuestion.HasSeenAll()) mKnown.isWhole = true;
+  const bool hasSeenAll = mQuestion.HasSeenAll() && !mHasMissedStart;
+  if (!mQuestion.IsSettled() && hasSeenAll) mKnown.isWhole = true;
 }
 
 // After a walk that stopped early: keeps the folders that waited before, and adds those found in
@@ -287,7 +288,7 @@ bool VolumeWalk::CheckUnchanged(FolderNumber number) {
 }
 
 // Forgets a folder that does not exist any more. One that is only covered, or cannot be examined,
-// may come back unchanged.
+// may come back unchanged; one that is gone may, with the mount that it is on.
 void VolumeWalk::ForgetIfGone(FolderNumber folder) {
   mTree[folder].isRead = false;
   const std::string path = mTree.PathOf(folder);
@@ -296,6 +297,7 @@ void VolumeWalk::ForgetIfGone(FolderNumber folder) {
     const bool isThere = held ? mTree.IsSame(folder, held->item) : !kernel::MeansGone(held.Error());
     if (isThere) return;
   }
+  Invalidate(mTree[folder].parent);
   mTree.Forget(folder);
 }
 
@@ -325,9 +327,13 @@ void VolumeWalk::MarkAsRead(FolderNumber number, kernel::Nanoseconds change,
 }
 
 // Has the folder read again next time, because something in it was not seen that may become visible
-// without a change of the folder.
+// without a change of the folder. For no folder: has the volume walked again from its places.
 void VolumeWalk::Invalidate(FolderNumber folder) {
-  if (folder == kNoParent) return;
+  if (folder == kNoParent) {
+    mKnown.isWhole = false;
+    mHasMissedStart = true;
+    return;
+  }
   mTree[folder].isRead = false;
   mTree[folder].checked = kNoWalk;
 }

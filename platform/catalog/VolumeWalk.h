@@ -101,6 +101,7 @@ class VolumeWalk {
   KnownFolders& mKnown;
   FolderTree& mTree;
   Question& mQuestion;
+  bool mHasMissedStart = false;
   std::vector<OpenFolder> mOpen;  // the innermost folders on the way to the current one
 };
 

@@ -1,120 +1,31 @@
 // What is asked about changes in mid-question: at each system call that an answer takes, in turn.
 // The answer is then the one from before or the one from after, or says that there is none, or
 // leads nowhere; it never leads to another item. A change to something else changes no answer.
-#include <fcntl.h>
 #include <gtest/gtest.h>
-#include <stdlib.h>
 #include <sys/mount.h>
-#include <sys/stat.h>
 
 #include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <optional>
-#include <set>
 #include <string>
 #include <tuple>
 
-#include "support/EveryRequest.h"
+#include "RaceSupport.h"
 #include "support/MountNamespace.h"
-#include "support/SmallRoot.h"
-#include "support/StoppedService.h"
 #include "support/TemporaryFolder.h"
-#include "support/Wire.h"
 
 namespace tallowmere::test {
 namespace {
 
 namespace fs = std::filesystem;
 
-constexpr std::size_t kRecordResponseSize = 75;
-
-constexpr const char* kName = "item.aif";
 constexpr const char* kLongName =
     "an item with a name of more than the sixty-three bytes that there is room for.aif";
 
-using Identity = std::pair<dev_t, ino_t>;
-
-std::optional<Identity> IdentityOf(const std::string& path) {
-  struct stat about {};
-  if (path.empty() || lstat(path.c_str(), &about) != 0) return std::nullopt;
-  return Identity{about.st_dev, about.st_ino};
-}
-
-// --- Answers ----------------------------------------------------------------------------------
-
-std::string ReadCounted(ChildProgram& service, std::string head) {
-  std::uint16_t count = 0;
-  std::memcpy(&count, head.data() + head.size() - sizeof count, sizeof count);
-  return head + service.Read(count + kTrailer.size());
-}
-
-// The whole response to a request.
-std::string Answer(ChildProgram& service, unsigned code, const std::string& request) {
-  service.Write(request);
-  switch (code) {
-    case 1:
-      return service.Read(2 + kRoomForAFullPath + kTrailer.size());
-    case 2:
-      return ReadCounted(service, service.Read(4));
-    case 7:
-      return service.Read(kRecordResponseSize);
-    default:
-      return ReadCounted(service, service.Read(3));
-  }
-}
-
-// A service that is not stopped, for what is true while nothing changes.
-class Bystander : public ChildProgram {
- public:
-  Bystander() : ChildProgram(ServiceToTest(), {std::to_string(getpid())}) {}
-};
-
-// The path in a response to code 2, 6, 8 or 9; empty when there is none.
-std::string PathIn(unsigned code, const std::string& response) {
-  const std::size_t head = code == 2 ? 4 : 3;
-  return response.size() > head + kTrailer.size() ? response.c_str() + head : "";
-}
-
-// The HFS path in a response to code 1.
-std::string FullPathIn(const std::string& response) {
-  return response.c_str() + 2;
-}
-
-// What a service knows of the item at a path, which may be a new one.
-Item ItemAt(ChildProgram& service, const fs::path& path) {
-  Item item{};
-  item.path = path;
-  item.folder = path.parent_path();
-  item.record = Answer(service, 7, RecordRequest(item.path))
-                    .substr(1, kRecordResponseSize - 1 - kTrailer.size());
-  item.name = std::string(item.record.data() + 7, static_cast<unsigned char>(item.record[6]));
-  std::memcpy(&item.volume, item.record.data(), sizeof item.volume);
-  std::memcpy(&item.folderID, item.record.data() + sizeof item.volume, sizeof item.folderID);
-  item.fullPath = FullPathIn(Answer(service, 1, FullPathRequest(item.path, kRoomForAFullPath, 1)));
-  return item;
-}
-
 // --- Races ------------------------------------------------------------------------------------
 
-void Exchange(const fs::path& first, const fs::path& second) {
-  ASSERT_EQ(renameat2(AT_FDCWD, first.c_str(), AT_FDCWD, second.c_str(), RENAME_EXCHANGE), 0);
-}
-
 enum class Race { kFolderBecomesLink, kItemIsReplaced, kFolderIsCovered };
-enum class Knowledge { kNone, kOfTheItem, kOfAPass };
-
-const char* NameOf(Knowledge knowledge) {
-  switch (knowledge) {
-    case Knowledge::kNone:
-      return "AtFirst";
-    case Knowledge::kOfTheItem:
-      return "Remembered";
-    default:
-      return "KnownByAPass";
-  }
-}
-
 const char* NameOf(Race race) {
   switch (race) {
     case Race::kFolderBecomesLink:
@@ -168,67 +79,6 @@ class Tree {
   Item mItem{};
 };
 
-// What may be answered: known from services that see the tree only before or only after.
-class Truth {
- public:
-  Truth(const Tree& tree, unsigned code) : mCode(code), mTree(tree) {}
-
-  void Note(const std::string& response) {
-    mAnswers.insert(response);
-    const bool isOfPath = mCode == 1 || mCode == 7;
-    const auto item = IdentityOf(isOfPath ? ItemAsked() : PathIn(mCode, response));
-    if (item) mItems.insert(*item);
-  }
-
-  testing::AssertionResult Admits(const std::string& response, ChildProgram& after) const {
-    if (response.size() < kTrailer.size() || !response.ends_with(kTrailer)) {
-      return testing::AssertionFailure() << "not a whole response";
-    }
-    if (mAnswers.contains(response)) return testing::AssertionSuccess();
-    const std::string path = PathAnswered(response, after);
-    const auto item = IdentityOf(path);
-    if (!item) return testing::AssertionSuccess();
-    if (mItems.contains(*item)) return testing::AssertionSuccess();
-    return testing::AssertionFailure() << "leads to another item, " << path;
-  }
-
- private:
-  // Code 1 tells of the folder.
-  std::string ItemAsked() const { return mCode == 1 ? mTree.Path().parent_path() : mTree.Path(); }
-
-  // Where the answer leads, for a service that is asked afterwards; empty when nowhere.
-  std::string PathAnswered(const std::string& response, ChildProgram& after) const {
-    switch (mCode) {
-      case 1: {
-        const std::string path = FullPathIn(response);
-        // A volume alone stands for a folder that cannot be told.
-        if (path.find(':') == path.size() - 1) return {};
-        return PathIn(2, Answer(after, 2, PathOfHFSPathRequest(path + '\0', "", 0)));
-      }
-      case 5:
-        return response == kNoVolumeNameResponse ? "" : "/";
-      case 7:
-        if (response[0] == 0) return {};
-        return PathIn(9, Answer(after, 9, PathOfRecordRequest(response.substr(1, 70), 0, 0)));
-      default:
-        return PathIn(mCode, response);
-    }
-  }
-
-  unsigned mCode;
-  const Tree& mTree;
-  std::set<std::string> mAnswers;
-  std::set<Identity> mItems;
-};
-
-class InSmallRoot : public testing::Test {
- protected:
-  void SetUp() override {
-    static const bool isThere = EnterSmallRoot({ServiceToTest(), TALLOWMERE_STOP_AT_CALLS});
-    if (!isThere) GTEST_SKIP() << "mounting is not permitted here";
-  }
-};
-
 class Races
     : public InSmallRoot,
       public testing::WithParamInterface<std::tuple<Race, unsigned, Knowledge, const char*>> {};
@@ -244,7 +94,7 @@ TEST_P(Races, ChangeNoAnswerIntoThatOfAnotherItem) {
     StoppedService service(ServiceToTest());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     if (knowledge == Knowledge::kOfTheItem) Answer(service.Streams(), 7, tree.Request(7));
-    Truth truth(tree, code);
+    Truth truth(tree.Path(), code);
     truth.Note(Answer(before, code, request));
 
     service.ChangeAt(call, [&, race = race] { tree.Change(race); });

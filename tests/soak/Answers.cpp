@@ -115,7 +115,9 @@ class Evaluation : private Walk {
     for (const Item& item : items) {
       for (const Entry* const entry : EntriesOf(item)) {
         names.insert(RecordName(*entry));
-        names.insert(ShortForm(*entry));
+        for (std::size_t marks = 1; marks <= kMostMarks; ++marks) {
+          names.insert(ShortForm(*entry, marks));
+        }
       }
     }
     return names;

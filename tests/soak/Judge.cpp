@@ -64,11 +64,6 @@ bool HidesFolders(const State& state) {
   return state.other.root != kNoNode || std::any_of(state.begin(), state.end(), isShared);
 }
 
-// ESTALE, which a server may say of what has moved.
-bool IsServersError(const Request& request, const std::string& response) {
-  return request.code == 2 && response == test::ResultResponse(test::kResultSystemError);
-}
-
 // A request and what it turns into: once code 8 has found a record, it continues as code 9 with a
 // search of the other volumes, which have items of their own with that number and name.
 std::vector<Request> StagesOf(const Request& request) {
@@ -90,6 +85,11 @@ const Graph& Judge::GraphOf(History::Version version) {
   return mGraphs.emplace(version, Graph({&mHistory.At(version)})).first->second;
 }
 
+bool Judge::IsServersError(const Request& request, const std::string& response) const {
+  return mNumbers != Numbers::kTrusted && request.code == 2 &&
+         response == test::ResultResponse(test::kResultSystemError);
+}
+
 Verdict Judge::Of(const Request& request, const std::string& response, History::Version first,
                   History::Version last) {
   bool hasChanged = false;
@@ -102,7 +102,8 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
     }
     before = std::move(truth);
   }
-  const bool canBeUndetermined = mIsUntrusted && (first < last || HidesFolders(mHistory.At(first)));
+  const bool canBeUndetermined =
+      mNumbers == Numbers::kUntrusted && (first < last || HidesFolders(mHistory.At(first)));
   if (!hasChanged && !canBeUndetermined) return Verdict::kWrong;
   std::vector<const State*> states;
   for (History::Version version = first; version <= last; ++version) {
@@ -112,7 +113,7 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
   if (first == last) states.push_back(states.front());
   const Truth inSteps = Answers(Graph(states), mPlace, request);
   if (inSteps.honestErrors.contains(response)) return Verdict::kHonestError;
-  if (mIsUntrusted && IsServersError(request, response)) return Verdict::kHonestError;
+  if (IsServersError(request, response)) return Verdict::kHonestError;
   switch (DestinationOf(states, request, response)) {
     case Destination::kMeant:
       return inSteps.responses.contains(response) ? Verdict::kMoved : Verdict::kWrong;

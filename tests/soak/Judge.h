@@ -22,12 +22,18 @@ enum class Verdict {
 };
 inline constexpr std::size_t kVerdicts = 5;
 
+// How far the inode numbers of the main volume can be trusted.
+enum class Numbers {
+  kTrusted,
+  kServed,     // but a server may say ESTALE of what has moved
+  kUntrusted,  // as well; and any two items could have one number, so that any change and anything
+               // that is mounted in it can make an id undetermined
+};
+
 class Judge {
  public:
-  // On an untrusted volume, where any two items could have one number, any change and anything
-  // that is mounted in it can make an id undetermined.
-  Judge(const History& history, Place place, bool isUntrusted = false)
-      : mHistory(history), mPlace(std::move(place)), mIsUntrusted(isUntrusted) {}
+  Judge(const History& history, Place place, Numbers numbers = Numbers::kTrusted)
+      : mHistory(history), mPlace(std::move(place)), mNumbers(numbers) {}
 
   // REQUIRES: all states from the first to the last one are reached and kept.
   Verdict Of(const Request& request, const std::string& response, History::Version first,
@@ -43,11 +49,12 @@ class Judge {
 
   Destination DestinationOf(const std::vector<const State*>& states, const Request& request,
                             const std::string& response) const;
+  bool IsServersError(const Request& request, const std::string& response) const;
   const Graph& GraphOf(History::Version version);
 
   const History& mHistory;
   Place mPlace;
-  bool mIsUntrusted;
+  Numbers mNumbers;
   std::map<History::Version, Graph> mGraphs;  // of the states that were used last
 };
 

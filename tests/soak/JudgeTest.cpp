@@ -76,14 +76,13 @@ std::vector<State> OuterFolderMoved(bool rootHasSub) {
 }
 
 Verdict VerdictOn(const std::vector<State>& states, const Request& request,
-                  const std::string& response, bool isUntrusted = false) {
+                  const std::string& response, Numbers numbers = Numbers::kTrusted) {
   History history(states.front());
   for (std::size_t i = 1; i < states.size(); ++i) {
     history.Begin(states[i]);
     history.Reach();
   }
-  return Judge(history, {"/soaked", "soaked"}, isUntrusted)
-      .Of(request, response, 0, history.Reached());
+  return Judge(history, {"/soaked", "soaked"}, numbers).Of(request, response, 0, history.Reached());
 }
 
 Request RequestAbout(unsigned code, const std::vector<NameIndex>& names) {
@@ -323,21 +322,24 @@ TEST(JudgeOfAnUntrustedVolume, TakesAnErrorWhenSomethingElseHasChanged) {
   State after = before;
   after.entries.at(after.count++) = EntryIn(kMainRoot, kTrack1, kSub, Kind::kFile);
   EXPECT_EQ(VerdictOn({before, after}, RequestAboutRecordOfX(), kNoItemResponse), Verdict::kWrong);
-  EXPECT_EQ(VerdictOn({before, after}, RequestAboutRecordOfX(), kNoItemResponse, true),
-            Verdict::kHonestError);
+  EXPECT_EQ(
+      VerdictOn({before, after}, RequestAboutRecordOfX(), kNoItemResponse, Numbers::kUntrusted),
+      Verdict::kHonestError);
 }
 
 TEST(JudgeOfAnUntrustedVolume, TakesNoErrorWhenNothingHasChanged) {
   const State state = FolderAndThenFileMoved().front();
-  EXPECT_EQ(VerdictOn({state}, RequestAboutRecordOfX(), kNoItemResponse, true), Verdict::kWrong);
+  EXPECT_EQ(VerdictOn({state}, RequestAboutRecordOfX(), kNoItemResponse, Numbers::kUntrusted),
+            Verdict::kWrong);
 }
 
 TEST(JudgeOfAnUntrustedVolume, TakesOnlyAnErrorAboutANumberThatTwoFoldersHave) {
   const State state = TwoFoldersWithOneNumber();
-  EXPECT_EQ(VerdictOn({state}, RequestAboutRecordOfX(), kNoItemResponse, true), Verdict::kExact);
-  EXPECT_EQ(
-      VerdictOn({state}, RequestAboutRecordOfX(), PathResponse("/soaked/soak B/track 1.aif"), true),
-      Verdict::kWrong);
+  EXPECT_EQ(VerdictOn({state}, RequestAboutRecordOfX(), kNoItemResponse, Numbers::kUntrusted),
+            Verdict::kExact);
+  EXPECT_EQ(VerdictOn({state}, RequestAboutRecordOfX(), PathResponse("/soaked/soak B/track 1.aif"),
+                      Numbers::kUntrusted),
+            Verdict::kWrong);
 }
 
 TEST(JudgeOfAnUntrustedVolume, TakesNoOtherItem) {
@@ -345,8 +347,16 @@ TEST(JudgeOfAnUntrustedVolume, TakesNoOtherItem) {
   State after = state;
   after.entries.at(after.count++) = EntryIn(kMainRoot, kTrack1, kSub, Kind::kFile);
   EXPECT_EQ(VerdictOn({state, after}, RequestAboutRecordOfX(),
-                      PathResponse("/soaked/soak B/track 2.aif"), true),
+                      PathResponse("/soaked/soak B/track 2.aif"), Numbers::kUntrusted),
             Verdict::kWrong);
+}
+
+TEST(JudgeOfAServedVolume, TakesAnErrorOfTheServerAboutWhatChanged) {
+  const Request request = RequestAbout(2, {kSoakB, kTrack1});
+  const std::string error = ResultResponse(kResultSystemError);
+  EXPECT_EQ(VerdictOn(FolderAndThenFileMoved(), request, error), Verdict::kWrong);
+  EXPECT_EQ(VerdictOn(FolderAndThenFileMoved(), request, error, Numbers::kServed),
+            Verdict::kHonestError);
 }
 
 }  // namespace

@@ -33,6 +33,13 @@ constexpr auto kTrustedOthers = std::to_array<std::string_view>({"tmpfs", "overl
 constexpr auto kUntrusted =
     std::to_array<std::string_view>({"fuse", "fuse-one-number", "bindfs", "fuse-overlayfs"});
 
+Numbers NumbersOf(const std::string& kind) {
+  if (kind == "fuseblk") return Numbers::kServed;
+  const bool isUntrusted =
+      std::find(kUntrusted.begin(), kUntrusted.end(), kind) != kUntrusted.end();
+  return isUntrusted ? Numbers::kUntrusted : Numbers::kTrusted;
+}
+
 bool IsMounted(const char* type, const std::string& place, const std::string& options = "") {
   return mount("none", place.c_str(), type, 0, options.c_str()) == 0;
 }
@@ -52,9 +59,7 @@ bool MainVolume::IsKind(const std::string& kind) {
   return std::find(kinds.begin(), kinds.end(), kind) != kinds.end();
 }
 
-MainVolume::MainVolume(const std::string& kind)
-    : mKind(kind),
-      mIsUntrusted(std::find(kUntrusted.begin(), kUntrusted.end(), kind) != kUntrusted.end()) {
+MainVolume::MainVolume(const std::string& kind) : mKind(kind), mNumbers(NumbersOf(kind)) {
   for (const Disk& disk : Disks()) {
     if (disk.kind == kind) mImage.emplace(kind, disk.makeCommand, disk.size);
   }

@@ -7,6 +7,7 @@
 #include <string>
 #include <vector>
 
+#include "Judge.h"
 #include "support/FileSystemImage.h"
 #include "support/TemporaryFolder.h"
 
@@ -21,9 +22,7 @@ class MainVolume {
   // REQUIRES: it is one of the kinds.
   explicit MainVolume(const std::string& kind);
 
-  // Whether two items can have one inode number as far as the service knows, so that nearly
-  // nothing can be told of an id while the tree changes.
-  bool IsUntrusted() const { return mIsUntrusted; }
+  Numbers InodeNumbers() const { return mNumbers; }
 
   // Mounts it. Returns the mount point; nullopt where a tool or the kernel's support is missing.
   // REQUIRES: this process is in a mount namespace of its own.
@@ -37,7 +36,7 @@ class MainVolume {
 
   test::TemporaryFolder mFolder;
   std::string mKind;
-  bool mIsUntrusted;
+  Numbers mNumbers;
   std::optional<test::FileSystemImage> mImage;
 };
 

@@ -62,10 +62,10 @@ bool IsVolumePlace(const Entry& entry) {
   return entry.folder == kMainRoot && entry.name == kVolumePlace;
 }
 
-std::string ShortForm(const Entry& entry) {
+std::string ShortForm(const Entry& entry, std::size_t marks) {
   const std::string name = NameAt(entry.name).hfsName;
   const std::size_t dot = std::min(name.rfind('.'), name.size());
-  const std::string tail = "#" + Hexadecimal(entry.inode) + name.substr(dot);
+  const std::string tail = std::string(marks, '#') + Hexadecimal(entry.inode) + name.substr(dot);
   return name.substr(0, std::min(dot, kLongestShortForm - tail.size())) + tail;
 }
 

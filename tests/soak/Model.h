@@ -67,7 +67,9 @@ struct Entry {
 // Whether it is the mount point of the other volume.
 bool IsVolumePlace(const Entry& entry);
 
-std::string ShortForm(const Entry& entry);
+// With more marks where fewer were not found to be the item's, which happens while it moves.
+std::string ShortForm(const Entry& entry, std::size_t marks = 1);
+inline constexpr std::size_t kMostMarks = 16;
 
 // The entry's HFS name in a record.
 std::string RecordName(const Entry& entry);

@@ -50,15 +50,19 @@ StoppedService::~StoppedService() {
 
 void StoppedService::ChangeAt(int call, std::function<void()> change) {
   const std::lock_guard lock(mMutex);
-  mCallsToGo = call;
-  mChange = std::move(change);
-  mHasChanged = false;
+  mCalls = 0;
+  mChanges.clear();
+  mChanges.emplace(call, std::move(change));
+}
+
+void StoppedService::ThenChangeAt(int call, std::function<void()> change) {
+  const std::lock_guard lock(mMutex);
+  mChanges.emplace(call, std::move(change));
 }
 
 bool StoppedService::HasChanged() {
   const std::lock_guard lock(mMutex);
-  mChange = nullptr;
-  return mHasChanged;
+  return std::exchange(mChanges, {}).empty();
 }
 
 // Runs until the service has ended.
@@ -69,9 +73,10 @@ void StoppedService::Supervise() {
     if (ioctl(mListener, SECCOMP_IOCTL_NOTIF_RECV, &stopped) != 0) continue;
     {
       const std::lock_guard lock(mMutex);
-      if (mChange && mCallsToGo-- == 0) {
-        std::exchange(mChange, nullptr)();
-        mHasChanged = true;
+      const int call = mCalls++;
+      while (!mChanges.empty() && mChanges.begin()->first == call) {
+        mChanges.begin()->second();
+        mChanges.erase(mChanges.begin());
       }
     }
     seccomp_notif_resp goOn{};

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <functional>
+#include <map>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -21,14 +22,17 @@ class StoppedService {
   // Whether the kernel lets us stop it.
   bool CanStop() const { return mListener >= 0; }
 
-  // The service's streams. It does not stop unless a change is pending.
+  // The service's streams. It is not held up unless a change is pending.
   ChildProgram& Streams() { return *mProgram; }
 
   // Calls `change` when the service is about to make its system call number `call`, counted from
   // now, the next one being 0.
   void ChangeAt(int call, std::function<void()> change);
 
-  // Cancels a pending change. Returns whether the change was made.
+  // A second change, at this call or a later one. REQUIRES: no call was made since ChangeAt.
+  void ThenChangeAt(int call, std::function<void()> change);
+
+  // Cancels pending changes. Returns whether all changes were made.
   bool HasChanged();
 
  private:
@@ -39,9 +43,8 @@ class StoppedService {
   std::unique_ptr<ChildProgram> mProgram;
   std::thread mSupervisor;
   std::mutex mMutex;  // guards everything below
-  int mCallsToGo = 0;
-  std::function<void()> mChange;
-  bool mHasChanged = false;
+  int mCalls = 0;     // since the changes were given
+  std::multimap<int, std::function<void()>> mChanges;
 };
 
 }  // namespace tallowmere::test

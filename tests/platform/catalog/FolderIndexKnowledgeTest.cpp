@@ -850,5 +850,49 @@ TEST_F(AnIndexBesideADeadMount, IsNotLedThereByALinkInAFoldersPlace) {
   EXPECT_EQ(Find(gone), "(none)");
 }
 
+// --- A volume that is elsewhere for a while -----------------------------------------------------
+
+class AnIndexOfAMovingVolume : public AnIndex {
+ protected:
+  void SetUp() override {
+    AnIndex::SetUp();
+    if (IsSkipped()) return;
+    for (const char* name : {"a/b", "c/d"}) Make(name);
+    mElsewhere = mFolder.MakeFolder("elsewhere");
+    KnowEverything();
+    mID = ID("c/d");
+  }
+  void TearDown() override { MoveBack(); }
+  void MoveAway() const {
+    EXPECT_EQ(mount(mTop.c_str(), mElsewhere.c_str(), nullptr, MS_MOVE, nullptr), 0);
+  }
+  void MoveBack() const { mount(mElsewhere.c_str(), mTop.c_str(), nullptr, MS_MOVE, nullptr); }
+
+  std::string mElsewhere;
+  std::uint32_t mID = 0;
+};
+
+TEST_F(AnIndexOfAMovingVolume, KnowsItAgainWhenItHasNotBeenThere) {
+  const volumes::VolumesPointer before = mTable.Now();
+  MoveAway();
+  EXPECT_EQ(mIndex->Find({kOfNoItem, nullptr, true}, mTop, *before), std::nullopt);
+  MoveBack();
+  EXPECT_EQ(Find(mID), PathTo("c/d"));
+}
+
+TEST_F(AnIndexOfAMovingVolume, KnowsItAgainWhenItWentWhileItWasLookedAt) {
+  Make("new");
+  bool isAway = false;
+  {
+    const test::BeforeEntries entries([&](int) {
+      if (!std::exchange(isAway, true)) MoveAway();
+    });
+    EXPECT_EQ(Find(kOfNoItem), "(none)");
+  }
+  ASSERT_TRUE(isAway);
+  MoveBack();
+  EXPECT_EQ(Find(mID), PathTo("c/d"));
+}
+
 }  // namespace
 }  // namespace tallowmere::catalog

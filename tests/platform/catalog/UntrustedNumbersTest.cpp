@@ -5,6 +5,7 @@
 
 #include "FolderIndexFixture.h"
 #include "NumberedFileSystem.h"
+#include "platform/HostCalls.h"
 #include "support/FileSystemImage.h"
 
 namespace tallowmere::catalog {
@@ -13,6 +14,7 @@ namespace {
 using test::BeforeEntries;
 using test::FileSystemImage;
 using test::NumberedFileSystem;
+using test::RefusedOpenat2;
 using test::RunTool;
 using test::ScopedMount;
 using test::TemporaryFolder;
@@ -96,6 +98,21 @@ TEST_F(AnUntrustedVolume, LooksForTheNumbersOfAReference) {
   EXPECT_EQ(Search(wanted, mTop), first);
   MakeShared("b/f");
   EXPECT_EQ(Search(wanted, mTop), std::nullopt);
+}
+
+// As when the item goes while its canonical path is looked up.
+TEST_F(AnUntrustedVolume, HasNoOtherItemForAReferenceByAPathWithLinksThatCouldNotBeHeld) {
+  const std::string first = MakeShared("a/f");
+  MakeShared("b/f");
+  const std::string link = mFolder.Path() / "link";
+  std::filesystem::create_symlink(PathTo("a"), link);
+  FSRef reference{};
+  {
+    const RefusedOpenat2 refused(EIO);
+    reference = test::ReferenceTo(link + "/f@500");
+  }
+  Remove(first);
+  EXPECT_EQ(test::PlaceOf(reference), std::nullopt);
 }
 
 TEST_F(AnUntrustedVolume, AnswersNothingUnlessEveryFolderMayBeRead) {
