@@ -1,5 +1,4 @@
 #include <AppKit/Workspace.h>
-#include <sys/stat.h>
 
 #include <algorithm>
 #include <string>
@@ -9,10 +8,13 @@
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
 #include "foundation/String.h"
+#include "kernel/Item.h"
+#include "kernel/Paths.h"
 #include "text/FileNameText.h"
 
 namespace {
 
+using namespace tallowmere;
 using namespace tallowmere::foundation;
 
 // The extensions of registered document and bundle types that are folders.
@@ -42,21 +44,17 @@ bool IsPackageExtension(std::string_view extension) {
 }
 
 bool IsFolder(const std::string& path) {
-  struct stat about {};
-  return lstat(path.c_str(), &about) == 0 && S_ISDIR(about.st_mode);
-}
-
-bool IsFile(const std::string& path) {
-  struct stat about {};
-  return stat(path.c_str(), &about) == 0 && S_ISREG(about.st_mode);
+  const auto status = kernel::ReadStatus(kernel::AtPath(path.c_str()));
+  return status && kernel::IsFolder(status->item);
 }
 
 bool IsPackage(const std::string& path) {
   if (!IsFolder(path)) return false;
   const auto extension = Extension(*LastComponent(path));
   if (extension && IsPackageExtension(*extension)) return true;
-  return std::any_of(std::begin(kPackageFiles), std::end(kPackageFiles),
-                     [&path](std::string_view file) { return IsFile(JoinPath(path, file)); });
+  return std::any_of(
+      std::begin(kPackageFiles), std::end(kPackageFiles),
+      [&path](std::string_view file) { return kernel::LeadsToFile(JoinPath(path, file)); });
 }
 
 }  // namespace

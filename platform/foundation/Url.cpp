@@ -1,10 +1,8 @@
 #include "foundation/Url.h"
 
-#include <unistd.h>
-
-#include <cerrno>
 #include <utility>
 
+#include "foundation/CurrentDirectory.h"
 #include "foundation/LetterCase.h"
 #include "foundation/PathText.h"
 #include "foundation/PercentEncoding.h"
@@ -28,17 +26,6 @@ std::string UrlTextOfPath(std::string_view path, bool folder) {
   AppendPercentEncodedPath(text, folder ? path : WithoutFolderMark(path), !isAbsolute);
   if (folder && !path.ends_with('/')) text += '/';
   return text;
-}
-
-// The current directory. Nullopt when it has been removed or cannot be read.
-std::optional<std::string> CurrentDirectory() {
-  std::string path(256, '\0');
-  while (getcwd(path.data(), path.size()) == nullptr) {
-    if (errno != ERANGE) return std::nullopt;
-    path.resize(path.size() * 2);
-  }
-  path.resize(path.find('\0'));
-  return path;
 }
 
 bool HasNul(std::string_view path) {

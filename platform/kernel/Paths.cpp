@@ -2,6 +2,7 @@
 
 #include <fcntl.h>
 #include <linux/openat2.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -98,6 +99,11 @@ Result<std::string> CanonicalPath(const std::string& path) {
   const auto folder = RealPath(path.substr(0, length));
   if (!folder) return folder.Error();
   return foundation::JoinPath(*folder, name);
+}
+
+bool LeadsToFile(const std::string& path) {
+  struct stat about {};
+  return stat(path.c_str(), &about) == 0 && S_ISREG(about.st_mode);
 }
 
 Result<std::string> PathOfDescriptor(const Descriptor& descriptor) {

@@ -39,6 +39,9 @@ Result<std::string> RealPath(const std::string& path);
 // The same, without following a link as the last component.
 Result<std::string> CanonicalPath(const std::string& path);
 
+// Whether a path leads to a regular file, following all links.
+bool LeadsToFile(const std::string& path);
+
 // The path at which the kernel shows an open item. It is not verified: a removed item has one too,
 // followed by " (deleted)".
 Result<std::string> PathOfDescriptor(const Descriptor& descriptor);
