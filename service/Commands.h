@@ -1,7 +1,7 @@
 // The commands, one function each, in three steps: read the fields, do the work, write the answer.
 //
 // A command starts its work only after its last field has arrived; when the channel has failed by
-// then, it returns at once. Work that makes several host calls is done within one Moment, which
+// then, it returns at once. Work that makes several host calls is done within one moment, which
 // ends before the answer is written. The caller writes the trailer.
 #pragma once
 

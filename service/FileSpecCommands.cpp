@@ -27,7 +27,7 @@ void GetHFSName(Channel& channel) {
   const auto maximum = channel.Take<std::uint16_t>();
   if (channel.Failed()) return;
 
-  process::Moment moment;
+  process::MomentScope moment;
   const CFileRef item(path.get(), false);
   path.reset();
   char name[protocol::kLongestHFSName] = {};
@@ -43,7 +43,7 @@ void GetFSSpec(Channel& channel) {
   auto path = channel.TakeAllocated();
   if (channel.Failed()) return;
 
-  process::Moment moment;
+  process::MomentScope moment;
   const CFileRef item(path.get(), true);
   path.reset();
   FSSpec spec;
@@ -64,7 +64,7 @@ void SetFileRefFromFSSpecData(Channel& channel) {
   const bool last = channel.Take<std::uint8_t>() != 0;
   if (channel.Failed()) return;
 
-  process::Moment moment;
+  process::MomentScope moment;
   CFileRef item;
   const bool isSet = CFileUtilSetFileRefFromFSSpecData(&item, volume, folder, name, last);
   moment.End();
@@ -79,7 +79,7 @@ void SetFileRefFromFSSpec(Channel& channel) {
   const bool last = channel.Take<std::uint8_t>() != 0;
   if (channel.Failed()) return;
 
-  process::Moment moment;
+  process::MomentScope moment;
   CFileRef item;
   const bool isSet =
       CFileUtilSetFileRefFromDeprecatedFSSpecThroughIPC(&item, &spec, searchOtherVolumes, last);

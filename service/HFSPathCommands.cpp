@@ -18,7 +18,7 @@ void MakeFullPath(Channel& channel) {
   const auto flag = channel.Take<std::uint8_t>();
   if (channel.Failed()) return;
 
-  process::Moment moment;
+  process::MomentScope moment;
   CFileRef item;
   item.Set(path.get(), false);
   path.reset();
@@ -43,7 +43,7 @@ void MakeFileRefFromPath(Channel& channel) {
   const auto flag = channel.Take<std::uint8_t>();
   if (channel.Failed()) return;
 
-  process::Moment moment;
+  process::MomentScope moment;
   CFileRef item;
   const char* const nameIfAny = nameLength == 0 ? nullptr : name.get();
   const OSErr result = CFileUtilMakeFileRefFromPath(&item, folder.get(), nameIfAny, flag);
@@ -60,7 +60,7 @@ void AddHFSName(Channel& channel) {
   const bool flag = channel.Take<std::uint8_t>() != 0;
   if (channel.Failed()) return;
 
-  process::Moment moment;
+  process::MomentScope moment;
   CFileRef item(path.get(), true);
   path.reset();
   const bool isAdded = CFileUtilAddHFSName(&item, name, flag);

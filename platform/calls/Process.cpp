@@ -21,7 +21,7 @@ catalog::Moment* OpenMoment() {
 namespace tallowmere::process {
 
 // Without memory for the process's state no moment opens, and each call looks for itself.
-Moment::Moment() noexcept : mIsOutermost(false) {
+MomentScope::MomentScope() noexcept : mIsOutermost(false) {
   try {
     calls::Process& process = calls::ThisProcess();
     if (process.momentOwner != std::thread::id()) return;
@@ -32,7 +32,7 @@ Moment::Moment() noexcept : mIsOutermost(false) {
   }
 }
 
-void Moment::End() noexcept {
+void MomentScope::End() noexcept {
   if (!mIsOutermost) return;
   calls::ThisProcess().moment.Restart();
   calls::ThisProcess().momentOwner = {};

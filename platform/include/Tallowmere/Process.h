@@ -4,19 +4,19 @@
 
 namespace tallowmere::process {
 
-// While a Moment is open, the host's calls of this thread answer as if at one moment: a call reuses
-// what an earlier one has looked up, so a concurrent change by others may or may not be seen.
-// Without a Moment, each call looks everything up anew.
+// While a MomentScope is open, the host's calls of this thread answer as if at one moment: a call
+// reuses what an earlier one has looked up, so a concurrent change by others may or may not be
+// seen. Without one, each call looks everything up anew.
 //
-// A Moment keeps a few folders open, so that their volumes cannot be unmounted: open it for one
-// request, no longer. One opened within another joins the outer one. It ends with its scope, also
+// It keeps a few folders open, so that their volumes cannot be unmounted: open it for one request,
+// no longer. One opened within another joins the outer one. It ends with its scope, also
 // when an exception leaves that, or earlier with End().
-class Moment {
+class MomentScope {
  public:
-  Moment() noexcept;
-  Moment(const Moment&) = delete;
-  Moment& operator=(const Moment&) = delete;
-  ~Moment() { End(); }
+  MomentScope() noexcept;
+  MomentScope(const MomentScope&) = delete;
+  MomentScope& operator=(const MomentScope&) = delete;
+  ~MomentScope() { End(); }
 
   void End() noexcept;
 

@@ -22,7 +22,7 @@
 namespace tallowmere::test {
 namespace {
 
-using process::Moment;
+using process::MomentScope;
 using testing::IsEmpty;
 using testing::Not;
 
@@ -71,7 +71,7 @@ class AMoment : public testing::Test {
   }
   // What asking about an item once more costs, after a first time.
   std::optional<std::vector<long>> CallsOfTheSecondQuestion(bool inMoment) const {
-    std::optional<Moment> moment;
+    std::optional<MomentScope> moment;
     FSRef item{};
     const auto ask = [&] {
       FSSpec spec{};
@@ -103,7 +103,7 @@ TEST_F(AMoment, LooksAtAnItemOnce) {
 TEST_F(AMoment, HoldsAFolderOnceForAllItsItems) {
   mFolder.MakeFile("first/a/b/y");
   const auto callsFor = [&](const std::string& before) {
-    std::optional<Moment> moment;
+    std::optional<MomentScope> moment;
     const auto prepare = [&] {
       moment.emplace();
       SpecOf(PathTo(before));
@@ -120,7 +120,7 @@ TEST_F(AMoment, GivesThePathByWhichAnItemWithTwoNamesWasFound) {
   const std::string path = PathTo("first/a/b/" + std::string(80, 'x') + ".aif");
   std::filesystem::create_hard_link(PathTo("first/a/b/x"), path);
   const FSSpec spec = SpecOf(path);
-  const Moment moment;
+  const MomentScope moment;
   ReferenceTo(PathTo("first/a/b/x"));
   EXPECT_EQ(ItemOf(spec), path);
 }
@@ -129,7 +129,7 @@ TEST_F(AMoment, GivesThePathByWhichAnItemWasFoundAfterManyOthers) {
   const std::string path = PathTo("first/a/b/y");
   std::filesystem::create_hard_link(PathTo("first/a/b/x"), path);
   const FSSpec spec = SpecOf(path);
-  const Moment moment;
+  const MomentScope moment;
   ReferenceTo(PathTo("first/a/b/x"));
   for (int i = 0; i < 20; ++i) ReferenceTo(PathTo("first/" + std::to_string(i)));
   EXPECT_EQ(ItemOf(spec), path);
@@ -137,7 +137,7 @@ TEST_F(AMoment, GivesThePathByWhichAnItemWasFoundAfterManyOthers) {
 
 TEST_F(AMoment, AnswersAsOutside) {
   const FSSpec outside = SpecOf(PathTo("first/a/b/x"));
-  const Moment moment;
+  const MomentScope moment;
   const FSSpec spec = SpecOf(PathTo("first/a/b/x"));
   EXPECT_EQ(spec.vRefNum, outside.vRefNum);
   EXPECT_EQ(ParentOf(spec), ParentOf(outside));
@@ -146,7 +146,7 @@ TEST_F(AMoment, AnswersAsOutside) {
 }
 
 TEST_F(AMoment, ClimbsFromAFolderToTheRoot) {
-  const Moment moment;
+  const MomentScope moment;
   EXPECT_EQ(FoldersOf("first/a/b/x"), "first:a:b:");
 }
 
@@ -154,7 +154,7 @@ TEST_F(AMoment, ClimbsThroughTheFoldersThatHoldItNow) {
   mFolder.MakeFolder("first/a/b/c");
   mFolder.MakeFile("first/a/b/c/x");
   const auto climb = [this](const std::string& name) {
-    const Moment moment;
+    const MomentScope moment;
     return FoldersOf(name);
   };
   ASSERT_EQ(climb("first/a/b/c/x"), "first:a:b:c:");
@@ -193,7 +193,7 @@ class AMomentAfterARename : public AMoment {
     mIsRenamed = true;
   }
   std::string FoldersInAMoment(const std::string& name) const {
-    const Moment moment;
+    const MomentScope moment;
     return FoldersOf(name);
   }
 
@@ -216,7 +216,7 @@ TEST_F(AMomentAfterARename, TakesNoFolderInAVolumeForItsRoot) {
 // --- What does not ------------------------------------------------------------------------------
 
 TEST_F(AMoment, KeepsNothingNegative) {
-  const Moment moment;
+  const MomentScope moment;
   const FSSpec spec = SpecOf(PathTo("first/a/b/x"));
   const FSSpec later = MakeRecord(spec.vRefNum, ParentOf(spec), "later");
   EXPECT_EQ(ItemOf(later), "(-43)");
@@ -231,7 +231,7 @@ TEST_F(AMoment, KeepsNothingNegative) {
 }
 
 TEST_F(AMoment, LooksAlongAPathOnceMoreBeforeItGivesIt) {
-  const Moment moment;
+  const MomentScope moment;
   const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   ASSERT_EQ(NameOfItem(item), "x");
   Rename("first/a/b/x", "first/a/y");
@@ -239,7 +239,7 @@ TEST_F(AMoment, LooksAlongAPathOnceMoreBeforeItGivesIt) {
 }
 
 TEST_F(AMoment, DoesNotTakeWhatIsMountedMeanwhileForWhatItHasSeen) {
-  const Moment moment;
+  const MomentScope moment;
   const FSSpec before = SpecOf(PathTo("first/a/b/x"));
   const ScopedMount cover("none", PathTo("first/a/b"), "tmpfs");
   ASSERT_TRUE(cover.IsMounted());
@@ -255,7 +255,7 @@ TEST_F(AMoment, DoesNotTakeWhatIsMountedMeanwhileForWhatItHasSeen) {
 }
 
 TEST_F(AMoment, KnowsAVolumeThatIsMountedMeanwhile) {
-  const Moment moment;
+  const MomentScope moment;
   const FSSpec before = SpecOf(PathTo("first/a/b/x"));
   const ScopedMount third("none", mFolder.MakeFolder("third"), "tmpfs");
   ASSERT_TRUE(third.IsMounted());
@@ -280,7 +280,7 @@ TEST(WithoutAMoment, EachCallLooksForItself) {
 
 TEST_F(AMoment, KeepsAVolumeMountedUntilItsScopeEnds) {
   {
-    const Moment moment;
+    const MomentScope moment;
     SpecOf(PathTo("first/a/b/x"));
     EXPECT_FALSE(CanUnmount("first"));
   }
@@ -288,7 +288,7 @@ TEST_F(AMoment, KeepsAVolumeMountedUntilItsScopeEnds) {
 }
 
 TEST_F(AMoment, LetsGoWhenItIsEnded) {
-  Moment moment;
+  MomentScope moment;
   SpecOf(PathTo("first/a/b/x"));
   moment.End();
   EXPECT_TRUE(CanUnmount("first"));
@@ -297,7 +297,7 @@ TEST_F(AMoment, LetsGoWhenItIsEnded) {
 
 TEST_F(AMoment, EndsByAnException) {
   try {
-    const Moment moment;
+    const MomentScope moment;
     SpecOf(PathTo("first/a/b/x"));
     throw std::runtime_error("thrown");
   } catch (const std::runtime_error&) {
@@ -308,17 +308,17 @@ TEST_F(AMoment, EndsByAnException) {
 TEST_F(AMoment, CarriesNothingOverToTheNext) {
   FSRef item{};
   {
-    const Moment moment;
+    const MomentScope moment;
     item = ReferenceTo(PathTo("first/a/b/x"));
     ASSERT_EQ(NameOfItem(item), "x");
   }
   Rename("first/a/b/x", "first/a/b/y");
-  const Moment next;
+  const MomentScope next;
   EXPECT_EQ(NameOfItem(item), "y");
 }
 
 TEST_F(AMoment, OnceEndedServesNoLongerInItsScope) {
-  Moment moment;
+  MomentScope moment;
   const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   ASSERT_EQ(NameOfItem(item), "x");
   moment.End();
@@ -327,10 +327,10 @@ TEST_F(AMoment, OnceEndedServesNoLongerInItsScope) {
 }
 
 TEST_F(AMoment, WithinAnotherIsTheSame) {
-  Moment outer;
+  MomentScope outer;
   SpecOf(PathTo("first/a/b/x"));
   {
-    Moment inner;
+    MomentScope inner;
     SpecOf(PathTo("second/a/b/x"));
     inner.End();
     EXPECT_FALSE(CanUnmount("first"));
@@ -346,7 +346,7 @@ TEST_F(AMoment, WithinAnotherIsTheSame) {
 // --- Whose it is --------------------------------------------------------------------------------
 
 TEST_F(AMoment, IsNotThatOfAnotherThread) {
-  const Moment moment;
+  const MomentScope moment;
   const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   ASSERT_EQ(NameOfItem(item), "x");
   Rename("first/a/b/x", "first/a/b/y");
@@ -356,10 +356,10 @@ TEST_F(AMoment, IsNotThatOfAnotherThread) {
 }
 
 TEST_F(AMoment, IsNotEndedByThatOfAnotherThread) {
-  Moment moment;
+  MomentScope moment;
   SpecOf(PathTo("first/a/b/x"));
   std::thread([&] {
-    const Moment other;
+    const MomentScope other;
     SpecOf(PathTo("second/a/b/x"));
   }).join();
   EXPECT_FALSE(CanUnmount("first"));
@@ -374,7 +374,7 @@ TEST_F(AMoment, LetsGoOfWhatItHoldsWhenAVolumeIsSearched) {
   const std::string path = mFolder.MakeFolder("second/gone");
   const FSCatalogInfo info = InfoOf(path);
   std::filesystem::remove(path);
-  const Moment moment;
+  const MomentScope moment;
   SpecOf(PathTo("first/a/b/x"));
   ASSERT_FALSE(CanUnmount("first"));
   EXPECT_EQ(ItemWithID(info.volume, info.nodeID), "(-43)");
@@ -399,7 +399,7 @@ TEST_F(AMoment, GoesOnWhenNoMoreDescriptorsCanBeOpened) {
   const FSSpec wanted = SpecOf(pathIn(kFolders));
   EXPECT_TRUE(HoldsInChild([] { return true; },
                            [&] {
-                             const Moment moment;
+                             const MomentScope moment;
                              for (int i = 0; i < kFolders; ++i) SpecOf(pathIn(i));
                              if (!LeaveDescriptors(0) || dup(STDIN_FILENO) != -1) return false;
                              const FSSpec spec = SpecOf(pathIn(kFolders));
@@ -413,7 +413,7 @@ TEST_F(AMoment, FollowsAPathOfMoreStepsThanItHasDescriptors) {
   mFolder.MakeFile("first/a/1/2/3/4/5/6/x");
   std::filesystem::create_symlink("a", PathTo("first/link"));
   const auto find = [](FSSpec& spec) {
-    const Moment moment;
+    const MomentScope moment;
     return FSMakeFSSpec(0, 0, Str255Of("first:link:1:2:3:4:5:6:x").bytes, &spec);
   };
   FSSpec wanted{};
@@ -427,7 +427,7 @@ TEST_F(AMoment, FollowsAPathOfMoreStepsThanItHasDescriptors) {
 
 // More folders than a moment holds.
 TEST_F(AMoment, AnswersForManyFolders) {
-  const Moment moment;
+  const MomentScope moment;
   std::vector<FSSpec> specs;
   for (int i = 0; i < 50; ++i) {
     mFolder.MakeFolder("first/many/" + std::to_string(i));

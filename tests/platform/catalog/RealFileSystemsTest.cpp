@@ -146,7 +146,7 @@ TEST_F(ARealFileSystem, Ext4TellsAnItemByTheNameThatIsMeant) {
     const FSSpec spec = SpecOf(meant);
     for (const std::string& known : {plain, longer}) {
       ReferenceTo(known);
-      const process::Moment moment;
+      const process::MomentScope moment;
       FSRef item{};
       ASSERT_EQ(FSpMakeFSRef(&spec, &item), noErr);
       EXPECT_EQ(PathOf(item), meant) << "known as " << known;

@@ -127,7 +127,7 @@ TEST(FoldersWithTheSameNumbers, EachHaveARecord) {
   const std::string second = numbered.MakeFolder("second", kNumber);
   for (const auto& [path, name] :
        {std::pair(first, "first@500"), std::pair(second, "second@500")}) {
-    const process::Moment moment;
+    const process::MomentScope moment;
     FSRef item{};
     ASSERT_TRUE(CFURLGetFSRef(foundation::test::MakeUrl(path, true).Get(), &item));
     FSSpec spec{};
