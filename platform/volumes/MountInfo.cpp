@@ -2,6 +2,7 @@
 
 #include <sys/sysmacros.h>
 
+#include <algorithm>
 #include <charconv>
 #include <optional>
 #include <utility>
@@ -32,6 +33,7 @@ bool IsOctalDigit(char c) {
 
 // The kernel writes space, tab, newline, backslash and '#' as a backslash and three octal digits.
 std::string Unescape(std::string_view text) {
+  if (text.find('\\') == text.npos) return std::string(text);
   std::string plain;
   plain.reserve(text.size());
   for (std::size_t i = 0; i < text.size(); ++i) {
@@ -76,6 +78,7 @@ std::optional<Mount> ParseLine(std::string_view line) {
 
 std::vector<Mount> ParseMountInfo(std::string_view text) {
   std::vector<Mount> mounts;
+  mounts.reserve(static_cast<std::size_t>(std::count(text.begin(), text.end(), '\n')));
   while (!text.empty()) {
     if (auto mount = ParseLine(TakeUntil(text, '\n'))) mounts.push_back(*std::move(mount));
   }

@@ -79,10 +79,10 @@ bool MountTree::IsEntered(std::size_t index) {
 // further up.
 bool MountTree::IsCovered(std::size_t index) const {
   const Mount& mount = mMounts[index];
-  for (std::string path = mount.mountPoint; path != "/";) {
+  for (std::string_view path = mount.mountPoint; path != "/";) {
     const auto found = mByPlace.find({mount.parent, path});
     if (found != mByPlace.end() && found->second != index) return true;
-    path.resize(std::max<std::size_t>(path.rfind('/'), 1));
+    path = path.substr(0, std::max<std::size_t>(path.rfind('/'), 1));
   }
   return mount.mountPoint == "/";
 }

@@ -5,7 +5,7 @@
 #include <cstddef>
 #include <functional>
 #include <map>
-#include <string>
+#include <string_view>
 #include <unordered_map>
 #include <utility>
 #include <vector>
@@ -54,7 +54,7 @@ class MountTree {
   int mRootID;
   std::vector<State> mState;
   std::unordered_map<int, std::size_t> mByID;
-  std::map<std::pair<int, std::string>, std::size_t> mByPlace;
+  std::map<std::pair<int, std::string_view>, std::size_t> mByPlace;
 };
 
 }  // namespace tallowmere::volumes

@@ -126,7 +126,7 @@ void VolumeTable::Read() {
 }
 
 VolumesPointer VolumeTable::VolumesOf(const std::vector<Mount>& mounts, int rootID) {
-  std::multimap<int, std::string> byParent;  // mount points
+  MountPointsByParent byParent;
   std::unordered_set<std::string> mountPoints;
   mMountIDs.clear();
   for (const Mount& mount : mounts) {
@@ -154,7 +154,7 @@ VolumesPointer VolumeTable::VolumesOf(const std::vector<Mount>& mounts, int root
 ListedVolumePointer VolumeTable::ListVolume(const std::vector<Mount>& mounts,
                                             const std::vector<std::size_t>& indexes,
                                             const MountTree& tree,
-                                            const std::multimap<int, std::string>& byParent) {
+                                            const MountPointsByParent& byParent) {
   const auto number = NumberOf(mounts[indexes.front()].id);
   if (!number) return nullptr;
   std::vector<ListedVolume::Place> places;
@@ -162,7 +162,7 @@ ListedVolumePointer VolumeTable::ListVolume(const std::vector<Mount>& mounts,
   for (const std::size_t index : indexes) {
     places.push_back({mounts[index], tree.MayBeFile(index)});
     const auto [begin, end] = byParent.equal_range(mounts[index].id);
-    for (auto cover = begin; cover != end; ++cover) covers.push_back(cover->second);
+    for (auto cover = begin; cover != end; ++cover) covers.emplace_back(cover->second);
   }
   return std::make_shared<const ListedVolume>(*number, std::move(places), std::move(covers));
 }

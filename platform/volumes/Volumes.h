@@ -87,11 +87,14 @@ class VolumeTable {
   void Invalidate() { mIsCurrent = false; }
 
  private:
+  // Views of the table's mounts.
+  using MountPointsByParent = std::multimap<int, std::string_view>;
+
   void Read();
   VolumesPointer VolumesOf(const std::vector<Mount>& mounts, int rootID);
   ListedVolumePointer ListVolume(const std::vector<Mount>& mounts,
                                  const std::vector<std::size_t>& indexes, const MountTree& tree,
-                                 const std::multimap<int, std::string>& byParent);
+                                 const MountPointsByParent& byParent);
   std::optional<VolumeNumber> NumberOf(int mountID);
 
   kernel::MountTableFile mFile;
