@@ -141,6 +141,8 @@ TEST_F(ConverterTest, KeepsNoFolderOpenAfterItHasFinished) {
   EXPECT_EQ(test::OpenDescriptors(), before);
 }
 
+#ifdef __x86_64__  // elsewhere, some of these calls have other names
+
 // The calls that look at the file system, of a converter of so many paths in three folders.
 std::ptrdiff_t LooksAt(const TemporaryFolder& folder, int paths) {
   std::vector<std::string> all;
@@ -171,6 +173,8 @@ TEST_F(ConverterTest, LooksOnceAtEachItemOfAFolderThatItKnows) {
   if (few < 0) GTEST_SKIP() << "tracing is not possible here";
   EXPECT_EQ(LooksAt(mFolder, 530) - few, 500);
 }
+
+#endif
 
 }  // namespace
 }  // namespace tallowmere

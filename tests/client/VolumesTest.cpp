@@ -86,6 +86,67 @@ TEST(ListVolumes, HasEachVolumeOnceAndNoInterfaceOfTheKernelNorFolderMountedAlon
   }
 }
 
+TEST(MountPoints, HaveTheKindsOfTheirFileSystems) {
+  const auto mounts = MountsIn(
+      "21 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
+      "23 21 0:9 / /a rw shared:1 master:2 - fuse.sshfs x rw\n"
+      "24 21 0:9 / /b rw - nfs4 x rw\n25 21 0:9 / /c rw\n");
+  ASSERT_EQ(mounts.size(), 4u);
+  EXPECT_EQ(mounts[0].kind, "ext4");
+  EXPECT_EQ(mounts[1].kind, "fuse.sshfs");
+  EXPECT_EQ(mounts[3].kind, "");
+  EXPECT_FALSE(HasServer(mounts[0]));
+  EXPECT_TRUE(HasServer(mounts[1]));
+  EXPECT_TRUE(HasServer(mounts[2]));
+  EXPECT_FALSE(HasServer(mounts[3]));
+}
+
+TEST(FindVolume, TakesANameOrAMountPoint) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  const std::string place = folder.MakeFolder("V\xC3\xA9 1");
+  const ScopedMount volume("none", place, "tmpfs");
+  const ScopedMount again(place, folder.MakeFolder("again"), nullptr, MS_BIND);
+  ASSERT_TRUE(volume.IsMounted() && again.IsMounted());
+  folder.MakeFolder("again/inner");
+  Client client = StartClient();
+  const auto byName = FindVolume(client, "V\xC3\xA9 1");
+  ASSERT_TRUE(byName);
+  EXPECT_EQ(byName->mountPoint, place);
+  for (const std::string& path : {place, place + "/", (folder.Path() / "again").string()}) {
+    const auto byPath = FindVolume(client, path);
+    ASSERT_TRUE(byPath) << path;
+    EXPECT_EQ(byPath->number, byName->number);
+    EXPECT_EQ(byPath->name, byName->name);
+  }
+}
+
+Outcome OutcomeOf(const Result<Volume>& volume) {
+  return volume ? Outcome::kFound : volume.Failure().outcome;
+}
+
+TEST(FindVolume, RefusesWhatIsNone) {
+  Client client = StartClient();
+  for (const char* const text : {"no such volume", "", "\xFF", "/etc", "/proc", "/proc/self"}) {
+    EXPECT_EQ(OutcomeOf(FindVolume(client, text)), Outcome::kNotAVolume) << text;
+  }
+  EXPECT_EQ(OutcomeOf(FindVolume(client, "/missing")), Outcome::kNotAVolume);
+  EXPECT_EQ(OutcomeOf(FindVolume(client, "/missing/x")), Outcome::kNothing);
+}
+
+TEST(FindVolume, RefusesANameThatTwoHave) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const TemporaryFolder folder;
+  const ScopedMount first("none", folder.MakeFolder("a/vol"), "tmpfs");
+  const ScopedMount second("none", folder.MakeFolder("b/vol"), "tmpfs");
+  ASSERT_TRUE(first.IsMounted() && second.IsMounted());
+  Client client = StartClient();
+  const auto volume = FindVolume(client, "vol");
+  EXPECT_EQ(OutcomeOf(volume), Outcome::kAmbiguous);
+  EXPECT_THAT(test::MessageOf(volume), testing::HasSubstr(folder.Path() / "b/vol"));
+  EXPECT_EQ(OutcomeOf(FindVolume(client, (folder.Path() / "b/vol").string())), Outcome::kFound);
+}
+
 TEST(ListVolumes, GivesTheErrorOfAServiceThatEnds) {
   Client client({.service = "/bin/true"});
   EXPECT_EQ(test::MessageOf(ListVolumes(client)), test::kEnded);
