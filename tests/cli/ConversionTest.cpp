@@ -436,3 +436,15 @@ TEST_F(Conversion, EachCommandHasHelpWithExamples) {
 
 }  // namespace
 }  // namespace tallowmere::test
+// Ignored, the signal of the limit leaves the write to fail as on a full disk.
+TEST_F(Conversion, SettingsThatCannotBeStoredLeaveNoFile) {
+  const std::string path = mFolder.Path() / "settings";
+  ChildProgram cli("/bin/sh", {"-c", "trap '' XFSZ; ulimit -f 0; exec \"$0\" aiff --output \"$1\"",
+                               TALLOWMERE_CLI, path});
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + path + ": it could not be written\n");
+  EXPECT_EQ(cli.Wait(), 1);
+  EXPECT_FALSE(std::filesystem::exists(path));
+  EXPECT_EQ(Cli({"aiff", "--format", "mp3 ", "--output", path}).status, 1);
+  EXPECT_FALSE(std::filesystem::exists(path));
+}
+
