@@ -35,7 +35,11 @@ _tallowmere_cli() {
   case $before in
     --service | --output) return ;;  # a file
     --deadline | --rate | --bits | --channels) ;;
-    --format) words='NONE twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6' ;;
+    --format)
+      # As one word for the shell, which quotes nothing here.
+      [[ 'raw ' == "$word"* ]] && COMPREPLY=('raw\ ')
+      words='NONE twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6'
+      ;;
     *)
       if [[ $word == -* && -n $command ]]; then
         words="${options[$command]} -h --help"

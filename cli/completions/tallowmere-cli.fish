@@ -33,5 +33,5 @@ complete -c tallowmere-cli -n $aiff -l rate -x -d 'In hertz'
 complete -c tallowmere-cli -n $aiff -l bits -x -d 'In a sample'
 complete -c tallowmere-cli -n $aiff -l channels -x -d 'Of the sound'
 complete -c tallowmere-cli -n $aiff -l format -x -d 'Four-character code' \
-    -a 'NONE "raw " twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6'
+    -a 'NONE raw\\\\\\  twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6'
 complete -c tallowmere-cli -n $aiff -l output -r -F -d 'File for the settings'
