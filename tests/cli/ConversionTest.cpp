@@ -300,9 +300,35 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
   EXPECT_EQ(errorsOf({"name", ""}), prefix + ": an empty text names nothing\n");
   EXPECT_EQ(errorsOf({"identify", ""}), prefix + ": an empty text names nothing\n");
 
-  const Output mixed = Cli({"name", missing, mFile});
-  EXPECT_EQ(mixed.text, "a/b\n");
-  EXPECT_EQ(mixed.status, 1);
+// So that paste(1) can put items and answers beside each other.
+TEST_F(Conversion, AnItemThatFailsIsAnEmptyLineInItsPlace) {
+  const std::string missing = mHere + "/missing/x";
+  const std::string record = Lines(Cli({"spec", mFile}).text)[0];
+  const std::string hfsPath = Lines(Cli({"hfs", mFile}).text)[0];
+  const auto expect = [](std::vector<std::string> command, const std::string& answer) {
+    const Output output = Cli(command);
+    EXPECT_EQ(output.text, "\n" + answer + "\n\n") << command[0];
+    EXPECT_EQ(output.status, 1) << command[0];
+  };
+  expect({"name", missing, mFile, ""}, "a/b");
+  expect({"spec", missing, mFile, ""}, record);
+  expect({"hfs", missing, mFile, ""}, hfsPath);
+  expect({"path", "1:2", record, "99:2:x"}, mFile);
+  expect({"posix", "no such volume:x", hfsPath, "\xE6\x97\xA5"}, mFile);
+  expect({"append", mHere, "", "a/b", "\xE6\x97\xA5"}, mFile);
+  EXPECT_EQ(Cli({"name", "--null-output", missing, mFile}).text, std::string("\0a/b\0", 5));
+  const auto table = Lines(Cli({"identify", missing, mFile, ""}).text);
+  ASSERT_EQ(table.size(), 4u);
+  EXPECT_EQ(table[1], "");
+  EXPECT_THAT(table[2], HasSubstr("a/b"));
+  EXPECT_EQ(table[3], "");
+}
+
+TEST_F(Conversion, AGiantItemIsQuotedInPart) {
+  const Output output = Cli({"spec", "-"}, "/" + std::string(1'000'000, 'x') + "\n" + mFile + "\n");
+  EXPECT_EQ(output.errors, "tallowmere-cli: /" + std::string(99, 'x') +
+                               "... (1000001 bytes): File name too long\n");
+  EXPECT_EQ(Lines(output.text).size(), 2u);
 }
 
 TEST_F(Conversion, APathThatIsTooLongIsSaid) {
