@@ -35,8 +35,11 @@ bool IsAt(const std::string& path, const struct stat& item) {
 // Asks one service for the record of each item and another for the path of that record.
 class Census {
  public:
-  Census(const ClientOptions& options, bool isJson)
-      : mRecords(options), mPaths(options), mIsJson(isJson) {}
+  Census(const ClientOptions& options, const Format& format)
+      : mRecords(options),
+        mPaths(options),
+        mIsJson(format.isJson),
+        mBar(!format.isQuiet && !format.hasNoProgress) {}
 
   // Returns whether the services still answer.
   bool Count(const std::string& path, const struct stat& item, double done) {
@@ -138,12 +141,12 @@ class Census {
 
 }  // namespace
 
-int TakeCensus(const ClientOptions& options, bool isJson, const std::string& folder) {
+int TakeCensus(const ClientOptions& options, const Format& format, const std::string& folder) {
   std::error_code error;
   const auto path = std::filesystem::canonical(folder, error);
   if (error) return Complain(folder + ": " + error.message());
 
-  Census census(options, isJson);
+  Census census(options, format);
   const TreeVisitor visitor{
       [&](const std::string& item, const struct stat& status, double done) {
         return census.Count(item, status, done);

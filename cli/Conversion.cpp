@@ -12,10 +12,10 @@ namespace tallowmere::cli {
 
 int Convert(const ItemsToAsk& toAsk, const std::string& key, const Ask& ask) {
   Client client(toAsk.client);
+  Report report(toAsk.format, key);
   if (const auto error = WhyItDoesNotAnswer(client)) return Complain(*error);
   Batch batch(client);
-  Report report(toAsk.format, key);
-  Items items(toAsk.items, toAsk.format.Separator());
+  Items items(toAsk.items, toAsk.format.InputEnd());
   const auto answerAll = [&] {
     batch.Finish();
     std::cout.flush();

@@ -55,31 +55,37 @@ std::vector<std::string> RowOf(const Identity& identity) {
 int PrintIdentities(const ItemsToAsk& paths) {
   Client client(paths.client);
   if (const auto error = WhyItDoesNotAnswer(client)) return Complain(*error);
+  const bool isJson = paths.format.isJson;
   Report report(paths.format, "path");
   Table table({{"vRefNum", Table::Align::kRight},
                {"parent id", Table::Align::kRight},
                {"HFS name"},
                {"HFS path"},
                {"way back"}});
-  Items items(paths.items, paths.format.Separator());
+  const auto fail = [&](const std::string& item, const std::string& reason) {
+    if (isJson) return report.Fail(item, reason);
+    report.TellFailure(item, reason);
+    table.AddEmptyRow();
+  };
+  Items items(paths.items, paths.format.InputEnd());
   while (const auto item = report.GoesOn() ? items.Next([] {}) : std::nullopt) {
     if (item->empty()) {
-      report.Fail(*item, kEmptyItem);
+      fail(*item, kEmptyItem);
       continue;
     }
     const std::string path = AbsolutePath(*item);
     const auto identity = Identify(client, path);
     if (!identity) {
-      report.Fail(*item, identity.Failure().message);
+      fail(*item, identity.Failure().message);
     } else if (!*identity) {
-      report.Fail(*item, WhyNoRecord(path));
-    } else if (paths.format.isJson) {
+      fail(*item, WhyNoRecord(path));
+    } else if (isJson) {
       report.Answer(*item, "", [&](Json& json) { Fill(json, **identity); });
     } else {
       table.Add(RowOf(**identity));
     }
   }
-  if (!paths.format.isJson && !table.IsEmpty()) table.Print(std::cout);
+  if (!isJson && !table.IsEmpty()) table.Print(std::cout);
   return report.Finish();
 }
 

@@ -1,4 +1,5 @@
-// A progress bar on standard error; does nothing when that is not a terminal.
+// A progress bar on standard error, narrower than the terminal. Does nothing when that is not a
+// terminal, nor while a pager has the terminal.
 #pragma once
 
 #include <chrono>
@@ -9,7 +10,7 @@ namespace tallowmere::cli {
 
 class ProgressBar {
  public:
-  ProgressBar();
+  explicit ProgressBar(bool isWanted);
   ProgressBar(const ProgressBar&) = delete;
   ProgressBar& operator=(const ProgressBar&) = delete;
   ~ProgressBar() { Hide(); }
@@ -22,7 +23,7 @@ class ProgressBar {
   void Hide();
 
  private:
-  bool mIsTerminal;
+  bool mIsWanted;
   bool mIsShown = false;
   std::chrono::steady_clock::time_point mNext;
 };

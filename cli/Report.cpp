@@ -11,6 +11,11 @@
 #include "cli/Text.h"
 
 namespace tallowmere::cli {
+namespace {
+
+constexpr const char* kHasNewline = "the answer has a newline; --json or --null-output prints it";
+
+}  // namespace
 
 void Put(Json& json, const std::string& key, std::string_view bytes) {
   std::string text = Utf8OfAnyBytes(bytes);
@@ -20,11 +25,17 @@ void Put(Json& json, const std::string& key, std::string_view bytes) {
 }
 
 Report::Report(Format format, std::string key)
-    : mFormat(format), mKey(std::move(key)), mOutputIsTerminal(isatty(STDOUT_FILENO) == 1) {}
+    : mFormat(format),
+      mKey(std::move(key)),
+      mOutputIsTerminal(isatty(STDOUT_FILENO) == 1),
+      mBar(!format.isQuiet && !format.hasNoProgress) {}
 
 void Report::Answer(std::string_view item, std::string_view text,
                     const std::function<void(Json&)>& fill) {
-  if (!mFormat.isJson) return Print(text);
+  if (!mFormat.isJson) {
+    const bool isLines = mFormat.OutputEnd() == '\n';
+    return isLines && text.find('\n') != text.npos ? Fail(item, kHasNewline) : Print(text);
+  }
   Json json;
   Put(json, mKey, item);
   fill(json);
@@ -32,16 +43,22 @@ void Report::Answer(std::string_view item, std::string_view text,
 }
 
 void Report::Fail(std::string_view item, std::string_view reason) {
+  if (!mFormat.isJson) {
+    TellFailure(item, reason);
+    return Print("");
+  }
   mStatus = kFailed;
   mBar.Hide();
-  if (!mFormat.isJson) {
-    Complain(std::string(item).append(": ").append(reason));
-    return;
-  }
   Json json;
   Put(json, mKey, item);
   Put(json, "error", reason);
   Print(json.dump());
+}
+
+void Report::TellFailure(std::string_view item, std::string_view reason) {
+  mStatus = kFailed;
+  mBar.Hide();
+  Complain(Quoted(item).append(": ").append(reason));
 }
 
 void Report::ShowProgress(std::optional<double> done) {
@@ -64,7 +81,7 @@ void Report::Print(std::string_view text) const {
   } else {
     std::cout << text;
   }
-  std::cout << mFormat.Separator();
+  std::cout << mFormat.OutputEnd();
 }
 
 }  // namespace tallowmere::cli

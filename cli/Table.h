@@ -20,6 +20,9 @@ class Table {
   // REQUIRES: one text for each column, safe for a terminal.
   void Add(std::vector<std::string> row);
 
+  // Adds an empty line.
+  void AddEmptyRow() { Add(std::vector<std::string>(mColumns.size())); }
+
   bool IsEmpty() const { return mRows.empty(); }
 
   // Titles are bold on a terminal. Nothing is padded at the end of a line.

@@ -150,9 +150,19 @@ class CommandLine {
                         const std::string& examples, std::function<int()> run) {
     CLI::App* const command = Add(name, what, examples, std::move(run));
     AddJson(command);
-    command->add_flag("-0,--null", mArguments.items.format.isNullTerminated,
-                      "Items of standard input and results end with a NUL, not a newline");
+    Format& format = mArguments.items.format;
+    command->add_flag("-0,--null", format.hasNullInput,
+                      "Items of standard input end with a NUL, not a newline");
+    command->add_flag("--null-output", format.hasNullOutput,
+                      "Results end with a NUL, not a newline; JSON is lines all the same");
+    AddQuiet(command);
     return command;
+  }
+
+  void AddQuiet(CLI::App* command) {
+    Format& format = mArguments.items.format;
+    command->add_flag("-q,--quiet", format.isQuiet, "Neither a progress bar nor a summary");
+    command->add_flag("--no-progress", format.hasNoProgress, "No progress bar");
   }
 
   void AddJson(CLI::App* command) {
@@ -249,13 +259,18 @@ void CommandLine::AddTheOthers() {
   command =
       Add("census", "Check that each item of a folder comes back by its record, in another process",
           "  tallowmere-cli census /home",
-          [&a] { return TakeCensus(a.items.client, a.items.format.isJson, a.folder); });
+          [&a] { return TakeCensus(a.items.client, a.items.format, a.folder); });
   AddJson(command);
+  AddQuiet(command);
   command->add_option("folder", a.folder, "The folder")->required()->check(CLI::ExistingDirectory);
 
   AddJson(Add("serve-check", "Start the service and try each request",
               "  tallowmere-cli serve-check",
               [&a] { return CheckService(a.items.client, a.items.format.isJson); }));
+
+  command = Add("help", "Print help for a command", "  tallowmere-cli help spec",
+                [this] { return PrintHelp(); });
+  command->add_option("command", a.topic, "The command; without it, help for all")->type_name("");
 }
 
 }  // namespace
@@ -267,8 +282,4 @@ int main(int count, char** arguments) {
   } catch (const std::exception& error) {
     return Complain(error.what());
   }
-
-  command = Add("help", "Print help for a command", "  tallowmere-cli help spec",
-                [this] { return PrintHelp(); });
-  command->add_option("command", a.topic, "The command; without it, help for all")->type_name("");
 }

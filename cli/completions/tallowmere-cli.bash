@@ -3,16 +3,17 @@
 _tallowmere_cli() {
   local -A options=(
     [volumes]='--json'
-    [identify]='-0 --null --json'
-    [spec]='--hex -0 --null --json'
-    [path]='--other-volumes -0 --null --json'
-    [hfs]='-0 --null --json'
-    [posix]='-0 --null --json'
-    [name]='-0 --null --json'
-    [append]='-0 --null --json'
+    [identify]='-0 --null --null-output -q --quiet --no-progress --json'
+    [spec]='--hex -0 --null --null-output -q --quiet --no-progress --json'
+    [path]='--other-volumes -0 --null --null-output -q --quiet --no-progress --json'
+    [hfs]='-0 --null --null-output -q --quiet --no-progress --json'
+    [posix]='-0 --null --null-output -q --quiet --no-progress --json'
+    [name]='-0 --null --null-output -q --quiet --no-progress --json'
+    [append]='-0 --null --null-output -q --quiet --no-progress --json'
     [aiff]='--rate --bits --channels --format --output --json'
-    [census]='--json'
+    [census]='-q --quiet --no-progress --json'
     [serve-check]='--json'
+    [help]=
   )
   # The command is the first word that is neither an option nor the value of one. In "--option=value",
   # "=" is a separate word.
@@ -44,8 +45,8 @@ _tallowmere_cli() {
       if [[ $word == -* && -n $command ]]; then
         words="${options[$command]} -h --help"
       elif [[ $word == -* ]]; then
-        words='--service --deadline --version -h --help'
-      elif [[ -z $command ]]; then
+        words='--service --deadline -V --version -h --help'
+      elif [[ -z $command || $command == help ]]; then
         words=${!options[*]}
       else
         return
@@ -54,7 +55,7 @@ _tallowmere_cli() {
   esac
   # The words listed here are not files.
   compopt +o default 2>/dev/null
-  mapfile -t COMPREPLY < <(compgen -W "$words" -- "$word")
+  mapfile -t -O ${#COMPREPLY[@]} COMPREPLY < <(compgen -W "$words" -- "$word")
 }
 
 # Completes files where nothing is listed.

@@ -92,8 +92,9 @@ TEST(CommandLine, OutputThatCannotBeWrittenIsStatus1AndOneSentence) {
         "--help", "--version", "spec --help", "help", "help spec"}) {
     ChildProgram cli("/bin/sh",
                      {"-c", std::string("exec \"$0\" ") + command + " >/dev/full", TALLOWMERE_CLI});
-    EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the output could not be written\n");
-    EXPECT_EQ(cli.Wait(), 1);
+    EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the output could not be written\n")
+        << command;
+    EXPECT_EQ(cli.Wait(), 1) << command;
   }
 }
 
@@ -145,7 +146,6 @@ std::string Printed(const std::vector<std::string>& arguments) {
   ChildProgram cli(TALLOWMERE_CLI, arguments);
   std::string text = cli.ReadToEnd();
   EXPECT_EQ(cli.Wait(), 0);
-}
   return text;
 }
 
@@ -205,6 +205,7 @@ TEST(CommandLine, TheExamplesOfTheHelpRun) {
                       TALLOWMERE_CLI});
   EXPECT_EQ(shell.ReadErrorsToEnd(), "");
   EXPECT_EQ(shell.Wait(), 0);
+}
 
 }  // namespace
 }  // namespace tallowmere::test

@@ -161,11 +161,36 @@ TEST_F(Conversion, TheLastLineMayLackItsEnd) {
   EXPECT_EQ(Cli({"name", "-"}, "").text, "");
 }
 
-TEST_F(Conversion, WithNullAnItemMayHoldANewline) {
+TEST_F(Conversion, NullEndsTheItemsAndNullOutputTheResults) {
   const std::string file = mFolder.MakeFile("x\ny");
-  const Output output = Cli({"name", "--null", "-"}, file + '\0' + mFile + '\0');
-  EXPECT_EQ(output.text, std::string("x\ny\0a/b\0", 8));
-  EXPECT_EQ(output.status, 0);
+  const std::string items = file + '\0' + mFile + '\0';
+  EXPECT_EQ(Cli({"name", "-0", "--null-output", "-"}, items).text, std::string("x\ny\0a/b\0", 8));
+  EXPECT_EQ(Cli({"name", "--null", "-"}, mFile + '\0' + mFile + '\0').text, "a/b\na/b\n");
+  EXPECT_EQ(Cli({"name", "--null-output", "-"}, mFile + "\n").text, std::string("a/b\0", 4));
+}
+
+TEST_F(Conversion, JsonIsOneObjectALineWhateverEndsItemsAndResults) {
+  const std::string items = mFile + '\0' + mHere + '\0';
+  for (const char* const command : {"name", "spec", "hfs", "identify"}) {
+    const Output output = Cli({command, "-0", "--null-output", "--json", "-"}, items);
+    const auto lines = Lines(output.text);
+    ASSERT_EQ(lines.size(), 2u) << command;
+    EXPECT_EQ(json::parse(lines[0])["path"], mFile) << command;
+    EXPECT_EQ(output.text.find('\0'), std::string::npos) << command;
+  }
+}
+
+// Two lines for one item would be taken for two items.
+TEST_F(Conversion, AnAnswerWithANewlineIsRefusedUnlessItsEndCanBeTold) {
+  const std::string file = mFolder.MakeFile("x\ny");
+  const Output lines = Cli({"name", file, mFile});
+  EXPECT_EQ(lines.text, "\na/b\n");
+  EXPECT_THAT(lines.errors, testing::EndsWith("/x\\012y: the answer has a newline; --json or "
+                                              "--null-output prints it\n"));
+  EXPECT_EQ(lines.status, 1);
+  EXPECT_EQ(json::parse(Cli({"name", "--json", file}).text)["name"], "x\ny");
+  EXPECT_EQ(Cli({"name", "--null-output", file}).text, std::string("x\ny\0", 4));
+  EXPECT_EQ(Cli({"spec", "--hex", file}).status, 0);
 }
 
 TEST_F(Conversion, ALineIsAnsweredBeforeTheNextOneIsThere) {
@@ -299,6 +324,7 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
             prefix + std::string(256, 'x') + ": no item can have this name\n");
   EXPECT_EQ(errorsOf({"name", ""}), prefix + ": an empty text names nothing\n");
   EXPECT_EQ(errorsOf({"identify", ""}), prefix + ": an empty text names nothing\n");
+}
 
 // So that paste(1) can put items and answers beside each other.
 TEST_F(Conversion, AnItemThatFailsIsAnEmptyLineInItsPlace) {
@@ -436,6 +462,18 @@ TEST_F(Conversion, SettingsOfASoundAreStoredAsTheyAre) {
             "tallowmere-cli: /dev/full: it could not be written\n");
 }
 
+// Ignored, the signal of the limit leaves the write to fail as on a full disk.
+TEST_F(Conversion, SettingsThatCannotBeStoredLeaveNoFile) {
+  const std::string path = mFolder.Path() / "settings";
+  ChildProgram cli("/bin/sh", {"-c", "trap '' XFSZ; ulimit -f 0; exec \"$0\" aiff --output \"$1\"",
+                               TALLOWMERE_CLI, path});
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + path + ": it could not be written\n");
+  EXPECT_EQ(cli.Wait(), 1);
+  EXPECT_FALSE(std::filesystem::exists(path));
+  EXPECT_EQ(Cli({"aiff", "--format", "mp3 ", "--output", path}).status, 1);
+  EXPECT_FALSE(std::filesystem::exists(path));
+}
+
 TEST_F(Conversion, AServiceThatWorksPassesTheCheckAndAnotherDoesNot) {
   const Output good = Cli({"serve-check"});
   EXPECT_EQ(good.status, 0);
@@ -462,15 +500,3 @@ TEST_F(Conversion, EachCommandHasHelpWithExamples) {
 
 }  // namespace
 }  // namespace tallowmere::test
-// Ignored, the signal of the limit leaves the write to fail as on a full disk.
-TEST_F(Conversion, SettingsThatCannotBeStoredLeaveNoFile) {
-  const std::string path = mFolder.Path() / "settings";
-  ChildProgram cli("/bin/sh", {"-c", "trap '' XFSZ; ulimit -f 0; exec \"$0\" aiff --output \"$1\"",
-                               TALLOWMERE_CLI, path});
-  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + path + ": it could not be written\n");
-  EXPECT_EQ(cli.Wait(), 1);
-  EXPECT_FALSE(std::filesystem::exists(path));
-  EXPECT_EQ(Cli({"aiff", "--format", "mp3 ", "--output", path}).status, 1);
-  EXPECT_FALSE(std::filesystem::exists(path));
-}
-
