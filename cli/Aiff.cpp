@@ -10,6 +10,7 @@
 
 #include "cli/AtomText.h"
 #include "cli/Commands.h"
+#include "cli/Finding.h"
 #include "cli/Output.h"
 #include "cli/Records.h"
 

@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "cli/Report.h"
+#include "cli/Format.h"
 
 namespace tallowmere::cli {
 

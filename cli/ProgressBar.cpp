@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <iostream>
+#include <string>
 
 #include "cli/Output.h"
 
@@ -52,7 +53,7 @@ ProgressBar::ProgressBar(bool isWanted)
     : mIsWanted(isWanted && IsAbleTerminal(STDERR_FILENO)),
       mNext(std::chrono::steady_clock::now() + kFirstPause) {}
 
-void ProgressBar::Show(std::optional<double> done, const std::string& text) {
+void ProgressBar::Show(std::optional<double> done, std::uint64_t items) {
   if (!mIsWanted) return;
   const auto now = std::chrono::steady_clock::now();
   if (now < mNext) return;
@@ -60,6 +61,7 @@ void ProgressBar::Show(std::optional<double> done, const std::string& text) {
   if (IsTakenByAPager()) return;
   mIsShown = true;
   const std::size_t room = Room();
+  const std::string text = std::to_string(items) + " items";
   const std::string bar = done ? BarOf(*done, room - std::min(room, text.size())) : "";
   std::cerr << kStartAgain << bar << text.substr(0, room - std::min(room, bar.size()))
             << std::flush;

@@ -3,8 +3,8 @@
 #pragma once
 
 #include <chrono>
+#include <cstdint>
 #include <optional>
-#include <string>
 
 namespace tallowmere::cli {
 
@@ -15,9 +15,9 @@ class ProgressBar {
   ProgressBar& operator=(const ProgressBar&) = delete;
   ~ProgressBar() { Hide(); }
 
-  // Draws the part that is done, 0 to 1, if known, followed by a text, at most a few times a
-  // second. Draws nothing in the first half second: short work needs no bar.
-  void Show(std::optional<double> done, const std::string& text);
+  // Draws the part that is done, 0 to 1, if known, followed by the number of items, at most a few
+  // times a second. Draws nothing in the first half second: short work needs no bar.
+  void Show(std::optional<double> done, std::uint64_t items);
 
   // Removes the bar until it is next shown, to make way for a line of output.
   void Hide();

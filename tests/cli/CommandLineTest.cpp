@@ -68,7 +68,8 @@ TEST(CommandLine, IdentifyGoesOnBehindAPathWithoutARecord) {
   const std::string missing = folder.Path() / "missing/file";
   ChildProgram cli(TALLOWMERE_CLI, {"identify", missing, folder.Path()});
   EXPECT_THAT(cli.ReadToEnd(), HasSubstr("  " + folder.Path().string() + "\n"));
-  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + missing + ": there is no such folder\n");
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + missing + ": there is no folder \"" +
+                                       folder.Path().string() + "/missing\"\n");
   EXPECT_EQ(cli.Wait(), 1);
 }
 

@@ -44,8 +44,8 @@ class Terminal : public testing::Test {
 
 TEST_F(Terminal, HeadsAreBoldAndComplaintsAreRed) {
   EXPECT_THAT(OnATerminal("$CLI volumes"), HasSubstr("\x1B[1mvRefNum  name"));
-  EXPECT_THAT(OnATerminal("$CLI name /nonexistent"),
-              HasSubstr("\x1B[31mtallowmere-cli:\x1B[0m /nonexistent: "));
+  EXPECT_THAT(OnATerminal("$CLI name /nonexistent/x"),
+              HasSubstr("\x1B[31mtallowmere-cli:\x1B[0m /nonexistent/x: "));
 }
 
 TEST_F(Terminal, ColoursCanBeRefused) {
@@ -69,7 +69,7 @@ TEST_F(Terminal, ControlCharactersOfAPathAreShownAndNotSent) {
 
 TEST_F(Terminal, AComplaintTakesTheProgressBarAway) {
   const std::string output =
-      OnATerminal("(echo /; sleep 1; echo /; echo /nonexistent) | $CLI name - >/dev/null");
+      OnATerminal("(echo /; sleep 1; echo /; echo /nonexistent/x) | $CLI name - >/dev/null");
   EXPECT_THAT(output, HasSubstr(" items"));
   EXPECT_THAT(output, HasSubstr("\r\x1B[K\x1B[31mtallowmere-cli:"));
   EXPECT_THAT(OnATerminal("export TERM=dumb; (echo /; sleep 1; echo /) | $CLI name - >/dev/null"),

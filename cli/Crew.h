@@ -1,0 +1,128 @@
+// Work by several threads at a time, handed over in the order in which it was given.
+//
+// A second thread and further ones begin when there is more work than a first few pieces.
+#pragma once
+
+#include <condition_variable>
+#include <cstddef>
+#include <deque>
+#include <exception>
+#include <functional>
+#include <memory>
+#include <mutex>
+#include <thread>
+#include <utility>
+#include <vector>
+
+namespace tallowmere::cli {
+
+template <class Piece>
+class Crew {
+ public:
+  using Work = std::function<void(Piece&)>;
+
+  // `hire` returns what one thread does with each of its pieces; at most `most` threads work, which
+  // is asked once, when there is work for two.
+  // `handOver` gets each piece that has been worked on, in Give or Finish.
+  Crew(std::function<std::size_t()> most, std::function<Work()> hire,
+       std::function<void(Piece&)> handOver)
+      : mAskForMost(std::move(most)), mHire(std::move(hire)), mHandOver(std::move(handOver)) {}
+  Crew(const Crew&) = delete;
+  Crew& operator=(const Crew&) = delete;
+  // Waits for the pieces that are being worked on; those behind them are dropped.
+  ~Crew() {
+    {
+      const std::lock_guard lock(mMutex);
+      mIsOver = true;
+    }
+    mWorkIsThere.notify_all();
+    for (std::thread& thread : mThreads) thread.join();
+  }
+
+  // Returns when at most two pieces for each thread wait to be handed over. Throws what the work on
+  // an earlier piece has thrown.
+  void Give(Piece piece) {
+    if (mGiven++ == kPiecesForOne) mMost = mAskForMost();
+    if (mGiven > mThreads.size() * kPiecesForOne && mThreads.size() < mMost) Hire();
+    {
+      const std::lock_guard lock(mMutex);
+      mTasks.push_back(std::make_unique<Task>(std::move(piece)));
+      mWaiting.push_back(mTasks.back().get());
+    }
+    mWorkIsThere.notify_one();
+    while (!mTasks.empty() && (mTasks.size() > 2 * mThreads.size() || IsFirstDone())) {
+      HandOverFirst();
+    }
+  }
+
+  // Returns when all pieces have been handed over.
+  void Finish() {
+    while (!mTasks.empty()) HandOverFirst();
+  }
+
+ private:
+  // Before another thread begins.
+  static constexpr std::size_t kPiecesForOne = 2;
+
+  struct Task {
+    explicit Task(Piece aPiece) : piece(std::move(aPiece)) {}
+
+    Piece piece;
+    bool isDone = false;
+    std::exception_ptr fault;
+  };
+
+  void Hire() {
+    mThreads.emplace_back([this, work = mHire()] { Run(work); });
+  }
+
+  void Run(const Work& work) {
+    std::unique_lock lock(mMutex);
+    while (true) {
+      mWorkIsThere.wait(lock, [this] { return mIsOver || !mWaiting.empty(); });
+      if (mIsOver) return;
+      Task& task = *mWaiting.front();
+      mWaiting.pop_front();
+      lock.unlock();
+      try {
+        work(task.piece);
+      } catch (...) {
+        task.fault = std::current_exception();
+      }
+      lock.lock();
+      task.isDone = true;
+      mSomeIsDone.notify_one();
+    }
+  }
+
+  bool IsFirstDone() {
+    const std::lock_guard lock(mMutex);
+    return mTasks.front()->isDone;
+  }
+
+  void HandOverFirst() {
+    {
+      std::unique_lock lock(mMutex);
+      mSomeIsDone.wait(lock, [this] { return mTasks.front()->isDone; });
+    }
+    const std::unique_ptr<Task> first = std::move(mTasks.front());
+    mTasks.pop_front();
+    if (first->fault) std::rethrow_exception(first->fault);
+    mHandOver(first->piece);
+  }
+
+  std::function<std::size_t()> mAskForMost;
+  std::size_t mMost = 1;
+  std::function<Work()> mHire;
+  std::function<void(Piece&)> mHandOver;
+  std::size_t mGiven = 0;
+  std::vector<std::thread> mThreads;
+  std::deque<std::unique_ptr<Task>> mTasks;  // not handed over yet
+  std::mutex mMutex;
+  std::condition_variable mWorkIsThere;
+  std::condition_variable mSomeIsDone;
+  std::deque<Task*> mWaiting;  // not begun yet
+  bool mIsOver = false;
+};
+
+}  // namespace tallowmere::cli
