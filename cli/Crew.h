@@ -1,6 +1,6 @@
 // Work by several threads at a time, handed over in the order in which it was given.
 //
-// A second thread and further ones begin when there is more work than a first few pieces.
+// A further thread begins when more work waits than those that there are begin soon.
 #pragma once
 
 #include <condition_variable>
@@ -22,7 +22,7 @@ class Crew {
   using Work = std::function<void(Piece&)>;
 
   // `hire` returns what one thread does with each of its pieces; at most `most` threads work, which
-  // is asked once, when there is work for two.
+  // is asked once, when there is work for a second one.
   // `handOver` gets each piece that has been worked on, in Give or Finish.
   Crew(std::function<std::size_t()> most, std::function<Work()> hire,
        std::function<void(Piece&)> handOver)
@@ -42,15 +42,14 @@ class Crew {
   // Returns when at most two pieces for each thread wait to be handed over. Throws what the work on
   // an earlier piece has thrown.
   void Give(Piece piece) {
-    if (mGiven++ == kPiecesForOne) mMost = mAskForMost();
-    if (mGiven > mThreads.size() * kPiecesForOne && mThreads.size() < mMost) Hire();
+    if (mThreads.empty() || (mTasks.size() >= kPiecesForOne * mThreads.size() && MayHire())) Hire();
     {
       const std::lock_guard lock(mMutex);
       mTasks.push_back(std::make_unique<Task>(std::move(piece)));
       mWaiting.push_back(mTasks.back().get());
     }
     mWorkIsThere.notify_one();
-    while (!mTasks.empty() && (mTasks.size() > 2 * mThreads.size() || IsFirstDone())) {
+    while (!mTasks.empty() && (mTasks.size() > kPiecesForOne * mThreads.size() || IsFirstDone())) {
       HandOverFirst();
     }
   }
@@ -61,7 +60,7 @@ class Crew {
   }
 
  private:
-  // Before another thread begins.
+  // One that is worked on, and one to go on with.
   static constexpr std::size_t kPiecesForOne = 2;
 
   struct Task {
@@ -71,6 +70,11 @@ class Crew {
     bool isDone = false;
     std::exception_ptr fault;
   };
+
+  bool MayHire() {
+    if (mMost == 0) mMost = mAskForMost();
+    return mThreads.size() < mMost;
+  }
 
   void Hire() {
     mThreads.emplace_back([this, work = mHire()] { Run(work); });
@@ -112,10 +116,9 @@ class Crew {
   }
 
   std::function<std::size_t()> mAskForMost;
-  std::size_t mMost = 1;
+  std::size_t mMost = 0;  // 0: not asked yet
   std::function<Work()> mHire;
   std::function<void(Piece&)> mHandOver;
-  std::size_t mGiven = 0;
   std::vector<std::thread> mThreads;
   std::deque<std::unique_ptr<Task>> mTasks;  // not handed over yet
   std::mutex mMutex;

@@ -155,7 +155,7 @@ class CommandLine {
                       "Items of standard input end with a NUL, not a newline");
     command->add_flag("--null-output", format.hasNullOutput,
                       "Results end with a NUL, not a newline; JSON is lines all the same");
-    command->add_flag("--existing", format.isExistingOnly, "A new item has no answer");
+    command->add_flag("--existing", format.isExistingOnly, "Fail for what does not exist");
     AddQuiet(command);
     return command;
   }

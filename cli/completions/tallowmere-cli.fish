@@ -26,6 +26,7 @@ complete -c tallowmere-cli -n '__fish_seen_subcommand_from help' -f -a "$command
 set -l with_items '__fish_seen_subcommand_from identify spec path hfs posix name append'
 complete -c tallowmere-cli -n $with_items -s 0 -l null -d 'Items end with a NUL'
 complete -c tallowmere-cli -n $with_items -l null-output -d 'Results end with a NUL'
+complete -c tallowmere-cli -n $with_items -l existing -d 'Fail for what is new'
 for condition in $with_items '__fish_seen_subcommand_from census'
     complete -c tallowmere-cli -n $condition -s q -l quiet -d 'Neither a progress bar nor a summary'
     complete -c tallowmere-cli -n $condition -l no-progress -d 'No progress bar'

@@ -10,6 +10,7 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstring>
 #include <iomanip>
 #include <sstream>
@@ -416,19 +417,27 @@ TEST(Census, IsStatus1WhereSomeItemsComeBackAndOthersDoNot) {
 TEST(Census, TellsWhatDidNotComeBackInTheOrderOfTheWalk) {
   const TemporaryFolder folder;
   const std::string asked = folder.MakeFolder("asked");
-  for (int i = 0; i < 5000; ++i) folder.MakeFile("asked/" + std::to_string(i));
+  for (int i = 0; i < 3000; ++i) folder.MakeFile("asked/" + std::to_string(i));
   std::string lost;
-  std::vector<Exchange> exchanges{RecordIn(asked), PathIs(asked, "back")};
-  ChildProgram find("find", {asked, "-mindepth", "1"});
+  std::vector<Exchange> exchanges{RecordIn(asked)};
+  ChildProgram find("find", {asked});
   std::istringstream items(find.ReadToEnd());
   for (std::string item; std::getline(items, item);) {
-    lost += item + ": has no record\n";
-    exchanges.push_back(NoRecordOf(item));
+    const std::string number = std::to_string(exchanges.size());
+    if (number.ends_with("00")) {
+      lost += item + ": has no record\n";
+      exchanges.push_back(NoRecordOf(item));
+    } else {
+      exchanges.push_back(RecordOf(item, number));
+      exchanges.push_back(PathIs(item, number));
+    }
   }
-  exchanges.push_back(RecordOf(asked, "back"));
+  ASSERT_NE(lost, "");
+  const auto count = std::count(lost.begin(), lost.end(), '\n');
   const CensusResult result = CensusOf(asked, {"--service", Impostor(folder, exchanges)});
-  EXPECT_EQ(result.text,
-            lost + "5001 items, 1 came back, 5000 did not, 0 vanished meanwhile, 0 left out\n");
+  EXPECT_EQ(result.text, lost + "3001 items, " + std::to_string(3001 - count) + " came back, " +
+                             std::to_string(count) +
+                             " did not, 0 vanished meanwhile, 0 left out\n");
 }
 
 TEST(Census, AnItemComesBackUnderItsOtherName) {

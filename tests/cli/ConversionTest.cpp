@@ -210,8 +210,6 @@ std::size_t ServicesFor(const TemporaryFolder& folder, int items) {
 
 TEST_F(Conversion, ManyItemsAreAnsweredByAServiceForEachCoreInTheirOrder) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
-  // Nothing but "/", so that no folder is shown at two mount points.
-  const std::string service = CountedService(mFolder);
   if (!cli::AllAnswerAlike(ReadFile("/proc/self/mountinfo")))
     GTEST_SKIP() << "a folder is shown twice here";
   const std::size_t cores = std::thread::hardware_concurrency();

@@ -46,6 +46,21 @@ TEST(Crew, WorksWithAsManyThreadsAsItMayForMuchWorkAndWithOneForLittle) {
   }
 }
 
+TEST(Crew, WorksWithOneThreadWhereEachPieceIsWaitedFor) {
+  std::size_t hired = 0;
+  Crew<int> crew([] { return std::size_t{4}; },
+                 [&hired] {
+                   ++hired;
+                   return [](int&) {};
+                 },
+                 [](int) {});
+  for (int i = 0; i < 20; ++i) {
+    crew.Give(i);
+    crew.Finish();
+  }
+  EXPECT_EQ(hired, 1u);
+}
+
 TEST(Crew, ThrowsWhatItsWorkHasThrownInItsTurn) {
   std::vector<int> done;
   Crew<int> crew([] { return std::size_t{2}; },
