@@ -8,10 +8,10 @@
 #include <unistd.h>
 
 #include <nlohmann/json.hpp>
+#include <set>
 #include <sstream>
 #include <thread>
 
-#include "cli/Services.h"
 #include "support/ChildProgram.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
@@ -208,10 +208,22 @@ std::size_t ServicesFor(const TemporaryFolder& folder, int items) {
   return std::filesystem::file_size(started);
 }
 
+bool EachFileSystemIsMountedOnce() {
+  std::set<std::string> devices;
+  std::istringstream lines(ReadFile("/proc/self/mountinfo"));
+  for (std::string line; std::getline(lines, line);) {
+    std::istringstream fields(line);
+    std::string id;
+    std::string parent;
+    std::string device;
+    fields >> id >> parent >> device;
+    if (!devices.insert(device).second) return false;
+  }
+  return true;
+}
+
 TEST_F(Conversion, ManyItemsAreAnsweredByAServiceForEachCoreInTheirOrder) {
-  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
-  if (!cli::AllAnswerAlike(ReadFile("/proc/self/mountinfo")))
-    GTEST_SKIP() << "a folder is shown twice here";
+  if (!EachFileSystemIsMountedOnce()) GTEST_SKIP() << "one service answers all here";
   const std::size_t cores = std::thread::hardware_concurrency();
   EXPECT_EQ(ServicesFor(mFolder, 2), 1u);
   EXPECT_EQ(ServicesFor(mFolder, 20'000), cores);
