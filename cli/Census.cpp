@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "cli/Commands.h"
+#include "cli/Conversion.h"
 #include "cli/Crew.h"
 #include "cli/Finding.h"
 #include "cli/Output.h"
@@ -60,6 +61,9 @@ constexpr std::size_t kMostEntries = 1024;
 class Checker {
  public:
   explicit Checker(const ClientOptions& options) : mRecords(options), mPaths(options) {}
+
+  // Whether both services can be asked.
+  bool Answers() { return !WhyItDoesNotAnswer(mRecords) && !WhyItDoesNotAnswer(mPaths); }
 
   void Check(Piece& piece) {
     mFailure.reset();
@@ -144,10 +148,10 @@ class Census {
         mBar(format.HasProgress()),
         mCrew(
             MostServices,
-            [options] {
-              return [checker = std::make_shared<Checker>(options)](Piece& piece) {
-                checker->Check(piece);
-              };
+            [this, options]() -> Crew<Piece>::Work {
+              const auto checker = std::make_shared<Checker>(options);
+              if (std::exchange(mHasOne, true) && !checker->Answers()) return nullptr;
+              return [checker](Piece& piece) { checker->Check(piece); };
             },
             [this](const Piece& piece) { Count(piece); }) {}
 
@@ -233,6 +237,7 @@ class Census {
   std::uint64_t mMissing = 0;   // of those
   std::uint64_t mVanished = 0;  // of those
   std::uint64_t mLeftOut = 0;
+  bool mHasOne = false;  // checker
   Piece mPiece;
   Crew<Piece> mCrew;  // the last, as its work ends first
 };

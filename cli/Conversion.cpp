@@ -45,7 +45,11 @@ int Convert(const ItemsToAsk& toAsk, const Ask& ask) {
   if (const auto error = WhyItDoesNotAnswer(*first)) return Complain(*error);
 
   const auto hire = [&]() -> Crew<Piece>::Work {
-    auto client = first ? std::exchange(first, nullptr) : std::make_shared<Client>(toAsk.client);
+    auto client = std::exchange(first, nullptr);
+    if (!client) {
+      client = std::make_shared<Client>(toAsk.client);
+      if (WhyItDoesNotAnswer(*client)) return nullptr;
+    }
     return [&ask, client](Piece& piece) { Work(*client, ask, piece); };
   };
   Crew<Piece> crew(MostServices, hire, [&report](Piece& piece) {

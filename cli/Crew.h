@@ -10,6 +10,7 @@
 #include <functional>
 #include <memory>
 #include <mutex>
+#include <system_error>
 #include <thread>
 #include <utility>
 #include <vector>
@@ -21,9 +22,10 @@ class Crew {
  public:
   using Work = std::function<void(Piece&)>;
 
-  // `hire` returns what one thread does with each of its pieces; at most `most` threads work, which
-  // is asked once, when there is work for a second one.
-  // `handOver` gets each piece that has been worked on, in Give or Finish.
+  // `hire` returns what one thread does with each of its pieces, or, but not the first time,
+  // nothing when there can be no further one. At most `most` threads work, which is asked once,
+  // when there is work for a second one. `handOver` gets each piece that has been worked on, in
+  // Give or Finish.
   Crew(std::function<std::size_t()> most, std::function<Work()> hire,
        std::function<void(Piece&)> handOver)
       : mAskForMost(std::move(most)), mHire(std::move(hire)), mHandOver(std::move(handOver)) {}
@@ -76,8 +78,17 @@ class Crew {
     return mThreads.size() < mMost;
   }
 
+  // Goes on with the threads that there are where the system gives no more.
   void Hire() {
-    mThreads.emplace_back([this, work = mHire()] { Run(work); });
+    try {
+      if (const Work work = mHire()) {
+        mThreads.emplace_back([this, work] { Run(work); });
+        return;
+      }
+    } catch (const std::system_error&) {
+      if (mThreads.empty()) throw;
+    }
+    mMost = mThreads.size();
   }
 
   void Run(const Work& work) {

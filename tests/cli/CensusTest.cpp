@@ -10,7 +10,6 @@
 #include <sys/un.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <cstring>
 #include <iomanip>
 #include <sstream>
@@ -422,8 +421,9 @@ TEST(Census, TellsWhatDidNotComeBackInTheOrderOfTheWalk) {
   std::vector<Exchange> exchanges{RecordIn(asked)};
   ChildProgram find("find", {asked});
   std::istringstream items(find.ReadToEnd());
+  int count = 0;
   for (std::string item; std::getline(items, item);) {
-    const std::string number = std::to_string(exchanges.size());
+    const std::string number = std::to_string(++count);
     if (number.ends_with("00")) {
       lost += item + ": has no record\n";
       exchanges.push_back(NoRecordOf(item));
@@ -432,12 +432,9 @@ TEST(Census, TellsWhatDidNotComeBackInTheOrderOfTheWalk) {
       exchanges.push_back(PathIs(item, number));
     }
   }
-  ASSERT_NE(lost, "");
-  const auto count = std::count(lost.begin(), lost.end(), '\n');
   const CensusResult result = CensusOf(asked, {"--service", Impostor(folder, exchanges)});
-  EXPECT_EQ(result.text, lost + "3001 items, " + std::to_string(3001 - count) + " came back, " +
-                             std::to_string(count) +
-                             " did not, 0 vanished meanwhile, 0 left out\n");
+  EXPECT_EQ(result.text,
+            lost + "3001 items, 2971 came back, 30 did not, 0 vanished meanwhile, 0 left out\n");
 }
 
 TEST(Census, AnItemComesBackUnderItsOtherName) {

@@ -229,6 +229,23 @@ TEST_F(Conversion, ManyItemsAreAnsweredByAServiceForEachCoreInTheirOrder) {
   EXPECT_EQ(ServicesFor(mFolder, 20'000), cores);
 }
 
+TEST_F(Conversion, OneServiceAnswersAllWhereASecondDoesNotStart) {
+  if (!EachFileSystemIsMountedOnce()) GTEST_SKIP() << "one service answers all here";
+  const std::string started = mFolder.Path() / "started";
+  const std::string service = mFolder.MakeFile(
+      "only", "#!/bin/sh\nmkdir '" + started + "' || exit\nexec " TALLOWMERE_SERVICE " \"$@\"\n");
+  chmod(service.c_str(), 0755);
+  std::string input;
+  std::string expected;
+  for (int i = 0; i < 20'000; ++i) {
+    input += "/" + std::to_string(i) + "\n";
+    expected += std::to_string(i) + "\n";
+  }
+  const Output output = Cli({"--service", service, "name", "--quiet", "-"}, input);
+  EXPECT_EQ(output.text, expected);
+  EXPECT_THAT(output.errors, HasSubstr("File exists"));  // said by the second, which was tried
+}
+
 // Each service may give either path of an item.
 TEST_F(Conversion, WhereAFolderIsShownTwiceOneServiceAnswersAll) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";

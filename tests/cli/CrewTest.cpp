@@ -61,6 +61,21 @@ TEST(Crew, WorksWithOneThreadWhereEachPieceIsWaitedFor) {
   EXPECT_EQ(hired, 1u);
 }
 
+TEST(Crew, GoesOnWithTheThreadsThatItCanGet) {
+  std::size_t asked = 0;
+  std::vector<int> done;
+  Crew<int> crew([] { return std::size_t{4}; },
+                 [&asked]() -> Crew<int>::Work {
+                   if (asked++ > 0) return nullptr;
+                   return [](int&) { std::this_thread::sleep_for(std::chrono::milliseconds(1)); };
+                 },
+                 [&done](int number) { done.push_back(number); });
+  for (int i = 0; i < 10; ++i) crew.Give(i);
+  crew.Finish();
+  EXPECT_EQ(done.size(), 10u);
+  EXPECT_EQ(asked, 2u);
+}
+
 TEST(Crew, ThrowsWhatItsWorkHasThrownInItsTurn) {
   std::vector<int> done;
   Crew<int> crew([] { return std::size_t{2}; },
