@@ -2,6 +2,7 @@
 
 #include <cerrno>
 #include <cmath>
+#include <filesystem>
 #include <fstream>
 #include <iostream>
 #include <limits>
@@ -9,6 +10,7 @@
 
 #include "cli/AtomText.h"
 #include "cli/Commands.h"
+#include "cli/Finding.h"
 #include "cli/Output.h"
 #include "cli/Records.h"
 
@@ -36,12 +38,14 @@ void PrintAsJson(const Sound& sound, std::string_view settings) {
   std::cout << json.dump() << '\n';
 }
 
+// What is stored in part is removed, unless it is a device or the like.
 int Store(const std::string& bytes, const std::string& path) {
   std::ofstream file(path, std::ios::binary);
   if (!file) return Complain(path + ": " + std::generic_category().message(errno));
-  return file.write(bytes.data(), static_cast<std::streamsize>(bytes.size())).flush()
-             ? 0
-             : Complain(path + ": it could not be written");
+  if (file.write(bytes.data(), static_cast<std::streamsize>(bytes.size())).flush()) return 0;
+  std::error_code none;
+  if (std::filesystem::is_regular_file(path, none)) std::filesystem::remove(path, none);
+  return Complain(path + ": it could not be written");
 }
 
 }  // namespace

@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "cli/Report.h"
+#include "cli/Format.h"
 
 namespace tallowmere::cli {
 
@@ -65,7 +65,7 @@ int PrintExportSettings(const ClientOptions& options, const Sound& sound, bool i
 // Asks one service for the record of every item in a folder, and another for the path of every
 // record. Prints each item that does not come back, each folder that is left out, and the totals.
 // Returns 1 when an item did not come back; items that vanish meanwhile do not count.
-int TakeCensus(const ClientOptions& options, bool isJson, const std::string& folder);
+int TakeCensus(const ClientOptions& options, const Format& format, const std::string& folder);
 
 // Starts the service and tries each request on the volume of "/", stopping at the first that fails.
 int CheckService(const ClientOptions& options, bool isJson);

@@ -1,9 +1,7 @@
-#include <memory>
+#include <utility>
 
 #include "cli/Commands.h"
 #include "cli/Conversion.h"
-#include "cli/Paths.h"
-#include "cli/Reasons.h"
 #include "cli/Records.h"
 
 namespace tallowmere::cli {
@@ -15,108 +13,101 @@ constexpr const char* kNoRecord =
     "hexadecimal digits";
 constexpr const char* kNotMacRoman = "it has a character that HFS names cannot have";
 
-// The usual handler: reports the answer, or why there is none.
-template <class Value>
-std::function<void(Result<std::optional<Value>>)> Tell(const std::string& item, Report& report,
-                                                       std::function<void(const Value&)> answer,
-                                                       std::function<std::string()> whyNone) {
-  return [item, &report, answer = std::move(answer),
-          whyNone = std::move(whyNone)](const Result<std::optional<Value>>& result) {
-    if (!result) return report.Fail(item, result.Failure().message);
-    if (!*result) return report.Fail(item, whyNone());
-    answer(**result);
+// The handler that writes down what `answer` makes of the conversion's value, or why there is none.
+template <class Value, class Answer>
+auto Tell(const Findings& findings, const std::string& item, Finding& finding, Answer answer) {
+  return [&findings, &item, &finding, answer](const Conversion<Value>& result) {
+    finding = result ? answer(findings, item, *result) : findings.Failure(item, result.Failure());
   };
 }
 
 // The handler for answers that are paths.
-std::function<void(Result<std::optional<std::string>>)> TellPath(
-    const std::string& item, Report& report, std::function<std::string()> whyNone) {
+auto TellPath(const Findings& findings, const std::string& item, Finding& finding) {
   return Tell<std::string>(
-      item, report,
-      [item, &report](const std::string& path) {
-        report.Answer(item, path, [&](Json& json) { Put(json, kPathKey, path); });
-      },
-      std::move(whyNone));
+      findings, item, finding, [](const auto& all, const auto& asked, const auto& path) {
+        return all.Answer(asked, path.outcome, path.value,
+                          [&](Json& json) { Put(json, kPathKey, path.value); });
+      });
+}
+
+// The handler for answers that are HFS names or HFS paths; `key` is theirs in JSON.
+auto TellHFSText(const Findings& findings, const std::string& item, Finding& finding,
+                 const char* key) {
+  return Tell<std::string>(
+      findings, item, finding, [key](const auto& all, const auto& asked, const auto& hfs) {
+        const std::string text = Utf8OfHFSName(hfs.value);
+        return all.Answer(asked, hfs.outcome, text, [&](Json& json) { json[key] = text; });
+      });
+}
+
+Finding Invalid(const Findings& findings, const std::string& item, const char* reason) {
+  return findings.Failure(item, {Outcome::kInvalid, reason});
 }
 
 }  // namespace
 
 int PrintRecords(const ItemsToAsk& items, bool asHex) {
-  return Convert(items, kPathKey, [=](Batch& batch, const std::string& item, Report& report) {
-    const std::string path = AbsolutePath(item);
-    batch.Add(request::GetFSSpec(path),
-              Tell<FSSpec>(
-                  item, report,
-                  [=, &report](const FSSpec& spec) {
-                    const auto text = asHex ? HexOfRecord(spec) : TextOfRecord(spec);
-                    report.Answer(item, text, [&](Json& json) { Put(json, spec); });
-                  },
-                  [path] { return WhyNoRecord(path); }));
+  const Findings findings(items.format, kPathKey);
+  return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
+    converter.RecordOf(
+        item,
+        Tell<FSSpec>(findings, item, finding,
+                     [asHex](const auto& all, const auto& asked, const Converted<FSSpec>& record) {
+                       const FSSpec& spec = record.value;
+                       return all.Answer(asked, record.outcome,
+                                         asHex ? HexOfRecord(spec) : TextOfFSSpec(spec),
+                                         [&](Json& json) { Put(json, spec); });
+                     }));
   });
 }
 
 int PrintPathsOfRecords(const ItemsToAsk& items, bool searchOtherVolumes) {
-  Client explaining(items.client);
-  return Convert(items, "record", [&](Batch& batch, const std::string& item, Report& report) {
+  const Findings findings(items.format, "record");
+  return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
     const auto spec = ReadRecord(item);
     if (!spec) {
-      return Refuse(batch, item, kNoRecord, report);
+      finding = Invalid(findings, item, kNoRecord);
+    } else {
+      converter.PathOf(*spec, searchOtherVolumes, TellPath(findings, item, finding));
     }
-    batch.Add(request::SetFileRefFromFSSpec(*spec, searchOtherVolumes),
-              TellPath(item, report, [&, spec] { return WhyNoPath(explaining, *spec); }));
   });
 }
 
 int PrintHFSPaths(const ItemsToAsk& items) {
-  return Convert(items, kPathKey, [](Batch& batch, const std::string& item, Report& report) {
-    const std::string path = AbsolutePath(item);
-    const auto folders = std::make_shared<Result<std::string>>(std::string());
-    batch.Add(request::MakeFullPath(path),
-              [folders](Result<std::string> result) { *folders = std::move(result); });
-    batch.Add(request::GetHFSName(path),
-              Tell<std::string>(
-                  item, report,
-                  [=, &report](const std::string& name) {
-                    if (!*folders) return report.Fail(item, folders->Failure().message);
-                    const auto text = Utf8OfHFSName(IsFolder(path) ? **folders : **folders + name);
-                    report.Answer(item, text, [&](Json& json) { json["hfs_path"] = text; });
-                  },
-                  [path] { return WhyNoName(path); }));
+  const Findings findings(items.format, kPathKey);
+  return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
+    converter.HFSPathOf(item, TellHFSText(findings, item, finding, "hfs_path"));
   });
 }
 
 int PrintPathsOfHFSPaths(const ItemsToAsk& items) {
-  Client explaining(items.client);
-  return Convert(items, "hfs_path", [&](Batch& batch, const std::string& item, Report& report) {
+  const Findings findings(items.format, "hfs_path");
+  return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
     const auto hfsPath = HFSNameOfUtf8(item);
-    if (!hfsPath) return Refuse(batch, item, kNotMacRoman, report);
-    batch.Add(request::MakeFileRefFromPath(*hfsPath),
-              TellPath(item, report, [&, hfsPath] { return WhyNoPath(explaining, *hfsPath); }));
+    if (!hfsPath) {
+      finding = Invalid(findings, item, kNotMacRoman);
+    } else {
+      converter.PathOfHFSPath(*hfsPath, TellPath(findings, item, finding));
+    }
   });
 }
 
 int PrintNames(const ItemsToAsk& items) {
-  return Convert(items, kPathKey, [](Batch& batch, const std::string& item, Report& report) {
-    const std::string path = AbsolutePath(item);
-    batch.Add(request::GetHFSName(path),
-              Tell<std::string>(
-                  item, report,
-                  [item, &report](const std::string& name) {
-                    const std::string text = Utf8OfHFSName(name);
-                    report.Answer(item, text, [&](Json& json) { json["name"] = text; });
-                  },
-                  [path] { return WhyNoName(path); }));
+  const Findings findings(items.format, kPathKey);
+  return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
+    converter.HFSNameOf(item, TellHFSText(findings, item, finding, "name"));
   });
 }
 
 int PrintPathsOfNames(const ItemsToAsk& items, const std::string& folder) {
-  const auto path = FolderAt(folder);
-  return Convert(items, "name", [&](Batch& batch, const std::string& item, Report& report) {
-    if (!path) return Refuse(batch, item, "there is no folder \"" + folder + '"', report);
+  const Findings findings(items.format, "name");
+  return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
     const auto name = HFSNameOfUtf8(item);
-    if (!name) return Refuse(batch, item, kNotMacRoman, report);
-    batch.Add(request::AddHFSName(*path, *name),
-              TellPath(item, report, [] { return "no item can have this name"; }));
+    if (!name) {
+      finding = Invalid(findings, item, kNotMacRoman);
+    } else {
+      converter.PathInFolder(folder, *name, TellPath(findings, item, finding));
+    }
   });
 }
 

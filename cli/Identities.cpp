@@ -4,9 +4,8 @@
 #include "cli/Conversion.h"
 #include "cli/Items.h"
 #include "cli/Output.h"
-#include "cli/Paths.h"
-#include "cli/Reasons.h"
 #include "cli/Records.h"
+#include "cli/Report.h"
 #include "cli/Table.h"
 #include "cli/Text.h"
 
@@ -15,27 +14,35 @@ namespace {
 
 struct Identity {
   FSSpec spec;
-  std::string hfsPath;
+  std::optional<std::string> hfsPath;
   std::optional<std::string> wayBack;  // the path that the record leads to
 };
 
-// Nullopt when the path has no record.
-Result<std::optional<Identity>> Identify(Client& client, const std::string& path) {
-  auto spec = client.GetFSSpec(path);
-  if (!spec) return spec.Failure();
-  if (!*spec) return std::optional<Identity>{};
-  auto folders = client.MakeFullPath(path);
-  if (!folders) return folders.Failure();
-  auto wayBack = client.SetFileRefFromFSSpec(**spec, false);
+// The answer, or nullopt where there is none for the item. An error when the service failed.
+Result<std::optional<std::string>> IfAny(Conversion<std::string> answer) {
+  if (answer) return std::optional((*std::move(answer)).value);
+  if (answer.Failure().outcome == Outcome::kServiceFailed) return answer.Failure();
+  return std::optional<std::string>();
+}
+
+Conversion<Identity> Identify(Client& client, const std::string& path) {
+  const auto record = client.RecordOf(path);
+  if (!record) return record.Failure();
+  auto hfsPath = IfAny(client.HFSPathOf(path));
+  if (!hfsPath) return hfsPath.Failure();
+  auto wayBack = IfAny(client.PathOf(record->value));
   if (!wayBack) return wayBack.Failure();
-  Identity identity{**std::move(spec), *std::move(folders), *std::move(wayBack)};
-  if (!IsFolder(path)) identity.hfsPath += identity.spec.name;
-  return std::optional(std::move(identity));
+  return Converted<Identity>{{record->value, *std::move(hfsPath), *std::move(wayBack)},
+                             record->outcome};
 }
 
 void Fill(Json& json, const Identity& identity) {
   Put(json, identity.spec);
-  json["hfs_path"] = Utf8OfHFSName(identity.hfsPath);
+  if (identity.hfsPath) {
+    json["hfs_path"] = Utf8OfHFSName(*identity.hfsPath);
+  } else {
+    json["hfs_path"] = nullptr;
+  }
   if (identity.wayBack) {
     Put(json, "way_back", *identity.wayBack);
   } else {
@@ -46,40 +53,54 @@ void Fill(Json& json, const Identity& identity) {
 std::vector<std::string> RowOf(const Identity& identity) {
   const auto& [spec, hfsPath, wayBack] = identity;
   return {std::to_string(spec.vRefNum), std::to_string(spec.parID),
-          Printable(Utf8OfHFSName(spec.name)), Printable(Utf8OfHFSName(hfsPath)),
+          Printable(Utf8OfHFSName(spec.name)),
+          hfsPath ? Printable(Utf8OfHFSName(*hfsPath)) : "none",
           wayBack ? Printable(*wayBack) : "none"};
 }
+
+// The findings of identify: JSON as they come, or at the end a table.
+class Identities {
+ public:
+  explicit Identities(const Format& format) : mFormat(format), mFindings(format, "path") {}
+
+  void Take(Report& report, const std::string& item, const Conversion<Identity>& identity) {
+    const Finding finding = identity
+                                ? mFindings.Answer(item, identity->outcome, "",
+                                                   [&](Json& json) { Fill(json, identity->value); })
+                                : mFindings.Failure(item, identity.Failure());
+    if (mFormat.isJson) return report.Print(finding);
+    report.Count(finding);
+    mTable.Add(finding.isFailure ? Table::Row(kColumns) : RowOf(identity->value));
+  }
+
+  void Finish() const {
+    if (!mTable.IsEmpty()) mTable.Print(std::cout);
+  }
+
+ private:
+  static constexpr std::size_t kColumns = 5;
+
+  Format mFormat;
+  Findings mFindings;
+  Table mTable{{{"vRefNum", Table::Align::kRight},
+                {"parent id", Table::Align::kRight},
+                {"HFS name"},
+                {"HFS path"},
+                {"way back"}}};
+};
 
 }  // namespace
 
 int PrintIdentities(const ItemsToAsk& paths) {
   Client client(paths.client);
   if (const auto error = WhyItDoesNotAnswer(client)) return Complain(*error);
-  Report report(paths.format, "path");
-  Table table({{"vRefNum", Table::Align::kRight},
-               {"parent id", Table::Align::kRight},
-               {"HFS name"},
-               {"HFS path"},
-               {"way back"}});
-  Items items(paths.items, paths.format.Separator());
+  Report report(paths.format);
+  Identities identities(paths.format);
+  Items items(paths.items, paths.format.InputEnd());
   while (const auto item = report.GoesOn() ? items.Next([] {}) : std::nullopt) {
-    if (item->empty()) {
-      report.Fail(*item, kEmptyItem);
-      continue;
-    }
-    const std::string path = AbsolutePath(*item);
-    const auto identity = Identify(client, path);
-    if (!identity) {
-      report.Fail(*item, identity.Failure().message);
-    } else if (!*identity) {
-      report.Fail(*item, WhyNoRecord(path));
-    } else if (paths.format.isJson) {
-      report.Answer(*item, "", [&](Json& json) { Fill(json, **identity); });
-    } else {
-      table.Add(RowOf(**identity));
-    }
+    identities.Take(report, *item, Identify(client, *item));
   }
-  if (!paths.format.isJson && !table.IsEmpty()) table.Print(std::cout);
+  identities.Finish();
   return report.Finish();
 }
 

@@ -10,15 +10,11 @@
 
 namespace tallowmere::cli {
 
-// The record as text, such as "-27:19:hostname", with the name in UTF-8.
-std::string TextOfRecord(const FSSpec& spec);
-
 // The record's 70 bytes, zeros after the name, as 140 hexadecimal digits.
 std::string HexOfRecord(const FSSpec& spec);
 
-// Reads a record in either form. The numbers are decimal; a parent id may be signed or unsigned. In
-// hexadecimal, the bytes after the name are ignored. Nullopt for anything else, for a name above 63
-// bytes and for one with a character that Mac Roman lacks.
+// Reads a record in either form. In hexadecimal, the bytes after the name are ignored. Nullopt for
+// anything else; see FSSpecOfText.
 std::optional<FSSpec> ReadRecord(std::string_view text);
 
 // Appends the record's numbers, its name as UTF-8 and its bytes to the object.

@@ -2,51 +2,47 @@
 
 #include <unistd.h>
 
-#include <algorithm>
 #include <iostream>
-#include <utility>
+#include <string>
 
 #include "cli/Output.h"
-#include "cli/Records.h"
 #include "cli/Text.h"
 
 namespace tallowmere::cli {
+namespace {
 
-void Put(Json& json, const std::string& key, std::string_view bytes) {
-  std::string text = Utf8OfAnyBytes(bytes);
-  const bool isUtf8 = text == bytes;
-  json[key] = std::move(text);
-  if (!isUtf8) json[key + "_hex"] = Hex(bytes);
+// From so many items on, a person cannot count what failed.
+constexpr std::uint64_t kManyItems = 1000;
+
+}  // namespace
+
+Report::Report(const Format& format)
+    : mFormat(format), mOutputIsTerminal(isatty(STDOUT_FILENO) == 1), mBar(format.HasProgress()) {}
+
+void Report::Print(const Finding& finding) {
+  Count(finding);
+  if (mOutputIsTerminal && !mFormat.isJson) {
+    std::cout << Printable(finding.text);
+  } else {
+    std::cout << finding.text;
+  }
+  std::cout << mFormat.OutputEnd();
 }
 
-Report::Report(Format format, std::string key)
-    : mFormat(format), mKey(std::move(key)), mOutputIsTerminal(isatty(STDOUT_FILENO) == 1) {}
-
-void Report::Answer(std::string_view item, std::string_view text,
-                    const std::function<void(Json&)>& fill) {
-  if (!mFormat.isJson) return Print(text);
-  Json json;
-  Put(json, mKey, item);
-  fill(json);
-  Print(json.dump());
-}
-
-void Report::Fail(std::string_view item, std::string_view reason) {
+void Report::Count(const Finding& finding) {
+  ++mItems;
+  if (finding.outcome == Outcome::kFound) ++mFound;
+  if (finding.outcome == Outcome::kNew) ++mNew;
+  if (finding.outcome == Outcome::kNothing) ++mNothing;
+  if (!finding.isFailure) return;
   mStatus = kFailed;
   mBar.Hide();
-  if (!mFormat.isJson) {
-    Complain(std::string(item).append(": ").append(reason));
-    return;
-  }
-  Json json;
-  Put(json, mKey, item);
-  Put(json, "error", reason);
-  Print(json.dump());
+  if (!finding.complaint.empty()) Complain(finding.complaint);
 }
 
 void Report::ShowProgress(std::optional<double> done) {
-  ++mItems;
-  if (!mOutputIsTerminal) mBar.Show(done, std::to_string(mItems) + " items");
+  ++mTaken;
+  if (!mOutputIsTerminal) mBar.Show(done, mTaken);
 }
 
 bool Report::GoesOn() const {
@@ -55,16 +51,15 @@ bool Report::GoesOn() const {
 
 int Report::Finish() {
   mBar.Hide();
-  return FinishOutput(mStatus);
+  const int status = FinishOutput(mStatus);
+  if (mItems >= kManyItems && !mFormat.isQuiet && GoesOn()) Summarize();
+  return status;
 }
 
-void Report::Print(std::string_view text) const {
-  if (mOutputIsTerminal && !mFormat.isJson) {
-    std::cout << Printable(text);
-  } else {
-    std::cout << text;
-  }
-  std::cout << mFormat.Separator();
+void Report::Summarize() const {
+  std::cerr << "tallowmere-cli: " << mItems << " items: " << mFound << " found, " << mNew
+            << " new, " << mNothing << " nothing, " << mItems - mFound - mNew - mNothing
+            << " failed\n";
 }
 
 }  // namespace tallowmere::cli

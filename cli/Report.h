@@ -1,40 +1,23 @@
-// A command's findings about its items, printed as text or as JSON: one line for each item, or with
-// --null one NUL-terminated text, in the items' order.
+// Prints a command's findings, in the items' order, and how far it is.
 #pragma once
 
-#include <functional>
-#include <nlohmann/json.hpp>
+#include <cstdint>
 #include <optional>
-#include <string>
-#include <string_view>
 
+#include "cli/Finding.h"
 #include "cli/ProgressBar.h"
 
 namespace tallowmere::cli {
 
-using Json = nlohmann::ordered_json;
-
-struct Format {
-  bool isJson = false;
-  bool isNullTerminated = false;
-
-  char Separator() const { return isNullTerminated ? '\0' : '\n'; }
-};
-
-// Stores bytes under a key, as text. Where they are not UTF-8, the text has U+FFFD for each invalid
-// byte, and "KEY_hex" holds all bytes in hexadecimal.
-void Put(Json& json, const std::string& key, std::string_view bytes);
-
 class Report {
  public:
-  // `key` is that of the item itself in JSON.
-  Report(Format format, std::string key);
+  explicit Report(const Format& format);
 
-  // Reports the answer for `item`: `text`, or in JSON what `fill` adds to the item's object.
-  void Answer(std::string_view item, std::string_view text, const std::function<void(Json&)>& fill);
+  // Prints the answer, or what takes its place, and the complaint.
+  void Print(const Finding& finding);
 
-  // Reports that `item` has no answer: the reason goes to standard error, or into its JSON object.
-  void Fail(std::string_view item, std::string_view reason);
+  // Counts a finding whose answer is printed elsewhere, and prints its complaint.
+  void Count(const Finding& finding);
 
   // Shows the progress, unless the answers themselves show it.
   void ShowProgress(std::optional<double> done);
@@ -42,17 +25,21 @@ class Report {
   // Whether the output can still be written.
   bool GoesOn() const;
 
-  // Returns the program's exit status once everything has been printed.
+  // Returns the program's exit status once everything has been printed. After many items, a summary
+  // goes to standard error.
   int Finish();
 
  private:
-  void Print(std::string_view text) const;
+  void Summarize() const;
 
   Format mFormat;
-  std::string mKey;
   bool mOutputIsTerminal;
   ProgressBar mBar;
-  std::size_t mItems = 0;
+  std::uint64_t mTaken = 0;    // items that have been read
+  std::uint64_t mItems = 0;    // items that have a finding
+  std::uint64_t mFound = 0;    // of those
+  std::uint64_t mNew = 0;      // of those
+  std::uint64_t mNothing = 0;  // of those
   int mStatus = 0;
 };
 

@@ -4,6 +4,7 @@
 #include <CoreServices/CoreServices.h>
 
 #include <memory>
+#include <mutex>
 #include <optional>
 
 namespace tallowmere::cli {
@@ -31,6 +32,9 @@ std::optional<FSRef> ReferenceTo(const std::string& path) {
 
 bool IsSameItem(const std::string& first, const std::string& second) {
   if (first == second) return true;
+  // The host's calls belong to one thread at a time.
+  static std::mutex host;
+  const std::lock_guard lock(host);
   const auto firstItem = ReferenceTo(first);
   const auto secondItem = ReferenceTo(second);
   return firstItem && secondItem && FSCompareFSRefs(&*firstItem, &*secondItem) == noErr;

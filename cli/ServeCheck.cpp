@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "cli/Commands.h"
+#include "cli/Finding.h"
 #include "cli/Output.h"
 #include "cli/Table.h"
 
@@ -14,7 +15,7 @@ constexpr const char* kRoot = "/";
 constexpr std::int16_t kVolumeOfRoot = 0;
 
 // What earlier checks have found out, for later ones.
-struct Findings {
+struct Learnt {
   std::string volumeName;
   std::int16_t volume = 0;
   FSSpec record{};
@@ -25,7 +26,7 @@ struct Findings {
 struct Check {
   int code;
   const char* what;
-  std::function<std::string(Client&, Findings&)> run;
+  std::function<std::string(Client&, Learnt&)> run;
 };
 
 // Keeps the answer in `found`; returns what is wrong when there is none.
@@ -48,45 +49,45 @@ std::string Compare(const Result<std::optional<Value>>& answer, const Value& wan
 const std::vector<Check>& Checks() {
   static const std::vector<Check> checks = {
       {4, "the name of the volume of \"/\"",
-       [](Client& client, Findings& found) {
+       [](Client& client, Learnt& found) {
          return Keep(client.GetHFSVolumeName(kVolumeOfRoot), found.volumeName);
        }},
       {3, "the number of a volume with that name",
-       [](Client& client, Findings& found) {
+       [](Client& client, Learnt& found) {
          return Keep(client.GetVolRefnumByHFSName(found.volumeName), found.volume);
        }},
       {7, "the record of \"/\"",
-       [](Client& client, Findings& found) { return Keep(client.GetFSSpec(kRoot), found.record); }},
+       [](Client& client, Learnt& found) { return Keep(client.GetFSSpec(kRoot), found.record); }},
       {9, "the path of that record",
-       [](Client& client, Findings& found) {
+       [](Client& client, Learnt& found) {
          return Compare(client.SetFileRefFromFSSpec(found.record, false), std::string(kRoot));
        }},
       {8, "the path of its parts",
-       [](Client& client, Findings& found) {
+       [](Client& client, Learnt& found) {
          return Compare(client.SetFileRefFromFSSpecData(found.record), std::string(kRoot));
        }},
       {5, "the HFS name of \"/\"",
-       [](Client& client, Findings& found) {
+       [](Client& client, Learnt& found) {
          return Compare(client.GetHFSName(kRoot), found.volumeName);
        }},
       {1, "the full HFS path of \"/\"",
-       [](Client& client, Findings& found) -> std::string {
+       [](Client& client, Learnt& found) -> std::string {
          const auto path = client.MakeFullPath(kRoot);
          if (!path) return path.Failure().message;
          found.fullPath = *path;
          return *path == found.volumeName + ":" ? "" : "the answer does not fit the others";
        }},
       {2, "the path of that full HFS path",
-       [](Client& client, Findings& found) {
+       [](Client& client, Learnt& found) {
          return Compare(client.MakeFileRefFromPath(found.fullPath), std::string(kRoot));
        }},
       {6, "the path of a name in \"/\"",
-       [](Client& client, Findings&) -> std::string {
+       [](Client& client, Learnt&) -> std::string {
          std::string path;
          const std::string wrong = Keep(client.AddHFSName(kRoot, "a/b"), path);
          return !wrong.empty() || path.ends_with("/a:b") ? wrong : "the answer is no such path";
        }},
-      {10, "the settings of a sound", [](Client& client, Findings&) -> std::string {
+      {10, "the settings of a sound", [](Client& client, Learnt&) -> std::string {
          const auto settings = client.GetAIFFExportSettings(FormatOf({}));
          if (!settings) return settings.Failure().message;
          return settings->result == 0 ? "" : "result " + std::to_string(settings->result);
@@ -107,7 +108,7 @@ void PrintAsJson(const Check& check, const std::string& wrong) {
 
 int CheckService(const ClientOptions& options, bool isJson) {
   Client client(options);
-  Findings found;
+  Learnt found;
   int status = 0;
   Table table({{"code", Table::Align::kRight}, {"request"}, {"result"}});
   for (const Check& check : Checks()) {

@@ -16,7 +16,7 @@ Table::Table(std::vector<Column> columns) : mColumns(std::move(columns)) {
   for (const Column& column : mColumns) mWidths.push_back(CharacterCount(column.title));
 }
 
-void Table::Add(std::vector<std::string> row) {
+void Table::Add(Row row) {
   for (std::size_t i = 0; i < row.size(); ++i) {
     mWidths[i] = std::max(mWidths[i], CharacterCount(row[i]));
   }
@@ -31,7 +31,7 @@ void Table::Print(std::ostream& out) const {
   for (const auto& row : mRows) out << LineOf(row) << '\n';
 }
 
-std::string Table::LineOf(const std::vector<std::string>& row) const {
+std::string Table::LineOf(const Row& row) const {
   std::string line;
   for (std::size_t i = 0; i < row.size(); ++i) {
     const std::string padding(mWidths[i] - CharacterCount(row[i]), ' ');

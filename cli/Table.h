@@ -15,10 +15,12 @@ class Table {
     Align align = Align::kLeft;
   };
 
+  using Row = std::vector<std::string>;
+
   explicit Table(std::vector<Column> columns);
 
-  // REQUIRES: one text for each column, safe for a terminal.
-  void Add(std::vector<std::string> row);
+  // Empty texts alone give an empty line. REQUIRES: one text for each column, safe for a terminal.
+  void Add(Row row);
 
   bool IsEmpty() const { return mRows.empty(); }
 
@@ -26,11 +28,11 @@ class Table {
   void Print(std::ostream& out) const;
 
  private:
-  std::string LineOf(const std::vector<std::string>& row) const;
+  std::string LineOf(const Row& row) const;
 
   std::vector<Column> mColumns;
   std::vector<std::size_t> mWidths;  // in characters
-  std::vector<std::vector<std::string>> mRows;
+  std::vector<Row> mRows;
 };
 
 }  // namespace tallowmere::cli

@@ -1,6 +1,7 @@
 #include "cli/Text.h"
 
 #include <algorithm>
+#include <climits>
 
 #include "text/FileNameText.h"
 #include "text/Utf16.h"
@@ -9,6 +10,7 @@ namespace tallowmere::cli {
 namespace {
 
 constexpr char16_t kReplacement = 0xFFFD;
+constexpr std::size_t kPartOfAGiant = 100;  // bytes
 
 // C0 and C1 control characters and DEL, each of one UTF-16 unit.
 bool IsControl(char16_t unit) {
@@ -45,6 +47,12 @@ std::string Printable(std::string_view text) {
     }
   }
   return printable;
+}
+
+std::string Quoted(std::string_view text) {
+  if (text.size() <= PATH_MAX) return std::string(text);
+  return std::string(text.substr(0, kPartOfAGiant)) + "... (" + std::to_string(text.size()) +
+         " bytes)";
 }
 
 std::string Utf8OfAnyBytes(std::string_view bytes) {

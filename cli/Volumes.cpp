@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "cli/Commands.h"
+#include "cli/Finding.h"
 #include "cli/Output.h"
 #include "cli/Table.h"
 #include "cli/Text.h"

@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "cli/Commands.h"
+#include "cli/Nearest.h"
 #include "cli/Output.h"
 
 namespace {
@@ -30,6 +31,7 @@ struct Arguments {
   ItemsToAsk items;
   std::string folder;
   std::string output;
+  std::string topic;
   Sound sound;
   bool asHex = false;
   bool searchOtherVolumes = false;
@@ -54,6 +56,10 @@ std::string CheckRate(const std::string& text) {
   return hertz && IsRate(*hertz) ? "" : text + " is no rate below 65536 hertz";
 }
 
+bool IsOption(const std::string& word) {
+  return word.size() > 1 && word[0] == '-';
+}
+
 bool HasInputAmongOthers(const std::vector<std::string>& items) {
   return items.size() > 1 && std::find(items.begin(), items.end(), "-") != items.end();
 }
@@ -62,7 +68,7 @@ class CommandLine {
  public:
   CommandLine() {
     mApp.require_subcommand(1);
-    mApp.set_version_flag("--version", TALLOWMERE_VERSION);
+    mApp.set_version_flag("-V,--version", TALLOWMERE_VERSION);
     mApp.add_option("--service", mArguments.items.client.service,
                     "The service's program; without it, the one beside this program or on PATH")
         ->type_name("PATH");
@@ -77,13 +83,11 @@ class CommandLine {
     try {
       mApp.parse(count, arguments);
     } catch (const CLI::ParseError& error) {
-      if (error.get_exit_code() == 0) return mApp.exit(error);
-      Complain(std::string(error.what()) + "; " + kHelpTells);
-      return kWrongUsage;
+      if (error.get_exit_code() == 0) return FinishOutput(mApp.exit(error));
+      return Refuse(WhatIsUnknown().value_or(error.what()));
     }
     if (HasInputAmongOthers(mArguments.items.items)) {
-      Complain("\"-\" stands for standard input and takes no other items beside it; " + kHelpTells);
-      return kWrongUsage;
+      return Refuse("\"-\" stands for standard input and takes no other items beside it");
     }
     const std::chrono::duration<double> deadline(mArguments.seconds);
     ClientOptions& client = mArguments.items.client;
@@ -95,6 +99,44 @@ class CommandLine {
 
  private:
   using ClientOptions = tallowmere::ClientOptions;
+
+  static int Refuse(const std::string& reason) {
+    Complain(reason + "; " + kHelpTells);
+    return kWrongUsage;
+  }
+
+  // What the arguments have that no command takes, whatever else is wrong with them.
+  std::optional<std::string> WhatIsUnknown() const {
+    const std::vector<std::string> words = mApp.remaining(true);
+    if (words.empty()) return std::nullopt;
+    const auto commands = mApp.get_subcommands();
+    if (commands.empty() && !IsOption(words[0])) return NoCommand(words[0]);
+    const auto option = std::find_if(words.begin(), words.end(), IsOption);
+    if (option != words.end()) return "there is no option " + *option;
+    return '"' + commands[0]->get_name() + "\" takes no \"" + words[0] + '"';
+  }
+
+  std::string NoCommand(const std::string& word) const {
+    std::vector<std::string> names;
+    for (const CLI::App* const command : mApp.get_subcommands({})) {
+      names.push_back(command->get_name());
+    }
+    const std::string nearest = Nearest(word, names);
+    return "there is no command \"" + word + '"' +
+           (nearest.empty() ? "" : "; the nearest is \"" + nearest + '"');
+  }
+
+  // Prints the help of the program, or of a command.
+  int PrintHelp() const {
+    const std::string& name = mArguments.topic;
+    const auto commands = mApp.get_subcommands(
+        [&name](const CLI::App* command) { return command->get_name() == name; });
+    if (!name.empty() && commands.empty()) return Refuse(NoCommand(name));
+    const CLI::App* const command = name.empty() ? &mApp : commands[0];
+    const std::string ofWhat = name.empty() ? mApp.get_name() : mApp.get_name() + ' ' + name;
+    std::cout << mApp.get_formatter()->make_help(command, ofWhat, CLI::AppFormatMode::Normal);
+    return FinishOutput();
+  }
 
   CLI::App* Add(const std::string& name, const std::string& what, const std::string& examples,
                 std::function<int()> run) {
@@ -108,9 +150,20 @@ class CommandLine {
                         const std::string& examples, std::function<int()> run) {
     CLI::App* const command = Add(name, what, examples, std::move(run));
     AddJson(command);
-    command->add_flag("-0,--null", mArguments.items.format.isNullTerminated,
-                      "Items of standard input and results end with a NUL, not a newline");
+    Format& format = mArguments.items.format;
+    command->add_flag("-0,--null", format.hasNullInput,
+                      "Items of standard input end with a NUL, not a newline");
+    command->add_flag("--null-output", format.hasNullOutput,
+                      "Results end with a NUL, not a newline; JSON is lines all the same");
+    command->add_flag("--existing", format.isExistingOnly, "Fail for what does not exist");
+    AddQuiet(command);
     return command;
+  }
+
+  void AddQuiet(CLI::App* command) {
+    Format& format = mArguments.items.format;
+    command->add_flag("-q,--quiet", format.isQuiet, "Neither a progress bar nor a summary");
+    command->add_flag("--no-progress", format.hasNoProgress, "No progress bar");
   }
 
   void AddJson(CLI::App* command) {
@@ -207,13 +260,18 @@ void CommandLine::AddTheOthers() {
   command =
       Add("census", "Check that each item of a folder comes back by its record, in another process",
           "  tallowmere-cli census /home",
-          [&a] { return TakeCensus(a.items.client, a.items.format.isJson, a.folder); });
+          [&a] { return TakeCensus(a.items.client, a.items.format, a.folder); });
   AddJson(command);
+  AddQuiet(command);
   command->add_option("folder", a.folder, "The folder")->required()->check(CLI::ExistingDirectory);
 
   AddJson(Add("serve-check", "Start the service and try each request",
               "  tallowmere-cli serve-check",
               [&a] { return CheckService(a.items.client, a.items.format.isJson); }));
+
+  command = Add("help", "Print help for a command", "  tallowmere-cli help spec",
+                [this] { return PrintHelp(); });
+  command->add_option("command", a.topic, "The command; without it, help for all")->type_name("");
 }
 
 }  // namespace

@@ -1,5 +1,6 @@
 // The conversions of the path of an item, which all begin with its record: that tells its HFS name,
 // and whether it is on a volume.
+#include <climits>
 #include <utility>
 
 #include "client/Conversions.h"
@@ -14,6 +15,8 @@ constexpr std::int32_t kParentOnNoVolume = 3;  // that of what leads nowhere
 
 // Of a full path, the service leaves the outermost folders out that do not fit into this.
 constexpr std::size_t kMostBytesOfFolders = 511;
+// A folder in it: a name of Linux, and a colon.
+constexpr std::size_t kLongestFolder = NAME_MAX + 1;
 
 std::string Quoted(std::string_view text) {
   return '"' + std::string(text) + '"';
@@ -147,7 +150,7 @@ class HFSPathQuestion final : public ItemQuestion<std::string> {
     const Error tooLong{Outcome::kInvalid,
                         "the HFS path of " + Quoted(GetPlace().path) + " is longer than 511 bytes"};
     if (path.size() > kMostBytesOfFolders) return tooLong;
-    while (LengthOfFolders(fullPath) > kMostBytesOfFolders - protocol::kLongestSpecName - 1) {
+    while (LengthOfFolders(fullPath) > kMostBytesOfFolders - kLongestFolder) {
       folder = FolderOf(folder);
       auto outer = exchange.AskNow(request::MakeFullPath(folder.empty() ? "/" : folder));
       if (!outer) return outer.Failure();

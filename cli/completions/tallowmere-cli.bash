@@ -3,16 +3,17 @@
 _tallowmere_cli() {
   local -A options=(
     [volumes]='--json'
-    [identify]='-0 --null --json'
-    [spec]='--hex -0 --null --json'
-    [path]='--other-volumes -0 --null --json'
-    [hfs]='-0 --null --json'
-    [posix]='-0 --null --json'
-    [name]='-0 --null --json'
-    [append]='-0 --null --json'
+    [identify]='-0 --null --null-output --existing -q --quiet --no-progress --json'
+    [spec]='--hex -0 --null --null-output --existing -q --quiet --no-progress --json'
+    [path]='--other-volumes -0 --null --null-output --existing -q --quiet --no-progress --json'
+    [hfs]='-0 --null --null-output --existing -q --quiet --no-progress --json'
+    [posix]='-0 --null --null-output --existing -q --quiet --no-progress --json'
+    [name]='-0 --null --null-output --existing -q --quiet --no-progress --json'
+    [append]='-0 --null --null-output --existing -q --quiet --no-progress --json'
     [aiff]='--rate --bits --channels --format --output --json'
-    [census]='--json'
+    [census]='-q --quiet --no-progress --json'
     [serve-check]='--json'
+    [help]=
   )
   # The command is the first word that is neither an option nor the value of one. In "--option=value",
   # "=" is a separate word.
@@ -35,13 +36,17 @@ _tallowmere_cli() {
   case $before in
     --service | --output) return ;;  # a file
     --deadline | --rate | --bits | --channels) ;;
-    --format) words='NONE twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6' ;;
+    --format)
+      # As one word for the shell, which quotes nothing here.
+      [[ 'raw ' == "$word"* ]] && COMPREPLY=('raw\ ')
+      words='NONE twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6'
+      ;;
     *)
       if [[ $word == -* && -n $command ]]; then
         words="${options[$command]} -h --help"
       elif [[ $word == -* ]]; then
-        words='--service --deadline --version -h --help'
-      elif [[ -z $command ]]; then
+        words='--service --deadline -V --version -h --help'
+      elif [[ -z $command || $command == help ]]; then
         words=${!options[*]}
       else
         return
@@ -50,7 +55,7 @@ _tallowmere_cli() {
   esac
   # The words listed here are not files.
   compopt +o default 2>/dev/null
-  mapfile -t COMPREPLY < <(compgen -W "$words" -- "$word")
+  mapfile -t -O ${#COMPREPLY[@]} COMPREPLY < <(compgen -W "$words" -- "$word")
 }
 
 # Completes files where nothing is listed.

@@ -1,11 +1,11 @@
 # Completions of tallowmere-cli for fish.
 
-set -l commands volumes identify spec path hfs posix name append aiff census serve-check
+set -l commands volumes identify spec path hfs posix name append aiff census serve-check help
 set -l no_command "not __fish_seen_subcommand_from $commands"
 complete -c tallowmere-cli -n $no_command -f
 
 complete -c tallowmere-cli -s h -l help -d 'Print help'
-complete -c tallowmere-cli -n $no_command -l version -d 'Print the version'
+complete -c tallowmere-cli -n $no_command -s V -l version -d 'Print the version'
 complete -c tallowmere-cli -n $no_command -l service -r -F -d "The service's program"
 complete -c tallowmere-cli -n $no_command -l deadline -x -d 'Seconds that one answer may take'
 
@@ -20,10 +20,18 @@ complete -c tallowmere-cli -n $no_command -a append -d 'Path of each HFS name in
 complete -c tallowmere-cli -n $no_command -a aiff -d 'Settings that export a sound to AIFF files'
 complete -c tallowmere-cli -n $no_command -a census -d 'Check that each item of a folder comes back'
 complete -c tallowmere-cli -n $no_command -a serve-check -d 'Exercise each request of the service'
+complete -c tallowmere-cli -n $no_command -a help -d 'Help for a command'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from help' -f -a "$commands"
 
 set -l with_items '__fish_seen_subcommand_from identify spec path hfs posix name append'
-complete -c tallowmere-cli -n $with_items -s 0 -l null -d 'Items and results end with a NUL'
-complete -c tallowmere-cli -n "__fish_seen_subcommand_from $commands" -l json -d 'One JSON object a line'
+complete -c tallowmere-cli -n $with_items -s 0 -l null -d 'Items end with a NUL'
+complete -c tallowmere-cli -n $with_items -l null-output -d 'Results end with a NUL'
+complete -c tallowmere-cli -n $with_items -l existing -d 'Fail for what is new'
+for condition in $with_items '__fish_seen_subcommand_from census'
+    complete -c tallowmere-cli -n $condition -s q -l quiet -d 'Neither a progress bar nor a summary'
+    complete -c tallowmere-cli -n $condition -l no-progress -d 'No progress bar'
+end
+complete -c tallowmere-cli -n "__fish_seen_subcommand_from $commands; and not __fish_seen_subcommand_from help" -l json -d 'One JSON object a line'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from spec' -l hex -d 'The 70 bytes as hexadecimal digits'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l other-volumes -d 'Look on the other volumes too'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from volumes aiff serve-check' -f
@@ -33,5 +41,5 @@ complete -c tallowmere-cli -n $aiff -l rate -x -d 'In hertz'
 complete -c tallowmere-cli -n $aiff -l bits -x -d 'In a sample'
 complete -c tallowmere-cli -n $aiff -l channels -x -d 'Of the sound'
 complete -c tallowmere-cli -n $aiff -l format -x -d 'Four-character code' \
-    -a 'NONE "raw " twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6'
+    -a 'NONE raw\\\\\\  twos sowt in24 in32 fl32 fl64 ulaw alaw ima4 MAC3 MAC6'
 complete -c tallowmere-cli -n $aiff -l output -r -F -d 'File for the settings'

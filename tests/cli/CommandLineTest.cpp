@@ -68,7 +68,8 @@ TEST(CommandLine, IdentifyGoesOnBehindAPathWithoutARecord) {
   const std::string missing = folder.Path() / "missing/file";
   ChildProgram cli(TALLOWMERE_CLI, {"identify", missing, folder.Path()});
   EXPECT_THAT(cli.ReadToEnd(), HasSubstr("  " + folder.Path().string() + "\n"));
-  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + missing + ": there is no such folder\n");
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + missing + ": there is no folder \"" +
+                                       folder.Path().string() + "/missing\"\n");
   EXPECT_EQ(cli.Wait(), 1);
 }
 
@@ -87,11 +88,14 @@ TEST(CommandLine, AiffTellsTheResultOfASoundThatIsRefused) {
 }
 
 TEST(CommandLine, OutputThatCannotBeWrittenIsStatus1AndOneSentence) {
-  for (const char* const command : {"volumes", "identify /", "aiff"}) {
+  for (const char* const command :
+       {"volumes", "identify /", "aiff", "aiff --output -", "serve-check", "census /dev/shm",
+        "--help", "--version", "spec --help", "help", "help spec"}) {
     ChildProgram cli("/bin/sh",
                      {"-c", std::string("exec \"$0\" ") + command + " >/dev/full", TALLOWMERE_CLI});
-    EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the output could not be written\n");
-    EXPECT_EQ(cli.Wait(), 1);
+    EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: the output could not be written\n")
+        << command;
+    EXPECT_EQ(cli.Wait(), 1) << command;
   }
 }
 
@@ -132,10 +136,76 @@ TEST(CommandLine, WrongUsageIsStatus2) {
   }
 }
 
-TEST(CommandLine, HelpIsStatus0) {
-  ChildProgram cli(TALLOWMERE_CLI, {"--help"});
-  EXPECT_THAT(cli.ReadToEnd(), HasSubstr("volumes"));
+std::string WhatIsWrongWith(const std::vector<std::string>& arguments) {
+  ChildProgram cli(TALLOWMERE_CLI, arguments);
+  const std::string error = cli.ReadErrorsToEnd();
+  EXPECT_EQ(cli.Wait(), 2);
+  return error;
+}
+
+std::string Printed(const std::vector<std::string>& arguments) {
+  ChildProgram cli(TALLOWMERE_CLI, arguments);
+  std::string text = cli.ReadToEnd();
   EXPECT_EQ(cli.Wait(), 0);
+  return text;
+}
+
+TEST(CommandLine, AnUnknownCommandIsNamedWithTheNearestOne) {
+  const std::string tells = "; --help tells more\n";
+  for (const auto& [word, nearest] : {std::pair("spce", "spec"),
+                                      {"indentify", "identify"},
+                                      {"serve", "serve-check"},
+                                      {"volume", "volumes"}}) {
+    const std::string expected = std::string("tallowmere-cli: there is no command \"") + word +
+                                 "\"; the nearest is \"" + nearest + "\"" + tells;
+    EXPECT_EQ(WhatIsWrongWith({word}), expected);
+    EXPECT_EQ(WhatIsWrongWith({word, "/etc", "--json"}), expected);
+    EXPECT_EQ(WhatIsWrongWith({"help", word}), expected);
+  }
+  EXPECT_EQ(WhatIsWrongWith({"xyzzy"}), "tallowmere-cli: there is no command \"xyzzy\"" + tells);
+}
+
+TEST(CommandLine, AWrongOptionIsNamedWhetherOrNotMoreIsMissing) {
+  const std::string expected = "tallowmere-cli: there is no option --nonsense; --help tells more\n";
+  for (const std::vector<std::string>& arguments : {std::vector<std::string>{"--nonsense"},
+                                                    {"spec", "--nonsense"},
+                                                    {"spec", "--nonsense", "/"},
+                                                    {"append", "--nonsense", "/"},
+                                                    {"census", "--nonsense"},
+                                                    {"volumes", "--nonsense"}}) {
+    EXPECT_EQ(WhatIsWrongWith(arguments), expected) << arguments[0];
+  }
+}
+
+TEST(CommandLine, WordsThatACommandDoesNotTakeAreNamed) {
+  EXPECT_EQ(WhatIsWrongWith({"volumes", "/"}),
+            "tallowmere-cli: \"volumes\" takes no \"/\"; --help tells more\n");
+}
+
+TEST(CommandLine, HelpIsAnOptionAndACommand) {
+  const std::string help = Printed({"--help"});
+  EXPECT_THAT(help, HasSubstr("volumes"));
+  EXPECT_EQ(Printed({"help"}), help);
+  EXPECT_EQ(Printed({"-h"}), help);
+  for (const char* const command : {"spec", "census", "help"}) {
+    EXPECT_EQ(Printed({"help", command}), Printed({command, "--help"}));
+  }
+}
+
+TEST(CommandLine, TheVersionHasAShortOption) {
+  EXPECT_EQ(Printed({"-V"}), Printed({"--version"}));
+}
+
+// Its parts are those that a shell runs.
+TEST(CommandLine, TheExamplesOfTheHelpRun) {
+  ChildProgram shell("/bin/bash",
+                     {"-c",
+                      "set -o pipefail; cd /etc/alternatives; PATH=$(dirname \"$0\"):$PATH; "
+                      "eval \"$(\"$0\" spec --help | grep -- '-print0')\" | jq -r .path | sort | "
+                      "cmp - <(find . | sort)",
+                      TALLOWMERE_CLI});
+  EXPECT_EQ(shell.ReadErrorsToEnd(), "");
+  EXPECT_EQ(shell.Wait(), 0);
 }
 
 }  // namespace

@@ -3,13 +3,17 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <signal.h>
+#include <sys/mount.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <nlohmann/json.hpp>
+#include <set>
 #include <sstream>
+#include <thread>
 
 #include "support/ChildProgram.h"
+#include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
 
 namespace tallowmere::test {
@@ -33,6 +37,32 @@ Output Cli(const std::vector<std::string>& arguments, const std::string& input =
   std::string text = cli.ReadToEnd();
   std::string errors = cli.ReadErrorsToEnd();
   return {cli.Wait(), std::move(text), std::move(errors)};
+}
+
+std::string ReadFile(const std::string& path) {
+  std::ifstream file(path, std::ios::binary);
+  return {std::istreambuf_iterator<char>(file), {}};
+}
+
+// The calls in a table of strace, except those that read, write or wait for pipes.
+int CallsBesidePipes(const std::string& table) {
+  int count = 0;
+  std::istringstream lines(ReadFile(table));
+  for (std::string line; std::getline(lines, line);) {
+    std::istringstream fields(line);
+    double share = 0;
+    double seconds = 0;
+    long each = 0;
+    int calls = 0;
+    if (!(fields >> share >> seconds >> each >> calls)) continue;
+    const std::string name = line.substr(line.rfind(' ') + 1);
+    if (name == "total" || name == "read" || name == "write" || name == "poll" ||
+        name == "clock_nanosleep") {
+      continue;
+    }
+    count += calls;
+  }
+  return count;
 }
 
 std::vector<std::string> Lines(const std::string& text) {
@@ -155,17 +185,141 @@ TEST_F(Conversion, LinesOfStandardInputAreAnsweredInTheirOrder) {
   EXPECT_EQ(output.status, 0);
 }
 
+// The path of a service that leaves a line in the file "started" when it starts.
+std::string CountedService(const TemporaryFolder& folder) {
+  const std::string started = folder.Path() / "started";
+  const std::string path = folder.MakeFile(
+      "counted", "#!/bin/sh\necho >>'" + started + "'\nexec " TALLOWMERE_SERVICE " \"$@\"\n");
+  chmod(path.c_str(), 0755);
+  return path;
+}
+
+// How many services answer so many items.
+std::size_t ServicesFor(const TemporaryFolder& folder, int items) {
+  const std::string started = folder.MakeFile("started", "");
+  const std::string service = CountedService(folder);
+  std::string input;
+  std::string expected;
+  for (int i = 0; i < items; ++i) {
+    input += "/" + std::to_string(i) + "\n";
+    expected += std::to_string(i) + "\n";
+  }
+  EXPECT_EQ(Cli({"--service", service, "name", "-"}, input).text, expected);
+  return std::filesystem::file_size(started);
+}
+
+bool EachFileSystemIsMountedOnce() {
+  std::set<std::string> devices;
+  std::istringstream lines(ReadFile("/proc/self/mountinfo"));
+  for (std::string line; std::getline(lines, line);) {
+    std::istringstream fields(line);
+    std::string id;
+    std::string parent;
+    std::string device;
+    fields >> id >> parent >> device;
+    if (!devices.insert(device).second) return false;
+  }
+  return true;
+}
+
+TEST_F(Conversion, ManyItemsAreAnsweredByAServiceForEachCoreInTheirOrder) {
+  if (!EachFileSystemIsMountedOnce()) GTEST_SKIP() << "one service answers all here";
+  const std::size_t cores = std::thread::hardware_concurrency();
+  EXPECT_EQ(ServicesFor(mFolder, 2), 1u);
+  EXPECT_EQ(ServicesFor(mFolder, 20'000), cores);
+}
+
+TEST_F(Conversion, OneServiceAnswersAllWhereASecondDoesNotStart) {
+  if (!EachFileSystemIsMountedOnce()) GTEST_SKIP() << "one service answers all here";
+  const std::string started = mFolder.Path() / "started";
+  const std::string service = mFolder.MakeFile(
+      "only", "#!/bin/sh\nmkdir '" + started + "' || exit\nexec " TALLOWMERE_SERVICE " \"$@\"\n");
+  chmod(service.c_str(), 0755);
+  std::string input;
+  std::string expected;
+  for (int i = 0; i < 20'000; ++i) {
+    input += "/" + std::to_string(i) + "\n";
+    expected += std::to_string(i) + "\n";
+  }
+  const Output output = Cli({"--service", service, "name", "--quiet", "-"}, input);
+  EXPECT_EQ(output.text, expected);
+  EXPECT_THAT(output.errors, HasSubstr("File exists"));  // said by the second, which was tried
+}
+
+// Each service may give either path of an item.
+TEST_F(Conversion, WhereAFolderIsShownTwiceOneServiceAnswersAll) {
+  if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+  const std::string twice = mFolder.MakeFolder("twice");
+  const ScopedMount volume("none", mFolder.MakeFolder("volume").string(), "tmpfs");
+  ASSERT_EQ(mount((mHere + "/volume").c_str(), twice.c_str(), nullptr, MS_BIND, nullptr), 0);
+  EXPECT_EQ(ServicesFor(mFolder, 20'000), 1u);
+  umount(twice.c_str());
+}
+
+TEST_F(Conversion, ManyItemsEndInASummary) {
+  std::string input;
+  for (int i = 0; i < 999; ++i) input += mFile + "\n";
+  EXPECT_EQ(Cli({"name", "-"}, input).errors, "");
+  input += mHere + "/new\n" + mHere + "/missing/x\n/proc/1/status\n";
+  EXPECT_EQ(Cli({"name", "--json", "-"}, input).errors,
+            "tallowmere-cli: 1002 items: 999 found, 1 new, 1 nothing, 1 failed\n");
+  EXPECT_EQ(Cli({"name", "--json", "--quiet", "-"}, input).errors, "");
+}
+
+// Beside those on pipes, of which there are fewer than items.
+TEST_F(Conversion, AnItemCostsTheCommandLineFewSystemCalls) {
+  if (access("/usr/bin/strace", X_OK) != 0) GTEST_SKIP() << "strace is not installed";
+  constexpr int kItems = 4000;
+  std::string input;
+  for (int i = 0; i < kItems; ++i) input += mFile + "\n";
+  const std::string calls = mFolder.Path() / "calls";
+  const std::string names = mFolder.MakeFile("names", input);
+  for (const char* const command : {"spec", "hfs", "name"}) {
+    ChildProgram traced(
+        "/bin/sh",
+        {"-c", "exec strace -qq -c -b execve -f -o \"$1\" \"$0\" $2 -q - <\"$3\" >/dev/null",
+         TALLOWMERE_CLI, calls, command, names});
+    EXPECT_EQ(traced.Wait(), 0);
+    EXPECT_LT(CallsBesidePipes(calls), 3 * kItems) << command;
+  }
+}
+
 TEST_F(Conversion, TheLastLineMayLackItsEnd) {
   EXPECT_EQ(Cli({"name", "-"}, mFile + "\n" + mFile).text, "a/b\na/b\n");
   EXPECT_EQ(Cli({"name", "-"}, mFile + "\n").text, "a/b\n");
   EXPECT_EQ(Cli({"name", "-"}, "").text, "");
 }
 
-TEST_F(Conversion, WithNullAnItemMayHoldANewline) {
+TEST_F(Conversion, NullEndsTheItemsAndNullOutputTheResults) {
   const std::string file = mFolder.MakeFile("x\ny");
-  const Output output = Cli({"name", "--null", "-"}, file + '\0' + mFile + '\0');
-  EXPECT_EQ(output.text, std::string("x\ny\0a/b\0", 8));
-  EXPECT_EQ(output.status, 0);
+  const std::string items = file + '\0' + mFile + '\0';
+  EXPECT_EQ(Cli({"name", "-0", "--null-output", "-"}, items).text, std::string("x\ny\0a/b\0", 8));
+  EXPECT_EQ(Cli({"name", "--null", "-"}, mFile + '\0' + mFile + '\0').text, "a/b\na/b\n");
+  EXPECT_EQ(Cli({"name", "--null-output", "-"}, mFile + "\n").text, std::string("a/b\0", 4));
+}
+
+TEST_F(Conversion, JsonIsOneObjectALineWhateverEndsItemsAndResults) {
+  const std::string items = mFile + '\0' + mHere + '\0';
+  for (const char* const command : {"name", "spec", "hfs", "identify"}) {
+    const Output output = Cli({command, "-0", "--null-output", "--json", "-"}, items);
+    const auto lines = Lines(output.text);
+    ASSERT_EQ(lines.size(), 2u) << command;
+    EXPECT_EQ(json::parse(lines[0])["path"], mFile) << command;
+    EXPECT_EQ(output.text.find('\0'), std::string::npos) << command;
+  }
+}
+
+// Two lines for one item would be taken for two items.
+TEST_F(Conversion, AnAnswerWithANewlineIsRefusedUnlessItsEndCanBeTold) {
+  const std::string file = mFolder.MakeFile("x\ny");
+  const Output lines = Cli({"name", file, mFile});
+  EXPECT_EQ(lines.text, "\na/b\n");
+  EXPECT_THAT(lines.errors, testing::EndsWith("/x\\012y: the answer has a newline; --json or "
+                                              "--null-output prints it\n"));
+  EXPECT_EQ(lines.status, 1);
+  EXPECT_EQ(json::parse(Cli({"name", "--json", file}).text)["name"], "x\ny");
+  EXPECT_EQ(Cli({"name", "--null-output", file}).text, std::string("x\ny\0", 4));
+  EXPECT_EQ(Cli({"spec", "--hex", file}).status, 0);
 }
 
 TEST_F(Conversion, ALineIsAnsweredBeforeTheNextOneIsThere) {
@@ -205,14 +359,15 @@ TEST_F(Conversion, JsonIsOneObjectALineWithStableKeys) {
     return Keys(Lines(output.text).at(0));
   };
   EXPECT_THAT(keysOf({"spec", "--json", mFile}),
-              ElementsAre("path", "volume", "parent", "name", "record"));
-  EXPECT_THAT(keysOf({"path", "--json", record}), ElementsAre("record", "path"));
-  EXPECT_THAT(keysOf({"hfs", "--json", mFile}), ElementsAre("path", "hfs_path"));
-  EXPECT_THAT(keysOf({"posix", "--json", hfsPath}), ElementsAre("hfs_path", "path"));
-  EXPECT_THAT(keysOf({"name", "--json", mFile}), ElementsAre("path", "name"));
-  EXPECT_THAT(keysOf({"append", "--json", mHere, "a/b"}), ElementsAre("name", "path"));
-  EXPECT_THAT(keysOf({"identify", "--json", mFile}),
-              ElementsAre("path", "volume", "parent", "name", "record", "hfs_path", "way_back"));
+              ElementsAre("path", "status", "volume", "parent", "name", "record"));
+  EXPECT_THAT(keysOf({"path", "--json", record}), ElementsAre("record", "status", "path"));
+  EXPECT_THAT(keysOf({"hfs", "--json", mFile}), ElementsAre("path", "status", "hfs_path"));
+  EXPECT_THAT(keysOf({"posix", "--json", hfsPath}), ElementsAre("hfs_path", "status", "path"));
+  EXPECT_THAT(keysOf({"name", "--json", mFile}), ElementsAre("path", "status", "name"));
+  EXPECT_THAT(keysOf({"append", "--json", mHere, "a/b"}), ElementsAre("name", "status", "path"));
+  EXPECT_THAT(
+      keysOf({"identify", "--json", mFile}),
+      ElementsAre("path", "status", "volume", "parent", "name", "record", "hfs_path", "way_back"));
   EXPECT_THAT(keysOf({"volumes", "--json"}),
               ElementsAre("volume", "name", "mount_point", "answers_to_its_name"));
   EXPECT_THAT(keysOf({"aiff", "--json"}),
@@ -235,15 +390,76 @@ TEST_F(Conversion, JsonHoldsWhatTheTextSays) {
 }
 
 TEST_F(Conversion, AFailedItemIsAnObjectInItsPlace) {
-  const Output output = Cli({"name", "--json", "-"}, mFile + "\n" + mHere + "/missing\n\n" + mFile);
+  const Output output =
+      Cli({"name", "--json", "-"}, mFile + "\n" + mHere + "/missing/x\n\n" + mFile);
   const auto lines = Lines(output.text);
   ASSERT_EQ(lines.size(), 4u);
   EXPECT_EQ(json::parse(lines[1]),
-            json({{"path", mHere + "/missing"}, {"error", "there is no such file or folder"}}));
-  EXPECT_EQ(json::parse(lines[2]), json({{"path", ""}, {"error", "an empty text names nothing"}}));
+            json({{"path", mHere + "/missing/x"},
+                  {"status", "nothing"},
+                  {"error", "there is no folder \"" + mHere + "/missing\""}}));
+  EXPECT_EQ(json::parse(lines[2]),
+            json({{"path", ""}, {"status", "invalid"}, {"error", "an empty path names nothing"}}));
   EXPECT_EQ(json::parse(lines[3])["name"], "a/b");
   EXPECT_EQ(output.errors, "");
   EXPECT_EQ(output.status, 1);
+}
+
+TEST_F(Conversion, TheStatusTellsHowItEnded) {
+  const std::string file = mFolder.MakeFile("file");
+  mFolder.MakeLink("dangling", "nowhere");
+  const auto statusOf = [](const std::string& command, const std::string& item) {
+    return json::parse(Cli({command, "--json", item}).text)["status"].get<std::string>();
+  };
+  const std::string record = Lines(Cli({"spec", file}).text)[0];
+  const std::string hfsPath = Lines(Cli({"hfs", file}).text)[0];
+  for (const char* const command : {"spec", "hfs", "name", "identify"}) {
+    EXPECT_EQ(statusOf(command, file), "found") << command;
+    EXPECT_EQ(statusOf(command, mHere + "/dangling"), "found") << command;
+    EXPECT_EQ(statusOf(command, mHere + "/new"), "new") << command;
+    EXPECT_EQ(statusOf(command, mHere + "/missing/new"), "nothing") << command;
+    EXPECT_EQ(statusOf(command, file + "/new"), "nothing") << command;
+    EXPECT_EQ(statusOf(command, mHere + "/dangling/new"), "nothing") << command;
+    EXPECT_EQ(statusOf(command, "/proc/self/status"), "not-a-volume") << command;
+    EXPECT_EQ(statusOf(command, mHere + "/\xE6\x97\xA5"), "invalid") << command;
+    EXPECT_EQ(statusOf(command, ""), "invalid") << command;
+  }
+  EXPECT_EQ(statusOf("path", record), "found");
+  EXPECT_EQ(statusOf("path", record + "2"), "new");
+  EXPECT_EQ(statusOf("path", "99:2:x"), "not-a-volume");
+  EXPECT_EQ(statusOf("path", "0:3:x"), "nothing");
+  EXPECT_EQ(statusOf("path", "1:2"), "invalid");
+  EXPECT_EQ(statusOf("posix", hfsPath), "found");
+  EXPECT_EQ(statusOf("posix", hfsPath + "2"), "new");
+  EXPECT_EQ(statusOf("posix", hfsPath + ":x"), "nothing");
+  EXPECT_EQ(statusOf("posix", "no such volume:x"), "not-a-volume");
+  EXPECT_EQ(statusOf("posix", "\xE6\x97\xA5"), "invalid");
+}
+
+TEST_F(Conversion, WithExistingANewItemFails) {
+  const std::string record = Lines(Cli({"spec", mFile}).text)[0];
+  const std::string hfsPath = Lines(Cli({"hfs", mFile}).text)[0];
+  const std::string last = mHere + "/new";
+  for (const std::vector<std::string>& command : {std::vector<std::string>{"spec", last, mFile},
+                                                  {"hfs", last, mFile},
+                                                  {"name", last, mFile},
+                                                  {"path", record + "2", record},
+                                                  {"posix", hfsPath + "2", hfsPath},
+                                                  {"append", mHere, "new", "a/b"},
+                                                  {"identify", last, mFile}}) {
+    EXPECT_EQ(Cli(command).status, 0) << command[0];
+    std::vector<std::string> existing = command;
+    existing.insert(existing.begin() + 1, {"--existing", "--json"});
+    const Output output = Cli(existing);
+    EXPECT_EQ(output.status, 1) << command[0];
+    const json first = json::parse(Lines(output.text).at(0));
+    EXPECT_EQ(first["status"], "new") << command[0];
+    EXPECT_TRUE(first.contains("error")) << command[0];
+    EXPECT_EQ(json::parse(Lines(output.text).at(1))["status"], "found") << command[0];
+  }
+  const Output output = Cli({"name", "--existing", last, mFile});
+  EXPECT_EQ(output.text, "\na/b\n");
+  EXPECT_THAT(output.errors, HasSubstr("/new: there is no such file or folder, only a folder"));
 }
 
 TEST_F(Conversion, BytesThatAreNoUtf8AreInJsonInHexadecimalToo) {
@@ -265,13 +481,15 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
   };
   const std::string prefix = "tallowmere-cli: ";
   const std::string missing = mHere + "/missing";
-  EXPECT_EQ(errorsOf({"name", missing}), prefix + missing + ": there is no such file or folder\n");
-  EXPECT_EQ(errorsOf({"hfs", mFile + "/x"}),
-            prefix + mFile + "/x: there is no such file or folder\n");
-  EXPECT_EQ(errorsOf({"spec", missing + "/x"}), prefix + missing + "/x: there is no such folder\n");
-  for (const char* const command : {"spec", "name", "hfs"}) {
-    EXPECT_EQ(errorsOf({command, "/proc/self/status"}),
-              prefix + "/proc/self/status: it is on no volume\n");
+  const auto quoted = [&](const std::string& text) { return prefix + '"' + text + '"'; };
+  for (const char* const command : {"spec", "name", "hfs", "identify"}) {
+    EXPECT_EQ(errorsOf({command, missing + "/x"}),
+              prefix + missing + "/x: there is no folder \"" + missing + "\"\n");
+    EXPECT_EQ(errorsOf({command, mFile + "/x"}),
+              prefix + mFile + "/x: there is no folder \"" + mFile + "\"\n");
+    EXPECT_EQ(errorsOf({command, "/proc/1/status"}),
+              quoted("/proc/1/status") + " is on no volume\n");
+    EXPECT_EQ(errorsOf({command, ""}), prefix + ": an empty path names nothing\n");
   }
   EXPECT_EQ(errorsOf({"path", "1:2"}),
             prefix +
@@ -279,35 +497,77 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
                 "characters, or 140 hexadecimal digits\n");
   EXPECT_EQ(errorsOf({"path", "99:2:x"}), prefix + "99:2:x: no volume has the number 99\n");
   EXPECT_EQ(errorsOf({"path", "0:3:x"}),
-            prefix + "0:3:x: there is no such item, nor a folder for it\n");
+            prefix + "there is neither the item \"0:3:x\" nor a folder for it\n");
   EXPECT_EQ(errorsOf({"posix", "no such volume:x"}),
             prefix + "no such volume:x: no volume is called \"no such volume\"\n");
   EXPECT_EQ(errorsOf({"posix", "a name that nobody has"}),
-            prefix + "a name that nobody has: there is no such item that can be reached\n");
+            prefix + "the HFS path \"a name that nobody has\" begins with no volume's name\n");
   EXPECT_EQ(errorsOf({"posix", std::string(256, 'x')}),
             prefix + std::string(256, 'x') + ": an HFS path has at most 255 bytes\n");
   EXPECT_EQ(errorsOf({"posix", "\xE6\x97\xA5"}),
             prefix + "\xE6\x97\xA5: it has a character that HFS names cannot have\n");
   EXPECT_EQ(errorsOf({"append", missing, "x"}),
             prefix + "x: there is no folder \"" + missing + "\"\n");
-  EXPECT_EQ(errorsOf({"append", "", "x"}), prefix + "x: there is no folder \"\"\n");
-  EXPECT_EQ(errorsOf({"name", mFolder.MakeLink("dangling", "nowhere")}),
-            prefix + mHere + "/dangling: the link leads nowhere\n");
+  EXPECT_EQ(errorsOf({"append", "", "x"}), prefix + "x: an empty path names nothing\n");
+  EXPECT_EQ(errorsOf({"append", mHere, ".."}), prefix + "no item has the HFS name \"..\"\n");
   EXPECT_EQ(errorsOf({"append", mHere, "\xE6\x97\xA5"}),
             prefix + "\xE6\x97\xA5: it has a character that HFS names cannot have\n");
-  EXPECT_EQ(errorsOf({"append", mHere, std::string(256, 'x')}),
-            prefix + std::string(256, 'x') + ": no item can have this name\n");
-  EXPECT_EQ(errorsOf({"name", ""}), prefix + ": an empty text names nothing\n");
-  EXPECT_EQ(errorsOf({"identify", ""}), prefix + ": an empty text names nothing\n");
+  EXPECT_THAT(errorsOf({"append", mHere, std::string(256, 'x')}),
+              HasSubstr("an HFS name has at most 63 bytes"));
+}
 
-  const Output mixed = Cli({"name", missing, mFile});
-  EXPECT_EQ(mixed.text, "a/b\n");
-  EXPECT_EQ(mixed.status, 1);
+// Each is a folder of "/", which an HFS path of the kernel's interface itself would not tell.
+TEST_F(Conversion, AnInterfaceOfTheKernelHasItsOwnHFSPath) {
+  const std::string root = Lines(Cli({"hfs", "/"}).text)[0];
+  EXPECT_EQ(Cli({"hfs", "/proc"}).text, root + "proc:\n");
+  EXPECT_EQ(json::parse(Cli({"identify", "--json", "/proc"}).text)["hfs_path"], root + "proc:");
+}
+
+TEST_F(Conversion, AnHFSPathThatIsCutIsNone) {
+  std::string path = mHere;
+  for (int i = 0; i < 3; ++i) path += "/" + std::string(200, static_cast<char>('a' + i));
+  std::filesystem::create_directories(path);
+  const Output output = Cli({"hfs", path, mFile});
+  EXPECT_THAT(output.text, testing::StartsWith("\n"));
+  EXPECT_EQ(output.status, 1);
+  EXPECT_EQ(json::parse(Cli({"hfs", "--json", path}).text)["status"], "invalid");
+  EXPECT_EQ(json::parse(Cli({"identify", "--json", path}).text)["hfs_path"], nullptr);
+}
+
+// So that paste(1) can put items and answers beside each other.
+TEST_F(Conversion, AnItemThatFailsIsAnEmptyLineInItsPlace) {
+  const std::string missing = mHere + "/missing/x";
+  const std::string record = Lines(Cli({"spec", mFile}).text)[0];
+  const std::string hfsPath = Lines(Cli({"hfs", mFile}).text)[0];
+  const auto expect = [](std::vector<std::string> command, const std::string& answer) {
+    const Output output = Cli(command);
+    EXPECT_EQ(output.text, "\n" + answer + "\n\n") << command[0];
+    EXPECT_EQ(output.status, 1) << command[0];
+  };
+  expect({"name", missing, mFile, ""}, "a/b");
+  expect({"spec", missing, mFile, ""}, record);
+  expect({"hfs", missing, mFile, ""}, hfsPath);
+  expect({"path", "1:2", record, "99:2:x"}, mFile);
+  expect({"posix", "no such volume:x", hfsPath, "\xE6\x97\xA5"}, mFile);
+  expect({"append", mHere, "", "a/b", "\xE6\x97\xA5"}, mFile);
+  EXPECT_EQ(Cli({"name", "--null-output", missing, mFile}).text, std::string("\0a/b\0", 5));
+  const auto table = Lines(Cli({"identify", missing, mFile, ""}).text);
+  ASSERT_EQ(table.size(), 4u);
+  EXPECT_EQ(table[1], "");
+  EXPECT_THAT(table[2], HasSubstr("a/b"));
+  EXPECT_EQ(table[3], "");
+}
+
+TEST_F(Conversion, AGiantItemIsQuotedInPart) {
+  const Output output = Cli({"spec", "-"}, "/" + std::string(1'000'000, 'x') + "\n" + mFile + "\n");
+  EXPECT_EQ(output.errors, "tallowmere-cli: \"/" + std::string(99, 'x') +
+                               "... (1000001 bytes)\" is too long: File name too long\n");
+  EXPECT_EQ(Lines(output.text).size(), 2u);
 }
 
 TEST_F(Conversion, APathThatIsTooLongIsSaid) {
   const Output output = Cli({"spec", "--json", "/" + std::string(70000, 'x')});
-  EXPECT_EQ(json::parse(output.text)["error"], "File name too long");
+  EXPECT_EQ(json::parse(output.text)["status"], "invalid");
 }
 
 TEST_F(Conversion, WithOtherVolumesARecordOfAnUnknownVolumeIsLookedForElsewhere) {
@@ -337,6 +597,7 @@ TEST_F(Conversion, AServiceThatDiesOfAnItemIsSaidOfThatItemAndTheRestIsAnswered)
     const auto lines = Lines(output.text);
     ASSERT_EQ(lines.size(), 3u) << command;
     EXPECT_EQ(json::parse(lines[0])["error"], "the service ended before it answered") << command;
+    EXPECT_EQ(json::parse(lines[0])["status"], "service-failed") << command;
     EXPECT_FALSE(json::parse(lines[1]).contains("error")) << command;
     EXPECT_EQ(output.status, 1);
     unlink(died.c_str());
@@ -408,6 +669,18 @@ TEST_F(Conversion, SettingsOfASoundAreStoredAsTheyAre) {
             "tallowmere-cli: " + mHere + "/missing/file: No such file or directory\n");
   EXPECT_EQ(Cli({"aiff", "--output", "/dev/full"}).errors,
             "tallowmere-cli: /dev/full: it could not be written\n");
+}
+
+// Ignored, the signal of the limit leaves the write to fail as on a full disk.
+TEST_F(Conversion, SettingsThatCannotBeStoredLeaveNoFile) {
+  const std::string path = mFolder.Path() / "settings";
+  ChildProgram cli("/bin/sh", {"-c", "trap '' XFSZ; ulimit -f 0; exec \"$0\" aiff --output \"$1\"",
+                               TALLOWMERE_CLI, path});
+  EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: " + path + ": it could not be written\n");
+  EXPECT_EQ(cli.Wait(), 1);
+  EXPECT_FALSE(std::filesystem::exists(path));
+  EXPECT_EQ(Cli({"aiff", "--format", "mp3 ", "--output", path}).status, 1);
+  EXPECT_FALSE(std::filesystem::exists(path));
 }
 
 TEST_F(Conversion, AServiceThatWorksPassesTheCheckAndAnotherDoesNot) {

@@ -7,7 +7,7 @@ namespace tallowmere::cli {
 namespace {
 
 TEST(Records, AreWrittenAsVolumeParentAndName) {
-  EXPECT_EQ(TextOfRecord({-27, 19, "host\x8E"}), "-27:19:host\xC3\xA9");
+  EXPECT_EQ(TextOfFSSpec({-27, 19, "host\x8E"}), "-27:19:host\xC3\xA9");
 }
 
 TEST(Records, AreWrittenAsThe70BytesOfTheProtocol) {
@@ -23,7 +23,7 @@ RC_GTEST_PROP(Records, ComeBackFromBothForms, ()) {
   auto name = *rc::gen::container<std::string>(rc::gen::arbitrary<char>());
   name.resize(std::min<std::size_t>(name.size(), 63));
   const FSSpec spec{*rc::gen::arbitrary<std::int16_t>(), *rc::gen::arbitrary<std::int32_t>(), name};
-  RC_ASSERT(ReadRecord(TextOfRecord(spec)) == spec);
+  RC_ASSERT(ReadRecord(TextOfFSSpec(spec)) == spec);
   RC_ASSERT(ReadRecord(HexOfRecord(spec)) == spec);
 }
 

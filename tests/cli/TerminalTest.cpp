@@ -4,6 +4,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <stdlib.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "support/ChildProgram.h"
@@ -43,8 +44,8 @@ class Terminal : public testing::Test {
 
 TEST_F(Terminal, HeadsAreBoldAndComplaintsAreRed) {
   EXPECT_THAT(OnATerminal("$CLI volumes"), HasSubstr("\x1B[1mvRefNum  name"));
-  EXPECT_THAT(OnATerminal("$CLI name /nonexistent"),
-              HasSubstr("\x1B[31mtallowmere-cli:\x1B[0m /nonexistent: "));
+  EXPECT_THAT(OnATerminal("$CLI name /nonexistent/x"),
+              HasSubstr("\x1B[31mtallowmere-cli:\x1B[0m /nonexistent/x: "));
 }
 
 TEST_F(Terminal, ColoursCanBeRefused) {
@@ -61,14 +62,14 @@ TEST_F(Terminal, ControlCharactersOfAPathAreShownAndNotSent) {
   const TemporaryFolder folder;
   folder.MakeFile("\x1B[1m\xFF");
   const std::string command =
-      "cd " + folder.Path().string() + "; printf '\\033[1m\\377' | $CLI name --null -";
+      "cd " + folder.Path().string() + "; printf '\\033[1m\\377' | $CLI name -";
   EXPECT_THAT(OnATerminal(command), HasSubstr("\\033[1m"));
   EXPECT_THAT(OnATerminal(command + " | cat"), HasSubstr("\x1B[1m"));
 }
 
 TEST_F(Terminal, AComplaintTakesTheProgressBarAway) {
   const std::string output =
-      OnATerminal("(echo /; sleep 1; echo /; echo /nonexistent) | $CLI name - >/dev/null");
+      OnATerminal("(echo /; sleep 1; echo /; echo /nonexistent/x) | $CLI name - >/dev/null");
   EXPECT_THAT(output, HasSubstr(" items"));
   EXPECT_THAT(output, HasSubstr("\r\x1B[K\x1B[31mtallowmere-cli:"));
   EXPECT_THAT(OnATerminal("export TERM=dumb; (echo /; sleep 1; echo /) | $CLI name - >/dev/null"),
@@ -82,6 +83,57 @@ TEST_F(Terminal, LongWorkHasAProgressBarAndShortWorkHasNone) {
   EXPECT_THAT(OnATerminal("echo / | $CLI name - >/dev/null"), Not(HasSubstr(" items")));
   // Not in the way of answers on the same terminal.
   EXPECT_THAT(OnATerminal("(echo /; sleep 1; echo /) | $CLI name -"), Not(HasSubstr(" items")));
+}
+
+// Gives answers for long enough that a bar is drawn.
+const std::string kSlowly = "(echo /; sleep 0.7; echo /; sleep 0.3; echo /)";
+
+// The widest line that a terminal shows, in characters.
+std::size_t Width(const std::string& output) {
+  std::size_t widest = 0;
+  for (std::size_t begin = 0; begin < output.size();) {
+    const std::size_t end = std::min(output.find_first_of("\r\n", begin), output.size());
+    std::string line = output.substr(begin, end - begin);
+    const std::string erase = "\x1B[K";
+    if (line.starts_with(erase)) line.erase(0, erase.size());
+    widest = std::max(widest, line.size());
+    begin = end + 1;
+  }
+  return widest;
+}
+
+TEST_F(Terminal, AProgressBarIsNarrowerThanTheTerminal) {
+  const std::string slow = "stty cols 40; " + kSlowly + " | $CLI name - >/dev/null";
+  EXPECT_THAT(OnATerminal(slow), HasSubstr(" items"));
+  EXPECT_LT(Width(OnATerminal(slow)), 40u);
+  // Of arguments, a part is known to be done.
+  const TemporaryFolder folder;
+  const std::string service =
+      folder.MakeFile("late", "#!/bin/sh\nsleep 0.7\nexec " TALLOWMERE_SERVICE " \"$@\"\n");
+  chmod(service.c_str(), 0755);
+  const std::string known = "$CLI --service " + service + " name / / >/dev/null";
+  EXPECT_THAT(OnATerminal(known), HasSubstr(" %  "));
+  EXPECT_THAT(OnATerminal("stty cols 40; " + known), HasSubstr(" %  "));
+  EXPECT_LT(Width(OnATerminal("stty cols 40; " + known)), 40u);
+  EXPECT_LT(Width(OnATerminal("stty cols 8; " + kSlowly + " | $CLI name - >/dev/null")), 8u);
+}
+
+TEST_F(Terminal, ProgressIsNotShownToWhoDoesNotWantIt) {
+  for (const char* const option : {"--quiet", "-q", "--no-progress"}) {
+    EXPECT_EQ(OnATerminal(kSlowly + " | $CLI name " + option + " - >/dev/null"), "") << option;
+  }
+}
+
+// A pager reads keys one by one: the line is its own.
+TEST_F(Terminal, ProgressIsNotShownWhileAPagerReadsTheAnswers) {
+  EXPECT_EQ(
+      OnATerminal(kSlowly + " | $CLI name - | (stty -icanon -echo </dev/tty; cat >/dev/null)"), "");
+}
+
+TEST_F(Terminal, ProgressIsNotShownWhereErrorsGoElsewhere) {
+  const TemporaryFolder folder;
+  const std::string errors = folder.MakeFile("errors", "");
+  EXPECT_EQ(OnATerminal(kSlowly + " | $CLI name - 2>" + errors + " >/dev/null; cat " + errors), "");
 }
 
 }  // namespace

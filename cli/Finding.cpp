@@ -1,0 +1,58 @@
+#include "cli/Finding.h"
+
+#include <utility>
+
+#include "cli/Records.h"
+#include "cli/Text.h"
+
+namespace tallowmere::cli {
+namespace {
+
+constexpr const char* kHasNewline = "the answer has a newline; --json or --null-output prints it";
+constexpr const char* kIsNew = "there is no such file or folder, only a folder for it";
+
+// The message for a person, who has to see which item is meant.
+std::string Complaint(std::string_view item, const std::string& message) {
+  const std::size_t quoted =
+      item.empty() ? std::string::npos : message.find(std::string(item) + '"');
+  if (quoted == std::string::npos) return Quoted(item) + ": " + message;
+  return std::string(message).replace(quoted, item.size(), Quoted(item));
+}
+
+}  // namespace
+
+void Put(Json& json, const std::string& key, std::string_view bytes) {
+  std::string text = Utf8OfAnyBytes(bytes);
+  const bool isUtf8 = text == bytes;
+  json[key] = std::move(text);
+  if (!isUtf8) json[key + "_hex"] = Hex(bytes);
+}
+
+Finding Findings::Answer(std::string_view item, Outcome outcome, std::string text,
+                         const std::function<void(Json&)>& fill) const {
+  if (mFormat.isExistingOnly && outcome == Outcome::kNew) return Failure(item, {outcome, kIsNew});
+  if (mFormat.isJson) {
+    Json json = Object(item, outcome);
+    fill(json);
+    text = json.dump();
+  } else if (mFormat.OutputEnd() == '\n' && text.find('\n') != std::string::npos) {
+    return Failure(item, {Outcome::kInvalid, kHasNewline});
+  }
+  return {outcome, false, std::move(text), {}};
+}
+
+Finding Findings::Failure(std::string_view item, const Error& error) const {
+  if (!mFormat.isJson) return {error.outcome, true, {}, Complaint(item, error.message)};
+  Json json = Object(item, error.outcome);
+  Put(json, "error", error.message);
+  return {error.outcome, true, json.dump(), {}};
+}
+
+Json Findings::Object(std::string_view item, Outcome outcome) const {
+  Json json;
+  Put(json, mKey, item);
+  json["status"] = Name(outcome);
+  return json;
+}
+
+}  // namespace tallowmere::cli
