@@ -37,27 +37,31 @@ class Alike {
   int mCount = 0;
 };
 
-// The name of the entry by which the kernel found an item: the very name; else the only one that is
-// alike but for letter case; else the only one with the item's number. Hard links can have several
-// names in one folder, and on hfsplus their entries have numbers of their own.
-std::optional<std::string> NameOfEntry(const Look& item) {
+enum class By { kNumber, kLetters };
+
+// The name of the entry of a folder by which the kernel found an item: the very name, else the only
+// one that is alike in number, or but for letter case.
+std::optional<std::string> NameOfEntry(const Look& item, By by) {
   const auto open = kernel::OpenForReading(item.Folder().SpotOf("."));
   if (!open) return std::nullopt;
   const std::string_view asked = item.Name();
-  const std::u16string folded = Folded(asked);
-  Alike inLetters;
-  Alike inNumber;
+  const std::u16string folded = by == By::kLetters ? Folded(asked) : std::u16string();
+  Alike alike;
   kernel::FolderReader reader(*open);
   while (const kernel::Entry* const entry = reader.Next()) {
     if (entry->name == asked) return std::string(asked);
-    if (Folded(entry->name) == folded) inLetters.Offer(entry->name);
-    if (entry->inode == item.Item().inode) inNumber.Offer(entry->name);
+    const bool isAlike =
+        by == By::kLetters ? Folded(entry->name) == folded : entry->inode == item.Item().inode;
+    if (isAlike) alike.Offer(entry->name);
   }
-  if (reader.FailedBy().number != 0) return std::nullopt;
-  for (const Alike* const alike : {&inLetters, &inNumber}) {
-    if (alike->Only() != nullptr) return *alike->Only();
-  }
-  return std::nullopt;
+  const bool isTold = reader.FailedBy().number == 0 && alike.Only() != nullptr;
+  return isTold ? std::optional(*alike.Only()) : std::nullopt;
+}
+
+// Entries of hard links on hfsplus have numbers of their own: their letters tell them.
+std::optional<std::string> StoredNameOf(const Look& item) {
+  auto name = NameOfEntry(item, By::kNumber);
+  return name ? name : NameOfEntry(item, By::kLetters);
 }
 
 bool HasLetters(std::string_view name) {
@@ -82,7 +86,7 @@ std::string_view MountPointOn(const volumes::Volume& volume, const std::string& 
 Look AsStored(Moment& moment, const Look& item) {
   const volumes::Volume& volume = *item.Folder().Volume();
   if (!volume.Kind().ignoresCase || !HasLetters(item.Name())) return item;
-  const auto name = NameOfEntry(item);
+  const auto name = StoredNameOf(item);
   if (!name || *name == item.Name()) return item;
   const auto stored = moment.LookUp(item.Folder(), *name);
   return stored && AreSame(volume, stored->Seen(), item.Seen()) ? *stored : item;
