@@ -9,6 +9,8 @@
 #include <vector>
 
 #include "cli/Format.h"
+#include "cli/OldRecords.h"
+#include "cli/OldVolumes.h"
 
 namespace tallowmere::cli {
 
@@ -28,14 +30,21 @@ int PrintIdentities(const ItemsToAsk& paths);
 // Prints the record of each path, as text or in hexadecimal.
 int PrintRecords(const ItemsToAsk& items, bool asHex);
 
+// How records were stored, and where the volumes that they name are now.
+struct RecordOptions {
+  RecordForm form;
+  OldPlaces places;
+  bool searchOtherVolumes = false;
+};
+
 // Prints the path of each record.
-int PrintPathsOfRecords(const ItemsToAsk& items, bool searchOtherVolumes);
+int PrintPathsOfRecords(const ItemsToAsk& items, const RecordOptions& options);
 
 // Prints the full HFS path of each path, as UTF-8.
 int PrintHFSPaths(const ItemsToAsk& items);
 
-// Prints the path of each HFS path, given as UTF-8.
-int PrintPathsOfHFSPaths(const ItemsToAsk& items);
+// Prints the path of each HFS path, given as UTF-8; that of a volume that was copied, in the copy.
+int PrintPathsOfHFSPaths(const ItemsToAsk& items, const OldPlaces& places);
 
 // Prints the HFS name of each path, as UTF-8.
 int PrintNames(const ItemsToAsk& items);

@@ -8,9 +8,6 @@ namespace tallowmere::cli {
 namespace {
 
 constexpr const char* kPathKey = "path";
-constexpr const char* kNoRecord =
-    "a record is volume:parent:name, the name of at most 63 Mac Roman characters, or 140 "
-    "hexadecimal digits";
 constexpr const char* kNotMacRoman = "it has a character that HFS names cannot have";
 
 // The handler that writes down what `answer` makes of the conversion's value, or why there is none.
@@ -61,34 +58,10 @@ int PrintRecords(const ItemsToAsk& items, bool asHex) {
   });
 }
 
-int PrintPathsOfRecords(const ItemsToAsk& items, bool searchOtherVolumes) {
-  const Findings findings(items.format, "record");
-  return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
-    const auto spec = ReadRecord(item);
-    if (!spec) {
-      finding = Invalid(findings, item, kNoRecord);
-    } else {
-      converter.PathOf(*spec, searchOtherVolumes, TellPath(findings, item, finding));
-    }
-  });
-}
-
 int PrintHFSPaths(const ItemsToAsk& items) {
   const Findings findings(items.format, kPathKey);
   return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
     converter.HFSPathOf(item, TellHFSText(findings, item, finding, "hfs_path"));
-  });
-}
-
-int PrintPathsOfHFSPaths(const ItemsToAsk& items) {
-  const Findings findings(items.format, "hfs_path");
-  return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
-    const auto hfsPath = HFSNameOfUtf8(item);
-    if (!hfsPath) {
-      finding = Invalid(findings, item, kNotMacRoman);
-    } else {
-      converter.PathOfHFSPath(*hfsPath, TellPath(findings, item, finding));
-    }
   });
 }
 

@@ -41,10 +41,12 @@ Finding Findings::Answer(std::string_view item, Outcome outcome, std::string tex
   return {outcome, false, std::move(text), {}};
 }
 
-Finding Findings::Failure(std::string_view item, const Error& error) const {
+Finding Findings::Failure(std::string_view item, const Error& error,
+                          const std::function<void(Json&)>& fill) const {
   if (!mFormat.isJson) return {error.outcome, true, {}, Complaint(item, error.message)};
   Json json = Object(item, error.outcome);
   Put(json, "error", error.message);
+  if (fill) fill(json);
   return {error.outcome, true, json.dump(), {}};
 }
 

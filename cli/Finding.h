@@ -37,8 +37,10 @@ class Findings {
   Finding Answer(std::string_view item, Outcome outcome, std::string text,
                  const std::function<void(Json&)>& fill) const;
 
-  // That there is none: the reason is a complaint, or in JSON part of the item's object.
-  Finding Failure(std::string_view item, const Error& error) const;
+  // That there is none: the reason is a complaint, or in JSON part of the item's object, with what
+  // `fill` adds.
+  Finding Failure(std::string_view item, const Error& error,
+                  const std::function<void(Json&)>& fill = {}) const;
 
  private:
   Json Object(std::string_view item, Outcome outcome) const;

@@ -21,18 +21,51 @@ std::optional<std::string> ReadHex(std::string_view digits) {
   return bytes;
 }
 
+// Nullopt for a character that is none of base64, padding among them.
+std::optional<std::uint32_t> ReadSixBits(char digit) {
+  constexpr std::string_view kDigits =
+      "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+  const std::size_t value = kDigits.find(digit);
+  return value == kDigits.npos ? std::nullopt : std::optional(static_cast<std::uint32_t>(value));
+}
+
+// The bytes of whole groups of six bits; what is left over at the end is no byte.
+std::optional<std::string> ReadBase64(std::string_view digits) {
+  std::string bytes;
+  std::uint32_t bits = 0;
+  unsigned count = 0;
+  for (const char digit : digits) {
+    const auto value = ReadSixBits(digit);
+    if (!value) return std::nullopt;
+    bits = bits << 6 | *value;
+    count += 6;
+    if (count < 8) continue;
+    count -= 8;
+    bytes.push_back(static_cast<char>(bits >> count));
+  }
+  return bytes;
+}
+
 }  // namespace
 
 std::string HexOfRecord(const FSSpec& spec) {
   return Hex(EncodeFSSpec(spec));
 }
 
-std::optional<FSSpec> ReadRecord(std::string_view text) {
-  const bool isHex =
-      text.size() == 2 * protocol::kFileSpecSize && text.find(kSeparator) == text.npos;
-  if (!isHex) return FSSpecOfText(text);
-  const auto bytes = ReadHex(text);
-  return bytes ? DecodeFSSpec(*bytes) : std::nullopt;
+std::optional<std::string> ReadRecordBytes(std::string_view text) {
+  constexpr std::string_view kPadding = "==";  // behind the last of 70 bytes
+  if (text.size() == 2 * protocol::kFileSpecSize) return ReadHex(text);
+  const bool isBase64 =
+      text.size() == (protocol::kFileSpecSize + 2) / 3 * 4 && text.ends_with(kPadding);
+  if (!isBase64) return std::nullopt;
+  text.remove_suffix(kPadding.size());
+  return ReadBase64(text);
+}
+
+std::optional<FSSpec> ReadRecord(std::string_view text, std::endian order) {
+  if (text.find(kSeparator) != text.npos) return FSSpecOfText(text);
+  const auto bytes = ReadRecordBytes(text);
+  return bytes ? DecodeFSSpec(*bytes, order) : std::nullopt;
 }
 
 void Put(nlohmann::ordered_json& json, const FSSpec& spec) {

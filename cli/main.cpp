@@ -2,11 +2,13 @@
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
+#include <bit>
 #include <charconv>
 #include <chrono>
 #include <exception>
 #include <functional>
 #include <iostream>
+#include <map>
 #include <optional>
 #include <string>
 #include <utility>
@@ -34,7 +36,7 @@ struct Arguments {
   std::string topic;
   Sound sound;
   bool asHex = false;
-  bool searchOtherVolumes = false;
+  RecordOptions records;
 };
 
 std::optional<double> ReadNumber(const std::string& text) {
@@ -54,6 +56,11 @@ std::string CheckTime(const std::string& text) {
 std::string CheckRate(const std::string& text) {
   const auto hertz = ReadNumber(text);
   return hertz && IsRate(*hertz) ? "" : text + " is no rate below 65536 hertz";
+}
+
+std::string CheckStride(const std::string& text) {
+  const auto bytes = ReadNumber(text);
+  return bytes && *bytes < 70 ? text + " is less than the 70 bytes of a record" : "";
 }
 
 bool IsOption(const std::string& word) {
@@ -176,6 +183,14 @@ class CommandLine {
         ->type_name("");
   }
 
+  void AddTable(CLI::App* command) {
+    command
+        ->add_option("--volumes", mArguments.records.places.table,
+                     "Lines OLD-NUMBER-OR-NAME=PLACE tell where volumes are; '#' begins a comment")
+        ->type_name("FILE");
+  }
+
+  void AddRecordOptions(CLI::App* command);
   void AddConversions();
   void AddTheOthers();
 
@@ -183,6 +198,44 @@ class CommandLine {
   Arguments mArguments;
   std::function<int()> mRun;
 };
+
+void CommandLine::AddRecordOptions(CLI::App* command) {
+  RecordOptions& records = mArguments.records;
+  CLI::Option* const volume =
+      command
+          ->add_option("--volume", records.places.volume,
+                       "All records are of this volume, whatever number they have: its mount point "
+                       "or name")
+          ->type_name("PLACE");
+  AddTable(command);
+  command->get_option("--volumes")->excludes(volume);
+  command
+      ->add_option_function<std::string>(
+          "--byte-order",
+          [&records](const std::string& order) {
+            records.form.order = order == "big" ? std::endian::big : std::endian::little;
+          },
+          "Of the numbers in bytes: big, as older machines stored them, or little")
+      ->check([](const std::string& order) {
+        return order == "big" || order == "little" ? "" : '"' + order + "\" is no byte order";
+      })
+      ->type_name("ORDER");
+  CLI::Option* const packed = command->add_flag("--packed", records.form.isPacked,
+                                                "Items are files of records, 70 bytes each");
+  command->add_option("--skip", records.form.skip, "Bytes in front of a file's first record")
+      ->needs(packed);
+  command
+      ->add_option("--stride", records.form.stride,
+                   "Bytes from the beginning of one record to that of the next")
+      ->needs(packed)
+      ->check(CheckStride)
+      ->capture_default_str();
+  command
+      ->add_flag("--other-volumes", records.searchOtherVolumes,
+                 "Look on the other volumes for what is not there. An item that is found so can be "
+                 "another one, with the same name in a folder that has the same id by chance")
+      ->excludes(volume);
+}
 
 void CommandLine::AddConversions() {
   Arguments& a = mArguments;
@@ -195,11 +248,13 @@ void CommandLine::AddConversions() {
 
   command = AddForItems("path", "Print the path of each record",
                         "  tallowmere-cli path -27:19:hostname\n"
-                        "  tallowmere-cli spec --hex - <paths | tallowmere-cli path -",
-                        [&a] { return PrintPathsOfRecords(a.items, a.searchOtherVolumes); });
-  AddItems(command, "record", "volume:parent:name, or 140 hexadecimal digits");
-  command->add_flag("--other-volumes", a.searchOtherVolumes,
-                    "Look on the other volumes for what is not there");
+                        "  tallowmere-cli spec --hex - <paths | tallowmere-cli path -\n"
+                        "  tallowmere-cli path --volume '/mnt/Old Disk' --byte-order big --packed "
+                        "records.bin",
+                        [&a] { return PrintPathsOfRecords(a.items, a.records); });
+  AddItems(command, "record",
+           "volume:parent:name, or the 70 bytes in hexadecimal or base64; with --packed, files");
+  AddRecordOptions(command);
 
   command = AddForItems("hfs", "Print the full HFS path of each path",
                         "  tallowmere-cli hfs /usr/bin/env /usr/bin",
@@ -208,9 +263,16 @@ void CommandLine::AddConversions() {
 
   command = AddForItems("posix", "Print the path of each HFS path",
                         "  tallowmere-cli posix Root:usr:bin:env\n"
-                        "  tallowmere-cli hfs - <paths | tallowmere-cli posix -",
-                        [&a] { return PrintPathsOfHFSPaths(a.items); });
+                        "  tallowmere-cli hfs - <paths | tallowmere-cli posix -\n"
+                        "  tallowmere-cli posix --map 'Old Disk=/srv/copies/old' 'Old Disk:Mix'",
+                        [&a] { return PrintPathsOfHFSPaths(a.items, a.records.places); });
   AddItems(command, "hfspath", "HFS paths, in UTF-8");
+  command
+      ->add_option("--map", a.records.places.maps,
+                   "The volume that was called so has been copied into a folder")
+      ->type_name("OLD-NAME=FOLDER")
+      ->allow_extra_args(false);
+  AddTable(command);
 
   command =
       AddForItems("name", "Print the HFS name of each path",

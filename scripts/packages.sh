@@ -34,8 +34,8 @@ to_test+=(mandoc zsh fish jq inotify-tools)
 to_test+=(locales)
 # For the types of the Python client.
 to_test+=(mypy)
-# For tests on a real HFS volume in an emulated machine, and of the Debian packages.
-to_emulate=(hfsutils qemu-system-x86 busybox-static cpio)
+# For tests on real HFS and HFS+ volumes in a machine of their own, and of the Debian packages.
+to_emulate=(hfsutils user-mode-linux qemu-system-x86 busybox-static cpio)
 to_package=(dpkg-dev file python3)
 # Checks packages.
 to_check_packages=(lintian)
@@ -49,10 +49,11 @@ to_cover=(clang libclang-rt-dev llvm)
 to_make_i386=(g++-i686-linux-gnu libc6-i386 lib32stdc++6)
 to_make_arm64=(g++-aarch64-linux-gnu qemu-user-static)
 
-# unpack_kernel FOLDER: puts Debian's kernel there, without installing it. Without one, the test
-# that boots it is skipped.
+# unpack_kernel FOLDER: puts Debian's kernel there, without installing it, unless the one that runs as
+# a program is installed. Without either, the tests that boot one are skipped.
 unpack_kernel() {
   [ -d "$1" ] && return
+  ls /usr/lib/uml/modules/*/kernel/fs/hfs >/dev/null 2>&1 && return
   local package
   package=$(apt-cache show linux-image-amd64 2>/dev/null |
     sed -n 's/^Depends: \(linux-image-[^ ,]*\).*/\1/p' | head -1)
@@ -60,7 +61,7 @@ unpack_kernel() {
   [ -n "$package" ] || return 0
   mkdir -p "$1"
   if ! (cd "$1" && apt-get download -qq "$package" && dpkg-deb --fsys-tarfile ./*.deb |
-        tar -x --wildcards './boot/vmlinuz*' '*/fs/hfs' '*/fs/nls' '*/drivers/block' '*/drivers/cdrom') \
+        tar -x --wildcards './boot/vmlinuz*' '*/fs/hfs' '*/fs/hfsplus' '*/fs/nls' '*/drivers/block' '*/drivers/cdrom') \
        >build/kernel.log 2>&1; then
     cat build/kernel.log >&2
     rm -rf "$1"

@@ -5,9 +5,9 @@ _tallowmere_cli() {
     [volumes]='--json'
     [identify]='-0 --null --null-output --existing -q --quiet --no-progress --json'
     [spec]='--hex -0 --null --null-output --existing -q --quiet --no-progress --json'
-    [path]='--other-volumes -0 --null --null-output --existing -q --quiet --no-progress --json'
+    [path]='--volume --volumes --byte-order --packed --skip --stride --other-volumes -0 --null --null-output --existing -q --quiet --no-progress --json'
     [hfs]='-0 --null --null-output --existing -q --quiet --no-progress --json'
-    [posix]='-0 --null --null-output --existing -q --quiet --no-progress --json'
+    [posix]='--map --volumes -0 --null --null-output --existing -q --quiet --no-progress --json'
     [name]='-0 --null --null-output --existing -q --quiet --no-progress --json'
     [append]='-0 --null --null-output --existing -q --quiet --no-progress --json'
     [aiff]='--rate --bits --channels --format --output --json'
@@ -20,7 +20,7 @@ _tallowmere_cli() {
   local i command=
   for ((i = 1; i < COMP_CWORD; i++)); do
     case ${COMP_WORDS[i]} in
-      --service | --deadline)
+      --service | --deadline | --volume | --volumes | --byte-order | --skip | --stride | --map)
         [[ ${COMP_WORDS[i + 1]} == = ]] && ((i++))
         ((i++))
         ;;
@@ -34,8 +34,9 @@ _tallowmere_cli() {
   [[ $word == = ]] && word=
   [[ $before == = ]] && before=${COMP_WORDS[COMP_CWORD - 2]}
   case $before in
-    --service | --output) return ;;  # a file
-    --deadline | --rate | --bits | --channels) ;;
+    --service | --output | --volume | --volumes | --map) return ;;  # a file
+    --deadline | --rate | --bits | --channels | --skip | --stride) ;;
+    --byte-order) words='big little' ;;
     --format)
       # As one word for the shell, which quotes nothing here.
       [[ 'raw ' == "$word"* ]] && COMPREPLY=('raw\ ')

@@ -34,6 +34,13 @@ end
 complete -c tallowmere-cli -n "__fish_seen_subcommand_from $commands; and not __fish_seen_subcommand_from help" -l json -d 'One JSON object a line'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from spec' -l hex -d 'The 70 bytes as hexadecimal digits'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l other-volumes -d 'Look on the other volumes too'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l volume -r -F -d 'Volume of all records'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from path posix' -l volumes -r -F -d 'Table of old volumes'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l byte-order -x -a 'big little' -d 'Of the numbers in bytes'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l packed -d 'Items are files of records'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l skip -x -d 'Bytes before the first record'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l stride -x -d 'Bytes from record to record'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from posix' -l map -r -F -d 'Folder of a copied volume'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from volumes aiff serve-check' -f
 
 set -l aiff '__fish_seen_subcommand_from aiff'

@@ -12,6 +12,7 @@
 #include "calls/ResultCodes.h"
 #include "catalog/Finding.h"
 #include "catalog/NameLookup.h"
+#include "catalog/StoredNames.h"
 #include "foundation/ColonsAndSlashes.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
@@ -93,8 +94,10 @@ OSErr FillName(catalog::Moment& moment, const Subject& item, HFSUniStr255& name)
     if (!volumeName) return ResultCodeOf(volumeName.Error());
     text = text::DecodeMacRoman(*volumeName);
   } else {
+    const std::string path =
+        item.Look() ? catalog::AsStored(moment, *item.Look()).Path() : item.Seen().path;
     text = foundation::ExchangeColonsAndSlashes(
-        text::TextOfFileName(*foundation::LastComponent(item.Seen().path)));
+        text::TextOfFileName(*foundation::LastComponent(path)));
   }
   text.resize(std::min(text.size(), kLongestUnicodeName));
   name.length = static_cast<UInt16>(text.size());

@@ -9,6 +9,7 @@
 #include "calls/Process.h"
 #include "calls/References.h"
 #include "catalog/Finding.h"
+#include "catalog/StoredNames.h"
 #include "foundation/NoThrow.h"
 #include "foundation/PathText.h"
 #include "foundation/Url.h"
@@ -93,7 +94,8 @@ CFURLRef CFURLCreateFromFSRef(CFAllocatorRef, const FSRef* item) {
         if (!found) return nullptr;
         path = *found;
       }
-      return foundation::CreateUrlOfPath(*path, kernel::IsFolder(*reference));
+      const std::string stored = catalog::StoredPath(moment, *reference, *path);
+      return foundation::CreateUrlOfPath(stored, kernel::IsFolder(*reference));
     });
   });
 }

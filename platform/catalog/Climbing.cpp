@@ -15,11 +15,12 @@ namespace tallowmere::catalog {
 namespace {
 
 // Whether a held folder's path gives the names of all folders above it: the walk along it stayed on
-// the mount of the volume's root.
+// the mount of the volume's root, and letter case counts.
 bool PathTellsNames(const Moment& moment, const HeldFolder& folder) {
   const volumes::Volume& volume = *folder.Volume();
   return moment.IsTableAsBefore() && !folder.IsRoot() && HasOneView(folder) &&
-         volume.NumbersIdentifyItems() && folder.Item().mount == volume.Root().mount &&
+         volume.NumbersIdentifyItems() && !volume.Kind().ignoresCase &&
+         folder.Item().mount == volume.Root().mount &&
          foundation::IsWithin(folder.Path(), volume.MountPoint());
 }
 

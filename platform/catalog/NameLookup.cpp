@@ -5,6 +5,7 @@
 
 #include "catalog/OwnNames.h"
 #include "catalog/ShortForms.h"
+#include "catalog/StoredNames.h"
 #include "catalog/Views.h"
 #include "foundation/PathText.h"
 #include "names/HFSNames.h"
@@ -45,10 +46,7 @@ kernel::Result<std::string> ShortFormOf(Moment& moment, const std::vector<HeldFo
   return kernel::kNotThere;
 }
 
-}  // namespace
-
-kernel::Result<Look> LookUpHFSName(Moment& moment, const HeldFolder& folder,
-                                   std::string_view name) {
+kernel::Result<Look> FindByText(Moment& moment, const HeldFolder& folder, std::string_view name) {
   if (!HasOneView(folder)) return LookUpInViews(moment, ViewsOf(moment, folder), name);
   auto look = FindByOwnName(moment, folder, name);
   if (!IsMissing(look) || names::ReadShortHFSName(name).empty()) return look;
@@ -56,7 +54,24 @@ kernel::Result<Look> LookUpHFSName(Moment& moment, const HeldFolder& folder,
   return ShortFormSearch(moment, views, name).Find();
 }
 
-kernel::Result<std::string> HFSNameOf(Moment& moment, const Look& item, std::size_t limit) {
+// The item whose name is the very bytes, when they are not UTF-8; else what is known already.
+kernel::Result<Look> FindByBytes(Moment& moment, const HeldFolder& folder, std::string_view name,
+                                 kernel::Result<Look> known) {
+  const std::string bytes = names::NameInBytes(name);
+  return bytes.empty() ? std::move(known) : moment.LookUp(folder, bytes);
+}
+
+}  // namespace
+
+kernel::Result<Look> LookUpHFSName(Moment& moment, const HeldFolder& folder,
+                                   std::string_view name) {
+  auto look = FindByText(moment, folder, name);
+  const bool canBeBytes = folder.Volume()->Kind().namesCanBeMacRoman && IsMissing(look);
+  return canBeBytes ? FindByBytes(moment, folder, name, std::move(look)) : look;
+}
+
+kernel::Result<std::string> HFSNameOf(Moment& moment, const Look& found, std::size_t limit) {
+  const Look item = AsStored(moment, found);
   const std::string_view linuxName = item.Name();
   auto unmistakable = names::UnmistakableHFSName(linuxName, limit);
   if (unmistakable && HasOneView(item.Folder())) return *std::move(unmistakable);

@@ -56,15 +56,18 @@ kernel::Result<Look> ShortFormSearch::Find() {
   return mFound.front();
 }
 
-// Whether any item without an own name could have this short form.
+// Whether any item could have this short form: one without an own name, or with a long one.
 bool ShortFormSearch::CanStandForOne() const {
   return mViews.size() > 1 || names::CanBeShortForm(mName) ||
          !names::SpellHFSName(mName).decomposed.empty();
 }
 
 bool ShortFormSearch::IsShortFormOf(const names::ShortNameParts& parts, const Look& item) {
-  return StandsFor(parts, mName, NameOf(item.Seen()).c_str()) &&
-         !HasOwnName(mMoment, mViews.front(), item.Seen(), names::kLongestSpecName);
+  const std::string linuxName = NameOf(item.Seen());
+  if (!StandsFor(parts, mName, linuxName.c_str())) return false;
+  const bool hadOne =
+      item.Folder().Volume()->Kind().longNamesHadShortForms && names::HadShortForm(linuxName);
+  return hadOne || !HasOwnName(mMoment, mViews.front(), item.Seen(), names::kLongestSpecName);
 }
 
 // Tries to find the item without reading the folder.

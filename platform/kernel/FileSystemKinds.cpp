@@ -115,6 +115,8 @@ constexpr auto kRows = std::to_array<Row>({
       .keepsNumbers = true}},
 
     // Catalog node ids, of 32 bits, are never reused: Inside Macintosh: Files, "Catalog Files".
+    // Names are found without regard to case, and mounted without a code page are the bytes of the
+    // disk: hfs.rst.
     {kHFS,
      Only::kAlways,
      {.name = "hfs",
@@ -122,27 +124,37 @@ constexpr auto kRows = std::to_array<Row>({
       .numberBits = 32,
       .upperIDs = UpperIDs::kFolded,
       .entriesTellNumbers = true,
-      .keepsNumbers = true}},
+      .keepsNumbers = true,
+      .ignoresCase = true,
+      .namesCanBeMacRoman = true}},
 
-    // Likewise: Technical Note TN1150, "Catalog File". The entry of a hard link has its own number
-    // there ("Hard Links").
+    // Likewise: Technical Note TN1150, "Catalog File", "String Comparison Algorithm". The entry of
+    // a hard link has its own number there ("Hard Links").
     {kHFSPlus,
      Only::kAlways,
      {.name = "hfsplus",
       .numbersTellItemsApart = true,
       .numberBits = 32,
       .upperIDs = UpperIDs::kFolded,
-      .keepsNumbers = true}},
+      .keepsNumbers = true,
+      .ignoresCase = true,
+      .longNamesHadShortForms = true}},
 
     // Inodes are numbered as they are encountered and lose the number when they leave memory:
     // vfat.rst, nfs=stale_rw. With nfs=nostale_ro it is a position on the disk, of 40 bits:
-    // FILEID_FAT in <linux/exportfs.h>.
+    // FILEID_FAT in <linux/exportfs.h>. Case: vfat.rst, check=; exfat likewise.
     {MSDOS_SUPER_MAGIC,
      Only::kAlways,
-     {.name = "vfat", .numbersTellItemsApart = true, .upperIDs = UpperIDs::kFolded}},
+     {.name = "vfat",
+      .numbersTellItemsApart = true,
+      .upperIDs = UpperIDs::kFolded,
+      .ignoresCase = true}},
     {EXFAT_SUPER_MAGIC,
      Only::kAlways,
-     {.name = "exfat", .numbersTellItemsApart = true, .upperIDs = UpperIDs::kFolded}},
+     {.name = "exfat",
+      .numbersTellItemsApart = true,
+      .upperIDs = UpperIDs::kFolded,
+      .ignoresCase = true}},
 
     // The number is the position of a record on the disk, in units of 32 bytes: isofs_get_ino in
     // the kernel's fs/isofs/isofs.h.

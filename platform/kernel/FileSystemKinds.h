@@ -39,6 +39,16 @@ struct FileSystemKind {
   // A folder has two links plus one for each folder in it, or a single one when it has lost count.
   bool countsSubfolders = false;
 
+  // A name also finds the item whose name differs from it in letter case alone, at least in some of
+  // its folders.
+  bool ignoresCase = false;
+
+  // Names can be the bytes that an older machine stored, in Mac Roman.
+  bool namesCanBeMacRoman = false;
+
+  // Programs of its time knew an item whose name is longer than 31 characters by a short form.
+  bool longNamesHadShortForms = false;
+
   // Every item is found by its handle as long as it exists. Other file systems only find what they
   // have not forgotten.
   bool findsAllByHandle = false;

@@ -129,4 +129,16 @@ SpelledNames SpellHFSName(std::string_view name) {
   return names;
 }
 
+std::string NameInBytes(std::string_view name) {
+  std::string bytes = foundation::ExchangeColonsAndSlashes(std::string(name));
+  const std::u16string text = text::TextOfFileName(bytes);
+  const bool isUtf8 = std::none_of(text.begin(), text.end(), text::IsEscapedByte);
+  return isUtf8 || !CanBeLinuxName(bytes) ? std::string() : bytes;
+}
+
+bool HadShortForm(std::string_view linuxName) {
+  return EncodeWithQuestionMarks(ExchangedText(linuxName), kLongestShortName + 1).size() >
+         kLongestShortName;
+}
+
 }  // namespace tallowmere::names

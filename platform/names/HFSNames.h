@@ -56,4 +56,12 @@ struct SpelledNames {
 };
 SpelledNames SpellHFSName(std::string_view name);
 
+// The Linux name that an HFS name is where a file system shows the bytes that are stored: the same
+// bytes, ':' and '/' exchanged. Empty when they are UTF-8, or no item can have the name.
+std::string NameInBytes(std::string_view name);
+
+// Whether a Linux name has more than 31 characters in HFS form, so that programs which knew no
+// longer ones had a short form for it.
+bool HadShortForm(std::string_view linuxName);
+
 }  // namespace tallowmere::names

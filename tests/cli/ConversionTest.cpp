@@ -12,6 +12,7 @@
 #include <sstream>
 #include <thread>
 
+#include "RunCli.h"
 #include "support/ChildProgram.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
@@ -23,21 +24,6 @@ using nlohmann::json;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::Not;
-
-struct Output {
-  int status;
-  std::string text;
-  std::string errors;
-};
-
-Output Cli(const std::vector<std::string>& arguments, const std::string& input = "") {
-  ChildProgram cli(TALLOWMERE_CLI, arguments);
-  cli.Write(input);
-  cli.CloseInput();
-  std::string text = cli.ReadToEnd();
-  std::string errors = cli.ReadErrorsToEnd();
-  return {cli.Wait(), std::move(text), std::move(errors)};
-}
 
 std::string ReadFile(const std::string& path) {
   std::ifstream file(path, std::ios::binary);
@@ -63,13 +49,6 @@ int CallsBesidePipes(const std::string& table) {
     count += calls;
   }
   return count;
-}
-
-std::vector<std::string> Lines(const std::string& text) {
-  std::vector<std::string> lines;
-  std::istringstream stream(text);
-  for (std::string line; std::getline(stream, line);) lines.push_back(line);
-  return lines;
 }
 
 // The keys of an object, in their order.
@@ -360,9 +339,11 @@ TEST_F(Conversion, JsonIsOneObjectALineWithStableKeys) {
   };
   EXPECT_THAT(keysOf({"spec", "--json", mFile}),
               ElementsAre("path", "status", "volume", "parent", "name", "record"));
-  EXPECT_THAT(keysOf({"path", "--json", record}), ElementsAre("record", "status", "path"));
+  EXPECT_THAT(keysOf({"path", "--json", record}),
+              ElementsAre("record", "status", "path", "exists", "by"));
   EXPECT_THAT(keysOf({"hfs", "--json", mFile}), ElementsAre("path", "status", "hfs_path"));
-  EXPECT_THAT(keysOf({"posix", "--json", hfsPath}), ElementsAre("hfs_path", "status", "path"));
+  EXPECT_THAT(keysOf({"posix", "--json", hfsPath}),
+              ElementsAre("hfs_path", "status", "path", "exists", "by"));
   EXPECT_THAT(keysOf({"name", "--json", mFile}), ElementsAre("path", "status", "name"));
   EXPECT_THAT(keysOf({"append", "--json", mHere, "a/b"}), ElementsAre("name", "status", "path"));
   EXPECT_THAT(
@@ -494,7 +475,7 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
   EXPECT_EQ(errorsOf({"path", "1:2"}),
             prefix +
                 "1:2: a record is volume:parent:name, the name of at most 63 Mac Roman "
-                "characters, or 140 hexadecimal digits\n");
+                "characters, or its 70 bytes in hexadecimal or base64\n");
   EXPECT_EQ(errorsOf({"path", "99:2:x"}), prefix + "99:2:x: no volume has the number 99\n");
   EXPECT_EQ(errorsOf({"path", "0:3:x"}),
             prefix + "there is neither the item \"0:3:x\" nor a folder for it\n");

@@ -2,7 +2,9 @@
 
 #include <dirent.h>
 #include <dlfcn.h>
+#include <linux/magic.h>
 #include <sys/syscall.h>
+#include <sys/vfs.h>
 #include <time.h>
 #include <unistd.h>
 
@@ -20,6 +22,7 @@ std::chrono::nanoseconds later{0};
 bool isUntyped = false;
 std::function<void(int)> beforeEntries;
 int openat2Error = 0;
+std::uint32_t fuseType = 0;
 
 template <class Call>
 Call Real(const char* name) {
@@ -50,6 +53,13 @@ extern "C" ssize_t getdents64(int folder, void* buffer, size_t size) noexcept {
     at += entry->d_reclen;
   }
   return got;
+}
+
+extern "C" int statfs(const char* path, struct statfs* about) noexcept {
+  static const auto real = Real<int (*)(const char*, struct statfs*)>("statfs");
+  const int result = real(path, about);
+  if (result == 0 && fuseType != 0 && about->f_type == FUSE_SUPER_MAGIC) about->f_type = fuseType;
+  return result;
 }
 
 extern "C" long syscall(long number, ...) noexcept {
@@ -85,6 +95,14 @@ UntypedEntries::UntypedEntries() {
 
 UntypedEntries::~UntypedEntries() {
   isUntyped = false;
+}
+
+FuseAsType::FuseAsType(std::uint32_t type) {
+  fuseType = type;
+}
+
+FuseAsType::~FuseAsType() {
+  fuseType = 0;
 }
 
 RefusedOpenat2::RefusedOpenat2(int error) {

@@ -4,6 +4,7 @@
 #pragma once
 
 #include <chrono>
+#include <cstdint>
 #include <functional>
 
 namespace tallowmere::test {
@@ -24,6 +25,15 @@ class UntypedEntries {
   UntypedEntries(const UntypedEntries&) = delete;
   UntypedEntries& operator=(const UntypedEntries&) = delete;
   ~UntypedEntries();
+};
+
+// Makes statfs report this type for every FUSE file system.
+class FuseAsType {
+ public:
+  explicit FuseAsType(std::uint32_t type);
+  FuseAsType(const FuseAsType&) = delete;
+  FuseAsType& operator=(const FuseAsType&) = delete;
+  ~FuseAsType();
 };
 
 // Makes openat2 fail with this error: EPERM in a sandbox, ENOSYS before Linux 5.6.

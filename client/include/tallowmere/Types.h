@@ -4,6 +4,7 @@
 // kernel's bytes.
 #pragma once
 
+#include <bit>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -20,14 +21,15 @@ struct FSSpec {
   bool operator==(const FSSpec&) const = default;
 };
 
-// The 70 bytes of a record as in the protocol and in old programs' data, numbers in this machine's
-// byte order: volume reference number (16 bits), parent id (32 bits), length of the name, name,
-// zeros up to 63 bytes. REQUIRES: the name has at most 63 bytes.
-std::string EncodeFSSpec(const FSSpec& spec);
+// The 70 bytes of a record as in the protocol and in old programs' data: volume reference number
+// (16 bits), parent id (32 bits), length of the name, name, zeros up to 63 bytes. The protocol has
+// the numbers in this machine's byte order; older machines stored them with the highest byte first.
+// REQUIRES: the name has at most 63 bytes.
+std::string EncodeFSSpec(const FSSpec& spec, std::endian order = std::endian::native);
 
 // The record in 70 bytes, ignoring what follows its name. Nullopt for any other number of bytes and
 // for a name length above 63.
-std::optional<FSSpec> DecodeFSSpec(std::string_view bytes);
+std::optional<FSSpec> DecodeFSSpec(std::string_view bytes, std::endian order = std::endian::native);
 
 // A record as text: "volume:parent:name", such as "-27:19:hostname", with the name in UTF-8.
 std::string TextOfFSSpec(const FSSpec& spec);

@@ -5,6 +5,7 @@
 #include <fuse_lowlevel.h>
 #include <linux/loop.h>
 #include <signal.h>
+#include <strings.h>
 #include <sys/ioctl.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
@@ -14,6 +15,7 @@
 #include <cerrno>
 #include <chrono>
 #include <cstdlib>
+#include <cstring>
 #include <ctime>
 #include <thread>
 #include <vector>
@@ -31,6 +33,7 @@ constexpr ino_t kFirstOwnNumber = 0x1000;
 
 // Nodes are never given away again; the kernel's number of one is its index.
 std::vector<Node> nodes;
+bool ignoresCase = false;
 
 struct stat About(ino_t number, mode_t mode) {
   struct stat about {};
@@ -43,7 +46,9 @@ struct stat About(ino_t number, mode_t mode) {
 
 fuse_ino_t Child(fuse_ino_t parent, const char* name) {
   for (fuse_ino_t node = FUSE_ROOT_ID + 1; node < nodes.size(); ++node) {
-    if (nodes[node].parent == parent && nodes[node].name == name) return node;
+    if (nodes[node].parent != parent) continue;
+    const char* const own = nodes[node].name.c_str();
+    if ((ignoresCase ? strcasecmp(own, name) : std::strcmp(own, name)) == 0) return node;
   }
   return 0;
 }
@@ -140,7 +145,9 @@ std::string MakeBlockDevice(const std::string& file) {
   return isMade ? device : "";
 }
 
-[[noreturn]] void Serve(const std::string& place, NumberedFileSystem::On on) {
+[[noreturn]] void Serve(const std::string& place, NumberedFileSystem::On on,
+                        NumberedFileSystem::Case letterCase) {
+  ignoresCase = letterCase == NumberedFileSystem::Case::kIgnored;
   nodes.resize(FUSE_ROOT_ID + 1);
   nodes[FUSE_ROOT_ID].about = About(FUSE_ROOT_ID, S_IFDIR | 0755);
   fuse_lowlevel_ops operations{};
@@ -168,12 +175,12 @@ std::string MakeBlockDevice(const std::string& file) {
 
 }  // namespace
 
-NumberedFileSystem::NumberedFileSystem(On on) {
+NumberedFileSystem::NumberedFileSystem(On on, Case letterCase) {
   const std::string place = mFolder.MakeFolder("numbered");
   struct stat before {};
   stat(place.c_str(), &before);
   mServer = fork();
-  if (mServer == 0) Serve(place, on);
+  if (mServer == 0) Serve(place, on, letterCase);
   for (int i = 0; i < 500 && !mIsMounted; ++i) {
     std::this_thread::sleep_for(std::chrono::milliseconds(10));
     struct stat now {};

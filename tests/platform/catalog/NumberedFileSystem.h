@@ -17,8 +17,11 @@ class NumberedFileSystem {
   // On a block device it passes for a file system of a disk: fuseblk.
   enum class On { kNothing, kBlockDevice };
 
+  // Whether a name finds an item whose name has ASCII letters in the other case.
+  enum class Case { kCounts, kIgnored };
+
   // Served by a child process. REQUIRES: the test is in a mount namespace of its own.
-  explicit NumberedFileSystem(On on = On::kNothing);
+  explicit NumberedFileSystem(On on = On::kNothing, Case letterCase = Case::kCounts);
   NumberedFileSystem(const NumberedFileSystem&) = delete;
   NumberedFileSystem& operator=(const NumberedFileSystem&) = delete;
   ~NumberedFileSystem();

@@ -1,0 +1,118 @@
+#include "catalog/StoredNames.h"
+
+#include <algorithm>
+#include <array>
+#include <optional>
+#include <string_view>
+
+#include "foundation/PathText.h"
+#include "kernel/FolderReader.h"
+#include "kernel/Paths.h"
+#include "text/FileNameText.h"
+#include "text/MacRoman.h"
+#include "text/Utf16.h"
+
+namespace tallowmere::catalog {
+namespace {
+
+// A name with the differences of letter case and normal form removed that Mac Roman letters have.
+std::u16string Folded(std::string_view name) {
+  std::u16string text = text::DecomposeMacRoman(text::TextOfFileName(name));
+  for (char16_t& letter : text) {
+    if (letter >= u'A' && letter <= u'Z') letter = static_cast<char16_t>(letter - u'A' + u'a');
+  }
+  return text;
+}
+
+// The entries of a folder that are alike in one way: only a single one tells anything.
+class Alike {
+ public:
+  void Offer(const char* name) {
+    if (mCount++ == 0) mName = name;
+  }
+  const std::string* Only() const { return mCount == 1 ? &mName : nullptr; }
+
+ private:
+  std::string mName;
+  int mCount = 0;
+};
+
+enum class By { kNumber, kLetters };
+
+// The name of the entry of a folder by which the kernel found an item: the very name, else the only
+// one that is alike in number, or but for letter case.
+std::optional<std::string> NameOfEntry(const Look& item, By by) {
+  const auto open = kernel::OpenForReading(item.Folder().SpotOf("."));
+  if (!open) return std::nullopt;
+  const std::string_view asked = item.Name();
+  const std::u16string folded = by == By::kLetters ? Folded(asked) : std::u16string();
+  Alike alike;
+  kernel::FolderReader reader(*open);
+  while (const kernel::Entry* const entry = reader.Next()) {
+    if (entry->name == asked) return std::string(asked);
+    const bool isAlike =
+        by == By::kLetters ? Folded(entry->name) == folded : entry->inode == item.Item().inode;
+    if (isAlike) alike.Offer(entry->name);
+  }
+  const bool isTold = reader.FailedBy().number == 0 && alike.Only() != nullptr;
+  return isTold ? std::optional(*alike.Only()) : std::nullopt;
+}
+
+// Entries of hard links on hfsplus have numbers of their own: their letters tell them.
+std::optional<std::string> StoredNameOf(const Look& item) {
+  auto name = NameOfEntry(item, By::kNumber);
+  return name ? name : NameOfEntry(item, By::kLetters);
+}
+
+bool HasLetters(std::string_view name) {
+  return std::any_of(name.begin(), name.end(), [](char byte) {
+    const auto letter = static_cast<unsigned char>(byte);
+    return !text::IsAscii(letter) || (letter >= 'A' && letter <= 'Z') ||
+           (letter >= 'a' && letter <= 'z');
+  });
+}
+
+// The mount point on a path of a volume; empty for a path that is not below any.
+std::string_view MountPointOn(const volumes::Volume& volume, const std::string& path) {
+  std::string_view longest;
+  for (const std::string& place : volume.Listed().MountPoints()) {
+    if (foundation::IsWithin(path, place) && place.size() > longest.size()) longest = place;
+  }
+  return longest;
+}
+
+}  // namespace
+
+Look AsStored(Moment& moment, const Look& item) {
+  const volumes::Volume& volume = *item.Folder().Volume();
+  if (!volume.Kind().ignoresCase || !HasLetters(item.Name())) return item;
+  const auto name = StoredNameOf(item);
+  if (!name || *name == item.Name()) return item;
+  const auto stored = moment.LookUp(item.Folder(), *name);
+  return stored && AreSame(volume, stored->Seen(), item.Seen()) ? *stored : item;
+}
+
+std::string StoredPath(Moment& moment, const kernel::Item& reference, const std::string& path) {
+  const auto listed = moment.LastVolumes()->WithMount(reference.mount);
+  const auto volume =
+      listed ? listed->Enter() : kernel::Result<volumes::VolumePointer>(kernel::kNoVolume);
+  if (!volume || !(*volume)->Kind().ignoresCase) return path;
+  const std::string_view top = MountPointOn(**volume, path);
+  if (top.empty()) return path;
+  std::string stored(top);
+  std::optional<kernel::Item> last;
+  for (std::size_t at = top.size(); at < path.size();) {
+    const std::size_t end = std::min(path.find('/', at + 1), path.size());
+    const auto folder = moment.HoldFolder(stored);
+    const auto look = folder ? moment.LookUp(*folder, path.substr(at + 1, end - at - 1))
+                             : kernel::Result<Look>(folder.Error());
+    if (!look) return path;
+    const Look found = AsStored(moment, *look);
+    stored = found.Path();
+    last = found.Item();
+    at = end;
+  }
+  return last && kernel::HaveSameNumbers(*last, reference) ? stored : path;
+}
+
+}  // namespace tallowmere::catalog

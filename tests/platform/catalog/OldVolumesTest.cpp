@@ -1,0 +1,225 @@
+// Names as old volumes give them, on a file system that passes for one: letter case does not count,
+// names are the bytes of the disk, long names had short forms.
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <filesystem>
+#include <optional>
+#include <string>
+
+#include "NumberedFileSystem.h"
+#include "names/HFSNames.h"
+#include "platform/HostCalls.h"
+#include "support/MountNamespace.h"
+#include "support/OtherKernel.h"
+#include "support/OwnMountNamespace.h"
+
+namespace tallowmere::test {
+namespace {
+
+// statfs(2) on the kinds' own volumes.
+constexpr std::uint32_t kHFS = 0x4244;
+constexpr std::uint32_t kHFSPlus = 0x482B;
+constexpr std::uint32_t kVfat = 0x4D44;
+constexpr std::uint32_t kExfat = 0x2011BAB0;
+constexpr std::uint32_t kExt = 0xEF53;
+
+class AnOldVolume : public testing::Test {
+ protected:
+  void Mount(std::uint32_t type) {
+    if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    mType.emplace(type);
+    mVolume.emplace(NumberedFileSystem::On::kBlockDevice, NumberedFileSystem::Case::kIgnored);
+    if (!mVolume->IsMounted()) GTEST_SKIP() << "no FUSE here, or no block device for it";
+    mNumber = InfoOf(Top()).volume;
+  }
+
+  std::string Top() const { return mVolume->Path(); }
+  std::string MakeFolder(const std::string& name) const {
+    EXPECT_EQ(mkdir((Top() + "/" + name).c_str(), 0755), 0) << name;
+    return Top() + "/" + name;
+  }
+  std::string MakeFile(const std::string& name) const {
+    EXPECT_EQ(mknod((Top() + "/" + name).c_str(), S_IFREG | 0644, 0), 0) << name;
+    return Top() + "/" + name;
+  }
+  // What a record finds.
+  std::string LookUp(const std::string& folder, std::string_view name) const {
+    return ItemOf(MakeRecord(mNumber, IDOf(folder), name));
+  }
+
+  std::optional<FuseAsType> mType;
+  std::optional<NumberedFileSystem> mVolume;
+  SInt16 mNumber = 0;
+};
+
+class WithoutLetterCase : public AnOldVolume, public testing::WithParamInterface<std::uint32_t> {
+ protected:
+  void SetUp() override { Mount(GetParam()); }
+};
+
+TEST_P(WithoutLetterCase, ARecordInAnotherCaseFindsTheItemUnderItsStoredName) {
+  const std::string path = MakeFile("Read Me");
+  EXPECT_EQ(LookUp(Top(), "Read Me"), path);
+  EXPECT_EQ(LookUp(Top(), "READ ME"), path);
+  EXPECT_EQ(LookUp(Top(), "read me"), path);
+}
+
+TEST_P(WithoutLetterCase, EachPathToAnItemHasOneRecord) {
+  MakeFolder("Folder");
+  MakeFile("Folder/Read Me");
+  const FSSpec record = SpecOf(Top() + "/Folder/Read Me");
+  for (const char* const path : {"/Folder/READ ME", "/FOLDER/read me", "/folder/Read Me"}) {
+    const FSSpec other = SpecOf(Top() + path);
+    EXPECT_EQ(NameOf(other), "Read Me") << path;
+    EXPECT_EQ(ParentOf(other), ParentOf(record)) << path;
+  }
+}
+
+TEST_P(WithoutLetterCase, AFolderOnTheWayHasItsStoredNameToo) {
+  MakeFolder("Folder");
+  const std::string inner = MakeFolder("Folder/Inner");
+  const std::string path = MakeFile("Folder/Inner/Read Me");
+  // The folders are remembered as they were asked for.
+  SpecOf(Top() + "/FOLDER/INNER/READ ME");
+  EXPECT_EQ(LookUp(inner, "read me"), path);
+  EXPECT_EQ(FolderWithID(mNumber, IDOf(Top() + "/FOLDER/INNER")), inner);
+  EXPECT_EQ(PathOf(ReferenceTo(Top() + "/folder/inner/read me")), path);
+}
+
+TEST_P(WithoutLetterCase, CatalogInformationHasTheStoredName) {
+  MakeFile("Read Me");
+  const FSRef reference = ReferenceTo(Top() + "/READ ME");
+  HFSUniStr255 name{};
+  ASSERT_EQ(FSGetCatalogInfo(&reference, kFSCatInfoNone, nullptr, &name, nullptr, nullptr), noErr);
+  EXPECT_EQ(std::u16string(name.unicode, name.unicode + name.length), u"Read Me");
+}
+
+TEST_P(WithoutLetterCase, ARecordMadeOfAnHFSNameHasTheStoredName) {
+  MakeFolder("Folder");
+  MakeFile("Folder/Read Me");
+  FSSpec record{};
+  ASSERT_EQ(FSMakeFSSpec(mNumber, 0, Str255Of(":FOLDER:READ ME").bytes, &record), noErr);
+  EXPECT_EQ(NameOf(record), "Read Me");
+  EXPECT_EQ(ItemOf(record), Top() + "/Folder/Read Me");
+}
+
+TEST_P(WithoutLetterCase, AFullPathHasTheStoredNames) {
+  MakeFolder("Folder");
+  MakeFolder("Folder/Inner");
+  Str255 name = {};
+  CInfoPBRec block = {};
+  block.dirInfo.ioNamePtr = name;
+  block.dirInfo.ioVRefNum = mNumber;
+  block.dirInfo.ioFDirIndex = -1;
+  block.dirInfo.ioDrDirID = static_cast<SInt32>(IDOf(Top() + "/FOLDER/INNER"));
+  ASSERT_EQ(PBGetCatInfoSync(&block), noErr);
+  EXPECT_EQ(names::TextOfPascal(name), "Inner");
+  block.dirInfo.ioDrDirID = block.dirInfo.ioDrParID;
+  ASSERT_EQ(PBGetCatInfoSync(&block), noErr);
+  EXPECT_EQ(names::TextOfPascal(name), "Folder");
+}
+
+TEST_P(WithoutLetterCase, AChangeOfCaseAloneIsSeen) {
+  const std::string before = MakeFile("Read Me");
+  const FSRef reference = ReferenceTo(before);
+  const std::string after = Top() + "/READ ME";
+  // At once the kernel takes both for two names of one item and does nothing.
+  std::filesystem::rename(before, Top() + "/other");
+  std::filesystem::rename(Top() + "/other", after);
+  EXPECT_EQ(PathOf(reference), after);
+  EXPECT_EQ(LookUp(Top(), "read me"), after);
+}
+
+INSTANTIATE_TEST_SUITE_P(OnEachKind, WithoutLetterCase,
+                         testing::Values(kHFS, kHFSPlus, kVfat, kExfat), [](const auto& type) {
+                           return type.param == kHFS       ? "hfs"
+                                  : type.param == kHFSPlus ? "hfsplus"
+                                  : type.param == kVfat    ? "vfat"
+                                                           : "exfat";
+                         });
+
+TEST_F(AnOldVolume, NamesInBytesAreFoundByTheSameBytes) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFS));
+  if (IsSkipped()) return;
+  const std::string path = MakeFile("caf\x8E");
+  EXPECT_EQ(LookUp(Top(), "caf\x8E"), path);
+  EXPECT_EQ(LookUp(Top(), "caf\x8F"), "(-43)");
+}
+
+TEST_F(AnOldVolume, ANameInUtf8CountsBeforeTheOneInBytes) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFS));
+  if (IsSkipped()) return;
+  MakeFile("caf\x8E");
+  const std::string text = MakeFile("caf\xC3\xA9");
+  EXPECT_EQ(LookUp(Top(), "caf\x8E"), text);
+}
+
+// The bytes of √© in Mac Roman are é in UTF-8.
+TEST_F(AnOldVolume, BytesThatAreUtf8AreNoNameInBytes) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFS));
+  if (IsSkipped()) return;
+  MakeFile("caf\xC3\xA9");
+  EXPECT_EQ(LookUp(Top(), "caf\xC3\xA9"), "(-43)");
+}
+
+TEST_F(AnOldVolume, ColonsAndSlashesAreExchangedInNamesInBytes) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFS));
+  if (IsSkipped()) return;
+  const std::string path = MakeFile("a:\x8E");
+  EXPECT_EQ(LookUp(Top(), "a/\x8E"), path);
+  EXPECT_EQ(LookUp(Top(), "a:\x8E"), "(-43)");
+}
+
+TEST_F(AnOldVolume, NamesInBytesAreLookedForOnClassicVolumesAlone) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFSPlus));
+  if (IsSkipped()) return;
+  MakeFile("caf\x8E");
+  EXPECT_EQ(LookUp(Top(), "caf\x8E"), "(-43)");
+}
+
+const std::string kLongName = "A name of more than 31 characters.aif";
+
+TEST_F(AnOldVolume, AShortFormOnRecordFindsTheItemWithItsNumber) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFSPlus));
+  if (IsSkipped()) return;
+  const std::string path = MakeFile(kLongName);
+  EXPECT_EQ(NameOf(SpecOf(path)), kLongName);
+  EXPECT_EQ(LookUp(Top(), names::ShortHFSName(kLongName, IDOf(path))), path);
+}
+
+TEST_F(AnOldVolume, AShortFormWithAnotherNumberFindsNothing) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFSPlus));
+  if (IsSkipped()) return;
+  const std::string path = MakeFile(kLongName);
+  const std::string other = MakeFile("other");
+  EXPECT_EQ(LookUp(Top(), names::ShortHFSName(kLongName, IDOf(other))), "(-43)");
+  EXPECT_EQ(LookUp(Top(), names::ShortHFSName("B" + kLongName, IDOf(path))), "(-43)");
+}
+
+TEST_F(AnOldVolume, AnItemThatIsCalledSoCountsBeforeTheShortForm) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFSPlus));
+  if (IsSkipped()) return;
+  const std::string path = MakeFile(kLongName);
+  const std::string shortForm = names::ShortHFSName(kLongName, IDOf(path));
+  const std::string literal = MakeFile(shortForm);
+  EXPECT_EQ(LookUp(Top(), shortForm), literal);
+}
+
+TEST_F(AnOldVolume, ANameOf31CharactersHadNoShortForm) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFSPlus));
+  if (IsSkipped()) return;
+  const std::string name(31, 'n');
+  const std::string path = MakeFile(name);
+  EXPECT_EQ(LookUp(Top(), names::ShortHFSName(name, IDOf(path))), "(-43)");
+}
+
+TEST_F(AnOldVolume, OnOtherVolumesALongNameHasNoShortForm) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kExt));
+  if (IsSkipped()) return;
+  const std::string path = MakeFile(kLongName);
+  EXPECT_EQ(LookUp(Top(), names::ShortHFSName(kLongName, IDOf(path))), "(-43)");
+}
+
+}  // namespace
+}  // namespace tallowmere::test
