@@ -222,15 +222,21 @@ class Cancellation(AsyncTest):
 
         self.run_with(act)
 
-    def test_a_loop_that_ends_meanwhile_leaves_nothing_behind(self) -> None:
+    def test_a_loop_that_ends_meanwhile_leaves_the_client_usable(self) -> None:
         client = aio.Client(SERVICE)
         before = descriptors()
 
-        async def main() -> None:
+        async def leave() -> None:
             asyncio.ensure_future(collect(client.batch(numbers(30000))))
             await asyncio.sleep(0.05)
 
-        asyncio.run(main())
+        async def ask() -> None:
+            self.assertEqual(await client.add_hfs_name("/nowhere", "x"), "/nowhere/x")
+
+        for _ in range(5):
+            asyncio.run(leave())
+            asyncio.run(ask())
+        asyncio.run(client.close())
         self.assertEqual(children(), [])
         self.assertEqual(descriptors(), before)
 
