@@ -1,4 +1,4 @@
-"""What is asked and answered on the two pipes, whoever moves the bytes: requests under way, and questions of a batch."""
+"""What is asked and answered on the two pipes, whoever moves the bytes: requests under way, questions of a batch."""
 
 from __future__ import annotations
 
@@ -69,7 +69,7 @@ class Conversation:
             raise ProtocolError("The service answered what it was not asked.")
 
     def fail(self, head: Waiting[Any], error: ServiceError) -> None:
-        """Gives the error to the first request under way; to head, the first before the failure, where there is none."""
+        """Gives the error to the first request under way, or where there is none to head, the first before it failed."""
         (self.pending.popleft() if self.pending else head).settle(error)
 
     def restart(self) -> None:

@@ -10,8 +10,9 @@ the item's folder. '~' is a plain character. A value of a wrong type is a TypeEr
 
 from __future__ import annotations
 
+import contextlib
 import os
-from typing import Any, List, NoReturn, Tuple, TypeVar
+from typing import Any, List, NoReturn, Optional, Tuple, TypeVar
 
 from . import request
 from ._outcome import Converted, Outcome, quoted
@@ -97,15 +98,15 @@ def path_of_hfs_path(hfs_path: HFSText) -> Conversion[str]:
             fail(Outcome.INVALID, f"The HFS path {_quoted(full)} has more than {MOST_HFS_BYTES} bytes.")
         if full.find(b":") < 1:
             fail(Outcome.INVALID, f"The HFS path {_quoted(full)} does not begin with a volume and a colon.")
-        [(result, path)] = yield [request.result_and_path(full)]
-        if result == 0 and path is not None:
-            return Converted(_single_slash(path), _outcome_of(path))
+        result, path = yield from _result_and_path(full)
+        if path is not None:
+            return Converted(path, _outcome_of(path))
         folder, colon, name = full.rpartition(b":")
         if result == _NO_ITEM and name:
-            [(result, path)] = yield [request.result_and_path(folder + colon)]
+            _, path = yield from _result_and_path(folder + colon)
             if path is not None:
-                return (yield from _in_folder(os.fsencode(_single_slash(path)), name))
-        _fail_by_result(result, full)
+                return (yield from _in_folder(os.fsencode(path), name))
+        return (yield from _fail_by_result(result, full))
 
     return Conversion(plan)
 
@@ -167,14 +168,14 @@ def _outcome_of(path: str) -> Outcome:
     return Outcome.FOUND if exists(path) else Outcome.NEW
 
 
-def _check_name(name: bytes) -> None:
+def _check_name(name: bytes, most: int = MOST_NAME_BYTES) -> None:
     """A name that an item of a folder can have, and that leads to no other one."""
     if not name or name in (b".", b".."):
         fail(Outcome.INVALID, f"An item cannot be called {_quoted(name)}.")
     if b":" in name or b"\0" in name:
         fail(Outcome.INVALID, f"The HFS name {_quoted(name)} has a character that HFS names cannot have.")
-    if len(name) > MOST_NAME_BYTES:
-        fail(Outcome.INVALID, f"The HFS name {_quoted(name)} has more than {MOST_NAME_BYTES} bytes.")
+    if len(name) > most:
+        fail(Outcome.INVALID, f"The HFS name {_quoted(name)} has more than {most} bytes.")
 
 
 def _record(place: Place, *others: Request[Any]) -> Plan[Tuple[FSSpec, List[Any]]]:
@@ -242,14 +243,25 @@ def _mounted_path(place: Place, spec: FSSpec, full: bytes) -> Plan[bytes]:
     """The path of an item on another device than its folder: a subvolume, a folder of another volume, a file mounted
     by itself, or a kernel interface, whose full path is that of an outer folder. Only the way back tells them apart."""
     [outer] = yield [request.make_full_path(place.folder)]
-    for own in ([full] if place.is_folder else []) + [outer + spec.name]:
-        [(_, back)] = yield [request.result_and_path(own)]
+    end = b":" if place.is_folder else b""
+    for own in ([full] if place.is_folder else []) + [outer + spec.name + end]:
+        _, back = yield from _result_and_path(own)
         if back is not None and _is_same(back, place):
             return bytes(own)
     if len(full) <= MOST_HFS_BYTES or not full.endswith(b":" + spec.name + b":"):
         _fail_on_no_volume(place)
     yield from _check_whole(place, full)  # too long to be led back by
     return full
+
+
+def _result_and_path(full: bytes) -> Plan[Tuple[int, Optional[str]]]:
+    """The path of a full HFS path. That of a kernel interface's folder is found without the colon at its end."""
+    [(result, path)] = yield [request.result_and_path(full)]
+    if result != 0 and full.endswith(b":") and b":" in full[:-1]:
+        [(_, folder)] = yield [request.result_and_path(full[:-1])]
+        if folder is not None and os.path.isdir(folder) and not os.path.islink(folder):
+            return 0, _single_slash(folder)
+    return result, None if path is None else _single_slash(path)
 
 
 def _is_same(path: str, place: Place) -> bool:
@@ -269,22 +281,35 @@ def _check_volume(place: Place, spec: FSSpec, full: bytes) -> Plan[None]:
 
 def _in_folder(folder: bytes, name: bytes) -> Plan[Converted[str]]:
     """The item with an HFS name in a folder, whose path has no links."""
-    _check_name(name)
+    _check_name(name, MOST_HFS_BYTES)
     plain = hfs_name_to_str(name).translate({ord("/"): ":", ord(":"): "/"}).encode()
     answer, spec = yield [request.add_hfs_name(folder, name), request.get_fsspec(os.path.join(folder, plain))]
-    if answer is None:
-        fail(Outcome.NOTHING, f"There is no item called {_quoted(name)} in {quoted(folder)}, and there cannot be one.")
+    path = None if answer is None else _single_slash(answer)
     if spec is None or spec.par_id == NOWHERE:
         fail(Outcome.NOT_A_VOLUME, f"{quoted(folder)} is on no volume.")
-    path = _single_slash(answer)
-    if os.path.dirname(os.fsencode(path)) != folder:
-        fail(Outcome.AMBIGUOUS, f"The HFS name {_quoted(name)} leads out of {quoted(folder)}.")
-    return Converted(path, _outcome_of(path))
+    if path is None or not _is_in(path, folder):
+        fail(Outcome.NOTHING, f"There is no item called {_quoted(name)} in {quoted(folder)}, and there cannot be one.")
+    outcome = _outcome_of(path)
+    if outcome is Outcome.NEW:
+        _check_name(name)
+    return Converted(path, outcome)
 
 
-def _fail_by_result(result: int, full: bytes) -> NoReturn:
-    if result == _NO_VOLUME:
-        fail(Outcome.NOT_A_VOLUME, f"No volume is called {_quoted(full.partition(b':')[0])}.")
+def _is_in(path: str, folder: bytes) -> bool:
+    """Whether path is one in that folder, which may be mounted at another place as well."""
+    holder = os.path.dirname(os.fsencode(path))
+    with contextlib.suppress(OSError):
+        return holder == folder or os.path.samefile(holder, folder)
+    return False
+
+
+def _fail_by_result(result: int, full: bytes) -> Plan[NoReturn]:
+    if result == _NO_VOLUME:  # which is told of what is in a kernel interface, too
+        volume = full.partition(b":")[0]
+        [number] = yield [request.get_vol_refnum_by_hfs_name(volume)]
+        if number is None:
+            fail(Outcome.NOT_A_VOLUME, f"No volume is called {_quoted(volume)}.")
+        fail(Outcome.NOT_A_VOLUME, f"The item with the HFS path {_quoted(full)} is on no volume.")
     if result == _NOT_PERMITTED:
         fail(Outcome.REFUSED, f"The item with the HFS path {_quoted(full)} may not be looked at.")
     if result in (_NO_ITEM, _NO_FOLDER):

@@ -104,6 +104,10 @@ class ThereAndBack(ConversionTest):
                 self.assertEqual(name_of, Converted(record.value.name, Outcome.NEW))
                 self.assertEqual(self.client.path_in_folder(self.folder, name_of.value), Converted(path, Outcome.NEW))
 
+    def test_a_long_name_finds_what_exists_in_a_folder(self) -> None:
+        path = self.make("c" * 200)
+        self.assertEqual(self.client.path_in_folder(self.folder, "c" * 200), Converted(path, Outcome.FOUND))
+
     def test_a_new_item_in_the_root_folder_has_one_slash(self) -> None:
         record = self.client.record_of("/new item?")
         self.assertEqual(self.client.path_of(record.value), Converted("/new item?", Outcome.NEW))
@@ -228,7 +232,7 @@ class Nothing(ConversionTest):
     def test_hfs_paths_that_lead_nowhere(self) -> None:
         folder = self.client.hfs_path_of(self.folder).value
         self.make("file")
-        for rest in (b"missing:", b"missing:f", b"file:f", b"missing:inner:f"):
+        for rest in (b"missing:", b"missing:f", b"missing:inner:", b"file:f", b"file:", b"missing:inner:f"):
             self.assert_error(Outcome.NOTHING, rest.decode(), self.client.path_of_hfs_path, folder + rest)
 
     def test_a_name_with_a_tilde_is_no_home_folder(self) -> None:
@@ -243,7 +247,8 @@ class Nothing(ConversionTest):
 class Invalid(ConversionTest):
     def test_what_is_no_path(self) -> None:
         for path, at_fault in (
-            ("", "empty"), ("/a\0b", "/a"), (b"/a\0b", "/a"), ("/\ud800", "characters"), ("/" + "a" * 70000, "too long"),
+            ("", "empty"), ("/a\0b", "/a"), (b"/a\0b", "/a"), ("/\ud800", "characters"),
+            ("/" + "a" * 70000, "too long"),
             (self.path("a" * 256), "too long"), ("/" + "a/" * 3000 + "f", "too long"),
         ):  # fmt: skip
             for ask in (self.client.record_of, self.client.hfs_path_of, self.client.hfs_name_of):
@@ -251,7 +256,7 @@ class Invalid(ConversionTest):
 
     def test_names_that_no_item_has(self) -> None:
         spec = self.client.record_of(self.folder).value
-        for name in (b"", b".", b"..", b"a:b", b":", b"a\0b", b"a" * 64):
+        for name in (b"", b".", b"..", b"a:b", b":", b"a\0b", b"a" * 64, b"a" * 256):
             at_fault = name.split(b"\0")[0].decode()[:200]
             self.assert_error(Outcome.INVALID, at_fault, self.client.path_in_folder, self.folder, name)
             if len(name) < 64:
@@ -305,10 +310,17 @@ class NotAVolume(ConversionTest):
 
     def test_the_folder_of_a_kernel_interface_has_its_own_path(self) -> None:
         hfs_path = self.client.hfs_path_of("/proc").value
-        self.assertTrue(hfs_path.endswith(b":proc"))
+        self.assertTrue(hfs_path.endswith(b":proc:"))
         self.assertEqual(self.client.path_of_hfs_path(hfs_path).value, "/proc")
         self.assertEqual(self.client.path_in_folder("/", "proc").value, "/proc")
         self.assertEqual(self.client.path_of(self.client.record_of("/proc").value).value, "/proc")
+
+    def test_an_hfs_path_into_a_kernel_interface_is_on_no_volume(self) -> None:
+        hfs_path = self.client.hfs_path_of("/proc").value
+        for rest in (b"version", b"new", b"sys:"):
+            self.assert_error(
+                Outcome.NOT_A_VOLUME, "is on no volume", self.client.path_of_hfs_path, hfs_path + rest
+            )  # fmt: skip
 
     def test_what_begins_with_no_volume(self) -> None:
         self.assert_error(Outcome.NOT_A_VOLUME, "no such volume", self.client.path_of_hfs_path, "no such volume:f")
@@ -365,7 +377,7 @@ class Batches(ConversionTest):
         asked = [each for path in paths for each in (conversion.hfs_path_of(path), request.get_fsspec(path),
                  conversion.record_of(path + "#1"), conversion.path_of(FSSpec(-99, 2, b"x")))]  # fmt: skip
         answers = list(self.client.batch(asked))
-        self.assertEqual([each.value for each in answers[0::4]], [self.client.hfs_path_of(path).value for path in paths])
+        self.assertEqual(answers[0::4], [self.client.hfs_path_of(path) for path in paths])
         self.assertEqual(answers[1::4], [self.client.get_fsspec(path) for path in paths])
         self.assertEqual({each.outcome for each in answers[2::4]}, {Outcome.NEW})
         self.assertEqual({each.outcome for each in answers[3::4]}, {Outcome.NOT_A_VOLUME})
@@ -474,7 +486,7 @@ class Volumes(ConversionTest):
             os.makedirs("proc/proc"); mount("--bind", "/proc", "proc/proc")
             outer = client.hfs_path_of("proc").text
             own = client.hfs_path_of("proc/proc").text
-            print(own == outer + "proc", client.path_of_hfs_path(own).value == os.path.abspath("proc/proc"))
+            print(own == outer + "proc:", client.path_of_hfs_path(own).value == os.path.abspath("proc/proc"))
             """,
         )
         self.assertEqual(said, "True True\n")

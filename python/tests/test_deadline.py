@@ -31,9 +31,8 @@ class Messages(FolderTest):
             ):  # fmt: skip
                 with self.subTest(what), self.assertRaises(DeadlineMissed) as caught:
                     ask(*arguments)
-                self.assertEqual(
-                    str(caught.exception), f"The service did not answer within 0.05 seconds when it was asked for {what}."
-                )
+                missed = "The service did not answer within 0.05 seconds when it was asked for "
+                self.assertEqual(str(caught.exception), f"{missed}{what}.")
 
     def test_a_giant_path_is_quoted_in_part(self) -> None:
         with Client(self.program("time.sleep(60)"), 0.05) as client, self.assertRaises(DeadlineMissed) as caught:
@@ -75,14 +74,18 @@ class Messages(FolderTest):
 class Mounts(FolderTest):
     TABLE = (
         b"22 27 0:21 / /proc rw - proc proc rw\n27 1 254:0 / / rw,relatime - ext4 /dev/vda rw\n"
-        b"40 27 0:40 / /a\\040b\\134c rw shared:1 master:2 - fuse.sshfs host:/x rw\nmalformed\n1 2 3:4 / relative rw - x\n"
+        b"40 27 0:40 / /a\\040b\\134c rw shared:1 master:2 - fuse.sshfs host:/x rw\n"
+        b"malformed\n1 2 3:4 / relative rw - x\n"
         b"41 27 0:41 / /proc rw - nfs4 host:/y rw\n42 27 8:1 / /disk rw - fuseblk /dev/sda rw\n"
     )
 
     def test_each_mount_point_is_there_once_the_root_first(self) -> None:
         self.assertEqual(
             mounts_in(self.TABLE),
-            [Mount(b"/", b"ext4"), Mount(b"/a b\\c", b"fuse.sshfs"), Mount(b"/proc", b"nfs4"), Mount(b"/disk", b"fuseblk")],
+            [
+                Mount(b"/", b"ext4"), Mount(b"/a b\\c", b"fuse.sshfs"), Mount(b"/proc", b"nfs4"),
+                Mount(b"/disk", b"fuseblk"),
+            ],  # fmt: skip
         )
         self.assertEqual([mount.is_served for mount in mounts_in(self.TABLE)], [False, True, True, True])
 
