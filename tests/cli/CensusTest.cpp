@@ -329,9 +329,11 @@ std::string InHexadecimal(std::string_view bytes) {
   return text.str();
 }
 
-// The path of a script that takes the place of each service, and knows these requests alone.
-std::string Impostor(const TemporaryFolder& folder, const std::vector<Exchange>& exchanges) {
-  std::string script = "#!/usr/bin/env python3\nimport os\nknown = {\n";
+// The path of a script that takes the place of each service, and knows these requests.
+std::string Impostor(const TemporaryFolder& folder, std::vector<Exchange> exchanges) {
+  // By which one service more is tried.
+  exchanges.push_back({VolumeNameRequest(0), VolumeNameResponse("Root"), ""});
+  std::string script = "#!/usr/bin/python3\nimport os\nknown = {\n";
   for (const auto& [request, answer, removed] : exchanges) {
     script += "  '" + InHexadecimal(request) + "': ('" + InHexadecimal(answer) + "', '" +
               InHexadecimal(removed) + "'),\n";
