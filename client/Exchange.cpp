@@ -1,6 +1,7 @@
 #include "client/Exchange.h"
 
 #include "client/FullPathRequest.h"
+#include "client/Quoted.h"
 #include "service/Protocol.h"
 
 namespace tallowmere::conversion {
@@ -10,13 +11,13 @@ namespace {
 std::optional<Error> WhatIsWrong(const std::string& path,
                                  const Result<answer::PathByResult>& answer) {
   if (!answer) return answer.Failure();
-  const std::string name = '"' + path + '"';
+  const std::string name = Quoted(path);
   if (answer->code != 0) {
     return Error{Outcome::kRefused, "the folders above " + name + " cannot all be looked at"};
   }
   if (IsSameItem(answer->path, path)) return std::nullopt;
   return Error{Outcome::kAmbiguous,
-               "the HFS path of " + name + " leads to \"" + answer->path + '"'};
+               "the HFS path of " + name + " leads to " + Quoted(answer->path)};
 }
 
 }  // namespace

@@ -5,22 +5,17 @@
 
 #include "client/Conversions.h"
 #include "client/NewNames.h"
+#include "client/ParentIDs.h"
+#include "client/Quoted.h"
 #include "service/Protocol.h"
 
 namespace tallowmere::conversion {
 namespace {
 
-constexpr std::int32_t kParentOfRoots = 1;     // the parent id of a volume's root folder
-constexpr std::int32_t kParentOnNoVolume = 3;  // that of what leads nowhere
-
 // Of a full path, the service leaves the outermost folders out that do not fit into this.
 constexpr std::size_t kMostBytesOfFolders = 511;
 // A folder in it: a name of Linux, and a colon.
 constexpr std::size_t kLongestFolder = NAME_MAX + 1;
-
-std::string Quoted(std::string_view text) {
-  return '"' + std::string(text) + '"';
-}
 
 Error OnNoVolume(const std::string& path) {
   return {Outcome::kNotAVolume, Quoted(path) + " is on no volume"};

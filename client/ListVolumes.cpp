@@ -4,12 +4,11 @@
 #include <utility>
 
 #include "client/Mounts.h"
+#include "client/ParentIDs.h"
+#include "client/Quoted.h"
 
 namespace tallowmere {
 namespace {
-
-// The parent id of every volume's root folder, and of nothing else.
-constexpr std::int32_t kParentOfRoots = 1;
 
 constexpr const char* kRoot = "/";
 
@@ -35,7 +34,7 @@ Result<std::vector<Volume>> ListVolumes(Client& client) {
 Result<Volume> VolumeWithName(const std::vector<Volume>& volumes, std::string_view name) {
   const auto hasName = [name](const Volume& volume) { return volume.name == name; };
   const auto first = std::find_if(volumes.begin(), volumes.end(), hasName);
-  const std::string text = '"' + Utf8OfHFSName(name) + '"';
+  const std::string text = Quoted(Utf8OfHFSName(name));
   if (first == volumes.end()) return Error{Outcome::kNotAVolume, "no volume is called " + text};
   const auto second = std::find_if(first + 1, volumes.end(), hasName);
   if (second == volumes.end()) return *first;
@@ -51,15 +50,14 @@ Result<Volume> VolumeAt(Client& client, PathView mountPoint) {
   if (record->outcome == Outcome::kFound && root.parID == kParentOfRoots) {
     return Volume{root.vRefNum, std::move(root.name), std::move(path)};
   }
-  return Error{Outcome::kNotAVolume, "no volume is mounted at \"" + path + '"'};
+  return Error{Outcome::kNotAVolume, "no volume is mounted at " + Quoted(path)};
 }
 
 Result<Volume> FindVolume(Client& client, std::string_view mountPointOrName) {
   if (mountPointOrName.starts_with('/')) return VolumeAt(client, mountPointOrName);
   const auto name = HFSNameOfUtf8(mountPointOrName);
   if (!name) {
-    return Error{Outcome::kNotAVolume,
-                 "no volume is called \"" + std::string(mountPointOrName) + '"'};
+    return Error{Outcome::kNotAVolume, "no volume is called " + Quoted(mountPointOrName)};
   }
   auto volumes = ListVolumes(client);
   return volumes ? VolumeWithName(*volumes, *name) : volumes.Failure();

@@ -4,18 +4,14 @@
 #include "client/Conversions.h"
 #include "client/FullPathRequest.h"
 #include "client/NewNames.h"
+#include "client/ParentIDs.h"
+#include "client/Quoted.h"
 #include "service/Protocol.h"
 
 namespace tallowmere::conversion {
 namespace {
 
-constexpr std::int32_t kParentOnNoVolume = 3;  // that of what leads nowhere
-
 using Path = Converted<std::string>;
-
-std::string Quoted(std::string_view text) {
-  return '"' + std::string(text) + '"';
-}
 
 Error Invalid(std::string message) {
   return {Outcome::kInvalid, std::move(message)};

@@ -12,15 +12,13 @@
 #include <system_error>
 #include <utility>
 
+#include "client/Quoted.h"
+
 namespace tallowmere {
 namespace {
 
 // Enough for the folders on the way to an item, which a listing of a tree comes back to.
 constexpr std::size_t kMostFolders = 8;
-
-std::string Quoted(std::string_view text) {
-  return '"' + std::string(text) + '"';
-}
 
 Error Failed(std::string_view path, int errorNumber) {
   const std::string reason = std::generic_category().message(errorNumber);
