@@ -124,6 +124,12 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
                  ? Verdict::kNowhere
                  : Verdict::kWrong;
     case Destination::kAnother:
+      // A question about an untrusted volume takes so long that what is told at its end may have
+      // led elsewhere at its beginning.
+      if (mNumbers == Numbers::kUntrusted && inSteps.responses.contains(response) &&
+          LeadsTo(GraphOf(last), mPlace, request.code, response).empty()) {
+        return Verdict::kNowhere;
+      }
       break;
   }
   return Verdict::kWrong;
