@@ -20,8 +20,8 @@ namespace tallowmere::catalog {
 // can differ in letter case from the stored one.
 kernel::Result<Look> LookUpHFSName(Moment& moment, const HeldFolder& folder, std::string_view name);
 
-// The HFS name, of at most `limit` bytes and in the stored letter case, by which LookUpHFSName finds
-// this very item. Returns ENOENT when there is none.
+// The HFS name, of at most `limit` bytes and in the stored letter case, by which LookUpHFSName
+// finds this very item. Returns ENOENT when there is none.
 kernel::Result<std::string> HFSNameOf(Moment& moment, const Look& found, std::size_t limit);
 
 }  // namespace tallowmere::catalog
