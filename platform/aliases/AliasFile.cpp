@@ -29,7 +29,7 @@ AliasFile Broken() {
 
 AliasFile SayingWhat(std::optional<std::string_view> resource) {
   const auto record = resource ? formats::ReadAliasRecord(*resource) : std::nullopt;
-  return record ? AliasFile{true, TargetOf(*record)} : Broken();
+  return record ? AliasFile{true, formats::AliasContent(*record)} : Broken();
 }
 
 // By Finder flags and resource fork.
@@ -53,7 +53,7 @@ Result<AliasFile> ReadBookmarkOf(const catalog::Look& file, const kernel::Descri
       contents, 0, static_cast<std::size_t>(std::min<std::uint64_t>(*size, kLongestBookmark)));
   if (!data) return data.Error();
   const auto bookmark = formats::ReadBookmarkFile(*data);
-  if (bookmark) return AliasFile{true, TargetOf(*bookmark)};
+  if (bookmark) return AliasFile{true, formats::AliasContent(*bookmark)};
   auto record = ReadRecordOf(file, contents);
   return record && record->isAlias ? record : Broken();
 }

@@ -8,8 +8,8 @@
 
 #include <optional>
 
-#include "aliases/Target.h"
 #include "catalog/Moment.h"
+#include "formats/Recognition.h"
 #include "kernel/Result.h"
 
 namespace tallowmere::aliases {
@@ -19,7 +19,7 @@ inline constexpr kernel::Error kBroken{-5};
 
 struct AliasFile {
   bool isAlias = false;
-  kernel::Result<Target> target = kBroken;  // kBroken where it is none, too
+  kernel::Result<formats::AliasContent> content = kBroken;  // kBroken where it is none, too
 };
 
 // What a file is; the kernel's error where it may not be read. Of a file that is no alias, mostly

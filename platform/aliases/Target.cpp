@@ -265,6 +265,10 @@ Target TargetOf(const Bookmark& bookmark) {
   return target;
 }
 
+Target TargetOf(const formats::AliasContent& content) {
+  return std::visit([](const auto& read) { return TargetOf(read); }, content);
+}
+
 bool IsBirthOf(const Creation& creation, std::int64_t birthSeconds) {
   constexpr std::int64_t kQuarter = 15 * 60;
   constexpr std::int64_t kFarthest = 14 * 60 * 60;

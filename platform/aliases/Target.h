@@ -12,8 +12,7 @@
 #include <string_view>
 #include <vector>
 
-#include "formats/AliasRecord.h"
-#include "formats/Bookmark.h"
+#include "formats/Recognition.h"
 #include "kernel/Item.h"
 
 namespace tallowmere::aliases {
@@ -67,6 +66,7 @@ struct Target {
 
 Target TargetOf(const formats::AliasRecord& record);
 Target TargetOf(const formats::Bookmark& bookmark);
+Target TargetOf(const formats::AliasContent& content);
 
 // Whether an item born then, in seconds since 1970, is the one that was created: in the same
 // second, or where the time zone is not known different by whole quarters of an hour, at most 14

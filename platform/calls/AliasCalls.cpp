@@ -61,8 +61,8 @@ class Chain {
       if (!read->isAlias) return target;
       mWasAliased = true;
       if (step == kMostSteps) break;
-      if (!read->target) return read->target.Error();
-      const auto resolved = aliases::Resolve(mMoment, &at, *read->target);
+      if (!read->content) return read->content.Error();
+      const auto resolved = aliases::Resolve(mMoment, &at, aliases::TargetOf(*read->content));
       if (!resolved) return resolved.Error();
       target = resolved->item;
       if (!isWhole || !S_ISREG(target->item.type)) return target;
@@ -78,10 +78,6 @@ class Chain {
   bool mWasAliased = false;
 };
 
-OSErr CodeOf(kernel::Error error) {
-  return error == aliases::kBroken ? static_cast<OSErr>(paramErr) : ResultCodeOf(error);
-}
-
 struct Answer {
   OSErr code;
   bool targetIsFolder;
@@ -95,7 +91,7 @@ Answer Resolve(catalog::Moment& moment, FSRef& item, const kernel::Item& referen
   if (!file) return {ResultCodeOf(file.Error()), false, false};
   Chain chain(moment);
   const auto target = chain.Follow(*file, isWhole);
-  if (!target) return {CodeOf(target.Error()), false, chain.WasAliased()};
+  if (!target) return {ResultCodeOfAlias(target.Error()), false, chain.WasAliased()};
   if (!*target) return {noErr, false, false};
   item = ReferenceTo(moment, **target);
   return {noErr, kernel::IsFolder((*target)->item), true};

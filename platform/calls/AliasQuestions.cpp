@@ -203,7 +203,7 @@ Answer LookAtContent(catalog::Moment& moment, const catalog::Look& file) {
 }
 
 Answer LookAt(catalog::Moment& moment, const std::string& path) {
-  const auto folder = moment.HoldHolderOf(path);
+  const auto folder = moment.HoldParentOf(path);
   if (!folder) return Failed(calls::ResultCodeOfFolder(folder.Error()));
   const auto file = moment.LookUp(*folder, *foundation::LastComponent(path));
   if (!file) return Failed(calls::ResultCodeOf(file.Error()));

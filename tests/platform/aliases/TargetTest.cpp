@@ -21,7 +21,7 @@ constexpr std::int64_t k1904 = -(66 * 365 + 17) * kDay;  // in seconds since 197
 Target TargetOf(const RecordToWrite& record) {
   const auto read = formats::ReadAliasRecord(test::Write(record));
   EXPECT_TRUE(read);
-  return TargetOf(*read);
+  return aliases::TargetOf(*read);
 }
 
 // --- Dates --------------------------------------------------------------------------------------
