@@ -152,7 +152,8 @@ void PrintAsJson(const std::string& item, const Answer& answer) {
   nlohmann::ordered_json json;
   json["alias"] = Utf8OfAnyBytes(item);
   if (answer.description) {
-    for (const Field& field : Fields(*answer.description).All()) json[field.key] = field.value;
+    const Fields fields(*answer.description);
+    for (const Field& field : fields.All()) json[field.key] = field.value;
   }
   json["exists"] = answer.result == noErr;
   if (answer.result == noErr) {
@@ -172,7 +173,8 @@ void PrintLine(std::string_view words, const std::string& value) {
 
 void PrintAsText(const std::string& item, const Answer& answer) {
   std::cout << Printable(item) << '\n';
-  for (const Field& field : Fields(*answer.description).All()) {
+  const Fields fields(*answer.description);
+  for (const Field& field : fields.All()) {
     PrintLine(field.words, field.value.is_string()
                                ? Printable(field.value.get_ref<const std::string&>())
                                : field.value.dump());

@@ -12,6 +12,7 @@ _tallowmere_cli() {
     [append]='-0 --null --json'
     [aiff]='--rate --bits --channels --format --output --json'
     [census]='--json'
+    [alias]='--hex -0 --null --json'
     [serve-check]='--json'
   )
   # The command is the first word that is neither an option nor the value of one. In "--option=value",

@@ -43,7 +43,7 @@ struct Printed {
   std::string errors;
   int status;
 };
-Printed Run(std::vector<std::string> arguments, const std::string& input = "") {
+Printed RunAlias(std::vector<std::string> arguments, const std::string& input = "") {
   arguments.insert(arguments.begin(), "alias");
   ChildProgram cli(TALLOWMERE_CLI, arguments);
   cli.Write(input);
@@ -56,7 +56,7 @@ Printed Run(std::vector<std::string> arguments, const std::string& input = "") {
 }
 
 json JsonOf(const std::string& file) {
-  return json::parse(Run({"--json", file}).output);
+  return json::parse(RunAlias({"--json", file}).output);
 }
 
 TEST(AliasCommand, ShowsWhatARecordSays) {
@@ -110,13 +110,13 @@ TEST(AliasCommand, TellsWhereAnAliasFileLeads) {
   EXPECT_EQ(shown["exists"], true);
   EXPECT_EQ(shown["target"], target);
   EXPECT_EQ(shown["found_by"], "levels");
-  const Printed text = Run({alias});
+  const Printed text = RunAlias({alias});
   EXPECT_EQ(text.status, 0);
   EXPECT_THAT(text.output, HasSubstr("leads to          " + target + " (by levels)\n"));
 }
 
 TEST(AliasCommand, ReadsHexadecimalDigits) {
-  const Printed shown = Run({"--hex", "--json", Hex(Write(Record()))});
+  const Printed shown = RunAlias({"--hex", "--json", Hex(Write(Record()))});
   EXPECT_EQ(json::parse(shown.output)["id"], 42);
   EXPECT_EQ(shown.status, 1);
 }
@@ -125,7 +125,7 @@ TEST(AliasCommand, ReadsItemsFromStandardInputAndCounts) {
   const TemporaryFolder folder;
   const std::string record = folder.MakeFile("record", Write(Record()));
   const Printed shown =
-      Run({"--json", "-"}, record + "\n" + folder.MakeFile("other", "x").string());
+      RunAlias({"--json", "-"}, record + "\n" + folder.MakeFile("other", "x").string());
   EXPECT_THAT(shown.output, HasSubstr("its volume is not mounted"));
   EXPECT_THAT(shown.output, HasSubstr("no alias, or a broken one"));
   EXPECT_EQ(shown.errors, "0 of 2 lead to an item\n");
@@ -135,12 +135,12 @@ TEST(AliasCommand, ComplainsOfWhatIsNone) {
   const TemporaryFolder folder;
   for (const std::string& item : {folder.MakeFile("x", "text").string(),
                                   (folder.Path() / "none").string(), folder.Path().string()}) {
-    const Printed shown = Run({item});
+    const Printed shown = RunAlias({item});
     EXPECT_EQ(shown.output, "");
     EXPECT_THAT(shown.errors, HasSubstr(item));
     EXPECT_EQ(shown.status, 1);
   }
-  EXPECT_EQ(Run({"--hex", "no digits"}).status, 1);
+  EXPECT_EQ(RunAlias({"--hex", "no digits"}).status, 1);
 }
 
 }  // namespace
