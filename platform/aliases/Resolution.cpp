@@ -56,7 +56,7 @@ class Findings {
     return Rank(other) > Rank(one) ? other : one;
   }
 
-  // Numbers that do not tell items apart: then their places do.
+  // By their places too: there are volumes whose numbers do not tell items apart.
   static bool AreSame(const Sighting& first, const Sighting& second) {
     return kernel::HaveSameNumbers(first.item, second.item) && first.path == second.path;
   }

@@ -19,7 +19,7 @@ using namespace tallowmere::calls;
 
 namespace {
 
-// As long as the longest chain.
+// Of a chain: a longer one counts as a ring.
 constexpr int kMostSteps = 64;
 
 // The item of a reference in the folder that holds it now. kNoVolume for what is on none.
@@ -44,14 +44,14 @@ kernel::Result<catalog::Look> LookAt(catalog::Moment& moment, const catalog::Sig
   return look;
 }
 
-// Follows an alias file to its target; with `chain` on, as long as that is one too.
+// Follows an alias file to its target, and as long as that is one too.
 class Chain {
  public:
   explicit Chain(catalog::Moment& moment) : mMoment(moment) {}
 
   bool WasAliased() const { return mWasAliased; }
 
-  // The last item; nullopt when the file is no alias.
+  // The last target, or with `isWhole` false the first; nullopt when the file is no alias.
   kernel::Result<std::optional<catalog::Sighting>> Follow(const catalog::Look& file, bool isWhole) {
     std::optional<catalog::Sighting> target;
     catalog::Look at = file;
