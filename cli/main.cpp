@@ -14,6 +14,7 @@
 #include <utility>
 #include <vector>
 
+#include "cli/Aliases.h"
 #include "cli/Commands.h"
 #include "cli/Nearest.h"
 #include "cli/Output.h"
@@ -326,6 +327,17 @@ void CommandLine::AddTheOthers() {
   AddJson(command);
   AddQuiet(command);
   command->add_option("folder", a.folder, "The folder")->required()->check(CLI::ExistingDirectory);
+
+  command = AddForItems(
+      "alias", "Print what each alias file, record or bookmark says, and where it leads now",
+      "  tallowmere-cli alias 'Old Disk/Mix alias'\n"
+      "  tallowmere-cli alias --hex --json - <records",
+      [&a] {
+        const Format& format = a.items.format;
+        return PrintAliases({a.items.items, a.asHex, format.isJson, format.Separator()});
+      });
+  AddItems(command, "file", "Alias files, or files with a record or bookmark");
+  command->add_flag("--hex", a.asHex, "The items are bytes as hexadecimal digits");
 
   AddJson(Add("serve-check", "Start the service and try each request",
               "  tallowmere-cli serve-check",

@@ -1,6 +1,6 @@
 # Completions of tallowmere-cli for fish.
 
-set -l commands volumes identify spec path hfs posix name append aiff census serve-check help
+set -l commands volumes identify spec path hfs posix name append aiff census alias serve-check help
 set -l no_command "not __fish_seen_subcommand_from $commands"
 complete -c tallowmere-cli -n $no_command -f
 
@@ -19,11 +19,12 @@ complete -c tallowmere-cli -n $no_command -a name -d 'HFS name of each path'
 complete -c tallowmere-cli -n $no_command -a append -d 'Path of each HFS name in a folder'
 complete -c tallowmere-cli -n $no_command -a aiff -d 'Settings that export a sound to AIFF files'
 complete -c tallowmere-cli -n $no_command -a census -d 'Check that each item of a folder comes back'
+complete -c tallowmere-cli -n $no_command -a alias -d 'What alias files and records say, and where they lead'
 complete -c tallowmere-cli -n $no_command -a serve-check -d 'Exercise each request of the service'
 complete -c tallowmere-cli -n $no_command -a help -d 'Help for a command'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from help' -f -a "$commands"
 
-set -l with_items '__fish_seen_subcommand_from identify spec path hfs posix name append'
+set -l with_items '__fish_seen_subcommand_from identify spec path hfs posix name append alias'
 complete -c tallowmere-cli -n $with_items -s 0 -l null -d 'Items end with a NUL'
 complete -c tallowmere-cli -n $with_items -l null-output -d 'Results end with a NUL'
 complete -c tallowmere-cli -n $with_items -l existing -d 'Fail for what is new'
@@ -33,6 +34,7 @@ for condition in $with_items '__fish_seen_subcommand_from census'
 end
 complete -c tallowmere-cli -n "__fish_seen_subcommand_from $commands; and not __fish_seen_subcommand_from help" -l json -d 'One JSON object a line'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from spec' -l hex -d 'The 70 bytes as hexadecimal digits'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from alias' -l hex -d 'The items are hexadecimal digits'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l other-volumes -d 'Look on the other volumes too'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l volume -r -F -d 'Volume of all records'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path posix' -l volumes -r -F -d 'Table of old volumes'

@@ -1,5 +1,7 @@
 #include "calls/ResultCodes.h"
 
+#include "aliases/AliasFile.h"
+
 namespace tallowmere::calls {
 
 OSErr ResultCodeOf(kernel::Error error) {
@@ -12,6 +14,10 @@ OSErr ResultCodeOf(kernel::Error error) {
 OSErr ResultCodeOfFolder(kernel::Error error) {
   const OSErr code = ResultCodeOf(error);
   return code == fnfErr ? static_cast<OSErr>(dirNFErr) : code;
+}
+
+OSErr ResultCodeOfAlias(kernel::Error error) {
+  return error == aliases::kBroken ? static_cast<OSErr>(paramErr) : ResultCodeOf(error);
 }
 
 }  // namespace tallowmere::calls

@@ -19,4 +19,7 @@ OSErr ResultCodeOf(kernel::Error error);
 // The code for a folder on the way: if nothing is there, dirNFErr.
 OSErr ResultCodeOfFolder(kernel::Error error);
 
+// The code for an alias: paramErr for one that is broken.
+OSErr ResultCodeOfAlias(kernel::Error error);
+
 }  // namespace tallowmere::calls

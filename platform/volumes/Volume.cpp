@@ -3,10 +3,13 @@
 #include <algorithm>
 #include <utility>
 
+#include "foundation/ColonsAndSlashes.h"
 #include "foundation/PathText.h"
 #include "kernel/MountTableFile.h"
 #include "kernel/VolumeFacts.h"
 #include "names/HFSNames.h"
+#include "text/FileNameText.h"
+#include "text/MacRoman.h"
 
 namespace tallowmere::volumes {
 namespace {
@@ -104,6 +107,16 @@ kernel::Result<std::string_view> ListedVolume::Name() const {
   mName = HFSNameOfVolume(isLabelled ? *label : kUnlabelledRoot);
   mIsNameKnown = static_cast<bool>(label);
   return std::string_view(mName);
+}
+
+kernel::Result<std::u16string> ListedVolume::FullName() const {
+  if (MountPoint() != "/") {
+    return foundation::ExchangeColonsAndSlashes(
+        text::TextOfFileName(*foundation::LastComponent(MountPoint())));
+  }
+  const auto name = Name();
+  if (!name) return name.Error();
+  return text::DecodeMacRoman(*name);
 }
 
 kernel::Result<VolumePointer> ListedVolume::Enter() const {

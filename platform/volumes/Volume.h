@@ -115,6 +115,13 @@ class ListedVolume : public std::enable_shared_from_this<ListedVolume> {
   // Returns an error when the process lacks descriptors or memory to find out.
   kernel::Result<std::string_view> Name() const;
 
+  // The name without that limit, in UTF-16, of characters that Mac Roman lacks as well; but the
+  // label of "/" as Name() has it.
+  kernel::Result<std::u16string> FullName() const;
+
+  // The type in the mount table: "ext4", "vfat", …
+  const std::string& MountedType() const { return mPlaces.front().mount.type; }
+
   // The volume with its root folder, which is read on first use. Returns kMoved when something else
   // is at the mount point, otherwise the kernel's error.
   kernel::Result<VolumePointer> Enter() const;

@@ -5,6 +5,7 @@
 
 #include "TestReferences.h"
 #include "platform/foundation/TestGenerators.h"
+#include "support/OldFormats.h"
 
 namespace tallowmere::test {
 namespace {
@@ -353,6 +354,65 @@ TEST_F(ResolveAlias, OfALinkNamesItsTarget) {
   EXPECT_TRUE(folder.ResolveAlias(true));
   EXPECT_EQ(PathOf(folder), mFolder.Path() / "folder");
   EXPECT_TRUE(IsMarkedAsFolder(folder));
+}
+
+// An alias file with a record that leads to a name in its own folder.
+void MakeAliasIn(const TemporaryFolder& folder, const std::string& name, const std::string& target,
+                 bool isFolder = false) {
+  RecordToWrite record;
+  record.kind = isFolder ? 1 : 0;
+  record.volumeName = "Elsewhere";
+  record.name = target;
+  record.levelsUp = record.levelsDown = 1;
+  record.tags = {{18, target}};
+  folder.MakeFile(name);
+  folder.MakeFile("._" + name, WriteSidecarOfAlias(Write(record)));
+}
+
+TEST_F(ResolveAlias, OfAnAliasFileNamesItsTarget) {
+  mFolder.MakeFile("x");
+  mFolder.MakeFolder("folder");
+  MakeAliasIn(mFolder, "file alias", "x");
+  MakeAliasIn(mFolder, "folder alias", "folder", true);
+  CFileRef file = At("file alias");
+  EXPECT_TRUE(file.ResolveAlias(false));
+  EXPECT_EQ(PathOf(file), mFolder.Path() / "x");
+  EXPECT_FALSE(IsMarkedAsFolder(file));
+  EXPECT_TRUE(IsZero(CachedFSRefOf(file)));
+  CFileRef folder = At("folder alias");
+  EXPECT_TRUE(folder.ResolveAlias(true));
+  EXPECT_EQ(PathOf(folder), mFolder.Path() / "folder");
+  EXPECT_TRUE(IsMarkedAsFolder(folder));
+}
+
+TEST_F(ResolveAlias, FollowsAChainOfAliasFilesToItsEnd) {
+  mFolder.MakeFile("x");
+  MakeAliasIn(mFolder, "first", "second");
+  MakeAliasIn(mFolder, "second", "x");
+  CFileRef reference = At("first");
+  EXPECT_TRUE(reference.ResolveAlias(false));
+  EXPECT_EQ(PathOf(reference), mFolder.Path() / "x");
+}
+
+TEST_F(ResolveAlias, OfAnAliasFileWithoutATargetChangesNothing) {
+  MakeAliasIn(mFolder, "alias", "none");
+  MakeAliasIn(mFolder, "ring", "ring");
+  for (const char* const name : {"alias", "ring"}) {
+    CFileRef reference = At(name);
+    const CFURLRef url = UrlOf(reference);
+    EXPECT_FALSE(reference.ResolveAlias(false));
+    EXPECT_EQ(UrlOf(reference), url);
+    EXPECT_FALSE(IsZero(CachedFSRefOf(reference)));
+  }
+}
+
+TEST_F(ResolveAlias, OfALinkToAnAliasFileNamesTheAliasFile) {
+  mFolder.MakeFile("x");
+  MakeAliasIn(mFolder, "alias", "x");
+  mFolder.MakeLink("link", mFolder.Path() / "alias");
+  CFileRef reference = At("link");
+  EXPECT_TRUE(reference.ResolveAlias(false));
+  EXPECT_EQ(PathOf(reference), mFolder.Path() / "alias");
 }
 
 TEST_F(ResolveAlias, OfADanglingLinkNamesWhatIsNotThere) {

@@ -1,9 +1,11 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <fstream>
 #include <vector>
 
 #include "HFSBridgeSupport.h"
+#include "support/OldFormats.h"
 
 namespace tallowmere::test {
 namespace {
@@ -287,11 +289,46 @@ TEST(ReferenceOfAnySpec, NullIsAnEmptyReferenceInEveryWay) {
   EXPECT_TRUE(IsEmpty(ref));
 }
 
-// No file here is an alias, a link is none either: each form names the item itself.
+// A link is no alias: each form names it itself.
 TEST_F(ReferenceOfSpec, ALinkIsNamedItselfInEveryWay) {
   std::filesystem::create_symlink(mData->MakeFile("file"), mData->Path("link"));
   for (const CFileRef& ref : AllRefsOf(Spec(mData->Number(), 2, "link"))) {
     EXPECT_EQ(PathOf(ref), mData->Path("link"));
+  }
+}
+
+// An alias file beside the target to which its record leads.
+void MakeAlias(const std::string& path, const std::string& target) {
+  RecordToWrite record;
+  record.volumeName = "Elsewhere";
+  record.name = target;
+  record.levelsUp = record.levelsDown = 1;
+  record.tags = {{18, target}};
+  const std::size_t name = path.rfind('/') + 1;
+  std::ofstream(path).flush();
+  std::ofstream(path.substr(0, name) + "._" + path.substr(name), std::ios::binary)
+      << WriteSidecarOfAlias(Write(record));
+}
+
+TEST_F(ReferenceOfSpec, AnAliasFileIsNamedItselfInEveryWayButByAPointerToWriteTo) {
+  mData->MakeFile("file");
+  MakeAlias(mData->Path("alias"), "file");
+  const auto refs = AllRefsOf(Spec(mData->Number(), 2, "alias"));
+  EXPECT_EQ(PathOf(refs[0]), mData->Path("file"));
+  for (std::size_t i = 1; i < refs.size(); ++i) EXPECT_EQ(PathOf(refs[i]), mData->Path("alias"));
+}
+
+TEST_F(ReferenceOfSpec, AChainOfAliasFilesIsNamedByItsEnd) {
+  mData->MakeFile("file");
+  MakeAlias(mData->Path("first"), "second");
+  MakeAlias(mData->Path("second"), "file");
+  EXPECT_EQ(PathOf(AllRefsOf(Spec(mData->Number(), 2, "first"))[0]), mData->Path("file"));
+}
+
+TEST_F(ReferenceOfSpec, AnAliasFileWithoutATargetIsNamedItself) {
+  MakeAlias(mData->Path("alias"), "none");
+  for (const CFileRef& ref : AllRefsOf(Spec(mData->Number(), 2, "alias"))) {
+    EXPECT_EQ(PathOf(ref), mData->Path("alias"));
   }
 }
 

@@ -176,6 +176,13 @@ void* ReturnAtOnce(void*) {
 
 void TryWhatIsNeeded() {
   Tell("needed/read", open("file", O_RDONLY));
+  const int file = open("file", O_RDONLY | O_NOFOLLOW | O_NOATIME);
+  Tell("needed/read-without-a-trace", file);
+  char value[1];
+  const ssize_t size = fgetxattr(file, "user.none", value, sizeof value);
+  const bool isAnswered = size < 0 && (errno == ENODATA || errno == EOPNOTSUPP);
+  Tell("needed/ask-for-an-attribute", isAnswered ? 0 : -1);
+  Tell("needed/read-a-link", readlink("/proc/self/exe", value, sizeof value));
   Tell("needed/list", open(".", O_RDONLY | O_DIRECTORY));
   const int local = socket(AF_UNIX, SOCK_STREAM, 0);
   const sockaddr_un place = Address("socket");

@@ -35,19 +35,6 @@ std::string Padded(std::string bytes, std::size_t block) {
   return bytes;
 }
 
-// CRC-16 of XMODEM, by the long division of the whole text with 16 zero bits behind it.
-std::uint16_t Checksum(const std::string& bytes) {
-  std::uint32_t rest = 0;
-  const std::string text = bytes + Zeros(2);
-  for (const char byte : text) {
-    for (int bit = 7; bit >= 0; --bit) {
-      rest = rest << 1 | (static_cast<unsigned char>(byte) >> bit & 1U);
-      if ((rest & 0x10000) != 0) rest ^= 0x11021;
-    }
-  }
-  return static_cast<std::uint16_t>(rest);
-}
-
 }  // namespace
 
 std::string Big(std::uint64_t number, int count) {
@@ -119,6 +106,24 @@ std::string WriteAppleDouble(const std::vector<std::pair<std::uint32_t, std::str
     content += bytes;
   }
   return head + content;
+}
+
+std::string WriteSidecarOfAlias(const std::string& record) {
+  const std::string fork = WriteResourceFork({{"icns", -16455, "icon"}, {"alis", 0, record}});
+  return WriteAppleDouble({{9, FinderInfo(kAliasFlag)}, {2, fork}});
+}
+
+// By the long division of the whole text with 16 zero bits behind it.
+std::uint16_t Checksum(const std::string& bytes) {
+  std::uint32_t rest = 0;
+  const std::string text = bytes + Zeros(2);
+  for (const char byte : text) {
+    for (int bit = 7; bit >= 0; --bit) {
+      rest = rest << 1 | (static_cast<unsigned char>(byte) >> bit & 1U);
+      if ((rest & 0x10000) != 0) rest ^= 0x11021;
+    }
+  }
+  return static_cast<std::uint16_t>(rest);
 }
 
 std::string Write(const MacBinaryToWrite& file) {

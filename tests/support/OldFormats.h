@@ -62,6 +62,13 @@ inline constexpr std::uint16_t kAliasFlag = 0x8000;
 std::string WriteAppleDouble(const std::vector<std::pair<std::uint32_t, std::string>>& entries,
                              std::uint32_t magic = 0x00051607);
 
+// What stands beside an empty file that is an alias with this record: AppleDouble with flag and
+// fork.
+std::string WriteSidecarOfAlias(const std::string& record);
+
+// The checksum of a MacBinary header: CRC-16 of XMODEM.
+std::uint16_t Checksum(const std::string& bytes);
+
 struct MacBinaryToWrite {
   std::string name = "alias";
   std::uint16_t finderFlags = kAliasFlag;

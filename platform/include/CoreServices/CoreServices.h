@@ -160,19 +160,29 @@ OSErr PBGetCatInfoSync(CInfoPBPtr paramBlock);
 
 // --- Aliases ----------------------------------------------------------------------------------
 //
-// Only a Finder alias is an alias, and Linux has none: a symbolic link is not an alias.
+// A file is an alias when it holds a bookmark, or an alias record in its resource fork, wherever Linux
+// keeps that; docs/platform.md has the rules by which its target is found. A symbolic link is not an
+// alias.
 
 enum : unsigned long { kResolveAliasFileNoUI = 1 };
 
-// Replaces the alias `item` by its target; with `resolveAliasChains`, by the last target of a
-// chain. Stores, each unless null, whether the target is a folder and whether `item` was an alias.
-// It never is, so noErr leaves `item` as it is, without checking that it still exists. Returns
-// fnfErr and writes nothing when `item` is null or no item.
+// Replaces the alias file `item` by its target; with `resolveAliasChains`, by the last target of a
+// chain of at most 64 steps. Stores, each unless null, whether the item that `item` refers to in the
+// end is a folder, and whether `item` was an alias, also when its target is not found. `item` stays
+// as it is when it is no alias (noErr) and on every error:
+//
+//   fnfErr           no such target, or it is not certain which it is; no such item; a ring
+//   dirNFErr         a folder on the way is missing
+//   nsvErr           its volume is not mounted
+//   paramErr         the record or bookmark is broken
+//   afpAccessDenied  permission refused, for the file or for its target
+//
+// Nothing is stored when `item` is null or no item: fnfErr.
 OSErr FSResolveAliasFile(FSRef* item, Boolean resolveAliasChains, Boolean* targetIsFolder,
                          Boolean* wasAliased);
 
-// The same; `mountFlags` (0 or kResolveAliasFileNoUI) determines whether mounting a volume may ask
-// the user.
+// The same: nothing is ever mounted and nobody asked, whatever `mountFlags` (0 or
+// kResolveAliasFileNoUI).
 OSErr FSResolveAliasFileWithMountFlags(FSRef* item, Boolean resolveAliasChains,
                                        Boolean* targetIsFolder, Boolean* wasAliased,
                                        unsigned long mountFlags);
