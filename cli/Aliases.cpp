@@ -1,6 +1,7 @@
 #include "cli/Aliases.h"
 
 #include <Tallowmere/Aliases.h>
+#include <tallowmere/Outcome.h>
 
 #include <array>
 #include <cerrno>
@@ -84,6 +85,22 @@ std::string_view ReasonOf(OSErr result, bool isAlias) {
   }
 }
 
+Outcome OutcomeOf(OSErr result) {
+  switch (result) {
+    case noErr:
+      return Outcome::kFound;
+    case nsvErr:
+      return Outcome::kNotAVolume;
+    case fnfErr:
+    case dirNFErr:
+      return Outcome::kNothing;
+    case paramErr:
+      return Outcome::kInvalid;
+    default:
+      return Outcome::kRefused;
+  }
+}
+
 // ISO 8601; with a Z where the time zone is known.
 std::string TextOf(const alias::Date& date) {
   const auto seconds = static_cast<std::time_t>(date.seconds);
@@ -155,11 +172,12 @@ void PrintAsJson(const std::string& item, const Answer& answer) {
     const Fields fields(*answer.description);
     for (const Field& field : fields.All()) json[field.key] = field.value;
   }
+  json["status"] = Name(OutcomeOf(answer.result));
   json["exists"] = answer.result == noErr;
   if (answer.result == noErr) {
     json["target"] = Utf8OfAnyBytes(answer.path);
     json["is_folder"] = answer.isFolder;
-    json["found_by"] = NameOf(answer.found);
+    json["by"] = NameOf(answer.found);
   } else {
     json["error"] = ReasonOf(answer.result, answer.description.has_value());
   }
@@ -212,9 +230,9 @@ Answer AnswerTo(const std::string& item, bool isHex) {
   return alias::LookAtFile(std::filesystem::absolute(item, ignored).lexically_normal().string());
 }
 
-bool Print(const std::string& item, const AliasesToShow& aliases) {
-  const Answer answer = AnswerTo(item, aliases.areHex);
-  if (aliases.isJson) {
+bool Print(const std::string& item, bool isHex, bool isJson) {
+  const Answer answer = AnswerTo(item, isHex);
+  if (isJson) {
     PrintAsJson(item, answer);
   } else if (answer.description) {
     PrintAsText(item, answer);
@@ -226,19 +244,19 @@ bool Print(const std::string& item, const AliasesToShow& aliases) {
 
 }  // namespace
 
-int PrintAliases(const AliasesToShow& aliases) {
-  Items items(aliases.items, aliases.separator);
+int PrintAliases(const std::vector<std::string>& arguments, const Format& format, bool areHex) {
+  Items items(arguments, format.InputEnd());
   std::size_t count = 0;
   std::size_t found = 0;
   while (const auto item = items.Next([] { std::cout.flush(); })) {
     ++count;
-    found += Print(*item, aliases) ? 1U : 0U;
+    found += Print(*item, areHex, format.isJson) ? 1U : 0U;
   }
   if (items.ReadError() != 0) {
     Complain("standard input: " + std::generic_category().message(items.ReadError()));
     return kFailed;
   }
-  if (count > 1) std::cerr << found << " of " << count << " lead to an item\n";
+  if (count > 1 && !format.isQuiet) std::cerr << found << " of " << count << " lead to an item\n";
   return FinishOutput(found == count ? 0 : kFailed);
 }
 

@@ -5,17 +5,14 @@
 #include <string>
 #include <vector>
 
+#include "cli/Format.h"
+
 namespace tallowmere::cli {
 
-struct AliasesToShow {
-  std::vector<std::string> items;  // arguments; a single "-" stands for those on standard input
-  bool areHex = false;  // bytes as hexadecimal digits, with any blanks between; else files
-  bool isJson = false;
-  char separator = '\n';  // of items on standard input
-};
-
-// Prints each, and with more than one a line with counts on standard error. Returns 1 when one of
-// them is none or its target is not found.
-int PrintAliases(const AliasesToShow& aliases);
+// Prints each of `items`: alias files or, if `areHex`, bytes as hexadecimal digits with any blanks
+// between. A single "-" stands for the items on standard input. With more than one, prints counts
+// on standard error unless the format is quiet. Returns 1 when one of them is no alias, or its
+// target is not found.
+int PrintAliases(const std::vector<std::string>& items, const Format& format, bool areHex);
 
 }  // namespace tallowmere::cli

@@ -158,14 +158,18 @@ class CommandLine {
                         const std::string& examples, std::function<int()> run) {
     CLI::App* const command = Add(name, what, examples, std::move(run));
     AddJson(command);
+    AddNullInput(command);
     Format& format = mArguments.items.format;
-    command->add_flag("-0,--null", format.hasNullInput,
-                      "Items of standard input end with a NUL, not a newline");
     command->add_flag("--null-output", format.hasNullOutput,
                       "Results end with a NUL, not a newline; JSON is lines all the same");
     command->add_flag("--existing", format.isExistingOnly, "Fail for what does not exist");
     AddQuiet(command);
     return command;
+  }
+
+  void AddNullInput(CLI::App* command) {
+    command->add_flag("-0,--null", mArguments.items.format.hasNullInput,
+                      "Items of standard input end with a NUL, not a newline");
   }
 
   void AddQuiet(CLI::App* command) {
@@ -328,14 +332,14 @@ void CommandLine::AddTheOthers() {
   AddQuiet(command);
   command->add_option("folder", a.folder, "The folder")->required()->check(CLI::ExistingDirectory);
 
-  command = AddForItems(
-      "alias", "Print what each alias file, record or bookmark says, and where it leads now",
-      "  tallowmere-cli alias 'Old Disk/Mix alias'\n"
-      "  tallowmere-cli alias --hex --json - <records",
-      [&a] {
-        const Format& format = a.items.format;
-        return PrintAliases({a.items.items, a.asHex, format.isJson, format.Separator()});
-      });
+  command =
+      Add("alias", "Print what each alias file, record or bookmark says, and where it leads now",
+          "  tallowmere-cli alias 'Old Disk/Mix alias'\n"
+          "  tallowmere-cli alias --hex --json - <records",
+          [&a] { return PrintAliases(a.items.items, a.items.format, a.asHex); });
+  AddJson(command);
+  AddNullInput(command);
+  command->add_flag("-q,--quiet", a.items.format.isQuiet, "No summary");
   AddItems(command, "file", "Alias files, or files with a record or bookmark");
   command->add_flag("--hex", a.asHex, "The items are bytes as hexadecimal digits");
 

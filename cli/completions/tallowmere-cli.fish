@@ -24,8 +24,12 @@ complete -c tallowmere-cli -n $no_command -a serve-check -d 'Exercise each reque
 complete -c tallowmere-cli -n $no_command -a help -d 'Help for a command'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from help' -f -a "$commands"
 
-set -l with_items '__fish_seen_subcommand_from identify spec path hfs posix name append alias'
-complete -c tallowmere-cli -n $with_items -s 0 -l null -d 'Items end with a NUL'
+set -l with_items '__fish_seen_subcommand_from identify spec path hfs posix name append'
+set -l alias '__fish_seen_subcommand_from alias'
+complete -c tallowmere-cli -n $alias -s q -l quiet -d 'No summary'
+for condition in $with_items $alias
+    complete -c tallowmere-cli -n $condition -s 0 -l null -d 'Items end with a NUL'
+end
 complete -c tallowmere-cli -n $with_items -l null-output -d 'Results end with a NUL'
 complete -c tallowmere-cli -n $with_items -l existing -d 'Fail for what is new'
 for condition in $with_items '__fish_seen_subcommand_from census'

@@ -70,6 +70,7 @@ TEST(AliasCommand, ShowsWhatARecordSays) {
   EXPECT_EQ(shown["id"], 42);
   EXPECT_EQ(shown["parent_id"], 23);
   EXPECT_EQ(shown["hfs_path"], "Caf\u00E9 Disk of Tallowmere:folder:file");
+  EXPECT_EQ(shown["status"], "not-a-volume");
   EXPECT_EQ(shown["exists"], false);
   EXPECT_EQ(shown["error"], "its volume is not mounted");
 }
@@ -109,7 +110,7 @@ TEST(AliasCommand, TellsWhereAnAliasFileLeads) {
   EXPECT_EQ(shown["container"], "alias file");
   EXPECT_EQ(shown["exists"], true);
   EXPECT_EQ(shown["target"], target);
-  EXPECT_EQ(shown["found_by"], "levels");
+  EXPECT_EQ(shown["by"], "levels");
   const Printed text = RunAlias({alias});
   EXPECT_EQ(text.status, 0);
   EXPECT_THAT(text.output, HasSubstr("leads to          " + target + " (by levels)\n"));
