@@ -133,7 +133,7 @@ Content FirstOf(const Attribute (&attributes)[count], std::uint32_t entry, std::
                 const catalog::Look& file, const kernel::Descriptor& contents) {
   for (const Attribute& attribute : attributes) {
     const auto value = AttributeOf(contents, attribute.name);
-    if (!value) return value;
+    if (!value) return value.Error();
     std::string taken = attribute.take(*value);
     if (!taken.empty()) return taken;
   }
