@@ -160,16 +160,16 @@ OSErr PBGetCatInfoSync(CInfoPBPtr paramBlock);
 
 // --- Aliases ----------------------------------------------------------------------------------
 //
-// A file is an alias when it holds a bookmark, or an alias record in its resource fork, wherever Linux
-// keeps that; docs/platform.md has the rules by which its target is found. A symbolic link is not an
-// alias.
+// A file is an alias when it holds a bookmark, or an alias record in its resource fork, wherever
+// Linux keeps that; docs/platform.md has the rules by which its target is found. A symbolic link is
+// not an alias.
 
 enum : unsigned long { kResolveAliasFileNoUI = 1 };
 
 // Replaces the alias file `item` by its target; with `resolveAliasChains`, by the last target of a
-// chain of at most 64 steps. Stores, each unless null, whether the item that `item` refers to in the
-// end is a folder, and whether `item` was an alias, also when its target is not found. `item` stays
-// as it is when it is no alias (noErr) and on every error:
+// chain of at most 64 steps. Stores, each unless null, whether the item that `item` refers to in
+// the end is a folder, and whether `item` was an alias, also when its target is not found. `item`
+// stays as it is when it is no alias (noErr) and on every error:
 //
 //   fnfErr           no such target, or it is not certain which it is; no such item; a ring
 //   dirNFErr         a folder on the way is missing

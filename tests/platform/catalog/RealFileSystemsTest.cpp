@@ -132,8 +132,8 @@ TEST_F(ARealFileSystem, Ext4KeepsThePromises) {
   ExpectTheSameIDsAfterMountingAgain();
 }
 
-// The item is known by either of its names, one of which has a short form. It is no newborn, so that
-// both names are seen to be one item's.
+// The item is known by either of its names, one of which has a short form. It is no newborn, so
+// that both names are seen to be one item's.
 TEST_F(ARealFileSystem, Ext4TellsAnItemByTheNameThatIsMeant) {
   MakeImage("ext4", {"mkfs.ext4", "-q", "-F"}, 32 * kMegabyte);
   if (IsSkipped()) return;
