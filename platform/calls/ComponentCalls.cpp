@@ -10,12 +10,9 @@
 using namespace tallowmere;
 using calls::ThisProcess;
 using foundation::OrZero;
+using quicktime::Components;
 
 namespace {
-
-bool IsComponent(Component component) {
-  return OrZero([component] { return ThisProcess().components.Has(component); });
-}
 
 quicktime::AIFFExporter* ExporterOf(ComponentInstance instance) {
   return OrZero([instance] { return ThisProcess().components.ExporterOf(instance); });
@@ -25,12 +22,12 @@ quicktime::AIFFExporter* ExporterOf(ComponentInstance instance) {
 
 Component FindNextComponent(Component previous, ComponentDescription* looking) {
   if (looking == nullptr) return nullptr;
-  return OrZero([&] { return ThisProcess().components.FindNext(previous, *looking); });
+  return Components::FindNext(previous, *looking);
 }
 
 OSErr GetComponentInfo(Component component, ComponentDescription* description, Handle name,
                        Handle info, Handle icon) {
-  if (!IsComponent(component) || description == nullptr) return paramErr;
+  if (!Components::Has(component) || description == nullptr) return paramErr;
   if (name != nullptr || info != nullptr || icon != nullptr) return paramErr;
   *description = component->description;
   return noErr;
@@ -39,7 +36,7 @@ OSErr GetComponentInfo(Component component, ComponentDescription* description, H
 OSErr OpenAComponent(Component component, ComponentInstance* instance) {
   if (instance == nullptr) return paramErr;
   *instance = nullptr;
-  if (!IsComponent(component)) return paramErr;
+  if (!Components::Has(component)) return paramErr;
   *instance = OrZero([] { return ThisProcess().components.Open(); });
   return *instance == nullptr ? memFullErr : noErr;
 }

@@ -1,9 +1,14 @@
 #include "quicktime/Components.h"
 
 #include <algorithm>
+#include <array>
 
 namespace tallowmere::quicktime {
 namespace {
+
+constexpr std::array<ComponentRecord, 1> kComponents{{
+    {{MovieExportType, kQTFileTypeAIFF, SoundMediaType, 0, 0}},
+}};
 
 bool IsLike(const ComponentDescription& component, const ComponentDescription& looking) {
   const auto fits = [](OSType code, OSType wanted) { return wanted == 0 || code == wanted; };
@@ -15,18 +20,19 @@ bool IsLike(const ComponentDescription& component, const ComponentDescription& l
 
 }  // namespace
 
-Component Components::FindNext(Component previous, const ComponentDescription& looking) {
+Component Components::FindNext(Component previous, const ComponentDescription& looking) noexcept {
   if (previous != nullptr && !Has(previous)) return nullptr;
-  auto* const first = previous == nullptr ? mComponents.begin() : previous + 1;
-  auto* const found =
-      std::find_if(first, mComponents.end(), [&looking](const ComponentRecord& component) {
+  const ComponentRecord* const first = previous == nullptr ? kComponents.begin() : previous + 1;
+  const ComponentRecord* const found =
+      std::find_if(first, kComponents.end(), [&looking](const ComponentRecord& component) {
         return IsLike(component.description, looking);
       });
-  return found == mComponents.end() ? nullptr : found;
+  // The host's type is not const; nothing writes through it.
+  return found == kComponents.end() ? nullptr : const_cast<Component>(found);
 }
 
-bool Components::Has(Component component) const {
-  return std::any_of(mComponents.begin(), mComponents.end(),
+bool Components::Has(Component component) noexcept {
+  return std::any_of(kComponents.begin(), kComponents.end(),
                      [component](const ComponentRecord& row) { return &row == component; });
 }
 

@@ -4,7 +4,6 @@
 
 #include <QuickTime/QuickTime.h>
 
-#include <array>
 #include <cstddef>
 
 #include "quicktime/AIFFExporter.h"
@@ -23,10 +22,10 @@ namespace tallowmere::quicktime {
 class Components {
  public:
   // The first component after `previous` (null: the first of all) that matches. Null when there is
-  // none and when `previous` is not a component.
-  Component FindNext(Component previous, const ComponentDescription& looking);
+  // none and when `previous` is not a component. Needs no memory.
+  static Component FindNext(Component previous, const ComponentDescription& looking) noexcept;
 
-  bool Has(Component component) const;
+  static bool Has(Component component) noexcept;
 
   // A new instance, open until it is closed.
   ComponentInstance Open() { return &mInstances.Add(); }
@@ -40,9 +39,6 @@ class Components {
   std::size_t OpenInstances() const { return mInstances.Count(); }
 
  private:
-  std::array<ComponentRecord, 1> mComponents{{
-      {{MovieExportType, kQTFileTypeAIFF, SoundMediaType, 0, 0}},
-  }};
   Slots<ComponentInstanceRecord> mInstances;
 };
 
