@@ -9,10 +9,10 @@
 
 namespace tallowmere::cli {
 
-// Prints each of `items`: alias files or, if `areHex`, bytes as hexadecimal digits with any blanks
-// between. A single "-" stands for the items on standard input. With more than one, prints counts
-// on standard error unless the format is quiet. Returns 1 when one of them is no alias, or its
-// target is not found.
-int PrintAliases(const std::vector<std::string>& items, const Format& format, bool areHex);
+// Prints each item that the arguments name: alias files or, if `areHex`, bytes as hexadecimal
+// digits with any blanks between. A single "-" stands for the items on standard input. With more
+// than one, prints counts on standard error unless the format is quiet. Returns 1 when one of them
+// is no alias, or its target is not found.
+int PrintAliases(const std::vector<std::string>& arguments, const Format& format, bool areHex);
 
 }  // namespace tallowmere::cli

@@ -83,8 +83,13 @@ class CommandLine {
     mApp.add_option("--deadline", mArguments.seconds, "How long one request may take, in seconds")
         ->check(CheckTime)
         ->capture_default_str();
-    AddConversions();
-    AddTheOthers();
+    AddRecords();
+    AddHFSPaths();
+    AddNames();
+    AddVolumes();
+    AddAudio();
+    AddCensusAndAliases();
+    AddCheck();
   }
 
   int Run(int count, char** arguments) {
@@ -196,8 +201,13 @@ class CommandLine {
   }
 
   void AddRecordOptions(CLI::App* command);
-  void AddConversions();
-  void AddTheOthers();
+  void AddRecords();
+  void AddHFSPaths();
+  void AddNames();
+  void AddVolumes();
+  void AddAudio();
+  void AddCensusAndAliases();
+  void AddCheck();
 
   CLI::App mApp{"Asks the tallowmere service about files and volumes.", "tallowmere-cli"};
   Arguments mArguments;
@@ -242,7 +252,7 @@ void CommandLine::AddRecordOptions(CLI::App* command) {
       ->excludes(volume);
 }
 
-void CommandLine::AddConversions() {
+void CommandLine::AddRecords() {
   Arguments& a = mArguments;
   CLI::App* command = AddForItems("spec", "Print the record of each path, as volume:parent:name",
                                   "  tallowmere-cli spec /etc/hostname\n"
@@ -260,10 +270,13 @@ void CommandLine::AddConversions() {
   AddItems(command, "record",
            "volume:parent:name, or the 70 bytes in hexadecimal or base64; with --packed, files");
   AddRecordOptions(command);
+}
 
-  command = AddForItems("hfs", "Print the full HFS path of each path",
-                        "  tallowmere-cli hfs /usr/bin/env /usr/bin",
-                        [&a] { return PrintHFSPaths(a.items); });
+void CommandLine::AddHFSPaths() {
+  Arguments& a = mArguments;
+  CLI::App* command = AddForItems("hfs", "Print the full HFS path of each path",
+                                  "  tallowmere-cli hfs /usr/bin/env /usr/bin",
+                                  [&a] { return PrintHFSPaths(a.items); });
   AddItems(command, "path", "Files or folders");
 
   command = AddForItems("posix", "Print the path of each HFS path",
@@ -278,8 +291,11 @@ void CommandLine::AddConversions() {
       ->type_name("OLD-NAME=FOLDER")
       ->allow_extra_args(false);
   AddTable(command);
+}
 
-  command =
+void CommandLine::AddNames() {
+  Arguments& a = mArguments;
+  CLI::App* command =
       AddForItems("name", "Print the HFS name of each path",
                   "  tallowmere-cli name 'a file: new.txt'", [&a] { return PrintNames(a.items); });
   AddItems(command, "path", "Files or folders");
@@ -296,13 +312,16 @@ void CommandLine::AddConversions() {
   AddItems(command, "path", "Files or folders, also new ones in an existing folder");
 }
 
-void CommandLine::AddTheOthers() {
+void CommandLine::AddVolumes() {
   Arguments& a = mArguments;
   AddJson(Add("volumes", "Print number, name and mount point of every volume",
               "  tallowmere-cli volumes",
               [&a] { return PrintVolumes(a.items.client, a.items.format.isJson); }));
+}
 
-  CLI::App* command =
+void CommandLine::AddAudio() {
+  Arguments& a = mArguments;
+  CLI::App* const command =
       Add("aiff", "Print the settings that export a sound to AIFF files",
           "  tallowmere-cli aiff --format twos --rate 44100 --bits 16 --channels 2\n"
           "  tallowmere-cli aiff --format sowt --output settings.bin",
@@ -323,8 +342,11 @@ void CommandLine::AddTheOthers() {
   command
       ->add_option("--output", a.output, "The file for the settings as they are; \"-\" prints them")
       ->type_name("FILE");
+}
 
-  command =
+void CommandLine::AddCensusAndAliases() {
+  Arguments& a = mArguments;
+  CLI::App* command =
       Add("census", "Check that each item of a folder comes back by its record, in another process",
           "  tallowmere-cli census /home",
           [&a] { return TakeCensus(a.items.client, a.items.format, a.folder); });
@@ -342,13 +364,16 @@ void CommandLine::AddTheOthers() {
   command->add_flag("-q,--quiet", a.items.format.isQuiet, "No summary");
   AddItems(command, "file", "Alias files, or files with a record or bookmark");
   command->add_flag("--hex", a.asHex, "The items are bytes as hexadecimal digits");
+}
 
+void CommandLine::AddCheck() {
+  Arguments& a = mArguments;
   AddJson(Add("serve-check", "Start the service and try each request",
               "  tallowmere-cli serve-check",
               [&a] { return CheckService(a.items.client, a.items.format.isJson); }));
 
-  command = Add("help", "Print help for a command", "  tallowmere-cli help spec",
-                [this] { return PrintHelp(); });
+  CLI::App* const command = Add("help", "Print help for a command", "  tallowmere-cli help spec",
+                                [this] { return PrintHelp(); });
   command->add_option("command", a.topic, "The command; without it, help for all")->type_name("");
 }
 

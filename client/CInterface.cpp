@@ -18,7 +18,6 @@ using tallowmere::Conversion;
 using tallowmere::Error;
 using tallowmere::FSSpec;
 using tallowmere::Outcome;
-using tallowmere::Result;
 
 struct tallowmere_client {
   tallowmere::Client client;

@@ -6,10 +6,10 @@
 
 namespace tallowmere {
 
-// Such as `the record of "/etc/hostname"`. REQUIRES: the bytes are one whole request.
-std::string WhatIsAsked(std::string_view request);
+// Such as `the record of "/etc/hostname"`. REQUIRES: `bytes` are one whole request.
+std::string WhatIsAsked(std::string_view bytes);
 
-// Whether the request may lead the service to volumes that it does not name.
-bool SearchesOtherVolumes(std::string_view request);
+// Whether a request may lead the service to volumes that it does not name.
+bool SearchesOtherVolumes(std::string_view bytes);
 
 }  // namespace tallowmere

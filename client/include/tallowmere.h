@@ -29,6 +29,8 @@ extern "C" {
 
 #define TALLOWMERE_API __attribute__((visibility("default")))
 
+/* This is C, which has no other way. NOLINTBEGIN(modernize-use-using) */
+
 typedef int32_t tallowmere_outcome;
 enum {
   TALLOWMERE_FOUND = 0,          /* the item exists */
@@ -158,6 +160,8 @@ TALLOWMERE_API tallowmere_outcome tallowmere_utf8_of_hfs_name(const char* name, 
                                                               char** text, size_t* text_length);
 TALLOWMERE_API tallowmere_outcome tallowmere_hfs_name_of_utf8(const char* text, size_t text_length,
                                                               char** name, size_t* name_length);
+
+/* NOLINTEND(modernize-use-using) */
 
 #ifdef __cplusplus
 }

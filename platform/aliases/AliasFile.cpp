@@ -1,7 +1,5 @@
 #include "aliases/AliasFile.h"
 
-#include <sys/stat.h>
-
 #include <algorithm>
 #include <string>
 #include <utility>
@@ -61,7 +59,7 @@ Result<AliasFile> ReadBookmarkOf(const catalog::Look& file, const kernel::Descri
 }  // namespace
 
 Result<AliasFile> ReadAliasFile(const catalog::Look& file) {
-  if (!S_ISREG(file.Item().type)) return AliasFile();
+  if (!kernel::IsRegularFile(file.Item())) return AliasFile();
   const auto contents = kernel::OpenFile(file.Spot(), file.Item());
   if (!contents) return contents.Error();
   const auto beginning = kernel::ReadBytes(*contents, 0, formats::kBookmarkFileMark);

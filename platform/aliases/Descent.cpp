@@ -64,17 +64,18 @@ Result<HeldFolder> Descent::Climb(const HeldFolder& folder) {
 // The composed and the decomposed form, where the name itself is not there: the one item that has
 // either.
 Result<Look> Descent::LookUpOtherForms(const HeldFolder& folder, const std::string& name) {
-  Result<Look> found = kernel::kNotThere;
+  std::vector<Look> found;
   for (const std::string& form : OtherFormsOf(name)) {
     auto look = mMoment.LookUp(folder, form);
     if (catalog::IsMissing(look)) continue;
     if (!look) return look;
-    if (found && !catalog::AreSame(*folder.Volume(), found->Seen(), look->Seen())) {
-      return kernel::kNotThere;
-    }
-    found = std::move(look);
+    found.push_back(*std::move(look));
   }
-  return found;
+  const bool isCertain = std::all_of(found.begin(), found.end(), [&](const Look& look) {
+    return catalog::AreSame(*folder.Volume(), found.front().Seen(), look.Seen());
+  });
+  if (found.empty() || !isCertain) return kernel::kNotThere;
+  return found.back();
 }
 
 Result<Look> Descent::LookUp(const HeldFolder& folder, const std::string& name,

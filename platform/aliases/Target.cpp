@@ -1,7 +1,5 @@
 #include "aliases/Target.h"
 
-#include <sys/stat.h>
-
 #include <algorithm>
 #include <cstdlib>
 #include <utility>
@@ -225,7 +223,7 @@ std::vector<Way> WaysOf(const Bookmark& bookmark) {
 
 bool Kinds::Admit(const kernel::Item& item) const {
   if (kernel::IsFolder(item)) return folder;
-  return kernel::IsLink(item) ? link : file && S_ISREG(item.type);
+  return kernel::IsLink(item) ? link : file && kernel::IsRegularFile(item);
 }
 
 Target TargetOf(const AliasRecord& record) {
@@ -270,8 +268,8 @@ Target TargetOf(const formats::AliasContent& content) {
 }
 
 bool IsBirthOf(const Creation& creation, std::int64_t birthSeconds) {
-  constexpr std::int64_t kQuarter = 15 * 60;
-  constexpr std::int64_t kFarthest = 14 * 60 * 60;
+  constexpr std::int64_t kQuarter = std::int64_t{15} * 60;
+  constexpr std::int64_t kFarthest = std::int64_t{14} * 60 * 60;
   constexpr std::int64_t kNoDate = std::int64_t{1} << 48;  // what overflows below is none
   if (birthSeconds > kNoDate || birthSeconds < -kNoDate) return false;
   const std::int64_t difference = birthSeconds - creation.seconds;

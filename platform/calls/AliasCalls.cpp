@@ -1,7 +1,6 @@
 // Alias files and where they lead.
 
 #include <CoreServices/CoreServices.h>
-#include <sys/stat.h>
 
 #include <string>
 
@@ -65,7 +64,7 @@ class Chain {
       const auto resolved = aliases::Resolve(mMoment, &at, aliases::TargetOf(*read->content));
       if (!resolved) return resolved.Error();
       target = resolved->item;
-      if (!isWhole || !S_ISREG(target->item.type)) return target;
+      if (!isWhole || !kernel::IsRegularFile(target->item)) return target;
       const auto next = LookAt(mMoment, *target);
       if (!next) return next.Error();
       at = *next;
@@ -104,7 +103,7 @@ OSErr FSResolveAliasFile(FSRef* item, Boolean resolveAliasChains, Boolean* targe
   const auto reference = Unpack(item);
   if (!reference) return fnfErr;
   Answer answer{noErr, kernel::IsFolder(*reference), false};
-  if (S_ISREG(reference->type)) {
+  if (kernel::IsRegularFile(*reference)) {
     answer.code = foundation::OrError([&] {
       return InMoment([&](catalog::Moment& moment) {
         answer = Resolve(moment, *item, *reference, resolveAliasChains != 0);

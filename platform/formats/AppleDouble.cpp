@@ -27,12 +27,16 @@ std::optional<AppleDouble> ReadAppleDouble(std::string_view beginning, std::uint
   const auto magic = BigEndianAt<std::uint32_t>(beginning, 0);
   const auto version = BigEndianAt<std::uint32_t>(beginning, 4);
   const auto count = BigEndianAt<std::uint16_t>(beginning, kCountAt);
-  if (!count || (magic != kMagicOfSingle && magic != kMagicOfDouble)) return std::nullopt;
-  if ((version != kVersion1 && version != kVersion2) || *count > kMostEntries) return std::nullopt;
+  const bool isSingle = magic == kMagicOfSingle;
+  const bool isDouble = magic == kMagicOfDouble;
+  const bool isOld = version == kVersion1;
+  const bool isNew = version == kVersion2;
+  if (!count || !(isSingle || isDouble) || !(isOld || isNew)) return std::nullopt;
+  if (*count > kMostEntries) return std::nullopt;
   const auto list = Piece(beginning, kEntriesAt, *count * kEntrySize);
   if (!list) return std::nullopt;
   AppleDouble read;
-  read.isSingle = magic == kMagicOfSingle;
+  read.isSingle = isSingle;
   for (std::size_t at = 0; at < list->size(); at += kEntrySize) {
     const AppleDouble::Entry entry{BigEndianIn<std::uint32_t>(*list, at),
                                    BigEndianIn<std::uint32_t>(*list, at + 4),

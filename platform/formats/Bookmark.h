@@ -56,7 +56,7 @@ bool BeginsBookmarkFile(std::string_view data);
 
 // The bookmark of an alias file, and one on its own. Nullopt when anything does not fit: a length,
 // an offset, a table met twice, a list too deep or too long.
-std::optional<Bookmark> ReadBookmarkFile(std::string_view data);
+std::optional<Bookmark> ReadBookmarkFile(std::string_view file);
 std::optional<Bookmark> ReadBookmark(std::string_view bytes);
 
 }  // namespace tallowmere::formats

@@ -20,7 +20,7 @@ struct Resource {
 
 // The resources of a type in the map's order; none where the fork has none. Nullopt for a map that
 // does not fit. The data stay valid as long as the fork's bytes.
-std::optional<std::vector<Resource>> ResourcesOfType(std::string_view fork, std::uint32_t type);
+std::optional<std::vector<Resource>> ResourcesOfType(std::string_view bytes, std::uint32_t type);
 
 // The one with id 0, else with the lowest id. REQUIRES: there is one.
 const Resource& FirstByID(const std::vector<Resource>& resources);

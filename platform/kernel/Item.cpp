@@ -44,6 +44,14 @@ bool IsLink(const Item& item) {
   return S_ISLNK(item.type);
 }
 
+bool IsRegularFile(const Item& item) {
+  return S_ISREG(item.type);
+}
+
+std::uint64_t DeviceNumber(unsigned majorNumber, unsigned minorNumber) {
+  return makedev(majorNumber, minorNumber);
+}
+
 bool HaveSameNumbers(const Item& first, const Item& second) {
   return first.device == second.device && first.inode == second.inode;
 }
@@ -66,7 +74,7 @@ Result<Status> ReadStatus(const Spot& spot) {
   }
   Item item{};
   item.inode = about.stx_ino;
-  item.device = makedev(about.stx_dev_major, about.stx_dev_minor);
+  item.device = DeviceNumber(about.stx_dev_major, about.stx_dev_minor);
   const bool hasBirth = (about.stx_mask & STATX_BTIME) != 0;
   item.birthSeconds = hasBirth ? about.stx_btime.tv_sec : 0;
   item.birthNanoseconds = hasBirth ? about.stx_btime.tv_nsec : kNoBirth;

@@ -43,6 +43,10 @@ struct Item {
 
 bool IsFolder(const Item& item);
 bool IsLink(const Item& item);
+bool IsRegularFile(const Item& item);
+
+// The device number of two halves, as in Item.
+std::uint64_t DeviceNumber(unsigned majorNumber, unsigned minorNumber);
 
 // Whether both have the same device and inode number.
 bool HaveSameNumbers(const Item& first, const Item& second);

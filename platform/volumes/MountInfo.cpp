@@ -1,11 +1,11 @@
 #include "volumes/MountInfo.h"
 
-#include <sys/sysmacros.h>
-
 #include <algorithm>
 #include <charconv>
 #include <optional>
 #include <utility>
+
+#include "kernel/Item.h"
 
 namespace tallowmere::volumes {
 namespace {
@@ -49,11 +49,11 @@ std::string Unescape(std::string_view text) {
   return plain;
 }
 
-std::optional<dev_t> ParseDevice(std::string_view text) {
+std::optional<std::uint64_t> ParseDevice(std::string_view text) {
   const auto majorNumber = ParseNumber<unsigned>(TakeUntil(text, ':'));
   const auto minorNumber = ParseNumber<unsigned>(text);
   if (!majorNumber || !minorNumber) return std::nullopt;
-  return makedev(*majorNumber, *minorNumber);
+  return kernel::DeviceNumber(*majorNumber, *minorNumber);
 }
 
 // "36 35 98:0 /mnt1 /mnt2 rw,noatime master:1 - ext3 /dev/root rw,errors=continue": any number of

@@ -1,8 +1,7 @@
 // Parses the kernel's table of mounts: proc(5), /proc/[pid]/mountinfo. Pure.
 #pragma once
 
-#include <sys/types.h>
-
+#include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -13,7 +12,7 @@ namespace tallowmere::volumes {
 struct Mount {
   int id;                  // unique while mounted
   int parent;              // the mount that this one is mounted on
-  dev_t device;            // of the file system; stat may report another (subvolumes, overlays)
+  std::uint64_t device;    // of the file system; stat may report another (subvolumes, overlays)
   std::string root;        // the folder of the file system that is shown at the mount point
   std::string mountPoint;  // absolute, as this process sees it
   std::string type;        // of the file system: "ext4", "tmpfs", …

@@ -18,7 +18,7 @@ MountTree::MountTree(const std::vector<Mount>& mounts, int rootID)
 
 std::vector<std::vector<std::size_t>> MountTree::GroupIntoVolumes(
     const std::function<bool(const Mount&)>& isFolder) {
-  std::map<dev_t, std::vector<std::size_t>> fileSystems;
+  std::map<std::uint64_t, std::vector<std::size_t>> fileSystems;
   for (std::size_t i = 0; i < mMounts.size(); ++i) {
     const bool counts = IsRoot(i) || kernel::HoldsFiles(mMounts[i].type);
     if (counts && IsReachable(i)) fileSystems[mMounts[i].device].push_back(i);
