@@ -227,7 +227,12 @@ Answer AnswerTo(const std::string& item, bool isHex) {
     return alias::LookAtBytes(bytes.value_or(""));
   }
   std::error_code ignored;
-  return alias::LookAtFile(std::filesystem::absolute(item, ignored).lexically_normal().string());
+  auto path = std::filesystem::absolute(item, ignored);
+  const auto name = path.filename();
+  if (name.empty() || name == "." || name == "..") {
+    path = std::filesystem::canonical(path, ignored);
+  }
+  return alias::LookAtFile(path.string());
 }
 
 bool Print(const std::string& item, bool isHex, bool isJson) {

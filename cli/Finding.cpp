@@ -1,5 +1,6 @@
 #include "cli/Finding.h"
 
+#include <cstring>
 #include <utility>
 
 #include "cli/Records.h"
@@ -13,9 +14,11 @@ constexpr const char* kIsNew = "there is no such file or folder, only a folder f
 
 // The message for a person, who has to see which item is meant.
 std::string Complaint(std::string_view item, const std::string& message) {
-  const std::size_t quoted =
-      item.empty() ? std::string::npos : message.find(std::string(item) + '"');
-  if (quoted == std::string::npos) return Quoted(item) + ": " + message;
+  if (item.empty()) return "\"\": " + message;
+  const std::size_t quoted = message.find(std::string(item) + '"');
+  const bool isNamed = quoted != std::string::npos && quoted > 0 &&
+                       std::strchr("\"/", message[quoted - 1]) != nullptr;
+  if (!isNamed) return Quoted(item) + ": " + message;
   return std::string(message).replace(quoted, item.size(), Quoted(item));
 }
 

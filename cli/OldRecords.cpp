@@ -50,8 +50,9 @@ Result<std::vector<std::string>> ReadPackedRecords(const std::vector<std::string
     const auto bytes = ReadAll(path);
     if (!bytes) return bytes.Failure();
     const std::string reason = WhyNoRecords(bytes->size(), form);
-    if (!reason.empty())
+    if (!reason.empty()) {
       return Error{Outcome::kInvalid, std::string(path).append(": ").append(reason)};
+    }
     for (std::size_t at = form.skip; at < bytes->size(); at += form.stride) {
       records.push_back(Hex(std::string_view(*bytes).substr(at, protocol::kFileSpecSize)));
     }

@@ -90,8 +90,9 @@ class RecordsToFind {
 Finding FindInCopy(const Findings& findings, const CopiedVolumes::InCopy& copy,
                    const std::string& item) {
   auto path = PathInCopy(copy);
-  if (path)
+  if (path) {
     return FindingOf(findings, item, Converted<std::string>{*path, Outcome::kFound}, kByMap);
+  }
   return FindingOf(findings, item, path.Failure(), kByMap);
 }
 

@@ -59,9 +59,21 @@ std::string CheckRate(const std::string& text) {
   return hertz && IsRate(*hertz) ? "" : text + " is no rate below 65536 hertz";
 }
 
+std::string CheckPlace(const std::string& text) {
+  return text.empty() ? "an empty text is no place" : "";
+}
+
+// In bytes: 0 to 2^53, which every double holds.
+std::string CheckCount(const std::string& text) {
+  constexpr double kMost = 9007199254740992;
+  const auto bytes = ReadNumber(text);
+  return !bytes || (*bytes >= 0 && *bytes <= kMost) ? "" : text + " is no number of bytes";
+}
+
 std::string CheckStride(const std::string& text) {
   const auto bytes = ReadNumber(text);
-  return bytes && *bytes < 70 ? text + " is less than the 70 bytes of a record" : "";
+  if (bytes && *bytes < 70) return text + " is less than the 70 bytes of a record";
+  return CheckCount(text);
 }
 
 bool IsOption(const std::string& word) {
@@ -197,6 +209,7 @@ class CommandLine {
     command
         ->add_option("--volumes", mArguments.records.places.table,
                      "Lines OLD-NUMBER-OR-NAME=PLACE tell where volumes are; '#' begins a comment")
+        ->check(CheckPlace)
         ->type_name("FILE");
   }
 
@@ -221,6 +234,7 @@ void CommandLine::AddRecordOptions(CLI::App* command) {
           ->add_option("--volume", records.places.volume,
                        "All records are of this volume, whatever number they have: its mount point "
                        "or name")
+          ->check(CheckPlace)
           ->type_name("PLACE");
   AddTable(command);
   command->get_option("--volumes")->excludes(volume);
@@ -238,7 +252,8 @@ void CommandLine::AddRecordOptions(CLI::App* command) {
   CLI::Option* const packed = command->add_flag("--packed", records.form.isPacked,
                                                 "Items are files of records, 70 bytes each");
   command->add_option("--skip", records.form.skip, "Bytes in front of a file's first record")
-      ->needs(packed);
+      ->needs(packed)
+      ->check(CheckCount);
   command
       ->add_option("--stride", records.form.stride,
                    "Bytes from the beginning of one record to that of the next")

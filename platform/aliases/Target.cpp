@@ -243,6 +243,12 @@ Target TargetOf(const AliasRecord& record) {
     target.ways = WaysByPosixPath(*record.posixPath);
   } else if (record.hfsPath) {
     target.ways = WaysByHFSPath(record, target.volumeNames);
+    // A reading in 8 bits that contradicts the name in UTF-16 is a wrong one.
+    if (record.targetName) {
+      std::erase_if(target.ways, [&](const Way& way) {
+        return !way.components.empty() && !IsOneOf(TextOfLast(way), readings);
+      });
+    }
   }
   const auto levels = LevelsOf(record);
   if (levels && CanDescend(target.ways, *levels, readings)) target.levels = levels;

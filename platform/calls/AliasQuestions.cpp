@@ -126,11 +126,9 @@ Description Describe(const Bookmark& bookmark) {
   d.creation = DateOf(bookmark.targetCreation);
   d.user = bookmark.userName.value_or("");
   if (!bookmark.components) return d;
-  d.posixPath = "/";
-  for (const std::string& name : *bookmark.components) {
-    d.posixPath = foundation::JoinPath(d.posixPath, name);
-    d.name = name;
-  }
+  for (const std::string& name : *bookmark.components) d.posixPath.append("/").append(name);
+  if (bookmark.components->empty()) d.posixPath = "/";
+  if (!bookmark.components->empty()) d.name = bookmark.components->back();
   const auto& ids = bookmark.ids;
   const bool hasIDs = ids && ids->size() == bookmark.components->size() && !ids->empty();
   if (hasIDs && ids->back() > 0) d.id = static_cast<std::uint64_t>(ids->back());

@@ -16,10 +16,13 @@ std::optional<AliasContent> ContentOf(const std::optional<Read>& read) {
 // In the forks of a file, the data first.
 std::optional<RecognizedAlias> InForks(Container container, std::string_view data,
                                        std::string_view resources) {
-  if (BeginsBookmarkFile(data))
-    return RecognizedAlias{container, ContentOf(ReadBookmarkFile(data))};
+  const bool isBookmark = BeginsBookmarkFile(data);
+  if (isBookmark) {
+    if (const auto bookmark = ReadBookmarkFile(data)) return RecognizedAlias{container, *bookmark};
+  }
   auto found = RecognizeAliasInFork(resources);
   if (found) found->container = container;
+  if (!found && isBookmark) return RecognizedAlias{container, std::nullopt};
   return found;
 }
 

@@ -69,7 +69,7 @@ std::string FinderInfoInHeader(const std::string& bytes) {
   const auto header = formats::ReadAppleDouble(bytes, bytes.size());
   const auto* const entry = header ? header->Find(AppleDouble::kFinderInfo) : nullptr;
   if (entry == nullptr) return {};
-  return FinderInfoIn(std::string_view(bytes).substr(entry->offset, entry->length));
+  return FinderInfoIn(formats::Piece(bytes, entry->offset, entry->length).value_or(""));
 }
 
 // An entry of an AppleDouble file; its first bytes, where it is longer than `most`.

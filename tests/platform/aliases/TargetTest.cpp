@@ -127,5 +127,27 @@ TEST(NamesOfARecord, In8BitsHaveTwoReadingsWhereTheyMayBeUTF8) {
   EXPECT_EQ(TargetOf(record).volumeNames, (std::vector<std::u16string>{u"Caf\u00E9"}));
 }
 
+// The bytes are Japanese in the writer's encoding, and other letters in Mac Roman.
+TEST(PathOfARecord, In8BitsIsNoneWhereItContradictsTheNameInUTF16) {
+  formats::AliasRecord record;
+  record.version = 3;
+  record.volumeName = u"Disk";
+  record.hfsPath = "Disk:folder:\x83\x65";
+  record.targetName = u"\u30C6";
+  EXPECT_TRUE(aliases::TargetOf(record).ways.empty());
+}
+
+TEST(PathOfARecord, In8BitsHasTheReadingOfTheNameInUTF16) {
+  formats::AliasRecord record;
+  record.version = 3;
+  record.volumeName = u"Disk";
+  record.hfsPath = "Disk:folder:caf\u00E9";
+  EXPECT_EQ(aliases::TargetOf(record).ways.size(), 2u);
+  record.targetName = u"caf\u00E9";
+  const auto ways = aliases::TargetOf(record).ways;
+  ASSERT_EQ(ways.size(), 1u);
+  EXPECT_EQ(ways[0].components, (std::vector<std::string>{"folder", "caf\u00E9"}));
+}
+
 }  // namespace
 }  // namespace tallowmere::aliases
