@@ -133,11 +133,12 @@ class CommandLine {
   // What the arguments have that no command takes, whatever else is wrong with them.
   std::optional<std::string> WhatIsUnknown() const {
     const std::vector<std::string> words = mApp.remaining(true);
-    if (words.empty()) return std::nullopt;
+    const auto end = std::find(words.begin(), words.end(), "--");
+    if (end == words.begin()) return std::nullopt;
     const auto commands = mApp.get_subcommands();
     if (commands.empty() && !IsOption(words[0])) return NoCommand(words[0]);
-    const auto option = std::find_if(words.begin(), words.end(), IsOption);
-    if (option != words.end()) return "there is no option " + *option;
+    const auto option = std::find_if(words.begin(), end, IsOption);
+    if (option != end) return "there is no option " + *option;
     return '"' + commands[0]->get_name() + "\" takes no \"" + words[0] + '"';
   }
 

@@ -456,6 +456,14 @@ TEST_F(Conversion, BytesThatAreNoUtf8AreInJsonInHexadecimalToo) {
 
 // --- What goes wrong ----------------------------------------------------------------------------
 
+TEST_F(Conversion, AnEmptyPlaceOfAVolumeIsRefused) {
+  for (const char* const option : {"--volume", "--volumes"}) {
+    const Output output = Cli({"path", option, "", "--", "-1:2:x"});
+    EXPECT_EQ(output.status, 2) << option;
+    EXPECT_THAT(output.errors, HasSubstr("an empty text is no place")) << option;
+  }
+}
+
 TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
   const auto errorsOf = [&](const std::vector<std::string>& command) {
     const Output output = Cli(command);
@@ -472,7 +480,7 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
               prefix + mFile + "/x: there is no folder \"" + mFile + "\"\n");
     EXPECT_EQ(errorsOf({command, "/proc/1/status"}),
               quoted("/proc/1/status") + " is on no volume\n");
-    EXPECT_EQ(errorsOf({command, ""}), prefix + ": an empty path names nothing\n");
+    EXPECT_EQ(errorsOf({command, ""}), prefix + "\"\": an empty path names nothing\n");
   }
   EXPECT_EQ(errorsOf({"path", "1:2"}),
             prefix +
