@@ -33,8 +33,20 @@ def hfs_name_to_str(name: bytes) -> str:
 
 
 def hfs_name_from_str(text: str) -> bytes:
-    """The Mac Roman name of a text in any normal form; UnicodeEncodeError where it has none."""
-    return unicodedata.normalize("NFC", text).encode("mac_roman")
+    """The Mac Roman name of a text, its letters with accents composed or not; UnicodeEncodeError where it has none.
+
+    Other characters stand for themselves alone: U+2126 (OHM SIGN), which NFC makes an omega, has no name.
+    """
+    return _DECOMPOSED.sub(lambda letter: unicodedata.normalize("NFC", letter[0]), text).encode("mac_roman")
+
+
+def _decomposed_letters() -> list[str]:
+    """The letters of Mac Roman that are a letter and a mark, as these two."""
+    letters = filter(str.isalpha, hfs_name_to_str(bytes(range(0x80, 0x100))))
+    return [pair for pair in (unicodedata.normalize("NFD", letter) for letter in letters) if len(pair) == 2]
+
+
+_DECOMPOSED = re.compile("|".join(_decomposed_letters()))
 
 
 @dataclass(frozen=True)
@@ -53,7 +65,7 @@ class FSSpec:
     name: bytes
 
     def __post_init__(self) -> None:
-        if not (isinstance(self.v_ref_num, int) and isinstance(self.par_id, int) and isinstance(self.name, bytes)):
+        if not (_is_whole(self.v_ref_num) and _is_whole(self.par_id) and isinstance(self.name, bytes)):
             raise TypeError("a record holds two whole numbers and the bytes of a name")
         if not (-0x8000 <= self.v_ref_num < 0x8000 and -0x80000000 <= self.par_id < 0x80000000):
             raise ValueError("a record holds a number of 16 bits and an id of 32 bits, with a sign")
@@ -97,6 +109,10 @@ class FSSpec:
         if length > MOST_NAME_BYTES:
             raise ValueError("a record holds a name of at most 63 bytes")
         return cls(v_ref_num, par_id, name[:length])
+
+
+def _is_whole(value: object) -> bool:
+    return isinstance(value, int) and not isinstance(value, bool)
 
 
 def _record_in(byte_order: str) -> struct.Struct:

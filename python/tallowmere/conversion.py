@@ -35,7 +35,7 @@ class Conversion(Planned[Converted[T_co]]):
 
 def record_of(path: Path, *, resolve: bool = True) -> Conversion[FSSpec]:
     """The record of an item, also of a new one in an existing folder."""
-    _check_path(path)
+    _check_path(path, resolve)
 
     def plan() -> Plan[Converted[FSSpec]]:
         place = look_at(path, resolve)
@@ -68,7 +68,7 @@ def path_of(spec: FSSpec, *, search_other_volumes: bool = False) -> Conversion[s
 
 def hfs_path_of(path: Path, *, resolve: bool = True) -> Conversion[bytes]:
     """The full HFS path of the item itself, in Mac Roman: that of a folder ends with a colon."""
-    _check_path(path)
+    _check_path(path, resolve)
 
     def plan() -> Plan[Converted[bytes]]:
         place = look_at(path, resolve)
@@ -105,6 +105,7 @@ def path_of_hfs_path(hfs_path: HFSText) -> Conversion[str]:
         if result == _NO_ITEM and name:
             _, path = yield from _result_and_path(folder + colon)
             if path is not None:
+                _check_name(name, MOST_HFS_BYTES)
                 return (yield from _in_folder(os.fsencode(path), name))
         return (yield from _fail_by_result(result, full))
 
@@ -113,7 +114,7 @@ def path_of_hfs_path(hfs_path: HFSText) -> Conversion[str]:
 
 def hfs_name_of(path: Path, *, resolve: bool = True) -> Conversion[bytes]:
     """The HFS name of an item, in Mac Roman, as its record has it; also of a new one in an existing folder."""
-    _check_path(path)
+    _check_path(path, resolve)
 
     def plan() -> Plan[Converted[bytes]]:
         place = look_at(path, resolve)
@@ -125,18 +126,22 @@ def hfs_name_of(path: Path, *, resolve: bool = True) -> Conversion[bytes]:
 
 def path_in_folder(folder: Path, name: HFSText, *, resolve: bool = True) -> Conversion[str]:
     """The path of the item with that HFS name in a folder, to which a link may lead; also of a new one."""
-    _check_path(folder)
+    _check_path(folder, resolve)
     _check_hfs(name)
 
     def plan() -> Plan[Converted[str]]:
-        return (yield from _in_folder(real_folder(folder, resolve), _encoded(name)))
+        encoded = _encoded(name)
+        _check_name(encoded, MOST_HFS_BYTES)
+        return (yield from _in_folder(real_folder(folder, resolve), encoded))
 
     return Conversion(plan)
 
 
-def _check_path(path: Path) -> None:
+def _check_path(path: Path, resolve: bool) -> None:
     if not isinstance(path, (str, bytes)):
         os.fspath(path)  # TypeError for what is no path
+    if not isinstance(resolve, bool):
+        raise TypeError(f"resolve is a bool, not {type(resolve).__name__}")
 
 
 def _check_hfs(name: HFSText) -> None:
@@ -255,9 +260,10 @@ def _mounted_path(place: Place, spec: FSSpec, full: bytes) -> Plan[bytes]:
 
 
 def _result_and_path(full: bytes) -> Plan[Tuple[int, Optional[str]]]:
-    """The path of a full HFS path. That of a kernel interface's folder is found without the colon at its end."""
+    """The path of a full HFS path. That of a kernel interface's folder is found without the colon at its end, which
+    is not to be left out where it climbs to an outer folder."""
     [(result, path)] = yield [request.result_and_path(full)]
-    if result != 0 and full.endswith(b":") and b":" in full[:-1]:
+    if result != 0 and full.endswith(b":") and not full.endswith(b"::") and b":" in full[:-1]:
         [(_, folder)] = yield [request.result_and_path(full[:-1])]
         if folder is not None and os.path.isdir(folder) and not os.path.islink(folder):
             return 0, _single_slash(folder)
@@ -280,8 +286,7 @@ def _check_volume(place: Place, spec: FSSpec, full: bytes) -> Plan[None]:
 
 
 def _in_folder(folder: bytes, name: bytes) -> Plan[Converted[str]]:
-    """The item with an HFS name in a folder, whose path has no links."""
-    _check_name(name, MOST_HFS_BYTES)
+    """The item with an HFS name in a folder, whose path has no links. REQUIRES: an item can have the name."""
     plain = hfs_name_to_str(name).translate({ord("/"): ":", ord(":"): "/"}).encode()
     answer, spec = yield [request.add_hfs_name(folder, name), request.get_fsspec(os.path.join(folder, plain))]
     path = None if answer is None else _single_slash(answer)

@@ -235,6 +235,14 @@ class Nothing(ConversionTest):
         for rest in (b"missing:", b"missing:f", b"missing:inner:", b"file:f", b"file:", b"missing:inner:f"):
             self.assert_error(Outcome.NOTHING, rest.decode(), self.client.path_of_hfs_path, folder + rest)
 
+    def test_hfs_paths_that_climb_above_the_root_folder(self) -> None:
+        root, folder = (self.client.hfs_path_of(path).value for path in ("/", self.folder))
+        above = folder + b":" * folder.count(b":")
+        for path in (root + b":", root + b"::", above, above + b":", root + b":etc", root + b":new"):
+            self.assert_error(Outcome.NOTHING, path.decode(), self.client.path_of_hfs_path, path)
+        self.assertEqual(self.client.path_of_hfs_path(above[:-1]).value, "/")
+        self.assertEqual(self.client.path_of_hfs_path(folder + b":").value, os.path.dirname(self.folder))
+
     def test_a_name_with_a_tilde_is_no_home_folder(self) -> None:
         spec = self.client.record_of(self.make("f")).value
         user = pwd.getpwuid(os.getuid()).pw_name.encode()
@@ -265,6 +273,26 @@ class Invalid(ConversionTest):
         for name in ("日本", "a\ud800"):
             self.assert_error(Outcome.INVALID, name[0], self.client.path_in_folder, self.folder, name)
             self.assert_error(Outcome.INVALID, name[0], self.client.path_of_hfs_path, "Root:" + name)
+
+    def test_names_with_characters_that_only_a_normal_form_makes_those_of_an_item(self) -> None:
+        folder = self.client.hfs_path_of(self.folder).text
+        for name in ("\u2126", "\u212a", "\u212b", "=\u0338"):
+            path = self.make(unicodedata.normalize("NFC", name))
+            self.assertEqual(self.client.path_in_folder(self.folder, os.path.basename(path)).value, path)
+            self.assert_error(Outcome.INVALID, "character", self.client.path_in_folder, self.folder, name)
+            self.assert_error(Outcome.INVALID, "character", self.client.path_of_hfs_path, folder + name)
+
+    def test_a_name_is_looked_at_before_its_folder(self) -> None:
+        for name in (b"", b"..", b"a:b", b"a\0b", b"a" * 256, "日本"):
+            self.assert_error(Outcome.INVALID, "", self.client.path_in_folder, self.path("missing"), name)
+
+    def test_what_is_no_bool_is_a_type_error(self) -> None:
+        for ask in (conversion.record_of, conversion.hfs_path_of, conversion.hfs_name_of):
+            for value in ("no", 0, None):
+                with self.subTest(ask.__name__, value=value), self.assertRaises(TypeError):
+                    ask("/etc", resolve=value)
+        with self.assertRaises(TypeError):
+            conversion.path_in_folder("/", "etc", resolve="no")
 
     def test_what_is_no_full_hfs_path(self) -> None:
         for path in (b"", b"name", b":name", b":", b"::up"):

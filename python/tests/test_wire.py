@@ -20,9 +20,22 @@ class Names(unittest.TestCase):
         for form in ("NFC", "NFD"):
             self.assertEqual(hfs_name_from_str(unicodedata.normalize(form, "Café Å")), b"Caf\x8e \x81")
 
+    def test_every_letter_may_be_decomposed(self) -> None:
+        letters = "".join(filter(str.isalpha, hfs_name_to_str(bytes(range(256)))))
+        self.assertEqual(hfs_name_from_str(unicodedata.normalize("NFD", letters)), letters.encode("mac_roman"))
+
     def test_what_mac_roman_lacks_is_an_error(self) -> None:
-        with self.assertRaises(UnicodeEncodeError):
-            hfs_name_from_str("日本")
+        for text in ("日本", "a\ud800", "e\u0301\u0301", "\u0301"):
+            with self.subTest(text), self.assertRaises(UnicodeEncodeError):
+                hfs_name_from_str(text)
+
+    def test_what_a_normal_form_makes_another_character_is_an_error(self) -> None:
+        for text in (
+            "\u2126", "\u212a", "\u212b", "\u037e", "\u0387", "\u1fef", "\u1ffd", "a\u0340", "a\u0341", "=\u0338",
+        ):  # fmt: skip
+            with self.subTest(text), self.assertRaises(UnicodeEncodeError):
+                self.assertEqual(len(unicodedata.normalize("NFC", text).encode("mac_roman")), 1)
+                hfs_name_from_str(text)
 
 
 class Records(unittest.TestCase):
@@ -55,6 +68,7 @@ class Records(unittest.TestCase):
     def test_other_types_are_type_errors(self) -> None:
         for fields in (
             (0.0, 2, b"a"), (0, 1.5, b"a"), ("0", 2, b"a"), (0, None, b"a"), (0, 2, "a"), (0, 2, [97]),
+            (False, 2, b"a"), (0, True, b"a"),
         ):  # fmt: skip
             with self.subTest(fields), self.assertRaises(TypeError):
                 FSSpec(*fields)
