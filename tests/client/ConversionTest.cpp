@@ -476,6 +476,23 @@ TEST_F(VolumeConversions, AVolumeMountedInItsNamesakeIsItself) {
   EXPECT_THAT(mClient.HFSPathOf(In("vol/vol")), Fails(Outcome::kAmbiguous));
 }
 
+TEST_F(VolumeConversions, AVolumeMountedInAKernelInterfaceHasItsNameForAnHFSPath) {
+  const ScopedMount interface("none", mFolder.MakeFolder("interface"), "sysfs");
+  const ScopedMount volume("none", In("interface/fs"), "tmpfs");
+  const ScopedMount inner("none", mFolder.MakeFolder("interface/fs/a/deep vol"), "tmpfs");
+  const ScopedMount below("none", In("interface/kernel/debug"), "tmpfs");
+  ASSERT_TRUE(interface.IsMounted() && volume.IsMounted() && inner.IsMounted());
+  ASSERT_TRUE(below.IsMounted());
+  EXPECT_THAT(mClient.HFSPathOf(In("interface/fs")), Is(std::string("fs:"), Outcome::kFound));
+  EXPECT_THAT(mClient.HFSPathOf(In("interface/kernel/debug")),
+              Is(std::string("debug:"), Outcome::kFound));
+  EXPECT_THAT(mClient.HFSPathOf(In("interface/kernel/debug/")),
+              Is(std::string("debug:"), Outcome::kFound));
+  EXPECT_THAT(mClient.HFSPathOf(In("interface/fs/a/deep vol")),
+              Is(std::string("deep vol:"), Outcome::kFound));
+  EXPECT_THAT(mClient.PathOfHFSPath("debug:"), Is(In("interface/kernel/debug"), Outcome::kFound));
+}
+
 TEST_F(VolumeConversions, AnHFSPathOnTheSecondOfTwoVolumesWithOneNameIsAmbiguous) {
   const ScopedMount first("none", mFolder.MakeFolder("a/vol"), "tmpfs");
   const ScopedMount second("none", mFolder.MakeFolder("b/vol"), "tmpfs");
