@@ -68,6 +68,11 @@ class ItemQuestion : public Question {
   // REQUIRES: it has been found.
   const Place& GetPlace() const { return *mPlace; }
   bool HasPlace() const { return mPlace.HasValue(); }
+  // Whether it has turned out to be the root folder of a volume.
+  bool IsRootOfVolume() const {
+    return HasPlace() && mPlace->isFolder && mRecord && *mRecord && **mRecord &&
+           (**mRecord)->parID == kParentOfRoots;
+  }
 
   virtual Result<T> ValueOf(Exchange& exchange, FSSpec record) = 0;
 
@@ -118,12 +123,16 @@ class HFSPathQuestion final : public ItemQuestion<std::string> {
     if (GetPlace().isFolder) exchange.Put(request::MakeFullPath(GetPlace().path), *this, mOwn);
   }
 
+  // The HFS path of a root folder has no part of that of the folder above, which may be in a kernel
+  // interface.
   bool IsAnswered() const override {
-    return ItemQuestion::IsAnswered() && (!HasPlace() || GetPlace().folder->fullPath);
+    return ItemQuestion::IsAnswered() &&
+           (!HasPlace() || IsRootOfVolume() || GetPlace().folder->fullPath);
   }
 
  private:
   Result<std::string> ValueOf(Exchange& exchange, FSSpec record) override {
+    if (record.parID == kParentOfRoots && mOwn) return OfRoot(exchange);
     const auto& folder = *GetPlace().folder->fullPath;
     if (!folder) return folder.Failure();
     if (mOwn && !*mOwn) return mOwn->Failure();
@@ -131,11 +140,17 @@ class HFSPathQuestion final : public ItemQuestion<std::string> {
     if (!mOwn) return Whole(exchange, std::move(path), *folder, FolderOf(GetPlace().path));
     path.push_back(protocol::kSeparator);
     // Of a folder at which a kernel interface is mounted, the service tells that of its holder.
-    if (record.parID != kParentOfRoots && **mOwn == *folder) return path;
+    if (**mOwn == *folder) return path;
     if (**mOwn != path) {
       if (auto error = exchange.WhyNotBack(**mOwn, GetPlace().path)) return *std::move(error);
     }
     return Whole(exchange, **mOwn, **mOwn, GetPlace().path);
+  }
+
+  Result<std::string> OfRoot(Exchange& exchange) {
+    if (!*mOwn) return mOwn->Failure();
+    if (auto error = exchange.WhyNotBack(**mOwn, GetPlace().path)) return *std::move(error);
+    return **mOwn;
   }
 
   // The path, unless the service has left something out of the full path of `folder`, with which it

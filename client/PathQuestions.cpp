@@ -46,34 +46,42 @@ class PathOfRecord final : public PathQuestion {
  public:
   PathOfRecord(Exchange& exchange, const FSSpec& record, bool searchOtherVolumes,
                Handler<std::string> handler)
-      : PathQuestion(std::move(handler)), mRecord(record) {
-    Put(exchange, searchOtherVolumes);
+      : PathQuestion(std::move(handler)),
+        mRecord(record),
+        mSearchesOtherVolumes(searchOtherVolumes) {
+    Put(exchange);
   }
 
  private:
-  void Put(Exchange& exchange, bool searchOtherVolumes) {
+  void Put(Exchange& exchange) {
     if (auto reason = WhyNoHFSName(mRecord.name)) return Refuse(Invalid(*std::move(reason)));
     if (mRecord.name.size() > protocol::kLongestSpecName) {
       return Refuse(Invalid("the name in the record " + Text() + " has more than 63 bytes"));
     }
-    exchange.Put(request::SetFileRefFromFSSpec(mRecord, searchOtherVolumes), *this, mPath);
+    exchange.Put(request::SetFileRefFromFSSpec(mRecord, mSearchesOtherVolumes), *this, mPath);
   }
 
   Conversion<std::string> Answer(Exchange& exchange) override {
     if (!*mPath) return mPath->Failure();
     if (!**mPath) return WhyNone(exchange);
     std::string path = Plain(**std::move(*mPath));
-    // Where the folder is missing, the service takes such a name for a home folder.
+    // Where the volume or the folder is missing, the service takes such a name for a home folder.
     if (mRecord.name.front() == '~') {
       const auto record = exchange.AskNow(request::GetFSSpec(path));
       if (!record) return record.Failure();
-      if (!*record || (*record)->parID != mRecord.parID) return WhyNone(exchange);
+      if (!*record || !IsMeant(**record)) return WhyNone(exchange);
     }
     const auto looked = LookAt(path);
     if (!looked) return looked.Failure();
     if (looked->exists) return Path{std::move(path), Outcome::kFound};
     if (LastNameOf(path) != LinuxNameOfHFSName(mRecord.name)) return WhyNone(exchange);
     return Path{std::move(path), Outcome::kNew};
+  }
+
+  // Whether the record of the answer is that of the item that was asked for.
+  bool IsMeant(const FSSpec& record) const {
+    return record.parID == mRecord.parID && record.name == mRecord.name &&
+           (mSearchesOtherVolumes || mRecord.vRefNum == 0 || mRecord.vRefNum == record.vRefNum);
   }
 
   Error WhyNone(Exchange& exchange) const {
@@ -88,6 +96,7 @@ class PathOfRecord final : public PathQuestion {
   std::string Text() const { return Quoted(TextOfFSSpec(mRecord)); }
 
   FSSpec mRecord;
+  bool mSearchesOtherVolumes;
   std::optional<Result<std::optional<std::string>>> mPath;
 };
 

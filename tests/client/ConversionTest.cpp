@@ -364,6 +364,29 @@ TEST_F(Conversions, AVolumeThatIsNotMountedIsSaid) {
   EXPECT_THAT(mClient.PathOfHFSPath("no such volume:x"), Fails(Outcome::kNotAVolume));
 }
 
+TEST_F(Conversions, AHomeFolderIsNoItemOfAVolumeThatIsNotMounted) {
+  const auto id = RawRecordOf("/root").parID;
+  for (const char* const name : {"~", "~root"}) {
+    for (const std::int16_t number : {std::int16_t{5}, std::int16_t{-999}}) {
+      ASSERT_TRUE(RawPathOf({number, id, name})) << name;
+      EXPECT_THAT(mClient.PathOf({number, id, name}), Fails(Outcome::kNotAVolume)) << name;
+      EXPECT_THAT(mClient.PathOf({number, 999999999, name}), Fails(Outcome::kNotAVolume)) << name;
+    }
+  }
+}
+
+TEST_F(Conversions, AnItemWithTheNameOfAHomeFolderComesBackByItsRecord) {
+  for (const char* const name : {"~", "~root", "~Root", "~\xC3\xA9", "~\xE6\x97\xA5"}) {
+    const std::string path = mFolder.MakeFile(name);
+    FSSpec record = RawRecordOf(path);
+    EXPECT_THAT(mClient.PathOf(record), Is(path, Outcome::kFound));
+    EXPECT_THAT(mClient.PathOf(record, true), Is(path, Outcome::kFound));
+    if (record.vRefNum != RawRecordOf("/etc").vRefNum) continue;
+    record.vRefNum = 0;
+    EXPECT_THAT(mClient.PathOf(record), Is(path, Outcome::kFound));
+  }
+}
+
 TEST_F(Conversions, AnHFSPathThatNamesNoVolumeIsRefused) {
   mFolder.MakeFile("file");
   const WorkingIn folder(mFolder.Path());
@@ -474,6 +497,23 @@ TEST_F(VolumeConversions, AVolumeMountedInItsNamesakeIsItself) {
   ASSERT_TRUE(outer.IsMounted() && inner.IsMounted());
   EXPECT_THAT(mClient.HFSPathOf(In("vol")), Is(std::string("vol:"), Outcome::kFound));
   EXPECT_THAT(mClient.HFSPathOf(In("vol/vol")), Fails(Outcome::kAmbiguous));
+}
+
+TEST_F(VolumeConversions, AVolumeMountedInAKernelInterfaceHasItsNameForAnHFSPath) {
+  const ScopedMount interface("none", mFolder.MakeFolder("interface"), "sysfs");
+  const ScopedMount volume("none", In("interface/fs"), "tmpfs");
+  const ScopedMount inner("none", mFolder.MakeFolder("interface/fs/a/deep vol"), "tmpfs");
+  const ScopedMount below("none", In("interface/kernel/debug"), "tmpfs");
+  ASSERT_TRUE(interface.IsMounted() && volume.IsMounted() && inner.IsMounted());
+  ASSERT_TRUE(below.IsMounted());
+  EXPECT_THAT(mClient.HFSPathOf(In("interface/fs")), Is(std::string("fs:"), Outcome::kFound));
+  EXPECT_THAT(mClient.HFSPathOf(In("interface/kernel/debug")),
+              Is(std::string("debug:"), Outcome::kFound));
+  EXPECT_THAT(mClient.HFSPathOf(In("interface/kernel/debug/")),
+              Is(std::string("debug:"), Outcome::kFound));
+  EXPECT_THAT(mClient.HFSPathOf(In("interface/fs/a/deep vol")),
+              Is(std::string("deep vol:"), Outcome::kFound));
+  EXPECT_THAT(mClient.PathOfHFSPath("debug:"), Is(In("interface/kernel/debug"), Outcome::kFound));
 }
 
 TEST_F(VolumeConversions, AnHFSPathOnTheSecondOfTwoVolumesWithOneNameIsAmbiguous) {
