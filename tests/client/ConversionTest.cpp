@@ -528,6 +528,18 @@ TEST_F(VolumeConversions, AnHFSPathOnTheSecondOfTwoVolumesWithOneNameIsAmbiguous
   EXPECT_THAT(mClient.HFSPathOf(In("b/vol/file")), Fails(Outcome::kAmbiguous));
 }
 
+TEST_F(VolumeConversions, AnHFSPathInAFolderThatOnlyTheSecondNamesakeHasIsAmbiguous) {
+  const ScopedMount first("none", mFolder.MakeFolder("a/v\xC3\xA9"), "tmpfs");
+  const ScopedMount second("none", mFolder.MakeFolder("b/v\xC3\xA9"), "tmpfs");
+  ASSERT_TRUE(first.IsMounted() && second.IsMounted());
+  mFolder.MakeFolder("b/v\xC3\xA9/only/inner");
+  for (const char* const item : {"only", "only/new", "only/inner", "only/inner/new"}) {
+    const auto hfsPath = mClient.HFSPathOf(In("b/v\xC3\xA9/") + item);
+    EXPECT_THAT(hfsPath, Fails(Outcome::kAmbiguous)) << item;
+    EXPECT_THAT(test::MessageOf(hfsPath), HasSubstr("v\xC3\xA9\"")) << item;
+  }
+}
+
 TEST_F(VolumeConversions, AnHFSPathWhoseOuterFoldersMayNotBeLookedAtIsRefused) {
   if (geteuid() != 0) GTEST_SKIP() << "becoming another user is not permitted here";
   const ScopedMount volume("none", mFolder.MakeFolder("vol"), "tmpfs");
