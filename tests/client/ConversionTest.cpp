@@ -406,6 +406,26 @@ TEST_F(Conversions, AKernelInterfaceHasItsOwnHFSPathAndWhatIsInItNone) {
   EXPECT_THAT(mClient.PathInFolder("/proc", "version"), Fails(Outcome::kNotAVolume));
 }
 
+TEST_F(Conversions, TheHFSPathOfAKernelInterfaceLeadsBackWithAndWithoutItsColon) {
+  const std::string root = *mClient.MakeFullPath("/");
+  for (const char* const path : {"/proc", "/sys"}) {
+    const auto hfsPath = mClient.HFSPathOf(path);
+    ASSERT_THAT(hfsPath, Is(root + (path + 1) + ":", Outcome::kFound));
+    EXPECT_THAT(mClient.PathOfHFSPath(hfsPath->value), Is(std::string(path), Outcome::kFound));
+    EXPECT_THAT(mClient.PathOfHFSPath(root + (path + 1)), Is(std::string(path), Outcome::kFound));
+  }
+  EXPECT_THAT(mClient.PathOfHFSPath(root + "proc:self:"), Fails(Outcome::kNotAVolume));
+  EXPECT_THAT(mClient.PathOfHFSPath(root + "proc::"), testing::Not(Is("/proc", Outcome::kFound)));
+  EXPECT_THAT(mClient.PathOfHFSPath(root + "proc:fs::"), Fails(Outcome::kNotAVolume));
+}
+
+TEST_F(Conversions, TheNameOfNoVolumeIsNotLookedForInTheCurrentFolder) {
+  mFolder.MakeFolder("no volume");
+  const WorkingIn folder(mFolder.Path());
+  Client here = StartClient();
+  EXPECT_THAT(here.PathOfHFSPath("no volume:"), Fails(Outcome::kNotAVolume));
+}
+
 TEST_F(Conversions, ANewItemInAKernelInterfaceIsOnNoVolume) {
   EXPECT_EQ(RawPathOf(RawRecordOf("/proc/new")), std::nullopt);
   EXPECT_THAT(mClient.RecordOf("/proc/new"), Fails(Outcome::kNotAVolume));
