@@ -96,6 +96,7 @@ class Exchange {
 
   Batch mBatch;
   std::vector<FullPath> mUnchecked;
+  std::vector<FullPath> mLost;  // those that lead nowhere
   std::deque<std::unique_ptr<Question>> mQuestions;
   std::map<std::int16_t, bool> mVolumes;
 };

@@ -206,7 +206,7 @@ class PathOfFullPath final : public PathQuestion {
     std::string_view hfsPath = mHFSPath;
     if (hfsPath.ends_with(protocol::kSeparator)) hfsPath.remove_suffix(1);
     const std::size_t end = hfsPath.rfind(protocol::kSeparator);
-    if (code == kNoSuchVolume) return WithoutVolume(exchange);
+    if (code == kNoSuchVolume) return InterfaceOrNone(exchange);
     if (code != kNoSuchItem || end == hfsPath.npos) return Failed(code);
     const std::string_view name = hfsPath.substr(end + 1);
     if (WhyNoHFSName(name)) return Failed(code);
@@ -214,6 +214,23 @@ class PathOfFullPath final : public PathQuestion {
     if (!folder) return folder.Failure();
     if (folder->code != 0) return Failed(code);
     return New(exchange, Plain(std::move(folder->path)), name);
+  }
+
+  // The folder of a kernel interface is found without the colon at its end.
+  Conversion<std::string> InterfaceOrNone(Exchange& exchange) const {
+    std::string_view hfsPath = mHFSPath;
+    if (!hfsPath.ends_with(protocol::kSeparator)) return WithoutVolume(exchange);
+    hfsPath.remove_suffix(1);
+    // Without a colon in it, it begins in the current folder; with one at its end, it went up.
+    if (WhyNone(hfsPath) || hfsPath.ends_with(protocol::kSeparator)) return WithoutVolume(exchange);
+    auto answer = exchange.AskNow(request::PathAndResult(hfsPath));
+    if (!answer) return answer.Failure();
+    if (answer->code != 0) return WithoutVolume(exchange);
+    std::string path = Plain(std::move(answer->path));
+    const auto looked = LookAt(path);
+    if (!looked) return looked.Failure();
+    if (!looked->isFolder) return WithoutVolume(exchange);
+    return Path{std::move(path), Outcome::kFound};
   }
 
   // That there is no such volume is told of what is in a kernel interface, too.

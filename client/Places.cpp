@@ -114,6 +114,13 @@ bool IsSameItem(const std::string& one, const std::string& other) {
          IsSame(first, second);
 }
 
+bool IsSameFileSystem(const std::string& one, const std::string& other) {
+  struct stat first {};
+  struct stat second {};
+  return lstat(one.c_str(), &first) == 0 && lstat(other.c_str(), &second) == 0 &&
+         first.st_dev == second.st_dev;
+}
+
 std::string_view LastNameOf(std::string_view path) {
   return path.substr(path.rfind('/') + 1);
 }

@@ -64,6 +64,9 @@ Result<Looked> LookAt(const std::string& path);
 // Whether two paths, links at their ends not followed, lead to one item.
 bool IsSameItem(const std::string& one, const std::string& other);
 
+// The same for items of one file system.
+bool IsSameFileSystem(const std::string& one, const std::string& other);
+
 // The last name of a path, and what is in front of it and its slash.
 std::string_view LastNameOf(std::string_view path);
 std::string_view FolderOf(std::string_view path);

@@ -406,6 +406,26 @@ TEST_F(Conversions, AKernelInterfaceHasItsOwnHFSPathAndWhatIsInItNone) {
   EXPECT_THAT(mClient.PathInFolder("/proc", "version"), Fails(Outcome::kNotAVolume));
 }
 
+TEST_F(Conversions, TheHFSPathOfAKernelInterfaceLeadsBackWithAndWithoutItsColon) {
+  const std::string root = *mClient.MakeFullPath("/");
+  for (const char* const path : {"/proc", "/sys"}) {
+    const auto hfsPath = mClient.HFSPathOf(path);
+    ASSERT_THAT(hfsPath, Is(root + (path + 1) + ":", Outcome::kFound));
+    EXPECT_THAT(mClient.PathOfHFSPath(hfsPath->value), Is(std::string(path), Outcome::kFound));
+    EXPECT_THAT(mClient.PathOfHFSPath(root + (path + 1)), Is(std::string(path), Outcome::kFound));
+  }
+  EXPECT_THAT(mClient.PathOfHFSPath(root + "proc:self:"), Fails(Outcome::kNotAVolume));
+  EXPECT_THAT(mClient.PathOfHFSPath(root + "proc::"), testing::Not(Is("/proc", Outcome::kFound)));
+  EXPECT_THAT(mClient.PathOfHFSPath(root + "proc:fs::"), Fails(Outcome::kNotAVolume));
+}
+
+TEST_F(Conversions, TheNameOfNoVolumeIsNotLookedForInTheCurrentFolder) {
+  mFolder.MakeFolder("no volume");
+  const WorkingIn folder(mFolder.Path());
+  Client here = StartClient();
+  EXPECT_THAT(here.PathOfHFSPath("no volume:"), Fails(Outcome::kNotAVolume));
+}
+
 TEST_F(Conversions, ANewItemInAKernelInterfaceIsOnNoVolume) {
   EXPECT_EQ(RawPathOf(RawRecordOf("/proc/new")), std::nullopt);
   EXPECT_THAT(mClient.RecordOf("/proc/new"), Fails(Outcome::kNotAVolume));
@@ -526,6 +546,18 @@ TEST_F(VolumeConversions, AnHFSPathOnTheSecondOfTwoVolumesWithOneNameIsAmbiguous
             In("a/vol/file"));
   EXPECT_THAT(mClient.HFSPathOf(In("a/vol/file")), Is(std::string("vol:file"), Outcome::kFound));
   EXPECT_THAT(mClient.HFSPathOf(In("b/vol/file")), Fails(Outcome::kAmbiguous));
+}
+
+TEST_F(VolumeConversions, AnHFSPathInAFolderThatOnlyTheSecondNamesakeHasIsAmbiguous) {
+  const ScopedMount first("none", mFolder.MakeFolder("a/v\xC3\xA9"), "tmpfs");
+  const ScopedMount second("none", mFolder.MakeFolder("b/v\xC3\xA9"), "tmpfs");
+  ASSERT_TRUE(first.IsMounted() && second.IsMounted());
+  mFolder.MakeFolder("b/v\xC3\xA9/only/inner");
+  for (const char* const item : {"only", "only/new", "only/inner", "only/inner/new"}) {
+    const auto hfsPath = mClient.HFSPathOf(In("b/v\xC3\xA9/") + item);
+    EXPECT_THAT(hfsPath, Fails(Outcome::kAmbiguous)) << item;
+    EXPECT_THAT(test::MessageOf(hfsPath), HasSubstr("v\xC3\xA9\"")) << item;
+  }
 }
 
 TEST_F(VolumeConversions, AnHFSPathWhoseOuterFoldersMayNotBeLookedAtIsRefused) {
