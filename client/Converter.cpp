@@ -10,7 +10,7 @@ namespace tallowmere {
 namespace {
 
 template <class T>
-class PlainQuestion final : public conversion::Question {
+class PlainQuestion final : public conversion::Inquiry {
  public:
   PlainQuestion(conversion::Exchange& exchange, const Request<T>& request,
                 std::function<void(Result<T>)> handler)
@@ -24,7 +24,7 @@ class PlainQuestion final : public conversion::Question {
   std::optional<Result<T>> mAnswer;
 };
 
-class KnownAnswer final : public conversion::Question {
+class KnownAnswer final : public conversion::Inquiry {
  public:
   explicit KnownAnswer(std::function<void()> handler) : mHandler(std::move(handler)) {}
   void Tell(conversion::Exchange& /*exchange*/) override { mHandler(); }

@@ -54,7 +54,7 @@ Request<answer::PathByResult> RootOfVolume(const std::string& fullPath) {
 
 }  // namespace
 
-void Exchange::Take(std::unique_ptr<Question> question) {
+void Exchange::Take(std::unique_ptr<Inquiry> question) {
   mQuestions.push_back(std::move(question));
   PutChecks();
   TellThoseInTurn();
@@ -79,7 +79,7 @@ void Exchange::Finish() {
 // half done.
 void Exchange::TellThoseInTurn() {
   while (!mQuestions.empty() && mQuestions.front()->IsAnswered()) {
-    const std::unique_ptr<Question> first = std::move(mQuestions.front());
+    const std::unique_ptr<Inquiry> first = std::move(mQuestions.front());
     mQuestions.pop_front();
     first->Tell(*this);
   }

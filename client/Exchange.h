@@ -20,12 +20,12 @@ namespace tallowmere::conversion {
 class Exchange;
 
 // What somebody has asked, in line with others until it is its turn to be told.
-class Question {
+class Inquiry {
  public:
-  Question() = default;
-  Question(const Question&) = delete;
-  Question& operator=(const Question&) = delete;
-  virtual ~Question() = default;
+  Inquiry() = default;
+  Inquiry(const Inquiry&) = delete;
+  Inquiry& operator=(const Inquiry&) = delete;
+  virtual ~Inquiry() = default;
 
   // Whether everything that was asked for it has been answered.
   virtual bool IsAnswered() const { return mAwaited == 0; }
@@ -47,7 +47,7 @@ class Exchange {
 
   // Puts a request for a question; `store` keeps its answer.
   template <class T>
-  void Put(const Request<T>& request, Question& question, std::optional<Result<T>>& store) {
+  void Put(const Request<T>& request, Inquiry& question, std::optional<Result<T>>& store) {
     ++question.mAwaited;
     mBatch.Add(request, [&question, &store](Result<T> answer) {
       store.emplace(std::move(answer));
@@ -65,7 +65,7 @@ class Exchange {
   }
 
   // Takes a question in whose requests have been put; tells those whose turn it is.
-  void Take(std::unique_ptr<Question> question);
+  void Take(std::unique_ptr<Inquiry> question);
 
   // Waits for all answers and tells them.
   void Finish();
@@ -97,7 +97,7 @@ class Exchange {
   Batch mBatch;
   std::vector<FullPath> mUnchecked;
   std::vector<FullPath> mLost;  // those that lead nowhere
-  std::deque<std::unique_ptr<Question>> mQuestions;
+  std::deque<std::unique_ptr<Inquiry>> mQuestions;
   std::map<std::int16_t, bool> mVolumes;
 };
 

@@ -45,7 +45,7 @@ std::optional<Error> WhyNotNew(const Place& place) {
 }
 
 template <class T>
-class ItemQuestion : public Question {
+class ItemQuestion : public Inquiry {
  public:
   ItemQuestion(Exchange& exchange, std::string_view path, Handler<T> handler)
       : mPlace(exchange.places.Find(path)), mHandler(std::move(handler)) {
@@ -179,18 +179,18 @@ class HFSPathQuestion final : public ItemQuestion<std::string> {
 
 }  // namespace
 
-std::unique_ptr<Question> RecordOf(Exchange& exchange, std::string_view path,
-                                   Handler<FSSpec> handler) {
+std::unique_ptr<Inquiry> RecordOf(Exchange& exchange, std::string_view path,
+                                  Handler<FSSpec> handler) {
   return std::make_unique<RecordQuestion>(exchange, path, std::move(handler));
 }
 
-std::unique_ptr<Question> HFSNameOf(Exchange& exchange, std::string_view path,
-                                    Handler<std::string> handler) {
+std::unique_ptr<Inquiry> HFSNameOf(Exchange& exchange, std::string_view path,
+                                   Handler<std::string> handler) {
   return std::make_unique<NameQuestion>(exchange, path, std::move(handler));
 }
 
-std::unique_ptr<Question> HFSPathOf(Exchange& exchange, std::string_view path,
-                                    Handler<std::string> handler) {
+std::unique_ptr<Inquiry> HFSPathOf(Exchange& exchange, std::string_view path,
+                                   Handler<std::string> handler) {
   return std::make_unique<HFSPathQuestion>(exchange, path, std::move(handler));
 }
 

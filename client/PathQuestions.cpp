@@ -23,7 +23,7 @@ std::string Plain(std::string path) {
   return path;
 }
 
-class PathQuestion : public Question {
+class PathQuestion : public Inquiry {
  public:
   explicit PathQuestion(Handler<std::string> handler) : mHandler(std::move(handler)) {}
 
@@ -284,18 +284,18 @@ class PathOfFullPath final : public PathQuestion {
 
 }  // namespace
 
-std::unique_ptr<Question> PathOf(Exchange& exchange, const FSSpec& record, bool searchOtherVolumes,
-                                 Handler<std::string> handler) {
+std::unique_ptr<Inquiry> PathOf(Exchange& exchange, const FSSpec& record, bool searchOtherVolumes,
+                                Handler<std::string> handler) {
   return std::make_unique<PathOfRecord>(exchange, record, searchOtherVolumes, std::move(handler));
 }
 
-std::unique_ptr<Question> PathInFolder(Exchange& exchange, std::string_view folder,
-                                       std::string_view hfsName, Handler<std::string> handler) {
+std::unique_ptr<Inquiry> PathInFolder(Exchange& exchange, std::string_view folder,
+                                      std::string_view hfsName, Handler<std::string> handler) {
   return std::make_unique<PathOfName>(exchange, folder, hfsName, std::move(handler));
 }
 
-std::unique_ptr<Question> PathOfHFSPath(Exchange& exchange, std::string_view hfsPath,
-                                        Handler<std::string> handler) {
+std::unique_ptr<Inquiry> PathOfHFSPath(Exchange& exchange, std::string_view hfsPath,
+                                       Handler<std::string> handler) {
   return std::make_unique<PathOfFullPath>(exchange, hfsPath, std::move(handler));
 }
 

@@ -1,6 +1,7 @@
 // tallowmere-cli alias: records, bookmarks and files with them, told apart by their content.
 #include <gmock/gmock.h>
 
+#include <filesystem>
 #include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
@@ -97,6 +98,28 @@ TEST(AliasCommand, TellsContainersApartByTheirContent) {
   EXPECT_EQ(bare["form"], "bookmark");
   EXPECT_EQ(bare["posix_path"], "/a/b");
   EXPECT_FALSE(bare.contains("container"));
+}
+
+TEST(AliasCommand, ReadsTheRecordBesideABrokenBookmark) {
+  const TemporaryFolder folder;
+  const std::string bookmark =
+      Write(BookmarkToWrite{.components = {"a", "b"}, .volumeName = "V"}).File();
+  MacBinaryToWrite macBinary;
+  macBinary.resourceFork = WriteResourceFork({{"alis", 0, Write(Record())}});
+  macBinary.dataFork = bookmark;
+  EXPECT_EQ(JsonOf(folder.MakeFile("whole", Write(macBinary)))["form"], "bookmark");
+  macBinary.dataFork = bookmark.substr(0, 60);
+  EXPECT_EQ(JsonOf(folder.MakeFile("cut", Write(macBinary)))["id"], 42);
+}
+
+// Not the file that the path names once ".." is taken out of its text.
+TEST(AliasCommand, GoesTheKernelsWayToAFile) {
+  const TemporaryFolder folder;
+  folder.MakeFolder("other/inner");
+  std::filesystem::create_directory_symlink("other/inner", folder.Path() / "link");
+  folder.MakeFile("record", "no alias");
+  folder.MakeFile("other/record", Write(Record()));
+  EXPECT_EQ(JsonOf(folder.Path() / "link/../record")["id"], 42);
 }
 
 TEST(AliasCommand, TellsWhereAnAliasFileLeads) {
