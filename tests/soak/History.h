@@ -23,6 +23,8 @@ class History {
   Version Begun() const { return mBegun.load(std::memory_order_seq_cst); }
   // Valid until kKept more have begun.
   const State& At(Version version) const { return mStates[version % kKept]; }
+  // Whether a state, and so all later ones, have not begun to be overwritten.
+  bool Keeps(Version version) const { return Begun() + 1 - version < kKept; }
 
   // For the writer: begins the next state. Facts that are not known before it is reached are filled
   // in until then.

@@ -359,5 +359,21 @@ TEST(JudgeOfAServedVolume, TakesAnErrorOfTheServerAboutWhatChanged) {
             Verdict::kHonestError);
 }
 
+TEST(History, TellsWhenAStateIsNoLongerKept) {
+  State state{};
+  History history(state);
+  for (History::Version version = 1; version < History::kKept - 1; ++version) {
+    state.main.number = -static_cast<int>(version);
+    history.Begin(state);
+    history.Reach();
+  }
+  EXPECT_TRUE(history.Keeps(0));
+  state.main.number = 1;
+  history.Begin(state);
+  EXPECT_FALSE(history.Keeps(0)) << "the next one may already be written over it";
+  EXPECT_TRUE(history.Keeps(1));
+  EXPECT_EQ(history.At(1).main.number, -1);
+}
+
 }  // namespace
 }  // namespace tallowmere::soak

@@ -327,33 +327,38 @@ class Run {
       answers.push_back({std::move(response), last});
     }
     while (history.Reached() < last) std::this_thread::yield();
-    // Of so many states as a busy machine takes, the answers in steps are too many to work out, and
-    // the first ones may be lost. Others are asked instead.
+    // Of so many states as a busy machine takes, the answers in steps are too many to work out.
+    // Others are asked instead.
     if (history.Begun() - first > kMostStates) return;
     for (std::size_t i = 0; i < size; ++i) {
       JudgeOne(requests[i], answers[i].response, first, answers[i].last);
     }
-    mCounts.asked += size;
+  }
+
+  Verdict VerdictOn(const Request& request, const std::string& response, History::Version first,
+                    History::Version last) {
+    if (request.code != kExport) return mJudge.Of(request, response, first, last);
+    const auto settings = ReadAtomContainer(
+        std::string_view(response).substr(6, response.size() - 6 - kTrailer.size()));
+    const bool isIt =
+        response.starts_with(I16(0)) && settings == SettingsOf("twos", kRateOfACD, 16, 2);
+    return isIt ? Verdict::kExact : Verdict::kWrong;
   }
 
   void JudgeOne(const Request& request, const std::string& response, History::Version first,
                 History::Version last) {
+    const Verdict verdict = VerdictOn(request, response, first, last);
+    std::string report;
+    if (verdict == Verdict::kWrong) report = mJudge.Report(request, response, first, last);
+    // The tree went on changing meanwhile. A verdict by states that are no longer kept is none.
+    if (!mChurner.Changes().Keeps(first)) return;
+    ++mCounts.asked;
     mCounts.states += last - first + 1;
-    Verdict verdict = Verdict::kWrong;
-    if (request.code == kExport) {
-      const auto settings = ReadAtomContainer(
-          std::string_view(response).substr(6, response.size() - 6 - kTrailer.size()));
-      const bool isIt =
-          response.starts_with(I16(0)) && settings == SettingsOf("twos", kRateOfACD, 16, 2);
-      verdict = isIt ? Verdict::kExact : Verdict::kWrong;
-    } else {
-      verdict = mJudge.Of(request, response, first, last);
-    }
     ++mCounts.ofVerdict[request.code][static_cast<std::size_t>(verdict)];
     if (verdict != Verdict::kWrong) return;
     if (++mCounts.wrong <= kMostReports) {
       std::printf("WRONG after %llu requests\n%s\n", static_cast<unsigned long long>(mCounts.asked),
-                  mJudge.Report(request, response, first, last).c_str());
+                  report.c_str());
       std::fflush(stdout);
     }
   }
