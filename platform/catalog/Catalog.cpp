@@ -7,6 +7,8 @@ namespace {
 
 // In bytes: some five thousand places with paths of usual length.
 constexpr std::size_t kPlacesLimit = 1 << 20;
+// Likewise: some fifteen thousand entries with names of usual length.
+constexpr std::size_t kListingsLimit = 1 << 20;
 
 // Mark the spaces of items without a node id, on top of their device number, which has fewer bits.
 constexpr std::uint64_t kByInode = std::uint64_t{1} << 63;
@@ -29,7 +31,7 @@ bool IsSeenAlike(const volumes::ListedVolume& first, const volumes::ListedVolume
 
 }  // namespace
 
-Catalog::Catalog() : mPlaces(kPlacesLimit) {}
+Catalog::Catalog() : mPlaces(kPlacesLimit), mListings(kListingsLimit) {}
 
 void Catalog::Remember(const kernel::Item& item, std::string_view path,
                        const volumes::Volume* volume) {

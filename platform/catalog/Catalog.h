@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "catalog/FolderIndex.h"
+#include "catalog/FolderListings.h"
 #include "catalog/PlaceMemory.h"
 #include "catalog/Sighting.h"
 #include "volumes/Volumes.h"
@@ -47,11 +48,14 @@ class Catalog {
   std::optional<std::string> SearchVolume(const volumes::VolumePointer& volume,
                                           const SearchedItem& item, const std::string& start);
 
+  FolderListings& Listings() { return mListings; }
+
  private:
   FolderIndex& IndexOf(const volumes::VolumePointer& volume);
 
   volumes::VolumeTable mTable;
   PlaceMemory mPlaces;
+  FolderListings mListings;
   std::vector<FolderIndex> mIndexes;  // by volume
   bool mWasFolderMarkRight = true;
 };

@@ -4,6 +4,8 @@
 #include <limits>
 #include <utility>
 
+#include "catalog/ChangeTimes.h"
+
 namespace tallowmere::catalog {
 namespace {
 
@@ -14,12 +16,6 @@ FolderTree::Identity IdentityOn(const volumes::Volume& volume) {
 
 // How many walks to make while the volume keeps changing.
 constexpr int kMostLooks = 3;
-
-// Whether a known folder stays valid until its change time moves. A server that promises nothing
-// can show several folders as one, with one change time.
-bool HoldsUntilChange(const volumes::Volume& volume) {
-  return volume.NumbersIdentifyItems() || volume.Kind().keepsNumbers;
-}
 
 }  // namespace
 

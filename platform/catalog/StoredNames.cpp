@@ -7,7 +7,6 @@
 
 #include "foundation/PathText.h"
 #include "kernel/FolderReader.h"
-#include "kernel/Paths.h"
 #include "text/FileNameText.h"
 #include "text/MacRoman.h"
 #include "text/Utf16.h"
@@ -41,27 +40,26 @@ enum class By { kNumber, kLetters };
 
 // The name of the entry of a folder by which the kernel found an item: the very name, else the only
 // one that is alike in number, or but for letter case.
-std::optional<std::string> NameOfEntry(const Look& item, By by) {
-  const auto open = kernel::OpenForReading(item.Folder().SpotOf("."));
-  if (!open) return std::nullopt;
+std::optional<std::string> NameOfEntry(FolderListings& listings, const Look& item, By by) {
   const std::string_view asked = item.Name();
   const std::u16string folded = by == By::kLetters ? Folded(asked) : std::u16string();
   Alike alike;
-  kernel::FolderReader reader(*open);
-  while (const kernel::Entry* const entry = reader.Next()) {
-    if (entry->name == asked) return std::string(asked);
+  bool isAsked = false;
+  const bool isRead = listings.Visit(item.Folder(), [&](const kernel::Entry& entry) {
+    isAsked = entry.name == asked;
     const bool isAlike =
-        by == By::kLetters ? Folded(entry->name) == folded : entry->inode == item.Item().inode;
-    if (isAlike) alike.Offer(entry->name);
-  }
-  const bool isTold = reader.FailedBy().number == 0 && alike.Only() != nullptr;
-  return isTold ? std::optional(*alike.Only()) : std::nullopt;
+        by == By::kLetters ? Folded(entry.name) == folded : entry.inode == item.Item().inode;
+    if (isAlike) alike.Offer(entry.name);
+    return !isAsked;
+  });
+  if (isAsked) return std::string(asked);
+  return isRead && alike.Only() != nullptr ? std::optional(*alike.Only()) : std::nullopt;
 }
 
 // Entries of hard links on hfsplus have numbers of their own: their letters tell them.
-std::optional<std::string> StoredNameOf(const Look& item) {
-  auto name = NameOfEntry(item, By::kNumber);
-  return name ? name : NameOfEntry(item, By::kLetters);
+std::optional<std::string> StoredNameOf(FolderListings& listings, const Look& item) {
+  auto name = NameOfEntry(listings, item, By::kNumber);
+  return name ? name : NameOfEntry(listings, item, By::kLetters);
 }
 
 bool HasLetters(std::string_view name) {
@@ -86,7 +84,7 @@ std::string_view MountPointOn(const volumes::Volume& volume, const std::string& 
 Look AsStored(Moment& moment, const Look& item) {
   const volumes::Volume& volume = *item.Folder().Volume();
   if (!volume.Kind().ignoresCase || !HasLetters(item.Name())) return item;
-  const auto name = StoredNameOf(item);
+  const auto name = StoredNameOf(moment.Knowledge().Listings(), item);
   if (!name || *name == item.Name()) return item;
   const auto stored = moment.LookUp(item.Folder(), *name);
   return stored && AreSame(volume, stored->Seen(), item.Seen()) ? *stored : item;

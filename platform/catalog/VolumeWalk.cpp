@@ -4,16 +4,13 @@
 #include <iterator>
 #include <utility>
 
+#include "catalog/ChangeTimes.h"
 #include "foundation/PathText.h"
 #include "kernel/Clock.h"
 #include "kernel/Paths.h"
 
 namespace tallowmere::catalog {
 namespace {
-
-// In nanoseconds. A change this recent may be followed by another with the same time: file systems
-// count time in ticks, the coarsest (FAT) of two seconds.
-constexpr std::uint64_t kCoarsestTick = 2'000'000'000;
 
 constexpr std::size_t kMostOpenFolders = 16;
 
@@ -321,9 +318,7 @@ void VolumeWalk::MarkAsRead(FolderNumber number, kernel::Nanoseconds change,
   FolderTree::Folder& folder = mTree[number];
   if (folder.isRead) return;
   folder.read = mKnown.walks;
-  const std::uint64_t age = static_cast<std::uint64_t>(now) - static_cast<std::uint64_t>(change);
-  const bool mayChangeUnseen = now <= change || age <= kCoarsestTick;
-  folder.isRead = !mayChangeUnseen;
+  folder.isRead = !MayChangeUnseen(change, now);
 }
 
 // Has the folder read again next time, because something in it was not seen that may become visible

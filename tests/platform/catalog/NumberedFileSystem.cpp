@@ -72,15 +72,16 @@ void GetAttributes(fuse_req_t request, fuse_ino_t node, fuse_file_info*) {
   fuse_reply_attr(request, &nodes[node].about, 0);
 }
 
+// In ticks where it passes for an old volume, so that two changes can have one time.
+void Touch(fuse_ino_t node) {
+  clock_gettime(ignoresCase ? CLOCK_REALTIME_COARSE : CLOCK_REALTIME, &nodes[node].about.st_ctim);
+}
+
 void SetAttributes(fuse_req_t request, fuse_ino_t node, struct stat* given, int which,
                    fuse_file_info*) {
   if ((which & FUSE_SET_ATTR_MODE) != 0) nodes[node].about.st_mode = given->st_mode;
-  clock_gettime(CLOCK_REALTIME, &nodes[node].about.st_ctim);
+  Touch(node);
   fuse_reply_attr(request, &nodes[node].about, 0);
-}
-
-void Touch(fuse_ino_t node) {
-  clock_gettime(CLOCK_REALTIME, &nodes[node].about.st_ctim);
 }
 
 void Make(fuse_req_t request, fuse_ino_t parent, const char* name, mode_t mode) {

@@ -3,9 +3,12 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include <chrono>
 #include <filesystem>
+#include <functional>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "NumberedFileSystem.h"
 #include "names/HFSNames.h"
@@ -138,6 +141,75 @@ INSTANTIATE_TEST_SUITE_P(OnEachKind, WithoutLetterCase,
                                   : type.param == kVfat    ? "vfat"
                                                            : "exfat";
                          });
+
+// Keeps its items' numbers, so that a change time is proof; an hour later, any change is old.
+class AnOldVolumeAnHourLater : public AnOldVolume {
+ protected:
+  void SetUp() override {
+    Mount(kHFSPlus);
+    mLater.emplace(std::chrono::hours(1));  // for this process, not for the volume's server
+  }
+
+  // How often folders are read while an action lasts.
+  static int ReadingsDuring(const std::function<void()>& action) {
+    int readings = 0;
+    const BeforeEntries counted([&](int) { ++readings; });
+    action();
+    return readings;
+  }
+
+  std::optional<OtherTime> mLater;
+};
+
+TEST_F(AnOldVolumeAnHourLater, ReadsAFolderOnceForAllNames) {
+  const std::string folder = MakeFolder("Folder");
+  std::vector<std::string> paths;
+  for (const char* const name : {"Folder/one", "Folder/two", "Folder/three"}) {
+    paths.push_back(MakeFile(name));
+  }
+  EXPECT_EQ(LookUp(folder, "ONE"), paths[0]);
+  EXPECT_EQ(ReadingsDuring([&] {
+              EXPECT_EQ(LookUp(folder, "one"), paths[0]);
+              EXPECT_EQ(LookUp(folder, "two"), paths[1]);
+              EXPECT_EQ(LookUp(folder, "THREE"), paths[2]);
+            }),
+            0);
+}
+
+TEST_F(AnOldVolumeAnHourLater, ReadsAFolderAgainWhenItHasChanged) {
+  const std::string folder = MakeFolder("Folder");
+  const std::string before = MakeFile("Folder/Read Me");
+  EXPECT_EQ(LookUp(folder, "read me"), before);
+  WaitForTheNextTick();
+  const std::string after = folder + "/READ ME";
+  std::filesystem::rename(before, folder + "/other");
+  std::filesystem::rename(folder + "/other", after);
+  EXPECT_EQ(LookUp(folder, "read me"), after);
+  EXPECT_EQ(ReadingsDuring([&] { EXPECT_EQ(LookUp(folder, "Read Me"), after); }), 0);
+}
+
+TEST_F(AnOldVolumeAnHourLater, FindsNamesInAFolderTooLargeToBeKept) {
+  const std::string folder = MakeFolder("Folder");
+  const std::string filler(200, 'n');
+  for (int i = 0; i < 6000; ++i) MakeFile("Folder/" + filler + std::to_string(i));
+  const std::string path = MakeFile("Folder/Read Me");
+  for (int i = 0; i < 2; ++i) EXPECT_EQ(LookUp(folder, "READ ME"), path);
+}
+
+TEST_F(AnOldVolume, OfRecentChangesReadsTheFolderEachTime) {
+  ASSERT_NO_FATAL_FAILURE(Mount(kHFSPlus));
+  if (IsSkipped()) return;
+  // Some of the changes have the same time as the one before.
+  for (int i = 0; i < 50; ++i) {
+    const std::string number = std::to_string(i);
+    const std::string lower = MakeFile("read me " + number);
+    EXPECT_EQ(LookUp(Top(), "Read Me " + number), lower);
+    const std::string upper = Top() + "/READ ME " + number;
+    std::filesystem::rename(lower, Top() + "/other");
+    std::filesystem::rename(Top() + "/other", upper);
+    ASSERT_EQ(LookUp(Top(), "Read Me " + number), upper);
+  }
+}
 
 TEST_F(AnOldVolume, NamesInBytesAreFoundByTheSameBytes) {
   ASSERT_NO_FATAL_FAILURE(Mount(kHFS));
