@@ -1,4 +1,4 @@
-// Alias records: any bytes, and records of any content.
+// Alias records: arbitrary bytes, and written records with arbitrary fields.
 #include <algorithm>
 #include <string>
 
@@ -41,14 +41,14 @@ void CheckBytes(std::string_view bytes) {
   Check(record->shortVolumeName.size() <= 27 && record->shortTargetName.size() <= 63);
   Check(!record->hfsPath || record->hfsPath->find('\0') == std::string::npos);
   CheckTarget(aliases::TargetOf(*record));
-  // What its size does not cover is not read.
+  // Bytes beyond the stated size are not read.
   const auto size = static_cast<std::size_t>(static_cast<unsigned char>(bytes[4]) << 8 |
                                              static_cast<unsigned char>(bytes[5]));
   Check(formats::ReadAliasRecord(bytes.substr(0, size)).has_value());
   Check(!formats::ReadAliasRecord(bytes.substr(0, size - 1)));
 }
 
-// A record is read as it was written.
+// A record is read back as it was written.
 void CheckWritten(Input& input) {
   test::RecordToWrite record;
   record.version = input.TakeByte() % 2 == 0 ? 2 : 3;

@@ -1,4 +1,4 @@
-// An answer as a client reads it: any bytes, cut off anywhere.
+// Answers as a client reads them: arbitrary bytes, cut off anywhere.
 #include <algorithm>
 #include <memory>
 #include <optional>
@@ -31,8 +31,8 @@ std::uint16_t NumberAt(std::string_view bytes, std::size_t at) {
   return static_cast<std::uint16_t>(low | high << 8);
 }
 
-// Whether the text is the string at this place of the answer, without its NUL and count. A string
-// that is absent or empty must give no text.
+// Checks that the text is the string at this place of the answer, without its count and NUL. An
+// absent or empty string must give no text.
 void CheckString(std::string_view answer, std::size_t at, bool isThere,
                  const std::optional<std::string>& text) {
   const std::uint16_t count = NumberAt(answer, at);
@@ -100,7 +100,7 @@ void ReadAndCompare(AnswerReader& answer, std::string_view bytes, unsigned kind,
   }
 }
 
-// What a reader made of some bytes.
+// The result of reading some bytes.
 struct Outcome {
   std::string_view fault;
   std::size_t size = 0;    // of a whole answer; otherwise 0

@@ -1,4 +1,4 @@
-// AppleDouble files: any bytes, and any beginning of a file of any size.
+// AppleDouble files: arbitrary bytes, as a whole file and as the beginning of a longer one.
 #include <algorithm>
 
 #include "formats/AppleDouble.h"

@@ -1,4 +1,4 @@
-// Atom containers: any bytes as a container, and the exporter's settings for any sound.
+// Atom containers: arbitrary bytes as a container, and the exporter's settings for any sound.
 #include <algorithm>
 #include <cstring>
 #include <string>
@@ -38,14 +38,14 @@ void CheckReading(std::string_view container) {
   Check(static_cast<std::size_t>(lines) == CountAtoms(*root));
 }
 
-// The lowest bytes of a number, the highest of them first.
+// Returns the lowest bytes of a number, the most significant first.
 std::string Bytes(UInt32 number, int count) {
   std::string bytes;
   while (count-- > 0) bytes.push_back(static_cast<char>(number >> (8 * count)));
   return bytes;
 }
 
-// The settings for an accepted sound contain that sound, and no proper beginning of them is a
+// The settings for an accepted sound contain that sound, and no shorter beginning of them is a
 // container.
 void CheckExport(const SoundDescription& sound, std::size_t cut) {
   quicktime::AIFFExporter exporter;
@@ -63,7 +63,7 @@ void CheckExport(const SoundDescription& sound, std::size_t cut) {
   Check(!test::ReadAtomContainer(beginning));
 }
 
-// A tree of four atoms with any numbers is read as it was written.
+// A tree of four atoms with arbitrary numbers is read back as it was written.
 void CheckWriting(Input& input) {
   const auto word = static_cast<UInt32>(input.TakeByte() << 24 | input.TakeByte());
   const auto half = static_cast<UInt16>(input.TakeByte() << 8 | input.TakeByte());

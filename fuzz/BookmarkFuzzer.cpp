@@ -1,4 +1,4 @@
-// Bookmarks: any bytes, as they are and as the data of a well-formed head.
+// Bookmarks: arbitrary bytes, as they are and as the data after a well-formed header.
 #include <string>
 
 #include "aliases/Target.h"
@@ -20,7 +20,7 @@ void CheckBookmark(const formats::Bookmark& bookmark) {
   }
 }
 
-// The same data in both heads are the same bookmark.
+// The same data under both kinds of header give the same bookmark.
 void CheckData(std::string_view bytes) {
   const std::string data(bytes);
   const std::string zeros(32, '\0');
@@ -39,7 +39,7 @@ void CheckData(std::string_view bytes) {
 }  // namespace
 }  // namespace tallowmere::fuzz
 
-// The input: a kind, then a bookmark, the data of an alias file, or what follows a head.
+// The input: a kind, then a bookmark, the data of an alias file, or the data after a header.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   using namespace tallowmere::fuzz;
   using namespace tallowmere::formats;

@@ -1,4 +1,4 @@
-// How a target reports a finding, and how it takes its input apart.
+// How a target reports a finding, and how it splits its input.
 #pragma once
 
 #include <cstdint>

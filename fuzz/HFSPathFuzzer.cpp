@@ -1,4 +1,5 @@
-// Converts HFS and Windows paths to Linux paths and back: any bytes as each of the three.
+// Converts HFS and Windows paths to Linux paths and back, with arbitrary bytes as each of the
+// three.
 #include <optional>
 #include <string>
 

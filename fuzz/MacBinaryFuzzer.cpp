@@ -1,4 +1,4 @@
-// MacBinary files: any bytes, any with the right checksum, and files of any content.
+// MacBinary files: arbitrary bytes, the same with a correct checksum, and files with any content.
 #include <string>
 
 #include "formats/MacBinary.h"

@@ -1,4 +1,4 @@
-// The kernel's table of mounts: any text, read and grouped into volumes.
+// The kernel's mount table: arbitrary text, parsed and grouped into volumes.
 #include <sys/sysmacros.h>
 
 #include <algorithm>
@@ -43,7 +43,7 @@ bool IsSame(const Mount& a, const Mount& b) {
          a.mountPoint == b.mountPoint && a.type == b.type;
 }
 
-// Checks that all mounts are read from their lines.
+// Checks that each mount is read back from its line.
 void CheckLinesOf(const std::vector<Mount>& mounts) {
   std::string table;
   for (const Mount& mount : mounts) AppendLine(table, mount);

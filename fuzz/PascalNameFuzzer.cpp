@@ -1,5 +1,5 @@
-// Converts names between Linux, text and Pascal strings, in both directions: any bytes as each of
-// them.
+// Converts names between Linux, text and Pascal strings in both directions, with arbitrary bytes as
+// each of them.
 #include <LegacyHFSBridge.h>
 #include <tallowmere/Types.h>
 
@@ -21,7 +21,7 @@ namespace {
 using names::kLongestSpecName;
 using names::kLongestStr255Name;
 
-// Any bytes are text, and also Mac Roman text, and survive the round trip.
+// Arbitrary bytes are text, and also Mac Roman text, and survive the round trip.
 void CheckText(std::string_view bytes) {
   Check(text::FileNameOfText(text::TextOfFileName(bytes)) == bytes);
   const std::u16string text = text::DecodeMacRoman(bytes);
@@ -106,7 +106,7 @@ void CheckBridge(std::string_view bytes, SInt32 bufferSize) {
   Check(std::equal(expected.begin(), expected.end(), units));
 }
 
-// With this many, short inputs reach the longest names.
+// Repeats short inputs so that they reach the longest names.
 constexpr unsigned kMostTimes = 4;
 
 std::string Repeated(std::string_view bytes, unsigned times) {

@@ -1,4 +1,4 @@
-// HFS paths to records and back, over a small tree: any bytes as a path from any folder.
+// HFS paths to records and back, over a small tree: arbitrary bytes as a path from any folder.
 #include <CFileRef.h>
 #include <CoreServices/CoreServices.h>
 #include <LegacyHFSBridge.h>
@@ -40,7 +40,7 @@ void CheckItem(const FSSpec& spec) {
   std::array<char, 1024> buffer;
   const std::size_t length = CFileUtilMakeFullPath(reference, buffer.data(), buffer.size(), 1);
   Check(length == std::strlen(buffer.data()));
-  // A path that leaves out folders, or has to be cut, is not the item's.
+  // A path that omits folders or does not fit is not the item's.
   std::string path(buffer.data());
   if (!reference.IsFolder()) path += names::TextOfPascal(spec.name);
   if (path.size() > sizeof(Str255) - 1) return;

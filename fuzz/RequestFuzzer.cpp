@@ -1,4 +1,4 @@
-// The whole request step: any bytes as a parent's input, over a small tree.
+// The whole request step: arbitrary bytes as a parent's input, over a small tree.
 //
 // Excluded are the codes that end the process (0 and those above 10) and the buffer sizes for which
 // shortening a path never ends.
@@ -29,8 +29,8 @@ namespace {
 
 constexpr std::size_t kCodeSize = sizeof(std::uint16_t);
 
-// In a buffer of this size, a volume's name of up to 63 bytes leaves enough room for a shortened
-// path.
+// The smallest buffer that surely has room for a shortened path after a volume's name of up to 63
+// bytes.
 constexpr std::uint16_t kSmallestBuffer = 69;
 
 template <class Number>
@@ -249,7 +249,7 @@ void CheckAnswer(std::string_view request, std::string_view bytes) {
   Check(answer.IsWhole() && answer.Size() == bytes.size());
 }
 
-// Nothing changes in the tree, so the same question always has the same answer, whatever was asked
+// Nothing changes in the tree, so the same request always has the same answer, whatever was asked
 // in between.
 void CheckAgainstEarlierAnswer(std::string_view request, std::string_view answer) {
   struct Known {
@@ -264,9 +264,9 @@ void CheckAgainstEarlierAnswer(std::string_view request, std::string_view answer
   before = now;
 }
 
-// --- There and back ---------------------------------------------------------------------------
+// --- Round trips ------------------------------------------------------------------------------
 
-// Whether the path spells out an item folder by folder, without links on the way.
+// Returns whether the path names an item folder by folder, without links on the way.
 bool IsPlain(const std::string& path) {
   if (!path.starts_with('/') || path.size() > 4000 || path.ends_with('/')) return false;
   const std::filesystem::path whole(path);
@@ -280,7 +280,7 @@ bool IsPlain(const std::string& path) {
 }
 
 // An item's record leads back to exactly that item.
-void CheckWayBack(const std::string& path) {
+void CheckRoundTrip(const std::string& path) {
   struct stat item;
   if (!IsPlain(path) || lstat(path.c_str(), &item) != 0) return;
   std::string question("\7\0", kCodeSize);
@@ -296,7 +296,7 @@ void CheckWayBack(const std::string& path) {
   Check(found.st_dev == item.st_dev && found.st_ino == item.st_ino);
 }
 
-// The path that a request or its answer is about; nullopt when there is none.
+// Returns the path that a request or its answer is about, or nullopt.
 std::optional<std::string> PathIn(std::string_view request, std::string_view answer) {
   const auto text = [](std::string_view bytes, std::size_t at) {
     const std::string_view counted =
@@ -321,15 +321,15 @@ std::optional<std::string> PathIn(std::string_view request, std::string_view ans
 
 // --- The process ------------------------------------------------------------------------------
 
-// Changes with every descriptor that stays open or is closed by mistake.
+// The result changes when a descriptor stays open or is closed by mistake.
 int LowestFreeDescriptor() {
   const int descriptor = dup(STDIN_FILENO);
   Check(descriptor >= 0 && close(descriptor) == 0);
   return descriptor;
 }
 
-// Serves the first request in the bytes and returns its size; nullopt when it was the last one to
-// be served.
+// Serves the first request in the bytes and returns its size, or nullopt when it was the last one
+// to be served.
 std::optional<std::size_t> ServeOne(const std::string& bytes) {
   if (bytes.size() >= kCodeSize) {
     const auto code = NumberAt<std::uint16_t>(bytes, 0);
@@ -343,7 +343,7 @@ std::optional<std::size_t> ServeOne(const std::string& bytes) {
   const std::string_view request = std::string_view(servable).substr(0, *size);
   CheckAnswer(request, answer);
   CheckAgainstEarlierAnswer(request, answer);
-  if (const auto path = PathIn(request, answer)) CheckWayBack(*path);
+  if (const auto path = PathIn(request, answer)) CheckRoundTrip(*path);
   return size;
 }
 

@@ -1,4 +1,4 @@
-// Resource forks: any bytes.
+// Resource forks: arbitrary bytes.
 #include <algorithm>
 
 #include "formats/Bytes.h"

@@ -17,13 +17,13 @@
 namespace tallowmere::fuzz {
 namespace {
 
-// Inode numbers below 16 are not ids themselves.
+// Inode numbers below 16 are not used as ids.
 constexpr int kSpentInodes = 20;
 
 constexpr int kDepth = 12;
 constexpr std::size_t kDeepNameLength = 60;
 
-// The places to return to, and the tree's root. They stay open as long as the process lives.
+// The directories to return to, and the tree's root. They stay open for the process's lifetime.
 struct Folders {
   int outside;
   int current;
@@ -41,10 +41,10 @@ void ChangeRoot(int root, int current) {
   Check(fchdir(root) == 0 && chroot(".") == 0 && fchdir(current) == 0);
 }
 
-// Leaves the tree, as a finding is stored outside.
+// Leaves the tree, because findings are stored outside.
 void LeaveSmallTree() {
   if (fchdir(gFolders.outside) != 0 || chroot(".") != 0 || fchdir(gFolders.current) != 0) {
-    std::fputs("The way out of the tree is lost, and with it the finding.\n", stderr);
+    std::fputs("cannot leave the tree to store the finding\n", stderr);
   }
 }
 
@@ -91,7 +91,7 @@ void MakeSecondVolume(const test::TemporaryFolder& tree) {
   tree.MakeLink("Second/out", "/folder");
 }
 
-// Shows only the mount table of /proc in the tree: nothing else there stays the same.
+// Makes only the mount table of /proc available in the tree; the rest of /proc is never the same.
 bool ShowMountTable(const test::TemporaryFolder& tree) {
   tree.MakeFolder("proc/self");
   const std::string table = tree.MakeFile("proc/self/mountinfo");

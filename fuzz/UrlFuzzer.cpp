@@ -1,4 +1,4 @@
-// URLs: any bytes as a URL's text, and as a path or component of one.
+// URLs: arbitrary bytes as a URL's text, and as a path or component of one.
 #include <CoreFoundation/CoreFoundation.h>
 
 #include <optional>
@@ -32,7 +32,7 @@ std::optional<std::string> PathOf(CFURLRef url) {
   return BytesOf(OwnedString(CFURLCopyFileSystemPath(url, kCFURLPOSIXPathStyle)));
 }
 
-// Any text can be put together from its parts.
+// The parts of any text reassemble to the text.
 void CheckParts(std::string_view text) {
   const foundation::UrlParts parts = foundation::SplitUrl(text);
   std::string whole;
@@ -62,7 +62,7 @@ void CheckPath(CFURLRef url) {
   }
 }
 
-// A URL's folder, and the folder with the name added, are URLs; the latter has that name again.
+// A URL's folder, and that folder with the name added, are URLs; the latter has the name again.
 void CheckComponents(CFURLRef url) {
   const auto name = BytesOf(OwnedString(CFURLCopyLastPathComponent(url)));
   const auto extension = BytesOf(OwnedString(CFURLCopyPathExtension(url)));
@@ -91,7 +91,7 @@ void CheckUrl(std::string_view text) {
   CheckComponents(url.Get());
 }
 
-// Any bytes can be percent-encoded, and have a URL as an absolute path.
+// Arbitrary bytes can be percent-encoded and form a URL as an absolute path.
 void CheckBytes(std::string_view bytes) {
   Check(foundation::PercentDecode(bytes).size() <= bytes.size());
   for (const bool isStart : {false, true}) {

@@ -1,4 +1,4 @@
-// What a reader of bytes may give: pieces of them.
+// Checks the slices that a parser returns.
 #pragma once
 
 #include <string_view>
@@ -7,7 +7,7 @@
 
 namespace tallowmere::fuzz {
 
-// Checks that a piece lies within the bytes, and reads all of it.
+// Checks that the piece lies within the bytes, and reads all of it.
 inline void CheckPiece(std::string_view piece, std::string_view bytes) {
   Check(piece.size() <= bytes.size());
   Check(piece.empty() || (piece.data() >= bytes.data() &&

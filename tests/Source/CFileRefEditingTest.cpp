@@ -1,3 +1,4 @@
+// Editing a reference: AddToPath, ReplaceName, SetToParent and ResolveAlias.
 #include <gtest/gtest.h>
 #include <pwd.h>
 #include <rapidcheck/gtest.h>
@@ -10,7 +11,7 @@
 namespace tallowmere::test {
 namespace {
 
-// U+D800 alone, which no file name and no URL can say.
+// An unpaired surrogate, which no file name and no URL can express.
 CFOwned<CFStringRef> Unpaired() {
   return MakeString(u"a\xD800");
 }
@@ -21,7 +22,7 @@ CFileRef FromUrlText(const char* text) {
   return reference;
 }
 
-// A reference whose URL has no path and no containing folder.
+// A reference whose URL has neither a path nor a containing folder.
 CFileRef Pathless() {
   return FromUrlText("http://host");
 }
@@ -134,7 +135,7 @@ TEST(AddToPath, ThatMakesNoUrlEmptiesTheReference) {
   EXPECT_TRUE(IsEmpty(reference));
 }
 
-TEST(AddToPath, OfNothingLeavesAnEmptyReferenceEmpty) {
+TEST(AddToPath, OfUnusableTextLeavesAnEmptyReferenceEmpty) {
   CFileRef reference;
   EXPECT_FALSE(reference.AddToPath(static_cast<CFStringRef>(nullptr), false));
   EXPECT_TRUE(IsEmpty(reference));
@@ -209,7 +210,7 @@ TEST(ReplaceName, RefusedOnAnEmptyReferenceChangesNothingInIt) {
   EXPECT_TRUE(IsEmpty(reference));
 }
 
-TEST(ReplaceName, OnAnEmptyReferenceByWhatIsNoPathLeavesItEmpty) {
+TEST(ReplaceName, OnAnEmptyReferenceByUnusableTextLeavesItEmpty) {
   CFileRef reference;
   EXPECT_FALSE(reference.ReplaceName("", false));
   EXPECT_TRUE(IsEmpty(reference));
@@ -356,7 +357,7 @@ TEST_F(ResolveAlias, OfALinkNamesItsTarget) {
   EXPECT_TRUE(IsMarkedAsFolder(folder));
 }
 
-// An alias file with a record that leads to a name in its own folder.
+// Makes an alias file whose record leads to a name in the same folder.
 void MakeAliasIn(const TemporaryFolder& folder, const std::string& name, const std::string& target,
                  bool isFolder = false) {
   RecordToWrite record;
@@ -415,7 +416,7 @@ TEST_F(ResolveAlias, OfALinkToAnAliasFileNamesTheAliasFile) {
   EXPECT_EQ(PathOf(reference), mFolder.Path() / "alias");
 }
 
-TEST_F(ResolveAlias, OfADanglingLinkNamesWhatIsNotThere) {
+TEST_F(ResolveAlias, OfADanglingLinkNamesItsMissingTarget) {
   mFolder.MakeLink("link", "/Applications/Tool of Tallowmere");
   CFileRef reference = At("link");
   EXPECT_TRUE(reference.ResolveAlias(false));

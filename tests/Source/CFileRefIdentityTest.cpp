@@ -1,3 +1,4 @@
+// The identity of a reference's item: volume number, node id, folder ids and Unicode name.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
@@ -23,7 +24,7 @@ CFileRef RefTo(const std::filesystem::path& path) {
   return CFileRef(path.c_str(), false);
 }
 
-// A folder and a volume of the machine's own; its root is some volume's, whatever that is.
+// A temporary folder of this machine, on whichever volume that is.
 class Identity : public testing::Test {
  protected:
   const TemporaryFolder mFolder;
@@ -63,7 +64,7 @@ TEST_F(Identity, OfARelativePathIsThatInTheFolderWhereItWasMade) {
   EXPECT_EQ(anew.GetNodeID(), kNoNode);
 }
 
-TEST_F(Identity, OfAUrlThatIsNoFilesIsNoneThoughItsPathHasAnItem) {
+TEST_F(Identity, OfANonFileUrlIsNoneEvenIfItsPathExists) {
   CFileRef reference;
   for (const std::string host : {"http://host", "file://host"}) {
     ASSERT_TRUE(reference.SetFromURLString(host + mFolder.MakeFile("here").string()));
@@ -187,7 +188,7 @@ TEST_F(Identity, OfPathsOf65535BytesIsFoundByClimbing) {
   }
 }
 
-// Any climb ends, whatever the path is made of.
+// The climb to an existing folder ends for every path.
 RC_GTEST_PROP(IdentityOfAnyPath, ComesToAnEnd, ()) {
   const auto pieces = *rc::gen::container<std::vector<std::string>>(
       rc::gen::element<std::string>("/", "/", "..", ".", "tmp", "missing", ":", " ", "\xFF"));
@@ -200,7 +201,7 @@ RC_GTEST_PROP(IdentityOfAnyPath, ComesToAnEnd, ()) {
 
 // --- The name in UTF-16 -----------------------------------------------------------------------
 
-TEST_F(Identity, TheNameOfAnExistingItemIsTheCatalogs) {
+TEST_F(Identity, TheNameOfAnExistingItemComesFromTheCatalog) {
   EXPECT_EQ(UnicodeNameOf(RefTo(mFolder.MakeFile("a:b \xC3\xA9"))), u"a/b \u00E9");
 }
 
@@ -239,8 +240,8 @@ TEST_F(IdentityOnAVolume, AMissingItemIsOnTheVolumeAboveIt) {
   EXPECT_EQ(mData->Ref("missing/folders/file").GetVolumeRefNumber(), mData->Number());
 }
 
-// The inodes of a new tmpfs begin at 1, and those below 16 have ids in the upper half.
-TEST_F(IdentityOnAVolume, AnIdInTheUpperHalfIsNegativeWhereItIsSigned) {
+// A new tmpfs numbers its inodes from 1. Inodes below 16 have ids in the upper half.
+TEST_F(IdentityOnAVolume, AnIdInTheUpperHalfIsNegativeAsASignedNumber) {
   const CFileRef folder(mData->MakeFolder("folder").c_str(), true);
   const unsigned long id = folder.GetNodeID();
   ASSERT_GE(id, 0x80000000u);

@@ -1,3 +1,4 @@
+// The life of a reference: creation, copying, clearing and destruction, and its cached FSRef.
 #include <gtest/gtest.h>
 
 #include <cstring>
@@ -40,7 +41,7 @@ TEST(FileReference, CopyOfAnEmptyReferenceIsEmpty) {
   const CFileRef empty;
   CFileRef copy(empty);
   EXPECT_TRUE(IsEmpty(copy));
-  EXPECT_TRUE(copy.AddToPath("/a", false));  // it is an object of its own
+  EXPECT_TRUE(copy.AddToPath("/a", false));  // changes the copy only
   EXPECT_TRUE(IsEmpty(empty));
 }
 
@@ -123,7 +124,7 @@ TEST(FileReference, InvalidateAndReInitReleaseWhatIsHeld) {
   }
 }
 
-TEST(FileReference, ClearingLeavesTheTextOfTheFSSpecsNameBehindItsLength) {
+TEST(FileReference, ClearingLeavesTheTextOfTheFSSpecsNameAfterItsLength) {
   CFileRef reference("/a", false);
   FSSpec& spec = CachedFSSpecOf(reference);
   std::memcpy(spec.name, "\003abc", 4);
@@ -145,7 +146,7 @@ TEST(FileReference, InitReleasesNothing) {
   CFRelease(url.Get());
 }
 
-TEST(FileReference, ReadsTheLowestBitOfItsValidityAlone) {
+TEST(FileReference, ReadsOnlyTheLowestBitOfItsValidity) {
   CFileRef reference;
   reference.*MemberOf(ValidField()) = 2;
   EXPECT_FALSE(reference.IsValid());
@@ -192,7 +193,7 @@ TEST(FileReferenceFSRef, OfAnEmptyReferenceStaysAsItIs) {
   EXPECT_EQ(static_cast<FSRef const&>(reference).hidden[0], 1);
 }
 
-TEST(FileReferenceFSRef, GetFSRefFillsTheCallersAlone) {
+TEST(FileReferenceFSRef, GetFSRefFillsOnlyTheCallersFSRef) {
   const CFileRef reference("/", true);
   FSRef item = {};
   EXPECT_TRUE(reference.GetFSRef(&item));
@@ -218,8 +219,8 @@ TEST(FileReferenceFSRef, GetFSRefRefusesPathsThatBeginWithADot) {
   }
 }
 
-// The path is cached; a fresh path for such a reference does not exist, for it is relative.
-TEST(FileReferenceFSRef, GetFSRefTestsTheFirstCharacterOfThePathAlone) {
+// Caches a path by hand: a reference makes no path of its own that begins with a dot.
+TEST(FileReferenceFSRef, GetFSRefTestsOnlyTheFirstCharacterOfThePath) {
   CFileRef reference("/", true);
   auto* const path = new char[2]{'.', '\0'};
   reference.*MemberOf(PathField()) = path;

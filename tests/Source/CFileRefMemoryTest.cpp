@@ -1,5 +1,5 @@
-// Every operation with the n-th allocation failing, for n = 0, 1, 2, … until it needs no more: the
-// reference is right or empty, and nothing is left or released twice.
+// Runs every operation with the n-th allocation failing, for n = 0, 1, 2, … until it succeeds. The
+// reference must be right or empty, and nothing may be leaked or freed twice.
 #include <gtest/gtest.h>
 
 #include <functional>
@@ -18,10 +18,10 @@ using foundation::test::FailOneAllocationAfter;
 using foundation::test::LiveAllocations;
 using foundation::test::SizeOfLastArray;
 
-// How allocations fail after a number of them.
+// Makes allocations fail after a number of successful ones.
 using Failing = void (*)(long count);
 
-// Runs `body` with allocations failing, which may throw std::bad_alloc out of it.
+// Runs `body` while allocations fail. Returns its result, or false when it throws std::bad_alloc.
 bool RunFailing(Failing failAfter, long count, const std::function<bool()>& body) {
   failAfter(count);
   bool result = false;
@@ -37,9 +37,9 @@ class AllocationFailure : public testing::Test {
  protected:
   using Operation = std::function<bool(CFileRef&)>;
 
-  // Runs `operation` on a reference that holds `mUrl`, as the comment above says, once with every
-  // allocation from the n-th on failing and once with the n-th alone. It succeeds in the end, with
-  // `expected` for its path. Returns how many of its allocations were made to fail.
+  // Runs `operation` on a reference to `mUrl`, as described at the top: once with every allocation
+  // from the n-th on failing, and once with only the n-th failing. Expects `expected` as its path
+  // in the end. Returns how many allocations were made to fail.
   long FailEach(const Operation& operation, const std::string& expected) {
     for (long n = 0;; ++n) {
       Fail(FailOneAllocationAfter, n, operation, expected);
@@ -47,7 +47,7 @@ class AllocationFailure : public testing::Test {
     }
   }
 
-  // The same for a setter: a failed one leaves the reference empty.
+  // The same for a setter: when it fails, the reference must be empty.
   long FailEachSetting(const Operation& setter, const std::string& expected) {
     mMayStayAsItWas = false;
     const long count = FailEach(setter, expected);
@@ -86,7 +86,7 @@ class AllocationFailure : public testing::Test {
 };
 
 TEST_F(AllocationFailure, InSettersLeavesTheReferenceEmpty) {
-  // The constant strings come into being on their first use.
+  // Constant strings are allocated on first use.
   CFileRef(mFolder.Get(), mName.Get()).Set("~/x", false);
   const auto path = MakeName(kPath);
   const auto url = MakeUrl(kPath, true);
@@ -133,10 +133,10 @@ TEST_F(AllocationFailure, InTildeExpansionLeavesTheReferenceEmpty) {
       5);
 }
 
-// The name of the user is a string of its own until the user is found.
+// A long user name is a heap string until the user is found.
 TEST_F(AllocationFailure, InTildeExpansionWithALongUserNameLeavesTheReferenceEmpty) {
   const std::string path = "~tallowmere_no_user_of_such_a_long_name/x";
-  CFileRef(path.c_str(), false);  // the constant strings come into being on their first use
+  CFileRef(path.c_str(), false);  // constant strings are allocated on first use
   for (long n = 0; n < 20; ++n) {
     for (const Failing failAfter : {FailOneAllocationAfter, FailAllocationsAfter}) {
       const long liveBefore = LiveAllocations();
@@ -193,7 +193,7 @@ TEST_F(AllocationFailure, InResolvingALinkLeavesTheReferenceEmptyOrAsItWas) {
   const TemporaryFolder folder;
   const std::string link = folder.MakeLink("link", kPath);
   const CFileRef source(link.c_str(), false);
-  ASSERT_TRUE(CFileRef(source).ResolveAlias(false));  // the platform remembers the link's place
+  ASSERT_TRUE(CFileRef(source).ResolveAlias(false));  // fills the platform's caches
   for (long n = 0;; ++n) {
     CFileRef reference(source);
     const long liveBefore = LiveAllocations();
@@ -204,8 +204,7 @@ TEST_F(AllocationFailure, InResolvingALinkLeavesTheReferenceEmptyOrAsItWas) {
     }
     EXPECT_EQ(CFGetRetainCount(UrlOf(source)), UrlOf(reference) == UrlOf(source) ? 2 : 1) << n;
     reference.ReInit();
-    EXPECT_LE(LiveAllocations(), liveBefore + 2)
-        << n;  // what is remembered of the item's place may stay
+    EXPECT_LE(LiveAllocations(), liveBefore + 2) << n;  // the platform may cache the item's place
     if (isDone) {
       EXPECT_GT(n, 6);
       return;
@@ -236,8 +235,8 @@ TEST_F(AllocationFailure, InQueriesGivesNoAnswer) {
 
 // --- What a path costs ------------------------------------------------------------------------
 //
-// The reference's own arrays come from new[]; the strings and URLs of the platform below use plain
-// new, which is not counted here.
+// The reference's own arrays come from new[]. The platform's strings and URLs use plain new, which
+// is not counted here.
 
 TEST(TheCostOfAPath, IsOneArrayOfItsLengthWhenFirstAskedFor) {
   const CFileRef reference("/abc", false);

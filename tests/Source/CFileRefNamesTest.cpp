@@ -1,3 +1,4 @@
+// The name of a reference's item and its extension.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 #include <strings.h>
@@ -80,7 +81,7 @@ TEST(TheNameOfAReference, BeyondTheNameBufferIsRefused) {
   EXPECT_STREQ(name, "former/");
 }
 
-TEST(TheNameOfAReference, ThatNoFileCanHaveIsRefused) {
+TEST(TheNameOfAReference, ThatIsNoFileNameIsRefused) {
   CFileRef reference;
   ASSERT_TRUE(reference.SetFromURLString("file:///a%00b"));
   EXPECT_FALSE(reference.HasValidName());
@@ -115,7 +116,7 @@ TEST(TheExtensionOfAReference, IsWhatFollowsTheLastDot) {
   EXPECT_EQ(ExtensionOf(Named("README")), std::nullopt);
 }
 
-TEST(TheExtensionOfAReference, InThePlatformsViewIsAnotherOne) {
+TEST(TheExtensionOfAReference, DiffersFromThePlatformsView) {
   EXPECT_EQ(NameOf(CFOwned(Named("report.TXT").CopyFileExtension()).Get()), "TXT");
   EXPECT_EQ(Named(".profile").CopyFileExtension(), nullptr);
   EXPECT_EQ(Named("name.").CopyFileExtension(), nullptr);
@@ -213,7 +214,7 @@ TEST(ReplacingTheExtension, OfTooLongANameChangesNothing) {
 
 // --- Models -----------------------------------------------------------------------------------
 
-// Names that a URL's path takes for one component of its own.
+// Returns false for names that a URL's path does not keep as a component.
 bool IsPlain(const std::string& name) {
   return !name.empty() && name != "." && name != "..";
 }
@@ -222,7 +223,7 @@ std::string Buffer() {
   return std::string(1200, 'x');
 }
 
-// The text that ends with the first NUL.
+// Returns the text before the first NUL.
 std::string TextIn(const std::string& buffer) {
   return buffer.substr(0, buffer.find('\0'));
 }
@@ -244,7 +245,7 @@ RC_GTEST_PROP(NameModel, GetFileName, ()) {
   }
 }
 
-// As GetFileName's, but mostly of lengths about the size of the name buffer.
+// As above, mostly with lengths around the size of the name buffer.
 RC_GTEST_PROP(NameModel, GetFileNameOfLongNames, ()) {
   const std::string name(*rc::gen::inRange<std::size_t>(1, 1100), 'n');
   const auto size = *rc::gen::inRange<std::size_t>(1, 1101);

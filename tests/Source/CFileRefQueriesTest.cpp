@@ -1,3 +1,4 @@
+// What a reference says about its path and item: existence, kind, equality and containment.
 #include <gtest/gtest.h>
 #include <linux/seccomp.h>
 #include <sys/prctl.h>
@@ -16,7 +17,7 @@
 namespace tallowmere::test {
 namespace {
 
-// What `trace` writes to std::cout, and the state it leaves the stream in.
+// What `trace` writes to std::cout, and whether it leaves the stream failed.
 struct Output {
   std::string text;
   bool failed;
@@ -67,7 +68,7 @@ TEST(ARelativeReference, HasNoPath) {
   EXPECT_FALSE(relative.PathContains(relative));
 }
 
-TEST(ARelativeReference, DoesNotExistThoughItsItemDoes) {
+TEST(ARelativeReference, DoesNotExistEvenIfItsItemDoes) {
   const TemporaryFolder folder;
   const CurrentFolder current(folder.Path());
   folder.MakeFile("x");
@@ -133,7 +134,7 @@ TEST(ThePathOfAReference, MayBeOfAnyLength) {
   }
 }
 
-TEST(ThePathOfAReference, BeyondWhatTheSystemTakesDoesNotExist) {
+TEST(ThePathOfAReference, LongerThanTheSystemAcceptsDoesNotExist) {
   const CFileRef longPath(("/" + std::string(5000, 'x')).c_str(), false);
   const CFileRef longName(("/" + std::string(256, 'x')).c_str(), false);
   for (const CFileRef* reference : {&longPath, &longName}) {
@@ -179,8 +180,8 @@ TEST(ThePathOfAReference, IsCopiedInEachStyle) {
   EXPECT_EQ(inStyle(5), inStyle(kPathStyleWindows));
 }
 
-// Runs `body` in a child that the kernel ends at its first system call. None where that mode is not
-// permitted.
+// Runs `body` in a child that the kernel kills at its first system call. Returns nullopt where
+// strict seccomp is not permitted.
 std::optional<bool> MakesNoSystemCall(const std::function<void()>& body) {
   constexpr int kNotPermitted = 2;
   const pid_t child = fork();
@@ -206,7 +207,7 @@ TEST(ThePathOfAReference, OnceAskedForCostsNoSystemCall) {
   const auto existsIsSilent = MakesNoSystemCall([&] { reference.Exists(); });
   if (!isSilent || !existsIsSilent) GTEST_SKIP() << "no seccomp here";
   EXPECT_TRUE(*isSilent);
-  EXPECT_FALSE(*existsIsSilent);  // or the measurement would prove nothing
+  EXPECT_FALSE(*existsIsSilent);  // shows that the measurement notices calls
 }
 
 // --- Existence and kind -----------------------------------------------------------------------
@@ -264,7 +265,7 @@ TEST_F(AnItem, IsTracedWithItsPathAndItsState) {
   EXPECT_EQ(TraceOf(At("y")).text, (mFolder.Path() / "y").string() + " (state: not existing)");
 }
 
-TEST_F(AnItem, KeepsItsPathThoughTheDiskChanges) {
+TEST_F(AnItem, KeepsItsPathWhenTheDiskChanges) {
   const auto path = mFolder.MakeFile("x");
   const CFileRef reference = At("x");
   const char* const text = reference.GetPath();
@@ -354,7 +355,7 @@ bool Contains(const char* path, const char* other) {
   return CFileRef(path, true).PathContains(CFileRef(other, false));
 }
 
-TEST(PathContainment, IsOfThePathItselfAndWhatLiesBelow) {
+TEST(PathContainment, IsOfThePathItselfAndItsDescendants) {
   EXPECT_TRUE(Contains("/Users/a", "/Users/a"));
   EXPECT_TRUE(Contains("/Users/a", "/Users/a/b"));
   EXPECT_TRUE(Contains("/Users/a", "/Users/a/b/c"));

@@ -1,3 +1,4 @@
+// Setting a reference from a path, folder and name, URL or FSRef, and expanding a tilde.
 #include <gtest/gtest.h>
 #include <pwd.h>
 
@@ -12,10 +13,10 @@ namespace {
 
 constexpr auto kUnknownStyle = static_cast<tPathStyle>(5);
 
-// U+D800 alone, which no file name and no URL can say.
+// An unpaired surrogate, which no file name and no URL can express.
 const auto kUnpaired = u"a\xD800";
 
-// The current user's entry, read before each use.
+// The current user's entry, read anew before each use.
 struct User {
   std::string name;
   std::string home;
@@ -39,7 +40,7 @@ class HomeFolder : public testing::Test {
     mUser = *user;
   }
 
-  // What setting from a path gives, through the C path and through the string.
+  // Checks setting from a path, both as C text and as a string.
   static void ExpectPath(const std::string& path, bool isDirectory, const std::string& expected,
                          bool expectedFolder) {
     CFileRef reference;
@@ -93,7 +94,7 @@ TEST_F(HomeFolder, OfANameThatCannotBeConvertedIsTheCurrentUsers) {
   EXPECT_EQ(PathOf(reference), mUser.home + "/x");
 }
 
-TEST_F(HomeFolder, OfANameThatCanBeConvertedInPartIsThatPartsUsers) {
+TEST_F(HomeFolder, OfAPartlyConvertibleNameIsThatOfTheConvertedPart) {
   ExpectPath("~" + mUser.name + "\xFFz/x", false, mUser.home + "/x", false);
 }
 
@@ -105,13 +106,13 @@ TEST(SettingAReference, ToTheHomeFolderOfAnUnknownUserFails) {
   EXPECT_FALSE(reference.Set(("~" + std::string(100000, 'x')).c_str(), false));
 }
 
-TEST(SettingAReference, ExpandsATildeInTheFirstPositionAlone) {
+TEST(SettingAReference, ExpandsATildeOnlyInTheFirstPosition) {
   EXPECT_EQ(PathOf(CFileRef("a~b", false)), "a~b");
   EXPECT_EQ(PathOf(CFileRef("/x/~", false)), "/x/~");
   EXPECT_EQ(PathOf(CFileRef("./~", false)), "./~");
 }
 
-TEST(SettingAReference, ExpandsATildeInThePosixStyleAlone) {
+TEST(SettingAReference, ExpandsATildeOnlyInThePosixStyle) {
   EXPECT_EQ(PathOf(CFileRef(MakeString(u"~").Get(), kPathStyleWindows, false)), "~");
   EXPECT_EQ(PathOf(CFileRef(MakeString(u":~").Get(), kPathStyleHFS, false)), "~");
 }
@@ -295,7 +296,7 @@ TEST(SettingAReference, ToTheFSRefOfNothingFails) {
 
 // --- Failure ----------------------------------------------------------------------------------
 
-TEST(SettingAReference, InVainEmptiesItAndReleasesWhatItHeld) {
+TEST(SettingAReference, UnsuccessfullyEmptiesItAndReleasesWhatItHeld) {
   const auto url = MakeUrl("/", true);
   const auto pathless = ParseUrl("http://host");
   const auto unpaired = MakeString(kUnpaired);

@@ -1,3 +1,4 @@
+// The record of a reference, and references set from a record, a folder id or an HFS path.
 #include <gtest/gtest.h>
 
 #include <cstring>
@@ -85,7 +86,7 @@ TEST_F(SpecOfReference, AMissingFileInAMissingFolderHasItsNameAlone) {
   EXPECT_TRUE(IsZero(CachedFSRefOf(missing)));
 }
 
-TEST_F(SpecOfReference, AURLThatIsNoFilesHasTheRecordOfAMissingItemAtItsPath) {
+TEST_F(SpecOfReference, ANonFileURLHasTheRecordOfAMissingItemAtItsPath) {
   mData->MakeFolder("Work/folder");
   mData->MakeFile("Work/file");
   for (const std::string start : {"http://elsewhere", "file://elsewhere", "http:"}) {
@@ -219,7 +220,7 @@ TEST_F(SettingFromHFSPath, NamesAreInMacRomanWithSlashesForColons) {
   EXPECT_EQ(PathOf(ref), mData->Path("a:b\xC3\xA9"));
 }
 
-TEST_F(SettingFromHFSPath, NamesThatTheLocalEncodingLacksAreInTheSystemsEncoding) {
+TEST_F(SettingFromHFSPath, NamesTheLocalEncodingLacksAreInTheSystemEncoding) {
   CFileRef::mLocalEncoding = kCFStringEncodingASCII;
   CFileRef ref;
   ref.SetFromHFSPath("Data:\x8E", false);
@@ -235,9 +236,9 @@ TEST_F(SettingFromHFSPath, NamesAreInTheLocalEncodingFirst) {
   EXPECT_EQ(PathOf(ref), mData->Path("\xC3\xA9"));
 }
 
-TEST_F(SettingFromHFSPath, TheReferencesOwnPathIsReadBeforeItIsLost) {
+TEST_F(SettingFromHFSPath, TheReferencesOwnPathIsReadBeforeItIsReleased) {
   CFileRef ref("/Data:Work", false);
-  EXPECT_FALSE(ref.SetFromHFSPath(ref.GetPath(), false));  // no volume has a name with '/'
+  EXPECT_FALSE(ref.SetFromHFSPath(ref.GetPath(), false));  // volume names have no '/'
   EXPECT_TRUE(IsEmpty(ref));
 }
 
@@ -251,7 +252,7 @@ TEST_F(SettingFromHFSPath, FailureLeavesTheReferenceEmpty) {
 
 // --- Reference of a record --------------------------------------------------------------------
 
-// The four ways to a reference of a record.
+// Makes references of the record in all four ways.
 std::vector<CFileRef> AllRefsOf(FSSpec spec, bool searchOtherVolumes = false) {
   FSSpec const& constant = spec;
   CFileRef set;
@@ -289,7 +290,7 @@ TEST(ReferenceOfAnySpec, NullIsAnEmptyReferenceInEveryWay) {
   EXPECT_TRUE(IsEmpty(ref));
 }
 
-// A link is no alias: each form names it itself.
+// A link is not an alias file, so it is not followed.
 TEST_F(ReferenceOfSpec, ALinkIsNamedItselfInEveryWay) {
   std::filesystem::create_symlink(mData->MakeFile("file"), mData->Path("link"));
   for (const CFileRef& ref : AllRefsOf(Spec(mData->Number(), 2, "link"))) {
@@ -297,7 +298,7 @@ TEST_F(ReferenceOfSpec, ALinkIsNamedItselfInEveryWay) {
   }
 }
 
-// An alias file beside the target to which its record leads.
+// Makes an alias file in the same folder as the target of its record.
 void MakeAlias(const std::string& path, const std::string& target) {
   RecordToWrite record;
   record.volumeName = "Elsewhere";
@@ -310,7 +311,7 @@ void MakeAlias(const std::string& path, const std::string& target) {
       << WriteSidecarOfAlias(Write(record));
 }
 
-TEST_F(ReferenceOfSpec, AnAliasFileIsNamedItselfInEveryWayButByAPointerToWriteTo) {
+TEST_F(ReferenceOfSpec, AnAliasFileIsNamedItselfExceptByAWritablePointer) {
   mData->MakeFile("file");
   MakeAlias(mData->Path("alias"), "file");
   const auto refs = AllRefsOf(Spec(mData->Number(), 2, "alias"));

@@ -1,5 +1,5 @@
-// A full path that cannot be made short enough is tried for ever. Compiled with the bridge at the
-// highest optimisation, which must not take that loop for one that ends.
+// Shortening a full path that cannot become short enough never ends. The bridge is compiled at the
+// highest optimisation, which must not assume that the loop ends.
 #include <gtest/gtest.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -12,7 +12,7 @@ namespace {
 
 constexpr unsigned kPatience = 1;  // seconds
 
-// Whether the call still ran after a second.
+// Returns whether the call still ran after a second.
 bool NeverReturns(const CFileRef& ref, unsigned short maxLength) {
   const pid_t child = fork();
   if (child == 0) {
@@ -37,7 +37,7 @@ TEST(EndlessShortening, OfAVolumeWithoutFolders) {
   EXPECT_FALSE(NeverReturns(root, static_cast<unsigned short>(LengthOf(root) + 1)));
 }
 
-TEST(EndlessShortening, OfFoldersThatAreAsShortAsTheyGet) {
+TEST(EndlessShortening, OfFoldersThatCannotBeShortened) {
   const TemporaryFolder folder;
   const CFileRef ref(folder.MakeFolder("Work/Docs").c_str(), true);
   char path[1024];
@@ -47,7 +47,7 @@ TEST(EndlessShortening, OfFoldersThatAreAsShortAsTheyGet) {
   EXPECT_FALSE(NeverReturns(ref, static_cast<unsigned short>(shortest + 1)));
 }
 
-TEST(EndlessShortening, IsNotWithoutABuffer) {
+TEST(EndlessShortening, DoesNotHappenWithoutABuffer) {
   EXPECT_EQ(CFileUtilMakeFullPath(CFileRef(), nullptr, 0, 1), 1);
 }
 

@@ -1,5 +1,5 @@
-// The reference and the bridge over a host some of whose calls fail. They are the platform's but
-// for those that a test makes fail, for which the linker puts the calls here in their place.
+// The reference and the bridge when calls of the host fail. The linker wraps the calls that a test
+// makes fail; all others are the platform's.
 #include <gtest/gtest.h>
 
 #include <limits>
@@ -8,7 +8,7 @@
 
 namespace {
 
-// How many more calls succeed.
+// How many more calls of each kind succeed.
 constexpr int kAll = std::numeric_limits<int>::max();
 int gCatalogCalls = kAll;
 int gFolderCalls = kAll;
@@ -69,7 +69,7 @@ TEST_F(AFailingHost, ThatRefusesAnItemHasNoRecordOfIt) {
   EXPECT_EQ(FieldsOf(spec), kEmptyFields);
 }
 
-TEST_F(AFailingHost, ThatRefusesAFolderLeavesTheNameInTheRecordOfANewItem) {
+TEST_F(AFailingHost, ThatRefusesAFolderLeavesOnlyTheNameInANewItemsRecord) {
   const CFileRef missing = mData->Ref("missing");
   gCatalogCalls = 0;
   FSSpec spec = Untouched();
@@ -85,7 +85,7 @@ TEST_F(AFailingHost, ThatRefusesAnItemHasNoVolumeForIt) {
   EXPECT_EQ(missing.GetVolumeRefNumber(), kNoVolume);
 }
 
-TEST_F(AFailingHost, ThatEndsAClimbKeepsWhatItHasGathered) {
+TEST_F(AFailingHost, ThatEndsAClimbLosesNoFolderFoundSoFar) {
   const CFileRef folder(mData->MakeFolder("a/b/c").c_str(), true);
   for (const auto& [calls, expected] : std::vector<std::pair<int, std::string>>{
            {0, "Data:"}, {1, "Data:c:"}, {2, "Data:b:c:"}, {3, "Data:a:b:c:"}}) {
@@ -96,7 +96,7 @@ TEST_F(AFailingHost, ThatEndsAClimbKeepsWhatItHasGathered) {
   }
 }
 
-TEST_F(AFailingHost, ThatHasNoURLForAnItemLeavesWhatItIsAddedToEmpty) {
+TEST_F(AFailingHost, ThatHasNoURLForAnItemEmptiesTheReferenceItIsAddedTo) {
   ExistingFile();
   CFileRef ref = mData->Ref();
   gCallsForURLs = 0;

@@ -1,3 +1,4 @@
+// Full HFS paths and how they are shortened, the names of volumes, and the HFS names of items.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
@@ -21,7 +22,7 @@ struct FullPath {
   }
 };
 
-// Into a buffer of exactly `maxLength` bytes, so that a byte outside of it is noticed.
+// Uses a buffer of exactly `maxLength` bytes, so that sanitizers notice an access beyond it.
 FullPath FullPathOf(const CFileRef& ref, unsigned short maxLength = kEnough,
                     bool keepFolders = true) {
   const auto buffer = std::make_unique<char[]>(maxLength);
@@ -96,7 +97,7 @@ TEST_F(FullPaths, WithoutTheirFoldersAreTheVolumesNameAndCountTheWholePath) {
   EXPECT_EQ(FullPathOf(CFileRef(), kEnough, false), (FullPath{1, ""}));
 }
 
-TEST_F(FullPaths, KeepTheFoldersBehindTheNulThatHidesThem) {
+TEST_F(FullPaths, KeepTheFoldersAfterTheNulThatHidesThem) {
   char buffer[kEnough];
   CFileUtilMakeFullPath(mData->Ref("Work/Docs"), buffer, sizeof buffer, 0);
   EXPECT_EQ(std::string(buffer, 16), std::string("Data\0Work:Docs:\0", 16));
@@ -126,7 +127,7 @@ TEST_F(FullPaths, HaveUpTo511BytesOfFolders) {
             (FullPath{5 + 256, "Data:" + inner + ":"}));
 }
 
-TEST_F(FullPaths, OfAChain200FoldersDeepAreItsInnermostFolders) {
+TEST_F(FullPaths, OfAPath200FoldersDeepKeepTheInnermostFolders) {
   std::string path;
   for (int level = 0; level < 200; ++level) path += "abcd/";
   mData->MakeFolder(path);
@@ -135,14 +136,14 @@ TEST_F(FullPaths, OfAChain200FoldersDeepAreItsInnermostFolders) {
   EXPECT_EQ(full.text.substr(0, 15), "Data:abcd:abcd:");
 }
 
-TEST_F(FullPaths, OfPathsOf65535BytesAreTheVolumeThatIsAboveThem) {
+TEST_F(FullPaths, OfPathsOf65535BytesAreTheVolumeAboveThem) {
   const std::string path =
       mData->Path() + "/" + std::string(65000, 'x') + "/" + std::string(400, 'y');
   EXPECT_EQ(FullPathOf(CFileRef(path.c_str(), false)), (FullPath{5, "Data:"}));
 }
 
-// Whatever the folders and the room: less than the room is used, the volume and the innermost
-// folders stay, and the result counts the whole path.
+// For any folders and any room: the result is shorter than the room, keeps the volume and the
+// innermost folders, and states the length of the whole path.
 TEST_F(FullPaths, OfAnyFoldersFitIntoAnyRoom) {
   rc::check([this] {
     const auto names = *rc::gen::resize(

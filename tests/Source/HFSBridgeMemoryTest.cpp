@@ -1,6 +1,6 @@
-// Every operation of the bridge with the n-th allocation failing, for n = 0, 1, 2, … and in the end
-// with none: what it gives is right or a failure, the reference is whole, and nothing is left or
-// released twice.
+// Runs every operation of the bridge with the n-th allocation failing, for n = 0, 1, 2, … and last
+// with none failing. It must give the right result or fail, keep the reference whole, leak nothing
+// and free nothing twice.
 #include <gtest/gtest.h>
 
 #include <functional>
@@ -16,10 +16,10 @@ using foundation::test::FailNoAllocation;
 using foundation::test::FailOneAllocationAfter;
 using foundation::test::LiveAllocations;
 
-// As many allocations as the operations need, once they have run.
+// At least the number of allocations of each operation.
 constexpr long kEnough = 400;
 
-// What the platform below may have learned in the meantime and keeps.
+// Allocations that the platform below may cache meanwhile.
 constexpr long kLearned = 20;
 
 class BridgeWithoutMemory : public DataVolumeTest {
@@ -31,8 +31,8 @@ class BridgeWithoutMemory : public DataVolumeTest {
     mData->MakeFile(kExisting);
   }
 
-  // Runs `operation` on a reference to an item of the volume as the comment above says. `check`
-  // gets the reference afterwards and whether there was memory enough.
+  // Runs `operation` on a reference to an item of the volume as described at the top. `check` gets
+  // the reference afterwards and whether there was enough memory.
   void FailEach(const std::string& item, const std::function<void(CFileRef&)>& operation,
                 const std::function<void(const CFileRef&, bool)>& check) {
     const CFileRef source = mData->Ref(item);
@@ -97,8 +97,8 @@ TEST_F(BridgeWithoutMemory, MakesAnItemsRecordOrNone) {
   }
 }
 
-// Its name is too long for a record: a new item's would be cut.
-TEST_F(BridgeWithoutMemory, MakesNoNewItemsRecordOfOneThatIsThere) {
+// The item's name is too long for a record, so a new item's record would have it cut.
+TEST_F(BridgeWithoutMemory, MakesNoNewItemsRecordForAnExistingItem) {
   const std::string name(70, 'n');
   mData->MakeFile(name);
   const CFileRef item = mData->Ref(name);
@@ -117,7 +117,7 @@ TEST_F(BridgeWithoutMemory, MakesNoNewItemsRecordOfOneThatIsThere) {
   }
 }
 
-// A path that is no item's, or the folder that the item would be in.
+// Accepts a path on which no item exists, or the folder that the item would be in.
 TEST_F(BridgeWithoutMemory, NamesTheItemOfARecordOrNoOther) {
   for (const char* const item : {kExisting, kMissing}) {
     FSSpec spec;
@@ -141,7 +141,7 @@ TEST_F(BridgeWithoutMemory, AddsANameOrNone) {
         const char* const path = ref.GetPath();
         EXPECT_TRUE(path != nullptr || !complete);
         if (path == nullptr) return;
-        // Added as it stands where there was no memory to see that the folder exists.
+        // The name is added unconverted when there was no memory to see that the folder exists.
         EXPECT_TRUE(path == mData->Path(kMissing) ||
                     (!complete && (path == mData->Path(kFolder) ||
                                    path == mData->Path(kFolder) + "/a/missing one")))

@@ -1,4 +1,4 @@
-// What the tests of the HFS bridge share: names and records by value, and volumes of their own.
+// Shared by the tests of the HFS bridge: names and records as values, and volumes for tests.
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
@@ -22,7 +22,7 @@ namespace tallowmere::test {
 
 // --- Names ------------------------------------------------------------------------------------
 
-// A Pascal string of at most 255 bytes in a buffer of its own.
+// Owns a Pascal string of at most 255 bytes.
 class Pascal {
  public:
   explicit Pascal(std::string_view text) : mBytes(1, static_cast<char>(text.size())) {
@@ -40,8 +40,8 @@ inline std::string TextOfPascal(ConstStr255Param name) {
 
 // --- Records ----------------------------------------------------------------------------------
 
-// A record with bytes behind its name that no result may depend on. The length byte is that of
-// `name`, which is cut where the record ends.
+// Returns a record whose bytes after the name are filler that no result may depend on. The length
+// byte is that of `name`, even where the record has no room for the whole name.
 inline FSSpec Spec(short volume, long folder, std::string_view name) {
   FSSpec spec;
   spec.vRefNum = volume;
@@ -52,12 +52,12 @@ inline FSSpec Spec(short volume, long folder, std::string_view name) {
   return spec;
 }
 
-// A record that tells whether it was written to.
+// A record whose values show whether it was written to.
 inline FSSpec Untouched() {
   return Spec(1234, 5678, "untouched");
 }
 
-// A record's fields, for comparing and for showing. The bytes behind the name are not among them.
+// A record's fields without the bytes after the name, for comparing and printing.
 struct Fields {
   int volume;
   long folder;
@@ -78,10 +78,10 @@ inline const Fields kEmptyFields = {kNoVolume, kNoFolder, ""};
 // A number that no volume has.
 inline constexpr short kUnknownVolume = 77;
 
-// A folder id that no item has: below what is given out.
+// A folder id that no item has: smaller than every id given to an item.
 inline constexpr long kUnknownFolder = 15;
 
-// A new file system, empty, mounted at a folder that has the volume's name.
+// A new, empty file system mounted at a folder that has the volume's name.
 class Volume {
  public:
   explicit Volume(std::string_view name)
@@ -95,7 +95,7 @@ class Volume {
   }
   CFileRef Ref(std::string_view item = "") const { return CFileRef(Path(item).c_str(), false); }
 
-  // The path of a new folder, with the folders on the way.
+  // Makes a folder and those above it, and returns its path.
   std::string MakeFolder(std::string_view item) const {
     std::filesystem::create_directories(mRoot / item);
     return Path(item);
@@ -113,7 +113,7 @@ class Volume {
   ScopedMount mMount;
 };
 
-// A test with a volume named Data.
+// A test with a volume named "Data".
 class DataVolumeTest : public testing::Test {
  protected:
   void SetUp() override {

@@ -1,4 +1,4 @@
-// Letter case in a program that has chosen a locale in which "I" and "i" are two letters.
+// Letter case under a locale in which "I" is not the capital of "i".
 #include <gtest/gtest.h>
 
 #include "TestReferences.h"

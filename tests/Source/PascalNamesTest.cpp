@@ -1,3 +1,4 @@
+// Names between CFStrings and Pascal strings: encodings, separators and lengths.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
@@ -22,7 +23,7 @@ std::ostream& operator<<(std::ostream& out, const Converted& converted) {
   return out << (converted.isWhole ? "whole \"" : "with loss \"") << converted.name << '"';
 }
 
-// Into a buffer of exactly `size` bytes, so that a byte outside of it is noticed.
+// Uses a buffer of exactly `size` bytes, so that sanitizers notice an access beyond it.
 Converted Convert(std::u16string_view name, SInt32 size = sizeof(Str255)) {
   const auto buffer = std::make_unique<unsigned char[]>(static_cast<std::size_t>(size));
   const bool isWhole = GetPascalStringFromCFString(MakeString(name).Get(), buffer.get(), size);
@@ -35,7 +36,7 @@ std::optional<std::u16string> Read(std::string_view name) {
   return read ? std::optional(TextOf(read.Get())) : std::nullopt;
 }
 
-// Sets the class-wide encoding for one test.
+// Changes the class-wide encoding while the object exists.
 class LocalEncoding {
  public:
   explicit LocalEncoding(CFStringEncoding encoding) { CFileRef::mLocalEncoding = encoding; }
@@ -65,7 +66,7 @@ TEST(PascalNames, ABufferWithoutRoomForALengthStaysAsItIs) {
   }
 }
 
-TEST(PascalNames, WhatNoEncodingHasBecomesAQuestionMarkAndNothingIsExchanged) {
+TEST(PascalNames, ACharacterInNoEncodingBecomesAQuestionMarkAndNothingIsExchanged) {
   EXPECT_EQ(Convert(u"a/b:\u65E5c"), (Converted{false, "a/b:?c"}));
 }
 
@@ -105,7 +106,7 @@ TEST(PascalNames, TheReadStringIsMutableAndTheCallersOwn) {
   EXPECT_EQ(CFGetRetainCount(name.Get()), 1);
 }
 
-TEST(PascalNames, MacRomanIsWhatNamesAreInAtTheStart) {
+TEST(PascalNames, NamesAreInMacRomanByDefault) {
   EXPECT_EQ(Convert(u"\u20AC\u00E9"), (Converted{true, "\xDB\x8E"}));
   EXPECT_EQ(Read("\xDB\x8E"), u"\u20AC\u00E9");
 }
@@ -116,7 +117,7 @@ TEST(PascalNames, TheLocalEncodingIsTriedFirst) {
   EXPECT_EQ(Read("\xE9"), u"\u00E9");
 }
 
-TEST(PascalNames, MacRomanTakesWhatTheLocalEncodingLacks) {
+TEST(PascalNames, MacRomanConvertsWhatTheLocalEncodingLacks) {
   const LocalEncoding ascii(kCFStringEncodingASCII);
   EXPECT_EQ(Convert(u"\u00E9"), (Converted{true, "\x8E"}));
   EXPECT_EQ(Read("\x8E"), u"\u00E9");
@@ -127,13 +128,13 @@ TEST(PascalNames, TheLossyConversionIsMacRomanWhateverTheLocalEncoding) {
   EXPECT_EQ(Convert(u"\u00E9\u65E5"), (Converted{false, "\x8E?"}));
 }
 
-TEST(PascalNames, ALocalEncodingThatThereIsNotIsPassedOver) {
+TEST(PascalNames, AnUnknownLocalEncodingIsIgnored) {
   const LocalEncoding unknown(kCFStringEncodingInvalidId);
   EXPECT_EQ(Convert(u"\u00E9"), (Converted{true, "\x8E"}));
   EXPECT_EQ(Read("\x8E"), u"\u00E9");
 }
 
-TEST(PascalNames, EveryByteButTheColonComesBack) {
+TEST(PascalNames, EveryByteButTheColonSurvivesARoundTrip) {
   std::string name;
   for (int byte = 0; byte < 256; ++byte) {
     if (byte != ':') name.push_back(static_cast<char>(byte));

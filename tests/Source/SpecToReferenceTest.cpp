@@ -1,3 +1,4 @@
+// References made from records and from HFS paths, and records made from references.
 #include <gtest/gtest.h>
 
 #include <vector>
@@ -84,7 +85,7 @@ TEST_F(SpecToReference, AStaleVolumeIsNotReplacedWhereSearchIsOff) {
   EXPECT_FALSE(ref.Exists());
 }
 
-TEST_F(SpecToReference, OfAnItemThatNoVolumeHasIsANewOneOnItsOwnVolume) {
+TEST_F(SpecToReference, OfAnItemOnNoVolumeIsANewOneOnItsOwnVolume) {
   const Volume second("Second");
   CFileRef ref;
   EXPECT_TRUE(SetFrom(ref, Spec(mData->Number(), 2, "on no volume at all"), true));
@@ -123,7 +124,7 @@ TEST_F(SpecToReference, WithTheFolderOfAnotherVolumeIsNeverThatFoldersFile) {
   EXPECT_EQ(PathOf(ref), "file");
 }
 
-TEST_F(SpecToReference, WithIdsThatNoFolderHasIsTheBareName) {
+TEST_F(SpecToReference, WithUnknownFolderIdsIsTheBareName) {
   for (const long folder : {0L, 1L, -1L}) {
     CFileRef ref;
     EXPECT_TRUE(SetFrom(ref, Spec(mData->Number(), folder, "name"))) << folder;
@@ -145,7 +146,7 @@ TEST(SpecToAnyReference, NullsAreRefused) {
   EXPECT_TRUE(IsEmpty(ref));
 }
 
-TEST_F(SpecToReference, TheReferencesOwnRecordIsReadBeforeItIsLost) {
+TEST_F(SpecToReference, TheReferencesOwnRecordIsReadBeforeItIsReset) {
   CFileRef ref = mData->Ref("file");
   FSSpec const& own = ref;
   EXPECT_TRUE(SetFrom(ref, own));
@@ -155,7 +156,7 @@ TEST_F(SpecToReference, TheReferencesOwnRecordIsReadBeforeItIsLost) {
 TEST_F(SpecToReference, ANameLengthBeyondTheRecordIsOf63Bytes) {
   mData->MakeFile(std::string(63, 'x'));
   for (int length = 63; length < 256; ++length) {
-    // On the heap, where a read behind the record is noticed.
+    // On the heap, where sanitizers notice a read beyond the record.
     auto spec = std::make_unique<FSSpec>(
         Spec(mData->Number(), 2, std::string(static_cast<std::size_t>(length), 'x')));
     CFileRef ref;
@@ -178,8 +179,8 @@ TEST_F(SpecToReference, EveryByteButNulNamesANewFileOfTheFolder) {
   }
 }
 
-// The way from a path to a record and back, for items that are not there.
-TEST_F(SpecToReference, AMissingFileComesBackFromItsRecord) {
+// A missing item's path survives the conversion to a record and back.
+TEST_F(SpecToReference, AMissingFileSurvivesTheConversionToARecord) {
   for (int byte = 1; byte < 256; ++byte) {
     if (byte == '/') continue;
     const CFileRef file = mData->Ref("x" + std::string(1, static_cast<char>(byte)));
@@ -208,7 +209,7 @@ TEST_F(SpecDataToReference, AnExistingItemIsNamed) {
   EXPECT_EQ(PathOf(ref), mData->Path("Work/Docs"));
 }
 
-TEST_F(SpecDataToReference, AFileThatIsOnAnotherVolumeIsFoundThere) {
+TEST_F(SpecDataToReference, AFileOnAnotherVolumeIsFoundThere) {
   const Volume other("Other");
   ASSERT_TRUE(other.IsMounted());
   const std::string file = other.MakeFile("f");
@@ -231,7 +232,7 @@ TEST_F(SpecDataToReference, ARootOfNoVolumeIsTheBareName) {
   EXPECT_EQ(PathOf(ref), "f");
 }
 
-TEST_F(SpecDataToReference, WhatHasNoRecordLeavesTheReferenceAsItWas) {
+TEST_F(SpecDataToReference, AnItemWithoutARecordLeavesTheReferenceUnchanged) {
   CFileRef ref("/former", false);
   for (const long folder : {kUnknownFolder, -1L}) {
     EXPECT_FALSE(CFileUtilSetFileRefFromFSSpecData(&ref, mData->Number(), folder, "f", false));
@@ -247,7 +248,7 @@ TEST_F(SpecDataToReference, WhatHasNoRecordLeavesTheReferenceAsItWas) {
 
 // --- The record of a reference ----------------------------------------------------------------
 
-TEST_F(SpecToReference, TheRecordOfAFileThatCouldBeThereIsUsable) {
+TEST_F(SpecToReference, TheRecordOfANewFileIsUsable) {
   FSSpec spec = Untouched();
   EXPECT_TRUE(CFileUtilGetDeprecatedFSSpecThroughIPC(mData->Ref("file"), &spec));
   EXPECT_EQ(FieldsOf(spec), (Fields{mData->Number(), 2, "file"}));
@@ -284,7 +285,7 @@ TEST_F(AddingAnHFSName, ToAFolderMakesColonsOfTheSlashesInANewName) {
   }
 }
 
-TEST_F(AddingAnHFSName, BelowAnythingElseIsAddedAsItStands) {
+TEST_F(AddingAnHFSName, BelowAnythingElseIsAddedUnconverted) {
   mData->MakeFile("file");
   for (const char* const item : {"file", "missing"}) {
     CFileRef ref = mData->Ref(item);
@@ -294,7 +295,7 @@ TEST_F(AddingAnHFSName, BelowAnythingElseIsAddedAsItStands) {
   }
 }
 
-TEST_F(AddingAnHFSName, InMacRomanBelowAnythingElseIsNoUTF8) {
+TEST_F(AddingAnHFSName, InMacRomanBelowAnythingElseIsNotUTF8) {
   CFileRef ref = mData->Ref("missing");
   EXPECT_FALSE(CFileUtilAddHFSName(&ref, "\x8E", true));
   EXPECT_EQ(PathOf(ref), mData->Path("missing"));
@@ -306,7 +307,7 @@ TEST_F(AddingAnHFSName, ToAnEmptyReferenceIsThePathItself) {
   EXPECT_EQ(PathOf(ref), "/a");
 }
 
-TEST_F(AddingAnHFSName, OfNothingToNothingIsRefused) {
+TEST_F(AddingAnHFSName, WithoutAReferenceOrANameIsRefused) {
   CFileRef ref = mData->Ref();
   EXPECT_FALSE(CFileUtilAddHFSName(nullptr, "name", false));
   EXPECT_FALSE(CFileUtilAddHFSName(&ref, nullptr, false));
@@ -345,7 +346,7 @@ class SpecOfPathInDir : public DataVolumeTest {
     mData->MakeFolder("Dir");
     mDir = mData->Ref("Dir").GetDirectoryID();
   }
-  // What all spellings of Data:Dir:f lead to, as long as f is missing.
+  // The result for all spellings of Data:Dir:f while f is missing.
   Made MissingFile() const { return {fnfErr, {mData->Number(), mDir, "f"}}; }
 
   long mDir = 0;
@@ -355,7 +356,7 @@ TEST_F(SpecOfPathInDir, AColonIsPutBetweenFolderAndName) {
   EXPECT_EQ(MakeSpec("Data:Dir", "f"), MissingFile());
 }
 
-TEST_F(SpecOfPathInDir, AColonBehindTheFolderIsEnough) {
+TEST_F(SpecOfPathInDir, ATrailingColonOfTheFolderIsEnough) {
   EXPECT_EQ(MakeSpec("Data:Dir:", "f"), MissingFile());
 }
 
@@ -371,7 +372,7 @@ TEST_F(SpecOfPathInDir, TheSecondStringIsJoinedToTheFirst) {
   EXPECT_EQ(MakeSpec("Data:\0Dir", "f", true), (Made{dirNFErr, FieldsOf(Untouched())}));
 }
 
-TEST_F(SpecOfPathInDir, AnEmptyFirstStringGetsNoColonBehindTheSecond) {
+TEST_F(SpecOfPathInDir, AnEmptyFirstStringGetsNoColonAfterTheSecond) {
   const CurrentFolder current(mData->Path());
   EXPECT_EQ(MakeSpec("\0Dir:", "f", true), MissingFile());
   EXPECT_EQ(MakeSpec("\0Dir", "f", true), (Made{fnfErr, {mData->Number(), 2, "Dirf"}}));
@@ -396,7 +397,7 @@ TEST_F(SpecOfPathInDir, TheLengthIsTakenModulo256) {
   const std::string folder = "Data:Dir:";
   for (const std::size_t length : {256u, 512u, 1024u, 1280u, 65280u}) {
     const std::string name(length - folder.size(), 'x');
-    // Nothing is left of the path, so it is the current folder.
+    // Nothing is left of the path, which then means the current folder.
     EXPECT_EQ(MakeSpec(folder.c_str(), name.c_str()), (Made{noErr, {mData->Number(), 1, "Data"}}));
     EXPECT_EQ(MakeSpec(folder.c_str(), ("f" + name + folder).c_str()), MakeSpec("Data:Dir:", "f"));
   }
@@ -413,13 +414,13 @@ TEST_F(SpecOfPathInDir, PathsOf65535BytesAreCut) {
   EXPECT_EQ(MakeSpec("Data:Dir", text.c_str()), MakeSpec("Data:", "Dir"));  // 8 bytes
 }
 
-TEST_F(SpecOfPathInDir, WhatHasNoRecordIsAnsweredAsTheFileManagerDoes) {
+TEST_F(SpecOfPathInDir, AnItemWithoutARecordGivesTheFileManagersError) {
   EXPECT_EQ(MakeSpec("No such volume:", "f").result, nsvErr);
   EXPECT_EQ(MakeSpec("Data:Missing", "f").result, dirNFErr);
   EXPECT_EQ(MakeSpec("Data:", std::string(64, 'x').c_str()).result, bdNamErr);
 }
 
-TEST_F(SpecOfPathInDir, AReferenceIsMadeOfWhatExists) {
+TEST_F(SpecOfPathInDir, AReferenceIsMadeOfAnExistingItem) {
   CFileRef ref("/former", false);
   EXPECT_EQ(CFileUtilMakeFileRefFromPath(&ref, "Data", "Dir", 0), noErr);
   EXPECT_EQ(PathOf(ref), mData->Path("Dir"));
@@ -428,7 +429,7 @@ TEST_F(SpecOfPathInDir, AReferenceIsMadeOfWhatExists) {
   EXPECT_EQ(PathOf(ref), mData->Path("Dir/a:b"));
 }
 
-TEST_F(SpecOfPathInDir, WhatIsMissingLeavesTheReferenceAsItWas) {
+TEST_F(SpecOfPathInDir, AMissingItemLeavesTheReferenceUnchanged) {
   CFileRef ref("/former", false);
   EXPECT_EQ(CFileUtilMakeFileRefFromPath(&ref, "Data:Dir", "missing", 0), fnfErr);
   EXPECT_EQ(CFileUtilMakeFileRefFromPath(&ref, "Data:Missing", "f", 0), dirNFErr);

@@ -1,4 +1,4 @@
-// What the tests of the file reference share.
+// Shared by the tests of the file reference: access to its private fields, and paths.
 #pragma once
 
 #include <unistd.h>
@@ -23,7 +23,7 @@ using foundation::test::ParseUrl;
 
 // --- The private fields -----------------------------------------------------------------------
 //
-// An explicit instantiation may name what is private.
+// An explicit instantiation may name private members.
 
 template <typename Field, typename Field::Type kMember>
 struct Reveal {
@@ -63,7 +63,7 @@ inline bool IsZero(const FSRef& item) {
                      [](UInt8 byte) { return byte == 0; });
 }
 
-// Whether every field is as in a new reference.
+// Returns whether every field is as in a new reference.
 inline bool IsEmpty(const CFileRef& reference) {
   const FSSpec& spec = reference.*MemberOf(FSSpecField());
   return UrlOf(reference) == nullptr && reference.*MemberOf(ValidField()) == 0 &&
@@ -73,7 +73,7 @@ inline bool IsEmpty(const CFileRef& reference) {
 
 // --- Paths ------------------------------------------------------------------------------------
 
-// The POSIX path, relative ones too; none for an empty reference.
+// Returns the POSIX path, which may be relative, or nullopt for an empty reference.
 inline std::optional<std::string> PathOf(const CFileRef& reference) {
   return NameOf(CFOwned(reference.CopyFileSystemPath(kPathStylePOSIX)).Get());
 }
@@ -82,7 +82,7 @@ inline bool IsMarkedAsFolder(const CFileRef& reference) {
   return CFURLHasDirectoryPath(UrlOf(reference)) != 0;
 }
 
-// A folder that is the current one until the object's end.
+// Changes the current folder while the object exists.
 class CurrentFolder {
  public:
   explicit CurrentFolder(const std::filesystem::path& path)

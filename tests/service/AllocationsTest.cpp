@@ -1,5 +1,5 @@
-// How many blocks of memory each request takes, once an earlier one has been about the same item.
-// The request step runs in this program, whose own operator new counts.
+// How many blocks each request allocates after an earlier request about the same item. The requests
+// are served in this process, whose operator new counts.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 
@@ -13,12 +13,12 @@
 
 namespace {
 
-// Of those that live when a trailer is written.
+// Live blocks at the last write of a trailer.
 int gLiveAtTrailer = 0;
 
 }  // namespace
 
-// In place of the C library's in this program.
+// Wraps the C library's write (linker option --wrap).
 extern "C" ssize_t __real_write(int descriptor, const void* bytes, std::size_t size);
 extern "C" ssize_t __wrap_write(int descriptor, const void* bytes, std::size_t size) {
   const std::string_view text(static_cast<const char*>(bytes), size);
@@ -31,14 +31,14 @@ namespace {
 
 struct Allocations {
   unsigned code;
-  int most;  // with room for a folder of temporary files that has a long path
+  int most;  // allows for a long path of the temporary folder
 };
 
 std::ostream& operator<<(std::ostream& out, const Allocations& row) {
   return out << "code " << row.code;
 }
 
-// A standard stream that is the end of a pipe for a time.
+// Redirects a standard stream to a pipe end while it exists.
 class Redirected {
  public:
   Redirected(int stream, int end) : mStream(stream), mSaved(dup(stream)) { dup2(end, stream); }
@@ -54,7 +54,7 @@ class Redirected {
   int mSaved;
 };
 
-// Has a request served here, and gives how many blocks that took.
+// Serves the request in this process and returns how many blocks that allocated.
 int Serve(const std::string& request) {
   std::array<int, 2> requests{};
   std::array<int, 2> responses{};
@@ -75,18 +75,18 @@ int Serve(const std::string& request) {
 
 class OfARequest : public testing::TestWithParam<Allocations> {};
 
-TEST_P(OfARequest, AreNoMoreThanThese) {
+TEST_P(OfARequest, AreAtMostThese) {
   const EveryRequest requests;
-  if (!requests.IsMade()) GTEST_SKIP() << "the folder for temporary files is too deep";
+  if (!requests.IsMade()) GTEST_SKIP() << "the path of the temporary folder is too long";
   Serve(requests.Of(7));
   Serve(requests.Of(GetParam().code));
   EXPECT_LE(Serve(requests.Of(GetParam().code)), GetParam().most);
 }
 
-// But for what the exporter keeps of each success.
+// Except for what the exporter keeps after each success.
 TEST_P(OfARequest, AreGivenBackBeforeTheTrailer) {
   const EveryRequest requests;
-  if (!requests.IsMade()) GTEST_SKIP() << "the folder for temporary files is too deep";
+  if (!requests.IsMade()) GTEST_SKIP() << "the path of the temporary folder is too long";
   const std::string request = requests.Of(GetParam().code);
   Serve(requests.Of(7));
   Serve(request);

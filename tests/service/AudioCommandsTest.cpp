@@ -1,3 +1,4 @@
+// Code 10: the export settings that a sound is answered with, and what is refused.
 #include <gtest/gtest.h>
 
 #include "support/AtomReader.h"
@@ -14,7 +15,7 @@ const std::string kAnyRequest = ExportSettingsRequest(44100 * kHertz, 16, 2, "tw
 
 struct Response {
   int result = 0;
-  std::uint32_t size = 0;  // as the response has it
+  std::uint32_t size = 0;  // as stated in the response
   std::string settings;
   std::string trailer;
 };
@@ -42,7 +43,7 @@ Response Ask(Service& service, const std::string& request) {
   return ReadResponse(service);
 }
 
-// Whole, and the settings are those for such a sound.
+// Checks that the response is complete and holds the settings for this sound.
 void ExpectSettings(const Response& response, std::string_view format, std::uint32_t rate,
                     unsigned sampleSize, unsigned channels) {
   EXPECT_EQ(response.result, 0);
@@ -51,12 +52,12 @@ void ExpectSettings(const Response& response, std::string_view format, std::uint
   EXPECT_EQ(ReadAtomContainer(response.settings), SettingsOf(format, rate, sampleSize, channels));
 }
 
-// The whole of what is sent when there are no settings.
+// The whole response when there are no settings.
 std::string Refusal(int result) {
   return (I16(result) + U32(0)).append(kTrailer);
 }
 
-TEST(AudioCommands, SettingsHoldWhatWasAskedForEveryFormat) {
+TEST(AudioCommands, SettingsMatchTheRequestInEveryFormat) {
   Service service;
   for (const auto* const format : kFormats) {
     for (const unsigned sampleSize : {8u, 16u, 24u, 32u}) {
@@ -84,7 +85,7 @@ TEST(AudioCommands, TheFractionOfARateIsKept) {
   ExpectSettings(Ask(service, ExportSettingsRequest(rate, 8, 1, "raw ")), "raw ", rate, 8, 1);
 }
 
-TEST(AudioCommands, OfASampleSizeAbove65535TheLow16BitsCount) {
+TEST(AudioCommands, ASampleSizeAbove65535CountsByItsLow16Bits) {
   Service service;
   const std::uint32_t rate = 44100 * kHertz;
   ExpectSettings(Ask(service, ExportSettingsRequest(rate, 0x10010, 2, "twos")), "twos", rate, 16,
@@ -122,7 +123,7 @@ TEST(AudioCommands, TheSameRequestHasTheSameResponseInEveryService) {
   EXPECT_EQ(Ask(second, kAnyRequest).settings, settings);
 }
 
-TEST(AudioCommands, WhatTheExporterRefusesIsAnsweredWithItsCodeAndNoSettings) {
+TEST(AudioCommands, ARefusalOfTheExporterIsItsCodeAndNoSettings) {
   Service service;
   const std::uint32_t rate = 44100 * kHertz;
   EXPECT_EQ(service.Ask(ExportSettingsRequest(rate, 16, 2, "mp4a"), 10), Refusal(-206));

@@ -42,7 +42,7 @@ TEST(AudioExport, TheBlockHoldsTheSettingsWithoutFurtherBytes) {
             SettingsOf("twos", kRate, 16, 2));
 }
 
-TEST(AudioExport, OfNumbersBeyond32BitsTheLow32BitsCount) {
+TEST(AudioExport, NumbersBeyond32BitsCountByTheirLow32Bits) {
   constexpr unsigned long kMore = 1ul << 32;
   Handle settings = nullptr;
   ASSERT_EQ(GetAIFFExportSettingsThroughIPC(&settings, kMore + kRate, kMore + 16, 2, kMore + kTwos),

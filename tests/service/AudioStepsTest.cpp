@@ -1,5 +1,5 @@
-// The steps of a request for export settings, one by one, with a host whose components can be
-// missing, fail or leave anything behind. Its memory handles are the platform's.
+// The steps of a request for export settings, against a fake component host that can lack a
+// component, fail, or return any handle. Memory handles are the platform's own.
 #include <QuickTime/QuickTime.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -19,18 +19,18 @@
 
 namespace {
 
-// What the host has and answers.
+// What the fake host has and returns.
 struct Script {
   bool hasExporter = true;
   OSErr info = noErr;
   OSErr open = noErr;
   ComponentResult description = noErr;
   ComponentResult settings = noErr;
-  Handle left = nullptr;  // what the call for the settings puts in their place
+  Handle left = nullptr;  // what MovieExportGetSettingsAsAtomContainer stores as the settings
 };
 Script gScript;
 
-// What it was asked.
+// What the host was asked.
 struct Asked {
   std::vector<std::string> calls;
   ComponentDescription looking;
@@ -39,7 +39,7 @@ struct Asked {
 };
 Asked gAsked;
 
-// Their addresses stand for a component and an instance.
+// Their addresses serve as the component and the instance.
 char gExporter;
 char gInstance;
 
@@ -106,7 +106,7 @@ class AudioSteps : public testing::Test {
     gAsked = {};
   }
 
-  // The result for any sound; the settings in mSettings.
+  // Returns the result for some sound and leaves the settings in mSettings.
   OSStatus Run() {
     return GetAIFFExportSettingsThroughIPC(&mSettings, 0x11223344, 0x55667788, 0x99, 0xAABBCCDD);
   }
@@ -116,7 +116,7 @@ class AudioSteps : public testing::Test {
     int status = 0;
   };
 
-  // One request served by a process of its own, on pipes in the place of its standard streams.
+  // Serves one request in a child process whose standard streams are pipes.
   static Served Serve() {
     const auto requests = MakePipe();
     const auto responses = MakePipe();
@@ -141,7 +141,7 @@ class AudioSteps : public testing::Test {
     return served;
   }
 
-  // A handle that is no block, in the place of the settings before.
+  // Starts as a handle to no block, which the request has to replace.
   char* mBytes = nullptr;
   Handle mSettings = &mBytes;
 };
@@ -208,7 +208,7 @@ TEST_F(AudioSteps, SettingsThatFailLeaveTheInstanceOpen) {
   EXPECT_THAT(gAsked.calls, ElementsAre("find", "info", "open", "describe", "settings"));
 }
 
-TEST_F(AudioSteps, OfAResultOf32BitsTheLow16BitsCount) {
+TEST_F(AudioSteps, AResultOf32BitsCountsByItsLow16Bits) {
   gScript.settings = static_cast<ComponentResult>(0x80018002);
   EXPECT_EQ(Run(), -32766);
   gScript.description = static_cast<ComponentResult>(0x80018003);
@@ -229,7 +229,7 @@ TEST_F(AudioSteps, ARequestThatIsCutAsksTheHostForNothing) {
   }
 }
 
-TEST_F(AudioSteps, WithoutAnExporterTheResponseHasTheCodeSize0AndTheTrailerAlone) {
+TEST_F(AudioSteps, WithoutAnExporterTheResponseIsTheCodeSize0AndTheTrailer) {
   gScript.hasExporter = false;
   const Served served = Serve();
   EXPECT_EQ(served.response, I16(-2005) + std::string("\0\0\0\0MWLT", 8));
@@ -260,7 +260,7 @@ TEST_F(AudioSteps, ABlockOfNoBytesIsSize0) {
   EXPECT_EQ(served.status, 0);
 }
 
-TEST_F(AudioSteps, ABlockThatAFailingCallLeftIsSentBesideItsCode) {
+TEST_F(AudioSteps, ABlockLeftByAFailingCallIsSentWithItsCode) {
   gScript.settings = -50;
   gScript.left = NewHandleWith("left");
   const Served served = Serve();
@@ -268,7 +268,7 @@ TEST_F(AudioSteps, ABlockThatAFailingCallLeftIsSentBesideItsCode) {
   EXPECT_EQ(served.status, 0);
 }
 
-TEST_F(AudioSteps, ABlockWithoutItsBytesFailsTheChannelBehindTheSize) {
+TEST_F(AudioSteps, ABlockWithoutItsBytesFailsTheChannelAfterTheSize) {
   gScript.left = NewHandleWith("gone");
   *gScript.left = nullptr;
   const Served served = Serve();

@@ -1,4 +1,4 @@
-// What no parent can be made to do to a pipe at the right moment.
+// Conditions on a pipe that a parent process cannot produce at the right moment.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
@@ -13,8 +13,8 @@
 namespace tallowmere::service {
 namespace {
 
-// A signal ends a write that waits for room, with a part of the bytes written.
-TEST(Channel, AWriteThatIsCutShortGoesOnBehindWhatWasWritten) {
+// A signal interrupts a write that waits for room after part of the bytes are written.
+TEST(Channel, AnInterruptedWriteGoesOnWhereItStopped) {
   struct sigaction ignoring {};
   ignoring.sa_handler = [](int) {};
   sigaction(SIGUSR1, &ignoring, nullptr);
@@ -45,18 +45,18 @@ TEST(Channel, AWriteThatIsCutShortGoesOnBehindWhatWasWritten) {
   EXPECT_EQ(got.substr(0, count), bytes);
 }
 
-// Takes a number of four bytes.
+// Returns whether four bytes can be read from the input.
 bool CanTake(int input) {
   Channel channel(input, -1);
   channel.Take<std::uint32_t>();
   return !channel.Failed();
 }
 
-TEST(Channel, AReadThatWouldHaveToWaitAndMayNotIsAFailure) {
+TEST(Channel, ANonBlockingReadWithoutDataIsAFailure) {
   int ends[2];
   ASSERT_EQ(pipe2(ends, O_CLOEXEC | O_NONBLOCK), 0);
   EXPECT_FALSE(CanTake(ends[0]));
-  ASSERT_EQ(write(ends[1], "abc", 3), 3);  // a part of the field
+  ASSERT_EQ(write(ends[1], "abc", 3), 3);  // part of the field
   EXPECT_FALSE(CanTake(ends[0]));
   ASSERT_EQ(write(ends[1], "abcd", 4), 4);
   EXPECT_TRUE(CanTake(ends[0]));
@@ -71,7 +71,7 @@ TEST(Channel, AReadOfAFolderIsAFailure) {
   close(folder);
 }
 
-TEST(Channel, AWriteThatWouldHaveToWaitAndMayNotIsAFailure) {
+TEST(Channel, ANonBlockingWriteWithoutRoomIsAFailure) {
   int ends[2];
   ASSERT_EQ(pipe2(ends, O_CLOEXEC | O_NONBLOCK), 0);
   const std::string more(static_cast<std::size_t>(fcntl(ends[1], F_GETPIPE_SZ)) + 1, 'x');

@@ -1,12 +1,12 @@
-// In a program that links this, operator new counts.
+// Counts operator new and operator delete in the program that links this.
 #pragma once
 
 namespace tallowmere::test {
 
-// How many blocks have been taken since the program began.
+// Returns the number of blocks allocated since the program started.
 int CountedAllocations();
 
-// How many of them have not been given back.
+// Returns how many of them have not been freed.
 int LiveAllocations();
 
 }  // namespace tallowmere::test

@@ -1,4 +1,4 @@
-// Codes 5, 7, 8 and 9: names and records of files, and the files of records.
+// Codes 5, 7, 8 and 9: the HFS name and the record of an item, and the path of a record.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -46,12 +46,12 @@ TEST_F(FileSpecCommands, ANameHasToFitWithItsNUL) {
   EXPECT_TRUE(mService.Answers(HFSNameRequest(path, 1), NameResponse(0, "")));
 }
 
-TEST_F(FileSpecCommands, ANameOfMaximum0IsNoneAndEmpty) {
+TEST_F(FileSpecCommands, AMaximumOf0GivesNoName) {
   EXPECT_TRUE(mService.Answers(HFSNameRequest(mFile, 0), NameResponse(0, "")));
 }
 
-// Every record needs the mount table.
-TEST_F(FileSpecCommands, ANameOfMaximum0LooksUpNoRecord) {
+// Making a record always reads the mount table.
+TEST_F(FileSpecCommands, AMaximumOf0LooksUpNoRecord) {
   const auto readsTheMountTable = [](const TracedRun& run) {
     return std::any_of(run.calls.begin(), run.calls.end(), [](const std::string& call) {
       return call.find("mountinfo") != std::string::npos;
@@ -65,7 +65,7 @@ TEST_F(FileSpecCommands, ANameOfMaximum0LooksUpNoRecord) {
   EXPECT_TRUE(readsTheMountTable(*with));
 }
 
-TEST_F(FileSpecCommands, TheNameOfAMissingItemIsNoneAndEmpty) {
+TEST_F(FileSpecCommands, AMissingItemHasNoName) {
   EXPECT_TRUE(mService.Answers(HFSNameRequest(mFile, 64), NameResponse(1, "file")));
   EXPECT_TRUE(mService.Answers(HFSNameRequest(PathTo("missing"), 64), NameResponse(0, "")));
 }
@@ -141,7 +141,7 @@ TEST_F(FileSpecCommands, TheRecordOfAnotherVolumeIsSearchedForOnAllIfRequested) 
   for (const unsigned search : {1u, 2u, 255u}) {
     EXPECT_TRUE(mService.Answers(PathOfRecordRequest(elsewhere, search, 0), PathResponse(mFile)));
   }
-  // No path comes of the bare name.
+  // The bare name does not become a path.
   EXPECT_TRUE(mService.Answers(PathOfRecordRequest(elsewhere, 0, 0), kNoItemResponse));
 }
 
@@ -157,7 +157,7 @@ TEST_F(FileSpecCommands, ANameLengthBeyondTheRecordIsTakenForTheWholeField) {
   EXPECT_TRUE(mService.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(PathTo(name))));
 }
 
-// A plain name is looked up in the folder, present or missing, without reading it.
+// A plain name is looked up without reading its folder, whether the item exists or not.
 TEST_F(FileSpecCommands, APlainNameWithANumberSignTakesNoReadingOfItsFolder) {
   const std::string request =
       RecordRequest(mFile) + PathOfRecordRequest(Record(mVolume, mParent, "Track #12.mp3"), 0, 0);

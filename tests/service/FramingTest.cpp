@@ -1,3 +1,4 @@
+// Requests in pieces, cut short or all at once, and the ends of counted strings.
 #include <gtest/gtest.h>
 
 #include <ostream>
@@ -46,10 +47,10 @@ TEST(Framing, AHundredRequestsWrittenAtOnceAreAnsweredInOrder) {
   EXPECT_EQ(service.Wait(), 0);
 }
 
-// A request cut at each of its bytes, the first request of the service or the second.
-class CutRequest : public testing::TestWithParam<std::string> {};
+// A request that follows a complete one and is cut at each of its bytes.
+class TruncatedRequest : public testing::TestWithParam<std::string> {};
 
-TEST_P(CutRequest, IsNotAnsweredWhereverItIsCut) {
+TEST_P(TruncatedRequest, IsNotAnsweredWhereverItIsCut) {
   for (std::size_t length = 0; length < GetParam().size(); ++length) {
     Service service;
     service.Write(kAnyRequest + GetParam().substr(0, length));
@@ -59,17 +60,17 @@ TEST_P(CutRequest, IsNotAnsweredWhereverItIsCut) {
   }
 }
 
-INSTANTIATE_TEST_SUITE_P(Framing, CutRequest,
+INSTANTIATE_TEST_SUITE_P(Framing, TruncatedRequest,
                          testing::Values(VolumeNumberRequest("Volume"), VolumeNameRequest(-1),
                                          ExportSettingsRequest(44100u << 16, 16, 2, "twos")));
 
-TEST(Framing, AStringWithoutItsNulInsideTheCountEndsWhereTheCountEnds) {
+TEST(Framing, AStringWithoutANulEndsWhereItsCountEnds) {
   Service service;
   const std::string name = service.NameOf(0);
   const int number = service.NumberOf(name);
   EXPECT_LT(number, 0);
   const std::string longer = name + "and more";
-  service.Write(U16(3) + CString(longer));  // leaves its bytes where the next name will stand
+  service.Write(U16(3) + CString(longer));  // leaves its bytes where the next name will be
   EXPECT_EQ(service.Read(6), VolumeNumberResponse(32767));
   EXPECT_EQ(service.Ask(U16(3) + Counted(name), 6), VolumeNumberResponse(number));
 }
@@ -92,7 +93,7 @@ TEST(Framing, AStringOfLength0IsTheEmptyString) {
   EXPECT_EQ(service.Ask(U16(3) + U16(0), 6), VolumeNumberResponse(32767));
 }
 
-// A request with a counted text in one of its fields.
+// A request with a counted string in one of its fields.
 struct RequestWithText {
   const char* name;
   std::string before;

@@ -1,4 +1,4 @@
-// Codes 1, 2 and 6: HFS paths, and names put behind paths.
+// Codes 1, 2 and 6: HFS paths of items, items of HFS paths, and names appended to paths.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -13,7 +13,7 @@ namespace {
 
 using std::string_literals::operator""s;
 
-// A folder "Work" with a folder "Docs" and a file "f" in it, told by its full HFS path.
+// A folder "Work" that holds a folder "Docs" and a file "f"; mHFSPath is its full HFS path.
 class HFSPathCommands : public testing::Test {
  protected:
   void SetUp() override {
@@ -23,7 +23,7 @@ class HFSPathCommands : public testing::Test {
     const std::string response = mService.Ask(FullPathRequest(mWork, 1024, 1), 2 + 1024 + 4);
     ASSERT_EQ(response.size(), 2 + 1024 + 4u);
     mHFSPath = response.substr(2).c_str();
-    // The counts below take a path that is long enough to be cut and short enough for one name.
+    // The sizes below need a path that is long enough to be shortened and fits one length byte.
     ASSERT_GT(mHFSPath.size(), 20u);
     ASSERT_LT(mHFSPath.size(), 200u);
   }
@@ -31,7 +31,7 @@ class HFSPathCommands : public testing::Test {
   Service mService;
   TemporaryFolder mFolder;
   std::string mWork;
-  std::string mHFSPath;  // of Work, with a colon behind it
+  std::string mHFSPath;  // of Work, with a trailing colon
 };
 
 // --- Code 1 -------------------------------------------------------------------------------------
@@ -41,7 +41,7 @@ TEST_F(HFSPathCommands, AFullPathIsTheVolumeAndTheFoldersEachWithAColon) {
   std::replace(expected.begin(), expected.end(), '/', ':');
   EXPECT_THAT(mHFSPath, testing::EndsWith(":Work:"));
   EXPECT_EQ(mHFSPath.back(), ':');
-  // Whatever the volumes of this machine are.
+  // Independent of the volumes of this machine.
   EXPECT_TRUE(expected.ends_with(mHFSPath.substr(mHFSPath.find(':') + 1)));
 }
 
@@ -61,7 +61,7 @@ TEST_F(HFSPathCommands, AFullPathIsFollowedByZeros) {
                                U16(length).append(buffer).append(kTrailer)));
 }
 
-TEST_F(HFSPathCommands, AFullPathThatDoesNotFitIsShortenedAndItsWholeLengthTold) {
+TEST_F(HFSPathCommands, AFullPathThatDoesNotFitIsShortenedAndHasItsWholeLengthStated) {
   const auto length = static_cast<unsigned>(mHFSPath.size());
   const std::string response = mService.Ask(FullPathRequest(mWork, length, 1), 2 + length + 4);
   EXPECT_EQ(response.substr(0, 2), U16(length));
@@ -92,11 +92,11 @@ TEST_F(HFSPathCommands, WithoutTheFlagTheVolumeIsFollowedByZerosWhateverTheSize)
   }
 }
 
-TEST_F(HFSPathCommands, AFullPathHasItsOuterFoldersReplacedAsFarAsTheSizeDemands) {
+TEST_F(HFSPathCommands, AFullPathLosesOuterFoldersUntilItFits) {
   const auto length = static_cast<unsigned>(mHFSPath.size());
   const std::string volume = mHFSPath.substr(0, mHFSPath.find(':') + 1);
   std::string folders = mHFSPath.substr(volume.size());
-  // The smallest size that returns needs room for the volume, "...:" and the NUL.
+  // The smallest size that is answered has room for the volume, "...:" and the NUL.
   for (unsigned size = length; size > volume.size() + 4; --size) {
     while (volume.size() + folders.size() >= size) {
       folders = "..." + folders.substr(folders.find(':', 4));
@@ -166,12 +166,12 @@ TEST_F(HFSPathCommands, WithTheFlagTheFolderIsTwoStrings) {
 TEST_F(HFSPathCommands, AFolderWithoutItsNULEndsWhereTheCountEnds) {
   EXPECT_TRUE(
       mService.Answers(PathOfHFSPathRequest(mHFSPath, "f", 0), ResultResponse(0, mWork + "/f")));
-  // The second string is empty: its NUL follows the first one's. Two colons climb.
+  // The second string is empty: its NUL follows that of the first. Two colons lead one folder up.
   EXPECT_TRUE(
       mService.Answers(PathOfHFSPathRequest(mHFSPath, "f", 1), ResultResponse(kResultNoItem)));
 }
 
-TEST_F(HFSPathCommands, WithoutFolderAndNameThereIsTheCurrentFolder) {
+TEST_F(HFSPathCommands, WithoutFolderAndNameThePathIsTheCurrentFolder) {
   const std::string here = std::filesystem::current_path();
   EXPECT_TRUE(mService.Answers(PathOfHFSPathRequest("", "", 0), ResultResponse(0, here)));
 }
@@ -207,7 +207,7 @@ TEST_F(HFSPathCommands, ANameWithoutItsNULEndsWhereTheCountEnds) {
                                PathResponse(mWork + "/new")));
 }
 
-TEST_F(HFSPathCommands, APathThatNoCountCanTellIsNone) {
+TEST_F(HFSPathCommands, APathTooLongForACountIsNone) {
   const std::string path = "/" + std::string(65000, 'x');
   const std::string name(65534 - path.size() - 1, 'n');
   EXPECT_TRUE(mService.Answers(AddNameRequest(path, name, 0), PathResponse(path + "/" + name)));

@@ -1,4 +1,4 @@
-// One item has one identity, whichever service is asked, when and from where.
+// An item has the same record, whichever service is asked, when and from where.
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -18,13 +18,13 @@ namespace fs = std::filesystem;
 
 constexpr std::size_t kResponseSize = 75;
 
-// The response to code 7 as it came.
+// Returns the whole response to code 7.
 std::string RecordOf(ChildProgram& service, const fs::path& path) {
   service.Write(U16(7) + CString(path.string()));
   return service.Read(kResponseSize);
 }
 
-// The number of the folder that holds the item; 0 for a record that is not usable.
+// Returns the id of the folder that holds the item, or 0 for an unusable record.
 std::uint32_t ParentID(const std::string& record) {
   std::uint32_t id = 0;
   if (record.size() == kResponseSize && record[0] == 1)
@@ -36,7 +36,7 @@ std::uint32_t ParentIDOf(ChildProgram& service, const fs::path& path) {
   return ParentID(RecordOf(service, path));
 }
 
-// A tree with a name of every kind, told by paths from its top.
+// A tree with one name of every kind. Paths() are relative to its top folder.
 class Identity : public testing::Test {
  protected:
   Identity() { MakeTree(mFolder.MakeFolder("Tree")); }
@@ -71,7 +71,7 @@ TEST_F(Identity, TwoServicesOneAfterTheOtherGiveTheSameRecord) {
   }
 }
 
-TEST_F(Identity, TheRecordOfAMissingItemHoldsNothingBehindItsName) {
+TEST_F(Identity, TheRecordOfAMissingItemHasZerosAfterItsName) {
   Service service;
   RecordOf(service, Tree() / std::string(60, 'n'));
   const std::string record = RecordOf(service, Tree() / "new");
@@ -119,7 +119,7 @@ class IdentityWithMounts : public Identity {
     if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   }
 
-  // A service in a mount namespace of its own, in which a command has been carried out before.
+  // Starts a service in a mount namespace of its own, after the command has run there.
   static ChildProgram ServiceAfter(const std::string& command) {
     return {"unshare",
             {"--mount", "--propagation", "private", "sh", "-c", command + " && exec \"$0\" \"$1\"",
@@ -141,7 +141,7 @@ TEST_F(IdentityWithMounts, AVolumeMountedElsewhereInAnotherNamespaceHasTheSameId
     const std::string moved = RecordOf(elsewhere, there / path);
     EXPECT_NE(ParentID(record), 0u);
     EXPECT_EQ(ParentID(moved), ParentID(record));
-    EXPECT_EQ(moved.substr(7), record.substr(7)) << "another name";
+    EXPECT_EQ(moved.substr(7), record.substr(7)) << "the names differ";
   }
 }
 
@@ -155,7 +155,7 @@ TEST_F(IdentityWithMounts, AFolderMountedElsewhereInAnotherNamespaceHasTheSameId
     const std::string bound = RecordOf(elsewhere, there / path);
     EXPECT_NE(ParentID(record), 0u);
     EXPECT_EQ(ParentID(bound), ParentID(record));
-    EXPECT_EQ(bound.substr(7), record.substr(7)) << "another name";
+    EXPECT_EQ(bound.substr(7), record.substr(7)) << "the names differ";
   }
 }
 

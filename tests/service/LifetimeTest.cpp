@@ -1,3 +1,4 @@
+// When the service ends, with which status, and that it leaves nothing behind.
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -27,7 +28,7 @@
 namespace tallowmere::test {
 namespace {
 
-// The id of a process that has ended and been waited for.
+// Returns the id of a process that has ended and been reaped.
 std::string IDOfNoProcess() {
   const pid_t process = fork();
   if (process == 0) _exit(0);
@@ -51,8 +52,8 @@ TEST(Lifetime, FurtherArgumentsAreIgnored) {
   EXPECT_EQ(service.Wait(), 0);
 }
 
-// Each of these names something that exists for kill: this process group, every process, or (as P)
-// this process. The service then serves request after request.
+// Arguments for which kill finds a process: this process group, every process, or (as P) this
+// process. The service then serves one request after another.
 class ArgumentThatNamesAProcess : public testing::TestWithParam<const char*> {};
 
 TEST_P(ArgumentThatNamesAProcess, KeepsTheServiceServing) {
@@ -93,7 +94,7 @@ TEST(Lifetime, EndsAfterTheRequestDuringWhichItsParentDied) {
   Service service(std::to_string(parent));
   EXPECT_EQ(service.Ask(kAnyRequest, 8), kItsResponse);
   EXPECT_EQ(service.Ask(kAnyRequest, 8), kItsResponse);
-  // Once the service has taken a byte of the next request, it has looked for its parent.
+  // The service has looked for its parent once it has read a byte of the next request.
   service.Write(kAnyRequest.substr(0, 1));
   while (service.UnreadInput() > 0) usleep(100);
   kill(parent, SIGKILL);
@@ -118,7 +119,7 @@ TEST(Lifetime, QuitAfterSeveralRequestsEndsWithStatus0AndNoResponse) {
   EXPECT_EQ(service.UnreadInput(), kAnyRequest.size());
 }
 
-TEST(Lifetime, TheParentIsLookedForAfterEveryRequestAlsoAfterOneThatFailed) {
+TEST(Lifetime, TheParentIsLookedForAfterEveryRequestEvenAFailedOne) {
   const auto run = RunTraced("kill", kAnyRequest + kAnyRequest);
   if (!run) GTEST_SKIP() << "strace cannot trace here";
   const std::string look = "kill(" + std::to_string(getpid()) + ", 0)";
@@ -171,8 +172,8 @@ TEST(Lifetime, AResponseThatNobodyReadsEndsTheServiceWithStatus0WhereTheSignalIs
 
 constexpr int kStillRuns = -1000;
 
-// A process that starts a service and is killed. It alone holds the other ends of the service's
-// pipes. The service is this process's child when its parent is gone.
+// A process that starts a service and is killed. Only it holds the other ends of the service's
+// pipes. Once it is gone, the service is reparented to this process.
 class MortalParent {
  public:
   explicit MortalParent(ChildProgram::BrokenPipe brokenPipe = ChildProgram::BrokenPipe::kEnds) {
@@ -202,7 +203,7 @@ class MortalParent {
 
   pid_t ServiceProcess() const { return mService; }
 
-  // Has it write these bytes to the service, and read nothing.
+  // Makes the parent write these bytes to the service. It reads no response.
   void Order(std::string_view requests) const {
     if (write(mOrders, requests.data(), requests.size()) < 0) std::abort();
   }
@@ -213,8 +214,8 @@ class MortalParent {
     waitpid(std::exchange(mProcess, -1), nullptr, 0);
   }
 
-  // The exit status of the service, or minus the signal that ended it; kStillRuns after ten
-  // seconds. REQUIRES: the parent is gone.
+  // Returns the service's exit status, the negated number of the signal that ended it, or
+  // kStillRuns after ten seconds. REQUIRES: the parent is gone.
   int StatusOfService() {
     int status = 0;
     for (int waited = 0; waited < 10'000; ++waited) {
@@ -228,7 +229,7 @@ class MortalParent {
   }
 
  private:
-  // Tells the service's process id once it has answered, and passes on what it is ordered to.
+  // Reports the service's process id once it has answered, then forwards the orders to it.
   [[noreturn]] static void Live(int orders, int test, ChildProgram::BrokenPipe brokenPipe) {
     Service service(std::to_string(getpid()), brokenPipe);
     const bool lives = service.Answers(kAnyRequest, kItsResponse);
@@ -247,13 +248,13 @@ class MortalParent {
   int mOrders = -1;
 };
 
-// The system call in which the kernel keeps a process waiting.
+// A system call in which a process is blocked.
 struct AwaitedCall {
   long number = 0;
   unsigned long size = 0;  // of a read or write
 };
 
-// None while it runs, and where that is not told.
+// Returns nullopt while the process runs, and where the kernel does not say.
 std::optional<AwaitedCall> CallAwaitedBy(pid_t process) {
   std::ifstream file("/proc/" + std::to_string(process) + "/syscall");
   AwaitedCall call;
@@ -263,12 +264,12 @@ std::optional<AwaitedCall> CallAwaitedBy(pid_t process) {
   return file ? std::optional(call) : std::nullopt;
 }
 
-// Whether the kernel tells it, of this process at least.
+// Returns whether the kernel reports such calls, at least for this process.
 bool AwaitedCallsAreTold() {
   return CallAwaitedBy(getpid()).has_value();
 }
 
-// Whether that is, within ten seconds, a call of which `is` says yes.
+// Returns whether the process blocks within ten seconds in a call that satisfies `is`.
 template <class Predicate>
 bool ComesToAwait(pid_t process, Predicate is) {
   for (int waited = 0; waited < 10'000; ++waited) {
@@ -279,12 +280,12 @@ bool ComesToAwait(pid_t process, Predicate is) {
   return false;
 }
 
-constexpr const char* kCallsAreNotTold = "the kernel does not tell what a process waits for";
+constexpr const char* kCallsAreNotTold = "the kernel does not report which call blocks a process";
 
-// A process stopped in front of a system call until the object ends.
+// Stops a process in front of a system call. The process continues when the object ends.
 class StoppedAtCall {
  public:
-  // Traces it. REQUIRES: it waits for something to do.
+  // REQUIRES: the process waits for input.
   explicit StoppedAtCall(pid_t process)
       : mProcess(process),
         mTraces(ptrace(PTRACE_SEIZE, process, nullptr, PTRACE_O_TRACESYSGOOD) == 0 &&
@@ -293,10 +294,10 @@ class StoppedAtCall {
   StoppedAtCall& operator=(const StoppedAtCall&) = delete;
   ~StoppedAtCall() { ptrace(PTRACE_DETACH, mProcess, nullptr, nullptr); }
 
-  // Not where it may not be traced.
+  // Returns false where the process may not be traced.
   bool Traces() const { return mTraces; }
 
-  // Lets it run up to its next call with that number. False when it ends before.
+  // Lets the process run up to its next call of that number. Returns false when it ends first.
   bool GoTo(std::uint64_t number) const {
     while (ptrace(PTRACE_SYSCALL, mProcess, nullptr, nullptr) == 0 && Stops()) {
       __ptrace_syscall_info info{};
@@ -339,7 +340,7 @@ TEST(KilledParent, EndsTheServiceThatWaitsForTheRestOfARequest) {
   EXPECT_EQ(parent.StatusOfService(), 0);
 }
 
-// What a service does whose parent is killed while it writes, or before that.
+// How a service ends whose parent is killed before or while it writes.
 struct AtTheBrokenPipe {
   const char* name;
   ChildProgram::BrokenPipe brokenPipe;
@@ -371,7 +372,7 @@ TEST_P(KilledParentOfABusyService, EndsItInTheMiddleOfAPassOverAVolume) {
 TEST_P(KilledParentOfABusyService, EndsItInTheMiddleOfAResponse) {
   if (!AwaitedCallsAreTold()) GTEST_SKIP() << kCallsAreNotTold;
   MortalParent parent(GetParam().brokenPipe);
-  std::string requests;  // with more to answer than a pipe takes
+  std::string requests;  // whose responses exceed the capacity of a pipe
   for (int i = 0; i < 200; ++i) requests += FullPathRequest("/", 1024, 1);
   parent.Order(requests);
   const auto isWrite = [](const AwaitedCall& call) { return call.number == SYS_write; };
@@ -386,7 +387,7 @@ INSTANTIATE_TEST_SUITE_P(
                     AtTheBrokenPipe{"ByItself", ChildProgram::BrokenPipe::kIsAnError, 0}),
     [](const auto& tested) { return tested.param.name; });
 
-// The service cannot end while the kernel has it wait for a server that is dead.
+// A service that the kernel keeps waiting for a dead server cannot end by itself.
 class KilledParentOfAServiceAtADeadMount : public testing::Test {
  protected:
   void SetUp() override {
@@ -420,12 +421,12 @@ TEST_F(KilledParentOfAServiceAtADeadMount, LeavesItToBeKilled) {
 
 // --- What is left behind ------------------------------------------------------------------------
 
-// Every request, a pass over a volume and the end: calls that name a file, pass or make something
-// for other processes, or write.
-TEST(Lifetime, NothingIsMadeOrChangedAndNobodyIsCalled) {
+// Traces every request, a pass over a volume and the exit. Covers the calls that name a file, that
+// create or send something for other processes, and that write.
+TEST(Lifetime, NothingIsCreatedChangedOrSent) {
   if (kIsSanitized) GTEST_SKIP() << "the sanitizer makes calls of its own";
   const EveryRequest every;
-  if (!every.IsMade()) GTEST_SKIP() << "the folder for temporary files is too deep";
+  if (!every.IsMade()) GTEST_SKIP() << "the path of the temporary folder is too long";
   std::string requests;
   for (unsigned code = 1; code <= 10; ++code) requests += every.Of(code);
   const TemporaryFolder folder;
@@ -464,7 +465,7 @@ TEST(Lifetime, NothingIsMadeOrChangedAndNobodyIsCalled) {
                                        "open"};
   int passes = 0;
   for (const std::string& call : run->calls) {
-    if (call.starts_with("+++ ")) continue;  // of strace
+    if (call.starts_with("+++ ")) continue;  // strace's note of the exit
     const std::string name = call.substr(0, call.find('('));
     passes += name == "getdents64" ? 1 : 0;
     if (name == "write") {

@@ -1,4 +1,4 @@
-// Every request has its right answer where the system gives little and permits little.
+// Every request is answered correctly with few descriptors, little memory and few permissions.
 #include <gtest/gtest.h>
 #include <sys/mount.h>
 #include <sys/resource.h>
@@ -27,7 +27,7 @@ const std::string kLittleMemory = "ulimit -v 65536";  // KiB
 const std::vector<std::string> kAsNobody{"setpriv", "--reuid=65534", "--regid=65534",
                                          "--clear-groups"};
 
-// A folder with an item in it that everyone may see.
+// A folder with an item in it, readable by everyone.
 class Limits : public testing::Test {
  protected:
   Limits() {
@@ -45,21 +45,21 @@ class Limits : public testing::Test {
   std::string mItem;
 };
 
-// The same with a volume in memory, whose items are found by nothing but a pass over it.
+// The same on a tmpfs, where the service finds items only by a pass over the volume.
 class LimitsOfAPass : public Limits {
  protected:
   void SetUp() override {
     if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
     mMount.emplace("tmpfs", mFolder.MakeFolder("Volume"), "tmpfs");
     ASSERT_TRUE(mMount->IsMounted());
-    // The first items have numbers that two items could have: a folder that is closed to a user
-    // then leaves open which it is.
+    // Uses up the small inode numbers. The item then gets an id that another item could share, and
+    // a folder that the user may not read leaves open which item is meant.
     for (int i = 0; i < 20; ++i) std::filesystem::remove(MakeItem(Volume()));
   }
 
   path Volume() const { return mFolder.Path() / "Volume"; }
 
-  // The record of the item in the folder that is made last of very many: 1000 folders of 100.
+  // Returns the record of the item in the last folder of 1000 folders with 100 each.
   std::string RecordOnALargeVolume() {
     for (int i = 0; i < 100'000; ++i) {
       const path folder = Volume() / std::to_string(i / 100);
@@ -69,7 +69,7 @@ class LimitsOfAPass : public Limits {
     return RecordOf(Volume() / "999/99999/folder");
   }
 
-  // Of a new item, asked of a service that another one does not hear of.
+  // Makes an item and returns its record, asked of a service that is used for nothing else.
   std::string RecordOf(const path& folder) {
     mItem = MakeItem(folder);
     Service service;
@@ -118,7 +118,7 @@ TEST_F(LimitsOfAPass, SixtyFourMegabytesAreEnoughForAHundredThousandFolders) {
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
 }
 
-// As long as it lives, a service has no more than so many pages beside those in use.
+// Limits a running service's address space to what it uses plus `pages`, while the object exists.
 class MemoryLimit {
  public:
   explicit MemoryLimit(const Service& service, rlim_t pages = 0) : mProcess(service.Process()) {
@@ -149,7 +149,7 @@ TEST_F(LimitsOfAPass, WithoutMemoryThePassIsAnErrorAndTheNextOneIsRight) {
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
 }
 
-// The answer of a new service that has no more than so many pages for it; nothing when it ends.
+// Returns a new service's answer within so many more pages, or an empty string when it ends.
 std::string AnswerWithin(Service& service, rlim_t pages, const std::string& request) {
   EXPECT_TRUE(service.Answers(kAnyRequest, kItsResponse));
   const MemoryLimit limit(service, pages);
@@ -170,7 +170,7 @@ TEST_F(Limits, WithoutMemoryToLookAUserUpTheItemIsNotFound) {
   }
 }
 
-// Without memory for the request itself it ends.
+// The service ends when there is no memory for the request itself.
 TEST_F(Limits, WithoutMemoryForAUsersLongNameTheItemIsNotFound) {
   if (kIsSanitized) GTEST_SKIP() << "the sanitizer takes terabytes";
   const std::string request = RecordRequest("~" + std::string(60'000, 'u'));
@@ -205,25 +205,25 @@ TEST_F(Limits, NothingHasToBeWritable) {
 }
 
 TEST_F(Limits, NoPrivilegeIsNeeded) {
-  if (!IsPermitted(kAsNobody)) GTEST_SKIP() << "one cannot become another user here";
+  if (!IsPermitted(kAsNobody)) GTEST_SKIP() << "changing the user is not permitted here";
   Service service(kAsNobody);
   ExpectRightAnswers(service, mItem);
 }
 
 TEST_F(LimitsOfAPass, NoPrivilegeIsNeededToFindAnItemByItsRecord) {
-  if (!IsPermitted(kAsNobody)) GTEST_SKIP() << "one cannot become another user here";
+  if (!IsPermitted(kAsNobody)) GTEST_SKIP() << "changing the user is not permitted here";
   const std::string record = RecordOf(Volume() / "a/b/c");
   Service service(kAsNobody);
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(record, 0, 0), PathResponse(mItem)));
 }
 
-// Its user may not look into the folder that holds the item's.
+// A folder that holds the item's folder and is closed to the service's user.
 class UnreadableFolder : public LimitsOfAPass {
  protected:
   void SetUp() override {
     LimitsOfAPass::SetUp();
     if (IsSkipped()) return;
-    if (!IsPermitted(kAsNobody)) GTEST_SKIP() << "one cannot become another user here";
+    if (!IsPermitted(kAsNobody)) GTEST_SKIP() << "changing the user is not permitted here";
     mItem = MakeItem(Volume() / "closed/folder");
     Service privileged;
     mKnown = LearnItem(privileged, mItem);
@@ -234,7 +234,7 @@ class UnreadableFolder : public LimitsOfAPass {
   Item mKnown;
 };
 
-TEST_F(UnreadableFolder, IsAnErrorToWhomeverItIsClosedAndNoLongerOnceItIsOpen) {
+TEST_F(UnreadableFolder, IsAnErrorUntilItIsOpened) {
   Service service(kAsNobody);
   const std::string nearestVolume = mKnown.volumeName + ":";
   std::string buffer = nearestVolume;
@@ -247,7 +247,7 @@ TEST_F(UnreadableFolder, IsAnErrorToWhomeverItIsClosedAndNoLongerOnceItIsOpen) {
       service.Answers(RequestAbout(mKnown, 7), RecordResponse(0, Record(32767, -1, mKnown.name))));
   EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 8), kNoPathResponse));
   EXPECT_TRUE(service.Answers(RequestAbout(mKnown, 9), kNoItemResponse));
-  // What takes no look at the item.
+  // These codes do not look at the item.
   for (const unsigned code : {3u, 4u, 6u}) {
     EXPECT_TRUE(service.Answers(RequestAbout(mKnown, code), AnswerAbout(mKnown, code))) << code;
   }
@@ -255,7 +255,7 @@ TEST_F(UnreadableFolder, IsAnErrorToWhomeverItIsClosedAndNoLongerOnceItIsOpen) {
   ExpectRightAnswers(service, mItem);
 }
 
-TEST_F(UnreadableFolder, ThatMayBeSearchedIsNoHindranceToWhomHasThePath) {
+TEST_F(UnreadableFolder, WithSearchPermissionHidesNoPathThroughIt) {
   Allow(0711);
   Service service(kAsNobody);
   ExpectRightAnswers(service, mItem);
@@ -269,7 +269,7 @@ TEST_F(UnreadableFolder, HidesWhatIsInItFromAPass) {
 
 // --- A volume that never answers ----------------------------------------------------------------
 
-TEST_F(LimitsOfAPass, AVolumeThatNeverAnswersKeepsNoRequestAboutAnotherWaiting) {
+TEST_F(LimitsOfAPass, AVolumeThatNeverAnswersBlocksNoRequestAboutAnother) {
   const DeadMount first(mFolder.MakeFolder("Dead"));
   const DeadMount second(mFolder.MakeFolder("Volume/a/Dead"));
   if (!second.IsMounted()) GTEST_SKIP() << "no FUSE mounts here";

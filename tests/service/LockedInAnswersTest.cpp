@@ -1,4 +1,4 @@
-// That a service which is locked in answers as one that is not.
+// Checks that a locked-in service gives the same answers as an open one.
 #include <gtest/gtest.h>
 #include <pwd.h>
 #include <sys/mount.h>
@@ -26,8 +26,8 @@ namespace {
 
 using std::filesystem::path;
 
-// A machine's own daemon for its users, at the place where the C library asks for one: it knows a
-// user "ann" whose home folder is "/Home of ann". The protocol is that of glibc's nscd-client.h.
+// A local user-database daemon, at the socket that the C library tries. It knows a user "ann" whose
+// home folder is "/Home of ann". Its protocol is that of glibc's nscd-client.h.
 class UserDaemon {
  public:
   static constexpr char kFolder[] = "/var/run/nscd";
@@ -84,7 +84,7 @@ class UserDaemon {
   std::thread mThread;
 };
 
-// Answers of a program to requests, up to its end.
+// Returns the program's answers to the requests, up to its end.
 std::string AnswersOf(const std::string& program, const std::string& requests) {
   ChildProgram service(program, {std::to_string(getpid())});
   std::thread writer([&] {
@@ -97,7 +97,7 @@ std::string AnswersOf(const std::string& program, const std::string& requests) {
   return answers;
 }
 
-// Every request about an item.
+// Returns the requests of every code about an item.
 std::string EveryRequestAbout(const std::string& item) {
   Service learns;
   Item known = LearnItem(learns, item);
@@ -131,7 +131,7 @@ TEST(LockedInAnswers, AreTheSameAboutItemsOfEveryKind) {
   ExpectSameAnswers(requests);
 }
 
-// A new service's first question is about an id: all folders are read.
+// The first request to a new service asks for an unknown id, so it reads every folder.
 TEST(LockedInAnswers, AreTheSameAfterAPassOverAVolume) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const TemporaryFolder folder;
@@ -176,7 +176,7 @@ TEST(LockedInAnswers, AreTheSameAboutUsersOfALocalDaemon) {
   EXPECT_EQ(AnswersOf(TALLOWMERE_SERVICE, requests), open);
 }
 
-// The exception: Landlock keeps a process from what /proc shows of others.
+// The exception: Landlock hides what /proc shows of other processes.
 TEST(LockedInAnswers, LeadThroughNoOtherProcess) {
   const TemporaryFolder folder;
   folder.MakeFile("item");
@@ -186,7 +186,7 @@ TEST(LockedInAnswers, LeadThroughNoOtherProcess) {
   EXPECT_EQ(AnswersOf(TALLOWMERE_SERVICE, request).at(0), '\0');
 }
 
-// The root folder is on a disk with a label: the volume is called by it.
+// The root folder is on a disk with a label, which names the volume.
 TEST(LockedInAnswers, TellTheLabelOfTheRootVolume) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   FileSystemImage disk("ext4", {"mkfs.ext4", "-q", "-F", "-L", "Label"}, 64 << 20);

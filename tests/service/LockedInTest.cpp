@@ -1,4 +1,4 @@
-// What a service that is locked in cannot do any more, attempted from inside.
+// What a locked-in service can no longer do, attempted from inside its process.
 #include <gtest/gtest.h>
 #include <linux/landlock.h>
 #include <sys/mount.h>
@@ -25,7 +25,7 @@ namespace {
 
 using Outcomes = std::map<std::string, int>;  // attempts and their error numbers
 
-// A local socket at a path that somebody listens to.
+// A listening local socket at a path.
 class Listener {
  public:
   explicit Listener(const std::string& path) : mSocket(socket(AF_UNIX, SOCK_STREAM, 0)) {
@@ -45,7 +45,7 @@ class Listener {
   int mSocket;
 };
 
-// A service that makes all attempts after its first request, and lives.
+// Runs a service that makes every attempt after its first request and goes on serving.
 class LockedIn : public testing::Test {
  protected:
   LockedIn() {
@@ -53,7 +53,8 @@ class LockedIn : public testing::Test {
     mFolder.MakeFolder("old folder");
   }
 
-  // `wrapper` stands in front of the program. Empty where the kernel does not permit the wrapper.
+  // `wrapper` precedes the program. Returns no outcomes where the kernel does not permit the
+  // wrapper.
   Outcomes AttemptAll(const std::vector<std::string>& wrapper = {},
                       const std::string& program = TALLOWMERE_SERVICE) {
     const Listener listener((mFolder.Path() / "socket").string());
@@ -83,12 +84,12 @@ bool IsOf(const std::string& attempt, const char* group) {
 bool IsNeeded(const std::string& attempt) {
   return IsOf(attempt, "needed");
 }
-// What is left open where the leak check of a sanitizer needs it.
+// A sanitizer's leak check needs these calls, so they stay open for it.
 bool IsOfTheLeakCheck(const std::string& attempt) {
   return kIsSanitized && IsOf(attempt, "processes");
 }
 
-// Of this kernel; not positive where it has none.
+// Returns the version of this kernel's Landlock; not positive where it has none.
 long LandlockVersion() {
   return syscall(SYS_landlock_create_ruleset, nullptr, 0, LANDLOCK_CREATE_RULESET_VERSION);
 }
@@ -100,7 +101,7 @@ bool MeansRefused(int error) {
 }
 
 TEST_F(LockedIn, IsRefusedEveryAttemptAndLives) {
-  if (LandlockVersion() < kTruncatingIsKnown) GTEST_SKIP() << "openat2 is left open here";
+  if (LandlockVersion() < kTruncatingIsKnown) GTEST_SKIP() << "this Landlock leaves openat2 open";
   for (const auto& [attempt, error] : AttemptAll()) {
     if (IsNeeded(attempt) || IsOfTheLeakCheck(attempt)) continue;
     EXPECT_TRUE(MeansRefused(error)) << attempt << ": " << std::strerror(error);
@@ -115,13 +116,13 @@ TEST_F(LockedIn, MayDoWhatItNeeds) {
   }
 }
 
-// That the attempts are ones: what refuses them above is nothing but the lock.
-TEST_F(LockedIn, WouldDoAllThatOtherwise) {
-  if (geteuid() != 0) GTEST_SKIP() << "some attempts take privileges";
+// Shows that the attempts are real: without the lock, nothing refuses them.
+TEST_F(LockedIn, CouldMakeEveryAttemptWithoutTheLock) {
+  if (geteuid() != 0) GTEST_SKIP() << "some attempts need privileges";
   for (const auto& [attempt, error] : AttemptAll({}, TALLOWMERE_OPEN_SERVICE)) {
     const bool isAbsent =
         IsOf(attempt, "absent") || (IsOf(attempt, "configured") && error == ENOSYS);
-    if (isAbsent) continue;  // the kernel was built without it
+    if (isAbsent) continue;  // the kernel was built without this call
     EXPECT_FALSE(MeansRefused(error)) << attempt << ": " << std::strerror(error);
   }
 }
@@ -141,7 +142,7 @@ TEST_F(LockedIn, LeavesEveryFileAsItIs) {
             (std::vector<std::string>{"file", "old file", "old folder", "old name", "socket"}));
 }
 
-TEST_F(LockedIn, StandsInTheProcessFromTheFirstRequestOn) {
+TEST_F(LockedIn, IsInForceFromTheFirstRequestOn) {
   Service service;
   ASSERT_TRUE(service.Answers(kAnyRequest, kItsResponse));
   std::ifstream status("/proc/" + std::to_string(service.Process()) + "/status");
@@ -169,7 +170,8 @@ TEST_F(LockedIn, WithoutLandlockIsKeptFromFilesByTheFilter) {
 }
 
 TEST_F(LockedIn, WithoutFiltersIsKeptFromFilesAndTCPByLandlock) {
-  if (LandlockVersion() < kNetworksAreKnown) GTEST_SKIP() << "this kernel's Landlock has less";
+  if (LandlockVersion() < kNetworksAreKnown)
+    GTEST_SKIP() << "this kernel's Landlock cannot restrict networks";
   for (const auto& [attempt, error] : AttemptAll(Without("filters"))) {
     if (IsNeeded(attempt)) {
       EXPECT_EQ(error, 0) << attempt;
@@ -194,7 +196,7 @@ INSTANTIATE_TEST_SUITE_P(Without, LockedInOnAKernel,
 
 // --- Networks -----------------------------------------------------------------------------------
 
-// With another /etc/nsswitch.conf.
+// Mounts another file over /etc/nsswitch.conf.
 class LockedInWithUsersFrom : public LockedIn {
  protected:
   Outcomes AttemptAllWith(const std::string& nameServiceSwitch) {

@@ -1,5 +1,5 @@
-// A file of a volume that is mounted elsewhere by itself shows no folder of the volume a second
-// time: no request takes another system call.
+// A file of a volume that is also mounted by itself elsewhere shows no folder of the volume twice,
+// so it must not cost any request a system call.
 #include <gtest/gtest.h>
 #include <sys/mount.h>
 
@@ -16,7 +16,7 @@
 namespace tallowmere::test {
 namespace {
 
-// The names of the calls that the last of several requests about an item makes, sorted.
+// Returns the sorted names of the calls that the last of several requests about an item makes.
 std::optional<std::vector<std::string>> CallsFor(const Item& item, unsigned code) {
   const std::string request = RequestAbout(item, code);
   const auto run = RunTraced("%file,%desc,kill", RequestAbout(item, 7) + request + request + kQuit);
@@ -34,7 +34,7 @@ class MountedFile : public testing::TestWithParam<unsigned> {};
 TEST_P(MountedFile, AddsNoSystemCall) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted";
   const TemporaryFolder folder;
-  // In memory, where a new item takes no other calls than an old one.
+  // On a tmpfs a new item takes the same calls as an old one.
   const ScopedMount volume("tmpfs", folder.MakeFolder("volume"), "tmpfs");
   ASSERT_TRUE(volume.IsMounted());
   folder.MakeFolder("volume/folder/inner");

@@ -1,4 +1,4 @@
-// The examples of docs/protocol.md, replayed byte for byte by a service that was started in "/".
+// Replays the examples of docs/protocol.md byte for byte to a service started in "/".
 #include <gtest/gtest.h>
 #include <unistd.h>
 
@@ -24,7 +24,7 @@ std::string BytesOf(const std::string& hexadecimal) {
   return bytes;
 }
 
-// Indented lines that begin with "request" or "response", and those that go on below.
+// Reads the indented lines that begin with "request" or "response", and their continuations.
 std::vector<Example> ReadExamples() {
   constexpr std::size_t kIndent = 4;
   constexpr std::size_t kLabel = 10;
@@ -54,7 +54,7 @@ TEST(TheProtocolPage, HasAnExampleOfEveryCode) {
   EXPECT_EQ(codes, std::string("\0\1\2\3\4\5\6\7\10\11\12", 11));
 }
 
-// The examples to one service, the one of code 0 last.
+// All examples in their order, except that code 0 comes last.
 class TheExamples : public testing::Test {
  protected:
   TheExamples() : mFormer(std::filesystem::current_path()) {

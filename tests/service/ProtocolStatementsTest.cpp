@@ -1,4 +1,4 @@
-// What docs/protocol.md says of the ends of the service, of full paths and of new items.
+// Statements of docs/protocol.md on how the service ends, on full paths and on new items.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
@@ -22,7 +22,7 @@ using std::filesystem::path;
 
 // --- What ends the service ----------------------------------------------------------------------
 
-// A service whose streams a shell has set, by words like "</dev/null".
+// Runs the service under a shell that redirects its streams, e.g. "</dev/null".
 Service Redirected(const std::string& streams) {
   return Service(std::vector<std::string>{"sh", "-c", "exec \"$@\" " + streams, "sh"});
 }
@@ -70,14 +70,14 @@ class FullPathOf : public testing::Test {
   Service mService;
 };
 
-TEST_F(FullPathOf, WhatIsNoPathOnAVolumeIsAColon) {
+TEST_F(FullPathOf, APathOnNoVolumeIsAColon) {
   for (const char* const item : {"relative", "relative/x", "", "~no such user", "~no such user/x",
                                  "file:///etc", "/proc/self/status", "/dev/null"}) {
     EXPECT_EQ(FullPath(item), ":") << item;
   }
 }
 
-TEST_F(FullPathOf, WhatIsNotThereBelowNoFolderIsTheVolumeAlone) {
+TEST_F(FullPathOf, AMissingItemInNoFolderIsTheVolumeAlone) {
   mFolder.MakeFile("file");
   mFolder.MakeLink("dangling", "nowhere");
   mFolder.MakeLink("link", mFolder.MakeFolder("folder"));
@@ -88,7 +88,7 @@ TEST_F(FullPathOf, WhatIsNotThereBelowNoFolderIsTheVolumeAlone) {
   }
 }
 
-TEST_F(FullPathOf, AnythingElseIsThatOfItsFolder) {
+TEST_F(FullPathOf, AnyOtherItemIsItsFolder) {
   mFolder.MakeFile("file");
   mFolder.MakeLink("dangling", "nowhere");
   const std::string here = FullPath(mFolder.Path());
@@ -98,7 +98,7 @@ TEST_F(FullPathOf, AnythingElseIsThatOfItsFolder) {
   EXPECT_EQ(FullPath("/proc"), FullPath("/"));
 }
 
-TEST_F(FullPathOf, ASingleFileMountedByItselfIsThatOfItsFolder) {
+TEST_F(FullPathOf, AFileMountedByItselfIsItsFolder) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const std::string file = mFolder.MakeFile("file");
   const ScopedMount mount(mFolder.MakeFile("other"), file, nullptr, MS_BIND);
@@ -147,7 +147,7 @@ TEST_F(NewItems, InDecomposedFormAreLedToThePrecomposedName) {
   EXPECT_TRUE(Leads(RecordOf(mFolder.Path() / "e\xCC\x81"), mFolder.Path() / "\xC3\xA9"));
 }
 
-TEST_F(NewItems, BelowWhatIsNoFolderHaveRecordsThatLeadNowhere) {
+TEST_F(NewItems, InNoFolderHaveRecordsThatLeadNowhere) {
   mFolder.MakeFile("file");
   mFolder.MakeLink("dangling", "nowhere");
   mFolder.MakeLink("link", mFolder.MakeFolder("folder"));
@@ -158,7 +158,7 @@ TEST_F(NewItems, BelowWhatIsNoFolderHaveRecordsThatLeadNowhere) {
   }
 }
 
-TEST_F(NewItems, CalledByDotsAreOtherFolders) {
+TEST_F(NewItems, NamedByDotsAreOtherFolders) {
   const std::string here = mFolder.Path();
   for (const char* const name : {".", ".."}) {
     EXPECT_TRUE(mService.Answers(AddNameRequest(here, name, 0), PathResponse(here + "/" + name)));
@@ -166,7 +166,7 @@ TEST_F(NewItems, CalledByDotsAreOtherFolders) {
   }
 }
 
-TEST_F(NewItems, WithoutANameAreTheFolder) {
+TEST_F(NewItems, WithoutANameAreTheirFolder) {
   EXPECT_TRUE(mService.Answers(AddNameRequest(mFolder.Path().string(), "", 0),
                                PathResponse(mFolder.Path().string())));
   EXPECT_TRUE(Leads(RecordInFolder(""), mFolder.Path()));
@@ -184,7 +184,7 @@ TEST_F(NewItems, BehindALinkTakeASlashAsItStands) {
   EXPECT_TRUE(mService.Answers(AddNameRequest(link, "a/b", 0), PathResponse(link + "/a/b")));
 }
 
-TEST_F(NewItems, CalledByATildeInNoFolderAreHomeFolders) {
+TEST_F(NewItems, NamedByATildeInNoFolderAreHomeFolders) {
   std::string home = mService.Ask(AddNameRequest("", "~", 0), 3);
   ASSERT_EQ(home.size(), 3u);
   home += mService.Read(static_cast<unsigned char>(home[1]) + 4u);
@@ -199,11 +199,11 @@ TEST_F(NewItems, WithANulHaveNoPath) {
   EXPECT_TRUE(mService.Answers(PathOfRecordRequest(record, 0, 0), kNoItemResponse));
 }
 
-TEST_F(NewItems, BehindAnEmptyPathAreTheirNameAsAPath) {
+TEST_F(NewItems, InAnEmptyPathAreTheirNameAsAPath) {
   EXPECT_TRUE(mService.Answers(AddNameRequest("", "/abs", 0), PathResponse("/abs")));
 }
 
-TEST(AnEmptyFirstStringOfCode2, GetsNoColonBehindTheFolder) {
+TEST(AnEmptyFirstStringOfCode2, GetsNoColonAfterTheFolder) {
   const TemporaryFolder folder;
   const std::string item = folder.MakeFile("folder and name");
   Service service(std::vector<std::string>{"env", "-C", folder.Path().string()});

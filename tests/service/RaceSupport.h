@@ -1,4 +1,4 @@
-// What the tests of races ask of a service, and what may be answered while things change.
+// Requests, answers and the checks of answers that the race tests share.
 #pragma once
 
 #include <fcntl.h>
@@ -39,7 +39,7 @@ inline std::string ReadCounted(ChildProgram& service, std::string head) {
   return head + service.Read(count + kTrailer.size());
 }
 
-// The whole response to a request.
+// Sends the request and reads the whole response.
 inline std::string Answer(ChildProgram& service, unsigned code, const std::string& request) {
   service.Write(request);
   switch (code) {
@@ -54,24 +54,24 @@ inline std::string Answer(ChildProgram& service, unsigned code, const std::strin
   }
 }
 
-// A service that is not stopped, for what is true while nothing changes.
+// A service that runs freely: it gives the reference answers while nothing changes.
 class Bystander : public ChildProgram {
  public:
   Bystander() : ChildProgram(ServiceToTest(), {std::to_string(getpid())}) {}
 };
 
-// The path in a response to code 2, 6, 8 or 9; empty when there is none.
+// Returns the path in a response to code 2, 6, 8 or 9, or an empty string when it has none.
 inline std::string PathIn(unsigned code, const std::string& response) {
   const std::size_t head = code == 2 ? 4 : 3;
   return response.size() > head + kTrailer.size() ? response.c_str() + head : "";
 }
 
-// The HFS path in a response to code 1.
+// Returns the HFS path in a response to code 1.
 inline std::string FullPathIn(const std::string& response) {
   return response.c_str() + 2;
 }
 
-// What a service knows of the item at a path, which may be a new one.
+// Returns what the service says about the item at the path. The item may be a new one.
 inline Item ItemAt(ChildProgram& service, const std::filesystem::path& path) {
   Item item{};
   item.path = path;
@@ -102,10 +102,11 @@ inline const char* NameOf(Knowledge knowledge) {
   }
 }
 
-// What may be answered: known from services that see the tree only before or only after.
+// The acceptable answers to one request: collected from services that see the tree only before or
+// only after a change.
 class Truth {
  public:
-  // Of a request about the item at a path.
+  // `asked` is the path of the item in the request.
   Truth(std::filesystem::path asked, unsigned code) : mCode(code), mAsked(std::move(asked)) {}
 
   void Note(const std::string& response) {
@@ -117,7 +118,7 @@ class Truth {
 
   testing::AssertionResult Admits(const std::string& response, ChildProgram& after) const {
     if (response.size() < kTrailer.size() || !response.ends_with(kTrailer)) {
-      return testing::AssertionFailure() << "not a whole response";
+      return testing::AssertionFailure() << "incomplete response";
     }
     if (mAnswers.contains(response)) return testing::AssertionSuccess();
     const auto item = ItemAnswered(response, after);
@@ -125,21 +126,22 @@ class Truth {
     return testing::AssertionFailure() << "leads to another item";
   }
 
-  // The item that the answer leads to, for a service that is asked afterwards.
+  // Returns the item that the answer leads to. Resolves it with `after`, a service asked
+  // afterwards.
   std::optional<Identity> ItemAnswered(const std::string& response, ChildProgram& after) const {
     return IdentityOf(PathAnswered(response, after));
   }
 
  private:
-  // Code 1 tells of the folder.
+  // Code 1 answers with the path of the item's folder.
   std::string ItemAsked() const { return mCode == 1 ? mAsked.parent_path() : mAsked; }
 
-  // Where the answer leads, for a service that is asked afterwards; empty when nowhere.
+  // Returns the path that the answer leads to, or an empty string. `after` is asked afterwards.
   std::string PathAnswered(const std::string& response, ChildProgram& after) const {
     switch (mCode) {
       case 1: {
         const std::string path = FullPathIn(response);
-        // A volume alone stands for a folder that cannot be told.
+        // The volume's name alone means that the folder could not be named.
         if (path.find(':') == path.size() - 1) return {};
         return PathIn(2, Answer(after, 2, PathOfHFSPathRequest(path + '\0', "", 0)));
       }

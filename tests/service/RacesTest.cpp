@@ -1,6 +1,6 @@
-// What is asked about changes in mid-question: at each system call that an answer takes, in turn.
-// The answer is then the one from before or the one from after, or says that there is none, or
-// leads nowhere; it never leads to another item. A change to something else changes no answer.
+// The file system changes mid-request, in front of each system call of the answer in turn. The
+// answer must be the one from before, the one from after, "no item", or a path that leads nowhere.
+// It never leads to another item. A change to something else changes no answer.
 #include <gtest/gtest.h>
 #include <sys/mount.h>
 
@@ -37,8 +37,8 @@ const char* NameOf(Race race) {
   }
 }
 
-// "top/folder/inner/item" is asked about. At each place to which the change could lead astray there
-// is another item of the same name.
+// Requests ask about "top/folder/inner/item". Wherever a change could mislead the service, there is
+// another item of the same name.
 class Tree {
  public:
   Tree(ChildProgram& before, std::string name) : mName(std::move(name)) {
@@ -127,20 +127,20 @@ INSTANTIATE_TEST_SUITE_P(AtEachCall, Races,
                                           testing::Values(kName, kLongName)),
                          NameOfCase);
 
-// --- Names with a way -------------------------------------------------------------------------
+// --- HFS paths through folders ----------------------------------------------------------------
 
-// What a name leads to by way of another folder than the one that was asked: "first" is exchanged
-// with "second" in mid-question.
+// A name that leads through other folders than the one asked about. "first" and "second" are
+// exchanged mid-request.
 struct Way {
   const char* text;      // for the test's name
-  const char* asked;     // the folder whose number is in the question
-  const char* name;      // and the name, as an HFS path
+  const char* asked;     // the folder whose id is in the request
+  const char* name;      // an HFS path relative to it
   const char* expected;  // empty when there is no such item
 };
 
 class RacesOnAWay : public InSmallRoot, public testing::WithParamInterface<Way> {};
 
-TEST_P(RacesOnAWay, LeadIntoNoFolderThatWasNeverOnIt) {
+TEST_P(RacesOnAWay, LeadOnlyIntoFoldersThatWereOnIt) {
   const Way& way = GetParam();
   bool isChanged = true;
   int call = 0;
@@ -179,8 +179,8 @@ INSTANTIATE_TEST_SUITE_P(
                     Way{"ThroughTheFolderAbove", "first/inner", "::other:item.aif", ""}),
     NameOfWay);
 
-// A folder takes a file's place in mid-question.
-TEST_F(InSmallRoot, TheNumberOfAFileIsNoFoldersInItsPlace) {
+// A folder takes a file's place mid-request.
+TEST_F(InSmallRoot, TheIdOfAFileIsNotTakenForTheFolderInItsPlace) {
   bool isChanged = true;
   for (int call = 0; isChanged; ++call) {
     const TemporaryFolder top;
@@ -205,24 +205,24 @@ TEST_F(InSmallRoot, TheNumberOfAFileIsNoFoldersInItsPlace) {
 
 struct Names {
   const char* item;
-  const char* asked;  // the same, or that of a new item
+  const char* asked;  // the same name, or that of a new item
 };
 
 class RacesBesideTheItem
     : public InSmallRoot,
       public testing::WithParamInterface<std::tuple<unsigned, Knowledge, Names>> {};
 
-// A pass over the volume, for a folder that is not there.
+// Makes the service read the whole volume, by an id that no folder has.
 void PassOver(ChildProgram& service, Item item) {
   constexpr std::int32_t kNoSuchFolder = 0x7FFFFFF;
   item.folderID = kNoSuchFolder;
   Answer(service, 8, RequestAbout(item, 8));
 }
 
-// The service knows an item where it was before a folder on its way moved and left a link: from
-// the item's own record, or from a pass since which it has not been asked about it. The link then
-// goes, in mid-question, and another name of the item could be told in place of its own.
-TEST_P(RacesBesideTheItem, ALinkToItsFolderGoesAndNoAnswerChanges) {
+// The service learned the item's place before one of its folders moved and left a link: from the
+// item's own record, or from a pass over the volume. The link goes away mid-request. The service
+// must not answer with the item's other name then.
+TEST_P(RacesBesideTheItem, ALinkToItsFolderVanishesAndNoAnswerChanges) {
   const auto [code, knowledge, names] = GetParam();
   bool isChanged = true;
   int call = 0;
@@ -253,13 +253,13 @@ TEST_P(RacesBesideTheItem, ALinkToItsFolderGoesAndNoAnswerChanges) {
     service.ChangeAt(call, [&] { fs::remove(folder); });
     EXPECT_EQ(Answer(service.Streams(), code, request), expected) << "changed at call " << call;
     isChanged = service.HasChanged();
-    EXPECT_EQ(Answer(bystander, code, request), expected) << "asked of another one afterwards";
+    EXPECT_EQ(Answer(bystander, code, request), expected) << "asked of another service afterwards";
   }
   EXPECT_GT(call, 1);
 }
 
-// The volume is where the table of mounts has never been said to show it.
-TEST_P(RacesBesideTheItem, ALinkToItsVolumeGoesAndNoAnswerChanges) {
+// The service knows the volume by a place at which the mount table never showed it.
+TEST_P(RacesBesideTheItem, ALinkToItsVolumeVanishesAndNoAnswerChanges) {
   const auto [code, knowledge, names] = GetParam();
   bool isChanged = true;
   int call = 0;
@@ -291,7 +291,7 @@ TEST_P(RacesBesideTheItem, ALinkToItsVolumeGoesAndNoAnswerChanges) {
     EXPECT_EQ(Answer(service.Streams(), code, request), expected) << "changed at call " << call;
     isChanged = service.HasChanged();
     fs::remove(folder);
-    fs::rename(moved, folder);  // for the unmounting
+    fs::rename(moved, folder);  // so that the volume can be unmounted
   }
   EXPECT_GT(call, 1);
 }

@@ -1,4 +1,4 @@
-// A hundred thousand requests with valid framing and any content, to one service.
+// Sends one service a hundred thousand requests with valid framing and random content.
 #include <gtest/gtest.h>
 
 #include <cstring>
@@ -16,7 +16,7 @@ namespace {
 constexpr int kRequests = 100'000;
 
 #if defined(__SANITIZE_ADDRESS__)
-constexpr bool kMemoryIsTheServicesOwn = false;  // freed memory is kept for a while
+constexpr bool kMemoryIsTheServicesOwn = false;  // the sanitizer holds on to freed memory
 #else
 constexpr bool kMemoryIsTheServicesOwn = true;
 #endif
@@ -48,7 +48,7 @@ class RandomRequests : public testing::Test {
     for (char& byte : bytes) byte = static_cast<char>(mRandom());
     return bytes;
   }
-  // Mostly short, now and then as long as can be.
+  // Mostly short, rarely the longest.
   std::size_t AnySize(std::size_t longest) {
     if (OneIn(1000)) return longest;
     return std::min<std::size_t>(longest, OneIn(50) ? Below(5000) : Below(40));
@@ -86,7 +86,7 @@ class RandomRequests : public testing::Test {
     const std::vector<std::int16_t> volumes{mVolume, mVolume, 0, 32767, -1, 1};
     return OneIn(10) ? static_cast<std::int16_t>(mRandom()) : AnyOf(volumes);
   }
-  // An id that no item has can cost a look at every folder of a volume.
+  // An id that no item has can make the service read every folder of a volume.
   std::int32_t AnyFolder() {
     const std::vector<std::int32_t> folders{mParent, mParent, 2, 1, 0, -1, 3};
     return OneIn(5000) ? static_cast<std::int32_t>(mRandom()) : AnyOf(folders);
@@ -96,7 +96,7 @@ class RandomRequests : public testing::Test {
   std::string AnyRequest() {
     switch (1 + Below(10)) {
       case 1: {
-        // A size that is too small is never answered.
+        // Sizes too small for the volume's name get no answer.
         mSize = AnyOf<unsigned>({0, 1023, 1024});
         return U16(1) + Counted(AnyPath()) + U16(mSize) + AnyFlag();
       }
@@ -123,7 +123,7 @@ class RandomRequests : public testing::Test {
     }
   }
 
-  // Reads one response; false when it is not as its code demands.
+  // Reads one response. Returns whether it has the form that its code demands.
   bool TakeResponse(char code) {
     bool isRight = true;
     switch (code) {
@@ -161,7 +161,7 @@ class RandomRequests : public testing::Test {
     const std::string flag = mService.Read(1);
     return flag == Flag(0) || flag == Flag(1);
   }
-  // A counted string with one NUL, at its end.
+  // Reads a counted string. Returns whether it has exactly one NUL, at its end.
   bool TakeText(bool isAlwaysThere) {
     std::uint16_t count = 0;
     const std::string field = mService.Read(2);
@@ -190,7 +190,7 @@ class RandomRequests : public testing::Test {
   std::mt19937_64 mRandom{20'240'229};
   std::int16_t mVolume = 0;
   std::int32_t mParent = 0;
-  unsigned mSize = 0;  // that the last request of code 1 asked for
+  unsigned mSize = 0;  // asked for by the last request of code 1
 };
 
 TEST_F(RandomRequests, AreAnsweredInFullAndLeaveDescriptorsAndMemoryAsTheyWere) {

@@ -1,4 +1,4 @@
-// What services answer that are started in unusual surroundings.
+// Checks the answers of services that run in unusual environments.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -20,31 +20,31 @@ constexpr bool kIsSanitized = true;
 constexpr bool kIsSanitized = false;
 #endif
 
-// An id that two items could have, and none has: all folders of its volume are read.
+// An id in the range that items can share. No item has it, so the service reads every folder.
 constexpr auto kSharedID = static_cast<std::int32_t>(0x80001234);
 
-// The command that starts a program in a shell, once a line of the shell has succeeded there.
+// Returns a command that runs `line` in a shell, then, if it succeeded, the program appended to it.
 inline std::vector<std::string> After(const std::string& line,
                                       std::vector<std::string> command = {}) {
   command.insert(command.end(), {"sh", "-c", "{ " + line + "; } && exec \"$@\"", "sh"});
   return command;
 }
 
-// Whether a program can be started by a command.
+// Returns whether the command may start a program here.
 inline bool IsPermitted(std::vector<std::string> command) {
-  // The service itself, which without its argument ends at once with status 1.
+  // Without an argument the service exits at once with status 1.
   command.insert(command.end(), {"sh", "-c", "\"$0\"; test $? = 1", TALLOWMERE_SERVICE});
   return RunTool(command);
 }
 
-// Every request about the item at a path has its right answer. The item is a file whose name is its
-// HFS name too, as are those of the folders on the way.
+// Checks every request about the file at `path`. REQUIRES: its name and those of its folders are
+// also their HFS names.
 inline void ExpectRightAnswers(Service& service, const std::string& path) {
   const Item item = LearnItem(service, path);
   ASSERT_EQ(item.record, Record(item.volume, item.folderID, item.name));
   EXPECT_NE(item.folderID, 0);
 
-  // Behind the volume's name the full path has the names behind its place, wherever that is.
+  // The full path continues the volume's name with the folders below the volume's mount point.
   std::string way = item.folder + "/";
   std::replace(way.begin(), way.end(), '/', ':');
   EXPECT_TRUE(item.fullPath.starts_with(item.volumeName + ":")) << item.fullPath;

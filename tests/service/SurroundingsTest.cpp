@@ -1,4 +1,4 @@
-// The root folder, the clock and the language in which a service is started.
+// The root folder, the clock and the language of the service's environment change no answer.
 #include <gtest/gtest.h>
 #include <unistd.h>
 
@@ -20,12 +20,12 @@ using std::filesystem::path;
 
 // --- A root folder of its own -------------------------------------------------------------------
 
-// A service alone in a user, mount and process namespace, with a small tree in memory for its root
-// folder: itself, the libraries that it needs, "/Home/folder/a track.aif" and the same on a volume
+// Starts a service in a user, mount and process namespace of its own. Its root folder is a tmpfs
+// with the service, its libraries, "/Home/folder/a track.aif", and the same folder on a volume
 // mounted at "/Media/Disk".
 class Container : public testing::Test {
  protected:
-  // `proc` is a line of the shell that mounts "proc", or does not. Null where it is not permitted.
+  // `proc` is a shell command that mounts "proc" or does not. Returns null where not permitted.
   std::unique_ptr<Service> Start(const std::string& proc) const {
     const std::string furnish = "set -e; cd '" + mFolder.Path().string() +
                                 "'; mount -t tmpfs none .; cd \"$PWD\"; "
@@ -80,7 +80,7 @@ TEST_F(Container, DoesNotOutliveItsPipesAsTheFirstProcess) {
   closed->CloseInput();
   EXPECT_EQ(closed->ReadToEnd(), "");
   EXPECT_EQ(closed->Wait(), 0);
-  // The kernel spares the first process the signal: its write fails.
+  // The kernel spares a namespace's first process the SIGPIPE, so its write fails instead.
   const auto unread = Start(kMountProc);
   ASSERT_TRUE(unread->Answers(kAnyRequest, kItsResponse));
   unread->CloseOutput();
@@ -112,7 +112,7 @@ TEST_P(ClockSetTo, ChangesNoAnswer) {
   ExpectRightAnswers(service, folder.MakeFile("folder/a track.aif"));
 }
 
-// A pass notes which folders it has read and when; they are read again when they have changed.
+// A pass records which folders it has read and when. Folders that have changed are read again.
 TEST_P(ClockSetTo, DoesNotHideWhatHasChangedSinceAPass) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const TemporaryFolder folder;
@@ -142,10 +142,10 @@ INSTANTIATE_TEST_SUITE_P(Surroundings, ClockSetTo,
                                          Clock{"GoingBackwards", "1800000000", "-3600"}),
                          [](const auto& clock) { return clock.param.name; });
 
-// Times that a file system has from another machine, whose clock was set to anything.
+// A disk's times from another machine, whose clock was set to anything.
 class TimesOnDisk : public testing::TestWithParam<const char*> {
  protected:
-  // Sets every time of the folders and of the item, that of birth included.
+  // Sets every time of the folders and the item, including the birth time.
   bool SetTimes(const std::string& time) {
     std::string commands;
     for (const char* const item : {"/", "/folder", "/folder/a track.aif"}) {
@@ -176,7 +176,7 @@ TEST_P(TimesOnDisk, ChangeNoAnswer) {
   Service service;
   ExpectRightAnswers(service, folder / "a track.aif");
   const Item item = LearnItem(service, folder / "a track.aif");
-  // Found by a pass, and again where it has gone since.
+  // Found by a pass, and found again after its folder is renamed.
   const std::vector<std::string> nobody{"setpriv", "--reuid=65534", "--clear-groups"};
   Service another(IsPermitted(nobody) ? nobody : std::vector<std::string>{"env"});
   EXPECT_TRUE(another.Answers(RequestAbout(item, 9), PathResponse(item.path)));
@@ -191,9 +191,9 @@ INSTANTIATE_TEST_SUITE_P(Surroundings, TimesOnDisk,
 
 // --- Languages and time zones -------------------------------------------------------------------
 
-constexpr const char* kTurkish = "tr_TR.UTF-8";  // in which "I" is not the capital of "i"
+constexpr const char* kTurkish = "tr_TR.UTF-8";  // where "I" is not the capital of "i"
 
-// Names of every kind: ASCII, both forms of accents, Turkish, Japanese, no UTF-8, too long.
+// Names of every kind: ASCII, both forms of accents, Turkish, Japanese, not UTF-8, too long.
 class Language : public testing::Test {
  protected:
   Language() {
@@ -206,8 +206,8 @@ class Language : public testing::Test {
     }
   }
 
-  // Of a service with nothing but these words in its environment: the answers to every request
-  // about every item, up to the end.
+  // Returns a service's answers to every request about every item, with nothing else in its
+  // environment than these variables.
   std::string Answers(const std::vector<std::string>& environment) const {
     std::vector<std::string> command{"env", "-i"};
     command.insert(command.end(), environment.begin(), environment.end());
@@ -234,7 +234,7 @@ class Language : public testing::Test {
 TEST_F(Language, ChangesNoByteOfAnAnswer) {
   const std::string plain = Answers({});
   EXPECT_GT(plain.size(), mItems.size() * 12 * kTrailer.size());
-  // Where it cannot be made it is one more that is not there.
+  // A locale that cannot be made here counts as one more missing locale.
   RunTool({"localedef", "-i", "tr_TR", "-f", "UTF-8", (mFolder.Path() / kTurkish).string()});
   const std::string places = "LOCPATH=" + mFolder.Path().string();
   for (const std::string language :
@@ -246,7 +246,7 @@ TEST_F(Language, ChangesNoByteOfAnAnswer) {
   }
 }
 
-TEST_F(Language, NoMoreThanTheTimeZone) {
+TEST_F(Language, IsNoDifferentInAnotherTimeZone) {
   const std::string plain = Answers({});
   for (const char* const zone :
        {"TZ=", "TZ=UTC", "TZ=Asia/Kathmandu", "TZ=<-12>+12", "TZ=:nowhere"}) {

@@ -1,4 +1,4 @@
-// How many system calls each request takes, once an earlier one has been about the same item.
+// How many system calls each request takes after an earlier request about the same item.
 #include <gtest/gtest.h>
 
 #include <array>
@@ -19,16 +19,16 @@ namespace {
 struct Calls {
   unsigned code;
   int reads;        // one for each part of a field
-  int writes;       // the same, and one for the trailer
-  int mostOfFiles;  // all others but kill: on a new item, which takes a handle to be told
+  int writes;       // one for each part of a field and one for the trailer
+  int mostOfFiles;  // all others but kill, for a new item, which takes an extra handle
 };
 
 std::ostream& operator<<(std::ostream& out, const Calls& calls) {
   return out << "code " << calls.code;
 }
 
-// In a root folder on a volume of its own where that is permitted: of a file system that is mounted
-// at several places each answer takes more.
+// Runs in a root folder on a volume of its own where permitted: on a file system that is mounted at
+// several places, each answer takes more calls.
 class SystemCalls : public testing::TestWithParam<Calls> {
  protected:
   void SetUp() override {
@@ -42,10 +42,10 @@ class SystemCalls : public testing::TestWithParam<Calls> {
   std::optional<TwoVolumeRoot> mRoot;
 };
 
-TEST_P(SystemCalls, AreNoMoreThanThese) {
+TEST_P(SystemCalls, AreAtMostThese) {
   const auto [code, reads, writes, mostOfFiles] = GetParam();
   const EveryRequest requests;
-  if (!requests.IsMade()) GTEST_SKIP() << "the folder for temporary files is too deep";
+  if (!requests.IsMade()) GTEST_SKIP() << "the path of the temporary folder is too long";
   const std::string request = requests.Of(code);
   const auto run = RunTraced("%file,%desc,kill", requests.Of(7) + request + request + kQuit);
   if (!run) GTEST_SKIP() << "strace cannot trace here";
@@ -55,7 +55,7 @@ TEST_P(SystemCalls, AreNoMoreThanThese) {
   int written = 0;
   int ofFiles = 0;
   for (const std::string& call : CallsOfLastRequest(*run)) {
-    if (IsCall(call, "mmap")) continue;  // of memory
+    if (IsCall(call, "mmap")) continue;  // memory only
     ++(IsCall(call, "read") ? read : IsCall(call, "write") ? written : ofFiles);
   }
   EXPECT_EQ(read, reads);

@@ -1,6 +1,6 @@
-// What is asked about changes twice in mid-question, at two of the system calls that an answer
-// takes. The answer is one that is true before, between or after the changes, or says that there is
-// none, or leads nowhere; it never puts together what was never there at one time.
+// The file system changes twice mid-request, in front of two system calls of the answer. The answer
+// must be true before, between or after the changes, or be "no item", or lead nowhere. It never
+// combines what was never there at the same time.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <linux/loop.h>
@@ -31,7 +31,7 @@ namespace fs = std::filesystem;
 
 // --- The volume -------------------------------------------------------------------------------
 
-// A disk that can be mounted in the small root folder, where there are no programs.
+// A disk that can be mounted in the small root folder, which has no programs.
 class Disk {
  public:
   // REQUIRES: this process still has the machine's root folder.
@@ -94,9 +94,9 @@ constexpr std::array<std::pair<Changes, const char*>, 8> kNames{{
     {Changes::kBindMovesAndAnotherTakesItsPlace, "ABindMovesAndAnotherTakesItsPlace"},
 }};
 
-// "here" and "there" are places for a volume with the folders "first" and "second" and with "link",
-// which leads to "first". What it covers there, and what a bind shows, has an item of the same name
-// at each place as well.
+// A volume with the folders "first" and "second" and a link to "first", mounted at "here" or at
+// "there". The folders that it covers, and those that a bind mount shows, hold items of the same
+// name.
 class MovingVolume {
  public:
   MovingVolume(Changes changes, const Disk* disk) : mChanges(changes), mDisk(disk) {
@@ -105,7 +105,7 @@ class MovingVolume {
     }
     EXPECT_EQ(MountAt(Here()), 0);
     for (const auto& left : fs::directory_iterator(Here())) fs::remove_all(left);
-    // The first numbers are not their ids.
+    // Uses up the small inode numbers, which are not the items' ids.
     for (int i = 0; i < 20; ++i) std::ofstream(Here() / std::to_string(i));
     for (const char* const name : {"first", "second"}) MakeItem(Here() / name);
     fs::create_symlink("first", Here() / "link");
@@ -160,7 +160,7 @@ class MovingVolume {
         return Bind("first", Here());
     }
   }
-  // Back to where it was, after this many changes.
+  // Restores the tree after so many changes.
   void Undo(int made) const {
     if (made == 2) UndoSecond();
     if (made > 0) UndoFirst();
@@ -221,7 +221,7 @@ class MovingVolume {
 
 // --- Races ------------------------------------------------------------------------------------
 
-// The calls between the first change and the second. A first question takes many more calls.
+// The numbers of calls between the two changes. A first request takes many more calls.
 const std::vector<int>& CallsBetween(Knowledge knowledge) {
   static const std::vector<int> few{2};
   static const std::vector<int> more{0, 1, 4};
@@ -241,8 +241,8 @@ class RacesOfTwoChanges
     InSmallRoot::SetUp();
   }
 
-  // Returns how many changes the question had time for. The bystander has seen the volume wherever
-  // it was, but is only asked while nothing changes.
+  // Returns how many changes happened during the request. The bystander has seen the volume at each
+  // of its places, but is only asked while nothing changes.
   int Race(const MovingVolume& volume, Bystander& bystander, int call, int between) const {
     const auto [changes, code, knowledge] = GetParam();
     const Item item = ItemAt(bystander, volume.Path());

@@ -1,3 +1,4 @@
+// Codes 3 and 4: the number of a volume and the name of a volume.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/mount.h>
@@ -30,7 +31,7 @@ TEST(VolumeCommands, NameLengthAbove256EndsTheServiceWithoutAResponse) {
   }
 }
 
-TEST(VolumeCommands, NothingIsReadBehindANameLengthAbove256) {
+TEST(VolumeCommands, NothingIsReadAfterANameLengthAbove256) {
   Service service;
   service.Write(U16(3) + Counted(std::string(257, 'x')));
   EXPECT_EQ(service.Wait(), 0);
@@ -123,7 +124,7 @@ TEST_F(WithMounts, AVolumeKeepsItsNumberWhileOthersComeAndGo) {
   EXPECT_EQ(another.NumberOf("Staying"), number);
 }
 
-TEST_F(WithMounts, OfTwoVolumesWithOneNameTheFirstAnswers) {
+TEST_F(WithMounts, TwoVolumesWithOneNameAreAnsweredByTheFirst) {
   Service service;
   ScopedMount first("none", Folder("a/Twin"), "tmpfs");
   ASSERT_TRUE(first.IsMounted());

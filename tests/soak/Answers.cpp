@@ -13,7 +13,7 @@ namespace {
 
 using namespace tallowmere::test;
 
-// The name in the record of a new item.
+// Returns the name in a new item's record.
 std::string NameOfNew(NameIndex name) {
   return std::string(NameAt(name).hfsName).substr(0, kLongestRecordName);
 }
@@ -65,7 +65,7 @@ class Evaluation : private Walk {
     std::string hfsPath;
   };
 
-  // A folder is at more than one place only when it was moved.
+  // A folder is in more than one place only when it was moved.
   std::vector<FolderPlace> PlacesOf(Node folder) {
     if (folder == kMainRoot) return {{mPlace.path, mPlace.name + ":"}};
     std::vector<FolderPlace> places;
@@ -97,7 +97,8 @@ class Evaluation : private Walk {
     return paths;
   }
 
-  // The names by which an item may be reported: in one state, the one by which it was reached.
+  // Returns the names that an answer may use for an item. In one state, that is the name by which
+  // it was reached.
   std::vector<const Entry*> EntriesOf(const Item& item) const {
     if (mGraph.IsOfOneState() || item.isRoot) return {item.entry};
     std::vector<const Entry*> entries;
@@ -109,7 +110,7 @@ class Evaluation : private Walk {
 
   // --- Answers that lead nowhere
 
-  // Names that an item may have had, whatever its final name.
+  // Returns names that an item may have been given, whatever its current name is.
   std::set<std::string> NamesGiven(const std::vector<Item>& items) const {
     std::set<std::string> names;
     for (const Item& item : items) {
@@ -141,7 +142,7 @@ class Evaluation : private Walk {
     }
   }
 
-  // Records with the items' names in those of the folders that have no such item.
+  // Notes records with the items' names in folders that have no such item.
   void NoteRecordsOfNothing(const Outcome& outcome, std::vector<Node> folders) {
     if (mGraph.IsOfOneState()) return;
     for (const Item& item : outcome.items) {
@@ -149,7 +150,7 @@ class Evaluation : private Walk {
     }
     const auto names = NamesGiven(outcome.items);
     NoteRecordsByMadeUpID(names);
-    // An item that was missing at the first look-up is a new one with the requested name.
+    // An item that was missing at first is reported as a new one with the requested name.
     if (outcome.canMiss) NoteRecordsByMadeUpID({NameOfNew(mRequest.path.Last())});
     for (const std::string& name : names) {
       for (const Node folder : folders) {
@@ -168,7 +169,7 @@ class Evaluation : private Walk {
                               : mRequest.hfsName == NameAt(name).hfsName;
   }
 
-  // The paths of new items in the folder, with the names of items that are or were there.
+  // Notes paths of new items in the folder, with names of items that are or were in it.
   void NotePathsOfNothing(Node folder, const Outcome& outcome) {
     if (mGraph.IsOfOneState()) return;
     auto names = NamesGiven(outcome.items);
@@ -185,7 +186,7 @@ class Evaluation : private Walk {
             return entry.folder == folder && newName == NameAt(entry.name).linuxName;
           });
       const std::string asAsked = TextOf(mRequest.path, mPlace) + "/" + newName;
-      // The item itself, by the given path: at one step the folder could not be identified.
+      // The item itself, by the requested path: at one step the folder could not be identified.
       if (isThere && mRequest.code == 6 && name == mRequest.hfsName) {
         mTruth.responses.insert(PathResponse(asAsked));
       }
@@ -212,7 +213,7 @@ class Evaluation : private Walk {
     return U16(static_cast<unsigned>(path.size())) + text.append(kTrailer);
   }
 
-  // Without the outermost folder, each path of this tree fits.
+  // Omitting the outermost folder makes every path of this tree fit.
   std::string Shortened(const std::string& path) const {
     const std::size_t volumeEnd = path.find(':');
     if (!mRequest.flag) return path.substr(0, volumeEnd);
@@ -223,7 +224,7 @@ class Evaluation : private Walk {
 
   // --- Errors
 
-  // The path leads onto the other volume, which was mounted or unmounted.
+  // Returns whether the path leads onto the other volume, which was mounted or unmounted meanwhile.
   bool CanLoseVolume() const { return mMeetsOther && mGraph.Others().size() > 1; }
 
   std::set<std::string> HonestErrors() const {
@@ -231,15 +232,15 @@ class Evaluation : private Walk {
     std::set<std::string> errors;
     switch (mRequest.code) {
       case 1:
-        // A colon stands for no volume and no folder: the item went before its volume was looked
-        // up.
+        // A lone colon means no volume and no folder: the item vanished before its volume was
+        // looked up.
         errors = {FullPathResponse(":"), FullPathResponse(mPlace.name + ":")};
         if (mMeetsOther)
           errors.insert(FullPathResponse(std::string(NameAt(kVolumePlace).hfsName) + ":"));
         return errors;
       case 2:
-        // The result is that of the look-up. When the item went before its path was looked up,
-        // there is no result, and nothing is reported instead.
+        // The result of the look-up. When the item vanished before its path was looked up, result 0
+        // comes without a path.
         return {ResultResponse(0), ResultResponse(kResultNoItem), ResultResponse(kResultNoFolder),
                 ResultResponse(kResultNoVolume), ResultResponse(kResultImpossibleName)};
       case 5:
@@ -327,8 +328,8 @@ class Evaluation : private Walk {
     }
   }
 
-  // The climb from a folder ends at one that is being moved, and what is above that is left out. A
-  // volume that is unmounted before its name is looked up has none.
+  // Notes shorter paths: the climb from a folder ends at one that is being moved, which omits the
+  // folders above it; a volume that is unmounted before its name is looked up has no name.
   void NoteCutPaths(const std::string& hfsPath) {
     if (mGraph.IsOfOneState()) return;
     const std::size_t volumeEnd = hfsPath.find(':') + 1;

@@ -1,4 +1,4 @@
-// The right answers while the tree is in a given state.
+// The correct answers to a request while the tree is in given states.
 #pragma once
 
 #include <set>
@@ -11,16 +11,16 @@ namespace tallowmere::soak {
 
 struct Truth {
   std::set<std::string> responses;
-  // For several states, where the judge must check that they lead nowhere:
-  std::set<std::string> nowhere;       // those that lead to no item
-  std::set<std::string> byMadeUpID;    // records with a made-up id, which is 0 here
-  std::set<std::string> honestErrors;  // that there is no item, or that it cannot be determined
-  std::string trace;                   // differs when any item that was visited differs
+  // Only for several states; the judge must check that these lead nowhere:
+  std::set<std::string> nowhere;       // answers that lead to no item
+  std::set<std::string> byMadeUpID;    // records with a made-up id, given here as 0
+  std::set<std::string> honestErrors;  // errors: no such item, or undetermined
+  std::string trace;                   // differs whenever a visited item differs
 };
 
-// The right answers while the tree is in this state; for one state, one response. For several
-// states, all responses each of whose steps was true in one of them, though perhaps not in the same
-// one: the item was moved during the request.
+// Returns the correct answers. For one state, that is one response. For several states, it is every
+// response each of whose steps was true in some state, not necessarily the same one: the item may
+// have moved mid-request.
 Truth Answers(const Graph& graph, const Place& place, const Request& request);
 
 }  // namespace tallowmere::soak

@@ -16,7 +16,7 @@
 namespace tallowmere::soak {
 namespace {
 
-// Node ids below this are made up by the service; the tree has none of them.
+// The service makes up ids for items with smaller inode numbers; the tree uses none of them.
 constexpr int kFirstInodes = 20;
 
 constexpr std::size_t kMostFolders = 6;
@@ -32,7 +32,7 @@ std::uint64_t InodeOf(const std::string& path) {
   return about.st_ino;
 }
 
-// The volume's number: minus the id of the mount.
+// Returns the volume's number: the negated mount id.
 int NumberOf(const std::string& place) {
   struct statx about {};
   if (statx(AT_FDCWD, place.c_str(), 0, STATX_MNT_ID, &about) != 0) StopFor(place);
@@ -44,7 +44,7 @@ int MakeFileAt(const std::string& path) {
   return descriptor < 0 ? -1 : close(descriptor);
 }
 
-// Uses up the numbers that cannot be node ids.
+// Files that use up the inode numbers that cannot be node ids.
 std::string UsedUp(const std::string& folder, int number) {
   return folder + "/used up " + std::to_string(number);
 }
@@ -153,7 +153,7 @@ void Churner::Change(const State& next, const std::function<int()>& call) {
   mHistory.Reach();
 }
 
-// The inode number is known before the state counts as reached. REQUIRES: the new entry is the last
+// Records the inode number before the state counts as reached. REQUIRES: the new entry is the last
 // one.
 void Churner::Make(const State& next, const std::string& path, const std::function<int()>& call) {
   State& state = mHistory.Begin(next);
@@ -241,7 +241,7 @@ bool Churner::RemoveFile() {
   return RemoveAny(Kind::kFile);
 }
 
-// A rename between two names of the same item does nothing.
+// A rename between two names of the same item has no effect.
 bool Churner::MoveFile() {
   const State& now = Now();
   const Entry* const entry = AnyEntry([](const Entry& e) { return e.kind == Kind::kFile; });
@@ -288,7 +288,7 @@ bool Churner::LinkFile() {
   return true;
 }
 
-// A link's place gets its inode number only when it is made, like a file's.
+// Like a file, a link has no inode number before it exists.
 bool Churner::MakeInnerLink() {
   if (!HasRoom()) return false;
   const Entry* const into =
@@ -321,7 +321,7 @@ bool Churner::MoveFolder() {
   return true;
 }
 
-// Also exchanges a folder and a link, where the link stays after its target.
+// May also exchange a folder and a link, if the link's target still precedes it.
 bool Churner::ExchangeFolders() {
   if (!mCanExchange) return false;
   const Entry* const first = AnyEntry([](const Entry& e) { return IsOuter(e); });
@@ -347,7 +347,7 @@ bool Churner::ExchangeFolders() {
   return true;
 }
 
-// Moves the folder to an earlier slot and puts a link to it in its place.
+// Moves the folder to an earlier slot and leaves a link to it.
 bool Churner::ReplaceFolderByLink() {
   if (!HasRoom()) return false;
   const Entry* const found =

@@ -1,4 +1,4 @@
-// Changes the tree while the service is asked, and records its history.
+// Changes the tree while requests are served, and records its history.
 #pragma once
 
 #include <atomic>
@@ -70,7 +70,7 @@ class Churner {
   std::string mFolder;
   std::mt19937_64 mRandom;
   unsigned mPause;
-  bool mCanExchange = false;  // not every server can
+  bool mCanExchange = false;  // not every file system supports it
   Node mNextNode = kMainRoot + 1;
   History mHistory;
   std::vector<std::uint64_t> mCounts;

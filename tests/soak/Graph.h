@@ -1,4 +1,4 @@
-// What is true of the tree in one state, or in one of several, and what names lead to in it.
+// What the tree looks like in one or more states, and what names and paths lead to in it.
 #pragma once
 
 #include <cstdint>
@@ -16,7 +16,7 @@ namespace tallowmere::soak {
 inline constexpr std::uint32_t kRootID = 2;
 inline constexpr std::uint32_t kParentOfRoots = 1;
 
-// What is true of the tree in one state, or what was true in several.
+// The tree as it is in one state, or everything that was true in several.
 class Graph {
  public:
   explicit Graph(const std::vector<const State*>& states);
@@ -28,7 +28,7 @@ class Graph {
 
   std::vector<const Entry*> In(Node folder, NameIndex name) const;
 
-  // Whether the folder lacks the name in at least one of the states.
+  // Returns whether the folder lacks the name in at least one of the states.
   bool CanMiss(Node folder, NameIndex name) const;
 
  private:
@@ -47,10 +47,10 @@ struct Item {
   bool isRoot;  // of the other volume
 };
 
-// What a name or a path leads to: in one state, one item or none.
+// What a name or a path leads to. In one state, that is one item or none.
 struct Outcome {
   std::vector<Item> items;
-  bool canMiss = false;  // also when the folder is missing
+  bool canMiss = false;  // the item or its folder is missing in some state
 };
 
 // Looks up names and ids in a graph, and records what it visits.
@@ -62,16 +62,16 @@ class Walk {
   Outcome LookUp(Node folder, NameIndex name);
   Outcome LookUpHFS(Node folder, std::string_view hfsName);
 
-  // Does not follow a link as the last component. Returns nothing for no names.
+  // Does not follow a link in the last component. Returns nothing for an empty path.
   Outcome At(std::span<const NameIndex> names);
 
-  // The folders that an item is or leads to. Sets `always` to false when it may lead to none.
+  // Returns the folders that an item is or links to. Clears `always` when it may link to none.
   std::vector<Node> FoldersAt(const Outcome& outcome, bool& always);
 
-  // Whether a link can lead somewhere, and whether it can lead nowhere.
+  // Returns whether a link can lead somewhere, and whether it can lead nowhere.
   std::pair<bool, bool> Leads(const Entry& link);
 
-  // In one state an id that several folders share is nobody's.
+  // In one state, an id that several folders share belongs to none of them.
   std::vector<Node> FoldersWithID(const Volume& volume, std::uint32_t id);
   std::uint32_t IDOf(Node folder) const;
   std::vector<Volume> VolumesOf(Node folder) const;
@@ -83,7 +83,7 @@ class Walk {
 
   const Graph& mGraph;
   bool mMeetsOther = false;  // whether the root folder of the other volume was visited
-  std::string mTrace;        // of the visited items: differs when any of them differs
+  std::string mTrace;        // differs whenever a visited item differs
 
  private:
   Outcome TargetOf(const Entry& link);

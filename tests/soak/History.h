@@ -9,7 +9,8 @@
 
 namespace tallowmere::soak {
 
-// The states of the tree in order. One thread writes, others read; the latest kKept are kept.
+// The states of the tree in order. One thread writes, others read. The latest kKept states are
+// kept.
 class History {
  public:
   using Version = std::uint64_t;
@@ -17,17 +18,17 @@ class History {
 
   explicit History(const State& first);
 
-  // The latest state that has certainly been reached; later ones may have been too.
+  // Returns the latest state that has certainly been reached. Later ones may have been reached too.
   Version Reached() const { return mReached.load(std::memory_order_seq_cst); }
-  // The latest state that may have been reached.
+  // Returns the latest state that may have been reached.
   Version Begun() const { return mBegun.load(std::memory_order_seq_cst); }
-  // Valid until kKept more have begun.
+  // The reference is valid until kKept more states have begun.
   const State& At(Version version) const { return mStates[version % kKept]; }
-  // Whether a state, and so all later ones, have not begun to be overwritten.
+  // Returns whether this state and all later ones are still intact.
   bool Keeps(Version version) const { return Begun() + 1 - version < kKept; }
 
-  // For the writer: begins the next state. Facts that are not known before it is reached are filled
-  // in until then.
+  // For the writer: begins the next state. Facts that only become known with the change are filled
+  // in before Reach().
   State& Begin(const State& next);
   void Reach();
 

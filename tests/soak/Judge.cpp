@@ -17,7 +17,7 @@ namespace {
 
 constexpr std::size_t kGraphsKept = 256;
 
-// Shows bytes that are not printable in hexadecimal, and at most one of the zeros at the end.
+// Shows unprintable bytes in hexadecimal and abbreviates runs of zeros.
 std::string Readable(std::string bytes) {
   std::string text;
   for (std::size_t i = 0; i < bytes.size(); ++i) {
@@ -36,9 +36,9 @@ std::string Readable(std::string bytes) {
   return text;
 }
 
-// The record with 0 in place of an id that the service made up: an item removed in mid-question
-// gets the id of one that is not on the named volume. The tree has no such ids. Empty where the
-// record has none.
+// Returns the record with 0 in place of a made-up id, or an empty string when it has none. An item
+// removed mid-request gets the made-up id of an item that is not on the named volume. No item of
+// the tree has such an id.
 std::string WithoutMadeUpID(std::string response) {
   constexpr std::size_t kIDStart = sizeof(std::uint8_t) + sizeof(std::int16_t);
   constexpr std::uint32_t kFirstMadeUpID = 0x80000000;
@@ -55,7 +55,7 @@ bool Has(const State& state, const Entry& entry) {
   return std::find(state.begin(), state.end(), entry) != state.end();
 }
 
-// Whether some folder cannot be told by its number: something covers it, or another one has it.
+// Returns whether a folder cannot be identified by its number: it is covered, or shares the number.
 bool HidesFolders(const State& state) {
   std::set<std::uint64_t> numbers;
   const auto isShared = [&](const Entry& entry) {
@@ -64,8 +64,8 @@ bool HidesFolders(const State& state) {
   return state.other.root != kNoNode || std::any_of(state.begin(), state.end(), isShared);
 }
 
-// A request and what it turns into: once code 8 has found a record, it continues as code 9 with a
-// search of the other volumes, which have items of their own with that number and name.
+// Returns the request and what it turns into: once code 8 has found a record, it continues as code
+// 9 and searches the other volumes, which may have an item of that number and name.
 std::vector<Request> StagesOf(const Request& request) {
   std::vector<Request> stages{request};
   if (request.code == 8 && request.hfsName.size() <= kLongestRecordName) {
@@ -109,7 +109,7 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
   for (History::Version version = first; version <= last; ++version) {
     states.push_back(&mHistory.At(version));
   }
-  // What cannot be determined is answered in steps as well.
+  // A second copy of the only state counts as several states, whose answers may be undetermined.
   if (first == last) states.push_back(states.front());
   const Truth inSteps = Answers(Graph(states), mPlace, request);
   if (inSteps.honestErrors.contains(response)) return Verdict::kHonestError;
@@ -124,8 +124,8 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
                  ? Verdict::kNowhere
                  : Verdict::kWrong;
     case Destination::kAnother:
-      // A question about an untrusted volume takes so long that what is told at its end may have
-      // led elsewhere at its beginning.
+      // A request to an untrusted volume takes so long that a path found at its end may have led
+      // elsewhere at its beginning.
       if (mNumbers == Numbers::kUntrusted && inSteps.responses.contains(response) &&
           LeadsTo(GraphOf(last), mPlace, request.code, response).empty()) {
         return Verdict::kNowhere;
@@ -135,7 +135,7 @@ Verdict Judge::Of(const Request& request, const std::string& response, History::
   return Verdict::kWrong;
 }
 
-// The item meant in a state is the one that the exact answer in that state leads to.
+// The item meant in a state is the one to which the exact answer in that state leads.
 Judge::Destination Judge::DestinationOf(const std::vector<const State*>& states,
                                         const Request& request, const std::string& response) const {
   std::set<Node> reached;

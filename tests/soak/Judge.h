@@ -1,4 +1,4 @@
-// Judges whether an answer was true at some moment between question and answer.
+// Judges whether an answer was true at some moment between request and answer.
 #pragma once
 
 #include <cstddef>
@@ -13,21 +13,21 @@
 namespace tallowmere::soak {
 
 enum class Verdict {
-  kExact,  // true in one of the states
-  kMoved,  // each of its steps was true in one of them: what was asked for was moved. It leads
-           // to what could be meant in one of them, or to no item in any
-  kHonestError,  // none, or undetermined, and what was asked for changed
-  kNowhere,      // leads to no item in any of the states, and what was asked for changed
+  kExact,        // true in one of the states
+  kMoved,        // each step was true in one of the states, as the item was moved; leads to an item
+                 // that could be meant in one of them, or to no item in any
+  kHonestError,  // no such item, or undetermined; what was asked for changed
+  kNowhere,      // leads to no item in any of the states; what was asked for changed
   kWrong,
 };
 inline constexpr std::size_t kVerdicts = 5;
 
-// How far the inode numbers of the main volume can be trusted.
+// How far inode numbers of the main volume identify items.
 enum class Numbers {
   kTrusted,
-  kServed,     // but a server may say ESTALE of what has moved
-  kUntrusted,  // as well; and any two items could have one number, so that any change and anything
-               // that is mounted in it can make an id undetermined
+  kServed,     // fully, but the server may answer ESTALE about what has moved
+  kUntrusted,  // the same, and two items may share a number: any change, and anything mounted in
+               // the volume, can make an id undetermined
 };
 
 class Judge {
@@ -35,16 +35,16 @@ class Judge {
   Judge(const History& history, Place place, Numbers numbers = Numbers::kTrusted)
       : mHistory(history), mPlace(std::move(place)), mNumbers(numbers) {}
 
-  // REQUIRES: all states from the first to the last one are reached and kept.
+  // REQUIRES: every state from the first to the last has been reached and is still kept.
   Verdict Of(const Request& request, const std::string& response, History::Version first,
              History::Version last);
 
-  // What is known of a request and its answer, for a report.
+  // Returns what is known about a request and its answer, for a report.
   std::string Report(const Request& request, const std::string& response, History::Version first,
                      History::Version last);
 
  private:
-  // The items, over all the states, that an answer leads to.
+  // The items that an answer leads to, over all the states.
   enum class Destination { kNone, kMeant, kAnother };
 
   Destination DestinationOf(const std::vector<const State*>& states, const Request& request,
@@ -55,7 +55,7 @@ class Judge {
   const History& mHistory;
   Place mPlace;
   Numbers mNumbers;
-  std::map<History::Version, Graph> mGraphs;  // of the states that were used last
+  std::map<History::Version, Graph> mGraphs;  // of the most recently used states
 };
 
 }  // namespace tallowmere::soak

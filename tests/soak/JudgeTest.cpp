@@ -1,4 +1,4 @@
-// Tests the soak's judge on histories made by hand.
+// Tests the soak's judge on hand-made histories.
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -46,7 +46,7 @@ State StateOf(const std::vector<Entry>& entries, Volume other = {kNoNode, kOther
 
 const Entry kPlaceEntry = EntryIn(kMainRoot, kVolumePlace, kPlaceFolder, Kind::kFolder);
 
-// F2 moves from B to C, then X replaces Z in it.
+// F2 moves from B to C, then X takes the name of Z in it.
 std::vector<State> FolderAndThenFileMoved() {
   const Entry x = EntryIn(kF2, kTrack1, kX, Kind::kFile);
   const Entry z = EntryIn(kF2, kTrack2, kZ, Kind::kFile);
@@ -56,7 +56,7 @@ std::vector<State> FolderAndThenFileMoved() {
           StateOf({kPlaceEntry, atC, EntryIn(kF2, kTrack2, kX, Kind::kFile)})};
 }
 
-// The volume is unmounted, with its one folder.
+// The volume is unmounted, together with its only folder.
 std::vector<State> VolumeUnmounted() {
   const Entry sub = EntryIn(kOtherRoot, kSubfolder, kSubOfOther, Kind::kFolder);
   return {StateOf({kPlaceEntry, sub}, {kOtherRoot, kOtherNumber}), StateOf({kPlaceEntry})};
@@ -121,13 +121,13 @@ TEST(Judge, PathOfOneStateIsExact) {
   }
 }
 
-TEST(Judge, PathToTheItemOnceItHasMovedIsMoved) {
+TEST(Judge, PathToTheItemAfterItMovedIsMoved) {
   EXPECT_EQ(VerdictOn(FolderAndThenFileMoved(), RequestAboutRecordOfX(),
                       PathResponse("/soaked/soak C/track 2.aif")),
             Verdict::kMoved);
 }
 
-TEST(Judge, ErrorAboutWhatChangedIsHonest) {
+TEST(Judge, ErrorAboutAChangedItemIsHonest) {
   EXPECT_EQ(VerdictOn(FolderAndThenFileMoved(), RequestAboutRecordOfX(), kNoPathResponse),
             Verdict::kHonestError);
   EXPECT_EQ(
@@ -144,7 +144,7 @@ TEST(Judge, NameOfTheVolumeOfAFolderThatWasReplacedIsAnHonestError) {
             Verdict::kHonestError);
 }
 
-TEST(Judge, NameOfAVolumeThatWentIsAnHonestError) {
+TEST(Judge, NameOfAnUnmountedVolumeIsAnHonestError) {
   EXPECT_EQ(VerdictOn(VolumeUnmounted(), RequestAbout(1, {kVolumePlace, kSubfolder}),
                       FullPathResponse("soak volume:")),
             Verdict::kHonestError);
@@ -162,19 +162,19 @@ TEST(Judge, RecordOfANewItemByAMadeUpIDIsNowhere) {
             Verdict::kNowhere);
 }
 
-TEST(Judge, FullPathCutShortIsNowhere) {
+TEST(Judge, FullPathWithoutOuterFoldersIsNowhere) {
   EXPECT_EQ(VerdictOn(OuterFolderMoved(false), RequestAbout(1, {kSoakB, kSubfolder}),
                       FullPathResponse("soaked:sub:")),
             Verdict::kNowhere);
 }
 
-TEST(Judge, FullPathOnAVolumeThatWentIsNowhere) {
+TEST(Judge, FullPathOnAnUnmountedVolumeIsNowhere) {
   EXPECT_EQ(VerdictOn(VolumeUnmounted(), RequestAbout(1, {kVolumePlace, kSubfolder}),
                       FullPathResponse(":sub:")),
             Verdict::kNowhere);
 }
 
-TEST(Judge, ItemThatIsReachedByNamesLookedUpInTurnIsMeant) {
+TEST(Judge, ItemReachedByLookingUpNamesInTurnIsMeant) {
   // F2 is at B until another folder takes the place; then its file gets the requested name.
   const Entry file = EntryIn(kF2, kTrack1, kX, Kind::kFile);
   Entry renamed = file;
@@ -192,7 +192,7 @@ TEST(Judge, ItemThatIsReachedByNamesLookedUpInTurnIsMeant) {
 
 // --- Shortened full paths -----------------------------------------------------------------------
 
-TEST(Judge, FullPathWithoutRoomIsExactOnlyAsItIsShortened) {
+TEST(Judge, FullPathWithoutRoomIsExactOnlyWhenShortened) {
   const auto states = OuterFolderMoved(false);
   Request request = RequestAbout(1, {kSoakB, kSubfolder});
   request.room = kLeastRoom;
@@ -209,8 +209,8 @@ TEST(Judge, FullPathWithoutRoomIsExactOnlyAsItIsShortened) {
   EXPECT_EQ(VerdictOn(states, request, response("soaked:")), Verdict::kWrong);
 }
 
-// In between, code 8 finds its record and searches the other volumes for it.
-TEST(Judge, ItemOfAnotherVolumeIsMeantOnlyWhereTheVolumesAreSearched) {
+// Between two steps, code 8 finds its record and then searches the other volumes for it.
+TEST(Judge, ItemOfAnotherVolumeIsMeantOnlyIfOtherVolumesAreSearched) {
   const Entry ofMain = EntryIn(kMainRoot, kTrack1, kX, Kind::kFile);
   const Entry ofOther = EntryIn(kOtherRoot, kTrack1, kZ, Kind::kFile);
   const std::vector<State> states{
@@ -227,13 +227,13 @@ TEST(Judge, ItemOfAnotherVolumeIsMeantOnlyWhereTheVolumesAreSearched) {
 
 // --- Wrong answers ----------------------------------------------------------------------------
 
-TEST(Judge, PathThatLedToAnotherItemOnlyIsWrong) {
+TEST(Judge, PathThatOnlyLedToAnotherItemIsWrong) {
   EXPECT_EQ(VerdictOn(FolderAndThenFileMoved(), RequestAboutRecordOfX(),
                       PathResponse("/soaked/soak B/track 2.aif")),
             Verdict::kWrong);
 }
 
-TEST(Judge, ErrorAboutWhatStayedIsWrong) {
+TEST(Judge, ErrorAboutAnUnchangedItemIsWrong) {
   const State state = FolderAndThenFileMoved().front();
   State another = state;
   another.entries.at(another.count++) = EntryIn(kMainRoot, kTrack1, kSub, Kind::kFile);
@@ -265,7 +265,7 @@ TEST(Judge, UsableRecordWithoutAFolderIsWrong) {
   }
 }
 
-TEST(Judge, FullPathWithoutAVolumeIsWrongUnlessTheVolumeWent) {
+TEST(Judge, FullPathWithoutAVolumeIsWrongUnlessItWasUnmounted) {
   const auto states = OuterFolderMoved(false);
   const Request request = RequestAbout(1, {kSoakB, kSubfolder});
   for (const char* const path : {":any thing at all:", ":soak B:sub:", ":sub:"}) {
@@ -273,7 +273,7 @@ TEST(Judge, FullPathWithoutAVolumeIsWrongUnlessTheVolumeWent) {
   }
 }
 
-TEST(Judge, FullPathWithoutAVolumeIsWrongWithOtherFoldersLengthOrBytesBehindIt) {
+TEST(Judge, FullPathWithoutAVolumeIsWrongWithOtherFoldersLengthOrPadding) {
   const Request request = RequestAbout(1, {kVolumePlace, kSubfolder});
   constexpr unsigned kAnotherLength = 7;
   std::string withAnotherLength = FullPathResponse(":sub:");
@@ -293,7 +293,7 @@ TEST(Judge, NameOfAVolumeThatIsNotMountedIsWrong) {
             Verdict::kWrong);
 }
 
-TEST(Judge, NameOfAVolumeThatThePathDoesNotLeadToIsWrong) {
+TEST(Judge, NameOfAVolumeOffThePathIsWrong) {
   auto states = OuterFolderMoved(false);
   for (State& state : states) state.other.root = kOtherRoot;
   EXPECT_EQ(
@@ -301,7 +301,7 @@ TEST(Judge, NameOfAVolumeThatThePathDoesNotLeadToIsWrong) {
       Verdict::kWrong);
 }
 
-TEST(Judge, FullPathCutShortThatLeadsToAnotherFolderIsWrong) {
+TEST(Judge, FullPathWithoutOuterFoldersThatLeadsElsewhereIsWrong) {
   EXPECT_EQ(VerdictOn(OuterFolderMoved(true), RequestAbout(1, {kSoakB, kSubfolder}),
                       FullPathResponse("soaked:sub:")),
             Verdict::kWrong);
@@ -309,7 +309,7 @@ TEST(Judge, FullPathCutShortThatLeadsToAnotherFolderIsWrong) {
 
 // --- Untrusted numbers --------------------------------------------------------------------------
 
-// Two folders with one number, each with an X.
+// Two folders with the same number; the first holds X.
 State TwoFoldersWithOneNumber() {
   Entry second = EntryIn(kMainRoot, kSoakC, kZ, Kind::kFolder);
   const Entry first = EntryIn(kMainRoot, kSoakB, kF2, Kind::kFolder);
@@ -317,7 +317,7 @@ State TwoFoldersWithOneNumber() {
   return StateOf({kPlaceEntry, first, second, EntryIn(kF2, kTrack1, kX, Kind::kFile)});
 }
 
-TEST(JudgeOfAnUntrustedVolume, TakesAnErrorWhenSomethingElseHasChanged) {
+TEST(JudgeOfAnUntrustedVolume, AcceptsAnErrorWhenSomethingElseHasChanged) {
   State before = FolderAndThenFileMoved().front();
   State after = before;
   after.entries.at(after.count++) = EntryIn(kMainRoot, kTrack1, kSub, Kind::kFile);
@@ -327,13 +327,13 @@ TEST(JudgeOfAnUntrustedVolume, TakesAnErrorWhenSomethingElseHasChanged) {
       Verdict::kHonestError);
 }
 
-TEST(JudgeOfAnUntrustedVolume, TakesNoErrorWhenNothingHasChanged) {
+TEST(JudgeOfAnUntrustedVolume, AcceptsNoErrorWhenNothingHasChanged) {
   const State state = FolderAndThenFileMoved().front();
   EXPECT_EQ(VerdictOn({state}, RequestAboutRecordOfX(), kNoItemResponse, Numbers::kUntrusted),
             Verdict::kWrong);
 }
 
-TEST(JudgeOfAnUntrustedVolume, TakesOnlyAnErrorAboutANumberThatTwoFoldersHave) {
+TEST(JudgeOfAnUntrustedVolume, AcceptsOnlyAnErrorAboutANumberOfTwoFolders) {
   const State state = TwoFoldersWithOneNumber();
   EXPECT_EQ(VerdictOn({state}, RequestAboutRecordOfX(), kNoItemResponse, Numbers::kUntrusted),
             Verdict::kExact);
@@ -342,7 +342,7 @@ TEST(JudgeOfAnUntrustedVolume, TakesOnlyAnErrorAboutANumberThatTwoFoldersHave) {
             Verdict::kWrong);
 }
 
-TEST(JudgeOfAnUntrustedVolume, TakesNoOtherItem) {
+TEST(JudgeOfAnUntrustedVolume, AcceptsNoOtherItem) {
   const State state = FolderAndThenFileMoved().front();
   State after = state;
   after.entries.at(after.count++) = EntryIn(kMainRoot, kTrack1, kSub, Kind::kFile);
@@ -351,7 +351,7 @@ TEST(JudgeOfAnUntrustedVolume, TakesNoOtherItem) {
             Verdict::kWrong);
 }
 
-TEST(JudgeOfAServedVolume, TakesAnErrorOfTheServerAboutWhatChanged) {
+TEST(JudgeOfAServedVolume, AcceptsAServersErrorAboutAChangedItem) {
   const Request request = RequestAbout(2, {kSoakB, kTrack1});
   const std::string error = ResultResponse(kResultSystemError);
   EXPECT_EQ(VerdictOn(FolderAndThenFileMoved(), request, error), Verdict::kWrong);
@@ -359,7 +359,7 @@ TEST(JudgeOfAServedVolume, TakesAnErrorOfTheServerAboutWhatChanged) {
             Verdict::kHonestError);
 }
 
-TEST(History, TellsWhenAStateIsNoLongerKept) {
+TEST(History, KnowsWhenAStateIsNoLongerKept) {
   State state{};
   History history(state);
   for (History::Version version = 1; version < History::kKept - 1; ++version) {
@@ -370,7 +370,7 @@ TEST(History, TellsWhenAStateIsNoLongerKept) {
   EXPECT_TRUE(history.Keeps(0));
   state.main.number = 1;
   history.Begin(state);
-  EXPECT_FALSE(history.Keeps(0)) << "the next one may already be written over it";
+  EXPECT_FALSE(history.Keeps(0)) << "the next state may already overwrite it";
   EXPECT_TRUE(history.Keeps(1));
   EXPECT_EQ(history.At(1).main.number, -1);
 }

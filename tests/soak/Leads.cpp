@@ -30,7 +30,7 @@ std::optional<NameIndex> IndexOf(std::string_view linuxName) {
   return std::nullopt;
 }
 
-// Zero when the bytes end before it.
+// Returns 0 when the bytes are too few.
 template <class Integer>
 Integer ReadAt(std::string_view bytes, std::size_t offset) {
   Integer value = 0;
@@ -75,7 +75,7 @@ class Resolution : private Walk {
 
   std::set<Node> OfFullPath(std::string_view fullPath) {
     auto names = Split(fullPath, ':');
-    if (!names.back().empty()) return {};  // no colon follows
+    if (!names.back().empty()) return {};  // no trailing colon
     names.pop_back();
     std::vector<Node> folders;
     for (const Volume& volume : MountedVolumes()) {
@@ -116,7 +116,7 @@ class Resolution : private Walk {
   const Place& mPlace;
 };
 
-// Looks up each name in the state in which the one before was looked up, or in a later one.
+// Looks up each name in the state in which the previous one was looked up, or in a later one.
 void Follow(std::span<const State* const> states, Node folder, const std::vector<NameIndex>& names,
             std::set<Node>& reached) {
   if (names.empty()) {

@@ -21,7 +21,7 @@ struct Disk {
   std::uintmax_t size;
 };
 
-// Each of about the least size that its tool accepts.
+// Each size is about the smallest that the tool accepts.
 const std::vector<Disk>& Disks() {
   static const std::vector<Disk> disks{{"ext4", {"mkfs.ext4", "-q", "-F"}, 64 << 20},
                                        {"xfs", {"mkfs.xfs", "-q", "-f"}, 320 << 20},
@@ -85,7 +85,7 @@ std::optional<std::string> MainVolume::Mount() {
 
 namespace {
 
-// The layers of an overlay, on a file system of their own.
+// The layers of an overlay, all on one file system.
 struct Layers {
   explicit Layers(const std::string& folder)
       : lower(folder + "/lower"), upper(folder + "/upper"), work(folder + "/work") {

@@ -13,19 +13,19 @@
 
 namespace tallowmere::soak {
 
-// One of them, not mounted at first. Its files are removed with it.
+// Mounts one of these file systems and removes its files at the end.
 class MainVolume {
  public:
   static std::vector<std::string> Kinds();
   static bool IsKind(const std::string& kind);
 
-  // REQUIRES: it is one of the kinds.
+  // REQUIRES: `kind` is one of Kinds().
   explicit MainVolume(const std::string& kind);
 
   Numbers InodeNumbers() const { return mNumbers; }
 
-  // Mounts it. Returns the mount point; nullopt where a tool or the kernel's support is missing.
-  // REQUIRES: this process is in a mount namespace of its own.
+  // Mounts the volume. Returns the mount point, or nullopt where a tool or kernel support is
+  // missing. REQUIRES: this process is in a mount namespace of its own.
   std::optional<std::string> Mount();
 
  private:

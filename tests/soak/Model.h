@@ -1,5 +1,4 @@
-// The tree of a soak: two volumes with a few dozen items, as plain data that is copied with each
-// change.
+// The tree of a soak: two volumes with a few dozen items, as plain data that each change copies.
 #pragma once
 
 #include <array>
@@ -13,18 +12,18 @@ namespace tallowmere::soak {
 
 struct Name {
   const char* linuxName;
-  const char* hfsName;  // in full; a record has a short form of a name that is too long for it
+  const char* hfsName;  // in full; a record has a short form when it is too long
   const char* newName;  // the Linux name of a new item with this HFS name
 };
 
 using NameIndex = std::uint8_t;
 
-// In the main volume's root folder. A link's target is always a name before its own, so that no
-// links form a cycle.
+// Names in the main volume's root folder. A link's target is always an earlier name than its own,
+// so that no links form a cycle.
 inline constexpr NameIndex kVolumePlace = 0;  // the mount point of the other volume
 inline constexpr NameIndex kFirstSlot = 1;
 inline constexpr NameIndex kEndOfSlots = 7;
-// In folders.
+// Names in folders.
 inline constexpr NameIndex kSubfolder = 7;
 inline constexpr NameIndex kInnerLink = 8;
 inline constexpr NameIndex kFirstFile = 9;
@@ -33,18 +32,18 @@ inline constexpr NameIndex kNoName = 255;
 
 const Name& NameAt(NameIndex index);
 
-// The Linux name of a new item with an HFS name, which may be a short form.
+// Returns the Linux name of a new item with an HFS name, which may be a short form.
 std::string NewName(std::string_view hfsName);
 
 // The longest name in a record, in bytes.
 inline constexpr std::size_t kLongestRecordName = 63;
 
-// Whether the name is too long for a record, which then has a short form of it.
+// Returns whether a record has to use a short form of the name.
 bool HasShortForm(NameIndex name);
 
 // --- Items ------------------------------------------------------------------------------------
 
-// Items are numbered as they are made; numbers are never reused.
+// Items are numbered in the order of their creation. Numbers are never reused.
 using Node = std::uint32_t;
 inline constexpr Node kNoNode = 0;
 inline constexpr Node kMainRoot = 1;
@@ -58,20 +57,20 @@ struct Entry {
   std::uint64_t inode;
   Kind kind;
   NameIndex name;
-  NameIndex target;       // of a link: a name in the main volume's root folder
-  NameIndex innerTarget;  // a name in that, or kNoName
+  NameIndex target;       // of a link: the first name on its path, in the main volume's root folder
+  NameIndex innerTarget;  // the second name, or kNoName
 
   bool operator==(const Entry&) const = default;
 };
 
-// Whether it is the mount point of the other volume.
+// Returns whether the entry is the mount point of the other volume.
 bool IsVolumePlace(const Entry& entry);
 
-// With more marks where fewer were not found to be the item's, which happens while it moves.
+// The service uses more marks when fewer did not lead back to the item, as while it moves.
 std::string ShortForm(const Entry& entry, std::size_t marks = 1);
 inline constexpr std::size_t kMostMarks = 16;
 
-// The entry's HFS name in a record.
+// Returns the entry's HFS name as in a record.
 std::string RecordName(const Entry& entry);
 
 std::string TextOf(const Entry& entry);

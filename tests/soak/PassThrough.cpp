@@ -24,7 +24,7 @@ constexpr ino_t kOneNumber = 500;
 int source = -1;
 PassThrough served;
 
-// The path below the source. The server's paths begin with "/".
+// Returns the path relative to the source folder. The server's paths begin with "/".
 const char* Below(const char* path) {
   return path[1] == '\0' ? "." : path + 1;
 }
@@ -88,7 +88,8 @@ void* Start(fuse_conn_info*, fuse_config* config) {
   return nullptr;
 }
 
-// A block device that lasts as long as the process; empty where there is none.
+// Returns a block device that lasts as long as the process, or an empty string where none is
+// possible.
 std::string BlockDevice() {
   constexpr off_t kSize = 1 << 20;
   std::FILE* const file = std::tmpfile();

@@ -1,4 +1,4 @@
-// A FUSE server that shows a folder of another file system.
+// A FUSE server that passes every call through to a folder of another file system.
 #pragma once
 
 #include <string>
@@ -6,8 +6,8 @@
 namespace tallowmere::soak {
 
 struct PassThrough {
-  bool onBlockDevice = false;  // it then passes for a file system of a disk: fuseblk
-  bool oneNumber = false;      // every item but the root folder has the same inode number
+  bool onBlockDevice = false;  // mounts as fuseblk, like a file system on a disk
+  bool oneNumber = false;      // gives every item but the root folder the same inode number
 };
 
 // Starts the server in a child process that ends with this one. Returns whether it is mounted.

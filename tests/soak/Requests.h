@@ -1,4 +1,4 @@
-// The requests of a soak, and their bytes.
+// The requests of a soak and their encoding.
 #pragma once
 
 #include <array>
@@ -11,7 +11,7 @@
 
 namespace tallowmere::soak {
 
-// Names, starting at the main volume's root folder.
+// A path as names, relative to the main volume's root folder.
 struct Path {
   std::array<NameIndex, 3> names{};
   std::size_t count = 0;
@@ -22,9 +22,9 @@ struct Path {
   bool operator==(const Path&) const = default;
 };
 
-// The longest full path that may be requested, in bytes with its NUL.
+// The largest buffer for a full path that may be requested, in bytes including the NUL.
 inline constexpr std::uint16_t kMostRoom = 1024;
-// The shortest that is safe for this tree, other than 0: the longest name of a volume and six more.
+// The smallest buffer but 0 that this tree allows: the longest name of a volume and six more bytes.
 inline constexpr std::uint16_t kLeastRoom = 17;
 
 struct Request {
@@ -34,8 +34,8 @@ struct Request {
   std::uint32_t folder = 0;
   std::string hfsName;             // of codes 6, 8, 9
   bool search = false;             // of code 9
-  bool byOther = false;            // for code 2: the first name is the other volume's
-  std::uint16_t room = kMostRoom;  // for code 1: 0, or from kLeastRoom on
+  bool byOther = false;            // of code 2: the first name is the other volume's
+  std::uint16_t room = kMostRoom;  // of code 1: 0, or at least kLeastRoom
   bool flag = false;               // the last field of codes 1, 2, 6, 8, 9
 };
 
@@ -47,13 +47,13 @@ struct Place {
 
 std::string VolumeName(const Volume& volume, const Place& place);
 
-// Stands for the folders that a full path (code 1) has no room for.
+// Replaces the folders that do not fit into a full path (code 1).
 inline constexpr std::string_view kAnyFolders = "...";
 
-// The Linux path.
+// Returns the Linux path.
 std::string TextOf(const Path& path, const Place& place);
 
-// The bytes of a request.
+// Returns the bytes of a request.
 std::string BytesOf(const Request& request, const Place& place);
 
 std::string TextOf(const Request& request);

@@ -1,4 +1,4 @@
-// File systems that a process serves.
+// File systems served by a process.
 #pragma once
 
 #include <functional>
@@ -8,10 +8,10 @@
 namespace tallowmere::soak {
 
 // Runs `serve`, which does not return, in a child process that ends with this one. Returns whether
-// something is mounted at `place` within a few seconds.
+// a file system is mounted at `place` within a few seconds.
 bool IsServed(const std::string& place, const std::function<void()>& serve);
 
-// The same with a program, which stays in the foreground.
+// Runs a program that stays in the foreground, likewise.
 bool IsServedBy(const std::vector<std::string>& command, const std::string& place);
 
 }  // namespace tallowmere::soak

@@ -1,6 +1,6 @@
-// tallowmere_soak: asks one service very many questions of every kind about a tree that changes all
-// the time, and compares each answer with the states of the tree between question and answer.
-// docs/reliability.md explains how it judges.
+// tallowmere_soak: sends one service millions of requests of every kind about a tree that changes
+// all the time, and compares each answer with the states of the tree between request and answer.
+// docs/reliability.md explains the verdicts.
 
 #include <dirent.h>
 #include <fcntl.h>
@@ -40,7 +40,7 @@ namespace {
 using namespace tallowmere::test;
 using Clock = std::chrono::steady_clock;
 
-// The exit status that ctest takes for "skipped".
+// The exit status that means "skipped" to ctest.
 constexpr int kSkipped = 77;
 // The usual exit status for invalid arguments.
 constexpr int kMisused = 2;
@@ -50,9 +50,9 @@ constexpr unsigned kExport = 10;
 constexpr unsigned kCodes = 11;
 constexpr std::size_t kMostReports = 20;
 constexpr int kProgressLines = 20;
-// A question is about the latest state or one shortly before it.
+// A request is about the latest state or one shortly before it.
 constexpr std::size_t kStatesAskedAbout = 40;
-// More are not judged by.
+// An answer that spans more states is not judged.
 constexpr History::Version kMostStates = 1024;
 static_assert(kMostStates < History::kKept);
 
@@ -72,14 +72,14 @@ class Asked : public ChildProgram {
  public:
   explicit Asked(const std::string& service) : ChildProgram(service, {std::to_string(getpid())}) {}
 
-  // Reads the response to the request; calls `onRead` whenever bytes have arrived.
+  // Reads the response to the request. Calls `onRead` whenever bytes have arrived.
   template <class OnRead>
   std::string Response(const Request& request, OnRead onRead) {
     std::optional<std::size_t> size;
     while (!(size = SizeOfResponse(request)) || mRead.size() - mUsed < *size) {
       mRead.erase(0, std::exchange(mUsed, 0));
       const std::string more = ReadSome();
-      if (more.empty()) throw std::runtime_error("the service gives no answer");
+      if (more.empty()) throw std::runtime_error("the service does not answer");
       mRead += more;
       onRead();
     }
@@ -106,7 +106,7 @@ class Asked : public ChildProgram {
   }
 
  private:
-  // Nullopt until enough of it has arrived.
+  // Returns nullopt until enough bytes have arrived.
   std::optional<std::size_t> SizeOfResponse(const Request& request) const {
     constexpr std::size_t kRecord = 1 + 70;
     constexpr std::size_t kSettingsSize = 2;
@@ -146,11 +146,11 @@ class Asker {
 
   std::size_t Below(std::size_t end) { return mRandom() % end; }
 
-  // A request about the tree's present or recent state.
+  // Returns a request about the tree's current or recent state.
   Request AnyRequest(const State& state) {
     static constexpr std::array<unsigned, 24> kCodesByWeight{1, 1, 2, 2, 2, 3, 4, 5, 5, 5, 6, 6,
                                                              7, 7, 7, 7, 7, 8, 8, 8, 9, 9, 9, 9};
-    // Only paths of 17 to 19 bytes are shortened in this tree.
+    // In this tree, only buffers of 17 to 19 bytes cause shortening.
     static constexpr std::array<std::uint16_t, 8> kRooms{
         0, kLeastRoom, kLeastRoom + 1, kLeastRoom + 2, kLeastRoom + 3, 768, kMostRoom, kMostRoom};
     Request request{};
@@ -209,7 +209,7 @@ class Asker {
     std::string whole = NameAt(name).hfsName;
     const bool isWhole = code != 9 && Below(2) == 0;
     if (isWhole || whole.size() <= kLongestRecordName) return whole;
-    // A short form, of an existing item.
+    // The short form of an existing item.
     const std::size_t start = Below(state.count);
     for (std::size_t i = 0; i < state.count; ++i) {
       const Entry& entry = state.entries[(start + i) % state.count];
@@ -243,7 +243,7 @@ class Asker {
     }
     if (request.folder == 0) request.folder = 2;
     request.hfsName = AnyHFSName(state, request.code);
-    // Mostly an existing name.
+    // Usually an existing name.
     for (std::size_t i = 0; Below(3) != 0 && i < state.count; ++i) {
       const Entry& entry = state.entries[(start + i) % state.count];
       if (entry.inode == request.folder && entry.kind == Kind::kFolder) {
@@ -265,7 +265,7 @@ struct Counts {
   std::array<std::array<std::uint64_t, kVerdicts>, kCodes> ofVerdict{};
   std::uint64_t asked = 0;
   std::uint64_t wrong = 0;
-  std::uint64_t states = 0;  // states used by judgements, in all
+  std::uint64_t states = 0;  // total number of states used by the judge
 };
 
 class Run {
@@ -294,7 +294,7 @@ class Run {
     Summarise();
     mService.Write(kQuit);
     const int status = mService.Wait();
-    if (status != 0) std::printf("the service ended with %d\n", status);
+    if (status != 0) std::printf("the service ended with status %d\n", status);
     return isLevel && mCounts.wrong == 0 && status == 0;
   }
 
@@ -327,8 +327,8 @@ class Run {
       answers.push_back({std::move(response), last});
     }
     while (history.Reached() < last) std::this_thread::yield();
-    // Of so many states as a busy machine takes, the answers in steps are too many to work out.
-    // Others are asked instead.
+    // A busy machine can take so many states that working out the answers in steps is too
+    // expensive. Other requests are judged instead.
     if (history.Begun() - first > kMostStates) return;
     for (std::size_t i = 0; i < size; ++i) {
       JudgeOne(requests[i], answers[i].response, first, answers[i].last);
@@ -350,7 +350,7 @@ class Run {
     const Verdict verdict = VerdictOn(request, response, first, last);
     std::string report;
     if (verdict == Verdict::kWrong) report = mJudge.Report(request, response, first, last);
-    // The tree went on changing meanwhile. A verdict by states that are no longer kept is none.
+    // The tree kept changing. A verdict based on overwritten states does not count.
     if (!mChurner.Changes().Keeps(first)) return;
     ++mCounts.asked;
     mCounts.states += last - first + 1;
@@ -363,7 +363,7 @@ class Run {
     }
   }
 
-  // Between two groups, the service has nothing open for a request.
+  // Between two groups, the service must hold nothing open for a request.
   bool WatchLevel() {
     const long memory = mService.KiBInUse();
     const int descriptors = mService.OpenDescriptors();
@@ -379,11 +379,11 @@ class Run {
       mDescriptors = descriptors;
       mExports = Exports();
     }
-    // For an export, as documented, the service keeps less than half a KiB.
+    // As documented, the service keeps less than half a KiB for each export.
     const long allowed = *mMemory + mOptions.slack + static_cast<long>(Exports() - mExports) / 2;
     if (memory > allowed)
-      std::printf("the memory is not level: %ld KiB, at most %ld\n", memory, allowed);
-    if (descriptors != mDescriptors) std::printf("the descriptors are not level\n");
+      std::printf("memory use grew to %ld KiB; %ld KiB are allowed\n", memory, allowed);
+    if (descriptors != mDescriptors) std::printf("the number of open descriptors changed\n");
     return memory <= allowed && descriptors == mDescriptors;
   }
 
@@ -398,7 +398,7 @@ class Run {
                   static_cast<unsigned long long>(of[2]), static_cast<unsigned long long>(of[3]),
                   static_cast<unsigned long long>(of[4]));
     }
-    std::printf("\n%.1f states to a question on average\n",
+    std::printf("\n%.1f states per request on average\n",
                 static_cast<double>(mCounts.states) / static_cast<double>(mCounts.asked));
     for (std::size_t kind = 0; kind < Churner::Kinds().size(); ++kind) {
       std::printf("%12llu × %s\n",
@@ -422,20 +422,20 @@ class Run {
 
 constexpr const char* kFolder = "/soaked";
 
-// The main volume at kFolder, in a small root folder of its own.
+// Mounts the main volume at kFolder, in a small root folder of its own.
 class Stage {
  public:
   Stage(MainVolume& volume, const std::string& service)
       : mIsSet(EnterOwnMountNamespace() && IsSet(volume, service)) {}
   Stage(const Stage&) = delete;
   Stage& operator=(const Stage&) = delete;
-  // A server ends when nothing shows its file system any more.
+  // The server ends when its file system is no longer mounted anywhere.
   ~Stage() { umount2(kFolder, MNT_DETACH); }
 
   bool IsSet() const { return mIsSet; }
 
  private:
-  // Mounted from the old root folder, from which it is moved along.
+  // Mounts the volume in the old root folder and moves the mount into the new one.
   static bool IsSet(MainVolume& volume, const std::string& service) {
     const auto place = volume.Mount();
     if (!place) return false;
@@ -467,7 +467,8 @@ int RunOn(MainVolume& volume, const Options& options) {
 int Main(Options options) {
   options.service = std::filesystem::absolute(options.service);
   MainVolume volume(options.on);
-  // The process that removes the volume's files afterwards keeps the machine's root folder.
+  // The child enters the small root folder. This process keeps the machine's root folder, so it can
+  // remove the volume's files at the end.
   const pid_t child = fork();
   if (child == 0) {
     int status = 1;

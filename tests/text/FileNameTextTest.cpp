@@ -1,3 +1,4 @@
+// Conversion of file names to UTF-16 and back, including names that are not UTF-8.
 #include <gtest/gtest.h>
 
 #include "text/FileNameText.h"
@@ -29,7 +30,7 @@ TEST(FileNameText, EachByteOutsideValidUtf8BecomesALoneSurrogate) {
   EXPECT_EQ(TextOfFileName("\xF0\x8F\xBF\xBF"), u"\xDCF0\xDC8F\xDCBF\xDCBF");
 }
 
-TEST(FileNameText, EveryNameOfTwoBytesComesBack) {
+TEST(FileNameText, EveryNameOfTwoBytesSurvivesARoundTrip) {
   for (unsigned first = 0; first < 256; ++first) {
     for (unsigned second = 0; second < 256; ++second) {
       const std::string name = {static_cast<char>(first), static_cast<char>(second)};
@@ -38,7 +39,7 @@ TEST(FileNameText, EveryNameOfTwoBytesComesBack) {
   }
 }
 
-TEST(FileNameText, EveryCodePointComesBack) {
+TEST(FileNameText, EveryCodePointSurvivesARoundTrip) {
   for (char32_t codePoint = 1; codePoint <= 0x10FFFF; ++codePoint) {
     if (codePoint >= 0xD800 && codePoint <= 0xDFFF) continue;
     std::u16string text;
@@ -54,7 +55,7 @@ TEST(FileNameText, EveryCodePointComesBack) {
   }
 }
 
-TEST(FileNameText, UnpairedSurrogatesThatStandForNoByteHaveNoName) {
+TEST(FileNameText, OtherUnpairedSurrogatesHaveNoName) {
   EXPECT_EQ(FileNameOfText(u"\xD800"), std::nullopt);
   EXPECT_EQ(FileNameOfText(u"a\xDBFFz"), std::nullopt);
   EXPECT_EQ(FileNameOfText(u"\xDC7F"), std::nullopt);

@@ -1,3 +1,4 @@
+// The Mac Roman encoding against its published table.
 #include <gtest/gtest.h>
 
 #include "text/MacRoman.h"
@@ -48,7 +49,7 @@ TEST(MacRoman, KeepsTheOrderOfLettersAroundACombinedOne) {
   EXPECT_EQ(EncodeMacRoman(u"xe\u0301y"), "x\x8Ey");
 }
 
-TEST(MacRoman, RefusesAMarkThatBelongsToNoLetterOfIts) {
+TEST(MacRoman, RefusesAMarkThatFormsNoLetterOfIts) {
   EXPECT_EQ(EncodeMacRoman(u"x\u0301"), std::nullopt);
   EXPECT_EQ(EncodeMacRoman(u"\u0301"), std::nullopt);
   EXPECT_EQ(EncodeMacRoman(u"e\u0301\u0301"), std::nullopt);
@@ -60,7 +61,7 @@ TEST(MacRoman, RefusesCharactersItLacks) {
   EXPECT_EQ(EncodeMacRoman(u"\xDC80"), std::nullopt);
 }
 
-TEST(MacRoman, TakesASurrogatePairAsOneCharacter) {
+TEST(MacRoman, TreatsASurrogatePairAsOneCharacter) {
   const MacRomanStep step = NextMacRoman(u"\U0001F600x");
   EXPECT_EQ(step.byte, std::nullopt);
   EXPECT_EQ(step.units, 2u);

@@ -1,3 +1,4 @@
+// Composed and decomposed forms of Unicode text.
 #include <gtest/gtest.h>
 
 #include <string>
@@ -8,7 +9,7 @@
 namespace tallowmere::text {
 namespace {
 
-// Composed and decomposed, as normalization forms C and D of Unicode give them.
+// Normalization forms C and D of the same text.
 const std::pair<std::u16string, std::u16string> kForms[] = {
     {u"plain", u"plain"},
     {u"Caf\u00E9", u"Cafe\u0301"},

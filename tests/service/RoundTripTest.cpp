@@ -1,4 +1,4 @@
-// What the commands say of real files of the machine agrees, and leads back to them.
+// The answers about real files of this machine agree with each other and lead back to the files.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -17,7 +17,7 @@ namespace fs = std::filesystem;
 
 constexpr std::size_t kFiles = 10'000;
 
-// Up to `kFiles` items of the system's own folders, links among them, not only of one kind.
+// Returns up to `kFiles` items of system folders, links included, taken from all of them.
 std::vector<std::string> RealFiles() {
   std::vector<std::string> files;
   for (const char* const top : {"/etc", "/usr", "/var"}) {
@@ -47,9 +47,9 @@ Spec ReadRecord(const std::string& record) {
   return spec;
 }
 
-class RoadBack : public testing::Test {
+class RoundTrip : public testing::Test {
  protected:
-  // The record, by code 7; empty when it is not usable.
+  // Returns the record from code 7, or an empty string when it is not usable.
   std::string RecordOf(const std::string& path) {
     const std::string response = mService.Ask(RecordRequest(path), 75);
     if (response.size() != 75 || response[0] != 1 || !response.ends_with(kTrailer)) return {};
@@ -59,17 +59,17 @@ class RoadBack : public testing::Test {
   Service mService;
 };
 
-// A file that another process moves or removes meanwhile says nothing.
+// Failures about a file that another process moves or removes meanwhile do not count.
 bool IsStillThere(const std::string& path) {
   struct stat about {};
   return lstat(path.c_str(), &about) == 0;
 }
 
-TEST_F(RoadBack, OfTenThousandFilesLeadsToEach) {
+TEST_F(RoundTrip, LeadsBackToTenThousandFiles) {
   const std::vector<std::string> files = RealFiles();
   ASSERT_GT(files.size(), 1000u);
   for (const std::string& path : files) {
-    // The folder mark that code 7 gives its reference leads through no link on the way.
+    // Code 7 resolves the links in front of the name.
     const std::string record = RecordOf(path);
     if (!IsStillThere(path)) continue;
     ASSERT_FALSE(record.empty()) << path;
@@ -80,7 +80,7 @@ TEST_F(RoadBack, OfTenThousandFilesLeadsToEach) {
     EXPECT_TRUE(mService.Answers(PathOfPartsRequest(spec.volume, spec.parent, spec.name, 0),
                                  PathResponse(real)))
         << path;
-    // A link that leads nowhere does not exist for code 5.
+    // For code 5, a dangling link does not exist.
     const std::string named = fs::exists(path) ? NameResponse(1, spec.name) : NameResponse(0, "");
     EXPECT_TRUE(mService.Answers(HFSNameRequest(path, 64), named)) << path;
     if (HasFailure() && !IsStillThere(path)) GTEST_SKIP() << path << " vanished meanwhile";
@@ -89,8 +89,8 @@ TEST_F(RoadBack, OfTenThousandFilesLeadsToEach) {
   RecordProperty("files", static_cast<int>(files.size()));
 }
 
-// Only of a path that one length byte can tell.
-TEST_F(RoadBack, OfFullPathsLeadsToTheirFolders) {
+// Only paths that fit one length byte.
+TEST_F(RoundTrip, LeadsFullPathsBackToTheirFolders) {
   std::set<std::string> folders;
   for (const std::string& path : RealFiles()) {
     folders.insert(fs::canonical(fs::path(path).parent_path()));
