@@ -48,7 +48,7 @@ using tallowmere::test::RecordToWrite;
 constexpr std::array<const char*, 6> kForms = {"posix", "hfs", "units", "id", "parent", "other"};
 constexpr std::int64_t k1904 = -2'082'844'800;  // in seconds since 1970
 constexpr unsigned kFractionBits = 16;
-constexpr std::int64_t kTimeZone = -8 * 60 * 60;  // of the writer
+constexpr std::int64_t kTimeZone = -std::int64_t{8} * 60 * 60;  // of the writer
 
 void Require(bool isDone, const std::string& what) {
   if (!isDone) throw std::runtime_error(what + ": " + std::strerror(errno));
