@@ -53,7 +53,7 @@ Result<AliasFile> ReadBookmarkOf(const catalog::Look& file, const kernel::Descri
   const auto bookmark = formats::ReadBookmarkFile(*data);
   if (bookmark) return AliasFile{true, formats::AliasContent(*bookmark)};
   auto record = ReadRecordOf(file, contents);
-  if (!record && record.Error() != kBroken) return record.Error();
+  if (!record && record.Error() != kBroken) return AliasFile{true, record.Error()};
   return record && record->isAlias ? record : Broken();
 }
 

@@ -19,7 +19,8 @@ inline constexpr kernel::Error kBroken{-5};
 
 struct AliasFile {
   bool isAlias = false;
-  kernel::Result<formats::AliasContent> content = kBroken;  // kBroken where it is none, too
+  // kBroken where it is none, too; the kernel's error where what counts may not be read.
+  kernel::Result<formats::AliasContent> content = kBroken;
 };
 
 // What a file is; the kernel's error where it may not be read. Of a file that is no alias, mostly

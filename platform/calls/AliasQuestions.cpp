@@ -209,7 +209,7 @@ Answer LookAt(catalog::Moment& moment, const std::string& path) {
   const auto alias = aliases::ReadAliasFile(*file);
   if (!alias) return Failed(calls::ResultCodeOfAlias(alias.Error()));
   if (!alias->isAlias) return LookAtContent(moment, *file);
-  if (!alias->content) return Failed(paramErr);
+  if (!alias->content) return Failed(calls::ResultCodeOfAlias(alias->content.Error()));
   return AnswerTo(moment, *alias->content, Container::kAliasFile, &*file);
 }
 

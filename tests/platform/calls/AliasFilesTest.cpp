@@ -866,6 +866,14 @@ TEST_F(RefusedAliases, ThatMayNotBeRead) {
   EXPECT_TRUE(IsRefusedToNobody(alias, false));
 }
 
+// The beginning of the data tells that it is an alias file.
+TEST_F(RefusedAliases, WhoseBookmarkIsBrokenAndWhoseRecordMayNotBeRead) {
+  const std::string cut = Write(Bookmark({"folder", "file"})).File().substr(0, 60);
+  const std::string alias = MakeAlias("alias", Write(ByPath("folder/file")), cut);
+  chmod(At("._alias").c_str(), 0600);
+  EXPECT_TRUE(IsRefusedToNobody(alias, true));
+}
+
 TEST_F(RefusedAliases, AreNoneWhereTheyMayBeRead) {
   EXPECT_FALSE(IsRefusedToNobody(MakeAlias(ByPath("folder/file")), true));
 }
