@@ -31,10 +31,11 @@ void Report::Print(const Finding& finding) {
 
 void Report::Count(const Finding& finding) {
   ++mItems;
-  if (finding.outcome == Outcome::kFound) ++mFound;
-  if (finding.outcome == Outcome::kNew) ++mNew;
+  if (!finding.isFailure) {
+    ++(finding.outcome == Outcome::kNew ? mNew : mFound);
+    return;
+  }
   if (finding.outcome == Outcome::kNothing) ++mNothing;
-  if (!finding.isFailure) return;
   mStatus = kFailed;
   mBar.Hide();
   if (!finding.complaint.empty()) Complain(finding.complaint);

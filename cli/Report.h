@@ -37,9 +37,9 @@ class Report {
   ProgressBar mBar;
   std::uint64_t mTaken = 0;    // items that have been read
   std::uint64_t mItems = 0;    // items that have a finding
-  std::uint64_t mFound = 0;    // of those
-  std::uint64_t mNew = 0;      // of those
-  std::uint64_t mNothing = 0;  // of those
+  std::uint64_t mFound = 0;    // of those: answered
+  std::uint64_t mNew = 0;      // answered
+  std::uint64_t mNothing = 0;  // failed, as nothing is there; the rest failed for another reason
   int mStatus = 0;
 };
 

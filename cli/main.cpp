@@ -172,16 +172,24 @@ class CommandLine {
     return command;
   }
 
+  // A command that answers each item, in any form.
   CLI::App* AddForItems(const std::string& name, const std::string& what,
                         const std::string& examples, std::function<int()> run) {
     CLI::App* const command = Add(name, what, examples, std::move(run));
     AddJson(command);
     AddNullInput(command);
-    Format& format = mArguments.items.format;
-    command->add_flag("--null-output", format.hasNullOutput,
-                      "Results end with a NUL, not a newline; JSON is lines all the same");
-    command->add_flag("--existing", format.isExistingOnly, "Fail for what does not exist");
-    AddQuiet(command);
+    command->add_flag("--existing", mArguments.items.format.isExistingOnly,
+                      "Fail for what does not exist");
+    return command;
+  }
+
+  // A command that answers each item with a line.
+  CLI::App* AddConversion(const std::string& name, const std::string& what,
+                          const std::string& examples, std::function<int()> run) {
+    CLI::App* const command = AddForItems(name, what, examples, std::move(run));
+    AddNullOutput(command);
+    AddQuiet(command, "Neither a progress bar nor a summary");
+    AddNoProgress(command);
     return command;
   }
 
@@ -190,10 +198,17 @@ class CommandLine {
                       "Items of standard input end with a NUL, not a newline");
   }
 
-  void AddQuiet(CLI::App* command) {
-    Format& format = mArguments.items.format;
-    command->add_flag("-q,--quiet", format.isQuiet, "Neither a progress bar nor a summary");
-    command->add_flag("--no-progress", format.hasNoProgress, "No progress bar");
+  void AddNullOutput(CLI::App* command) {
+    command->add_flag("--null-output", mArguments.items.format.hasNullOutput,
+                      "Results end with a NUL, not a newline; JSON is lines all the same");
+  }
+
+  void AddQuiet(CLI::App* command, const std::string& what) {
+    command->add_flag("-q,--quiet", mArguments.items.format.isQuiet, what);
+  }
+
+  void AddNoProgress(CLI::App* command) {
+    command->add_flag("--no-progress", mArguments.items.format.hasNoProgress, "No progress bar");
   }
 
   void AddJson(CLI::App* command) {
@@ -270,19 +285,20 @@ void CommandLine::AddRecordOptions(CLI::App* command) {
 
 void CommandLine::AddRecords() {
   Arguments& a = mArguments;
-  CLI::App* command = AddForItems("spec", "Print the record of each path, as volume:parent:name",
-                                  "  tallowmere-cli spec /etc/hostname\n"
-                                  "  find . -print0 | tallowmere-cli spec -0 --json -",
-                                  [&a] { return PrintRecords(a.items, a.asHex); });
+  CLI::App* command = AddConversion("spec", "Print the record of each path, as volume:parent:name",
+                                    "  tallowmere-cli spec /etc/hostname\n"
+                                    "  find . -print0 | tallowmere-cli spec -0 --json -",
+                                    [&a] { return PrintRecords(a.items, a.asHex); });
   AddItems(command, "path", "Files or folders, also new ones in an existing folder");
   command->add_flag("--hex", a.asHex, "The 70 bytes of the record in hexadecimal");
 
-  command = AddForItems("path", "Print the path of each record",
-                        "  tallowmere-cli path -27:19:hostname\n"
-                        "  tallowmere-cli spec --hex - <paths | tallowmere-cli path -\n"
-                        "  tallowmere-cli path --volume '/mnt/Old Disk' --byte-order big --packed "
-                        "records.bin",
-                        [&a] { return PrintPathsOfRecords(a.items, a.records); });
+  command =
+      AddConversion("path", "Print the path of each record",
+                    "  tallowmere-cli path -27:19:hostname\n"
+                    "  tallowmere-cli spec --hex - <paths | tallowmere-cli path -\n"
+                    "  tallowmere-cli path --volume '/mnt/Old Disk' --byte-order big --packed "
+                    "records.bin",
+                    [&a] { return PrintPathsOfRecords(a.items, a.records); });
   AddItems(command, "record",
            "volume:parent:name, or the 70 bytes in hexadecimal or base64; with --packed, files");
   AddRecordOptions(command);
@@ -290,16 +306,16 @@ void CommandLine::AddRecords() {
 
 void CommandLine::AddHFSPaths() {
   Arguments& a = mArguments;
-  CLI::App* command = AddForItems("hfs", "Print the full HFS path of each path",
-                                  "  tallowmere-cli hfs /usr/bin/env /usr/bin",
-                                  [&a] { return PrintHFSPaths(a.items); });
+  CLI::App* command = AddConversion("hfs", "Print the full HFS path of each path",
+                                    "  tallowmere-cli hfs /usr/bin/env /usr/bin",
+                                    [&a] { return PrintHFSPaths(a.items); });
   AddItems(command, "path", "Files or folders");
 
-  command = AddForItems("posix", "Print the path of each HFS path",
-                        "  tallowmere-cli posix Root:usr:bin:env\n"
-                        "  tallowmere-cli hfs - <paths | tallowmere-cli posix -\n"
-                        "  tallowmere-cli posix --map 'Old Disk=/srv/copies/old' 'Old Disk:Mix'",
-                        [&a] { return PrintPathsOfHFSPaths(a.items, a.records.places); });
+  command = AddConversion("posix", "Print the path of each HFS path",
+                          "  tallowmere-cli posix Root:usr:bin:env\n"
+                          "  tallowmere-cli hfs - <paths | tallowmere-cli posix -\n"
+                          "  tallowmere-cli posix --map 'Old Disk=/srv/copies/old' 'Old Disk:Mix'",
+                          [&a] { return PrintPathsOfHFSPaths(a.items, a.records.places); });
   AddItems(command, "hfspath", "HFS paths, in UTF-8");
   command
       ->add_option("--map", a.records.places.maps,
@@ -311,20 +327,21 @@ void CommandLine::AddHFSPaths() {
 
 void CommandLine::AddNames() {
   Arguments& a = mArguments;
-  CLI::App* command =
-      AddForItems("name", "Print the HFS name of each path",
-                  "  tallowmere-cli name 'a file: new.txt'", [&a] { return PrintNames(a.items); });
+  CLI::App* command = AddConversion("name", "Print the HFS name of each path",
+                                    "  tallowmere-cli name 'a file: new.txt'",
+                                    [&a] { return PrintNames(a.items); });
   AddItems(command, "path", "Files or folders");
 
-  command = AddForItems("append", "Print the path of each HFS name in a folder",
-                        "  tallowmere-cli append /tmp 'Mix 1/2.aif'",
-                        [&a] { return PrintPathsOfNames(a.items, a.folder); });
+  command = AddConversion("append", "Print the path of each HFS name in a folder",
+                          "  tallowmere-cli append /tmp 'Mix 1/2.aif'",
+                          [&a] { return PrintPathsOfNames(a.items, a.folder); });
   command->add_option("folder", a.folder, "The folder")->required()->type_name("");
   AddItems(command, "name", "HFS names, in UTF-8, also new ones");
 
   command = AddForItems(
       "identify", "Print record, full HFS path and the way back of each path, as a table",
       "  tallowmere-cli identify / /usr/bin/env", [&a] { return PrintIdentities(a.items); });
+  AddQuiet(command, "No summary");
   AddItems(command, "path", "Files or folders, also new ones in an existing folder");
 }
 
@@ -367,7 +384,8 @@ void CommandLine::AddCensusAndAliases() {
           "  tallowmere-cli census /home",
           [&a] { return TakeCensus(a.items.client, a.items.format, a.folder); });
   AddJson(command);
-  AddQuiet(command);
+  AddQuiet(command, "No progress bar");
+  AddNoProgress(command);
   command->add_option("folder", a.folder, "The folder")->required()->check(CLI::ExistingDirectory);
 
   command =
@@ -377,7 +395,7 @@ void CommandLine::AddCensusAndAliases() {
           [&a] { return PrintAliases(a.items.items, a.items.format, a.asHex); });
   AddJson(command);
   AddNullInput(command);
-  command->add_flag("-q,--quiet", a.items.format.isQuiet, "No summary");
+  AddQuiet(command, "No summary");
   AddItems(command, "file", "Alias files, or files with a record or bookmark");
   command->add_flag("--hex", a.asHex, "The items are bytes as hexadecimal digits");
 }

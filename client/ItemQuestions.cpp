@@ -133,18 +133,43 @@ class HFSPathQuestion final : public ItemQuestion<std::string> {
  private:
   Result<std::string> ValueOf(Exchange& exchange, FSSpec record) override {
     if (record.parID == kParentOfRoots && mOwn) return OfRoot(exchange);
-    const auto& folder = *GetPlace().folder->fullPath;
-    if (!folder) return folder.Failure();
     if (mOwn && !*mOwn) return mOwn->Failure();
-    std::string path = *folder + record.name;
-    if (!mOwn) return Whole(exchange, std::move(path), *folder, FolderOf(GetPlace().path));
-    path.push_back(protocol::kSeparator);
-    // Of a folder at which a kernel interface is mounted, the service tells that of its holder.
-    if (**mOwn == *folder) return path;
-    if (**mOwn != path) {
-      if (auto error = exchange.WhyNotBack(**mOwn, GetPlace().path)) return *std::move(error);
+    const auto& holder = *GetPlace().folder->fullPath;
+    if (!mOwn) {
+      if (!holder) return holder.Failure();
+      return Whole(exchange, *holder + record.name, *holder, FolderOf(GetPlace().path));
     }
-    return Whole(exchange, **mOwn, **mOwn, GetPlace().path);
+    std::string path = holder ? *holder + record.name + protocol::kSeparator : "";
+    if (**mOwn == path || (holder && IsLongNameIn(*holder))) {
+      return Whole(exchange, **mOwn, **mOwn, GetPlace().path);
+    }
+    return OfMountPoint(exchange, holder, std::move(path));
+  }
+
+  // Whether the folder's own path ends with a name in its holder of which the record has but a
+  // short form, and is too long to be asked about.
+  bool IsLongNameIn(const std::string& holder) const {
+    const std::string& own = **mOwn;
+    return own.size() > protocol::kLongestHFSPath && own.starts_with(holder) &&
+           own.find(protocol::kSeparator, holder.size()) == own.size() - 1;
+  }
+
+  // Of a folder at which something is mounted that is no volume of its own, the service tells the
+  // path at which that is mounted first, or for a kernel interface that of the folder that holds
+  // it. Where this leads elsewhere, the folder has its path as an item of its holder.
+  Result<std::string> OfMountPoint(Exchange& exchange, const Result<std::string>& holder,
+                                   std::string path) {
+    const std::string& place = GetPlace().path;
+    const std::string& first = **mOwn;
+    const bool isKnown = first.size() <= protocol::kLongestHFSPath;
+    if (isKnown && !exchange.WhyNotBack(first, place)) return first;
+    if (!holder) return holder.Failure();
+    // The folder of a kernel interface is found without the colon at its end.
+    const std::string_view withoutColon = std::string_view(path).substr(0, path.size() - 1);
+    if (auto error = exchange.WhyNotBack(std::string(withoutColon), place)) {
+      return *std::move(error);
+    }
+    return Whole(exchange, std::move(path), *holder, FolderOf(place));
   }
 
   Result<std::string> OfRoot(Exchange& exchange) {

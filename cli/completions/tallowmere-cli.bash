@@ -3,7 +3,7 @@
 _tallowmere_cli() {
   local -A options=(
     [volumes]='--json'
-    [identify]='-0 --null --null-output --existing -q --quiet --no-progress --json'
+    [identify]='-0 --null --existing -q --quiet --json'
     [spec]='--hex -0 --null --null-output --existing -q --quiet --no-progress --json'
     [path]='--volume --volumes --byte-order --packed --skip --stride --other-volumes -0 --null --null-output --existing -q --quiet --no-progress --json'
     [hfs]='-0 --null --null-output --existing -q --quiet --no-progress --json'

@@ -24,18 +24,25 @@ complete -c tallowmere-cli -n $no_command -a serve-check -d 'Exercise each reque
 complete -c tallowmere-cli -n $no_command -a help -d 'Help for a command'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from help' -f -a "$commands"
 
-set -l with_items '__fish_seen_subcommand_from identify spec path hfs posix name append'
+set -l conversions '__fish_seen_subcommand_from spec path hfs posix name append'
+set -l identify '__fish_seen_subcommand_from identify'
+set -l census '__fish_seen_subcommand_from census'
 set -l alias '__fish_seen_subcommand_from alias'
-complete -c tallowmere-cli -n $alias -s q -l quiet -d 'No summary'
-for condition in $with_items $alias
+complete -c tallowmere-cli -n $conversions -s q -l quiet -d 'Neither a progress bar nor a summary'
+complete -c tallowmere-cli -n $census -s q -l quiet -d 'No progress bar'
+for condition in $identify $alias
+    complete -c tallowmere-cli -n $condition -s q -l quiet -d 'No summary'
+end
+for condition in $conversions $identify $alias
     complete -c tallowmere-cli -n $condition -s 0 -l null -d 'Items end with a NUL'
 end
-complete -c tallowmere-cli -n $with_items -l null-output -d 'Results end with a NUL'
-complete -c tallowmere-cli -n $with_items -l existing -d 'Fail for what is new'
-for condition in $with_items '__fish_seen_subcommand_from census'
-    complete -c tallowmere-cli -n $condition -s q -l quiet -d 'Neither a progress bar nor a summary'
+for condition in $conversions $identify
+    complete -c tallowmere-cli -n $condition -l existing -d 'Fail for what is new'
+end
+for condition in $conversions $census
     complete -c tallowmere-cli -n $condition -l no-progress -d 'No progress bar'
 end
+complete -c tallowmere-cli -n $conversions -l null-output -d 'Results end with a NUL'
 complete -c tallowmere-cli -n "__fish_seen_subcommand_from $commands; and not __fish_seen_subcommand_from help" -l json -d 'One JSON object a line'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from spec' -l hex -d 'The 70 bytes as hexadecimal digits'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from alias' -l hex -d 'The items are hexadecimal digits'

@@ -246,17 +246,35 @@ def _fail_too_long(place: Place) -> NoReturn:
 
 def _mounted_path(place: Place, spec: FSSpec, full: bytes) -> Plan[bytes]:
     """The path of an item on another device than its folder: a subvolume, a folder of another volume, a file mounted
-    by itself, or a kernel interface, whose full path is that of an outer folder. Only the way back tells them apart."""
+    by itself, or a kernel interface.
+
+    The full path is the one where that is mounted first, or of an interface that of the folder that holds it. Where it
+    leads elsewhere, the item has its path in the folder that it is mounted in.
+    """
     [outer] = yield [request.make_full_path(place.folder)]
-    end = b":" if place.is_folder else b""
-    for own in ([full] if place.is_folder else []) + [outer + spec.name + end]:
-        _, back = yield from _result_and_path(own)
+    own: bytes = outer + spec.name + (b":" if place.is_folder else b"")
+    if place.is_folder and full not in (outer, own) and len(full) <= MOST_HFS_BYTES:
+        _, back = yield from _result_and_path(full)
         if back is not None and _is_same(back, place):
-            return bytes(own)
-    if len(full) <= MOST_HFS_BYTES or not full.endswith(b":" + spec.name + b":"):
-        _fail_on_no_volume(place)
-    yield from _check_whole(place, full)  # too long to be led back by
-    return full
+            return full
+    if len(own) <= MOST_HFS_BYTES:
+        yield from _check_leads_back(place, spec, own)
+    else:
+        yield from _check_whole(place, own if place.is_folder else outer)
+    if len(own) > _MOST_FULL_PATH:
+        _fail_too_long(place)
+    return own
+
+
+def _check_leads_back(place: Place, spec: FSSpec, full: bytes) -> Plan[None]:
+    result, back = yield from _result_and_path(full)
+    if back is not None and _is_same(back, place):
+        return
+    if back is not None:
+        fail(Outcome.AMBIGUOUS, f"The HFS path of {quoted(place.path)} leads to {quoted(back)}.")
+    if result != _NOT_PERMITTED:
+        yield from _check_volume(place, spec, full)
+    fail(Outcome.REFUSED, f"The folders above {quoted(place.path)} cannot all be looked at.")
 
 
 def _result_and_path(full: bytes) -> Plan[Tuple[int, Optional[str]]]:

@@ -519,6 +519,41 @@ class Volumes(ConversionTest):
         )
         self.assertEqual(said, "True True\n")
 
+    def test_a_kernel_interface_that_is_mounted_twice_has_a_path_at_each_place(self) -> None:
+        said = in_own_mounts(
+            self,
+            """
+            os.makedirs("first"); os.makedirs("folder/second")
+            outer = client.hfs_path_of(".").text
+            for place in ("first", "folder/second"): mount("--bind", "/proc", place)
+            for place in ("first", "folder/second"):
+                own = client.hfs_path_of(place)
+                print(own.text[len(outer):], os.path.relpath(client.path_of_hfs_path(own.value).value))
+            """,
+        )
+        self.assertEqual(said, "first: first\nfolder:second: folder/second\n")
+
+    def test_what_is_mounted_beside_two_volumes_of_one_name_leads_back_or_is_ambiguous(self) -> None:
+        said = in_own_mounts(
+            self,
+            """
+            def show(source, place): os.makedirs(place); mount("--bind", source, place)
+            for place in ("a/vol", "b/vol"):
+                os.makedirs(place); mount("-t", "tmpfs", "none", place)
+            os.mkdir("a/vol/in a"); os.mkdir("b/vol/in b")
+            open("a/vol/file", "w").close(); open("b/vol/other", "w").close()
+            show("b/vol/in b", "shown"); show("b/vol/in b", "a/vol/shown")
+            show("a/vol/in a", "b/vol/first"); show("b/vol/in b", "b/vol/shown"); show("/proc", "b/vol/proc")
+            mount("--bind", "a/vol/file", "b/vol/other")
+            outer = client.hfs_path_of(".").text
+            for path in ("shown", "a/vol/shown", "b/vol/first",
+                         "shown/new", "b/vol/shown", "b/vol/proc", "b/vol/other"):
+                try: print(client.hfs_path_of(path).text.replace(outer, "HERE:"))
+                except ConversionError as error: print(error.outcome.value)
+            """,
+        )
+        self.assertEqual(said, "HERE:shown:\nvol:shown:\nvol:in a:\n" + "ambiguous\n" * 4)
+
     def test_a_folder_of_another_mount_comes_back(self) -> None:
         said = in_own_mounts(
             self,

@@ -192,6 +192,15 @@ TEST(CommandLine, HelpIsAnOptionAndACommand) {
   }
 }
 
+// It prints a table, and shows no progress.
+TEST(CommandLine, IdentifyHasNoOptionsThatDoNothing) {
+  for (const char* const option : {"--null-output", "--no-progress"}) {
+    EXPECT_EQ(
+        WhatIsWrongWith({"identify", option, "/"}),
+        std::string("tallowmere-cli: there is no option ") + option + "; --help tells more\n");
+  }
+}
+
 TEST(CommandLine, TheVersionHasAShortOption) {
   EXPECT_EQ(Printed({"-V"}), Printed({"--version"}));
 }

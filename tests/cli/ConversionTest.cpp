@@ -245,6 +245,14 @@ TEST_F(Conversion, ManyItemsEndInASummary) {
   EXPECT_EQ(Cli({"name", "--json", "--quiet", "-"}, input).errors, "");
 }
 
+// Of four counts each item is in one.
+TEST_F(Conversion, WhatFailsForBeingNewIsSummedUpAsFailed) {
+  std::string input = mFile + "\n" + mHere + "/missing/x\n";
+  for (int i = 0; i < 1000; ++i) input += mHere + "/new\n";
+  EXPECT_EQ(Cli({"name", "--json", "--existing", "-"}, input).errors,
+            "tallowmere-cli: 1002 items: 1 found, 0 new, 1 nothing, 1000 failed\n");
+}
+
 // Beside those on pipes, of which there are fewer than items.
 TEST_F(Conversion, AnItemCostsTheCommandLineFewSystemCalls) {
   if (access("/usr/bin/strace", X_OK) != 0) GTEST_SKIP() << "strace is not installed";
@@ -281,7 +289,7 @@ TEST_F(Conversion, NullEndsTheItemsAndNullOutputTheResults) {
 
 TEST_F(Conversion, JsonIsOneObjectALineWhateverEndsItemsAndResults) {
   const std::string items = mFile + '\0' + mHere + '\0';
-  for (const char* const command : {"name", "spec", "hfs", "identify"}) {
+  for (const char* const command : {"name", "spec", "hfs"}) {
     const Output output = Cli({command, "-0", "--null-output", "--json", "-"}, items);
     const auto lines = Lines(output.text);
     ASSERT_EQ(lines.size(), 2u) << command;
