@@ -25,14 +25,17 @@ FolderIndex::FolderIndex(volumes::VolumePointer volume)
 std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std::string& start,
                                              const volumes::Volumes& volumes) {
   if (!volumes.WithNumber(mVolume->Number())) return std::nullopt;
+  std::optional<std::string> likely;  // the answer of the look before
   try {
     for (int look = 0; look < kMostLooks; ++look) {
       const bool isLast = mKnown.walks == std::numeric_limits<WalkNumber>::max();
       if (mKnown.tree.IsMostlyWaste() || isLast || !HoldsUntilChange(*mVolume)) Clear();
       Question question(item, *mVolume, LastMissed(item.id));
-      const bool isProved = Run(question, start, volumes);
+      const Proof proof = Run(question, start, volumes);
       if (mKnown.waiting.empty()) mKnown.waiting = {};
-      if (isProved) return question.Answer();
+      if (proof == Proof::kCertain) return question.Answer();
+      if (proof == Proof::kLikely && likely == question.Answer()) return likely;
+      likely = proof == Proof::kLikely ? question.Answer() : std::nullopt;
     }
   } catch (...) {
     Clear();
@@ -41,17 +44,18 @@ std::optional<std::string> FolderIndex::Find(const SearchedItem& item, const std
   return std::nullopt;
 }
 
-// Returns whether the question has an answer. That only one place has the id is certain only if the
-// volume did not change during the walk.
-bool FolderIndex::Run(Question& question, const std::string& start,
-                      const volumes::Volumes& volumes) {
+// That only one place has the id is certain only if the volume did not change during the walk.
+FolderIndex::Proof FolderIndex::Run(Question& question, const std::string& start,
+                                    const volumes::Volumes& volumes) {
   VolumeWalk walk(*mVolume, volumes, mKnown, question);
   if (question.IsCertain()) walk.CheckKnownWithID();
-  if (question.IsSettled()) return true;
+  if (question.IsSettled()) return Proof::kCertain;
   if (!mKnown.isWhole || !mKnown.waiting.empty() || question.HasToReadAll()) walk.Walk(start);
   walk.CheckKnown();
   if (!question.IsSettled() && question.IsMissed()) NoteMissing(question.ID());
-  return mVolume->NumbersIdentifyItems() || !question.Answer() || walk.IsSteady();
+  if (mVolume->NumbersIdentifyItems() || !question.Answer()) return Proof::kCertain;
+  if (!walk.IsSteady()) return Proof::kNone;
+  return walk.MayHaveMissedChanges() ? Proof::kLikely : Proof::kCertain;
 }
 
 std::size_t FolderIndex::Size() const {

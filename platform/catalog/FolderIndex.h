@@ -10,7 +10,8 @@
 //
 // Where numbers do not identify items, an id is resolved only if exactly one place on the volume
 // has it: every folder was read, nothing was mounted on the volume or unreadable, and nothing
-// changed during the walk. Where change times are not reliable either, nothing is kept.
+// changed during the walk. Shortly after a change, when another one can have the same time, two
+// walks have to agree. Where change times are not reliable either, nothing is kept.
 //
 // One thread. Everything may throw std::bad_alloc, after which the index is as good as new.
 #pragma once
@@ -56,8 +57,15 @@ class FolderIndex {
     WalkNumber walk;  // the last one that met no item with it
   };
 
+  // How sure the answer of one walk is.
+  enum class Proof {
+    kNone,    // the volume changed meanwhile
+    kLikely,  // it may have: two walks have to agree
+    kCertain,
+  };
+
   void Clear();
-  bool Run(Question& question, const std::string& start, const volumes::Volumes& volumes);
+  Proof Run(Question& question, const std::string& start, const volumes::Volumes& volumes);
   WalkNumber LastMissed(std::uint32_t id) const;
   void NoteMissing(std::uint32_t id);
 

@@ -20,7 +20,12 @@ constexpr std::uint32_t kLinksWithoutSubfolders = 2;
 
 VolumeWalk::VolumeWalk(const volumes::Volume& volume, const volumes::Volumes& volumes,
                        KnownFolders& known, Question& question)
-    : mVolume(volume), mVolumes(volumes), mKnown(known), mTree(known.tree), mQuestion(question) {
+    : mVolume(volume),
+      mVolumes(volumes),
+      mKnown(known),
+      mTree(known.tree),
+      mQuestion(question),
+      mBegan(kernel::Now()) {
   ++mKnown.walks;
 }
 
@@ -263,6 +268,13 @@ bool VolumeWalk::IsSteady() const {
     if (!isAsSeen) return false;
   }
   return true;
+}
+
+bool VolumeWalk::MayHaveMissedChanges() const {
+  for (FolderNumber number = 0; number < mTree.Count(); ++number) {
+    if (IsSeen(number) && MayChangeUnseen(mTree[number].change, mBegan)) return true;
+  }
+  return false;
 }
 
 // Whether the folder is at its known place, unchanged since it was read, and need not be read for

@@ -50,6 +50,10 @@ class VolumeWalk {
   // already read.
   bool IsSteady() const;
 
+  // Whether a folder had changed so shortly before the walk that it may have changed again with the
+  // same time.
+  bool MayHaveMissedChanges() const;
+
  private:
   struct OpenFolder {
     FolderNumber number;
@@ -101,6 +105,7 @@ class VolumeWalk {
   KnownFolders& mKnown;
   FolderTree& mTree;
   Question& mQuestion;
+  kernel::Nanoseconds mBegan;
   bool mHasMissedStart = false;
   std::vector<OpenFolder> mOpen;  // the innermost folders on the way to the current one
 };

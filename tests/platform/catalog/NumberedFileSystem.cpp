@@ -34,6 +34,7 @@ constexpr ino_t kFirstOwnNumber = 0x1000;
 // Nodes are never given away again; the kernel's number of one is its index.
 std::vector<Node> nodes;
 bool ignoresCase = false;
+NumberedFileSystem::Ticks ticks = NumberedFileSystem::Ticks::kFine;
 
 struct stat About(ino_t number, mode_t mode) {
   struct stat about {};
@@ -72,9 +73,11 @@ void GetAttributes(fuse_req_t request, fuse_ino_t node, fuse_file_info*) {
   fuse_reply_attr(request, &nodes[node].about, 0);
 }
 
-// In ticks where it passes for an old volume, so that two changes can have one time.
 void Touch(fuse_ino_t node) {
-  clock_gettime(ignoresCase ? CLOCK_REALTIME_COARSE : CLOCK_REALTIME, &nodes[node].about.st_ctim);
+  const bool isFine = ticks == NumberedFileSystem::Ticks::kFine;
+  timespec& change = nodes[node].about.st_ctim;
+  clock_gettime(isFine ? CLOCK_REALTIME : CLOCK_REALTIME_COARSE, &change);
+  if (ticks == NumberedFileSystem::Ticks::kSeconds) change.tv_nsec = 0;
 }
 
 void SetAttributes(fuse_req_t request, fuse_ino_t node, struct stat* given, int which,
@@ -146,9 +149,7 @@ std::string MakeBlockDevice(const std::string& file) {
   return isMade ? device : "";
 }
 
-[[noreturn]] void Serve(const std::string& place, NumberedFileSystem::On on,
-                        NumberedFileSystem::Case letterCase) {
-  ignoresCase = letterCase == NumberedFileSystem::Case::kIgnored;
+[[noreturn]] void Serve(const std::string& place, NumberedFileSystem::On on) {
   nodes.resize(FUSE_ROOT_ID + 1);
   nodes[FUSE_ROOT_ID].about = About(FUSE_ROOT_ID, S_IFDIR | 0755);
   fuse_lowlevel_ops operations{};
@@ -176,12 +177,16 @@ std::string MakeBlockDevice(const std::string& file) {
 
 }  // namespace
 
-NumberedFileSystem::NumberedFileSystem(On on, Case letterCase) {
+NumberedFileSystem::NumberedFileSystem(On on, Case letterCase, Ticks howTimesAdvance) {
   const std::string place = mFolder.MakeFolder("numbered");
   struct stat before {};
   stat(place.c_str(), &before);
   mServer = fork();
-  if (mServer == 0) Serve(place, on, letterCase);
+  if (mServer == 0) {
+    ignoresCase = letterCase == Case::kIgnored;
+    ticks = howTimesAdvance;
+    Serve(place, on);
+  }
   for (int i = 0; i < 500 && !mIsMounted; ++i) {
     std::this_thread::sleep_for(std::chrono::milliseconds(10));
     struct stat now {};

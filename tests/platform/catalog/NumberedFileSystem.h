@@ -20,8 +20,13 @@ class NumberedFileSystem {
   // Whether a name finds an item whose name has ASCII letters in the other case.
   enum class Case { kCounts, kIgnored };
 
+  // How times advance: as finely as the clock, in the kernel's ticks of some milliseconds, or in
+  // seconds. Within a tick, all changes have one time.
+  enum class Ticks { kFine, kKernels, kSeconds };
+
   // Served by a child process. REQUIRES: the test is in a mount namespace of its own.
-  explicit NumberedFileSystem(On on = On::kNothing, Case letterCase = Case::kCounts);
+  explicit NumberedFileSystem(On on = On::kNothing, Case letterCase = Case::kCounts,
+                              Ticks ticks = Ticks::kFine);
   NumberedFileSystem(const NumberedFileSystem&) = delete;
   NumberedFileSystem& operator=(const NumberedFileSystem&) = delete;
   ~NumberedFileSystem();

@@ -32,7 +32,8 @@ class AnOldVolume : public testing::Test {
   void Mount(std::uint32_t type) {
     if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
     mType.emplace(type);
-    mVolume.emplace(NumberedFileSystem::On::kBlockDevice, NumberedFileSystem::Case::kIgnored);
+    mVolume.emplace(NumberedFileSystem::On::kBlockDevice, NumberedFileSystem::Case::kIgnored,
+                    NumberedFileSystem::Ticks::kKernels);
     if (!mVolume->IsMounted()) GTEST_SKIP() << "no FUSE here, or no block device for it";
     mNumber = InfoOf(Top()).volume;
   }
