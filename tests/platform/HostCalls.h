@@ -1,5 +1,4 @@
-// Makes records and references of real items through the host's own calls, for tests of those
-// calls.
+// Makes records and references of real items through the host's own calls, to test these.
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
@@ -83,8 +82,7 @@ inline std::string ItemWithID(SInt16 volume, std::uint32_t id) {
   return error == noErr ? PathOf(reference) : "(" + std::to_string(error) + ")";
 }
 
-// Returns the path of the folder with an id, as the start of an HFS path, or the result code in
-// brackets.
+// Returns the path of the folder with an id, found by FSMakeFSSpec, or the result code in brackets.
 inline std::string FolderWithID(SInt16 volume, std::uint32_t id) {
   FSSpec spec{};
   const OSErr error = FSMakeFSSpec(volume, static_cast<SInt32>(id), Str255Of("").bytes, &spec);
@@ -99,8 +97,7 @@ inline FSSpec MakeRecord(SInt16 volume, std::uint32_t parent, std::string_view n
   return spec;
 }
 
-// A volume's number and name. VolumeAt takes an index from 1 and gives number 0 past the last
-// volume.
+// A volume's number and name. VolumeAt takes an index from 1 and gives 0 past the last volume.
 struct VolumeAtIndex {
   SInt16 number;
   std::string name;

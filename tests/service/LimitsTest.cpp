@@ -261,7 +261,7 @@ TEST_F(UnreadableFolder, WithSearchPermissionHidesNoPathThroughIt) {
   ExpectRightAnswers(service, mItem);
 }
 
-TEST_F(UnreadableFolder, HidesWhatIsInItFromAPass) {
+TEST_F(UnreadableFolder, HidesItsItemsFromAPass) {
   Allow(0711);
   Service service(kAsNobody);
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(mKnown.record, 0, 0), kNoItemResponse));

@@ -28,8 +28,7 @@ class HFSPathsToRecords : public testing::Test {
     std::memset(&mSpec, 0xA5, sizeof mSpec);
     return FSMakeFSSpec(volume, static_cast<SInt32>(folder), Str255Of(path).bytes, &mSpec);
   }
-  // Returns what a path relative to a/b leads to: a path below the top, or the result code in
-  // brackets.
+  // Returns where a path relative to a/b leads: a path below the top, or the result in brackets.
   std::string From(std::string_view path) { return From(mInfo.volume, mInfo.nodeID, path); }
   std::string From(SInt16 volume, std::uint32_t folder, std::string_view path) {
     const OSErr error = Make(volume, folder, path);

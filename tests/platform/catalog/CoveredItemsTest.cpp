@@ -236,8 +236,7 @@ TEST_F(CoveredItemsInTheCurrentFolder, AreNotTakenForWhatTheirPathLeadsToNow) {
 
 // --- Links on the way ---------------------------------------------------------------------------
 
-// Behind a folder with search permission only, where an item can only be found by its remembered
-// place.
+// Behind a folder with search permission only, where only a remembered place leads to an item.
 class ItemsBehindALink : public testing::Test {
  protected:
   void SetUp() override {
@@ -269,8 +268,7 @@ TEST_F(ItemsBehindALink, ComeBackWhenTheLinkIsGone) {
   }));
 }
 
-// The path to a folder now leads through a link, so it is not the way by which it was first
-// reached.
+// The path to a folder now leads through a link and is no longer the path first used.
 class CoveredItemsBehindANewLink : public CoveredItems {
  protected:
   void SetUp() override {
@@ -290,7 +288,7 @@ class CoveredItemsBehindANewLink : public CoveredItems {
   FSSpec mSpec{};
 };
 
-TEST_F(CoveredItemsBehindANewLink, LeaveTheirShortFormToWhatCoversThem) {
+TEST_F(CoveredItemsBehindANewLink, LeaveTheirShortFormToTheirCover) {
   Cover("volume/moved/folder/\xE6\x97\xA5", PathTo("volume/source"));
   const FSSpec covering = SpecOf(PathTo("volume/way/folder/\xE6\x97\xA5"));
   EXPECT_EQ(ItemOf(SpecOf(PathTo("volume/source"))), PathTo("volume/source"));

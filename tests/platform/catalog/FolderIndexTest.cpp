@@ -62,7 +62,7 @@ TEST_F(AFolderIndex, FindsEveryKindOfItem) {
   for (const char* name : {"a/link", "a/pipe", "a/\xFF\n: name"}) ExpectFoundFrom("", name);
 }
 
-TEST_F(AFolderIndex, FindsWhatIsInFoldersWhoseNamesBeginWithDots) {
+TEST_F(AFolderIndex, FindsItemsInFoldersWhoseNamesBeginWithDots) {
   for (const std::string folder : {".a", "..a", "..."}) {
     mFolder.MakeFolder(folder);
     mFolder.MakeFile(folder + "/x");
@@ -110,7 +110,7 @@ class AFolderIndexOfAVolume : public AFolderIndex {
   std::optional<ScopedMount> mVolume;
 };
 
-TEST_F(AFolderIndexOfAVolume, EndsWithoutAnItemThatIsGone) {
+TEST_F(AFolderIndexOfAVolume, EndsWhenTheItemIsGone) {
   const kernel::Item item = ItemAt("volume/a/x");
   std::filesystem::remove(PathOf("volume/a/x"));
   EXPECT_EQ(Search(item, PathOf("volume/a")), std::nullopt);

@@ -39,8 +39,7 @@ class AMoment : public testing::Test {
       mFolder.MakeFolder(std::string(name) + "/a/b");
       mFolder.MakeFile(std::string(name) + "/a/b/x");
     }
-    // Child processes share the kernel's notice that mounts have changed, so this one consumes it
-    // first.
+    // Child processes share the kernel's notice of changed mounts, so consume it here first.
     VolumeAt(1);
   }
   std::string PathTo(const std::string& name) const { return mFolder.Path() / name; }

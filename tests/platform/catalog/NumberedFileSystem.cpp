@@ -131,8 +131,7 @@ void ReadFolder(fuse_req_t request, fuse_ino_t folder, size_t size, off_t offset
   fuse_reply_buf(request, buffer.data(), used);
 }
 
-// Returns a block device that lasts as long as the process, or an empty string where none is
-// possible.
+// Returns a block device that lasts as long as the process, or an empty string on failure.
 std::string MakeBlockDevice(const std::string& file) {
   constexpr off_t kSize = 1 << 20;
   loop_config config{};

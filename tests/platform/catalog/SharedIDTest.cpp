@@ -117,8 +117,7 @@ INSTANTIATE_TEST_SUITE_P(OnEachKind, ASharedID,
                            return isOnDisk ? "WithTrustedNumbers" : "WithOthers";
                          });
 
-// The platform looks each requested folder up by itself instead of taking a known item with the
-// same number.
+// The platform looks up each requested folder instead of taking a known item with its number.
 TEST(FoldersWithTheSameNumbers, EachHaveARecord) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const NumberedFileSystem numbered;

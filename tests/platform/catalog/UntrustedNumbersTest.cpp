@@ -1,5 +1,4 @@
-// Volumes on which two items can share device and inode number, so that only their places tell them
-// apart.
+// Volumes on which two items can share device and inode number and differ only in their places.
 #include <algorithm>
 #include <climits>
 
@@ -285,8 +284,7 @@ TEST_F(ABtrfsVolume, FindsWhatMovedWithItsSubvolume) {
   for (const char* name : {"s3", "s1", "s1/d", "s3/d", "s1/d/f", "s3/d/f"}) ExpectFound(name);
 }
 
-// An overlay with layers in two subvolumes. Its inode numbers cannot be trusted, but its change
-// times can.
+// An overlay with layers in two subvolumes: its change times can be trusted, its numbers cannot.
 class AnOverlayOfSubvolumes : public ABtrfsVolume {
  protected:
   void SetUp() override {

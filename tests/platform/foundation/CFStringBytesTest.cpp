@@ -243,7 +243,7 @@ TEST(CFStringPascal, MustBeValidInItsEncoding) {
             nullptr);
 }
 
-RC_GTEST_PROP(CFStringPascal, EveryMacRomanNameComesBack, ()) {
+RC_GTEST_PROP(CFStringPascal, EveryMacRomanNameSurvivesARoundTrip, ()) {
   const auto size = *rc::gen::inRange<std::size_t>(0, 256);
   std::string pascal(size + 1, static_cast<char>(size));
   for (std::size_t i = 1; i <= size; ++i) pascal[i] = *rc::gen::arbitrary<char>();
@@ -293,7 +293,7 @@ TEST(CFStringFileName, MaximumSizeIsEnoughWithTheNul) {
   EXPECT_EQ(NameOf(string.Get()), "\xE6\x97\xA5\xE6\x97\xA5");
 }
 
-RC_GTEST_PROP(CFStringFileName, EveryNameComesBack, ()) {
+RC_GTEST_PROP(CFStringFileName, EveryNameSurvivesARoundTrip, ()) {
   const auto bytes = *AnyName();
   RC_ASSERT(NameOf(MakeName(bytes).Get()) == bytes);
 }

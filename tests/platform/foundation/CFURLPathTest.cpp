@@ -151,7 +151,7 @@ TEST(CFURLPath, LongerThanALinuxPathSurvivesARoundTrip) {
   EXPECT_EQ(PathOf(MakeUrl(path, false)), path);
 }
 
-RC_GTEST_PROP(CFURLPath, EveryAbsolutePathComesBackWithTheMarkAsAsked, (bool folder)) {
+RC_GTEST_PROP(CFURLPath, EveryAbsolutePathSurvivesARoundTripWithTheRequestedMark, (bool folder)) {
   const std::string path = "/" + *AnyPath();
   const auto url = MakeUrl(path, folder);
   const auto name = path.substr(0, std::max(path.find_last_not_of('/') + 1, std::size_t{1}));
@@ -161,7 +161,7 @@ RC_GTEST_PROP(CFURLPath, EveryAbsolutePathComesBackWithTheMarkAsAsked, (bool fol
   RC_ASSERT(TextOfUrl(ParseUrl(text)) == text);
 }
 
-RC_GTEST_PROP(CFURLPath, EveryRelativePathComesBack, (bool folder)) {
+RC_GTEST_PROP(CFURLPath, EveryRelativePathSurvivesARoundTrip, (bool folder)) {
   const std::string path = *rc::gen::distinctFrom(AnyName(), std::string()) + *AnyPath();
   const auto url = MakeUrl(path, folder);
   RC_ASSERT(PathOf(url) == path.substr(0, path.find_last_not_of('/') + 1));

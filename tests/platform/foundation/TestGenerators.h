@@ -14,8 +14,7 @@ inline std::string Concatenated(const std::vector<std::string>& pieces) {
   return all;
 }
 
-// A byte, a character of valid UTF-8, or text with a meaning in URLs or path styles. Never NUL or
-// "/".
+// A byte but NUL and "/", a character of valid UTF-8, or text with a meaning in URLs or paths.
 inline rc::Gen<std::string> AnyNamePiece() {
   return rc::gen::oneOf(
       rc::gen::map(rc::gen::suchThat(rc::gen::inRange(1, 256), [](int c) { return c != '/'; }),

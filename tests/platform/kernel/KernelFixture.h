@@ -77,8 +77,7 @@ class AMountedImage : public testing::Test {
     return handle ? *handle : FileHandle{};
   }
 
-  // Opens an item by its numbers. Checks that it is the one at `path` and returns 0, or returns the
-  // error.
+  // Opens an item by its numbers. Returns the error, or 0 after checking that it is at `path`.
   int ErrorOfOpening(const HandleNumbers& numbers, const std::filesystem::path& path = {}) const {
     struct stat status {};
     EXPECT_EQ(fstat(Root(), &status), 0);

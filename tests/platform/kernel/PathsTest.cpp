@@ -148,7 +148,7 @@ TEST_F(PathsOfLinks, AreFollowedToAFolderThatIsHeld) {
   EXPECT_TRUE(OpenForReading({held->Get(), "b"}));
 }
 
-TEST_F(PathsOfLinks, AreToldOfAnOpenItem) {
+TEST_F(PathsOfLinks, AreReadFromAnOpenItem) {
   const auto held = HoldWithoutLinks(PathOf("a/b/x"));
   ASSERT_TRUE(held);
   EXPECT_EQ(*PathOfDescriptor(*held), PathOf("a/b/x"));
