@@ -45,8 +45,7 @@ std::string Bytes(UInt32 number, int count) {
   return bytes;
 }
 
-// The settings for an accepted sound contain that sound, and no shorter beginning of them is a
-// container.
+// The settings for an accepted sound contain that sound. No shorter beginning is a container.
 void CheckExport(const SoundDescription& sound, std::size_t cut) {
   quicktime::AIFFExporter exporter;
   const OSErr result = exporter.SetSound(sound);

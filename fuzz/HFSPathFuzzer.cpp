@@ -1,5 +1,4 @@
-// Converts HFS and Windows paths to Linux paths and back, with arbitrary bytes as each of the
-// three.
+// Converts HFS and Windows paths to Linux paths and back: arbitrary bytes as each of them.
 #include <optional>
 #include <string>
 

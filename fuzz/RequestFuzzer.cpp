@@ -29,8 +29,7 @@ namespace {
 
 constexpr std::size_t kCodeSize = sizeof(std::uint16_t);
 
-// The smallest buffer that surely has room for a shortened path after a volume's name of up to 63
-// bytes.
+// Has room for a shortened path after the longest volume's name of 63 bytes.
 constexpr std::uint16_t kSmallestBuffer = 69;
 
 template <class Number>
@@ -249,8 +248,7 @@ void CheckAnswer(std::string_view request, std::string_view bytes) {
   Check(answer.IsWhole() && answer.Size() == bytes.size());
 }
 
-// Nothing changes in the tree, so the same request always has the same answer, whatever was asked
-// in between.
+// Nothing changes in the tree, so the same request always has the same answer.
 void CheckAgainstEarlierAnswer(std::string_view request, std::string_view answer) {
   struct Known {
     std::size_t request;

@@ -1,8 +1,6 @@
-# Sourced by the scripts in this folder: ensures that the Debian packages that they need are
-# installed.
+# Sourced by the scripts in this folder: installs the Debian packages that they need, and builds.
 
-# need PACKAGE…: installs missing packages. Where that takes another user's rights, prints the
-# command to run and stops.
+# need PACKAGE…: installs missing packages. Without root, prints the command to run and exits with 1.
 need() {
   local missing=() package
   for package in "$@"; do
@@ -27,37 +25,37 @@ need() {
 
 to_build=(g++ cmake ninja-build libcli11-dev nlohmann-json3-dev)
 to_test=(libgtest-dev libgmock-dev librapidcheck-dev libfuse3-dev pkgconf python3 strace)
-# For tests on file systems made by these tools, and of the manual pages and completions.
+# For tests on file systems that these tools make, and tests of manual pages and completions.
 to_test+=(e2fsprogs xfsprogs btrfs-progs squashfs-tools dosfstools bindfs fuse-overlayfs)
 to_test+=(mandoc zsh fish jq inotify-tools)
-# A language with letters of its own for i and I.
+# For a Turkish locale, in which i and I are different letters.
 to_test+=(locales)
-# For the types of the Python client.
+# For the type hints of the Python client.
 to_test+=(mypy)
-# For tests on real HFS and HFS+ volumes in a machine of their own, and of the Debian packages.
+# For tests of real HFS and HFS+ volumes in a virtual machine, and tests of the Debian packages.
 to_emulate=(hfsutils user-mode-linux qemu-system-x86 busybox-static cpio)
 to_package=(dpkg-dev file python3)
-# Checks packages.
+# For checking the packages.
 to_check_packages=(lintian)
-# What the benchmarks compare with, and the library for their pieces in one process.
+# Programs that the benchmarks compare with, and the library for benchmarks within a process.
 to_measure=(libbenchmark-dev openssh-sftp-server bfs e2fsprogs btrfs-progs xfsprogs bindfs)
 to_format=(clang-format)
 to_lint=(clang-tidy)
 to_fuzz=(clang libclang-rt-dev)
 to_cover=(clang libclang-rt-dev llvm)
-# To build for other machines, and to run what was built.
+# For building for other machines and running the result.
 to_make_i386=(g++-i686-linux-gnu libc6-i386 lib32stdc++6)
 to_make_arm64=(g++-aarch64-linux-gnu qemu-user-static)
 
-# unpack_kernel FOLDER: puts Debian's kernel there, without installing it, unless the one that runs as
-# a program is installed. Without either, the tests that boot one are skipped.
+# unpack_kernel FOLDER: unpacks Debian's kernel there without installing it, unless User Mode Linux is
+# installed. Without either kernel, the tests that boot one are skipped.
 unpack_kernel() {
   [ -d "$1" ] && return
   ls /usr/lib/uml/modules/*/kernel/fs/hfs >/dev/null 2>&1 && return
   local package
   package=$(apt-cache show linux-image-amd64 2>/dev/null |
     sed -n 's/^Depends: \(linux-image-[^ ,]*\).*/\1/p' | head -1)
-  echo "== Unpacking ${package:-no kernel: apt knows none for this machine}"
+  echo "== Unpacking ${package:-no kernel, as apt has none for this machine}"
   [ -n "$package" ] || return 0
   mkdir -p "$1"
   if ! (cd "$1" && apt-get download -qq "$package" && dpkg-deb --fsys-tarfile ./*.deb |
@@ -69,7 +67,7 @@ unpack_kernel() {
   rm -f "$1"/*.deb
 }
 
-# build PRESET [TARGET…]: configures if that has not been done, then builds.
+# build PRESET [TARGET…]: configures if necessary, then builds.
 build() {
   local preset=$1
   shift
@@ -82,8 +80,8 @@ configure() {
   [ -f "build/$1/build.ninja" ] || cmake --preset "$1" >/dev/null
 }
 
-# lint CHECKS: runs the linter on the product's sources, with these of the checks in .clang-tidy.
-# Starts with the longest source, so that no processor waits for the last one.
+# lint CHECKS: runs these checks of .clang-tidy on all sources but tests and fuzz targets. Starts with
+# the longest source, so that all processors finish at about the same time.
 lint() {
   configure dev
   find . -path ./build -prune -o -path ./tests -prune -o -path ./fuzz -prune -o -name '*.cpp' -printf '%s %p\n' |

@@ -56,7 +56,7 @@ TEST(AddToPath, CollapsesNoSlash) {
   EXPECT_EQ(PathOf(reference), "//b");
 }
 
-TEST(AddToPath, ExpandsNoTildeBehindAPath) {
+TEST(AddToPath, ExpandsNoTildeAfterAPath) {
   CFileRef reference("/a", true);
   EXPECT_TRUE(reference.AddToPath("~", false));
   EXPECT_STREQ(reference.GetPath(), "/a/~");
@@ -477,7 +477,7 @@ TEST_F(ResolveAlias, OfAnEmptyReferenceChangesNothing) {
   EXPECT_TRUE(IsEmpty(reference));
 }
 
-TEST_F(ResolveAlias, OfAMissingItemZeroesTheFSRefAlone) {
+TEST_F(ResolveAlias, OfAMissingItemZeroesOnlyTheFSRef) {
   const auto path = mFolder.MakeFile("x");
   CFileRef reference = At("x");
   ASSERT_TRUE(reference.UpdateInternalFSRef());

@@ -135,7 +135,7 @@ TEST_F(Identity, FailureEmptiesTheCachedFSRef) {
   EXPECT_TRUE(IsZero(CachedFSRefOf(ref)));
 }
 
-TEST_F(Identity, TheVolumesNumberLeavesTheCachedFSRefAlone) {
+TEST_F(Identity, TheVolumesNumberLeavesTheCachedFSRefUnchanged) {
   mFolderRef.GetVolumeRefNumber();
   EXPECT_TRUE(IsZero(CachedFSRefOf(mFolderRef)));
 }

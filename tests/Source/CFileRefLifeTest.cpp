@@ -155,7 +155,7 @@ TEST(FileReference, ReadsOnlyTheLowestBitOfItsValidity) {
 
 // --- FSRefs -----------------------------------------------------------------------------------
 
-TEST(FileReferenceFSRef, IsThatOfTheItemAsItIsNow) {
+TEST(FileReferenceFSRef, IsThatOfTheCurrentItem) {
   const TemporaryFolder folder;
   const CFileRef reference((folder.Path() / "x").c_str(), false);
   EXPECT_TRUE(IsZero(static_cast<FSRef const&>(reference)));

@@ -185,7 +185,7 @@ TEST_F(SettingByFolder, WithANameIsTheExistingItem) {
   EXPECT_EQ(PathOf(ref), mData->Path("a:b"));
 }
 
-TEST_F(SettingByFolder, WhatCannotBeFoundLeavesTheReferenceAsItWas) {
+TEST_F(SettingByFolder, AnUnknownItemLeavesTheReferenceUnchanged) {
   const CFileRef file(mData->MakeFile("file").c_str(), false);
   const auto fileID = static_cast<long>(file.GetNodeID());
   const Volume other("Other");

@@ -144,7 +144,7 @@ TEST(PascalNames, EveryByteButTheColonSurvivesARoundTrip) {
   EXPECT_EQ(Convert(*text), (Converted{true, name}));
 }
 
-RC_GTEST_PROP(PascalNames, EveryHFSNameComesBack, (std::string name)) {
+RC_GTEST_PROP(PascalNames, EveryHFSNameSurvivesARoundTrip, (std::string name)) {
   if (name.size() > 255) name.resize(255);
   std::replace(name.begin(), name.end(), ':', '/');
   const auto text = Read(name);

@@ -1,5 +1,4 @@
-// Records and references of real items by the host's own calls, for the tests of what those
-// promise.
+// Makes records and references of real items through the host's own calls, to test these.
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
@@ -22,14 +21,14 @@ struct Str255Of {
   Str255 bytes = {};
 };
 
-// A reference to what is at a path, a link itself.
+// Returns a reference to the item at a path. A link is the item itself.
 inline FSRef ReferenceTo(const std::string& path) {
   FSRef item{};
   EXPECT_TRUE(CFURLGetFSRef(foundation::test::MakeUrl(path, false).Get(), &item)) << path;
   return item;
 }
 
-// Where the item is now; none when it is gone.
+// Returns the item's current path, or nullopt when it is gone.
 inline std::optional<std::string> PlaceOf(const FSRef& item) {
   const CFOwned url(CFURLCreateFromFSRef(kCFAllocatorDefault, &item));
   return url ? foundation::test::PathOf(url) : std::nullopt;
@@ -50,7 +49,7 @@ inline std::string NameOf(const FSSpec& spec) {
   return std::string(names::TextOfPascal(spec.name));
 }
 
-// By value: the field is not aligned, so no reference may be bound to it.
+// Returns a copy: the field is not aligned, so no reference may bind to it.
 inline std::uint32_t ParentOf(const FSSpec& spec) {
   return static_cast<std::uint32_t>(spec.parID);
 }
@@ -69,21 +68,21 @@ inline std::uint32_t IDOf(const std::string& path) {
   return InfoOf(path).nodeID;
 }
 
-// What FSpMakeFSRef finds: a path, or the result code in brackets.
+// Returns the path that FSpMakeFSRef finds, or the result code in brackets.
 inline std::string ItemOf(const FSSpec& spec) {
   FSRef reference{};
   const OSErr error = FSpMakeFSRef(&spec, &reference);
   return error == noErr ? PathOf(reference) : "(" + std::to_string(error) + ")";
 }
 
-// What FSResolveNodeID finds, likewise.
+// Returns the path that FSResolveNodeID finds, or the result code in brackets.
 inline std::string ItemWithID(SInt16 volume, std::uint32_t id) {
   FSRef reference{};
   const OSErr error = FSResolveNodeID(volume, id, &reference);
   return error == noErr ? PathOf(reference) : "(" + std::to_string(error) + ")";
 }
 
-// The folder with an id as the start of an HFS path, likewise.
+// Returns the path of the folder with an id, found by FSMakeFSSpec, or the result code in brackets.
 inline std::string FolderWithID(SInt16 volume, std::uint32_t id) {
   FSSpec spec{};
   const OSErr error = FSMakeFSSpec(volume, static_cast<SInt32>(id), Str255Of("").bytes, &spec);
@@ -98,7 +97,7 @@ inline FSSpec MakeRecord(SInt16 volume, std::uint32_t parent, std::string_view n
   return spec;
 }
 
-// The number of the volume with an index from 1, and its name; 0 past the last.
+// A volume's number and name. VolumeAt takes an index from 1 and gives 0 past the last volume.
 struct VolumeAtIndex {
   SInt16 number;
   std::string name;
@@ -112,7 +111,7 @@ inline VolumeAtIndex VolumeAt(SInt16 index) {
   return {block.volumeParam.ioVRefNum, std::string(names::TextOfPascal(name))};
 }
 
-// The number of the last volume with a name; 0 when there is none.
+// Returns the number of the last volume with this name, or 0.
 inline SInt16 VolumeNamed(std::string_view name) {
   SInt16 number = 0;
   SInt16 index = 1;
@@ -122,7 +121,7 @@ inline SInt16 VolumeNamed(std::string_view name) {
   return number;
 }
 
-// The inode number of what is at a path, as lstat(2) tells it.
+// Returns the inode number of the item at a path, from lstat(2).
 inline std::uint64_t InodeOf(const std::string& path) {
   struct stat about {};
   EXPECT_EQ(lstat(path.c_str(), &about), 0) << path;

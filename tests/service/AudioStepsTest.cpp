@@ -215,7 +215,7 @@ TEST_F(AudioSteps, AResultOf32BitsCountsByItsLow16Bits) {
   EXPECT_EQ(Run(), -32765);
 }
 
-TEST_F(AudioSteps, ARequestThatIsCutAsksTheHostForNothing) {
+TEST_F(AudioSteps, ATruncatedRequestCallsNothingOfTheHost) {
   const std::string fields = ExportSettingsRequest(44100u << 16, 16, 2, "twos").substr(2);
   for (std::size_t length = 0; length < fields.size(); ++length) {
     const auto ends = MakePipe();

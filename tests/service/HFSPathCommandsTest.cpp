@@ -45,7 +45,7 @@ TEST_F(HFSPathCommands, AFullPathIsTheVolumeAndTheFoldersEachWithAColon) {
   EXPECT_TRUE(expected.ends_with(mHFSPath.substr(mHFSPath.find(':') + 1)));
 }
 
-TEST_F(HFSPathCommands, AFullPathOfSize0IsItsLengthAlone) {
+TEST_F(HFSPathCommands, AFullPathOfSize0IsOnlyItsLength) {
   const auto length = static_cast<unsigned>(mHFSPath.size());
   EXPECT_TRUE(mService.Answers(FullPathRequest(mWork, 0, 1), U16(length).append(kTrailer)));
 }
@@ -184,7 +184,7 @@ TEST_F(HFSPathCommands, ANameIsAddedToAFolder) {
   EXPECT_TRUE(mService.Answers(AddNameRequest(mWork, "a/b", 0), PathResponse(mWork + "/a:b")));
 }
 
-TEST_F(HFSPathCommands, ANameIsAddedAsItIsToWhatIsNoFolder) {
+TEST_F(HFSPathCommands, ANameIsAddedUnconvertedToANonFolder) {
   EXPECT_TRUE(
       mService.Answers(AddNameRequest(mWork + "/f", "a/b", 0), PathResponse(mWork + "/f/a/b")));
 }

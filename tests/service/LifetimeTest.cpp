@@ -70,7 +70,7 @@ TEST_P(ArgumentThatNamesAProcess, KeepsTheServiceServing) {
 INSTANTIATE_TEST_SUITE_P(Lifetime, ArgumentThatNamesAProcess,
                          testing::Values("abc", "-1", "", "0", " Px", "\t+P"));
 
-TEST(Lifetime, ANumberEndsAtTheFirstCharacterThatIsNoDigit) {
+TEST(Lifetime, ANumberEndsAtTheFirstNonDigit) {
   Service service(" " + IDOfNoProcess() + "x");
   service.Write(kAnyRequest + kAnyRequest);
   EXPECT_EQ(service.ReadToEnd(), kItsResponse);

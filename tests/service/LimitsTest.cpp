@@ -52,8 +52,8 @@ class LimitsOfAPass : public Limits {
     if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
     mMount.emplace("tmpfs", mFolder.MakeFolder("Volume"), "tmpfs");
     ASSERT_TRUE(mMount->IsMounted());
-    // Uses up the small inode numbers. The item then gets an id that another item could share, and
-    // a folder that the user may not read leaves open which item is meant.
+    // Uses up the small inode numbers. Other items could share their ids, so a folder that the user
+    // may not read would leave open which item is meant.
     for (int i = 0; i < 20; ++i) std::filesystem::remove(MakeItem(Volume()));
   }
 
@@ -261,7 +261,7 @@ TEST_F(UnreadableFolder, WithSearchPermissionHidesNoPathThroughIt) {
   ExpectRightAnswers(service, mItem);
 }
 
-TEST_F(UnreadableFolder, HidesWhatIsInItFromAPass) {
+TEST_F(UnreadableFolder, HidesItsItemsFromAPass) {
   Allow(0711);
   Service service(kAsNobody);
   EXPECT_TRUE(service.Answers(PathOfRecordRequest(mKnown.record, 0, 0), kNoItemResponse));

@@ -53,8 +53,7 @@ class LockedIn : public testing::Test {
     mFolder.MakeFolder("old folder");
   }
 
-  // `wrapper` precedes the program. Returns no outcomes where the kernel does not permit the
-  // wrapper.
+  // `wrapper` precedes the program. Returns no outcomes where the kernel forbids the wrapper.
   Outcomes AttemptAll(const std::vector<std::string>& wrapper = {},
                       const std::string& program = TALLOWMERE_SERVICE) {
     const Listener listener((mFolder.Path() / "socket").string());

@@ -27,7 +27,7 @@ Service Redirected(const std::string& streams) {
   return Service(std::vector<std::string>{"sh", "-c", "exec \"$@\" " + streams, "sh"});
 }
 
-TEST(UnusualStreams, InputThatIsNotBlockingAndHasNoDataEndsTheServiceWithStatus0) {
+TEST(UnusualStreams, NonBlockingInputWithoutDataEndsTheServiceWithStatus0) {
   std::array<int, 2> ends{};
   ASSERT_EQ(pipe2(ends.data(), O_NONBLOCK), 0);
   Service service = Redirected("<&" + std::to_string(ends[0]));
@@ -179,7 +179,7 @@ TEST_F(NewItems, WithAColonKeepIt) {
   EXPECT_TRUE(Leads(RecordInFolder("a:b"), item));
 }
 
-TEST_F(NewItems, BehindALinkTakeASlashAsItStands) {
+TEST_F(NewItems, BehindALinkKeepASlash) {
   const std::string link = mFolder.MakeLink("link", mFolder.MakeFolder("folder"));
   EXPECT_TRUE(mService.Answers(AddNameRequest(link, "a/b", 0), PathResponse(link + "/a/b")));
 }

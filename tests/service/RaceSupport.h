@@ -126,8 +126,7 @@ class Truth {
     return testing::AssertionFailure() << "leads to another item";
   }
 
-  // Returns the item that the answer leads to. Resolves it with `after`, a service asked
-  // afterwards.
+  // Returns the item that the answer leads to, resolved by the service `after`.
   std::optional<Identity> ItemAnswered(const std::string& response, ChildProgram& after) const {
     return IdentityOf(PathAnswered(response, after));
   }

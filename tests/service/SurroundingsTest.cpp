@@ -67,7 +67,7 @@ TEST_F(Container, WithoutProcAnswersEveryRequestAboutItsOneVolume) {
   EXPECT_EQ(service->NumberOf("Disk"), 32767);
 }
 
-TEST_F(Container, WithoutProcHasNoRecordOfWhatIsOnAnotherVolume) {
+TEST_F(Container, WithoutProcHasNoRecordOfItemsOnAnotherVolume) {
   const auto service = Start(kWithoutProc);
   if (!service) GTEST_SKIP() << "namespaces or mounting are not permitted here";
   EXPECT_TRUE(service->Answers(RecordRequest("/Media/Disk/folder/a track.aif"),
@@ -113,7 +113,7 @@ TEST_P(ClockSetTo, ChangesNoAnswer) {
 }
 
 // A pass records which folders it has read and when. Folders that have changed are read again.
-TEST_P(ClockSetTo, DoesNotHideWhatHasChangedSinceAPass) {
+TEST_P(ClockSetTo, DoesNotHideChangesSinceAPass) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const TemporaryFolder folder;
   const ScopedMount volume("none", folder.MakeFolder("Volume").string(), "tmpfs");

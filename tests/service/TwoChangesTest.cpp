@@ -95,8 +95,7 @@ constexpr std::array<std::pair<Changes, const char*>, 8> kNames{{
 }};
 
 // A volume with the folders "first" and "second" and a link to "first", mounted at "here" or at
-// "there". The folders that it covers, and those that a bind mount shows, hold items of the same
-// name.
+// "there". The folders that it covers, and those that a bind mount shows, hold namesakes.
 class MovingVolume {
  public:
   MovingVolume(Changes changes, const Disk* disk) : mChanges(changes), mDisk(disk) {

@@ -153,8 +153,7 @@ void Churner::Change(const State& next, const std::function<int()>& call) {
   mHistory.Reach();
 }
 
-// Records the inode number before the state counts as reached. REQUIRES: the new entry is the last
-// one.
+// Records the inode number before the state counts as reached. REQUIRES: the new entry is last.
 void Churner::Make(const State& next, const std::string& path, const std::function<int()>& call) {
   State& state = mHistory.Begin(next);
   if (call() != 0) StopFor(path);

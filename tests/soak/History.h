@@ -9,8 +9,7 @@
 
 namespace tallowmere::soak {
 
-// The states of the tree in order. One thread writes, others read. The latest kKept states are
-// kept.
+// The states of the tree in order. One thread writes, others read. Only the latest kKept remain.
 class History {
  public:
   using Version = std::uint64_t;

@@ -88,8 +88,7 @@ void* Start(fuse_conn_info*, fuse_config* config) {
   return nullptr;
 }
 
-// Returns a block device that lasts as long as the process, or an empty string where none is
-// possible.
+// Returns a block device that lasts as long as the process, or an empty string on failure.
 std::string BlockDevice() {
   constexpr off_t kSize = 1 << 20;
   std::FILE* const file = std::tmpfile();

@@ -1,4 +1,4 @@
-// A parent application: asks the service for the record of a file, and for the file of that record.
+// A parent process: asks the service for the record of a file, and for the path of that record.
 #include <tallowmere/Client.h>
 
 #include <iostream>

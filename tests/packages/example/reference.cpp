@@ -1,4 +1,4 @@
-// The same without the service: the logic itself, linked in.
+// The same without the service, by linking the library.
 #include <CFileRef.h>
 #include <LegacyHFSBridge.h>
 

@@ -1,3 +1,4 @@
+// Which items the workspace takes for packages.
 #include <AppKit/Workspace.h>
 #include <gtest/gtest.h>
 #include <unistd.h>
@@ -53,14 +54,14 @@ TEST_F(APackage, IsNoFolderWithAnotherExtension) {
   }
 }
 
-TEST_F(APackage, IsToldByItsExtensionInAnyLetterCase) {
+TEST_F(APackage, IsRecognisedByItsExtensionInAnyLetterCase) {
   mFolder.MakeFolder("x.App");
   mFolder.MakeFolder("x.RTFD");
   EXPECT_TRUE(IsPackageHere("x.App"));
   EXPECT_TRUE(IsPackageHere("x.RTFD"));
 }
 
-TEST_F(APackage, IsToldByItsExtensionInTurkishToo) {
+TEST_F(APackage, IsRecognisedByItsExtensionInTurkishToo) {
   const TurkishLocale locale;
   if (!locale.IsChosen()) GTEST_SKIP() << "the C library's locales cannot be made here";
   mFolder.MakeFolder("x.IBPLUGIN");
@@ -97,13 +98,13 @@ TEST_F(APackage, IsNoLinkToAPackage) {
   EXPECT_FALSE(IsPackageHere("link.app/"));
 }
 
-TEST_F(APackage, IsToldFromAPathThatEndsInSlashes) {
+TEST_F(APackage, IsRecognisedFromAPathThatEndsInSlashes) {
   mFolder.MakeFolder("x.app");
   EXPECT_TRUE(IsPackageHere("x.app/"));
   EXPECT_TRUE(IsPackageHere("x.app//"));
 }
 
-TEST_F(APackage, IsToldFromARelativePath) {
+TEST_F(APackage, IsRecognisedFromARelativePath) {
   mFolder.MakeFolder("x.app");
   const auto former = std::filesystem::current_path();
   std::filesystem::current_path(mFolder.Path());
@@ -116,7 +117,7 @@ TEST_F(APackage, MayHaveANameThatIsNotUtf8) {
   EXPECT_TRUE(IsPackageHere("\xFF.app"));
 }
 
-TEST(NoPackage, IsWhatIsNoPathOrDoesNotExist) {
+TEST(NoPackage, IsAnInvalidPathOrAMissingItem) {
   EXPECT_FALSE(Workspace::IsFilePackageAtPath(nullptr));
   EXPECT_FALSE(IsPackage(""));
   EXPECT_FALSE(IsPackage("/"));

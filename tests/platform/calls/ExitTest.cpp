@@ -1,4 +1,4 @@
-// What is asked when the process ends, by handlers and by destructors of static objects.
+// Calls made while the process exits, from exit handlers and destructors of static objects.
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -13,7 +13,7 @@
 namespace tallowmere::test {
 namespace {
 
-// Where an item was, and what is known of it.
+// An item's path, reference and record from before the exit.
 std::string gPath;
 FSRef gItem;
 FSSpec gSpec;
@@ -24,7 +24,7 @@ bool IsAllRight() {
          FSpMakeFSRef(&gSpec, &again) == noErr && FSCompareFSRefs(&gItem, &again) == noErr;
 }
 
-// Made before anything of the platform, so that it is destroyed after all of it.
+// Constructed before any object of the platform, so destroyed after all of them.
 struct LastOfAll {
   ~LastOfAll() {
     if (isArmed) _exit(IsAllRight() ? 0 : 1);
@@ -32,7 +32,7 @@ struct LastOfAll {
   bool isArmed = false;
 } gLastOfAll;
 
-// The status of a child process that ends by exit(3) after `prepare`.
+// Returns the exit status of a child process that runs `prepare` and then calls exit(3).
 template <class Prepare>
 int StatusOfExit(Prepare prepare) {
   std::fflush(nullptr);
@@ -57,11 +57,11 @@ class AtTheEndOfTheProcess : public testing::Test {
   const TemporaryFolder mFolder;
 };
 
-TEST_F(AtTheEndOfTheProcess, AHandlerIsAnsweredRight) {
+TEST_F(AtTheEndOfTheProcess, AnExitHandlerGetsRightAnswers) {
   EXPECT_EQ(StatusOfExit([] { std::atexit([] { _exit(IsAllRight() ? 0 : 1); }); }), 0);
 }
 
-TEST_F(AtTheEndOfTheProcess, AStaticObjectIsAnsweredRight) {
+TEST_F(AtTheEndOfTheProcess, AStaticObjectGetsRightAnswers) {
   EXPECT_EQ(StatusOfExit([] { gLastOfAll.isArmed = true; }), 0);
 }
 

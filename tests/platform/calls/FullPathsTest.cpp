@@ -1,4 +1,4 @@
-// FSMakeFSSpec: records by HFS paths.
+// FSMakeFSSpec: the record that an HFS path leads to.
 #include <sys/mount.h>
 
 #include <algorithm>
@@ -28,7 +28,7 @@ class HFSPathsToRecords : public testing::Test {
     std::memset(&mSpec, 0xA5, sizeof mSpec);
     return FSMakeFSSpec(volume, static_cast<SInt32>(folder), Str255Of(path).bytes, &mSpec);
   }
-  // What a path relative to a/b leads to: a path below the top, or the result code.
+  // Returns where a path relative to a/b leads: a path below the top, or the result in brackets.
   std::string From(std::string_view path) { return From(mInfo.volume, mInfo.nodeID, path); }
   std::string From(SInt16 volume, std::uint32_t folder, std::string_view path) {
     const OSErr error = Make(volume, folder, path);
@@ -37,7 +37,7 @@ class HFSPathsToRecords : public testing::Test {
     if (found == mTop) return ".";
     return found.starts_with(mTop + "/") ? found.substr(mTop.size() + 1) : found;
   }
-  // A Linux path as a full HFS path.
+  // Returns a Linux path as a full HFS path.
   static std::string Full(std::string path) {
     std::replace(path.begin(), path.end(), '/', ':');
     return NameOf(SpecOf("/")) + path;
@@ -134,14 +134,14 @@ TEST_F(HFSPathsToRecords, AMissingLastNameFillsTheRecord) {
   EXPECT_EQ(ParentOf(mSpec), IDOf(mTop + "/a"));
 }
 
-TEST_F(HFSPathsToRecords, ARecordOfWhatIsMissingFindsItOnceItIsThere) {
+TEST_F(HFSPathsToRecords, ARecordOfAMissingItemFindsItOnceItExists) {
   EXPECT_EQ(Make(mInfo.volume, mInfo.nodeID, "later"), fnfErr);
   EXPECT_EQ(ItemOf(mSpec), "(-43)");
   const std::string path = mFolder.MakeFile("a/b/later");
   EXPECT_EQ(ItemOf(mSpec), path);
 }
 
-TEST_F(HFSPathsToRecords, AMissingNameThatNoRecordHoldsIsABadOne) {
+TEST_F(HFSPathsToRecords, AMissingNameThatFitsNoRecordIsABadName) {
   EXPECT_EQ(From(std::string(63, 'n')), "(-43)");
   EXPECT_EQ(From(std::string(64, 'n')), "(-37)");
   EXPECT_EQ(From(std::string(255, 'n')), "(-37)");
@@ -167,7 +167,7 @@ TEST_F(HFSPathsToRecords, AMissingFolderOnTheWayIsReported) {
   EXPECT_TRUE(IsUntouched());
 }
 
-// In the parent that every root has there are the roots alone.
+// The parent of all root folders holds only root folders.
 TEST_F(HFSPathsToRecords, TheParentOfRootsHoldsNothingButTheVolumesRoot) {
   EXPECT_EQ(From(mInfo.volume, 1, "no such volume"), "(-43)");
   EXPECT_EQ(ParentOf(mSpec), 1U);
@@ -186,17 +186,17 @@ TEST_F(HFSPathsToRecords, LinksToFoldersOnTheWayAreFollowed) {
   EXPECT_EQ(From("up"), "a/b/up");
   EXPECT_EQ(From("link"), "a/b/link");
   EXPECT_EQ(From(":link:x"), "(-120)");
-  // A climb is one from the folder that was reached.
+  // The climb starts from the folder that the link led to.
   EXPECT_EQ(From(":up::a"), From(Full(mTop).substr(0, Full(mTop).rfind(':')) + ":a"));
 }
 
-TEST_F(HFSPathsToRecords, ALinkOnTheWayThatLeadsNowhereIsAMissingFolder) {
+TEST_F(HFSPathsToRecords, ADanglingLinkOnTheWayIsAMissingFolder) {
   mFolder.MakeLink("a/b/link", "nowhere");
   EXPECT_EQ(From(":link:x"), "(-120)");
   EXPECT_TRUE(IsUntouched());
 }
 
-TEST_F(HFSPathsToRecords, LinksOnTheWayThatGoInACircleAreAMissingFolder) {
+TEST_F(HFSPathsToRecords, ACycleOfLinksOnTheWayIsAMissingFolder) {
   mFolder.MakeLink("a/b/link", "link");
   EXPECT_EQ(From(":link:x"), "(-120)");
   EXPECT_EQ(From(0, 0, Full(mTop + "/a/b/link/x")), "(-120)");
@@ -204,12 +204,12 @@ TEST_F(HFSPathsToRecords, LinksOnTheWayThatGoInACircleAreAMissingFolder) {
 }
 
 TEST_F(HFSPathsToRecords, AKnownFileOnTheWayOfAFullPathIsAMissingFolder) {
-  EXPECT_EQ(From(0, 0, Full(mTop + "/a/b/file")), "a/b/file");  // from now on its place is known
+  EXPECT_EQ(From(0, 0, Full(mTop + "/a/b/file")), "a/b/file");  // its place is cached from now on
   EXPECT_EQ(From(0, 0, Full(mTop + "/a/b/file/x")), "(-120)");
   EXPECT_TRUE(IsUntouched());
 }
 
-TEST_F(HFSPathsToRecords, AFullPathLeadsToTheFoldersThatAreThereNow) {
+TEST_F(HFSPathsToRecords, AFullPathLeadsToTheCurrentFolders) {
   const std::string path = Full(mTop + "/a/b/file");
   EXPECT_EQ(From(path), "a/b/file");
   EXPECT_EQ(From(path), "a/b/file");
@@ -226,7 +226,7 @@ TEST_F(HFSPathsToRecords, AFullPathLeadsToTheFoldersThatAreThereNow) {
   EXPECT_EQ(From(Full(mTop + "/a/b/")), "old/b");
 }
 
-TEST_F(HFSPathsToRecords, AFullPathLeadsIntoWhatIsMountedOnItsWayNow) {
+TEST_F(HFSPathsToRecords, AFullPathLeadsIntoANewMountOnItsWay) {
   const std::string path = Full(mTop + "/a/b/file");
   EXPECT_EQ(From(path), "a/b/file");
   const ScopedMount mounted("none", mTop + "/a/b", "tmpfs");

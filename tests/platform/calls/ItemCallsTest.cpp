@@ -19,7 +19,7 @@ namespace {
 
 constexpr SInt16 kNoVolume = 32767;
 
-// Bytes that a call which fails leaves as they are, padding among them.
+// Fills a record, padding included. A call that fails must leave these bytes as they are.
 constexpr unsigned char kFilling = 0xA5;
 template <class Record>
 void Fill(Record& record) {
@@ -38,7 +38,7 @@ std::u16string TextOf(const HFSUniStr255& name) {
 class ItemCalls : public testing::Test {
  protected:
   void SetUp() override {
-    // A volume of their own, where it is permitted, is soon searched for what is gone.
+    // Where permitted, uses a volume of its own, on which a search for a deleted item ends soon.
     if (EnterOwnMountNamespace()) mVolume.emplace("tmpfs", mFolder.Path(), "tmpfs");
     for (int i = 0; i < 20; ++i) std::filesystem::remove(mFolder.MakeFile("first"));
     mPath = mFolder.MakeFolder("folder");
@@ -63,7 +63,7 @@ class ItemCalls : public testing::Test {
   FSCatalogInfo mInfo{};
 };
 
-TEST_F(ItemCalls, CatalogInfoFillsOnlyWhatIsAskedFor) {
+TEST_F(ItemCalls, CatalogInfoFillsOnlyRequestedFields) {
   const FSRef reference = ReferenceTo(mFile);
   FSCatalogInfo info;
   Fill(info);
@@ -111,7 +111,7 @@ TEST_F(ItemCalls, CatalogInfoOfARootIsThatOfTheVolume) {
   EXPECT_EQ(ItemOf(spec), "/");
 }
 
-TEST_F(ItemCalls, CatalogInfoOfAnItemThatIsGoneWritesNothing) {
+TEST_F(ItemCalls, CatalogInfoOfADeletedItemWritesNothing) {
   const FSRef reference = ReferenceTo(mFile);
   std::filesystem::remove(mFile);
   FSCatalogInfo info;
@@ -154,7 +154,7 @@ TEST_F(ItemCalls, ANodeIDFindsFilesFoldersAndTheRoot) {
   EXPECT_EQ(PathOf(found), "/");
 }
 
-TEST_F(ItemCalls, IDsThatNoItemHasAreNotFound) {
+TEST_F(ItemCalls, UnknownIDsAreNotFound) {
   for (const std::uint32_t id : {0u, 1u, 3u, 15u, 0xFFFFFFFFu}) {
     FSRef reference;
     Fill(reference);
@@ -208,7 +208,7 @@ TEST_F(ItemCalls, AUnicodeNameFindsItsItem) {
   EXPECT_EQ(PathOf(found), accented);
 }
 
-TEST_F(ItemCalls, AUnicodeNameThatNothingHasIsNotFound) {
+TEST_F(ItemCalls, AnUnknownUnicodeNameIsNotFound) {
   const FSRef parent = ReferenceTo(mPath);
   const std::vector<std::u16string> names{u"",
                                           u".",
@@ -229,7 +229,7 @@ TEST_F(ItemCalls, AUnicodeNameThatNothingHasIsNotFound) {
   }
 }
 
-TEST_F(ItemCalls, AUnicodeNameInWhatIsNoFolderIsAnError) {
+TEST_F(ItemCalls, AUnicodeNameInAFileOrLinkIsAnError) {
   FSRef found{};
   EXPECT_EQ(MakeReference(ReferenceTo(mFile), u"x", found), errFSNotAFolder);
   const std::string link = mFolder.Path() / "link";
@@ -237,7 +237,7 @@ TEST_F(ItemCalls, AUnicodeNameInWhatIsNoFolderIsAnError) {
   EXPECT_EQ(MakeReference(ReferenceTo(link), u"file", found), errFSNotAFolder);
 }
 
-TEST_F(ItemCalls, AUnicodeNameInAFolderThatIsGoneIsNotFound) {
+TEST_F(ItemCalls, AUnicodeNameInADeletedFolderIsNotFound) {
   const FSRef parent = ReferenceTo(mPath);
   std::filesystem::remove_all(mPath);
   FSRef found{};
@@ -289,7 +289,7 @@ TEST_F(ItemCalls, AFileHasNoFolderInfo) {
   EXPECT_EQ(CatalogInfo(block), dirNFErr);
 }
 
-TEST_F(ItemCalls, OnlyIndexMinus1IsTaken) {
+TEST_F(ItemCalls, OnlyIndexMinus1IsAccepted) {
   for (const SInt16 index : std::vector<SInt16>{0, 1, -2, 32767, -32768}) {
     auto block = Block(mInfo.nodeID);
     block.dirInfo.ioFDirIndex = index;
@@ -297,7 +297,7 @@ TEST_F(ItemCalls, OnlyIndexMinus1IsTaken) {
   }
 }
 
-// Elsewhere a neighbour can take the number of what is gone.
+// On a shared volume, another process can reuse the inode number of a deleted item.
 class ItemCallsOnAVolumeOfTheirOwn : public ItemCalls {
  protected:
   void SetUp() override {
@@ -306,7 +306,7 @@ class ItemCallsOnAVolumeOfTheirOwn : public ItemCalls {
   }
 };
 
-TEST_F(ItemCallsOnAVolumeOfTheirOwn, WhatIsGoneHasNoFolderInfoNorItems) {
+TEST_F(ItemCallsOnAVolumeOfTheirOwn, ADeletedItemHasNoFolderInfoAndNoItems) {
   const std::string path = mFolder.MakeFolder("x");
   const FSCatalogInfo info = InfoOf(path);
   std::filesystem::remove(path);
@@ -329,7 +329,7 @@ TEST_F(ItemCalls, TheRootOfAnotherVolumeHasParent1AndItsOwnName) {
   EXPECT_EQ(IDOf(path), 2u);
 }
 
-// --- What is on no volume -----------------------------------------------------------------------
+// --- Items on no volume -------------------------------------------------------------------------
 
 TEST_F(ItemCalls, TheFolderOfAKernelInterfaceHasAnIDThatLeadsNowhere) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
@@ -350,7 +350,7 @@ TEST_F(ItemCalls, ItemsOfAKernelInterfaceAreOnNoVolume) {
   EXPECT_EQ(PathOf(reference), "/proc/version");
 }
 
-TEST_F(ItemCalls, TheIDOfAnItemOnNoVolumeIsNotSearchedFor) {
+TEST_F(ItemCalls, AnIDOnNoVolumeIsNotSearchedFor) {
   const auto calls = CallsOf([] {},
                              [&] {
                                ItemOf(MakeRecord(mInfo.volume, 3, "x"));
@@ -360,7 +360,7 @@ TEST_F(ItemCalls, TheIDOfAnItemOnNoVolumeIsNotSearchedFor) {
   EXPECT_THAT(*calls, testing::Not(testing::Contains(SYS_getdents64)));
 }
 
-TEST_F(ItemCalls, AFileThatIsMountedAloneComesBack) {
+TEST_F(ItemCalls, AFileMountedAloneSurvivesARoundTrip) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const ScopedMount tmpfs("tmpfs", mFolder.MakeFolder("volume"), "tmpfs");
   const std::string source = mFolder.MakeFile("volume/source");

@@ -1,4 +1,4 @@
-// References to items by URL, and back.
+// References to items from URLs, and URLs from references.
 #include <CoreServices/CoreServices.h>
 #include <gtest/gtest.h>
 #include <sys/mount.h>
@@ -40,20 +40,20 @@ class AReferenceToAnItem : public testing::Test {
 
 // --- Taking one -------------------------------------------------------------------------------
 
-TEST_F(AReferenceToAnItem, IsTakenFromAFileUrl) {
+TEST_F(AReferenceToAnItem, IsMadeFromAFileUrl) {
   mFolder.MakeFile("x");
   EXPECT_TRUE(HasReference(MakeUrl(PathOf("x"), false).Get()));
   EXPECT_TRUE(HasReference(ParseUrl("file://localhost/").Get()));
 }
 
-TEST_F(AReferenceToAnItem, IsNotTakenFromAnotherUrl) {
+TEST_F(AReferenceToAnItem, IsNotMadeFromAnotherUrl) {
   EXPECT_FALSE(HasReference(ParseUrl("http://localhost/").Get()));
   EXPECT_FALSE(HasReference(ParseUrl("file://elsewhere/").Get()));
   EXPECT_FALSE(HasReference(ParseUrl("mailto:x").Get()));
   EXPECT_FALSE(HasReference(ParseUrl("file:///%00").Get()));
 }
 
-TEST_F(AReferenceToAnItem, IsNotTakenFromWhatIsMissing) {
+TEST_F(AReferenceToAnItem, IsNotMadeForAMissingItem) {
   mFolder.MakeFile("x");
   EXPECT_FALSE(HasReference(MakeUrl(PathOf("y"), false).Get()));
   EXPECT_FALSE(HasReference(MakeUrl(PathOf("x/y"), false).Get()));
@@ -67,7 +67,7 @@ TEST_F(AReferenceToAnItem, IsToADanglingLinkItself) {
   EXPECT_EQ(PlaceOf(item), PathOf("link"));
 }
 
-TEST_F(AReferenceToAnItem, IsToALinkItselfThoughAFolderIsMeant) {
+TEST_F(AReferenceToAnItem, IsToALinkItselfEvenWithAFolderMark) {
   mFolder.MakeFolder("folder");
   mFolder.MakeLink("link", "folder");
   FSRef item = {};
@@ -86,7 +86,7 @@ TEST_F(AReferenceToAnItem, IsFoundThroughLinksOnTheWay) {
   EXPECT_EQ(PlaceOf(ReferenceTo(PathOf("link/.."))), mFolder.Path());
 }
 
-TEST_F(AReferenceToAnItem, OfARelativeUrlIsSeenFromTheFolderOfItsMaking) {
+TEST_F(AReferenceToAnItem, OfARelativeUrlIsRelativeToTheFolderWhereItWasMade) {
   mFolder.MakeFolder("folder");
   mFolder.MakeFile("folder/x");
   const auto former = std::filesystem::current_path();
@@ -162,7 +162,7 @@ TEST_F(AReferenceToAnItem, FollowsItsMoveToAnotherFolder) {
   EXPECT_EQ(PlaceOf(item), PathOf("b/c/y"));
 }
 
-TEST_F(AReferenceToAnItem, IsNotTakenForWhatTakesItsName) {
+TEST_F(AReferenceToAnItem, IsNotTakenForANewItemOfItsName) {
   mFolder.MakeFile("x");
   mFolder.MakeFile("y");
   const FSRef item = ReferenceTo(PathOf("x"));
@@ -171,7 +171,7 @@ TEST_F(AReferenceToAnItem, IsNotTakenForWhatTakesItsName) {
   EXPECT_EQ(PlaceOf(item), PathOf("z"));
 }
 
-TEST_F(AReferenceToAnItem, IsNotTakenForALinkInItsPlaceThatLeadsToIt) {
+TEST_F(AReferenceToAnItem, IsNotTakenForALinkToItInItsPlace) {
   mFolder.MakeFile("x");
   const FSRef item = ReferenceTo(PathOf("x"));
   Move("x", "y");
@@ -179,7 +179,7 @@ TEST_F(AReferenceToAnItem, IsNotTakenForALinkInItsPlaceThatLeadsToIt) {
   EXPECT_EQ(PlaceOf(item), PathOf("y"));
 }
 
-TEST_F(AReferenceToAnItem, GivesTheCanonicalPathAlsoAfterALinkCameIntoTheWay) {
+TEST_F(AReferenceToAnItem, GivesTheCanonicalPathWhenALinkIsNowOnTheWay) {
   mFolder.MakeFolder("a");
   mFolder.MakeFile("a/x");
   const FSRef item = ReferenceTo(PathOf("a/x"));
@@ -189,7 +189,7 @@ TEST_F(AReferenceToAnItem, GivesTheCanonicalPathAlsoAfterALinkCameIntoTheWay) {
   EXPECT_EQ(PlaceOf(item), PathOf("b/x"));
 }
 
-TEST_F(AReferenceToAnItem, OfTwoNamesGivesTheOneLastSeen) {
+TEST_F(AReferenceToAnItem, WithTwoNamesGivesTheOneLastSeen) {
   mFolder.MakeFile("x");
   ASSERT_EQ(link(PathOf("x").c_str(), PathOf("y").c_str()), 0);
   const FSRef first = ReferenceTo(PathOf("x"));
@@ -208,7 +208,7 @@ TEST_F(AReferenceToAnItem, FollowsItsRenameInAProcessWithoutPrivileges) {
   EXPECT_TRUE(HoldsWithout(CAP_DAC_READ_SEARCH, [&] { return PlaceOf(item) == PathOf("b/c/y"); }));
 }
 
-// On a volume of its own, so that looking for what is gone comes to an end soon.
+// Uses a volume of its own, on which a search for a deleted item ends soon.
 class AReferenceOnAVolume : public AReferenceToAnItem {
  protected:
   void SetUp() override {
@@ -227,7 +227,7 @@ TEST_F(AReferenceOnAVolume, GivesNoUrlWhenTheItemIsGone) {
   EXPECT_EQ(PlaceOf(item), std::nullopt);
 }
 
-TEST_F(AReferenceOnAVolume, GivesNoUrlWhenTheItemIsOnAnotherVolumeNow) {
+TEST_F(AReferenceOnAVolume, GivesNoUrlWhenTheItemMovedToAnotherVolume) {
   mFolder.MakeFile("volume/x");
   const FSRef item = ReferenceTo(PathOf("volume/x"));
   std::filesystem::copy(PathOf("volume/x"), PathOf("x"));
@@ -243,7 +243,7 @@ TEST_F(AReferenceOnAVolume, GivesNoUrlWhenTheVolumeIsGone) {
   EXPECT_EQ(PlaceOf(item), std::nullopt);
 }
 
-TEST_F(AReferenceOnAVolume, HoldsNothingThatKeepsTheVolumeMounted) {
+TEST_F(AReferenceOnAVolume, DoesNotKeepTheVolumeMounted) {
   mFolder.MakeFolder("volume/a");
   mFolder.MakeFile("volume/x");
   const FSRef item = ReferenceTo(PathOf("volume/x"));
@@ -252,11 +252,11 @@ TEST_F(AReferenceOnAVolume, HoldsNothingThatKeepsTheVolumeMounted) {
   EXPECT_EQ(umount2(PathOf("volume").c_str(), 0), 0) << std::strerror(errno);
 }
 
-TEST_F(AReferenceOnAVolume, FindsItsItemThoughItsPlaceIsForgotten) {
+TEST_F(AReferenceOnAVolume, FindsItsItemAfterItsPlaceIsForgotten) {
   mFolder.MakeFolder("volume/a/b");
   mFolder.MakeFile("volume/a/b/x");
   const FSRef item = ReferenceTo(PathOf("volume/a/b/x"));
-  // Which are more places than are remembered.
+  // More places than the platform remembers.
   mFolder.MakeFolder("volume/many");
   for (int i = 0; i < 5000; ++i) {
     ReferenceTo(mFolder.MakeFile("volume/many/" + std::string(200, 'n') + std::to_string(i)));
@@ -264,7 +264,7 @@ TEST_F(AReferenceOnAVolume, FindsItsItemThoughItsPlaceIsForgotten) {
   EXPECT_EQ(PlaceOf(item), PathOf("volume/a/b/x"));
 }
 
-TEST_F(AReferenceToAnItem, FindsItThoughNoFolderOfItsPlaceIsThere) {
+TEST_F(AReferenceToAnItem, FindsItAfterAllItsFoldersMoved) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   ScopedMount volume("none", mFolder.MakeFolder("a/volume"), "tmpfs");
   ASSERT_TRUE(volume.IsMounted());
@@ -276,7 +276,7 @@ TEST_F(AReferenceToAnItem, FindsItThoughNoFolderOfItsPlaceIsThere) {
   Move("c", "a");
 }
 
-TEST_F(AReferenceOnAVolume, ThatIsDeletedGivesNoUrlOfTheNewItemOfItsName) {
+TEST_F(AReferenceOnAVolume, ToADeletedItemGivesNoUrlOfItsSuccessor) {
   mFolder.MakeFile("volume/x");
   const FSRef item = ReferenceTo(PathOf("volume/x"));
   std::filesystem::remove(PathOf("volume/x"));
@@ -284,7 +284,7 @@ TEST_F(AReferenceOnAVolume, ThatIsDeletedGivesNoUrlOfTheNewItemOfItsName) {
   EXPECT_EQ(PlaceOf(item), std::nullopt);
 }
 
-// On a disk an item that was old when its reference was taken is told by its birth.
+// On a disk, the birth time identifies an item that was old when its reference was made.
 class AReferenceOnADisk : public testing::Test {
  protected:
   void SetUp() override {
@@ -312,8 +312,8 @@ TEST_F(AReferenceOnADisk, FollowsTheRenameOfAnOldItem) {
   EXPECT_EQ(PlaceOf(item), PathOf("a/y"));
 }
 
-// The file system gives a freed inode number away at once, within one tick of the clock of births.
-TEST_F(AReferenceOnADisk, ThatIsDeletedIsNotTakenForANewItemOfItsNameAndNumber) {
+// The file system reuses a freed inode number at once, within one tick of the clock of birth times.
+TEST_F(AReferenceOnADisk, ToADeletedItemIsNotTakenForItsSuccessor) {
   for (int i = 0; i < 50; ++i) {
     const std::string path = Make("x");
     const std::uint64_t inode = InodeOf(path);
@@ -328,7 +328,7 @@ TEST_F(AReferenceOnADisk, ThatIsDeletedIsNotTakenForANewItemOfItsNameAndNumber) 
 
 // --- Comparing --------------------------------------------------------------------------------
 
-TEST_F(AReferenceToAnItem, IsEqualToAnotherToTheSame) {
+TEST_F(AReferenceToAnItem, IsEqualToAnotherReferenceToTheSameItem) {
   mFolder.MakeFolder("folder");
   mFolder.MakeFile("folder/x");
   mFolder.MakeLink("link", "folder");
@@ -337,7 +337,7 @@ TEST_F(AReferenceToAnItem, IsEqualToAnotherToTheSame) {
   EXPECT_EQ(FSCompareFSRefs(&first, &second), noErr);
 }
 
-TEST_F(AReferenceToAnItem, IsNotEqualToOneToAnother) {
+TEST_F(AReferenceToAnItem, IsNotEqualToAReferenceToAnotherItem) {
   mFolder.MakeFile("x");
   mFolder.MakeLink("link", "x");
   const FSRef first = ReferenceTo(PathOf("x"));

@@ -87,14 +87,14 @@ TEST(VolumeCalls, Number0IsTheVolumeAtIndex1) {
 
 using Numbers = std::vector<SInt16>;
 
-// The volumes from an index from 1 on.
+// Returns the volumes at this index and all later ones. Indexes start at 1.
 Numbers WalkFrom(SInt16 index) {
   Numbers numbers;
   for (SInt16 number; (number = VolumeAt(index).number) != 0; ++index) numbers.push_back(number);
   return numbers;
 }
 
-// With some volumes of its own behind the machine's.
+// Mounts some volumes after the machine's own.
 class AWalkOverTheVolumes : public testing::Test {
  protected:
   void SetUp() override {
@@ -110,7 +110,7 @@ class AWalkOverTheVolumes : public testing::Test {
     mount.emplace("none", mFolder.MakeFolder(name), "tmpfs");
     ASSERT_TRUE(mount->IsMounted());
   }
-  // What reads the table of mounts as it is now.
+  // These calls read the current mount table.
   void AskOtherCalls() const {
     const FSSpec spec = SpecOf(mFolder.Path());
     ItemOf(spec);
@@ -132,7 +132,7 @@ class AWalkOverTheVolumes : public testing::Test {
   Numbers mBefore;
 };
 
-// The numbers of a walk during which something is done after its first step.
+// Returns the numbers of a walk during which `work` is done after the first step.
 template <class Work>
 Numbers WalkDuring(Work work) {
   Numbers numbers{VolumeAt(1).number};
@@ -154,7 +154,7 @@ TEST_F(AWalkOverTheVolumes, SeesOneStateWhileAVolumeAppears) {
   EXPECT_EQ(WalkFrom(1), after);
 }
 
-TEST_F(AWalkOverTheVolumes, SeesOneStateWhileAVolumeGoes) {
+TEST_F(AWalkOverTheVolumes, SeesOneStateWhileAVolumeVanishes) {
   const SInt16 gone = NumberOf("first");
   EXPECT_EQ(WalkDuring([&] {
               mFirst->Unmount();
@@ -182,7 +182,7 @@ TEST_F(AWalkOverTheVolumes, SeesOneStateByEitherCallAtEachOfItsSteps) {
   EXPECT_EQ(during, mBefore);
 }
 
-TEST_F(AWalkOverTheVolumes, AskedForAnIndexThatIsNotTheNextSeesTheCurrentVolumes) {
+TEST_F(AWalkOverTheVolumes, AtAnotherIndexThanTheNextSeesTheCurrentVolumes) {
   const auto pastTheLast = static_cast<SInt16>(mBefore.size() + 1);
   VolumeAt(1);
   std::optional<ScopedMount> appearing;
@@ -190,7 +190,7 @@ TEST_F(AWalkOverTheVolumes, AskedForAnIndexThatIsNotTheNextSeesTheCurrentVolumes
   EXPECT_EQ(VolumeAt(pastTheLast).number, NumberOf("new"));
 }
 
-TEST_F(AWalkOverTheVolumes, BeginsAnewWithTheFirst) {
+TEST_F(AWalkOverTheVolumes, BeginsAnewAtTheFirst) {
   VolumeAt(1);
   VolumeAt(2);
   std::optional<ScopedMount> appearing;

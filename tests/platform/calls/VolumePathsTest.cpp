@@ -1,4 +1,4 @@
-// The volumes of HFS paths, as they are on this machine and as they are made here.
+// The volumes that HFS paths name, on this machine and with mounts made by the test.
 #include <gtest/gtest.h>
 
 #include "foundation/VolumePaths.h"
@@ -26,7 +26,7 @@ TEST(VolumePaths, APathIsOnTheVolumeWhoseMountPointItBeginsWith) {
   EXPECT_EQ(MountPointOfVolume(u"cafe\u0301 of tallowmere"), std::nullopt);
 }
 
-TEST(VolumePaths, OfTwoVolumesWithOneNameOnlyTheFirstIsCalledSo) {
+TEST(VolumePaths, AnAmbiguousVolumeNameIsTheFirstVolumes) {
   if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const TemporaryFolder folder;
   const std::string first = folder.MakeFolder("1/tallowmere twin").string();
@@ -39,11 +39,11 @@ TEST(VolumePaths, OfTwoVolumesWithOneNameOnlyTheFirstIsCalledSo) {
   EXPECT_EQ(MountPointOfVolume(u"tallowmere twin"), first);
 }
 
-TEST(VolumePaths, ANameOutsideMacRomanIsNoVolumes) {
+TEST(VolumePaths, NoVolumeHasANameOutsideMacRoman) {
   EXPECT_EQ(MountPointOfVolume(u"\u6F22"), std::nullopt);
 }
 
-TEST(VolumePaths, ANameThatNoVolumeHasIsNoVolumes) {
+TEST(VolumePaths, AnUnknownNameIsNoVolume) {
   EXPECT_EQ(MountPointOfVolume(u"tallowmere has no such volume"), std::nullopt);
 }
 

@@ -1,5 +1,5 @@
-// Mounts over parts of a volume, and mount points that move: what is seen at one place of a volume
-// is hidden at another.
+// Mounts over parts of a volume, and mount points that move: an item hidden at one place of its
+// volume may be visible at another.
 #include <sys/mount.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
@@ -21,7 +21,7 @@
 namespace tallowmere::test {
 namespace {
 
-// Nobody in particular: what the kernel may only show to the superuser is not used.
+// Runs without privileges, so that nothing is used that the kernel reserves for the superuser.
 void ExpectRoundTrip(const std::string& path) {
   const FSSpec spec = SpecOf(path);
   const auto comesBack = [&] {
@@ -108,7 +108,7 @@ TEST_F(CoveredItems, AreFoundAgainWhenTheCoverIsGone) {
   EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
 }
 
-TEST_F(CoveredItems, AreNotWhatAFullPathLeadsToWhereverTheyWereSeen) {
+TEST_F(CoveredItems, AreNotReachedByAFullPathWhereverTheyWereSeen) {
   mFolder.MakeFolder("volume/second");
   Cover("volume/second", PathTo("volume/folder"));
   Cover("volume/folder/below");
@@ -122,8 +122,8 @@ TEST_F(CoveredItems, AreNotWhatAFullPathLeadsToWhereverTheyWereSeen) {
   EXPECT_EQ(ItemOf(spec), PathTo("volume/folder/below/x"));
 }
 
-// A name is that of an item of the first place, also on the way.
-TEST_F(CoveredItems, OfTheFirstPlaceAreWhatAFullPathLeadsToThroughAnother) {
+// A name is looked up at the volume's first place, in every folder on the way.
+TEST_F(CoveredItems, OfTheFirstPlaceAreReachedByAFullPathThroughAnother) {
   ShowAt("again");
   Cover("again/folder");
   const std::string covering = mFolder.MakeFile("again/folder/new");
@@ -136,7 +136,7 @@ TEST_F(CoveredItems, OfTheFirstPlaceAreWhatAFullPathLeadsToThroughAnother) {
   EXPECT_EQ(spec.vRefNum, SpecOf(PathTo("volume/folder/new")).vRefNum);
 }
 
-// The volume still shows each of its folders at one place.
+// The volume still shows each of its folders in one place only.
 TEST_F(CoveredItems, AreNoneWhereAFileOfTheVolumeIsMountedElsewhere) {
   mFolder.MakeFile("elsewhere");
   Cover("elsewhere", PathTo("volume/file"));
@@ -146,9 +146,9 @@ TEST_F(CoveredItems, AreNoneWhereAFileOfTheVolumeIsMountedElsewhere) {
   ExpectRoundTrip(PathTo("elsewhere"));
 }
 
-// At the place where its mount hangs another volume's folder may have the same name.
-TEST_F(CoveredItems, OfAPartThatIsMountedByItselfTheVolumesOwnFolderIsTold) {
-  // The first inodes are too low for ids that are remembered.
+// The mount point is in another volume, which may have a folder of the same name there.
+TEST_F(CoveredItems, OfAPartMountedByItselfHaveTheVolumesOwnFolder) {
+  // Uses up the inode numbers below 16, which differ from their ids.
   for (int i = 0; i < 20; ++i) mFolder.MakeFolder("volume/filler/" + std::to_string(i));
   mFolder.MakeFolder("volume/inner/below");
   mFolder.MakeFolder("volume/part");
@@ -163,7 +163,7 @@ TEST_F(CoveredItems, OfAPartThatIsMountedByItselfTheVolumesOwnFolderIsTold) {
   EXPECT_EQ(static_cast<std::uint32_t>(block.dirInfo.ioDrParID), 2U);
 }
 
-TEST_F(CoveredItems, APartThatNothingElseShowsIsTheTopOfWhatCanBeClimbed) {
+TEST_F(CoveredItems, APartThatNothingElseShowsIsTheTopOfAClimb) {
   mFolder.MakeFolder("part");
   Cover("part", PathTo("volume/folder"));
   Cover("volume");
@@ -175,7 +175,7 @@ TEST_F(CoveredItems, APartThatNothingElseShowsIsTheTopOfWhatCanBeClimbed) {
   EXPECT_EQ(static_cast<std::uint32_t>(block.dirInfo.ioDrParID), 1U);
 }
 
-// A process that was in a folder before it was covered still shows it.
+// The current folder of a process still shows the items after a mount covers it.
 class CoveredItemsInTheCurrentFolder : public CoveredItems {
  protected:
   void SetUp() override {
@@ -214,7 +214,7 @@ TEST_F(CoveredItemsInTheCurrentFolder, HaveTheirRecordWhereAnotherMountShowsThei
   EXPECT_EQ(ItemOf(spec), PathTo("again/folder/below/x"));
 }
 
-// The folder is at its path again, under a mount that does not show what was mounted in it.
+// A second mount of the volume shows the folder at its old path again, but without the mount in it.
 TEST_F(CoveredItemsInTheCurrentFolder, HaveNoRecordWhereTheirVolumeIsMountedOverItself) {
   Cover("volume/folder/below/x", PathTo("other"));
   Cover("volume", PathTo("volume"));
@@ -234,9 +234,9 @@ TEST_F(CoveredItemsInTheCurrentFolder, AreNotTakenForWhatTheirPathLeadsToNow) {
       dirNFErr);
 }
 
-// --- A link on the way --------------------------------------------------------------------------
+// --- Links on the way ---------------------------------------------------------------------------
 
-// In a folder that may be searched and not read, so that only memory can tell where an item is.
+// Behind a folder with search permission only, where only a remembered place leads to an item.
 class ItemsBehindALink : public testing::Test {
  protected:
   void SetUp() override {
@@ -268,13 +268,13 @@ TEST_F(ItemsBehindALink, ComeBackWhenTheLinkIsGone) {
   }));
 }
 
-// The way to a folder is not the one on which it was first reached, though it is spelled alike.
-class CoveredItemsOnAWayThatIsALinkNow : public CoveredItems {
+// The path to a folder now leads through a link and is no longer the path first used.
+class CoveredItemsBehindANewLink : public CoveredItems {
  protected:
   void SetUp() override {
     CoveredItems::SetUp();
     if (IsSkipped()) return;
-    // The first numbers are too low to be ids.
+    // Uses up the inode numbers below 16, which differ from their ids.
     for (int i = 0; i < 20; ++i) mFolder.MakeFile("volume/" + std::to_string(i));
     mFolder.MakeFolder("volume/way/folder");
     mFolder.MakeFile("volume/way/folder/x");
@@ -288,14 +288,14 @@ class CoveredItemsOnAWayThatIsALinkNow : public CoveredItems {
   FSSpec mSpec{};
 };
 
-TEST_F(CoveredItemsOnAWayThatIsALinkNow, LeaveTheirShortFormToWhatCoversThem) {
+TEST_F(CoveredItemsBehindANewLink, LeaveTheirShortFormToTheirCover) {
   Cover("volume/moved/folder/\xE6\x97\xA5", PathTo("volume/source"));
   const FSSpec covering = SpecOf(PathTo("volume/way/folder/\xE6\x97\xA5"));
   EXPECT_EQ(ItemOf(SpecOf(PathTo("volume/source"))), PathTo("volume/source"));
   EXPECT_EQ(ItemOf(covering), PathTo("volume/moved/folder/\xE6\x97\xA5"));
 }
 
-TEST_F(CoveredItemsOnAWayThatIsALinkNow, ComeBackWhereAnotherMountShowsThem) {
+TEST_F(CoveredItemsBehindANewLink, ComeBackWhereAnotherMountShowsThem) {
   ShowAt("again");
   const auto id = static_cast<std::uint32_t>(InodeOf(PathTo("volume/moved/folder/x")));
   Cover("volume/moved/folder/x", PathTo("other"));
@@ -303,12 +303,12 @@ TEST_F(CoveredItemsOnAWayThatIsALinkNow, ComeBackWhereAnotherMountShowsThem) {
   EXPECT_EQ(ItemOf(spec), PathTo("again/moved/folder/x"));
 }
 
-// --- Kernels that answer otherwise --------------------------------------------------------------
+// --- Kernels that answer differently ------------------------------------------------------------
 
 class ItemsInAClosedFolder : public CoveredItems {};
 
 TEST_F(ItemsInAClosedFolder, AreFoundNearTheLastOneWithoutOpenat2) {
-  // The first numbers are too low to be ids.
+  // Uses up the inode numbers below 16, which differ from their ids.
   for (int i = 0; i < 20; ++i) mFolder.MakeFile("volume/" + std::to_string(i));
   mFolder.MakeFolder("volume/closed/open");
   mFolder.MakeFile("volume/closed/open/x");
@@ -324,11 +324,11 @@ TEST_F(ItemsInAClosedFolder, AreFoundNearTheLastOneWithoutOpenat2) {
   }
 }
 
-// Who has the right to open by handle in a user namespace alone is told that what is not below the
-// mount that was asked is gone.
+// A process that may open by handle only thanks to its user namespace gets ESTALE for an item that
+// is not below the mount it asked.
 class ItemsOnTwoMounts : public CoveredItems {};
 
-TEST_F(ItemsOnTwoMounts, AreSearchedThoughOneMountSaysThatTheyAreGone) {
+TEST_F(ItemsOnTwoMounts, AreSearchedForWhenOneMountReportsThemGone) {
   ShowAt("again");
   const FSRef reference = ReferenceTo(PathTo("again/folder/below/x"));
   std::filesystem::rename(PathTo("volume/folder/below/x"), PathTo("volume/folder/moved"));
@@ -346,7 +346,7 @@ class AVolumeThatMoves : public testing::Test {
     if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
     mVolume.emplace("none", mFolder.MakeFolder("a/volume"), "tmpfs");
     ASSERT_TRUE(mVolume->IsMounted());
-    // The first numbers are too low to be ids.
+    // Uses up the inode numbers below 16, which differ from their ids.
     for (int i = 0; i < 20; ++i) mFolder.MakeFile("a/volume/" + std::to_string(i));
     mFolder.MakeFolder("a/volume/folder/below");
     mFolder.MakeFile("a/volume/folder/below/x");
@@ -367,7 +367,7 @@ class AVolumeThatMoves : public testing::Test {
   bool mIsMoved = false;
 };
 
-TEST_F(AVolumeThatMoves, GivesTheIdsThatItGaveBefore) {
+TEST_F(AVolumeThatMoves, GivesTheSameIdsAsBefore) {
   const std::uint64_t inode = InodeOf(PathTo("a/volume/folder/below"));
   Move();
   const FSSpec spec = SpecOf(PathTo("b/volume/folder/below/x"));
@@ -375,7 +375,7 @@ TEST_F(AVolumeThatMoves, GivesTheIdsThatItGaveBefore) {
   EXPECT_EQ(ItemOf(spec), PathTo("b/volume/folder/below/x"));
 }
 
-TEST_F(AVolumeThatMoves, IsNotTakenForWhatIsWhereItWas) {
+TEST_F(AVolumeThatMoves, IsNotTakenForWhatIsNowInItsOldPlace) {
   const std::uint64_t inode = InodeOf(PathTo("a/volume/folder/below"));
   Move();
   mFolder.MakeFolder("a/volume/folder/below");
@@ -394,7 +394,7 @@ TEST_F(AVolumeThatMoves, IsSearchedWhereItIsNow) {
   EXPECT_EQ(ItemOf(root), PathTo("b/volume/folder"));
 }
 
-TEST_F(AVolumeThatMoves, IsFoundByItsNumberWhenNobodyHasLookedAtItBefore) {
+TEST_F(AVolumeThatMoves, IsFoundByItsNumberWithoutAnEarlierRequest) {
   const SInt16 number = VolumeNamed("volume");
   ASSERT_NE(number, 0);
   const std::uint64_t inode = InodeOf(PathTo("a/volume/folder"));

@@ -1,4 +1,4 @@
-// From id to place: what was remembered is verified, and nothing but the item itself is an answer.
+// Finding items by id: remembered places are verified, and only the item itself is an answer.
 #include <fcntl.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
@@ -26,14 +26,14 @@ class TheCatalog : public testing::Test {
   }
   std::string Make(const std::string& name) const { return mFolder.MakeFolder("volume/" + name); }
   std::string Top() const { return mFolder.Path() / "volume"; }
-  // The mount's id, by statx(2) itself.
+  // Returns the mount's id, straight from statx(2).
   std::uint64_t MountID() const {
     struct statx about {};
     EXPECT_EQ(statx(AT_FDCWD, Top().c_str(), 0, STATX_MNT_ID, &about), 0);
     return about.stx_mnt_id;
   }
   SInt16 Number() const { return InfoOf(Top()).volume; }
-  // What has the id on the volume: a path, or the result code in brackets.
+  // Both return the path of what has the id on the volume, or the result code in brackets.
   std::string FindFolder(std::uint32_t id) const { return FolderWithID(Number(), id); }
   std::string FindItem(std::uint32_t id) const { return ItemWithID(Number(), id); }
 
@@ -59,7 +59,7 @@ TEST_F(TheCatalog, FindsARememberedItemWhereItIsNow) {
   EXPECT_EQ(FindFolder(id), mFolder.Path() / "volume/d/c");
 }
 
-TEST_F(TheCatalog, FindsWhatMovesInAFolderWhoseNameIsTheFolderAboveInAUrl) {
+TEST_F(TheCatalog, FindsWhatMovesInAFolderWhoseNameMeansItsParentInAUrl) {
   for (int i = 0; i < 20; ++i) Make("filler/" + std::to_string(i));
   const std::uint32_t id = IDOf(Make("a/%2E%2E/b"));
   const std::filesystem::path volume = mFolder.Path() / "volume";
@@ -89,7 +89,7 @@ TEST_F(TheCatalog, KnowsTheVolumeWhereItIsMountedNow) {
 }
 
 TEST_F(TheCatalog, SearchesANewVolumeThatHasTheNumberOfAFormerOne) {
-  // The first numbers are too low to be ids.
+  // Uses up the inode numbers below 16, which differ from their ids.
   const auto fill = [&](const std::string& folder) {
     for (int i = 0; i < 20; ++i) mFolder.MakeFolder(folder + "/" + std::to_string(i));
     return mFolder.MakeFolder(folder + "/a/b");
@@ -102,7 +102,7 @@ TEST_F(TheCatalog, SearchesANewVolumeThatHasTheNumberOfAFormerOne) {
   const std::uint64_t former = MountID();
   ScopedMount other("tmpfs", mFolder.MakeFolder("other"), "tmpfs");
   fill("other");
-  // The kernel gives the lowest free number, which another process can have taken for a while.
+  // The kernel assigns the lowest free mount id, which another process may hold for a while.
   for (int attempt = 0; attempt == 0 || (attempt < 1000 && MountID() != former); ++attempt) {
     mMount->Unmount();
     mMount.emplace(mFolder.Path() / "other", Top(), "", MS_BIND);
@@ -112,8 +112,8 @@ TEST_F(TheCatalog, SearchesANewVolumeThatHasTheNumberOfAFormerOne) {
   EXPECT_EQ(searchFor(path), path);
 }
 
-// A file system that gives the number of a deleted item to the next one.
-class NumbersThatAreTakenAgain : public testing::Test {
+// A file system that reuses the inode number of a deleted item for the next one.
+class ReusedNumbers : public testing::Test {
  protected:
   void SetUp() override {
     if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
@@ -125,7 +125,7 @@ class NumbersThatAreTakenAgain : public testing::Test {
   std::optional<FileSystemImage> mImage;
 };
 
-TEST_F(NumbersThatAreTakenAgain, AreNotAnsweredWithARememberedPlace) {
+TEST_F(ReusedNumbers, AreNotAnsweredWithARememberedPlace) {
   std::filesystem::create_directory(PathTo("old"));
   const FSCatalogInfo info = InfoOf(PathTo("old"));
   std::filesystem::remove(PathTo("old"));
@@ -138,7 +138,7 @@ TEST_F(NumbersThatAreTakenAgain, AreNotAnsweredWithARememberedPlace) {
   EXPECT_EQ(ItemOf(MakeRecord(info.volume, info.nodeID, "x")), "(-120)");
 }
 
-TEST_F(NumbersThatAreTakenAgain, DoNotLeadAReferenceToTheNewItem) {
+TEST_F(ReusedNumbers, DoNotLeadAReferenceToTheNewItem) {
   std::ofstream(PathTo("file")) << "old";
   const FSRef old = ReferenceTo(PathTo("file"));
   const std::uint32_t id = IDOf(PathTo("file"));

@@ -1,4 +1,4 @@
-// An index of a volume that a test has for itself.
+// A folder index on a volume of the test's own.
 #pragma once
 
 #include <fcntl.h>
@@ -28,7 +28,7 @@ inline kernel::Item ItemOf(const std::string& path) {
   return item ? *item : kernel::Item{};
 }
 
-// The volume that an item is on; null when it is on none.
+// Returns the volume that an item is on, or null when it is on none.
 inline volumes::VolumePointer VolumeOf(volumes::VolumeTable& table, const std::string& path) {
   const auto listed = table.Now()->OfItem(ItemOf(path), path);
   const auto volume =
@@ -38,7 +38,7 @@ inline volumes::VolumePointer VolumeOf(volumes::VolumeTable& table, const std::s
 
 using test::HoldsForNobody;
 
-// A node id that no item of a test has.
+// A node id that no item of the tests has.
 inline constexpr std::uint32_t kOfNoItem = 0x12345678;
 
 class AnIndex : public testing::Test {
@@ -48,7 +48,7 @@ class AnIndex : public testing::Test {
     mTop = mFolder.MakeFolder("volume");
     mMount.emplace("tmpfs", mTop, "tmpfs");
     ASSERT_TRUE(mMount->IsMounted());
-    for (int i = 0; i < 20; ++i) Remove(Make("first"));  // their numbers are not their ids
+    for (int i = 0; i < 20; ++i) Remove(Make("first"));  // use up numbers below 16
     std::filesystem::permissions(mFolder.Path(), std::filesystem::perms(0755));
     UseVolumeOf(PathTo(""));
   }
@@ -58,7 +58,7 @@ class AnIndex : public testing::Test {
     mIndex.emplace(mVolume);
   }
 
-  // Until the test changes something, all changes are so old that none can have the same time.
+  // Makes all changes so far too old to share a time with a change that the test makes later.
   void LetChangesAge() {
     test::WaitForTheNextTick();
     mOtherTime.emplace(std::chrono::seconds(3));
@@ -92,22 +92,22 @@ class AnIndex : public testing::Test {
   std::optional<std::string> Search(const SearchedItem& item, const std::string& start) {
     return mIndex->Find(item, start, *mTable.Now());
   }
-  // Where the index finds a folder, "(none)" where it does not.
+  // Returns where the index finds a folder, or "(none)".
   std::string Find(std::uint32_t id, const std::string& start = "") {
     return Search({id, nullptr, true}, PathTo(start)).value_or("(none)");
   }
-  // Everything is read, and known until it changes.
+  // Makes the index read every folder. It then knows them until they change.
   void KnowEverything() {
     LetChangesAge();
     EXPECT_EQ(Find(kOfNoItem), "(none)");
   }
-  // How many folders a search opens.
+  // Returns how many folders a search opens.
   std::uint64_t OpenedFor(std::uint32_t id) {
     const std::uint64_t before = mIndex->OpenedFolders();
     Find(id);
     return mIndex->OpenedFolders() - before;
   }
-  // Where the index finds an item of any kind, "(none)" where it does not.
+  // Returns where the index finds an item of any kind, or "(none)".
   std::string FindAny(std::uint32_t id, const std::string& start = "") {
     return Search({id, nullptr, false}, PathTo(start)).value_or("(none)");
   }

@@ -1,4 +1,4 @@
-// What an index keeps from one search to the next, and what it does not touch.
+// What an index keeps from one search to the next, and what it never touches.
 #include <sys/mount.h>
 #include <sys/resource.h>
 #include <sys/syscall.h>
@@ -26,7 +26,7 @@ std::size_t OpenDescriptors() {
   return count;
 }
 
-// While it lives, at most so many more descriptors can be opened.
+// While it exists, only so many more descriptors can be opened.
 class FewDescriptors {
  public:
   explicit FewDescriptors(std::size_t more) {
@@ -43,7 +43,7 @@ class FewDescriptors {
   rlimit mBefore{};
 };
 
-// A file without a name until it is given one.
+// An open file without a name, until it is given one.
 class NamelessFile {
  public:
   explicit NamelessFile(const std::string& volume)
@@ -62,7 +62,7 @@ class NamelessFile {
   kernel::Descriptor mFile;
 };
 
-TEST_F(AnIndex, AnswersTheNextQuestionFromWhatItLearned) {
+TEST_F(AnIndex, AnswersTheNextSearchFromWhatItLearned) {
   for (const char* name : {"a/b/c", "a/d/e", "f/g/h"}) Make(name);
   EXPECT_EQ(Find(IDOfWhatIsGone()), "(none)");
   for (const char* name : {"a", "a/b", "a/b/c", "a/d/e", "f", "f/g/h"}) {
@@ -71,7 +71,7 @@ TEST_F(AnIndex, AnswersTheNextQuestionFromWhatItLearned) {
   }
 }
 
-TEST_F(AnIndex, TellsTheNewPlaceOfAFolderAtWhichItStarts) {
+TEST_F(AnIndex, FindsAFolderAtItsNewPlaceWhenItStartsThere) {
   for (const char* name : {"a/moved/below", "b"}) Make(name);
   EXPECT_EQ(Find(IDOfWhatIsGone()), "(none)");
   Move("a/moved", "b/moved");
@@ -99,7 +99,7 @@ TEST_F(AnIndex, ReadsOnlyFoldersThatHaveChanged) {
   ExpectFound("a/b7/c/new");
 }
 
-TEST_F(AnIndex, FindsWhatIsMadeWithinOneTickOfTheLastLook) {
+TEST_F(AnIndex, FindsAnItemMadeWithinOneTickOfTheLastSearch) {
   Make("a/b");
   for (int i = 0; i < 50; ++i) {
     const std::string name = "a/b/" + std::to_string(i);
@@ -108,8 +108,8 @@ TEST_F(AnIndex, FindsWhatIsMadeWithinOneTickOfTheLastLook) {
   }
 }
 
-// Where times are counted in twos of seconds, another change could have the same one.
-TEST_F(AnIndex, ReadsAgainWhatHadChangedHalfASecondBeforeTheLastLook) {
+// On a file system with timestamps of two seconds, a later change could get the same time.
+TEST_F(AnIndex, RereadsFoldersChangedHalfASecondBeforeTheLastSearch) {
   Make("a/b");
   const std::uint32_t gone = IDOfWhatIsGone();
   const test::OtherTime later(std::chrono::milliseconds(500));
@@ -117,9 +117,9 @@ TEST_F(AnIndex, ReadsAgainWhatHadChangedHalfASecondBeforeTheLastLook) {
   EXPECT_GT(OpenedFor(gone), 0u);
 }
 
-// The clock was set back, or another machine's is ahead: the next change may have an earlier time,
-// or the same.
-TEST_F(AnIndex, ReadsAgainWhatHasChangedInTheFuture) {
+// The clock was set back, or another machine's clock is ahead: the next change may get an earlier
+// time, or the same one.
+TEST_F(AnIndex, RereadsFoldersChangedInTheFuture) {
   Make("a/b");
   const std::uint32_t gone = IDOfWhatIsGone();
   const test::OtherTime earlier(std::chrono::hours(-1));
@@ -139,7 +139,7 @@ TEST_F(AnIndex, FindsFoldersAndFilesWhoseEntriesHaveNoType) {
   ExpectFound("a/d");
 }
 
-TEST_F(AnIndex, ReadsNothingAgainWhereEntriesHaveNoType) {
+TEST_F(AnIndex, RereadsNothingWhereEntriesHaveNoType) {
   Make("a/b/c");
   MakeFile("a/x");
   const test::UntypedEntries untyped;
@@ -158,7 +158,7 @@ TEST_F(AnIndex, FindsAFolderDeepInASubtreeThatHasMoved) {
   ExpectFound("e/z");
 }
 
-TEST_F(AnIndex, FindsEverythingInFoldersThatChangedPlaces) {
+TEST_F(AnIndex, FindsEverythingInExchangedFolders) {
   Make("a/x/below");
   Make("b/x/below");
   ExpectFound("a/x/below");
@@ -180,7 +180,7 @@ TEST_F(AnIndex, FindsFoldersExchangedOnTheWay) {
   ExpectFound("b");
 }
 
-TEST_F(AnIndex, DoesNotFindADeletedFolderNorTakeItsSuccessorForIt) {
+TEST_F(AnIndex, DoesNotTakeASuccessorForADeletedFolder) {
   const std::string path = Make("a/b/c");
   const std::uint32_t id = ID("a/b/c");
   ExpectFound("a/b/c");
@@ -190,7 +190,7 @@ TEST_F(AnIndex, DoesNotFindADeletedFolderNorTakeItsSuccessorForIt) {
   ExpectFound("a/b/c");
 }
 
-TEST_F(AnIndex, FindsAFolderAgainThatWasAwayForAWhile) {
+TEST_F(AnIndex, FindsAFolderAgainThatWasGoneForAWhile) {
   Make("a/b/c");
   const std::uint32_t id = ID("a/b/c");
   ExpectFound("a/b/c");
@@ -224,11 +224,11 @@ TEST_F(AnIndex, ResumesWhereItStopped) {
   for (int i = 0; i < 200; ++i) Make("a/b" + std::to_string(i) + "/c/d");
   LetChangesAge();
   for (int i = 0; i < 200; ++i) ExpectFound("a/b" + std::to_string(i) + "/c/d");
-  // Each of the folders that hold folders about once, and where it had stopped once more.
+  // Each folder with subfolders about once, plus once where a search had stopped.
   EXPECT_LE(mIndex->OpenedFolders(), 2u * (200 * 2 + 2));
 }
 
-TEST_F(AnIndex, HasNothingOpenBetweenTwoSearches) {
+TEST_F(AnIndex, HoldsNothingOpenBetweenTwoSearches) {
   Make("a/b/c/d");
   Find(ID("a/b/c/d"));
   const std::size_t before = OpenDescriptors();
@@ -330,7 +330,7 @@ TEST_F(AnIndex, ReadsAFolderThatHasBecomeReadable) {
   EXPECT_EQ(found, PathTo("a/b/c"));
 }
 
-TEST_F(AnIndex, DoesNotEnterWhatIsMountedInTheVolume) {
+TEST_F(AnIndex, DoesNotEnterMountsInTheVolume) {
   Make("a/mounted");
   const ScopedMount other("tmpfs", PathTo("a/mounted"), "tmpfs");
   ASSERT_TRUE(other.IsMounted());
@@ -399,7 +399,7 @@ TEST_F(AnIndex, ResumesWhereItStoppedAfterASearchForAFile) {
   MakeFile("a/b99/x");
   const std::uint32_t file = ID("a/b99/x");
   LetChangesAge();
-  // The folders that are opened for folders.
+  // Counts the folders opened by searches for folders.
   const auto opened = [&](bool looksForAFile) {
     mIndex.emplace(mVolume);
     std::uint64_t ofFile = 0;
@@ -459,7 +459,7 @@ TEST_F(AnIndex, DoesNotGrowWithFoldersThatChangeBetweenStops) {
   EXPECT_LE(mIndex->Size(), 3 * size);
 }
 
-TEST_F(AnIndex, ReadsNothingForAnItemThatItHasMissed) {
+TEST_F(AnIndex, ReadsNothingForAnItemKnownToBeMissing) {
   for (const char* name : {"a/b/c", "a/d/e", "f/g/h"}) Make(name);
   LetChangesAge();
   EXPECT_EQ(OpenedForAny(kOfNoItem), 9u);
@@ -468,7 +468,7 @@ TEST_F(AnIndex, ReadsNothingForAnItemThatItHasMissed) {
   EXPECT_EQ(OpenedForAny(kOfNoItem, "a/b"), 0u);
 }
 
-TEST_F(AnIndex, ReadsNothingForAReferenceWhoseNumberItHasMissed) {
+TEST_F(AnIndex, ReadsNothingForAReferenceWithANumberKnownToBeMissing) {
   Make("a/b/c");
   const std::string path = MakeFile("a/x");
   const kernel::Item item = ItemAt("a/x");
@@ -481,7 +481,7 @@ TEST_F(AnIndex, ReadsNothingForAReferenceWhoseNumberItHasMissed) {
   EXPECT_EQ(mIndex->OpenedFolders(), before);
 }
 
-TEST_F(AnIndex, DoesNotMissTheItemThatHasTheNumberOfALostReference) {
+TEST_F(AnIndex, FindsTheItemWithTheNumberOfALostReference) {
   Make("a/b/c");
   MakeFile("a/x");
   kernel::Item other = ItemAt("a/x");
@@ -491,7 +491,7 @@ TEST_F(AnIndex, DoesNotMissTheItemThatHasTheNumberOfALostReference) {
   EXPECT_EQ(FindAny(ID("a/x")), PathTo("a/x"));
 }
 
-TEST_F(AnIndex, ReadsOnlyWhatHasChangedForAnItemThatItHasMissed) {
+TEST_F(AnIndex, ReadsOnlyChangedFoldersForAnItemKnownToBeMissing) {
   for (int i = 0; i < 50; ++i) Make("a/b" + std::to_string(i) + "/c/d");
   const NamelessFile file(PathTo(""));
   const std::uint32_t id = mVolume->IDOf(file.Item());
@@ -505,7 +505,7 @@ TEST_F(AnIndex, ReadsOnlyWhatHasChangedForAnItemThatItHasMissed) {
   EXPECT_EQ(FindAny(id), PathTo("a/b7/c/x"));
 }
 
-TEST_F(AnIndex, ReadsForAMissedItemWhatWasReadForAnotherQuestion) {
+TEST_F(AnIndex, LooksForAMissingItemInFoldersThatAnotherSearchHasRead) {
   for (const char* name : {"a/b/c", "a/d/e"}) Make(name);
   for (const char* name : {"a/d/x", "a/d/e/x"}) {
     const NamelessFile file(PathTo(""));
@@ -526,7 +526,7 @@ TEST_F(AnIndex, ReadsForAMissedItemWhatWasReadForAnotherQuestion) {
   EXPECT_EQ(FindAny(id), PathTo("a/b/x"));
 }
 
-TEST_F(AnIndex, FindsWhatIsNamedWithinOneTickOfMissingIt) {
+TEST_F(AnIndex, FindsAnItemNamedWithinOneTickOfMissingIt) {
   Make("a/b");
   for (int i = 0; i < 50; ++i) {
     const NamelessFile file(PathTo(""));
@@ -537,7 +537,7 @@ TEST_F(AnIndex, FindsWhatIsNamedWithinOneTickOfMissingIt) {
   }
 }
 
-TEST_F(AnIndex, NotesSoManyMissedItemsAndForgetsTheOldest) {
+TEST_F(AnIndex, RemembersSomeMissingItemsAndForgetsTheOldest) {
   Make("a");
   LetChangesAge();
   constexpr auto kMost = static_cast<std::uint32_t>(FolderIndex::kMostMissing);
@@ -550,7 +550,7 @@ TEST_F(AnIndex, NotesSoManyMissedItemsAndForgetsTheOldest) {
   EXPECT_EQ(mIndex->Size(), size);
 }
 
-TEST_F(AnIndex, DoesNotReadAgainWhatIsBelowAFolderThatHasMoved) {
+TEST_F(AnIndex, DoesNotRereadBelowAFolderThatHasMoved) {
   for (int i = 0; i < 30; ++i) {
     Make("a/b/" + std::to_string(i) + "/x");
     Make("e/f/" + std::to_string(i) + "/x");
@@ -563,7 +563,7 @@ TEST_F(AnIndex, DoesNotReadAgainWhatIsBelowAFolderThatHasMoved) {
   ExpectFound("a/f/7/x");
 }
 
-TEST_F(AnIndex, FindsWhatWaitedInAFolderBelowOneThatHasMoved) {
+TEST_F(AnIndex, FindsUnreadFoldersBelowAFolderThatHasMoved) {
   for (int i = 0; i < 50; ++i) Make("r/g/p/" + std::to_string(i) + "/x");
   LetChangesAge();
   ExpectFound("r/g/p/25/x");
@@ -575,7 +575,7 @@ TEST_F(AnIndex, FindsWhatWaitedInAFolderBelowOneThatHasMoved) {
   }
 }
 
-TEST_F(AnIndex, FindsWhatWasCoveredWhenItsFolderWasRead) {
+TEST_F(AnIndex, FindsAFolderThatWasCoveredDuringAnEarlierSearch) {
   Make("a/b/c/d");
   const std::uint32_t id = ID("a/b/c");
   LetChangesAge();
@@ -588,7 +588,7 @@ TEST_F(AnIndex, FindsWhatWasCoveredWhenItsFolderWasRead) {
   EXPECT_EQ(FindAny(id), PathTo("a/b/c"));
 }
 
-TEST_F(AnIndex, FindsInAFolderThatItKnowsWhatWasCoveredForAWhile) {
+TEST_F(AnIndex, FindsItemsCoveredForAWhileInAKnownFolder) {
   Make("a/b/c/d");
   MakeFile("a/b/x");
   const std::uint32_t file = ID("a/b/x");
@@ -617,7 +617,7 @@ TEST_F(AnIndex, FindsAFileThatWasCoveredForAWhile) {
   EXPECT_EQ(FindAny(file), PathTo("a/x"));
 }
 
-TEST_F(AnIndex, FindsAFileInAFolderThatItKnowsUnderAnotherMount) {
+TEST_F(AnIndex, FindsAFileInAKnownFolderAtAnotherMount) {
   Make("a/b/c");
   MakeFile("a/x");
   MakeFile("a/b/y");
@@ -636,7 +636,7 @@ TEST_F(AnIndex, FindsAFileInAFolderThatItKnowsUnderAnotherMount) {
   EXPECT_EQ(find("a/b/y", PathTo("a")), PathTo("a/b/y"));
 }
 
-TEST_F(AnIndex, LooksWhereverTheVolumeIsMounted) {
+TEST_F(AnIndex, SearchesWhereverTheVolumeIsMounted) {
   Make("a/b");
   Make("c/d");
   const std::uint32_t inFirst = ID("a/b");
@@ -653,7 +653,7 @@ TEST_F(AnIndex, LooksWhereverTheVolumeIsMounted) {
   EXPECT_EQ(Search({inFirst, nullptr, true}, second + "/d"), first + "/b");
 }
 
-TEST_F(AnIndex, RemembersAFolderThatCouldNotBeOpenedForAWhile) {
+TEST_F(AnIndex, RetriesAFolderThatCouldNotBeOpenedForAWhile) {
   Make("a/b/c");
   KnowEverything();
   Make("a/b/new/x");
@@ -667,7 +667,7 @@ TEST_F(AnIndex, RemembersAFolderThatCouldNotBeOpenedForAWhile) {
   ExpectFound("a/b/c");
 }
 
-TEST_F(AnIndex, FindsWhatIsDeeperThanItHasDescriptors) {
+TEST_F(AnIndex, FindsFoldersDeeperThanItHasDescriptors) {
   Make("a/b/c/d/e/f");
   MakeFile("a/b/c/d/e/f/x");
   const std::uint32_t file = ID("a/b/c/d/e/f/x");
@@ -676,7 +676,7 @@ TEST_F(AnIndex, FindsWhatIsDeeperThanItHasDescriptors) {
   EXPECT_EQ(FindAny(file), PathTo("a/b/c/d/e/f/x"));
 }
 
-TEST_F(AnIndex, DoesNotNoteAsMissedWhatItCouldNotSee) {
+TEST_F(AnIndex, DoesNotTakeInvisibleItemsForMissing) {
   Make("a/b/c/d/e/f");
   MakeFile("a/b/c/d/e/f/x");
   const std::uint32_t id = ID("a/b/c/d/e/f/x");
@@ -704,7 +704,7 @@ TEST_F(AnIndex, FindsAFileInAnOverlayOfTwoFileSystemsByItsOwnNumber) {
   EXPECT_EQ(FindAny(ID("a/y")), PathTo("a/y"));
 }
 
-// An id that two items could have, on a volume whose numbers identify items.
+// Searches for an id that two items could share, on a volume whose inode numbers identify items.
 class AnIndexOfMixedIDs : public AnIndex {
  protected:
   void SetUp() override {
@@ -738,7 +738,7 @@ TEST_F(AnIndexOfMixedIDs, FindsNoneUnlessEveryFolderCouldBeOpened) {
   ExpectFound("deep/1/2/3/4/5/6/7");
 }
 
-TEST_F(AnIndexOfMixedIDs, FindsNoneWhenTheLookAtWhatItKnowsFails) {
+TEST_F(AnIndexOfMixedIDs, FindsNoneWhenAKnownFolderCannotBeLookedAt) {
   LetChangesAge();
   EXPECT_EQ(Find(mID), mSmall);
   Make("deep/1/2/3/new");
@@ -770,7 +770,7 @@ TEST_F(AnIndexOfMixedIDs, SkipsFoldersWithoutPermission) {
       [&] { return Find(mID) == mSmall && FindAny(mID) == mSmall && Find(mID) == mSmall; }));
 }
 
-TEST_F(AnIndexOfMixedIDs, SkipsFoldersThatHaveNoPath) {
+TEST_F(AnIndexOfMixedIDs, SkipsFoldersWithoutAPath) {
   kernel::Descriptor folder(open(PathTo("deep").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   const std::string name(250, 'd');
   for (int depth = 0; depth < 40; ++depth) {
@@ -785,7 +785,7 @@ TEST_F(AnIndexOfMixedIDs, SkipsFoldersThatHaveNoPath) {
   }
 }
 
-// Whoever waits for a dead mount waits for ever; the alarm ends the test program.
+// An access to a dead mount never returns; the alarm would then end the test program.
 class AnIndexBesideADeadMount : public AnIndex {
  protected:
   void SetUp() override {
@@ -818,14 +818,14 @@ TEST_F(AnIndexBesideADeadMount, EndsWithoutWaiting) {
   ExpectFound("a/other");
 }
 
-TEST_F(AnIndexBesideADeadMount, DoesNotLookAtTheMountForTheFolderThatItCovers) {
+TEST_F(AnIndexBesideADeadMount, DoesNotAccessTheMountForTheFolderThatItCovers) {
   Kill();
   if (IsSkipped()) return;
   EXPECT_EQ(Find(mCovered), "(none)");
   EXPECT_EQ(Search({mCovered, nullptr, false}, PathTo("a")), std::nullopt);
 }
 
-TEST_F(AnIndexBesideADeadMount, DoesNotLookForWhatItKnewBelowIt) {
+TEST_F(AnIndexBesideADeadMount, DoesNotSearchKnownFoldersBelowIt) {
   EXPECT_EQ(Find(mBelow), PathTo("a/dead/below/deeper"));
   EXPECT_EQ(Find(mCovered), PathTo("a/dead"));
   Kill();
@@ -834,7 +834,7 @@ TEST_F(AnIndexBesideADeadMount, DoesNotLookForWhatItKnewBelowIt) {
   EXPECT_EQ(Find(mCovered), "(none)");
 }
 
-TEST_F(AnIndexBesideADeadMount, IsNotLedThereByALinkInAFoldersPlace) {
+TEST_F(AnIndexBesideADeadMount, DoesNotFollowALinkThereInAFoldersPlace) {
   for (const char* name : {"gone/below", "moved/below"}) Make(name);
   const std::uint32_t gone = ID("gone/below");
   const std::uint32_t moved = ID("moved/below");
@@ -872,7 +872,7 @@ class AnIndexOfAMovingVolume : public AnIndex {
   std::uint32_t mID = 0;
 };
 
-TEST_F(AnIndexOfAMovingVolume, KnowsItAgainWhenItHasNotBeenThere) {
+TEST_F(AnIndexOfAMovingVolume, RecognisesItAfterASearchWhileItWasAway) {
   const volumes::VolumesPointer before = mTable.Now();
   MoveAway();
   EXPECT_EQ(mIndex->Find({kOfNoItem, nullptr, true}, mTop, *before), std::nullopt);
@@ -880,7 +880,7 @@ TEST_F(AnIndexOfAMovingVolume, KnowsItAgainWhenItHasNotBeenThere) {
   EXPECT_EQ(Find(mID), PathTo("c/d"));
 }
 
-TEST_F(AnIndexOfAMovingVolume, KnowsItAgainWhenItWentWhileItWasLookedAt) {
+TEST_F(AnIndexOfAMovingVolume, RecognisesItAfterItMovedDuringASearch) {
   Make("new");
   bool isAway = false;
   {

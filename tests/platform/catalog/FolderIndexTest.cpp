@@ -1,4 +1,4 @@
-// Where an index finds items, from wherever it starts.
+// Where an index finds items, whichever folder it starts from.
 #include <sys/mount.h>
 
 #include "FolderIndexFixture.h"
@@ -13,12 +13,12 @@ using test::TemporaryFolder;
 class AFolderIndex : public testing::Test {
  protected:
   kernel::Item ItemAt(const std::string& name) const { return ItemOf(mFolder.Path() / name); }
-  // Where a pass that starts at a folder finds what is at `name`, which must be there.
+  // Checks that a search from a folder finds the item at `name`, which must exist.
   void ExpectFoundFrom(const std::string& start, const std::string& name) const {
     EXPECT_EQ(Search(ItemAt(name), mFolder.Path() / start), mFolder.Path() / name);
   }
 
-  // What a new index of the item's volume finds.
+  // Searches with a new index of the item's volume.
   std::optional<std::string> Search(const kernel::Item& item, const std::string& start) const {
     volumes::VolumeTable table;
     const auto volume = VolumeOf(table, start);
@@ -62,7 +62,7 @@ TEST_F(AFolderIndex, FindsEveryKindOfItem) {
   for (const char* name : {"a/link", "a/pipe", "a/\xFF\n: name"}) ExpectFoundFrom("", name);
 }
 
-TEST_F(AFolderIndex, FindsWhatIsInFoldersWhoseNamesBeginWithDots) {
+TEST_F(AFolderIndex, FindsItemsInFoldersWhoseNamesBeginWithDots) {
   for (const std::string folder : {".a", "..a", "..."}) {
     mFolder.MakeFolder(folder);
     mFolder.MakeFile(folder + "/x");
@@ -94,7 +94,7 @@ TEST_F(AFolderIndex, SkipsFoldersWithoutAPathFromTheRoot) {
   ExpectFoundFrom("a", "b/x");
 }
 
-// Where the whole volume is one folder's size, so that a pass over it comes to an end soon.
+// Uses a volume of its own, so that a pass over it ends soon.
 class AFolderIndexOfAVolume : public AFolderIndex {
  protected:
   void SetUp() override {
@@ -110,23 +110,23 @@ class AFolderIndexOfAVolume : public AFolderIndex {
   std::optional<ScopedMount> mVolume;
 };
 
-TEST_F(AFolderIndexOfAVolume, EndsWithoutAnItemThatIsGone) {
+TEST_F(AFolderIndexOfAVolume, EndsWhenTheItemIsGone) {
   const kernel::Item item = ItemAt("volume/a/x");
   std::filesystem::remove(PathOf("volume/a/x"));
   EXPECT_EQ(Search(item, PathOf("volume/a")), std::nullopt);
   EXPECT_EQ(Search(item, PathOf("volume")), std::nullopt);
 }
 
-TEST_F(AFolderIndexOfAVolume, FindsAnItemWhereItIsBeforeWhereItIsMountedOnceMore) {
+TEST_F(AFolderIndexOfAVolume, PrefersAnItemsOwnPlaceToASecondMount) {
   const kernel::Item item = ItemAt("volume/a/x");
   std::filesystem::rename(PathOf("volume/a"), PathOf("volume/b"));
-  // The same files once more, under another mount.
+  // The same files again, at another mount.
   const ScopedMount again(PathOf("volume/b"), mFolder.MakeFolder("volume/first"), "", MS_BIND);
   ASSERT_TRUE(again.IsMounted());
   EXPECT_EQ(Search(item, PathOf("volume")), PathOf("volume/b/x"));
 }
 
-TEST_F(AFolderIndexOfAVolume, DoesNotTakeACoveredFolderForWhatCoversIt) {
+TEST_F(AFolderIndexOfAVolume, DoesNotTakeACoveredFolderForItsCover) {
   const kernel::Item covered = ItemAt("volume/a/mounted");
   const ScopedMount cover("tmpfs", PathOf("volume/a/mounted"), "tmpfs");
   ASSERT_TRUE(cover.IsMounted());

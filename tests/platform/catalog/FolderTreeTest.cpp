@@ -1,3 +1,4 @@
+// The tree of folders that an index keeps in memory.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -41,7 +42,7 @@ TEST_F(AFolderTree, KnowsThePathOfAFolderInTheRoot) {
   EXPECT_EQ(tree.PathOf(LearnIn(tree, LearnIn(tree, kNoParent, "/", 2), "a", 101)), "/a");
 }
 
-TEST_F(AFolderTree, KnowsAFolderAgainWhereverItHasMoved) {
+TEST_F(AFolderTree, RecognisesAFolderWhereverItHasMoved) {
   const FolderNumber a = Learn(mTop, "a", 101);
   const FolderNumber b = Learn(mTop, "b", 102);
   const FolderNumber below = Learn(b, "below", 103);
@@ -49,7 +50,7 @@ TEST_F(AFolderTree, KnowsAFolderAgainWhereverItHasMoved) {
   EXPECT_EQ(mTree.PathOf(below), "/v/a/c/below");
 }
 
-TEST_F(AFolderTree, KeepsAFolderUnderItsParentWhenItIsMetByItsPath) {
+TEST_F(AFolderTree, KeepsAFolderUnderItsParentWhenReachedByItsPath) {
   const FolderNumber a = Learn(mTop, "a", 101);
   EXPECT_EQ(Learn(kNoParent, "/v/a", 101), a);
   Learn(kNoParent, "/w", 100);
@@ -83,7 +84,7 @@ TEST_F(AFolderTree, ForgetsAFolder) {
   EXPECT_NE(Learn(mTop, "a", 101), a);
 }
 
-TEST_F(AFolderTree, IsMostlyWasteWhenMostNamesAreOfFoldersThatAreGone) {
+TEST_F(AFolderTree, IsMostlyWasteWhenMostNamesAreOfDeletedFolders) {
   const std::string name(50, 'n');
   mTree.Forget(Learn(mTop, name, 101));
   EXPECT_TRUE(mTree.IsMostlyWaste());
@@ -108,7 +109,7 @@ TEST_F(AFolderTree, DistinguishesFoldersOfTwoDevices) {
   EXPECT_FALSE(mTree.IsSame(here, FolderWith(101, 2)));
 }
 
-TEST_F(AFolderTree, KnowsAFolderAgainAtAnotherMount) {
+TEST_F(AFolderTree, RecognisesAFolderAtAnotherMount) {
   const FolderNumber a = Learn(mTop, "a", 101);
   EXPECT_EQ(mTree.Learn({kNoParent, "/w"}, FolderWith(101, 1, 11), 101), a);
   EXPECT_EQ(mTree.PathOf(a), "/w");
@@ -116,7 +117,7 @@ TEST_F(AFolderTree, KnowsAFolderAgainAtAnotherMount) {
   EXPECT_FALSE(mTree.IsSame(a, FolderWith(101, 1, 10)));
 }
 
-TEST_F(AFolderTree, KeepsTheHandleOfTheFirstFolderOfARegionAlone) {
+TEST_F(AFolderTree, KeepsOnlyTheHandleOfARegionsFirstFolder) {
   kernel::Item first = FolderWith(101, 2);
   first.handle.size = 8;
   const FolderNumber outer = mTree.Learn({mTop, "a"}, first, 101);
@@ -152,14 +153,14 @@ TEST_F(AFolderTreeByPlaces, DistinguishesFoldersWithTheSameNumber) {
   EXPECT_EQ(mPlaces.PathOf(inner), "/v/a/b");
 }
 
-TEST_F(AFolderTreeByPlaces, KnowsAFolderAgainAtItsPlace) {
+TEST_F(AFolderTreeByPlaces, RecognisesAFolderAtItsPlace) {
   const FolderNumber a = LearnIn(mPlaces, mRoot, "a", 101);
   mPlaces[a].isRead = true;
   EXPECT_EQ(LearnIn(mPlaces, mRoot, "a", 101), a);
   EXPECT_TRUE(mPlaces[a].isRead);
 }
 
-TEST_F(AFolderTreeByPlaces, ReadsAnewWhatHasTakenAPlace) {
+TEST_F(AFolderTreeByPlaces, RereadsAFolderThatHasTakenAPlace) {
   const FolderNumber a = LearnIn(mPlaces, mRoot, "a", 101);
   mPlaces[a].isRead = true;
   EXPECT_EQ(LearnIn(mPlaces, mRoot, "a", 102), a);

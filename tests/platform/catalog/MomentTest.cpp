@@ -1,4 +1,4 @@
-// Moments as a process opens them: what was looked at once serves until the end.
+// Moments as a process opens them: what has been looked up once is used until the moment ends.
 #include <Tallowmere/Process.h>
 #include <fcntl.h>
 #include <gmock/gmock.h>
@@ -26,7 +26,7 @@ using process::MomentScope;
 using testing::IsEmpty;
 using testing::Not;
 
-// On volumes of its own: "first" and "second", each with the same items.
+// Mounts the volumes "first" and "second" with the same items on each.
 class AMoment : public testing::Test {
  protected:
   void SetUp() override {
@@ -34,12 +34,12 @@ class AMoment : public testing::Test {
     for (auto [mount, name] : {std::pair(&mFirst, "first"), std::pair(&mSecond, "second")}) {
       mount->emplace("none", mFolder.MakeFolder(name), "tmpfs");
       ASSERT_TRUE((*mount)->IsMounted());
-      // The first numbers are not their ids.
+      // Uses up the inode numbers below 16, which differ from their ids.
       for (int i = 0; i < 20; ++i) mFolder.MakeFile(std::string(name) + "/" + std::to_string(i));
       mFolder.MakeFolder(std::string(name) + "/a/b");
       mFolder.MakeFile(std::string(name) + "/a/b/x");
     }
-    // Child processes share the kernel's signal that the mounts have changed: it is for this one.
+    // Child processes share the kernel's notice of changed mounts, so consume it here first.
     VolumeAt(1);
   }
   std::string PathTo(const std::string& name) const { return mFolder.Path() / name; }
@@ -48,13 +48,13 @@ class AMoment : public testing::Test {
   }
   bool CanUnmount(const std::string& name) const { return umount2(PathTo(name).c_str(), 0) == 0; }
 
-  // The name that the item of a reference has.
+  // Returns the current name of a reference's item, or the result code in brackets.
   static std::string NameOfItem(const FSRef& item) {
     FSSpec spec{};
     const OSErr error = FSGetCatalogInfo(&item, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr);
     return error == noErr ? NameOf(spec) : "(" + std::to_string(error) + ")";
   }
-  // The folders that a climb from the one of an item comes to, each with a colon.
+  // Returns the folders that a climb from the item's folder passes, each with a colon.
   std::string FoldersOf(const std::string& name) const {
     const FSSpec spec = SpecOf(PathTo(name));
     std::string folders;
@@ -69,7 +69,7 @@ class AMoment : public testing::Test {
     }
     return folders;
   }
-  // What asking about an item once more costs, after a first time.
+  // Returns the system calls of a second request about an item.
   std::optional<std::vector<long>> CallsOfTheSecondQuestion(bool inMoment) const {
     std::optional<MomentScope> moment;
     FSRef item{};
@@ -90,7 +90,7 @@ class AMoment : public testing::Test {
   std::optional<ScopedMount> mSecond;
 };
 
-// --- What serves --------------------------------------------------------------------------------
+// --- What is reused -----------------------------------------------------------------------------
 
 TEST_F(AMoment, LooksAtAnItemOnce) {
   const auto within = CallsOfTheSecondQuestion(true);
@@ -159,7 +159,7 @@ TEST_F(AMoment, ClimbsThroughTheFoldersThatHoldItNow) {
   };
   ASSERT_EQ(climb("first/a/b/c/x"), "first:a:b:c:");
   ASSERT_EQ(climb("first/a/b/c/x"), "first:a:b:c:");
-  // The folder that held "c" goes elsewhere and is seen there; "c" stays where it was.
+  // The folder that held "c" moves and is seen at its new place; "c" stays where it was.
   Rename("first/a/b", "first/elsewhere");
   mFolder.MakeFolder("first/a/b");
   Rename("first/elsewhere/c", "first/a/b/c");
@@ -168,8 +168,8 @@ TEST_F(AMoment, ClimbsThroughTheFoldersThatHoldItNow) {
   EXPECT_EQ(climb("first/a/b/c/x"), "first:a:b:c:");
 }
 
-// "t/m/z/m" is a mount point, and becomes "t/m": what the table calls the mount point is then a
-// folder in the volume.
+// Renames "t/m/z", which holds the mount point "m", to "t". "t/m/z/m", the mount point that the
+// mount table last showed, is then a folder inside the volume.
 class AMomentAfterARename : public AMoment {
  protected:
   void SetUp() override {
@@ -213,7 +213,7 @@ TEST_F(AMomentAfterARename, TakesNoFolderInAVolumeForItsRoot) {
   EXPECT_EQ(FoldersInAMoment("t/m/z/m/x/y"), "m:z:m:x:");
 }
 
-// --- What does not ------------------------------------------------------------------------------
+// --- What is not reused -------------------------------------------------------------------------
 
 TEST_F(AMoment, KeepsNothingNegative) {
   const MomentScope moment;
@@ -230,7 +230,7 @@ TEST_F(AMoment, KeepsNothingNegative) {
   EXPECT_TRUE(CFURLGetFSRef(url.Get(), &item));
 }
 
-TEST_F(AMoment, LooksAlongAPathOnceMoreBeforeItGivesIt) {
+TEST_F(AMoment, VerifiesAPathBeforeItGivesIt) {
   const MomentScope moment;
   const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   ASSERT_EQ(NameOfItem(item), "x");
@@ -238,7 +238,7 @@ TEST_F(AMoment, LooksAlongAPathOnceMoreBeforeItGivesIt) {
   EXPECT_EQ(PathOf(item), PathTo("first/a/y"));
 }
 
-TEST_F(AMoment, DoesNotTakeWhatIsMountedMeanwhileForWhatItHasSeen) {
+TEST_F(AMoment, DoesNotMixANewMountWithWhatItHasSeen) {
   const MomentScope moment;
   const FSSpec before = SpecOf(PathTo("first/a/b/x"));
   const ScopedMount cover("none", PathTo("first/a/b"), "tmpfs");
@@ -247,14 +247,14 @@ TEST_F(AMoment, DoesNotTakeWhatIsMountedMeanwhileForWhatItHasSeen) {
   const FSRef item = ReferenceTo(mFolder.MakeFile("first/a/b/x"));
   FSCatalogInfo info{};
   ASSERT_EQ(FSGetCatalogInfo(&item, kFSCatInfoVolume, &info, nullptr, nullptr, nullptr), noErr);
-  // Either state is one of this moment, but of one item only.
+  // Both states occur within this moment, but one item must not mix them.
   FSSpec spec{};
   ASSERT_EQ(FSGetCatalogInfo(&item, kFSCatInfoNone, nullptr, nullptr, &spec, nullptr), noErr);
   EXPECT_EQ(info.volume, spec.vRefNum);
   EXPECT_EQ(ParentOf(spec) == 2U, spec.vRefNum != before.vRefNum);
 }
 
-TEST_F(AMoment, KnowsAVolumeThatIsMountedMeanwhile) {
+TEST_F(AMoment, SeesAVolumeMountedMeanwhile) {
   const MomentScope moment;
   const FSSpec before = SpecOf(PathTo("first/a/b/x"));
   const ScopedMount third("none", mFolder.MakeFolder("third"), "tmpfs");
@@ -265,7 +265,7 @@ TEST_F(AMoment, KnowsAVolumeThatIsMountedMeanwhile) {
   EXPECT_EQ(spec.vRefNum, VolumeNamed("third"));
 }
 
-TEST(WithoutAMoment, EachCallLooksForItself) {
+TEST(WithoutAMoment, EachCallLooksAfresh) {
   const TemporaryFolder folder;
   const std::string path = folder.MakeFile("x");
   const FSRef item = ReferenceTo(path);
@@ -287,7 +287,7 @@ TEST_F(AMoment, KeepsAVolumeMountedUntilItsScopeEnds) {
   EXPECT_TRUE(CanUnmount("first"));
 }
 
-TEST_F(AMoment, LetsGoWhenItIsEnded) {
+TEST_F(AMoment, ReleasesEverythingWhenItIsEnded) {
   MomentScope moment;
   SpecOf(PathTo("first/a/b/x"));
   moment.End();
@@ -295,7 +295,7 @@ TEST_F(AMoment, LetsGoWhenItIsEnded) {
   moment.End();
 }
 
-TEST_F(AMoment, EndsByAnException) {
+TEST_F(AMoment, EndsOnAnException) {
   try {
     const MomentScope moment;
     SpecOf(PathTo("first/a/b/x"));
@@ -317,7 +317,7 @@ TEST_F(AMoment, CarriesNothingOverToTheNext) {
   EXPECT_EQ(NameOfItem(item), "y");
 }
 
-TEST_F(AMoment, OnceEndedServesNoLongerInItsScope) {
+TEST_F(AMoment, IsNotUsedInItsScopeOnceEnded) {
   MomentScope moment;
   const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   ASSERT_EQ(NameOfItem(item), "x");
@@ -326,7 +326,7 @@ TEST_F(AMoment, OnceEndedServesNoLongerInItsScope) {
   EXPECT_EQ(NameOfItem(item), "y");
 }
 
-TEST_F(AMoment, WithinAnotherIsTheSame) {
+TEST_F(AMoment, NestedInAnotherIsTheSame) {
   MomentScope outer;
   SpecOf(PathTo("first/a/b/x"));
   {
@@ -345,7 +345,7 @@ TEST_F(AMoment, WithinAnotherIsTheSame) {
 
 // --- Whose it is --------------------------------------------------------------------------------
 
-TEST_F(AMoment, IsNotThatOfAnotherThread) {
+TEST_F(AMoment, IsNotSharedWithAnotherThread) {
   const MomentScope moment;
   const FSRef item = ReferenceTo(PathTo("first/a/b/x"));
   ASSERT_EQ(NameOfItem(item), "x");
@@ -355,7 +355,7 @@ TEST_F(AMoment, IsNotThatOfAnotherThread) {
   EXPECT_EQ(seen, "y");
 }
 
-TEST_F(AMoment, IsNotEndedByThatOfAnotherThread) {
+TEST_F(AMoment, IsNotEndedByAnotherThread) {
   MomentScope moment;
   SpecOf(PathTo("first/a/b/x"));
   std::thread([&] {
@@ -370,7 +370,7 @@ TEST_F(AMoment, IsNotEndedByThatOfAnotherThread) {
 
 // --- What it holds ------------------------------------------------------------------------------
 
-TEST_F(AMoment, LetsGoOfWhatItHoldsWhenAVolumeIsSearched) {
+TEST_F(AMoment, ReleasesItsFoldersWhenAVolumeIsSearched) {
   const std::string path = mFolder.MakeFolder("second/gone");
   const FSCatalogInfo info = InfoOf(path);
   std::filesystem::remove(path);
@@ -381,7 +381,7 @@ TEST_F(AMoment, LetsGoOfWhatItHoldsWhenAVolumeIsSearched) {
   EXPECT_TRUE(CanUnmount("first"));
 }
 
-// Has no more than so many descriptors opened from now on.
+// Limits how many more descriptors can be opened. Returns whether that worked.
 bool LeaveDescriptors(int count) {
   const kernel::Descriptor lowest(dup(STDIN_FILENO));
   const auto end = static_cast<rlim_t>(lowest.Get() + count);
@@ -425,7 +425,7 @@ TEST_F(AMoment, FollowsAPathOfMoreStepsThanItHasDescriptors) {
                            }));
 }
 
-// More folders than a moment holds.
+// With more folders than a moment holds.
 TEST_F(AMoment, AnswersForManyFolders) {
   const MomentScope moment;
   std::vector<FSSpec> specs;

@@ -1,4 +1,4 @@
-// HFS names of items in a folder, and the items that they find.
+// The HFS names of items in a folder, and the items that such names find.
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
@@ -46,7 +46,7 @@ class NamesInAFolder : public testing::Test {
   FSSpec Record(std::string_view name) const {
     return MakeRecord(mInfo.volume, mInfo.nodeID, name);
   }
-  // The path of what an HFS name finds in the folder, or a result code.
+  // Returns the path that an HFS name finds in the folder, or the result code in brackets.
   std::string LookUp(std::string_view name) const { return ItemOf(Record(name)); }
 
   std::string HFSName(const std::string& name) const { return NameOf(SpecOf(PathTo(name))); }
@@ -65,7 +65,7 @@ std::string Hexadecimal(std::uint32_t id) {
   return text;
 }
 
-TEST_F(NamesInAFolder, APlainNameIsItsOwn) {
+TEST_F(NamesInAFolder, APlainNameIsItsOwnHFSName) {
   Make("a file.txt");
   EXPECT_EQ(HFSName("a file.txt"), "a file.txt");
   ExpectRoundTrip("a file.txt");
@@ -111,7 +111,7 @@ TEST_F(NamesInAFolder, ANameOfMixedFormsIsFoundWhenItIsTheOnlyOne) {
             "\x8E\x8E");
 }
 
-TEST_F(NamesInAFolder, OfTwoNamesOfMixedFormsNeitherIsFoundByTheirCommonForm) {
+TEST_F(NamesInAFolder, TwoNamesOfMixedFormsAreNotFoundByTheirCommonForm) {
   const std::string first =
       "\xC3\xA9"
       "e\xCC\x81";
@@ -123,7 +123,7 @@ TEST_F(NamesInAFolder, OfTwoNamesOfMixedFormsNeitherIsFoundByTheirCommonForm) {
   ExpectRoundTrip(second);
 }
 
-TEST_F(NamesInAFolder, AllFormsOfANameSideBySideComeBack) {
+TEST_F(NamesInAFolder, AllFormsOfANameSideBySideSurviveARoundTrip) {
   const std::vector<std::string> forms{"\xC3\xA9\xC3\xA9",
                                        "e\xCC\x81"
                                        "e\xCC\x81",
@@ -134,7 +134,7 @@ TEST_F(NamesInAFolder, AllFormsOfANameSideBySideComeBack) {
   for (const std::string& name : forms) ExpectRoundTrip(name);
 }
 
-TEST_F(NamesInAFolder, EveryByteComesBackInEitherNormalForm) {
+TEST_F(NamesInAFolder, EveryByteSurvivesARoundTripInEitherNormalForm) {
   for (int byte = 1; byte < 256; ++byte) {
     const auto names = SpellHFSName("x" + std::string(1, static_cast<char>(byte)));
     for (const std::string& name : {names.precomposed, names.decomposed}) {
@@ -146,7 +146,7 @@ TEST_F(NamesInAFolder, EveryByteComesBackInEitherNormalForm) {
   }
 }
 
-TEST_F(NamesInAFolder, EveryByteComesBackBesideItsOtherForm) {
+TEST_F(NamesInAFolder, EveryByteSurvivesARoundTripBesideItsOtherForm) {
   std::vector<std::string> made;
   for (int byte = 1; byte < 256; ++byte) {
     const auto names = SpellHFSName("x" + std::string(1, static_cast<char>(byte)));
@@ -158,7 +158,7 @@ TEST_F(NamesInAFolder, EveryByteComesBackBesideItsOtherForm) {
   for (const std::string& path : made) EXPECT_EQ(ItemOf(SpecOf(path)), path);
 }
 
-TEST_F(NamesInAFolder, InvalidUtf8ComesBack) {
+TEST_F(NamesInAFolder, InvalidUtf8SurvivesARoundTrip) {
   for (const std::string& name :
        std::vector<std::string>{"\xFF", "a\x80.aif", "\xC3", "\xED\xA0\x80", "\xF4\x90\x80\x80",
                                 "\xC0\xAF", "\xFF\xFE\xFD"}) {
@@ -169,7 +169,7 @@ TEST_F(NamesInAFolder, InvalidUtf8ComesBack) {
   }
 }
 
-TEST_F(NamesInAFolder, ControlCharactersComeBack) {
+TEST_F(NamesInAFolder, ControlCharactersSurviveARoundTrip) {
   for (const std::string& name :
        std::vector<std::string>{"\n", " ", "\t\r", "\x01\x7F", "\\", "*?"}) {
     Make(name);
@@ -178,14 +178,14 @@ TEST_F(NamesInAFolder, ControlCharactersComeBack) {
   }
 }
 
-TEST_F(NamesInAFolder, NamesOfEveryLengthComeBack) {
+TEST_F(NamesInAFolder, NamesOfEveryLengthSurviveARoundTrip) {
   for (std::size_t length = 1; length <= 255; ++length) Make(std::string(length, 'n'));
   for (std::size_t length = 1; length <= 255; ++length) ExpectRoundTrip(std::string(length, 'n'));
   EXPECT_EQ(HFSName(std::string(63, 'n')), std::string(63, 'n'));
   EXPECT_LE(HFSName(std::string(64, 'n')).size(), 31u);
 }
 
-TEST_F(NamesInAFolder, NamesThatDifferOnlyBehindByte63ComeBack) {
+TEST_F(NamesInAFolder, NamesThatDifferOnlyAfterByte63SurviveARoundTrip) {
   std::set<std::string> forms;
   for (const char* end : {"a", "b", ".aif", ".wav", "c.aif"}) Make(std::string(70, 'n') + end);
   for (const char* end : {"a", "b", ".aif", ".wav", "c.aif"}) {
@@ -195,7 +195,7 @@ TEST_F(NamesInAFolder, NamesThatDifferOnlyBehindByte63ComeBack) {
   EXPECT_EQ(forms.size(), 5u);
 }
 
-TEST_F(NamesInAFolder, AnAccentedNameBeyond255BytesInUtf8IsNotFoundAndNoError) {
+TEST_F(NamesInAFolder, AnAccentedNameBeyond255BytesInUtf8IsNotFound) {
   EXPECT_EQ(LookUp(std::string(63, '\x8E')), "(-43)");
   Str255Of name(std::string(255, '\x8E'));
   FSSpec spec{};
@@ -203,7 +203,7 @@ TEST_F(NamesInAFolder, AnAccentedNameBeyond255BytesInUtf8IsNotFoundAndNoError) {
             bdNamErr);
 }
 
-TEST_F(NamesInAFolder, AnExtensionWithANumberSignComesBack) {
+TEST_F(NamesInAFolder, AnExtensionWithANumberSignSurvivesARoundTrip) {
   for (const char* name : {"\xFF.c#", "\xFF.#", "\xFF.a#B", "\xFF.#10", "\xFF#.10", "\xFF.#A#B"}) {
     Make(name);
     ExpectRoundTrip(name);
@@ -240,19 +240,20 @@ TEST_F(NamesInAFolder, ARecordWithMoreMarksStillFindsItsItemWhenTheLiteralNameIs
   EXPECT_EQ(ItemOf(record), PathTo(longName));
 }
 
-// A short form stands for what has no other name: else a new file called so would seem to be there.
+// Only items without a plain name have a short form. Otherwise a new file of that name would seem
+// to exist already.
 TEST_F(NamesInAFolder, AnItemWithANameOfItsOwnIsNotFoundByAShortForm) {
   for (const std::string& name : std::vector<std::string>{"report.txt", "what?", kDecomposed}) {
     Make(name);
     EXPECT_EQ(LookUp(ShortHFSName(name, IDOf(PathTo(name)))), "(-43)") << name;
   }
-  // With a twin it has none.
+  // Beside a twin, the name is not plain.
   const std::string shortForm = ShortHFSName(kDecomposed, IDOf(PathTo(kDecomposed)));
   Make(kComposed);
   EXPECT_EQ(LookUp(shortForm), PathTo(kDecomposed));
 }
 
-TEST_F(NamesInAFolder, AShortFormIsLookedUpInItsOwnFolderAlone) {
+TEST_F(NamesInAFolder, AShortFormIsLookedUpOnlyInItsOwnFolder) {
   const std::string longName = std::string(80, 'n');
   Make(longName);
   const std::string shortForm = HFSName(longName);
@@ -263,7 +264,7 @@ TEST_F(NamesInAFolder, AShortFormIsLookedUpInItsOwnFolderAlone) {
   EXPECT_TRUE(HoldsForNobody([&] { return ItemOf(record) == "(-43)"; }));
 }
 
-TEST_F(NamesInAFolder, HardLinksWithOneShortFormComeBackAsOneItem) {
+TEST_F(NamesInAFolder, HardLinksWithOneShortFormAreFoundAsOneItem) {
   const std::string first = std::string(80, 'n') + "1";
   const std::string second = std::string(80, 'n') + "2";
   Make(first);
@@ -289,7 +290,7 @@ TEST_F(NamesInAFolder, AShortFormWithTheIDOfAnotherItemIsNotFound) {
   EXPECT_EQ(LookUp(ShortHFSName(longName, IDOf(PathTo(longName)))), PathTo(longName));
 }
 
-TEST_F(NamesInAFolder, AShortFormOfAnItemThatWasReplacedIsNotFound) {
+TEST_F(NamesInAFolder, AShortFormOfAReplacedItemIsNotFound) {
   const std::string longName = std::string(80, 'n');
   Make(longName);
   const FSSpec record = SpecOf(PathTo(longName));
@@ -298,10 +299,10 @@ TEST_F(NamesInAFolder, AShortFormOfAnItemThatWasReplacedIsNotFound) {
   EXPECT_EQ(ItemOf(record), "(-43)");
 }
 
-TEST_F(NamesInAFolder, AShortFormOfWhatCannotBeLookedAtIsNotTakenForANewName) {
+TEST_F(NamesInAFolder, AShortFormOfAnInaccessibleItemIsNotTakenForANewName) {
   constexpr std::size_t kLongestPath = PATH_MAX - 1;
   const std::string longName(80, 'n');
-  // The folder's path leaves room for the short form alone.
+  // The folder's path is so long that only the short form fits below it.
   const std::size_t length = kLongestPath - longName.size();
   std::string path = mFolder.Path();
   while (path.size() + 202 < length) path += "/" + std::string(200, 'f');
@@ -318,8 +319,8 @@ TEST_F(NamesInAFolder, AShortFormOfWhatCannotBeLookedAtIsNotTakenForANewName) {
   unlinkat(folder.Get(), longName.c_str(), 0);
 }
 
-// A sandbox that lets folders be searched, and not read.
-TEST_F(NamesInAFolder, AFolderWhoseReadingIsForbiddenIsRefused) {
+// In a sandbox that permits searching folders but not reading them.
+TEST_F(NamesInAFolder, AnUnreadableFolderIsRefused) {
   ASSERT_EQ(LookUp("missing\x8E"), "(-43)");
   for (const int error : {EACCES, EPERM}) {
     EXPECT_TRUE(HoldsInChild([&] { return RefuseCall(SYS_openat, error); },
@@ -333,7 +334,7 @@ TEST_F(NamesInAFolder, AFolderWhoseReadingIsForbiddenIsRefused) {
                            [&] { return LookUp("missing\x8E") == "(-36)"; }));
 }
 
-TEST_F(NamesInAFolder, NoItemIsCalledSo) {
+TEST_F(NamesInAFolder, NamesThatNoItemCanHaveAreNotFound) {
   for (const std::string& name : std::vector<std::string>{
            std::string(), std::string("."), std::string(".."), std::string("a\0b", 3),
            std::string("\0", 1), std::string(":"), std::string("a:b")}) {
@@ -341,21 +342,21 @@ TEST_F(NamesInAFolder, NoItemIsCalledSo) {
   }
 }
 
-TEST_F(NamesInAFolder, WhatIsADotInAUrlIsANameLikeOthers) {
+TEST_F(NamesInAFolder, AnEscapeSequenceIsANameLikeOthers) {
   for (const char* const name : {"%2E", "%2e%2E", ".%2e", "%2E.", "%2F", "a%2Fb", "%", "%00"}) {
     Make(name);
     ExpectRoundTrip(name);
   }
 }
 
-TEST_F(NamesInAFolder, ALinkIsFoundItselfAndADanglingOneToo) {
+TEST_F(NamesInAFolder, ALinkIsFoundItselfEvenADanglingOne) {
   ASSERT_EQ(symlink("nowhere", PathTo("link").c_str()), 0);
   ASSERT_EQ(symlink("/", PathTo("root").c_str()), 0);
   ExpectRoundTrip("link");
   ExpectRoundTrip("root");
 }
 
-TEST_F(NamesInAFolder, ManyHostileNamesSideBySideComeBack) {
+TEST_F(NamesInAFolder, ManyHostileNamesSideBySideSurviveARoundTrip) {
   std::set<std::string> names;
   unsigned seed = 4711;
   const auto next = [&seed](unsigned limit) {

@@ -28,10 +28,10 @@ struct Node {
   fuse_ino_t parent;
   std::string name;
 };
-// Of items for which the test gives no number.
+// The first number of items to which the test gives none.
 constexpr ino_t kFirstOwnNumber = 0x1000;
 
-// Nodes are never given away again; the kernel's number of one is its index.
+// A node's index is its FUSE node id. Indexes are never reused.
 std::vector<Node> nodes;
 bool ignoresCase = false;
 NumberedFileSystem::Ticks ticks = NumberedFileSystem::Ticks::kFine;
@@ -134,7 +134,7 @@ void ReadFolder(fuse_req_t request, fuse_ino_t folder, size_t size, off_t offset
   fuse_reply_buf(request, buffer.data(), used);
 }
 
-// A block device that lasts as long as the process; empty where there is none.
+// Returns a block device that lasts as long as the process, or an empty string on failure.
 std::string MakeBlockDevice(const std::string& file) {
   constexpr off_t kSize = 1 << 20;
   loop_config config{};

@@ -1,6 +1,6 @@
-// A file system whose items have the inode numbers that a test gives them: the number behind the
-// last '@' of their names, else one of their own. Nothing can be written, and folders alone can be
-// removed; nothing can be moved to where something is.
+// A file system in which a test chooses the inode numbers: an item has the number after the last
+// '@' of its name, or else one of its own. Nothing can be written, only folders can be removed, and
+// nothing can be moved over an existing item.
 #pragma once
 
 #include <sys/types.h>
@@ -14,17 +14,17 @@ namespace tallowmere::test {
 
 class NumberedFileSystem {
  public:
-  // On a block device it passes for a file system of a disk: fuseblk.
+  // On a block device it mounts as fuseblk, like a file system on a disk.
   enum class On { kNothing, kBlockDevice };
 
-  // Whether a name finds an item whose name has ASCII letters in the other case.
+  // Whether names that differ only in the case of ASCII letters find the same item.
   enum class Case { kCounts, kIgnored };
 
   // How times advance: as finely as the clock, in the kernel's ticks of some milliseconds, or in
   // seconds. Within a tick, all changes have one time.
   enum class Ticks { kFine, kKernels, kSeconds };
 
-  // Served by a child process. REQUIRES: the test is in a mount namespace of its own.
+  // Serves from a child process. REQUIRES: the test is in a mount namespace of its own.
   explicit NumberedFileSystem(On on = On::kNothing, Case letterCase = Case::kCounts,
                               Ticks ticks = Ticks::kFine);
   NumberedFileSystem(const NumberedFileSystem&) = delete;
@@ -34,7 +34,7 @@ class NumberedFileSystem {
   bool IsMounted() const { return mIsMounted; }
   std::filesystem::path Path() const { return mFolder.Path() / "numbered"; }
 
-  // Makes a folder or a file with that inode number. The path.
+  // Both make an item with that inode number and return its path.
   std::string MakeFolder(const std::string& name, unsigned long number) const;
   std::string MakeFile(const std::string& name, unsigned long number) const;
 

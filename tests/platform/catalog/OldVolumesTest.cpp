@@ -1,5 +1,5 @@
-// Names as old volumes give them, on a file system that passes for one: letter case does not count,
-// names are the bytes of the disk, long names had short forms.
+// Names on file systems that pass for old volumes: they ignore letter case, give names as the
+// disk's bytes, or once had short forms of long names.
 #include <fcntl.h>
 #include <sys/stat.h>
 
@@ -20,7 +20,7 @@
 namespace tallowmere::test {
 namespace {
 
-// statfs(2) on the kinds' own volumes.
+// The types that statfs(2) reports on real volumes.
 constexpr std::uint32_t kHFS = 0x4244;
 constexpr std::uint32_t kHFSPlus = 0x482B;
 constexpr std::uint32_t kVfat = 0x4D44;
@@ -47,7 +47,7 @@ class AnOldVolume : public testing::Test {
     EXPECT_EQ(mknod((Top() + "/" + name).c_str(), S_IFREG | 0644, 0), 0) << name;
     return Top() + "/" + name;
   }
-  // What a record finds.
+  // Returns the path that a record finds, or the result code in brackets.
   std::string LookUp(const std::string& folder, std::string_view name) const {
     return ItemOf(MakeRecord(mNumber, IDOf(folder), name));
   }
@@ -84,7 +84,7 @@ TEST_P(WithoutLetterCase, AFolderOnTheWayHasItsStoredNameToo) {
   MakeFolder("Folder");
   const std::string inner = MakeFolder("Folder/Inner");
   const std::string path = MakeFile("Folder/Inner/Read Me");
-  // The folders are remembered as they were asked for.
+  // The platform remembers the folders as they were spelled.
   SpecOf(Top() + "/FOLDER/INNER/READ ME");
   EXPECT_EQ(LookUp(inner, "read me"), path);
   EXPECT_EQ(FolderWithID(mNumber, IDOf(Top() + "/FOLDER/INNER")), inner);
@@ -124,11 +124,11 @@ TEST_P(WithoutLetterCase, AFullPathHasTheStoredNames) {
   EXPECT_EQ(names::TextOfPascal(name), "Folder");
 }
 
-TEST_P(WithoutLetterCase, AChangeOfCaseAloneIsSeen) {
+TEST_P(WithoutLetterCase, ARenameOfLetterCaseOnlyIsSeen) {
   const std::string before = MakeFile("Read Me");
   const FSRef reference = ReferenceTo(before);
   const std::string after = Top() + "/READ ME";
-  // At once the kernel takes both for two names of one item and does nothing.
+  // Renaming directly would have no effect: to the kernel both are names of the same item.
   std::filesystem::rename(before, Top() + "/other");
   std::filesystem::rename(Top() + "/other", after);
   EXPECT_EQ(PathOf(reference), after);
@@ -228,8 +228,8 @@ TEST_F(AnOldVolume, ANameInUtf8CountsBeforeTheOneInBytes) {
   EXPECT_EQ(LookUp(Top(), "caf\x8E"), text);
 }
 
-// The bytes of √© in Mac Roman are é in UTF-8.
-TEST_F(AnOldVolume, BytesThatAreUtf8AreNoNameInBytes) {
+// "√©" in Mac Roman has the bytes of "é" in UTF-8.
+TEST_F(AnOldVolume, BytesThatAreUtf8AreNotANameInBytes) {
   ASSERT_NO_FATAL_FAILURE(Mount(kHFS));
   if (IsSkipped()) return;
   MakeFile("caf\xC3\xA9");
@@ -244,7 +244,7 @@ TEST_F(AnOldVolume, ColonsAndSlashesAreExchangedInNamesInBytes) {
   EXPECT_EQ(LookUp(Top(), "a:\x8E"), "(-43)");
 }
 
-TEST_F(AnOldVolume, NamesInBytesAreLookedForOnClassicVolumesAlone) {
+TEST_F(AnOldVolume, NamesInBytesAreLookedForOnlyOnClassicVolumes) {
   ASSERT_NO_FATAL_FAILURE(Mount(kHFSPlus));
   if (IsSkipped()) return;
   MakeFile("caf\x8E");
@@ -270,7 +270,7 @@ TEST_F(AnOldVolume, AShortFormWithAnotherNumberFindsNothing) {
   EXPECT_EQ(LookUp(Top(), names::ShortHFSName("B" + kLongName, IDOf(path))), "(-43)");
 }
 
-TEST_F(AnOldVolume, AnItemThatIsCalledSoCountsBeforeTheShortForm) {
+TEST_F(AnOldVolume, AnItemOfThatNameCountsBeforeTheShortForm) {
   ASSERT_NO_FATAL_FAILURE(Mount(kHFSPlus));
   if (IsSkipped()) return;
   const std::string path = MakeFile(kLongName);

@@ -1,3 +1,4 @@
+// The bounded memory of the places where items were last seen.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
@@ -19,7 +20,7 @@ std::string PathOf(const PlaceMemory::Place* place) {
   return place == nullptr ? "(null)" : place->path;
 }
 
-// Bytes that one place with a short path takes.
+// Returns the bytes that one place with a short path takes.
 std::size_t SizeOfOnePlace() {
   PlaceMemory memory(kPlenty);
   memory.Remember(Item(1, 1), "/a");
@@ -120,7 +121,7 @@ TEST(PlaceMemory, KnowsThePlaceOfTheLastUse) {
   EXPECT_EQ(memory.Latest(), "/a");
 }
 
-// What it recalls is what it was last told, and its size is that of what it can recall.
+// It only recalls what it was told last, and its size is that of what it can recall.
 RC_GTEST_PROP(PlaceMemory, NeverRecallsAWrongPlace, ()) {
   PlaceMemory memory(10 * SizeOfOnePlace());
   std::map<std::uint64_t, std::string> told;

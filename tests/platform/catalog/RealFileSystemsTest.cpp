@@ -1,5 +1,5 @@
-// The same promises on real file systems: identity, and the way from path to record to path in
-// another process.
+// The platform's promises on real file systems: identity, and the round trip from path to record to
+// path in another process.
 #include <Tallowmere/Process.h>
 #include <fcntl.h>
 #include <sys/mount.h>
@@ -35,7 +35,7 @@ std::string FromHexadecimal(std::string_view digits) {
   return bytes;
 }
 
-// Every item below a folder and the folder itself, links not followed, other mounts not entered.
+// Returns the folder and every item below it. Follows no links and enters no other mounts.
 std::vector<std::string> ItemsBelow(const std::string& top) {
   std::vector<std::string> paths{top};
   for (const auto& entry : std::filesystem::recursive_directory_iterator(top)) {
@@ -44,7 +44,7 @@ std::vector<std::string> ItemsBelow(const std::string& top) {
   return paths;
 }
 
-// Folders, files, links and, if the file system takes any bytes, hostile names.
+// Makes folders, files, links and, if the file system accepts any bytes, hostile names.
 void MakeItems(const std::string& top, bool anyName) {
   const auto write = [](const std::string& path) { std::ofstream(path) << path; };
   for (int i = 0; i < 4; ++i) {
@@ -67,7 +67,7 @@ void MakeItems(const std::string& top, bool anyName) {
   ASSERT_EQ(mkfifo((top + "/pipe").c_str(), 0644), 0);
 }
 
-// What another process makes of the records of all items.
+// Checks that another process resolves the records of all items to their paths.
 void ExpectRoundTrip(const std::string& top, const std::vector<std::string>& arguments) {
   ChildProgram resolve(TALLOWMERE_RESOLVE_SPEC, arguments);
   for (const std::string& path : ItemsBelow(top)) {
@@ -125,16 +125,16 @@ class ARealFileSystem : public testing::Test {
 TEST_F(ARealFileSystem, Ext4KeepsThePromises) {
   MakeImage("ext4", {"mkfs.ext4", "-q", "-F"}, 32 * kMegabyte);
   if (IsSkipped()) return;
-  // Which nobody may read.
+  // Unprivileged processes may not read it.
   std::filesystem::remove(mImage->Path() / "lost+found");
   MakeItems(mImage->Path(), true);
   ExpectPromises(mImage->Path());
   ExpectTheSameIDsAfterMountingAgain();
 }
 
-// The item is known by either of its names, one of which has a short form. It is no newborn, so
-// that both names are seen to be one item's.
-TEST_F(ARealFileSystem, Ext4TellsAnItemByTheNameThatIsMeant) {
+// An item with two names, one of which has a short form, is known by either. It is not new, so both
+// names are recognised as the same item's.
+TEST_F(ARealFileSystem, Ext4AnswersWithTheNameThatIsMeant) {
   MakeImage("ext4", {"mkfs.ext4", "-q", "-F"}, 32 * kMegabyte);
   if (IsSkipped()) return;
   const std::string plain = mImage->Path() / "plain.aif";
@@ -170,7 +170,7 @@ TEST_F(ARealFileSystem, BtrfsKeepsThePromises) {
   ExpectTheSameIDsAfterMountingAgain();
 }
 
-TEST_F(ARealFileSystem, BtrfsKeepsThemInSubvolumes) {
+TEST_F(ARealFileSystem, BtrfsKeepsThePromisesInSubvolumes) {
   MakeImage("btrfs", {"mkfs.btrfs", "-q", "-f"}, 128 * kMegabyte);
   if (IsSkipped()) return;
   const std::string top = mImage->Path();
@@ -179,7 +179,7 @@ TEST_F(ARealFileSystem, BtrfsKeepsThemInSubvolumes) {
     MakeItems(top + name, true);
   }
   ExpectPromises(top);
-  // By its number alone as well.
+  // Also found by id alone.
   for (const std::string& path :
        {top + "/one", top + "/two/folder 3", top + "/two/folder 3/file.aif",
         top + "/one/inner/folder 0/below/file"}) {
@@ -193,8 +193,8 @@ TEST_F(ARealFileSystem, BtrfsKeepsThemInSubvolumes) {
   ExpectTheSameIDsAfterMountingAgain();
 }
 
-// The first subvolume that is made has the number 256, and its folder too.
-TEST_F(ARealFileSystem, BtrfsTellsASubvolumeInTheIDsOfItsItems) {
+// The first subvolume made has the number 256, and so has the first item in each.
+TEST_F(ARealFileSystem, BtrfsIDsIncludeTheSubvolume) {
   MakeImage("btrfs", {"mkfs.btrfs", "-q", "-f"}, 128 * kMegabyte);
   if (IsSkipped()) return;
   const std::string top = mImage->Path();
@@ -208,8 +208,8 @@ TEST_F(ARealFileSystem, BtrfsTellsASubvolumeInTheIDsOfItsItems) {
   EXPECT_EQ(IDOf(top + "/two/folder"), 0x80000000 + (1 << 22) + 257);
 }
 
-// With handles, without, and as no volume.
-TEST_F(ARealFileSystem, BtrfsShowsWhatIsMountedOnItsFolders) {
+// A tmpfs on a plain folder, one inside a subvolume, a bind mount and a kernel interface.
+TEST_F(ARealFileSystem, BtrfsShowsMountsOnItsFolders) {
   MakeImage("btrfs", {"mkfs.btrfs", "-q", "-f"}, 128 * kMegabyte);
   if (IsSkipped()) return;
   const std::string top = mImage->Path();
@@ -266,14 +266,14 @@ TEST_F(ARealFileSystem, SquashfsKeepsThePromises) {
   ExpectTheSameIDsAfterMountingAgain();
 }
 
-TEST_F(ARealFileSystem, VfatKeepsThemWhileItIsMounted) {
+TEST_F(ARealFileSystem, VfatKeepsThePromisesWhileItIsMounted) {
   MakeImage("vfat", {"mkfs.vfat"}, 16 * kMegabyte);
   if (IsSkipped()) return;
   MakeItems(mImage->Path(), false);
   ExpectPromises(mImage->Path());
 }
 
-// What name_to_handle_at(2) itself gives.
+// A handle straight from name_to_handle_at(2).
 struct RawHandle {
   file_handle* Get() { return reinterpret_cast<file_handle*>(bytes); }
   bool Read(const std::string& path, int flags) {
@@ -299,7 +299,7 @@ bool HasHandleToIdentify(const std::string& path) {
   return handle.Read(path, 0) || handle.Read(path, kOnlyToIdentify);
 }
 
-// As statx(2) itself tells it.
+// Returns the birth time straight from statx(2).
 timespec BirthOf(const std::string& path) {
   struct statx about {};
   EXPECT_EQ(statx(AT_FDCWD, path.c_str(), AT_SYMLINK_NOFOLLOW, STATX_BTIME, &about), 0) << path;
@@ -345,7 +345,7 @@ TEST_F(AnOverlay, OnOneFileSystemGivesTheSameIDsAfterMountingAgain) {
   EXPECT_EQ(IDsBelow(Top()), before);
 }
 
-TEST_F(AnOverlay, FindsAFileByItsNumberAlone) {
+TEST_F(AnOverlay, FindsAFileByItsIDAlone) {
   const std::string path = Top() + "/folder 3/below/file";
   const FSCatalogInfo info = InfoOf(path);
   EXPECT_TRUE(HoldsForNobody([&] {
@@ -354,7 +354,7 @@ TEST_F(AnOverlay, FindsAFileByItsNumberAlone) {
   }));
 }
 
-// The first rename of what lies below, and the first write to it, give it another birth.
+// The first rename or write copies a lower item up, which gives it a new birth time.
 TEST_F(AnOverlay, LeavesReferencesValidThroughTheFirstChange) {
   const OtherTime later(std::chrono::hours(1));
   const std::string path = Top() + "/folder 3/below/file";
@@ -378,7 +378,7 @@ TEST_F(AnOverlay, DoesNotTakeANewItemForOneThatWasDeleted) {
   EXPECT_EQ(PathOf(item), "(none)");
 }
 
-// The system calls of a process of its own that resolves one record.
+// Returns the system calls of a new process that resolves one record.
 std::string CallsOfResolving(const FSSpec& spec) {
   const TemporaryFolder folder;
   const std::string record = folder.MakeFile("record");

@@ -1,5 +1,5 @@
-// Items whose numbers mix to one id, on a file system whose numbers identify items and on one
-// whose numbers are not relied on.
+// Items whose inode numbers are mixed to the same id, on a file system whose numbers identify items
+// and on one whose numbers are not trusted.
 #include <Tallowmere/Process.h>
 
 #include <chrono>
@@ -30,7 +30,7 @@ class ASharedID : public testing::TestWithParam<NumberedFileSystem::On> {
     FindTwoNumbers();
   }
 
-  // Among so many numbers two surely meet.
+  // Among a million numbers, two certainly share an id.
   void FindTwoNumbers() {
     std::unordered_map<std::uint32_t, std::uint64_t> seen;
     for (std::uint64_t number = 0x80000000; seen.size() < 1000000; ++number) {
@@ -60,7 +60,7 @@ TEST_P(ASharedID, FindsTheOnlyItemThatHasIt) {
   EXPECT_EQ(FindItem(), path);
 }
 
-TEST_P(ASharedID, OfTwoFoldersFindsNeither) {
+TEST_P(ASharedID, SharedByTwoFoldersFindsNeither) {
   const std::string first = mNumbered->MakeFolder("first", mFirst);
   const std::string second = mNumbered->MakeFolder("second", mSecond);
   ASSERT_EQ(IDOf(first), IDOf(second));
@@ -69,7 +69,7 @@ TEST_P(ASharedID, OfTwoFoldersFindsNeither) {
   EXPECT_EQ(ItemOf(MakeRecord(mVolume, mID, "x")), "(-120)");
 }
 
-TEST_P(ASharedID, OfAFolderAndAFileFindsTheFolderWhenOneIsWanted) {
+TEST_P(ASharedID, SharedWithAFileFindsTheFolderWhenOneIsWanted) {
   const std::string folder = mNumbered->MakeFolder("folder", mFirst);
   ASSERT_EQ(IDOf(mNumbered->MakeFile("file", mSecond)), mID);
   EXPECT_EQ(FindFolder(), folder);
@@ -88,7 +88,7 @@ TEST_P(ASharedID, IsNotedWhenTheSecondItemComesLater) {
   EXPECT_EQ(FindFolder(), second);
 }
 
-TEST_P(ASharedID, OfTwoItemsWithOneShortFormGivesNeitherARecord) {
+TEST_P(ASharedID, SharedByTwoItemsWithOneShortFormGivesNeitherARecord) {
   const std::string name(70, 'n');
   const std::string first = mNumbered->MakeFolder(name + "1", mFirst);
   const std::string second = mNumbered->MakeFolder(name + "2", mSecond);
@@ -100,7 +100,7 @@ TEST_P(ASharedID, OfTwoItemsWithOneShortFormGivesNeitherARecord) {
   }
 }
 
-TEST_P(ASharedID, DoesNotMakeAnItemOfAnotherNumberTheOneOfAReference) {
+TEST_P(ASharedID, DoesNotLeadAReferenceToAnItemOfAnotherNumber) {
   const std::string first = mNumbered->MakeFolder("first", mFirst);
   mNumbered->MakeFolder("second", mSecond);
   const FSRef reference = ReferenceTo(first);
@@ -117,7 +117,7 @@ INSTANTIATE_TEST_SUITE_P(OnEachKind, ASharedID,
                            return isOnDisk ? "WithTrustedNumbers" : "WithOthers";
                          });
 
-// The platform takes a folder that is asked for as one for itself, not for an item of another.
+// The platform looks up each requested folder instead of taking a known item with its number.
 TEST(FoldersWithTheSameNumbers, EachHaveARecord) {
   if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const NumberedFileSystem numbered;

@@ -1,5 +1,4 @@
-// Volumes on which two items can have one device and inode number: what tells them apart is their
-// places.
+// Volumes on which two items can share device and inode number and differ only in their places.
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -30,7 +29,7 @@ std::string PathOfDescriptor(int descriptor) {
   return std::filesystem::read_symlink(link);
 }
 
-// A server that gives two items one number.
+// Served so that two items have the same number.
 class AnUntrustedVolume : public AnIndex {
  protected:
   void SetUp() override {
@@ -65,7 +64,7 @@ TEST_F(AnUntrustedVolume, AnswersNothingWhenTwoPlacesHaveTheNumber) {
   EXPECT_EQ(Find(kShared, "a"), "(none)");
 }
 
-TEST_F(AnUntrustedVolume, NoticesWhenTheSecondComesAndWhenTheFirstGoes) {
+TEST_F(AnUntrustedVolume, NoticesWhenTheSecondAppearsAndTheFirstVanishes) {
   const std::string first = MakeShared("a/f");
   LetChangesAge();
   EXPECT_EQ(FindShared(), first);
@@ -89,14 +88,14 @@ TEST_F(AnUntrustedVolume, AnswersNothingWhereEveryItemHasOneNumber) {
   EXPECT_EQ(Find(ID("a")), PathTo("a"));
 }
 
-TEST_F(AnUntrustedVolume, OfAFolderAndAFileAnswersTheFolderWhenOneIsWanted) {
+TEST_F(AnUntrustedVolume, WithAFolderAndAFileAnswersTheFolderWhenOneIsWanted) {
   const std::string folder = MakeShared("a/f");
   mNumbered->MakeFile("b/x", kShared);
   EXPECT_EQ(FindShared(), folder);
   EXPECT_EQ(FindAny(kShared), "(none)");
 }
 
-TEST_F(AnUntrustedVolume, LooksForTheNumbersOfAReference) {
+TEST_F(AnUntrustedVolume, SearchesForTheNumbersOfAReference) {
   const std::string first = MakeShared("a/f");
   const kernel::Item reference = ItemOf(first);
   const SearchedItem wanted{kShared, &reference, true};
@@ -105,8 +104,8 @@ TEST_F(AnUntrustedVolume, LooksForTheNumbersOfAReference) {
   EXPECT_EQ(Search(wanted, mTop), std::nullopt);
 }
 
-// As when the item goes while its canonical path is looked up.
-TEST_F(AnUntrustedVolume, HasNoOtherItemForAReferenceByAPathWithLinksThatCouldNotBeHeld) {
+// Simulates an item that vanishes while its canonical path is looked up.
+TEST_F(AnUntrustedVolume, HasNoOtherItemForAReferenceByALinkedPathThatCouldNotBeHeld) {
   const std::string first = MakeShared("a/f");
   MakeShared("b/f");
   const std::string link = mFolder.Path() / "link";
@@ -142,7 +141,7 @@ TEST_F(AnUntrustedVolume, AnswersNothingWhileSomethingIsMountedInIt) {
   EXPECT_EQ(FindShared(), first);
 }
 
-TEST_F(AnUntrustedVolume, AnswersOnceWhatTwoMountsShow) {
+TEST_F(AnUntrustedVolume, CountsOnceWhatTwoMountsShow) {
   const std::string path = MakeShared("a/f");
   const ScopedMount again(PathTo("a"), mFolder.MakeFolder("again"), "", MS_BIND);
   ASSERT_TRUE(again.IsMounted());
@@ -153,7 +152,7 @@ TEST_F(AnUntrustedVolume, AnswersOnceWhatTwoMountsShow) {
   EXPECT_EQ(FindShared(), "(none)");
 }
 
-TEST_F(AnUntrustedVolume, KeepsNothingFromOneQuestionToTheNext) {
+TEST_F(AnUntrustedVolume, KeepsNothingFromOneSearchToTheNext) {
   Make("a/d/e");
   LetChangesAge();
   const std::uint64_t opened = OpenedFor(kOfNoItem);
@@ -167,8 +166,8 @@ TEST_F(AnUntrustedVolume, IsReadOnceWhereverTheSearchStarts) {
   EXPECT_EQ(OpenedForAny(kOfNoItem, "a/d"), opened);
 }
 
-// The second of two moves from where the walk has not looked to where it has.
-TEST_F(AnUntrustedVolume, MissesNothingThatMovesWhileItLooks) {
+// In one of the two rounds, the item moves from a folder not yet read to one already read.
+TEST_F(AnUntrustedVolume, MissesNothingThatMovesDuringASearch) {
   MakeShared("c/f");
   MakeShared("a/f");
   MakeShared("b/f");
@@ -185,7 +184,7 @@ TEST_F(AnUntrustedVolume, MissesNothingThatMovesWhileItLooks) {
   }
 }
 
-TEST_F(AnUntrustedVolume, AnswersWhenItHasChangedOnceWhileItLooked) {
+TEST_F(AnUntrustedVolume, AnswersWhenItChangedOnceDuringTheSearch) {
   const std::string path = MakeShared("c/f");
   bool hasChanged = false;
   const BeforeEntries entries([&](int folder) {
@@ -197,7 +196,7 @@ TEST_F(AnUntrustedVolume, AnswersWhenItHasChangedOnceWhileItLooked) {
   EXPECT_TRUE(hasChanged);
 }
 
-TEST_F(AnUntrustedVolume, AnswersNothingWhileItNeverStaysAsItIs) {
+TEST_F(AnUntrustedVolume, AnswersNothingWhileItKeepsChanging) {
   MakeShared("c/f");
   int changes = 0;
   const BeforeEntries entries([&](int folder) {
@@ -253,7 +252,7 @@ TEST_F(AnUntrustedVolumeWithCoarseTimes, NoticesAnItemThatAWalkMissedAsItMoved) 
   EXPECT_TRUE(isInOneTick);
 }
 
-// Two file systems that bindfs shows as one.
+// Two file systems that bindfs presents as one.
 class TwoFileSystemsAsOne : public AnIndex {
  protected:
   void SetUp() override {
@@ -292,7 +291,7 @@ TEST_F(TwoFileSystemsAsOne, HaveAnItemWithANumberThatOneHas) {
   EXPECT_EQ(Find(ID("e2/d/f")), PathTo("e2/d/f"));
 }
 
-TEST_F(TwoFileSystemsAsOne, HaveNoItemWithTheNumbersOfAReferenceThatBothHave) {
+TEST_F(TwoFileSystemsAsOne, HaveNoItemForAReferenceWhoseNumbersBothHave) {
   const kernel::Item reference = ItemAt("e1/d/f");
   EXPECT_EQ(Search({mID, &reference, true}, PathTo("e1/d")), std::nullopt);
 }
@@ -335,8 +334,7 @@ TEST_F(ABtrfsVolume, FindsWhatMovedWithItsSubvolume) {
   for (const char* name : {"s3", "s1", "s1/d", "s3/d", "s1/d/f", "s3/d/f"}) ExpectFound(name);
 }
 
-// An overlay whose layers are in two subvolumes, so that its numbers are not to be trusted, but its
-// change times are.
+// An overlay with layers in two subvolumes: its change times can be trusted, its numbers cannot.
 class AnOverlayOfSubvolumes : public ABtrfsVolume {
  protected:
   void SetUp() override {
@@ -359,7 +357,7 @@ class AnOverlayOfSubvolumes : public ABtrfsVolume {
   std::optional<ScopedMount> mOverlay;
 };
 
-TEST_F(AnOverlayOfSubvolumes, HasNoItemWithANumberThatTwoHave) {
+TEST_F(AnOverlayOfSubvolumes, HasNoItemForANumberOfTwoItems) {
   ASSERT_TRUE(kernel::HaveSameNumbers(ItemAt("e1/f"), ItemAt("e2/f")));
   for (int round = 0; round < 2; ++round) {
     EXPECT_EQ(Find(ID("e1/f")), "(none)");
@@ -378,7 +376,7 @@ TEST_F(AnOverlayOfSubvolumes, ReadsOnlyFoldersThatHaveChanged) {
   EXPECT_EQ(Find(id), PathTo("new/7/y"));
 }
 
-TEST_F(AnOverlayOfSubvolumes, FollowsWhatMovesAndWhatTakesItsPlace) {
+TEST_F(AnOverlayOfSubvolumes, FollowsMovedItemsAndTheirSuccessors) {
   for (const char* name : {"x/a/b", "y/a/b"}) Make(name);
   KnowEverything();
   const std::uint32_t first = ID("x/a/b");

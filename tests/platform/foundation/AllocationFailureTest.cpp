@@ -1,5 +1,5 @@
-// Every call, with the n-th allocation failing for n = 0, 1, 2, … until the call succeeds: each
-// failure is a null, and nothing that was allocated on the way stays.
+// Runs every call with the n-th allocation failing, for n = 0, 1, 2, … until it succeeds. A failed
+// call returns null and leaks nothing.
 #include <gtest/gtest.h>
 
 #include <functional>
@@ -10,11 +10,11 @@
 namespace tallowmere::foundation::test {
 namespace {
 
-// Longer than any string keeps without an allocation.
+// Too long for a string to hold without an allocation.
 constexpr char kLongName[] = "/a name/that is/rather long/\xC3\xA9\xFF/a b c d e f g h.extension";
 
-// Runs `create` as the comment above says; its result, once there is one, is released.
-// Returns how many of its allocations were made to fail.
+// Runs `create` as described at the top and releases its result. Returns how many allocations were
+// made to fail.
 long FailEachAllocation(const std::function<CFTypeRef()>& create) {
   const long liveBefore = LiveAllocations();
   for (long n = 0;; ++n) {
@@ -120,7 +120,7 @@ TEST_F(AllocationFailure, GivesNoPathAndNoComponent) {
   }
 }
 
-TEST_F(AllocationFailure, DoesNotReachThePathOfAUrlNorACopyOfWhatCannotChange) {
+TEST_F(AllocationFailure, DoesNotAffectThePathOfAUrlOrTheCopyOfAnImmutableString) {
   Boolean isAbsolute = false;
   FailAllocationsAfter(0);
   const CFOwned path(CFURLCopyStrictPath(mUrl.Get(), &isAbsolute));
@@ -154,7 +154,7 @@ TEST_F(AllocationFailure, GivesNoFileSystemRepresentation) {
   EXPECT_STREQ(buffer, "old");
 }
 
-TEST_F(AllocationFailure, DoesNotReachWhatNeedsNoMemory) {
+TEST_F(AllocationFailure, DoesNotAffectCallsThatNeedNoMemory) {
   FailAllocationsAfter(0);
   const bool folder = CFURLHasDirectoryPath(mUrl.Get()) != 0;
   const bool equal = CFEqual(mUrl.Get(), mUrl.Get()) != 0;

@@ -1,3 +1,4 @@
+// CFOwned, the owner of one reference to an object.
 #include <gtest/gtest.h>
 
 #include <utility>
@@ -8,7 +9,7 @@
 namespace tallowmere::foundation::test {
 namespace {
 
-TEST(CFOwned, GivesItsReferenceBackAtItsEnd) {
+TEST(CFOwned, ReleasesItsReferenceAtItsEnd) {
   const auto string = MakeString(u"a");
   {
     CFRetain(string.Get());
@@ -26,7 +27,7 @@ TEST(CFOwned, HoldsNullUntilGivenAnObject) {
   EXPECT_TRUE(string);
 }
 
-TEST(CFOwned, AssignmentEndsTheOldObjectOnce) {
+TEST(CFOwned, AssignmentReleasesTheOldObjectOnce) {
   const auto first = MakeString(u"a");
   const auto second = MakeString(u"b");
   CFRetain(first.Get());
@@ -41,7 +42,7 @@ TEST(CFOwned, AssignmentEndsTheOldObjectOnce) {
   EXPECT_EQ(CFGetRetainCount(second.Get()), 1);
 }
 
-TEST(CFOwned, DetachHandsTheReferenceOver) {
+TEST(CFOwned, DetachHandsOverTheReference) {
   auto owned = MakeString(u"a");
   const CFStringRef string = owned.Detach();
   EXPECT_FALSE(owned);

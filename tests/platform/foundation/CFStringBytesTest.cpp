@@ -1,3 +1,4 @@
+// Strings to bytes and back: encodings, loss, full buffers, Pascal strings and file names.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
@@ -26,7 +27,7 @@ void PrintTo(const Bytes& bytes, std::ostream* out) {
   *out << bytes.units << " units: " << testing::PrintToString(bytes.bytes);
 }
 
-// What CFStringGetBytes makes of a text in a buffer of some size.
+// Runs CFStringGetBytes on a text with a buffer of some size.
 Bytes GetBytes(std::u16string_view text, CFStringEncoding encoding, UInt8 lossByte = 0,
                std::size_t capacity = 64) {
   const auto string = MakeString(text);
@@ -90,7 +91,7 @@ TEST(CFStringBytes, MacRomanIsTheEuroSignRevision) {
   EXPECT_EQ(GetBytes(u"\u20AC\uF8FF", kCFStringEncodingMacRoman), (Bytes{2, "\xDB\xF0"}));
 }
 
-TEST(CFStringBytes, MacRomanTakesALetterAndItsMarkTogether) {
+TEST(CFStringBytes, MacRomanConvertsALetterAndItsMarkTogether) {
   EXPECT_EQ(GetBytes(u"e\u0301x", kCFStringEncodingMacRoman), (Bytes{3, "\x8Ex"}));
 }
 
@@ -162,7 +163,7 @@ TEST(CFStringBytes, WithoutBufferOnlyCounts) {
   EXPECT_EQ(used, 5);
 }
 
-TEST(CFStringBytes, ConvertsTheRangeAlone) {
+TEST(CFStringBytes, ConvertsOnlyTheRange) {
   UInt8 buffer[8];
   CFIndex used = -1;
   const auto string = MakeString(u"~name/x");
@@ -180,7 +181,7 @@ TEST(CFStringBytes, ConvertsTheRangeAlone) {
 
 struct PascalResult {
   bool done;
-  std::string buffer;  // all of it
+  std::string buffer;  // including bytes that were not written
 };
 
 PascalResult GetPascal(std::u16string_view text, std::size_t capacity,
@@ -242,7 +243,7 @@ TEST(CFStringPascal, MustBeValidInItsEncoding) {
             nullptr);
 }
 
-RC_GTEST_PROP(CFStringPascal, EveryMacRomanNameComesBack, ()) {
+RC_GTEST_PROP(CFStringPascal, EveryMacRomanNameSurvivesARoundTrip, ()) {
   const auto size = *rc::gen::inRange<std::size_t>(0, 256);
   std::string pascal(size + 1, static_cast<char>(size));
   for (std::size_t i = 1; i <= size; ++i) pascal[i] = *rc::gen::arbitrary<char>();
@@ -280,7 +281,7 @@ TEST(CFStringFileName, BufferOfSizeZeroIsTooSmall) {
   EXPECT_FALSE(CFStringGetFileSystemRepresentation(CFSTR(""), nullptr, -1));
 }
 
-TEST(CFStringFileName, StringsThatNoNameHasHaveNone) {
+TEST(CFStringFileName, StringsThatAreNoNamesHaveNone) {
   EXPECT_EQ(NameOf(MakeString(u"a\xD800").Get()), std::nullopt);
   EXPECT_EQ(NameOf(MakeString(u"a\xDC7F").Get()), std::nullopt);
   EXPECT_EQ(NameOf(MakeString(u"a\0b"s).Get()), std::nullopt);
@@ -292,7 +293,7 @@ TEST(CFStringFileName, MaximumSizeIsEnoughWithTheNul) {
   EXPECT_EQ(NameOf(string.Get()), "\xE6\x97\xA5\xE6\x97\xA5");
 }
 
-RC_GTEST_PROP(CFStringFileName, EveryNameComesBack, ()) {
+RC_GTEST_PROP(CFStringFileName, EveryNameSurvivesARoundTrip, ()) {
   const auto bytes = *AnyName();
   RC_ASSERT(NameOf(MakeName(bytes).Get()) == bytes);
 }

@@ -1,3 +1,4 @@
+// Strings: creation, formatting, changes and searching.
 #include <gtest/gtest.h>
 
 #include <string>
@@ -40,7 +41,7 @@ TEST(CFString, ConstantIsMadeOnce) {
   EXPECT_EQ(TextOf(constants[0]), u"a\u00E9");
 }
 
-TEST(CFString, CopyKeepsTheTextOfItsMoment) {
+TEST(CFString, CopyKeepsTheTextFromWhenItWasMade) {
   const auto original = MakeMutable(u"a");
   const CFOwned copy(CFStringCreateCopy(kCFAllocatorDefault, original.Get()));
   CFStringAppend(original.Get(), CFSTR("b"));
@@ -136,14 +137,14 @@ TEST(CFString, ReplacesNothingWhereThereIsNothing) {
   EXPECT_EQ(TextOf(string.Get()), u"a:b");
 }
 
-TEST(CFString, DoesNotReplaceInWhatItHasPutThere) {
+TEST(CFString, DoesNotReplaceWithinItsReplacements) {
   const auto string = MakeMutable(u"aaa");
   EXPECT_EQ(CFStringFindAndReplace(string.Get(), CFSTR("aa"), CFSTR("ba"), Whole(string.Get()), 0),
             1);
   EXPECT_EQ(TextOf(string.Get()), u"baa");
 }
 
-TEST(CFString, ReplacesWithinTheRangeAlone) {
+TEST(CFString, ReplacesOnlyWithinTheRange) {
   const auto string = MakeMutable(u"//////");
   EXPECT_EQ(CFStringFindAndReplace(string.Get(), CFSTR("//"), CFSTR("--->"), CFRangeMake(1, 3), 0),
             1);
@@ -190,7 +191,7 @@ TEST(CFString, FindsNothingBeyondTheRange) {
   EXPECT_EQ(found.location, -5);
 }
 
-TEST(CFString, GetCharactersCopiesTheRangeAlone) {
+TEST(CFString, GetCharactersCopiesOnlyTheRange) {
   const auto string = MakeString(u"abcd");
   UniChar buffer[4] = {'.', '.', '.', '.'};
   CFStringGetCharacters(string.Get(), CFRangeMake(1, 2), buffer);

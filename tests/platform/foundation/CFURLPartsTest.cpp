@@ -1,4 +1,4 @@
-// Components, extension, folder mark and editing of URLs, and URLs made of their text.
+// Components, extension, folder mark and editing of URLs, and URLs parsed from text.
 #include <gtest/gtest.h>
 
 #include <string>
@@ -129,7 +129,7 @@ TEST(CFURLParent, OfTheRootIsTheRoot) {
   EXPECT_EQ(Parent("file:///"), "file:///");
 }
 
-TEST(CFURLParent, OfABareNameIsTheFolderItself) {
+TEST(CFURLParent, OfABareNameIsTheCurrentFolder) {
   EXPECT_EQ(Parent("a"), "./");
   EXPECT_EQ(Parent("a/"), "./");
 }
@@ -190,7 +190,7 @@ TEST(CFURLAppend, KeepsAllButThePath) {
   EXPECT_EQ(Appended("http://u@host:80/a?q/r#f/g", u"b", true), "http://u@host:80/a/b/?q/r#f/g");
 }
 
-TEST(CFURLAppend, BeginsThePathOfAUrlWithout) {
+TEST(CFURLAppend, StartsAPathWhereThereIsNone) {
   EXPECT_EQ(Appended("http://host", u"b", false), "http://host/b");
   EXPECT_EQ(Appended("?q", u"b:c", false), "b%3Ac?q");
   EXPECT_EQ(Appended("?q", u"", false), std::nullopt);
@@ -218,7 +218,7 @@ TEST(CFURLAppend, LeavesTheOriginalAlone) {
 
 // --- URLs of their text -----------------------------------------------------------------------
 
-TEST(CFURLBytes, BecomeTheTextAsItStands) {
+TEST(CFURLBytes, BecomeTheTextUnchanged) {
   EXPECT_EQ(TextOfUrl(ParseUrl("HTTP://a/%7eb/../c")), "HTTP://a/%7eb/../c");
 }
 

@@ -1,4 +1,4 @@
-// URLs made of paths, and paths of URLs.
+// URLs made from paths, and paths made from URLs.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 #include <unistd.h>
@@ -21,7 +21,7 @@ std::string TextOfUrl(const CFOwned<CFURLRef>& url) {
   return UrlOf(url.Get()).Text();
 }
 
-// A temporary folder that is the current one as long as this lives.
+// Makes a temporary folder and changes into it while the object exists.
 class CurrentFolder {
  public:
   CurrentFolder() : mBefore(std::filesystem::current_path()) {
@@ -44,7 +44,7 @@ class CurrentFolder {
 
 // --- POSIX paths ------------------------------------------------------------------------------
 
-TEST(CFURLPath, FolderEndsInOneSlashMoreIfItHasNone) {
+TEST(CFURLPath, FolderGetsATrailingSlashIfItHasNone) {
   EXPECT_EQ(TextOfUrl(MakeUrl("/a", true)), "file:///a/");
   EXPECT_EQ(TextOfUrl(MakeUrl("/a/", true)), "file:///a/");
   EXPECT_EQ(TextOfUrl(MakeUrl("/a//", true)), "file:///a//");
@@ -75,7 +75,7 @@ TEST(CFURLPath, UnknownStyleHasNoUrlAndNoPath) {
   EXPECT_EQ(PathIn(MakeUrl("/a", false), 3), std::nullopt);
 }
 
-TEST(CFURLPath, UnpairedSurrogateThatStandsForNoByteHasNoUrl) {
+TEST(CFURLPath, OtherUnpairedSurrogateHasNoUrl) {
   const auto path = MakeString(u"/a\xD800z");
   EXPECT_EQ(CFURLCreateWithFileSystemPath(kCFAllocatorDefault, path.Get(), kCFURLPOSIXPathStyle, 0),
             nullptr);
@@ -112,14 +112,14 @@ TEST(CFURLPath, IsPercentDecoded) {
   EXPECT_EQ(PathOf(ParseUrl("file:///a%20%c3%A9%ff")), "/a \xC3\xA9\xFF");
 }
 
-TEST(CFURLPath, EscapedBytesThatAreUtf8TogetherAreReadAsThat) {
+TEST(CFURLPath, EscapedBytesThatFormUtf8AreReadTogether) {
   const CFOwned url(CFURLCreateWithFileSystemPath(
       kCFAllocatorDefault, MakeString(u"/\xDCC3\xDCA9").Get(), kCFURLPOSIXPathStyle, 0));
   const CFOwned path(CFURLCopyFileSystemPath(url.Get(), kCFURLPOSIXPathStyle));
   EXPECT_EQ(TextOf(path.Get()), u"/\u00E9");
 }
 
-TEST(CFURLPath, IsThatOfTheMomentWhenItsStringCanChange) {
+TEST(CFURLPath, DoesNotFollowLaterChangesOfItsString) {
   const CFOwned string(CFStringCreateMutableCopy(kCFAllocatorDefault, 0, MakeName("/a").Get()));
   const CFOwned url(
       CFURLCreateWithFileSystemPath(kCFAllocatorDefault, string.Get(), kCFURLPOSIXPathStyle, 0));
@@ -145,13 +145,13 @@ TEST(CFURLPath, EverySchemeHasItsPath) {
   EXPECT_EQ(PathOf(ParseUrl("http://host:80/a/b/?q#f")), "/a/b");
 }
 
-TEST(CFURLPath, LongerThanALinuxPathComesBack) {
+TEST(CFURLPath, LongerThanALinuxPathSurvivesARoundTrip) {
   std::string path;
   for (int i = 0; i < 3000; ++i) path += "/\xC3\xA9";
   EXPECT_EQ(PathOf(MakeUrl(path, false)), path);
 }
 
-RC_GTEST_PROP(CFURLPath, EveryAbsolutePathComesBackWithTheMarkAsAsked, (bool folder)) {
+RC_GTEST_PROP(CFURLPath, EveryAbsolutePathSurvivesARoundTripWithTheRequestedMark, (bool folder)) {
   const std::string path = "/" + *AnyPath();
   const auto url = MakeUrl(path, folder);
   const auto name = path.substr(0, std::max(path.find_last_not_of('/') + 1, std::size_t{1}));
@@ -161,7 +161,7 @@ RC_GTEST_PROP(CFURLPath, EveryAbsolutePathComesBackWithTheMarkAsAsked, (bool fol
   RC_ASSERT(TextOfUrl(ParseUrl(text)) == text);
 }
 
-RC_GTEST_PROP(CFURLPath, EveryRelativePathComesBack, (bool folder)) {
+RC_GTEST_PROP(CFURLPath, EveryRelativePathSurvivesARoundTrip, (bool folder)) {
   const std::string path = *rc::gen::distinctFrom(AnyName(), std::string()) + *AnyPath();
   const auto url = MakeUrl(path, folder);
   RC_ASSERT(PathOf(url) == path.substr(0, path.find_last_not_of('/') + 1));
@@ -232,7 +232,7 @@ TEST(CFURLBase, EditingKeepsIt) {
 TEST(CFURLBase, MayBeLongAndOddlyNamed) {
   const CurrentFolder here;
   const std::string name = std::string(250, 'x') + "%\xFF";
-  for (int i = 0; i < 20; ++i) {  // beyond 4096 bytes, one step at a time
+  for (int i = 0; i < 20; ++i) {  // one step at a time to a path of more than 4096 bytes
     ASSERT_TRUE(std::filesystem::create_directory(name));
     ASSERT_EQ(chdir(name.c_str()), 0);
   }
@@ -271,7 +271,7 @@ TEST(CFURLAbsolutePath, HasNoFolderMark) {
 
 // --- Other styles -----------------------------------------------------------------------------
 
-TEST(CFURLHfsPath, BecomesTheVolumesPathAndBack) {
+TEST(CFURLHfsPath, BecomesAPathOnItsVolumeAndBack) {
   const auto file = MakeUrl("Data:Dir:a/b", false, kCFURLHFSPathStyle);
   EXPECT_EQ(TextOfUrl(file), "file:///mnt/data/Dir/a:b");
   EXPECT_EQ(PathIn(file, kCFURLHFSPathStyle), "Data:Dir:a/b");

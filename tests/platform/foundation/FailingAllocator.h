@@ -1,22 +1,22 @@
-// The process's operator new, made to fail on purpose. One thread.
+// Makes the process's operator new fail on purpose. For one thread only.
 #pragma once
 
 #include <cstddef>
 
 namespace tallowmere::foundation::test {
 
-// `count` more allocations succeed, then every one throws std::bad_alloc.
+// Lets `count` more allocations succeed; all later ones throw std::bad_alloc.
 void FailAllocationsAfter(long count);
 
-// The same, but only the first one throws.
+// Lets `count` more allocations succeed; the next one throws, and later ones succeed again.
 void FailOneAllocationAfter(long count);
 
 void FailNoAllocation();
 
-// How many allocations have not been given back.
+// Returns the number of allocations that have not been freed.
 long LiveAllocations();
 
-// How many allocations were made by new[], and the bytes of the last one.
+// The number of allocations by new[], and the size of the last one in bytes.
 long ArrayAllocations();
 std::size_t SizeOfLastArray();
 

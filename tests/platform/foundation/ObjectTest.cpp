@@ -1,3 +1,4 @@
+// Reference counting and equality of objects.
 #include <gtest/gtest.h>
 
 #include <array>
@@ -14,7 +15,7 @@ TEST(Object, BeginsWithOneReference) {
   EXPECT_EQ(CFGetRetainCount(MakeUrl("/a", false).Get()), 1);
 }
 
-TEST(Object, RetainReturnsTheObjectWithOneReferenceMore) {
+TEST(Object, RetainAddsAReferenceAndReturnsTheObject) {
   const auto url = MakeUrl("/a", false);
   EXPECT_EQ(CFRetain(url.Get()), url.Get());
   EXPECT_EQ(CFGetRetainCount(url.Get()), 2);

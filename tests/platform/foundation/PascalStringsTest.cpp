@@ -1,3 +1,4 @@
+// Copies between Pascal strings and C strings.
 #include <CoreServices/CoreServices.h>
 #include <gtest/gtest.h>
 

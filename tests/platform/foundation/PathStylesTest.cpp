@@ -1,3 +1,4 @@
+// Conversion between Linux paths and HFS and Windows paths.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
@@ -20,7 +21,7 @@ TEST(HfsPath, BeginsWithTheNameOfAVolume) {
   EXPECT_EQ(LinuxPathOfHfsPath("Root:"), "/");
 }
 
-TEST(HfsPath, NameOfTheVolumeIsInTheHfsView) {
+TEST(HfsPath, NameOfTheVolumeIsInHfsForm) {
   EXPECT_EQ(LinuxPathOfHfsPath("Data/2:a"), "/mnt/Data:2/a");
 }
 
@@ -44,7 +45,7 @@ TEST(HfsPath, LeadingColonMakesItRelative) {
   EXPECT_EQ(LinuxPathOfHfsPath(":"), ".");
 }
 
-TEST(HfsPath, EachColonMoreClimbs) {
+TEST(HfsPath, EachFurtherColonClimbs) {
   EXPECT_EQ(LinuxPathOfHfsPath("Data:a::b"), "/mnt/data/a/../b");
   EXPECT_EQ(LinuxPathOfHfsPath("Data:a:b:::c"), "/mnt/data/a/b/../../c");
   EXPECT_EQ(LinuxPathOfHfsPath("::a"), "../a");
@@ -88,12 +89,12 @@ TEST(HfsPath, OfARelativePathBeginsWithAColon) {
   EXPECT_EQ(HfsPathOfLinuxPath("./a", false), ":a");
 }
 
-TEST(HfsPath, ClimbsWithAColonMore) {
+TEST(HfsPath, ClimbsWithAFurtherColon) {
   EXPECT_EQ(HfsPathOfLinuxPath("/mnt/data/a/../b", false), "Data:a::b");
   EXPECT_EQ(HfsPathOfLinuxPath("/mnt/data/../b", false), std::nullopt);
 }
 
-TEST(HfsPath, PassesOverDoubledSlashesAndDots) {
+TEST(HfsPath, IgnoresDoubledSlashesAndDots) {
   EXPECT_EQ(HfsPathOfLinuxPath("//mnt/./data//a/.", true), "Data:a:");
 }
 
@@ -106,7 +107,7 @@ TEST(HfsPath, WithoutVolumesIsNone) {
   EXPECT_EQ(relative, ":a");
 }
 
-// The path without doubled slashes, dots and a slash at its end.
+// Returns the path without doubled slashes, dots and a trailing slash.
 std::string Normal(const std::string& path) {
   std::string normal = std::filesystem::path(path).lexically_normal().native();
   while (normal.size() > 1 && normal.ends_with('/')) normal.pop_back();
@@ -148,7 +149,7 @@ TEST(WindowsPath, DriveIsOneLetterAndItsColon) {
   EXPECT_EQ(WindowsPathOfLinuxPath("/C:a"), "\\C:a");
 }
 
-TEST(WindowsPath, ThatWouldReadAsAnotherIsNone) {
+TEST(WindowsPath, ThatWouldReadAsAnotherPathIsNone) {
   EXPECT_EQ(WindowsPathOfLinuxPath("/a\\b"), std::nullopt);
   EXPECT_EQ(WindowsPathOfLinuxPath("C:/a"), std::nullopt);
 }

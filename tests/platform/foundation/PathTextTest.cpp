@@ -1,3 +1,4 @@
+// Operations on the text of paths.
 #include <gtest/gtest.h>
 
 #include "foundation/PathText.h"
@@ -15,7 +16,7 @@ TEST(PathText, FolderMarkIsRemovedWholly) {
   EXPECT_EQ(WithFolderMark("///", false), "/");
 }
 
-TEST(PathText, LastComponentStandsBehindTheLastSlash) {
+TEST(PathText, LastComponentFollowsTheLastSlash) {
   EXPECT_EQ(LastComponent("/a/b"), "b");
   EXPECT_EQ(LastComponent("/a/b//"), "b");
   EXPECT_EQ(LastComponent("b"), "b");
@@ -28,7 +29,7 @@ TEST(PathText, ParentKeepsDoubledSlashes) {
   EXPECT_EQ(ParentPath("//"), "/");
 }
 
-TEST(PathText, TheFolderOfAnItemIsWhatStandsBeforeItsName) {
+TEST(PathText, TheFolderOfAnItemPrecedesItsName) {
   EXPECT_EQ(FolderOf("/a/b"), "/a");
   EXPECT_EQ(FolderOf("/a"), "/");
   EXPECT_EQ(FolderOf("/a/%2E"), "/a");
@@ -42,7 +43,7 @@ TEST(PathText, JoinNeedsNoSlashAtTheStart) {
   EXPECT_EQ(JoinPath("a", ""), "a/");
 }
 
-TEST(PathText, ExtensionNeedsADotBehindTheFirstCharacter) {
+TEST(PathText, ExtensionNeedsADotAfterTheFirstCharacter) {
   EXPECT_EQ(Extension("a.b"), "b");
   EXPECT_EQ(Extension("..b"), "b");
   EXPECT_EQ(Extension(".b"), std::nullopt);

@@ -1,4 +1,4 @@
-// Random names and paths as Linux may hold them.
+// Generators of random names and paths that Linux permits.
 #pragma once
 
 #include <rapidcheck.h>
@@ -14,8 +14,7 @@ inline std::string Concatenated(const std::vector<std::string>& pieces) {
   return all;
 }
 
-// A byte, a character of valid UTF-8, or something that means something to URLs or path styles. No
-// NUL and no "/".
+// A byte but NUL and "/", a character of valid UTF-8, or text with a meaning in URLs or paths.
 inline rc::Gen<std::string> AnyNamePiece() {
   return rc::gen::oneOf(
       rc::gen::map(rc::gen::suchThat(rc::gen::inRange(1, 256), [](int c) { return c != '/'; }),
@@ -25,12 +24,12 @@ inline rc::Gen<std::string> AnyNamePiece() {
                                     "C:", "~", " "));
 }
 
-// A possibly empty name.
+// A name, possibly empty.
 inline rc::Gen<std::string> AnyName() {
   return rc::gen::map(rc::gen::container<std::vector<std::string>>(AnyNamePiece()), Concatenated);
 }
 
-// Names with "/" between, before and behind them, doubled ones too. May be empty.
+// Names with "/" between, before and after them, also doubled. Possibly empty.
 inline rc::Gen<std::string> AnyPath() {
   return rc::gen::map(rc::gen::container<std::vector<std::string>>(
                           rc::gen::oneOf(AnyNamePiece(), rc::gen::just(std::string("/")))),

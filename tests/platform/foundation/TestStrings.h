@@ -1,4 +1,4 @@
-// Strings and URLs for tests, through the public calls alone.
+// Strings and URLs for tests, made through the public calls only.
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
@@ -17,7 +17,7 @@ inline CFOwned<CFStringRef> MakeString(std::u16string_view text) {
                                               static_cast<CFIndex>(units.size())));
 }
 
-// The string of a file name or path. REQUIRES: no NUL inside.
+// Returns the string of a file name or path. REQUIRES: no NUL inside.
 inline CFOwned<CFStringRef> MakeName(const std::string& bytes) {
   return CFOwned(CFStringCreateWithFileSystemRepresentation(kCFAllocatorDefault, bytes.c_str()));
 }
@@ -32,7 +32,7 @@ inline std::u16string TextOf(CFStringRef string) {
   return {units.begin(), units.end()};
 }
 
-// The file-system representation; none for null and for a string that has none.
+// Returns the file-system representation, or nullopt for null and for a string that has none.
 inline std::optional<std::string> NameOf(CFStringRef string) {
   if (string == nullptr) return std::nullopt;
   std::string bytes(
@@ -45,7 +45,7 @@ inline std::optional<std::string> NameOf(CFStringRef string) {
   return bytes;
 }
 
-// The URL of a path in Linux bytes, or null.
+// Returns the URL of a path in Linux bytes, or null.
 inline CFOwned<CFURLRef> MakeUrl(const std::string& path, bool folder,
                                  CFURLPathStyle style = kCFURLPOSIXPathStyle) {
   const auto name = MakeName(path);
@@ -53,7 +53,7 @@ inline CFOwned<CFURLRef> MakeUrl(const std::string& path, bool folder,
       CFURLCreateWithFileSystemPath(kCFAllocatorDefault, name.Get(), style, folder ? 1 : 0));
 }
 
-// The URL with a text, or null.
+// Returns the URL with this text, or null.
 inline CFOwned<CFURLRef> ParseUrl(std::string_view text) {
   return CFOwned(
       CFURLCreateWithBytes(kCFAllocatorDefault, reinterpret_cast<const UInt8*>(text.data()),

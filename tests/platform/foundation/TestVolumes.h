@@ -1,10 +1,10 @@
-// The mounted volumes that HFS paths meet in these tests: "Root" at "/", "Data" at "/mnt/data", and
-// "Data:2" (in the HFS view "Data/2") at "/mnt/Data:2".
+// Fake volumes for tests of HFS paths: "Root" at "/", "Data" at "/mnt/data", and "Data:2" (HFS name
+// "Data/2") at "/mnt/Data:2".
 #pragma once
 
 namespace tallowmere::foundation::test {
 
-// Takes the volumes away, or brings them back.
+// Unmounts or mounts the fake volumes.
 void SetVolumesAreMounted(bool mounted);
 
 }  // namespace tallowmere::foundation::test

@@ -1,3 +1,4 @@
+// Which texts are URLs by the grammar of RFC 3986.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
@@ -114,7 +115,7 @@ TEST(UrlGrammar, RefusesBadSchemes) {
   }
 }
 
-TEST(UrlGrammar, ColonBehindASlashIsNoScheme) {
+TEST(UrlGrammar, ColonAfterASlashIsNoScheme) {
   EXPECT_TRUE(IsUrl("./1a:b"));
   EXPECT_TRUE(IsUrl("/a_b:c"));
   EXPECT_TRUE(IsUrl("?:"));
@@ -196,7 +197,7 @@ TEST(UrlGrammar, RefusesALiteralOfAnyLength) {
   EXPECT_FALSE(IsUrl("//[::1\0]"sv));
 }
 
-TEST(UrlGrammar, ReadsNothingBehindTheText) {
+TEST(UrlGrammar, ReadsNothingAfterTheText) {
   EXPECT_FALSE(IsUrl("a%41"sv.substr(0, 3)));
   EXPECT_FALSE(IsUrl("a%41"sv.substr(0, 2)));
 }

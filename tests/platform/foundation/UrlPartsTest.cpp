@@ -1,3 +1,4 @@
+// Splitting URLs into parts, and percent-encoding.
 #include <gtest/gtest.h>
 
 #include "foundation/PercentEncoding.h"
@@ -35,13 +36,13 @@ TEST(UrlParts, MarksInLaterPartsAreText) {
   EXPECT_EQ(parts.fragment, "g?h#i");
 }
 
-TEST(UrlParts, PathIsReplacedAlone) {
+TEST(UrlParts, OnlyThePathIsReplaced) {
   EXPECT_EQ(WithPath("s://h/a?q#f", "/b/c"), "s://h/b/c?q#f");
   EXPECT_EQ(WithPath("s://h?q", "//b"), "s://h//b?q");
   EXPECT_EQ(WithPath("a", "b"), "b");
 }
 
-TEST(UrlParts, PathThatWouldReadAsAnAuthorityDoesNot) {
+TEST(UrlParts, PathIsNotMistakenForAnAuthority) {
   EXPECT_EQ(WithPath("s:/a", "//b"), "s:/.//b");
 }
 
@@ -55,7 +56,7 @@ TEST(PercentEncoding, DecodesBothLetterCases) {
   EXPECT_EQ(PercentDecode("%aB%Ab%2f"), "\xAB\xAB/");
 }
 
-TEST(PercentEncoding, LeavesWhatIsNoSequence) {
+TEST(PercentEncoding, LeavesInvalidSequencesUnchanged) {
   EXPECT_EQ(PercentDecode(std::string_view("%41").substr(0, 2)), "%4");
   EXPECT_EQ(PercentDecode("%"), "%");
   EXPECT_EQ(PercentDecode("%4"), "%4");

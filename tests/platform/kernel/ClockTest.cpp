@@ -1,3 +1,4 @@
+// The clock and its times in nanoseconds.
 #include <gtest/gtest.h>
 
 #include <chrono>
@@ -15,7 +16,7 @@ TEST(Clock, CountsNanosecondsSince1970) {
   EXPECT_EQ(NanosecondsOf(-1, 999'999'999), -1);
 }
 
-TEST(Clock, GivesOtherTimesOtherNumbersBeyondWhatItCanCount) {
+TEST(Clock, GivesDistinctNumbersToTimesOutOfRange) {
   constexpr std::int64_t kLast = std::numeric_limits<std::int64_t>::max();
   EXPECT_NE(NanosecondsOf(kLast, 0), NanosecondsOf(kLast, 1));
   EXPECT_NE(NanosecondsOf(kLast, 0), NanosecondsOf(kLast - 1, 0));

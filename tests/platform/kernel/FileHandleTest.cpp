@@ -1,3 +1,4 @@
+// File handles: reading them, making them from inode numbers, and opening items by them.
 #include <linux/capability.h>
 
 #include <cstring>
@@ -14,7 +15,7 @@ using test::TemporaryFolder;
 
 constexpr std::uint64_t kTopSubvolume = 5;  // BTRFS_FS_TREE_OBJECTID in <linux/btrfs_tree.h>
 
-// A handle of an inode number and a generation, as the kernel's commonest kind has them.
+// Makes a handle of inode number and generation, the form that most file systems use.
 FileHandle MakeHandle(std::uint32_t inode, std::uint32_t generation) {
   FileHandle handle{1, 8, {}};
   std::memcpy(handle.bytes.data(), &inode, sizeof inode);
@@ -28,7 +29,7 @@ TEST(FileHandle, OfAMissingItemIsAnError) {
   EXPECT_EQ(ReadHandleToIdentify(AT_FDCWD, (folder.Path() / "x").c_str()).Error().number, ENOENT);
 }
 
-TEST(FileHandle, OfAnInodeTakesItsFormFromASibling) {
+TEST(FileHandle, OfAnInodeNumberHasTheFormOfASibling) {
   EXPECT_EQ(HandleOf({4711}, MakeHandle(2, 77), 2), MakeHandle(4711, 0));
   EXPECT_EQ(HandleOf({4711, 0, 5}, MakeHandle(2, 77), 2), MakeHandle(4711, 5));
 }
@@ -104,7 +105,7 @@ class AFileHandleOnBtrfs : public AMountedImage {
     if (!IsSkipped()) MakeSubvolumes();
   }
 
-  // Two subvolumes with the same content; their ids are 256 and 257.
+  // Makes two subvolumes with the same content. Their numbers are 256 and 257.
   void MakeSubvolumes() {
     for (const std::string name : {"one", "two"}) {
       ASSERT_TRUE(test::RunTool({"btrfs", "subvolume", "create", PathOf(name).string()}));
@@ -114,7 +115,7 @@ class AFileHandleOnBtrfs : public AMountedImage {
     MakeFolder("folder");
   }
 
-  // Of an item below the root folder; 0 when there is none.
+  // Returns the subvolume of an item below the root folder, or 0 when there is none.
   std::uint64_t SubvolumeAt(const char* path) const {
     const auto handle = ReadHandle(Root(), path);
     return handle ? SubvolumeOf(*handle).value_or(0) : 0;
@@ -163,12 +164,12 @@ TEST_F(AFileHandleOnBtrfs, OfADeletedSubvolumeIsStale) {
   EXPECT_EQ(ErrorOfOpening({256, 256}), ESTALE);
 }
 
-TEST_F(AFileHandleOnBtrfs, OfNumbersIsRefusedToNobody) {
+TEST_F(AFileHandleOnBtrfs, OfNumbersIsRefusedWithoutPrivileges) {
   const HandleNumbers numbers{InodeOf(PathOf("one/file")), 256};
   EXPECT_TRUE(test::HoldsForNobody([&] { return ErrorOfOpening(numbers) == EPERM; }));
 }
 
-// With what mksquashfs makes of a folder.
+// An image that mksquashfs makes of a folder.
 class AFileHandleOnSquashfs : public AMountedImage {
  protected:
   void Make(const std::vector<std::string>& options) {

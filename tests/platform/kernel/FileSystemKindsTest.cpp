@@ -1,3 +1,4 @@
+// What the table of file system kinds says about each kind.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <sys/vfs.h>
@@ -38,7 +39,7 @@ const FileSystemKind& KindAt(const std::filesystem::path& path) {
 #define SKIP_WITHOUT_MOUNTS() \
   if (geteuid() != 0 || !test::EnterOwnMountNamespace()) GTEST_SKIP() << "may not mount"
 
-TEST(FileSystemKinds, WhatIsNotInTheTablePromisesNothing) {
+TEST(FileSystemKinds, UnknownKindsPromiseNothing) {
   const FileSystemKind& kind = KindOf(0x12345678, 1000, kDisk);
   EXPECT_EQ(kind.name, "unknown");
   EXPECT_FALSE(kind.numbersTellItemsApart);
@@ -76,7 +77,7 @@ TEST(FileSystemKinds, HaveNumbersOf32BitsWhereThatIsKnown) {
   }
 }
 
-TEST(FileSystemKinds, TheTypesOfTheLinuxHeaders) {
+TEST(FileSystemKinds, HaveTheTypesOfTheLinuxHeaders) {
   const std::pair<std::uint32_t, std::string_view> types[] = {
       {0xEF53, "ext"},         {0x58465342, "xfs"},      {0x9123683E, "btrfs"},
       {0x01021994, "tmpfs"},   {0x73717368, "squashfs"}, {0xE0F5E1E2, "erofs"},
@@ -105,7 +106,7 @@ TEST(FileSystemKinds, AnOverlayIsTrustedOnlyIfItCountsInodes) {
   EXPECT_FALSE(KindOf(0x794C7630, 0, kNoDisk).numbersTellItemsApart);
 }
 
-TEST(FileSystemKinds, NumbersAreFoldedWhereThoseThatShareAnIDCanBeAskedFor) {
+TEST(FileSystemKinds, NumbersAreFoldedWhereItemsThatShareAnIDCanBeOpened) {
   for (const std::uint32_t type : {0xEF53u, 0x58465342u, 0x73717368u, 0x4244u, 0x482Bu, 0x4D44u,
                                    0x2011BAB0u, 0x9660u, 0x15013346u}) {
     EXPECT_EQ(KindOf(type, 1000, kDisk).upperIDs, UpperIDs::kFolded) << type;
@@ -152,7 +153,7 @@ TEST(FileSystemKinds, OnATmpfs) {
   EXPECT_EQ(KindAt(folder.Path()).name, "tmpfs");
 }
 
-// Mounts an overlay of two folders and looks.
+// Mounts an overlay of two folders and returns the name of its kind.
 std::string NameOfOverlay(const std::filesystem::path& lower, const std::filesystem::path& upper) {
   TemporaryFolder place;
   ScopedMount overlay("none", place.Path(), "overlay", 0,

@@ -1,4 +1,4 @@
-// What the table of kinds says, held against the kernel's own file systems.
+// Checks the table of file system kinds against the kernel's own file systems.
 #include <dirent.h>
 #include <sys/vfs.h>
 
@@ -22,7 +22,7 @@ struct Disk {
 
 using Path = std::filesystem::path;
 
-// Of what is below a folder, itself included.
+// Returns the folder and all items below it.
 std::vector<Path> ItemsBelow(const Path& folder) {
   std::vector<Path> items{folder};
   for (const auto& entry : std::filesystem::recursive_directory_iterator(folder)) {
@@ -31,7 +31,7 @@ std::vector<Path> ItemsBelow(const Path& folder) {
   return items;
 }
 
-// On a volume with a folder that has three folders, two files, one with two names, and a link.
+// A volume with a folder that holds three folders, two files (one with two names) and a link.
 class AKindOfFileSystems : public AMountedImage, public testing::WithParamInterface<Disk> {
  protected:
   void SetUp() override {
@@ -44,7 +44,7 @@ class AKindOfFileSystems : public AMountedImage, public testing::WithParamInterf
     std::filesystem::create_symlink("f", PathOf("a/l"));
   }
 
-  // With numbers that the rest of the volume has too.
+  // Makes a subvolume whose inode numbers also occur in the rest of the volume.
   void MakeSubvolume() {
     ASSERT_TRUE(test::RunTool({"btrfs", "subvolume", "create", PathOf("s").string()}));
     for (const std::string name : {"s/b", "s/c"}) MakeFolder(name);
@@ -65,7 +65,7 @@ class AKindOfFileSystems : public AMountedImage, public testing::WithParamInterf
     return numbers;
   }
 
-  // What its kind needs to open an item by number.
+  // Returns what its kind needs to open an item by number.
   HandleNumbers NumbersOf(const Path& item) const {
     HandleNumbers numbers{InodeOf(item)};
     if (Kind().byNumber == ByNumber::kInodeAndSubvolume) {
@@ -131,7 +131,7 @@ class AKindOfFileSystems : public AMountedImage, public testing::WithParamInterf
   }
 };
 
-TEST_P(AKindOfFileSystems, KeepsWhatTheTablePromises) {
+TEST_P(AKindOfFileSystems, KeepsThePromisesOfTheTable) {
   const FileSystemKind& kind = Kind();
   ASSERT_NE(kind.name, "unknown");
   if (kind.numbersTellItemsApart) ExpectFoldersToldApart();

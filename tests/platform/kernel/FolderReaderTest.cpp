@@ -1,3 +1,4 @@
+// Reading the entries of a folder.
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -35,11 +36,11 @@ class EntriesOfAFolder : public testing::Test {
   test::TemporaryFolder mFolder;
 };
 
-TEST_F(EntriesOfAFolder, AreNoneWhereNothingIs) {
+TEST_F(EntriesOfAFolder, AreNoneInAnEmptyFolder) {
   EXPECT_TRUE(Kinds().empty());
 }
 
-TEST_F(EntriesOfAFolder, AreAllButTheFolderItselfAndTheOneAbove) {
+TEST_F(EntriesOfAFolder, ExcludeTheFolderItselfAndItsParent) {
   mFolder.MakeFolder("folder");
   mFolder.MakeFile("file");
   mFolder.MakeFile("...");
@@ -77,8 +78,8 @@ TEST_F(EntriesOfAFolder, HaveNoKindWhereTheFileSystemDoesNotSay) {
                                             std::pair("file", Entry::Kind::kUnknown)));
 }
 
-// Several times what one call of the kernel gives.
-TEST_F(EntriesOfAFolder, ComeOnceEachInALargeFolder) {
+// Several times as many entries as one system call returns.
+TEST_F(EntriesOfAFolder, AreEachReturnedOnceFromALargeFolder) {
   constexpr int kFiles = 2000;
   std::set<std::string> made;
   for (int i = 0; i < kFiles; ++i) {

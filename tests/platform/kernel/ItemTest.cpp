@@ -1,4 +1,4 @@
-// What tells one item from another, and from the next with its number.
+// What distinguishes an item from others, and from a later item with the same inode number.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -28,13 +28,13 @@ class AnItemOfTheKernel : public testing::Test {
   std::string PathOf(const char* name) const { return mFolder.Path() / name; }
   Result<Item> Read(const char* name) const { return ReadItem(AtPath(PathOf(name).c_str())); }
   bool IsAtX(const Item& item) const { return IsAt(item, AtPath(PathOf("x").c_str())); }
-  // Whether the file system tells births, by statx(2) itself.
+  // Returns whether the file system records birth times, from statx(2) itself.
   bool TellsBirths() const {
     struct statx about {};
     EXPECT_EQ(statx(AT_FDCWD, PathOf("x").c_str(), AT_SYMLINK_NOFOLLOW, STATX_BTIME, &about), 0);
     return (about.stx_mask & STATX_BTIME) != 0;
   }
-  // One that any file system could have given for "x": neither birth nor handle.
+  // Returns an item such as any file system could give for "x": with neither birth time nor handle.
   Item PlainReferenceToX() const {
     Item item{};
     struct stat about = {};
@@ -136,7 +136,7 @@ TEST_F(AnItemOfTheKernel, WithoutBirthIsNotToAnItemWithBirth) {
 
 // --- What proves it -----------------------------------------------------------------------------
 
-// On a file system without a device.
+// On a tmpfs, a file system without a device.
 class AnItemInMemory : public AnItemOfTheKernel {
  protected:
   void SetUp() override {
@@ -155,7 +155,7 @@ TEST_F(AnItemInMemory, AlwaysCarriesItsHandle) {
   EXPECT_EQ(Read("x")->handle, HandleAt(AtPath(PathOf("x").c_str())));
 }
 
-// File systems give a freed inode number away at once, within one tick of the clock of births.
+// File systems reuse a freed inode number at once, within one tick of the clock of birth times.
 class AnItemOnADisk : public AnItemOfTheKernel {
  protected:
   void SetUp() override {
@@ -176,7 +176,7 @@ class AnItemOnADisk : public AnItemOfTheKernel {
   std::optional<test::FileSystemImage> mImage;
 };
 
-// The one test by the machine's own clock.
+// The only test that uses the machine's real clock.
 TEST_F(AnItemOnADisk, ThatWasJustBornCarriesItsHandle) {
   EXPECT_NE(ReadX().handle.size, 0U);
 }
@@ -197,19 +197,19 @@ TEST_F(AnItemOnADisk, CarriesItsHandleUntilTwoSecondsAfterItsBirth) {
   EXPECT_EQ(readAtTheAgeOf(milliseconds(3100)).handle.size, 0U);
 }
 
-TEST_F(AnItemOnADisk, ThatIsYetToBeBornByTheClockCarriesItsHandle) {
+TEST_F(AnItemOnADisk, BornInTheFutureCarriesItsHandle) {
   const OtherTime earlier(-std::chrono::hours(24));
   EXPECT_NE(ReadX().handle.size, 0U);
 }
 
-TEST_F(AnItemOnADisk, ThatIsOldIsProvedByItsBirthAlone) {
+TEST_F(AnItemOnADisk, ThatIsOldIsIdentifiedByItsBirthAlone) {
   const OtherTime later(std::chrono::hours(1));
   const Item item = ReadX();
   EXPECT_EQ(item.handle.size, 0U);
   EXPECT_TRUE(IsAt(item, AtPath(Path().c_str())));
 }
 
-TEST_F(AnItemOnADisk, IsNotTakenForTheNextOneWithItsNameAndNumber) {
+TEST_F(AnItemOnADisk, IsNotTakenForItsSuccessorWithTheSameNumber) {
   const Item old = ReadX();
   std::filesystem::remove(Path());
   Make();
@@ -219,7 +219,7 @@ TEST_F(AnItemOnADisk, IsNotTakenForTheNextOneWithItsNameAndNumber) {
   EXPECT_FALSE(IsProvedSame(old, next));
 }
 
-TEST_F(AnItemOnADisk, GetsAProofThatIsNoItemsWhenAnotherHasTakenItsPlace) {
+TEST_F(AnItemOnADisk, MatchesNoItemWhenItWasReplacedWhileRead) {
   auto seen = ReadStatus(AtPath(Path().c_str()));
   ASSERT_TRUE(seen);
   const Item old = ReadX();
@@ -230,7 +230,7 @@ TEST_F(AnItemOnADisk, GetsAProofThatIsNoItemsWhenAnotherHasTakenItsPlace) {
   EXPECT_FALSE(IsProvedSame(item, old));
 }
 
-TEST(AnItemWithoutBirthAndHandle, IsToAnItemOnItsOwnMountAlone) {
+TEST(AnItemWithoutBirthAndHandle, MatchesOnlyOnItsOwnMount) {
   constexpr char kItem[] = "/proc/version";
   auto item = ReadItem(AtPath(kItem));
   ASSERT_TRUE(item);

@@ -1,4 +1,4 @@
-// A mounted image whose items are opened by number.
+// A mounted image for opening items by number.
 #pragma once
 
 #include <fcntl.h>
@@ -35,7 +35,7 @@ inline std::uint64_t InodeOf(const std::filesystem::path& path) {
 
 class AMountedImage : public testing::Test {
  protected:
-  // Skips the test where there can be no such image.
+  // Skips the test where the image cannot be made or mounted.
   void MakeImage(const std::string& type, std::vector<std::string> makeCommand,
                  std::uintmax_t size) {
     if (geteuid() != 0 || !test::EnterOwnMountNamespace()) GTEST_SKIP() << "may not mount";
@@ -50,7 +50,7 @@ class AMountedImage : public testing::Test {
     ASSERT_TRUE(mRoot.IsOpen());
   }
 
-  // Empties the kernel's caches of the volume as well.
+  // Also empties the kernel's caches of the volume.
   void MountAgain(const std::string& options = "") {
     mRoot.Close();
     mImage->Unmount();
@@ -77,7 +77,7 @@ class AMountedImage : public testing::Test {
     return handle ? *handle : FileHandle{};
   }
 
-  // The error of opening an item by its numbers, 0 if it is then the one at `path`.
+  // Opens an item by its numbers. Returns the error, or 0 after checking that it is at `path`.
   int ErrorOfOpening(const HandleNumbers& numbers, const std::filesystem::path& path = {}) const {
     struct stat status {};
     EXPECT_EQ(fstat(Root(), &status), 0);
@@ -94,7 +94,7 @@ class AMountedImage : public testing::Test {
   std::optional<test::FileSystemImage> mImage;
 
  private:
-  Descriptor mRoot;  // goes before the image
+  Descriptor mRoot;  // closed before the image is unmounted
 };
 
 }  // namespace tallowmere::kernel

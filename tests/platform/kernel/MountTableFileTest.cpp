@@ -1,4 +1,4 @@
-// The table of mounts as a file, and what is asked of the root beside it.
+// The mount table as a file, and the queries about the root folder that go with it.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -76,7 +76,7 @@ TEST(AMountPoint, IsAFolderOrNot) {
   EXPECT_FALSE(IsFolderByMemory(folder.Path() / "missing"));
 }
 
-// The label as a process tells it whose "/" is a folder.
+// Returns whether a process with this root folder reads this label.
 bool HasLabel(const std::string& root, const std::string& label) {
   return HoldsInChild([&] { return chroot(root.c_str()) == 0 && chdir("/") == 0; },
                       [&] {

@@ -1,4 +1,4 @@
-// Paths held and read, by a kernel with openat2 and by those without it.
+// Opening and resolving paths, on kernels with and without openat2.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -29,7 +29,7 @@ TEST(ANormalizedPath, IsAbsoluteWithoutEmptyComponentsAndDots) {
   }
 }
 
-// The error of openat2, 0 for a kernel that has it: ENOSYS before Linux 5.6, EPERM in sandboxes.
+// The error of openat2, or 0 where it works: ENOSYS before Linux 5.6, EPERM in sandboxes.
 class HeldPaths : public testing::TestWithParam<int> {
  protected:
   void SetUp() override {
@@ -82,19 +82,19 @@ TEST_P(HeldPaths, EndWhereNothingIs) {
   EXPECT_EQ(ErrorOf(HoldWithoutLinks(PathOf(std::string(256, 'n')))), ENAMETOOLONG);
 }
 
-TEST_P(HeldPaths, LongerThanTheKernelTakesAreAnError) {
+TEST_P(HeldPaths, LongerThanTheKernelAcceptsAreAnError) {
   std::string path = PathOf("a");
   while (path.size() < PATH_MAX) path += "/b";
   EXPECT_EQ(ErrorOf(HoldWithoutLinks(path)), ENAMETOOLONG);
 }
 
-TEST_P(HeldPaths, OfFoldersAreOfNothingElse) {
+TEST_P(HeldPaths, OfFoldersLeadToNothingElse) {
   EXPECT_EQ(InodeOf(HoldFolderWithoutLinks(PathOf("a/b"))), InodeAt("a/b"));
   EXPECT_EQ(ErrorOf(HoldFolderWithoutLinks(PathOf("a/b/x"))), ENOTDIR);
   EXPECT_EQ(ErrorOf(HoldFolderWithoutLinks(PathOf("missing"))), ENOENT);
 }
 
-TEST_P(HeldPaths, TakeNoRightToRead) {
+TEST_P(HeldPaths, NeedNoPermissionToRead) {
   ASSERT_EQ(chmod(mFolder.Path().c_str(), 0755), 0);
   ASSERT_EQ(chmod(PathOf("a/b").c_str(), 0711), 0);
   EXPECT_TRUE(test::HoldsForNobody([&] {
@@ -129,7 +129,7 @@ TEST_F(PathsOfLinks, AreFollowedToTheirEndsByTheRealPath) {
   EXPECT_EQ(RealPath(PathOf("link/dangling")).Error(), kNotThere);
 }
 
-TEST_F(PathsOfLinks, AreNotFollowedInTheLastPlaceByTheCanonicalPath) {
+TEST_F(PathsOfLinks, AreNotFollowedAsTheLastNameByTheCanonicalPath) {
   EXPECT_EQ(*CanonicalPath(PathOf("link")), PathOf("link"));
   EXPECT_EQ(*CanonicalPath(PathOf("link/dangling")), PathOf("a/dangling"));
   EXPECT_EQ(*CanonicalPath(PathOf("link/.")), PathOf("a"));
@@ -148,7 +148,7 @@ TEST_F(PathsOfLinks, AreFollowedToAFolderThatIsHeld) {
   EXPECT_TRUE(OpenForReading({held->Get(), "b"}));
 }
 
-TEST_F(PathsOfLinks, AreToldOfAnOpenItem) {
+TEST_F(PathsOfLinks, AreReadFromAnOpenItem) {
   const auto held = HoldWithoutLinks(PathOf("a/b/x"));
   ASSERT_TRUE(held);
   EXPECT_EQ(*PathOfDescriptor(*held), PathOf("a/b/x"));

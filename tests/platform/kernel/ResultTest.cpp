@@ -1,3 +1,4 @@
+// Results with a value or an error.
 #include <gtest/gtest.h>
 
 #include <memory>
@@ -36,7 +37,7 @@ TEST(Result, KeepsTheErrorOfTheCallThatFailed) {
   EXPECT_EQ(failed.Error().number, EIO);
 }
 
-TEST(Errors, ThatSayThatNothingIsThereAreNotThoseThatHideIt) {
+TEST(Errors, ForMissingItemsDifferFromErrorsThatHideItems) {
   for (const int number : {ENOENT, ENOTDIR, ELOOP}) EXPECT_TRUE(MeansGone({number})) << number;
   for (const int number : {EACCES, EPERM, EIO, EMFILE}) EXPECT_FALSE(MeansGone({number})) << number;
   for (const int number : {EACCES, EPERM}) EXPECT_TRUE(MeansRefused({number})) << number;

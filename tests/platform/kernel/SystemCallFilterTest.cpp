@@ -1,5 +1,5 @@
-// Which calls the filter decides by their number alone. The kernel runs a filter once for each
-// number when it is installed, and no more for those that it allows without a look at an argument:
+// Which calls the filter decides by number alone. When a filter is installed, the kernel runs it
+// once for each number, and never again for those that it allows without reading an argument:
 // seccomp_cache_prepare in kernel/seccomp.c, since Linux 5.11.
 #include <gtest/gtest.h>
 #include <linux/seccomp.h>
@@ -17,12 +17,12 @@ namespace {
 
 constexpr Openings kUsualOpenings{.toWrite = true, .toNetworks = false};
 
-// The architecture that the filter's first comparison asks for.
+// The first comparison of the filter is with the architecture.
 std::uint32_t ArchitectureOf(const SystemCallFilter& filter) {
   return filter.steps[1].k;
 }
 
-// What the filter returns for a call of this machine. Nullopt when it looks at an argument.
+// Returns what the filter returns for a call on this machine, or nullopt when it reads an argument.
 std::optional<std::uint32_t> DecisionByNumber(const SystemCallFilter& filter, int call) {
   std::uint32_t value = 0;
   for (std::size_t at = 0; at < filter.size;) {
@@ -60,16 +60,17 @@ class ASystemCallFilter : public testing::Test {
   const SystemCallFilter mFilter = MakeSystemCallFilter(kUsualOpenings);
 };
 
-// All calls of requests about known items but the look for the parent, whose signal counts.
-TEST_F(ASystemCallFilter, AllowsTheCallsOfARequestByTheirNumberAlone) {
+// Every call of a request about known items, except the kill that looks for the parent: its signal
+// is an argument.
+TEST_F(ASystemCallFilter, AllowsTheCallsOfARequestByNumberAlone) {
   for (const int call : {SYS_read, SYS_write, SYS_close, SYS_openat, SYS_openat2, SYS_statx,
                          SYS_ppoll, SYS_pread64, SYS_name_to_handle_at, SYS_getdents64, SYS_brk}) {
     EXPECT_EQ(DecisionByNumber(mFilter, call), SECCOMP_RET_ALLOW) << call;
   }
-#ifdef SYS_newfstatat  // under another name on processors of 32 bits
+#ifdef SYS_newfstatat  // has another name on 32-bit processors
   EXPECT_EQ(DecisionByNumber(mFilter, SYS_newfstatat), SECCOMP_RET_ALLOW);
 #endif
-#ifdef SYS_poll  // newer architectures have ppoll alone
+#ifdef SYS_poll  // newer architectures only have ppoll
   EXPECT_EQ(DecisionByNumber(mFilter, SYS_poll), SECCOMP_RET_ALLOW);
 #endif
 }
@@ -78,19 +79,19 @@ TEST_F(ASystemCallFilter, LooksAtTheSignal) {
   EXPECT_EQ(DecisionByNumber(mFilter, SYS_kill), std::nullopt);
 }
 
-TEST_F(ASystemCallFilter, LooksAtTheFlagsOfOpeningWhereNothingElseDoes) {
+TEST_F(ASystemCallFilter, ChecksTheFlagsOfOpenWhereNothingElseDoes) {
   const SystemCallFilter filter = MakeSystemCallFilter({.toWrite = false, .toNetworks = false});
   EXPECT_EQ(DecisionByNumber(filter, SYS_openat), std::nullopt);
   EXPECT_EQ(DecisionByNumber(filter, SYS_openat2), SECCOMP_RET_ALLOW);
 }
 
-TEST_F(ASystemCallFilter, RefusesWhatItClosesByItsNumberAlone) {
+TEST_F(ASystemCallFilter, RefusesForbiddenCallsByNumberAlone) {
   for (const int call : {SYS_execve, SYS_mount, SYS_unlinkat, SYS_bpf}) {
     EXPECT_EQ(DecisionByNumber(mFilter, call), SECCOMP_RET_ERRNO | EPERM) << call;
   }
 }
 
-TEST_F(ASystemCallFilter, DoesNotKnowCallsThatCameLater) {
+TEST_F(ASystemCallFilter, AnswersNewerCallsAsUnknown) {
   EXPECT_EQ(DecisionByNumber(mFilter, 4711), SECCOMP_RET_ERRNO | ENOSYS);
 }
 

@@ -1,3 +1,4 @@
+// Which configurations of the user database need the network.
 #include <gtest/gtest.h>
 
 #include "kernel/UserDatabase.h"

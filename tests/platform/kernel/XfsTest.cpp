@@ -1,3 +1,4 @@
+// XFS: opening items by inode number and generation.
 #include <linux/capability.h>
 
 #include "KernelFixture.h"
@@ -16,14 +17,14 @@ class AnXfsVolume : public AMountedImage {
     MakeImage("xfs", {"mkfs.xfs", "-q", "-d", "agcount=4"}, 320 * kMebibyte);
   }
 
-  // Opens the item that has an inode number, whichever it is; the error of what fails first.
+  // Opens the item that now has the inode number. Returns 0, or the error of the step that failed.
   int ErrorOfOpeningNow(std::uint64_t inode, const std::filesystem::path& path = {}) const {
     const auto generation = ReadXfsGeneration(Root(), inode);
     if (!generation) return generation.Error().number;
     return ErrorOfOpening({inode, 0, *generation}, path);
   }
 
-  // Makes files until one has the number; its name, or none.
+  // Makes files until one has the inode number. Returns its name, or an empty string.
   std::string NameWithInode(std::uint64_t inode) const {
     for (int i = 0; i < 1000; ++i) {
       const std::string name = "again" + std::to_string(i);
@@ -51,7 +52,7 @@ TEST_F(AnXfsVolume, DoesNotOpenAnItemWithAnotherGeneration) {
   EXPECT_EQ(ErrorOfOpening({inode, 0, *generation + 1}), ESTALE);
 }
 
-TEST_F(AnXfsVolume, HasNoGenerationForANumberThatNoItemHas) {
+TEST_F(AnXfsVolume, HasNoGenerationForAnUnknownNumber) {
   const std::uint64_t inode = InodeOf(MakeFile("f"));
   MakeFile("next");
   std::filesystem::remove(PathOf("f"));
@@ -62,7 +63,7 @@ TEST_F(AnXfsVolume, HasNoGenerationForANumberThatNoItemHas) {
   EXPECT_EQ(ReadXfsGeneration(Root(), ~std::uint64_t{0}).Error().number, ENOENT);
 }
 
-TEST_F(AnXfsVolume, GivesANumberAgainWithAnotherGeneration) {
+TEST_F(AnXfsVolume, ReusesANumberWithAnotherGeneration) {
   const std::uint64_t inode = InodeOf(MakeFile("f"));
   const auto before = ReadXfsGeneration(Root(), inode);
   ASSERT_TRUE(before);
@@ -83,11 +84,12 @@ TEST_F(AnXfsVolume, WithShortNumbersHasHandlesOfAnotherForm) {
 TEST_F(AnXfsVolume, HasNoNumberAboveTheHighest) {
   const auto highest = ReadHighestXfsInode(Root());
   ASSERT_TRUE(highest);
-  // Four groups of 80 MiB, which number like 128 MiB, with eight inodes in each block of 4 KiB.
+  // Four groups of 80 MiB are numbered like groups of 128 MiB, with eight inodes per block of 4
+  // KiB.
   EXPECT_EQ(*highest, 4 * (128 * kMebibyte / 4096) * 8 - 1);
 }
 
-TEST_F(AnXfsVolume, TellsGenerationsToAdministratorsOnlyAndItsSizeToAll) {
+TEST_F(AnXfsVolume, ShowsGenerationsOnlyToAdministratorsAndItsSizeToAll) {
   const std::uint64_t inode = InodeOf(MakeFile("f"));
   const auto knowsSizeOnly = [&] {
     return ReadXfsGeneration(Root(), inode).Error().number == EPERM && ReadHighestXfsInode(Root());
@@ -97,8 +99,8 @@ TEST_F(AnXfsVolume, TellsGenerationsToAdministratorsOnlyAndItsSizeToAll) {
   EXPECT_TRUE(test::HoldsWithout(CAP_SYS_ADMIN, knowsSizeOnly));
 }
 
-// Sparse, with groups of 1 TiB: those of the second have numbers of 32 bits, those of the third and
-// later ones longer ones. New folders are spread over the groups.
+// A sparse volume with groups of 1 TiB. Inode numbers have 32 bits in the second group and more in
+// later ones. XFS spreads new folders over the groups.
 class ALargeXfsVolume : public AnXfsVolume {
  protected:
   void SetUp() override {

@@ -1,3 +1,4 @@
+// The plain and short HFS names of Linux names.
 #include <gtest/gtest.h>
 
 #include "names/HFSNames.h"
@@ -19,7 +20,7 @@ TEST(HFSNames, ControlCharactersAreOrdinary) {
   EXPECT_EQ(PlainHFSName("a\n\x01\x7F", 63), "a\n\x01\x7F");
 }
 
-TEST(HFSNames, WhatMacRomanLacksHasNoPlainName) {
+TEST(HFSNames, ACharacterOutsideMacRomanLeavesNoPlainName) {
   EXPECT_EQ(PlainHFSName("\xE6\x97\xA5", 63), std::nullopt);
   EXPECT_EQ(PlainHFSName("\xFF", 63), std::nullopt);
 }
@@ -37,7 +38,7 @@ TEST(HFSNames, AShortNameKeepsTheExtensionAndAsMuchOfTheRestAsFits) {
             "A very long name tha#1B4A3F.aif");
 }
 
-TEST(HFSNames, ADotInFrontBeginsNoExtension) {
+TEST(HFSNames, ALeadingDotBeginsNoExtension) {
   EXPECT_EQ(ShortHFSName(".\xE6\x97\xA5", 0x1B), ".?#1B");
   EXPECT_EQ(ShortHFSName(".aif\xFF", 0x1B), ".aif?#1B");
   EXPECT_EQ(ShortHFSName(".aif", 0x1B), ".aif#1B");

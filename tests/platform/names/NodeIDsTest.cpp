@@ -1,3 +1,4 @@
+// Node ids of inode numbers, and the numbers that an id can come from.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
@@ -24,12 +25,12 @@ constexpr NodeIDRule kFolded{{128, kDevice, 0}, UpperIDs::kFolded};
 constexpr NodeIDRule kSubvolumes{{256, kDevice, kRootSubvolume}, UpperIDs::kSubvolumes};
 constexpr std::array kRules{kMixed, kFolded, kSubvolumes};
 
-// The id of a number on the root folder's device.
+// Returns the id of an inode number on the root folder's device.
 std::uint32_t IDOf(const NodeIDRule& rule, std::uint64_t inode) {
   return NodeIDOf({inode, kDevice, rule.root.subvolume}, rule);
 }
 
-// The id of a number in another subvolume than the root folder's.
+// Returns the id of an inode number in a subvolume other than the root folder's.
 std::uint32_t IDInSubvolume(std::uint64_t subvolume, std::uint64_t inode) {
   return NodeIDOf({inode, kOtherDevice, subvolume}, kSubvolumes);
 }
@@ -59,7 +60,7 @@ TEST(NodeIDs, ANumberFrom16To31BitsIsItsOwnID) {
   }
 }
 
-TEST(NodeIDs, TheNumbersBelow16StandAboveAllOthers) {
+TEST(NodeIDs, TheNumbersBelow16AreMovedAboveAllOthers) {
   for (const NodeIDRule& rule : kRules) {
     EXPECT_EQ(IDOf(rule, 1), 0xFFFFFFF0u);
     EXPECT_EQ(IDOf(rule, 2), 0xFFFFFFF1u);
@@ -83,15 +84,15 @@ TEST(NodeIDs, FoldedNumbersAbove32BitsAreShifted) {
   EXPECT_EQ(IDOf(kFolded, kNoLimit), 0xC3910C9Du);
 }
 
-TEST(NodeIDs, FoldedNumbersThatWouldStandAmongTheSmallOnesAreMovedDown) {
+TEST(NodeIDs, FoldedNumbersThatWouldCollideWithTheSmallOnesAreMovedDown) {
   EXPECT_EQ(IDOf(kFolded, 0xFFFFFFF0), 0xFFFFFFE0u);
   EXPECT_EQ(IDOf(kFolded, 0xFFFFFFFF), 0xFFFFFFEFu);
   EXPECT_EQ(IDOf(kFolded, 0x161C8863E), 0xFFFFFFEFu);
   EXPECT_EQ(IDOf(kFolded, 0x161C8863F), 0xFFFFFFE0u);
 }
 
-// As a new folder in each of the 32 groups of 1 TiB would.
-TEST(NodeIDs, TheSamePlaceInManyGroupsOfALargeXfsVolumeHasIDsFarApart) {
+// Like the first new folder in each of the 32 groups of 1 TiB.
+TEST(NodeIDs, TheSamePlaceInManyXfsGroupsHasIDsFarApart) {
   std::vector<std::uint32_t> ids;
   for (std::uint64_t group = 1; group < 32; ++group) {
     ids.push_back(IDOf(kFolded, group * k31Bits + 128));
@@ -109,7 +110,7 @@ TEST(NodeIDs, LowSubvolumesAndNumbersHavePlacesOfTheirOwn) {
   EXPECT_EQ(IDInSubvolume(639, 0x3FFFFF), 0xDFFFFFFFu);
 }
 
-TEST(NodeIDs, OtherSubvolumesAndNumbersAreMixedAboveThose) {
+TEST(NodeIDs, OtherSubvolumesAndNumbersAreMixedAboveTheLowOnes) {
   EXPECT_EQ(IDInSubvolume(255, 256), 0xF36999E0u);
   EXPECT_EQ(IDInSubvolume(640, 256), 0xF791C7AAu);
   EXPECT_EQ(IDInSubvolume(256, 0x400000), 0xFB4102F6u);
@@ -119,7 +120,7 @@ TEST(NodeIDs, OtherSubvolumesAndNumbersAreMixedAboveThose) {
   EXPECT_EQ(IDInSubvolume(5, 256), 0xF29EC2D7u);
 }
 
-TEST(NodeIDs, InTheRootFoldersSubvolumeNumbersAbove31BitsAreMixedAsWell) {
+TEST(NodeIDs, NumbersAbove31BitsInTheRootFoldersSubvolumeAreMixed) {
   EXPECT_EQ(IDOf(kSubvolumes, 0x80000000), 0xEFDA86CAu);
   EXPECT_EQ(IDOf(kSubvolumes, 0x100000000), 0xECE81A14u);
 }
@@ -250,7 +251,7 @@ rc::Gen<NodeIDRule> AnyRule() {
 
 constexpr std::uint64_t kOne = 1;
 
-// A number of any length but 0, or a neighbour of one of the table's boundaries.
+// Returns a number of any length but 0, or one near a boundary of the table of ids.
 std::uint64_t AnyNumber() {
   if (*rc::gen::arbitrary<bool>()) {
     return (*rc::gen::arbitrary<std::uint64_t>() | kOne << 63) >> *rc::gen::inRange(0, 64);
@@ -266,7 +267,7 @@ ItemNumbers AnyItem(const NodeIDRule& rule) {
   return {inode, kOtherDevice, *rc::gen::inRange<std::uint64_t>(250, 650)};
 }
 
-// A candidate as the kernel would show it.
+// Returns a candidate as the kernel would report it.
 ItemNumbers Shown(const Candidate& candidate, const NodeIDRule& rule) {
   if (candidate.subvolume == 0) return {candidate.inode, kDevice, rule.root.subvolume};
   return {candidate.inode, kOtherDevice, candidate.subvolume};
@@ -317,7 +318,7 @@ RC_GTEST_PROP(NodeIDs, ThatAreCertainHaveOneCandidate, (std::uint32_t id)) {
   RC_ASSERT(candidates->size() <= 1u);
 }
 
-// Two numbers whose lowest 31 bits differ by the shift.
+// The lowest 31 bits of the two numbers differ by the shift.
 RC_GTEST_PROP(NodeIDs, OfTwoItemsAreNotTheSameCertainOne, ()) {
   const auto kept = *rc::gen::inRange<std::uint64_t>(0, k31Bits);
   const auto fold = *rc::gen::inRange<std::uint64_t>(2, 500);

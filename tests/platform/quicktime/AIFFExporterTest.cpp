@@ -1,3 +1,4 @@
+// The exporter: the sounds that it accepts and the settings that it writes.
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
@@ -24,7 +25,7 @@ constexpr ComponentResult kUnknownFormat = -206;
 
 class AIFFExporter : public WithExporter {
  protected:
-  // The settings as a tree; none when there are none.
+  // Returns the settings as a tree, or nullopt when there are none.
   std::optional<Atom> Settings() {
     Handle settings = nullptr;
     if (MovieExportGetSettingsAsAtomContainer(mExporter, &settings) != noErr) return std::nullopt;
@@ -34,7 +35,7 @@ class AIFFExporter : public WithExporter {
   }
 };
 
-TEST_F(AIFFExporter, TakesEveryFormatThatTheFilesCanHold) {
+TEST_F(AIFFExporter, AcceptsEveryFormatThatTheFilesCanHold) {
   for (const auto* const format : kUncompressed) {
     EXPECT_EQ(Set(Sound(format, 24, 6, 48000u << 16)), noErr) << format;
     EXPECT_EQ(Settings(), SettingsOf(format, 48000u << 16, 24, 6)) << format;
@@ -118,14 +119,14 @@ TEST_F(AIFFExporter, TakesTheLargestAndTheSmallestNumbers) {
   EXPECT_EQ(Settings(), SettingsOf("twos", 1, 1, 1));
 }
 
-TEST_F(AIFFExporter, OfSeveralFaultsTheSizeCountsFirstAndTheFormatSecond) {
+TEST_F(AIFFExporter, ReportsTheSizeFirstAndTheFormatSecond) {
   SoundDescription sound = Sound("mp4a", 0, 0, 0);
   EXPECT_EQ(Set(sound), kUnknownFormat);
   sound.descSize = 0;
   EXPECT_EQ(Set(sound), kBadArgument);
 }
 
-TEST_F(AIFFExporter, KeepsWhatItWasToldBeforeARefusal) {
+TEST_F(AIFFExporter, KeepsTheSoundFromBeforeARefusal) {
   ASSERT_EQ(Set(Sound("twos")), noErr);
   EXPECT_NE(Set(Sound("mp4a")), noErr);
   EXPECT_NE(Set(Sound("sowt", 0)), noErr);
@@ -141,7 +142,7 @@ TEST_F(AIFFExporter, LeavesTheDescriptionsBlockAlone) {
   DisposeHandle(block);
 }
 
-TEST_F(AIFFExporter, HasNoSettingsBeforeItIsToldASound) {
+TEST_F(AIFFExporter, HasNoSettingsBeforeASoundIsSet) {
   char* bytes = nullptr;
   Handle settings = &bytes;
   EXPECT_EQ(MovieExportGetSettingsAsAtomContainer(mExporter, &settings), kBadArgument);
@@ -172,7 +173,7 @@ TEST_F(AIFFExporter, EachInstanceHasItsOwnSound) {
   EXPECT_EQ(Settings(), SettingsOf("twos", 44100u << 16, 16, 2));
 }
 
-TEST_F(AIFFExporter, RefusesNullAndWhatIsNotOpen) {
+TEST_F(AIFFExporter, RefusesNullAndClosedInstances) {
   EXPECT_EQ(Set(Handle{nullptr}), kBadArgument);
   EXPECT_EQ(MovieExportGetSettingsAsAtomContainer(mExporter, nullptr), kBadArgument);
   const Handle purged = BlockOf(Sound("twos"));
@@ -187,7 +188,7 @@ TEST_F(AIFFExporter, RefusesNullAndWhatIsNotOpen) {
   EXPECT_EQ(settings, nullptr);
 }
 
-// The settings of one sound, byte for byte as the format is published.
+// The settings of one sound, byte for byte in the published format.
 TEST_F(AIFFExporter, WritesTheSettingsInTheirPublishedForm) {
   ASSERT_EQ(Set(Sound("sowt", 24, 6, 0xBB808000)), noErr);
   Handle settings = nullptr;

@@ -1,3 +1,4 @@
+// Finding components, and opening and closing instances.
 #include <QuickTime/QuickTime.h>
 #include <gtest/gtest.h>
 
@@ -32,7 +33,7 @@ TEST(Components, AZeroInTheDescriptionStandsForAnyCode) {
   EXPECT_EQ(Find({}), Exporter());
 }
 
-TEST(Components, AnotherCodeIsNoComponents) {
+TEST(Components, AnUnknownCodeFindsNoComponent) {
   EXPECT_EQ(Find({kOther, kAIFF, kSoun, 0, 0}), nullptr);
   EXPECT_EQ(Find({kSpit, kOther, kSoun, 0, 0}), nullptr);
   EXPECT_EQ(Find({kSpit, kAIFF, kOther, 0, 0}), nullptr);
@@ -48,7 +49,7 @@ TEST(Components, ThereIsOneExporter) {
   EXPECT_EQ(FindNextComponent(Exporter(), &looking), nullptr);
 }
 
-TEST(Components, NothingIsFoundForNullOrBehindWhatIsNoComponent) {
+TEST(Components, NothingIsFoundForNullOrAfterANonComponent) {
   ComponentDescription looking{};
   EXPECT_EQ(FindNextComponent(nullptr, nullptr), nullptr);
   EXPECT_EQ(FindNextComponent(reinterpret_cast<Component>(&looking), &looking), nullptr);
@@ -64,7 +65,7 @@ TEST(Components, TheInformationIsTheDescription) {
   EXPECT_EQ(description.componentFlagsMask, 0u);
 }
 
-TEST(Components, ThereIsNoInformationWithoutAComponentOrAPlaceForIt) {
+TEST(Components, ThereIsNoInformationWithoutAComponentOrABuffer) {
   ComponentDescription description{};
   EXPECT_EQ(GetComponentInfo(nullptr, &description, nullptr, nullptr, nullptr), -50);
   EXPECT_EQ(GetComponentInfo(Exporter(), nullptr, nullptr, nullptr, nullptr), -50);
@@ -94,7 +95,7 @@ TEST(Components, AnInstanceIsOpenUntilItIsClosed) {
   EXPECT_EQ(OpenInstances(), before);
 }
 
-TEST(Components, WhatIsNoComponentIsNotOpened) {
+TEST(Components, ANonComponentIsNotOpened) {
   const auto before = OpenInstances();
   ComponentDescription other{};
   ComponentInstance instance = reinterpret_cast<ComponentInstance>(&other);
@@ -105,7 +106,7 @@ TEST(Components, WhatIsNoComponentIsNotOpened) {
   EXPECT_EQ(OpenInstances(), before);
 }
 
-TEST(Components, WhatIsNotOpenIsNotClosed) {
+TEST(Components, AClosedInstanceIsNotClosedAgain) {
   ComponentInstance instance = nullptr;
   ASSERT_EQ(OpenAComponent(Exporter(), &instance), noErr);
   ASSERT_EQ(CloseComponent(instance), noErr);

@@ -1,4 +1,4 @@
-// An open exporter and sounds to describe to it.
+// An open exporter, and descriptions of sounds for it.
 #pragma once
 
 #include <QuickTime/QuickTime.h>
@@ -9,7 +9,7 @@
 
 namespace tallowmere::quicktime::test {
 
-// "twos" as the number that it is.
+// Returns "twos" and the like as a number.
 inline OSType CodeOf(std::string_view text) {
   OSType code = 0;
   for (const char c : text) code = code * 256 + static_cast<unsigned char>(c);
@@ -27,7 +27,7 @@ inline SoundDescription Sound(std::string_view format, SInt16 sampleSize = 16, S
   return sound;
 }
 
-// A block with the description, the caller's.
+// Returns a new block with the description. The caller disposes of it.
 inline Handle BlockOf(const SoundDescription& sound) {
   const Handle block = NewHandleClear(sizeof sound);
   std::memcpy(*block, &sound, sizeof sound);

@@ -1,3 +1,4 @@
+// Handles: blocks of memory, their sizes and their lifetimes.
 #include <QuickTime/QuickTime.h>
 #include <gtest/gtest.h>
 
@@ -15,7 +16,7 @@ using tallowmere::test::LiveHandles;
 using tallowmere::test::NewHandleWith;
 
 TEST(Handles, ANewBlockIsZeroAndHasItsSize) {
-  // What was in memory before is no zeros.
+  // Leaves nonzero bytes in freed memory.
   const Handle before = NewHandleClear(36);
   std::memset(*before, 0xFF, 36);
   DisposeHandle(before);
@@ -69,7 +70,7 @@ TEST(Handles, AmongThousandsEachBlockIsItsOwnAndStaysWhereItIs) {
   EXPECT_EQ(LiveHandles(), before);
 }
 
-TEST(Handles, APointerBesideABlocksIsNoHandle) {
+TEST(Handles, ANeighbouringPointerIsNoHandle) {
   const Handle handle = NewHandleClear(1);
   const auto before = LiveHandles();
   for (const int away : {-1, 1, 2}) {
@@ -88,7 +89,7 @@ TEST(Handles, ABlockIsAliveUntilItIsDisposedOf) {
   EXPECT_EQ(LiveHandles(), before);
 }
 
-TEST(Handles, NoBlockHasNoSizeAndIsNotDisposedOf) {
+TEST(Handles, AnInvalidHandleHasNoSizeAndIsNotDisposedOf) {
   const auto before = LiveHandles();
   char bytes[] = "no block";
   char* pointer = bytes;
@@ -99,7 +100,7 @@ TEST(Handles, NoBlockHasNoSizeAndIsNotDisposedOf) {
   EXPECT_EQ(LiveHandles(), before);
 }
 
-TEST(Handles, ABlockThatIsGoneHasNoSizeAndIsNotDisposedOfAgain) {
+TEST(Handles, ADisposedBlockHasNoSizeAndIsNotDisposedOfAgain) {
   const Handle handle = NewHandleClear(8);
   DisposeHandle(handle);
   EXPECT_EQ(GetHandleSize(handle), 0);
@@ -110,7 +111,7 @@ TEST(Handles, ThereIsNoBlockOfASizeBelow0OrBeyondAllMemory) {
   const auto before = LiveHandles();
   EXPECT_EQ(NewHandleClear(-1), nullptr);
   EXPECT_EQ(NewHandleClear(std::numeric_limits<Size>::min()), nullptr);
-#ifndef __SANITIZE_ADDRESS__  // which ends the process instead
+#ifndef __SANITIZE_ADDRESS__  // ends the process instead
   EXPECT_EQ(NewHandleClear(std::numeric_limits<Size>::max()), nullptr);
 #endif
   EXPECT_EQ(LiveHandles(), before);
@@ -120,7 +121,7 @@ TEST(Handles, AnEmptiedPointerDoesNotKeepABlockFromBeingFreed) {
   const Handle handle = NewHandleClear(16);
   *handle = nullptr;
   EXPECT_EQ(GetHandleSize(handle), 16);
-  DisposeHandle(handle);  // the leak check tells
+  DisposeHandle(handle);  // a leak would show in the leak check
 }
 
 TEST(Handles, ABlockIsMadeOfBytes) {

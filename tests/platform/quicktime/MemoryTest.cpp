@@ -1,4 +1,4 @@
-// What is left when memory runs out at any point.
+// What remains when memory runs out at any point.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -19,11 +19,11 @@ using tallowmere::test::OpenInstances;
 
 class Memory : public WithExporter {};
 
-// Enough for the table to grow on the way, more than once.
+// Enough to make the table grow more than once.
 constexpr int kMany = 100;
 
 TEST_F(Memory, WithoutItThereIsNoBlock) {
-  DisposeHandle(NewHandleClear(1));  // the table of blocks has its first memory
+  DisposeHandle(NewHandleClear(1));  // allocates the table of blocks
   std::vector<Handle> made;
   long most = 0;
   for (int i = 0; i < kMany; ++i) {
@@ -94,7 +94,7 @@ TEST_F(Memory, WithoutItThereAreNoSettings) {
   DisposeHandle(settings);
 }
 
-TEST_F(Memory, OfClosedInstancesAndDisposedBlocksIsGivenBack) {
+TEST_F(Memory, OfClosedInstancesAndDisposedBlocksIsFreed) {
   const auto once = [] {
     ComponentDescription looking{};
     ComponentInstance instance = nullptr;

@@ -1,4 +1,4 @@
-// The text of the table of mounts.
+// Parsing the text of the mount table.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/sysmacros.h>

@@ -1,4 +1,4 @@
-// Which mounts make a volume, and which are reachable.
+// Which mounts make up a volume, and which can be reached.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -12,7 +12,7 @@ namespace {
 using testing::ElementsAre;
 using testing::SizeIs;
 
-// The lowest mount at "/".
+// Returns the id of the lowest mount at "/".
 int RootIDOf(const std::vector<Mount>& mounts) {
   for (const Mount& mount : mounts) {
     if (mount.mountPoint == "/") return mount.id;
@@ -26,7 +26,8 @@ std::vector<std::vector<std::size_t>> GroupIntoVolumes(
   return MountTree(mounts, rootID).GroupIntoVolumes(isFolder);
 }
 
-// The mount points of the volumes' places. Every mount but a path that ends in "file" is a folder.
+// Returns the mount points of the volumes' places. Mounts at a path that ends in "file" are files,
+// all others are folders.
 std::vector<std::string> PlacesIn(std::string_view table) {
   const std::vector<Mount> mounts = ParseMountInfo(table);
   std::vector<std::string> places;
@@ -80,14 +81,14 @@ TEST(MountTree, BtrfsSubvolumesOfOneFileSystemAreOneVolume) {
               ElementsAre("/", "/boot"));
 }
 
-TEST(MountTree, TheFileSystemsRootFolderIsThePlaceBeforeAnEarlierMountOfAFolder) {
+TEST(MountTree, TheFileSystemsRootFolderIsThePlaceDespiteAnEarlierMountOfAFolder) {
   EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
                        "40 25 0:22 /@home /home rw - btrfs /dev/sda2 rw\n"
                        "41 25 0:22 / /mnt/all rw - btrfs /dev/sda2 rw\n"),
               ElementsAre("/", "/mnt/all"));
 }
 
-TEST(MountTree, TheRootIsThePlaceOfItsVolumeBeforeTheFileSystemsRootFolder) {
+TEST(MountTree, TheRootIsThePlaceOfItsVolumeDespiteTheFileSystemsRootFolder) {
   EXPECT_THAT(PlacesIn("20 25 0:30 / /early rw - tmpfs none rw\n"
                        "25 1 8:1 /@ / rw - btrfs /dev/sda1 rw\n"
                        "41 25 8:1 / /mnt/toplevel rw - btrfs /dev/sda1 rw\n"),
@@ -122,7 +123,7 @@ TEST(MountTree, OnlyMountsOfInnerFoldersAreAskedWhetherTheyAreFolders) {
   EXPECT_THAT(asked, ElementsAre("/bound"));
 }
 
-TEST(MountTree, OfStackedMountsOnlyTheTopmostIsAVolume) {
+TEST(MountTree, OnlyTheTopmostOfStackedMountsIsAVolume) {
   const auto mounts = ParseMountInfo(
       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
       "26 25 0:40 / /mnt rw - tmpfs none rw\n"
@@ -150,7 +151,7 @@ TEST(MountTree, MountsOnACoveredMountAreHidden) {
               ElementsAre("/", "/mnt"));
 }
 
-TEST(MountTree, WhatIsMountedOverTheRootIsUnreachable) {
+TEST(MountTree, AMountOverTheRootIsUnreachable) {
   EXPECT_THAT(PlacesIn("25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
                        "26 25 0:40 / /mnt rw - tmpfs none rw\n"
                        "27 25 0:41 / / rw - tmpfs none rw\n"
@@ -159,7 +160,7 @@ TEST(MountTree, WhatIsMountedOverTheRootIsUnreachable) {
               ElementsAre("/", "/mnt", "/under"));
 }
 
-TEST(MountTree, OfTwoMountsAtOnePlaceTheLaterIsReached) {
+TEST(MountTree, TheLaterOfTwoMountsAtOnePlaceIsReached) {
   const auto mounts = ParseMountInfo(
       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"
       "26 25 0:40 / /mnt rw - tmpfs none rw\n"
@@ -168,7 +169,7 @@ TEST(MountTree, OfTwoMountsAtOnePlaceTheLaterIsReached) {
               ElementsAre(ElementsAre(0), ElementsAre(2)));
 }
 
-TEST(MountTree, NoFolderIsExaminedBehindAServer) {
+TEST(MountTree, NoFolderIsExaminedOnAServer) {
   std::vector<std::string> asked;
   const auto mounts = ParseMountInfo(
       "25 1 8:1 / / rw - ext4 /dev/sda1 rw\n"

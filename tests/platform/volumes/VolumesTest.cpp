@@ -1,4 +1,4 @@
-// Volumes as tables of mounts list them: recorded ones, and this machine's.
+// Volumes as mount tables list them: recorded tables, and this machine's.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <linux/fs.h>
@@ -25,14 +25,14 @@ namespace {
 
 using test::TemporaryFolder;
 
-// A file system of its own, mounted at the top or somewhere below.
+// Returns the line of a file system of its own, mounted at "/" or below.
 std::string Line(int id, const std::string& place) {
   const std::string number = std::to_string(id);
   const std::string parent = place == "/" ? " 1 " : " 27 ";
   return number + parent + "0:" + number + " / " + place + " rw - tmpfs none rw\n";
 }
 
-// A table of a recorded text, which changes when it is told to.
+// A mount table with recorded text, which a test can replace.
 class RecordedTable {
  public:
   explicit RecordedTable(const std::string& text, kernel::RootMount (*readRoot)() = RootInMount27)
@@ -86,7 +86,7 @@ TEST(TheTableOfVolumes, AMountIDBeyond16BitsGetsAFreeNegativeNumber) {
   EXPECT_EQ(numbers, before);
 }
 
-TEST(TheTableOfVolumes, ANumberThatIsTakenIsNotThatOfALaterMountWithThatID) {
+TEST(TheTableOfVolumes, ANumberInUseIsNotGivenToALaterMountWithThatID) {
   const std::string before = Line(27, "/") + Line(70000, "/mnt/a");
   RecordedTable table(before);
   const VolumeNumber taken = table.NumberAt(1);
@@ -109,7 +109,7 @@ TEST(TheTableOfVolumes, UnknownNumbersHaveNoVolume) {
   EXPECT_EQ(table.Count(), 2u);
 }
 
-TEST(TheTableOfVolumes, AVolumeIsCalledAsTheLastComponentOfItsMountPoint) {
+TEST(TheTableOfVolumes, AVolumeIsNamedAfterTheLastComponentOfItsMountPoint) {
   RecordedTable table(Line(27, "/") + Line(31, "/media/user/My\\040Disk") + Line(32, "/mnt/a:b"));
   EXPECT_EQ(table.NameAt(1), "My Disk");
   EXPECT_EQ(table.NameAt(2), "a/b");
@@ -122,7 +122,7 @@ TEST(TheTableOfVolumes, NamesOf63BytesStayWholeAndLongerOnesBecomeShort) {
   EXPECT_EQ(table.NameAt(2), std::string(29, 'n') + "#2");
 }
 
-TEST(TheTableOfVolumes, AVolumeIsFoundByItsNameTheFirstOfTwo) {
+TEST(TheTableOfVolumes, AVolumeNameFindsTheFirstOfTwo) {
   RecordedTable table(Line(27, "/") + Line(31, "/mnt/x:y") + Line(32, "/media/x:y"));
   const auto named = table->WithName("x/y");
   ASSERT_TRUE(named);
@@ -137,7 +137,7 @@ TEST(TheTableOfVolumes, ARootThatIsNoMountPointIsStillTheFirstVolume) {
   EXPECT_EQ(table.PlaceAt(1), "/mnt/a");
 }
 
-TEST(TheTableOfVolumes, WhereTheKernelTellsNoMountIDsTheLowestMountAtTheRootIsTheRoot) {
+TEST(TheTableOfVolumes, WithoutMountIDsTheLowestMountAtTheRootIsTheRoot) {
   const std::string text = Line(27, "/") + "40 27 0:40 / / rw - tmpfs none rw\n" + Line(41, "/mnt");
   RecordedTable table(text, RootWithoutID);
   ASSERT_EQ(table.Count(), 2u);
@@ -145,18 +145,18 @@ TEST(TheTableOfVolumes, WhereTheKernelTellsNoMountIDsTheLowestMountAtTheRootIsTh
   EXPECT_EQ(table.NumberAt(1), -41);
 }
 
-TEST(TheTableOfVolumes, WhereTheKernelTellsNoMountIDsAMountCanBeItsOwnParent) {
+TEST(TheTableOfVolumes, WithoutMountIDsAMountCanBeItsOwnParent) {
   RecordedTable table(Line(41, "/mnt") + "27 27 0:27 / / rw - rootfs none rw\n", RootWithoutID);
   EXPECT_EQ(table.NumberAt(0), -27);
 }
 
-TEST(TheTableOfVolumes, WhereTheKernelTellsNoMountIDsAndTheTableHasNoRootThereIsOneStill) {
+TEST(TheTableOfVolumes, WithoutMountIDsAndARootInTheTableThereIsARoot) {
   RecordedTable table(Line(41, "/mnt"), RootWithoutID);
   EXPECT_EQ(table.PlaceAt(0), "/");
   EXPECT_EQ(table.PlaceAt(1), "/mnt");
 }
 
-TEST(TheTableOfVolumes, AnInnerFolderMountedWhereNothingCanBeSeenIsNoVolume) {
+TEST(TheTableOfVolumes, AnInnerFolderMountedOutOfSightIsNoVolume) {
   RecordedTable table(Line(27, "/") + "31 27 0:31 /inner /nonexistent/place rw - tmpfs none rw\n");
   EXPECT_EQ(table.Count(), 1u);
 }
@@ -178,14 +178,15 @@ TEST(TheTableOfVolumes, WithNeitherTableNorMountIDTheRootStillHasANumber) {
   EXPECT_EQ(table.Now()->InOrder().at(0)->Number(), number);
 }
 
-TEST(TheTableOfVolumes, ATableThatCannotBeReadIsAsGoodAsNone) {
+TEST(TheTableOfVolumes, AnUnreadableTableCountsAsNone) {
   const TemporaryFolder folder;
-  VolumeTable table(kernel::MountTableFile(folder.Path()));  // a folder opens, but has no text
+  VolumeTable table(
+      kernel::MountTableFile(folder.Path()));  // opening a folder works, reading fails
   ASSERT_EQ(table.Now()->InOrder().size(), 1u);
   EXPECT_EQ(table.Now()->InOrder()[0]->MountPoint(), "/");
 }
 
-TEST(TheTableOfVolumes, AnItemWhoseMountIsNotToldIsOnTheVolumeOfItsDevice) {
+TEST(TheTableOfVolumes, AnItemWithAnUnknownMountIsOnTheVolumeOfItsDevice) {
   VolumeTable table;
   auto root = kernel::ReadItem(kernel::AtPath("/"));
   ASSERT_TRUE(root);
@@ -193,7 +194,7 @@ TEST(TheTableOfVolumes, AnItemWhoseMountIsNotToldIsOnTheVolumeOfItsDevice) {
   EXPECT_EQ(table.Now()->OfItem(*root, "/nonexistent"), table.Now()->WithNumber(0));
 }
 
-TEST(TheTableOfVolumes, AnItemWithNeitherMountNorDeviceOfTheTableIsOnTheVolumeThatItsPathIsWithin) {
+TEST(TheTableOfVolumes, AnItemWithAnUnknownMountAndDeviceIsOnTheVolumeOfItsPath) {
   RecordedTable table(Line(27, "/") + Line(31, "/mnt/a") +
                       "32 31 0:32 / /mnt/a/b rw - tmpfs none rw\n");
   kernel::Item item{};
@@ -203,7 +204,7 @@ TEST(TheTableOfVolumes, AnItemWithNeitherMountNorDeviceOfTheTableIsOnTheVolumeTh
   EXPECT_EQ(table->OfItem(item, "/mnt")->MountPoint(), "/");
 }
 
-TEST(TheTableOfVolumes, AMountForWhichNoNumberIsLeftIsNoVolume) {
+TEST(TheTableOfVolumes, AMountWithoutAFreeNumberIsNoVolume) {
   constexpr int kNumbers = 32768;
   std::string text = Line(27, "/");
   for (int id = 1; id <= kNumbers; ++id) {
@@ -214,7 +215,7 @@ TEST(TheTableOfVolumes, AMountForWhichNoNumberIsLeftIsNoVolume) {
   EXPECT_EQ(table->OfPath("/mnt/late"), table->WithNumber(0));
 }
 
-TEST(TheTableOfVolumes, AMountBelongsToItsVolumeAndThatOfAKernelInterfaceToNone) {
+TEST(TheTableOfVolumes, AMountBelongsToItsVolumeAndAKernelInterfaceToNone) {
   RecordedTable table(Line(27, "/") + Line(31, "/mnt/a") +
                       "32 27 0:31 /inner /mnt/b rw - tmpfs none rw\n"
                       "33 27 0:33 / /proc rw - proc none rw\n");
@@ -227,7 +228,7 @@ TEST(TheTableOfVolumes, AMountBelongsToItsVolumeAndThatOfAKernelInterfaceToNone)
   EXPECT_FALSE(table->HoldsMountPoint("/mnt/a"));
 }
 
-TEST(TheTableOfVolumes, AVolumeTellsEveryPlaceOfAnItem) {
+TEST(TheTableOfVolumes, AVolumeKnowsEveryPlaceOfAnItem) {
   RecordedTable table(Line(27, "/") + Line(31, "/mnt/a") +
                       "32 27 0:31 /inner /mnt/b rw - nfs none rw\n");
   const auto volume = table->WithMount(31);
@@ -239,7 +240,7 @@ TEST(TheTableOfVolumes, AVolumeTellsEveryPlaceOfAnItem) {
   EXPECT_THAT(volume->PathsOf("/mnt/b/x", 27), ElementsAre("/mnt/b/x"));
 }
 
-TEST(TheTableOfVolumes, IsReadAnewWhenSomethingWasMountedAndOnlyThen) {
+TEST(TheTableOfVolumes, IsRereadOnlyWhenSomethingWasMounted) {
   if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const TemporaryFolder folder;
   VolumeTable table;
@@ -253,7 +254,7 @@ TEST(TheTableOfVolumes, IsReadAnewWhenSomethingWasMountedAndOnlyThen) {
   const VolumesPointer after = table.Now();
   ASSERT_EQ(after->InOrder().size(), before->InOrder().size() + 1);
   EXPECT_EQ(after->InOrder().back()->MountPoint(), place);
-  // Who holds the former state still has it whole.
+  // Holders of the former state still have it whole.
   EXPECT_EQ(before->OfPath(place)->MountPoint(),
             after->OfPath(folder.Path().string())->MountPoint());
 }
@@ -278,7 +279,7 @@ TEST(AVolume, IsShownWhereAFolderOfItIsMountedAndNotWhereAFileIs) {
 
 // --- The name of the volume of "/" --------------------------------------------------------------
 
-// In a child process whose "/" is a folder.
+// Checks the volume's name in a child process whose root folder is `folder`.
 bool RootIsCalled(
     const std::string& name, const std::string& folder,
     const std::function<bool()>& prepare = [] { return true; }) {
@@ -308,7 +309,7 @@ TEST_F(TheLabelOfTheRoot, IsTheNameOfItsVolume) {
   EXPECT_TRUE(RootIsCalled("My/Disk/1", Root()));
 }
 
-TEST_F(TheLabelOfTheRoot, ThatMayNotBeAskedForOrCannotBeReadLeavesTheNameRoot) {
+TEST_F(TheLabelOfTheRoot, ThatCannotBeReadLeavesTheNameRoot) {
   for (const int error : {EPERM, EACCES, EIO}) {
     EXPECT_TRUE(RootIsCalled("Root", Root(), [error] {
       return test::RefuseIoctl(FS_IOC_GETFSLABEL, error);
@@ -316,7 +317,7 @@ TEST_F(TheLabelOfTheRoot, ThatMayNotBeAskedForOrCannotBeReadLeavesTheNameRoot) {
   }
 }
 
-TEST_F(TheLabelOfTheRoot, ThatIsNoneInThisKernelLeavesTheNameRoot) {
+TEST_F(TheLabelOfTheRoot, UnsupportedByTheKernelLeavesTheNameRoot) {
   for (const int error : {ENOTTY, EOPNOTSUPP, EINVAL, ENOSYS}) {
     EXPECT_TRUE(RootIsCalled("Root", Root(), [error] {
       return test::RefuseIoctl(FS_IOC_GETFSLABEL, error);
@@ -324,7 +325,7 @@ TEST_F(TheLabelOfTheRoot, ThatIsNoneInThisKernelLeavesTheNameRoot) {
   }
 }
 
-TEST_F(TheLabelOfTheRoot, ThatCannotBeAskedForWithoutDescriptorsIsNoName) {
+TEST_F(TheLabelOfTheRoot, UnreadableWithoutDescriptorsIsNoName) {
   EXPECT_TRUE(test::HoldsInChild([&] { return chroot(Root().c_str()) == 0 && chdir("/") == 0; },
                                  [] {
                                    VolumeTable table;
@@ -339,7 +340,7 @@ TEST_F(TheLabelOfTheRoot, ThatCannotBeAskedForWithoutDescriptorsIsNoName) {
                                  }));
 }
 
-// Memory for a root.
+// On a tmpfs as the root folder.
 TEST(AFileSystemWithoutLabels, IsCalledRootAtTheRoot) {
   if (!test::EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
   const TemporaryFolder folder;
