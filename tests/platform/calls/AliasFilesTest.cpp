@@ -1,10 +1,13 @@
 // Alias files: which files are ones, where they lead, and what the host's calls answer.
 #include <CoreServices/CoreServices.h>
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/mount.h>
+#include <sys/wait.h>
 #include <sys/xattr.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
@@ -18,6 +21,7 @@
 #include "support/FileSystemImage.h"
 #include "support/OldFormats.h"
 #include "support/OwnMountNamespace.h"
+#include "support/Pipe.h"
 #include "support/Privileges.h"
 #include "support/TemporaryFolder.h"
 
@@ -247,6 +251,64 @@ TEST_F(AliasFiles, OnAFileThatIsGoneFail) {
   FSRef item = before;
   EXPECT_EQ(FSResolveAliasFile(&item, true, nullptr, nullptr), fnfErr);
   EXPECT_EQ(std::memcmp(&item, &before, sizeof item), 0);
+}
+
+// --- Leases -------------------------------------------------------------------------------------
+
+// A process with a lease on a file, as file servers have: fcntl(2), F_SETLEASE. It gives the lease
+// back as soon as another process wants the file, or keeps it.
+class LeaseHolder {
+ public:
+  LeaseHolder(const std::string& file, bool givesBack) {
+    const auto [reading, writing] = MakePipe();
+    mChild = fork();
+    if (mChild == 0) Hold(file, givesBack, writing);
+    close(writing);
+    char byte = 0;
+    mHolds = read(reading, &byte, 1) == 1;
+    close(reading);
+  }
+  ~LeaseHolder() {
+    kill(mChild, SIGKILL);
+    waitpid(mChild, nullptr, 0);
+  }
+  LeaseHolder(const LeaseHolder&) = delete;
+  LeaseHolder& operator=(const LeaseHolder&) = delete;
+
+  bool Holds() const { return mHolds; }
+
+ private:
+  [[noreturn]] static void Hold(const std::string& path, bool givesBack, int ready) {
+    sigset_t wanted;  // told so by SIGIO
+    sigemptyset(&wanted);
+    sigaddset(&wanted, SIGIO);
+    sigprocmask(SIG_BLOCK, &wanted, nullptr);
+    const int file = open(path.c_str(), O_RDWR | O_CLOEXEC);
+    if (fcntl(file, F_SETLEASE, F_WRLCK) == 0 && write(ready, "", 1) == 1) {
+      int signal = 0;
+      sigwait(&wanted, &signal);
+      if (givesBack) fcntl(file, F_SETLEASE, F_UNLCK);
+      pause();
+    }
+    _exit(1);
+  }
+
+  pid_t mChild;
+  bool mHolds;
+};
+
+TEST_F(AliasFiles, UnderALeaseAreReadWhenItIsGivenBack) {
+  const std::string alias = MakeBookmark(Bookmark({"folder", "file"}));
+  const LeaseHolder server(alias, true);
+  if (!server.Holds()) GTEST_SKIP() << "no leases here";
+  EXPECT_EQ(Resolve(alias), (Outcome{mFile}));
+}
+
+TEST_F(AliasFiles, UnderALeaseThatIsKeptCannotBeRead) {
+  const std::string alias = MakeBookmark(Bookmark({"folder", "file"}));
+  const LeaseHolder server(alias, false);
+  if (!server.Holds()) GTEST_SKIP() << "no leases here";
+  EXPECT_EQ(Resolve(alias), Failed(ioErr, false));
 }
 
 // --- What it costs ------------------------------------------------------------------------------
