@@ -422,6 +422,22 @@ TEST_F(AliasStores, AppleDoubleInAFolder) {
   EXPECT_EQ(Resolve(mAlias), (Outcome{mFile}));
 }
 
+// A server's own folder: a link leads to what nobody keeps for this folder's files.
+TEST_F(AliasStores, AFolderOfAppleDoubleThatIsALinkIsNone) {
+  MakeFolder("elsewhere");
+  MakeFile("elsewhere/alias",
+           WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)}, {kResourceFork, mFork}}));
+  MakeLink(".AppleDouble", "elsewhere");
+  EXPECT_EQ(Resolve(mAlias), NoAlias(mAlias));
+}
+
+TEST_F(AliasStores, AttributesOfAnAFPServerAreNoAppleSingle) {
+  Set("user.org.netatalk.Metadata",
+      WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)}}, 0x00051600));
+  Set("user.org.netatalk.ResourceFork", mFork);
+  EXPECT_EQ(Resolve(mAlias), NoAlias(mAlias));
+}
+
 TEST_F(AliasStores, TheFirstThatHasFinderInformationCounts) {
   MakeFile("._alias",
            WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)}, {kResourceFork, mFork}}));
