@@ -858,6 +858,19 @@ TEST_F(PlacesOfBookmarks, AreOfTheFirstTable) {
   EXPECT_EQ(Resolve(MakeFile("alias", writer.File())), Failed(nsvErr)) << "tables are not merged";
 }
 
+TEST_F(PlacesOfBookmarks, NeedOneKindOnly) {
+  for (const std::uint64_t flags : {3U, 5U, 6U, 7U}) {
+    for (const char* const item : {"folder", "folder/file"}) {
+      const std::filesystem::path path = item;
+      EXPECT_EQ(Resolve(MakeBookmark({.components = {path.begin(), path.end()},
+                                      .volumeName = "Old Disk",
+                                      .flags = flags})),
+                Failed(fnfErr))
+          << item << ' ' << flags;
+    }
+  }
+}
+
 TEST_F(PlacesOfBookmarks, NeedAKind) {
   BookmarkWriter writer;
   const auto components = writer.Texts({"folder", "file"});
