@@ -219,6 +219,14 @@ std::vector<Way> WaysOf(const Bookmark& bookmark) {
            Components(all.begin() + static_cast<std::ptrdiff_t>(*first), all.end())}};
 }
 
+// Of several kinds none is certain.
+Kinds KindsOf(const BookmarkFlags& flags) {
+  const Kinds kinds = {.file = flags.Has(BookmarkFlags::kFile),
+                       .folder = flags.Has(BookmarkFlags::kFolder),
+                       .link = flags.Has(BookmarkFlags::kLink)};
+  return kinds.file + kinds.folder + kinds.link == 1 ? kinds : Kinds();
+}
+
 }  // namespace
 
 bool Kinds::Admit(const kernel::Item& item) const {
@@ -258,10 +266,7 @@ Target TargetOf(const AliasRecord& record) {
 
 Target TargetOf(const Bookmark& bookmark) {
   Target target;
-  const BookmarkFlags flags = bookmark.flags.value_or(BookmarkFlags());
-  target.kinds = {.file = flags.Has(BookmarkFlags::kFile),
-                  .folder = flags.Has(BookmarkFlags::kFolder),
-                  .link = flags.Has(BookmarkFlags::kLink)};
+  target.kinds = KindsOf(bookmark.flags.value_or(BookmarkFlags()));
   if (bookmark.volumeName && !bookmark.volumeName->empty()) {
     target.volumeNames = {text::TextOfFileName(*bookmark.volumeName)};
   }

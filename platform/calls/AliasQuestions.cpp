@@ -10,6 +10,7 @@
 #include "calls/Process.h"
 #include "calls/ResultCodes.h"
 #include "formats/Recognition.h"
+#include "foundation/ColonsAndSlashes.h"
 #include "foundation/PathText.h"
 #include "kernel/Contents.h"
 #include "stores/Stores.h"
@@ -121,6 +122,8 @@ Description Describe(const Bookmark& bookmark) {
   d.isFolder = bookmark.flags && bookmark.flags->Has(formats::BookmarkFlags::kFolder);
   d.volumeName = bookmark.volumeName.value_or("");
   d.volumeCreation = DateOf(bookmark.volumeCreation);
+  // What writers put where the file system has no date.
+  if (d.volumeCreation && d.volumeCreation->seconds == 0) d.volumeCreation.reset();
   d.mountPoint = bookmark.volumePath.value_or("");
   d.isOnDiskImage = bookmark.diskImageLevel.has_value();
   d.creation = DateOf(bookmark.targetCreation);
@@ -128,7 +131,9 @@ Description Describe(const Bookmark& bookmark) {
   if (!bookmark.components) return d;
   for (const std::string& name : *bookmark.components) d.posixPath.append("/").append(name);
   if (bookmark.components->empty()) d.posixPath = "/";
-  if (!bookmark.components->empty()) d.name = bookmark.components->back();
+  if (!bookmark.components->empty()) {
+    d.name = foundation::ExchangeColonsAndSlashes(bookmark.components->back());
+  }
   const auto& ids = bookmark.ids;
   const bool hasIDs = ids && ids->size() == bookmark.components->size() && !ids->empty();
   if (hasIDs && ids->back() > 0) d.id = static_cast<std::uint64_t>(ids->back());

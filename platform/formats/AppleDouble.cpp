@@ -15,6 +15,11 @@ constexpr std::size_t kCountAt = 24;
 constexpr std::size_t kEntriesAt = 26;
 constexpr std::size_t kEntrySize = 12;
 
+bool IsKnown(std::uint32_t id) {
+  return id == AppleDouble::kDataFork || id == AppleDouble::kResourceFork ||
+         id == AppleDouble::kRealName || id == AppleDouble::kFinderInfo;
+}
+
 }  // namespace
 
 const AppleDouble::Entry* AppleDouble::Find(std::uint32_t id) const {
@@ -41,7 +46,7 @@ std::optional<AppleDouble> ReadAppleDouble(std::string_view beginning, std::uint
     const AppleDouble::Entry entry{BigEndianIn<std::uint32_t>(*list, at),
                                    BigEndianIn<std::uint32_t>(*list, at + 4),
                                    BigEndianIn<std::uint32_t>(*list, at + 8)};
-    if (entry.length == 0) continue;
+    if (entry.length == 0 || !IsKnown(entry.id)) continue;
     if (entry.offset > size || entry.length > size - entry.offset) return std::nullopt;
     read.entries.push_back(entry);
   }

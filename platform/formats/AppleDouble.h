@@ -12,7 +12,8 @@
 namespace tallowmere::formats {
 
 struct AppleDouble {
-  // Entry ids. The Finder information has 32 bytes; systems append others to them.
+  // Entry ids; others are skipped. The Finder information has 32 bytes; systems append others to
+  // them.
   static constexpr std::uint32_t kDataFork = 1;
   static constexpr std::uint32_t kResourceFork = 2;
   static constexpr std::uint32_t kRealName = 3;
@@ -37,7 +38,7 @@ inline constexpr std::size_t kMostEntries = 300;
 inline constexpr std::size_t kLongestAppleDoubleHead = 26 + kMostEntries * 12;
 
 // The entries of a file of `size` bytes that begins with `beginning`. Nullopt for another magic
-// number or version, and when anything does not fit.
+// number or version, and when anything does not fit that is not skipped.
 std::optional<AppleDouble> ReadAppleDouble(std::string_view beginning, std::uint64_t size);
 
 }  // namespace tallowmere::formats

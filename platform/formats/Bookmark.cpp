@@ -16,6 +16,7 @@ constexpr std::uint32_t kVersion = 0x10040000;
 constexpr std::uint32_t kDataOfFileAt = 0x38;
 constexpr std::uint32_t kBareHead = 0x30;
 
+constexpr std::uint32_t kLevelOfTarget = 1;
 constexpr std::uint32_t kTableMagic = 0xFFFFFFFE;
 constexpr std::uint64_t kTableHead = 20;
 constexpr std::uint64_t kTableEntry = 12;
@@ -194,6 +195,7 @@ constexpr Key kKeys[] = {
 };
 
 struct Table {
+  std::uint32_t level;
   std::uint32_t next;  // offset; 0 for none
   std::string_view entries;
 };
@@ -201,12 +203,13 @@ struct Table {
 // The size that the table gives is not used: writers differ in how they count.
 std::optional<Table> ReadTable(std::string_view data, std::uint32_t offset) {
   const auto magic = LittleEndianAt<std::uint32_t>(data, std::uint64_t{offset} + 4);
+  const auto level = LittleEndianAt<std::uint32_t>(data, std::uint64_t{offset} + 8);
   const auto next = LittleEndianAt<std::uint32_t>(data, std::uint64_t{offset} + 12);
   const auto count = LittleEndianAt<std::uint32_t>(data, std::uint64_t{offset} + 16);
   if (!count || magic != kTableMagic) return std::nullopt;
   const auto entries = Piece(data, offset + kTableHead, *count * kTableEntry);
   if (!entries) return std::nullopt;
-  return Table{*next, *entries};
+  return Table{*level, *next, *entries};
 }
 
 bool ReadEntries(const Data& data, std::string_view entries, Bookmark& bookmark) {
@@ -229,7 +232,8 @@ std::optional<Bookmark> ReadData(std::string_view bytes) {
   const auto first = LittleEndianAt<std::uint32_t>(bytes, 0);
   const auto table = first ? ReadTable(bytes, *first) : std::nullopt;
   Bookmark bookmark;
-  if (!table || !ReadEntries(data, table->entries, bookmark)) return std::nullopt;
+  if (!table || table->level != kLevelOfTarget) return std::nullopt;
+  if (!ReadEntries(data, table->entries, bookmark)) return std::nullopt;
   std::unordered_set<std::uint32_t> met{*first};
   for (std::uint32_t next = table->next; next != 0;) {
     const auto other = met.insert(next).second ? ReadTable(bytes, next) : std::nullopt;

@@ -2,8 +2,8 @@
 // by those who read them. Little-endian, but for dates.
 //
 // Data with tables of contents, each a chain of keys and offsets of items. An item is length, type
-// and so many bytes. The first table is the target's; the others, each for one more volume on the
-// way to it, are checked and never used.
+// and so many bytes. The first table, of level 1, is the target's; the others, each for one more
+// volume on the way to it, are checked and never used.
 #pragma once
 
 #include <cstdint>

@@ -8,6 +8,8 @@
 
 #include <array>
 #include <cerrno>
+#include <chrono>
+#include <thread>
 
 namespace tallowmere::kernel {
 namespace {
@@ -15,12 +17,26 @@ namespace {
 // What is there by now may be a device or a pipe, which must not make the process wait.
 constexpr int kReading = O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
 
-Result<Descriptor> Open(const Spot& spot) {
+// How often to try again while another process has a lease on the file. The first try asks for it,
+// and servers give it back at once: fcntl(2), "Leases".
+constexpr int kMostTries = 100;
+constexpr std::chrono::milliseconds kBetweenTries{10};
+
+Result<Descriptor> TryToOpen(const Spot& spot) {
   int file = openat(spot.folder, spot.name, kReading | O_NOATIME);
   // Only the owner may: open(2).
   if (file < 0 && errno == EPERM) file = openat(spot.folder, spot.name, kReading);
   if (file < 0) return Error::OfLastCall();
   return Descriptor(file);
+}
+
+Result<Descriptor> Open(const Spot& spot) {
+  auto file = TryToOpen(spot);
+  for (int tries = 0; !file && file.Error().number == EWOULDBLOCK && tries < kMostTries; ++tries) {
+    std::this_thread::sleep_for(kBetweenTries);
+    file = TryToOpen(spot);
+  }
+  return file;
 }
 
 }  // namespace

@@ -12,7 +12,8 @@
 
 namespace tallowmere::kernel {
 
-// Opens the file of a spot for reading. ENOENT when there is something else than a regular file.
+// Opens the file of a spot for reading. ENOENT when there is something else than a regular file;
+// EWOULDBLOCK when another process has a lease on it and keeps it for more than a second.
 Result<Descriptor> OpenFile(const Spot& spot);
 
 // The same for a file that was seen there. ENOENT when it is another one by now.

@@ -9,6 +9,7 @@
 #include "formats/AppleDouble.h"
 #include "formats/Bytes.h"
 #include "kernel/Contents.h"
+#include "kernel/Paths.h"
 
 namespace tallowmere::stores {
 namespace {
@@ -67,7 +68,8 @@ std::string FinderInfoInStream(std::string_view stream) {
 
 std::string FinderInfoInHeader(const std::string& bytes) {
   const auto header = formats::ReadAppleDouble(bytes, bytes.size());
-  const auto* const entry = header ? header->Find(AppleDouble::kFinderInfo) : nullptr;
+  const auto* const entry =
+      header && !header->isSingle ? header->Find(AppleDouble::kFinderInfo) : nullptr;
   if (entry == nullptr) return {};
   return FinderInfoIn(formats::Piece(bytes, entry->offset, entry->length).value_or(""));
 }
@@ -85,17 +87,27 @@ Content EntryIn(const kernel::Descriptor& file, std::uint32_t id, std::size_t mo
                            static_cast<std::size_t>(std::min<std::uint64_t>(entry->length, most)));
 }
 
-Content EntryBeside(const catalog::Look& file, const char* prefix, std::uint32_t id,
-                    std::size_t most) {
-  const std::string name = std::string(prefix) + file.Name();
-  const auto sidecar = kernel::OpenFile(file.Folder().SpotOf(name.c_str()));
-  if (sidecar) return EntryIn(*sidecar, id, most);
-  const kernel::Error error = sidecar.Error();
+// Of an AppleDouble file that is not there, or does not open.
+Content Without(kernel::Error error) {
   const bool isMissing = kernel::MeansGone(error) || error.number == ENAMETOOLONG;
   return isMissing ? Content(std::string()) : error;
 }
 
-constexpr std::array kSidecars = {"._", ".AppleDouble/"};
+Content EntryAt(const kernel::Spot& sidecar, std::uint32_t id, std::size_t most) {
+  const auto opened = kernel::OpenFile(sidecar);
+  return opened ? EntryIn(*opened, id, most) : Without(opened.Error());
+}
+
+Content EntryBeside(const catalog::Look& file, std::uint32_t id, std::size_t most) {
+  const std::string name = std::string("._") + file.Name();
+  return EntryAt(file.Folder().SpotOf(name.c_str()), id, most);
+}
+
+// A link in place of the folder would lead to other files' entries.
+Content EntryInFolder(const catalog::Look& file, std::uint32_t id, std::size_t most) {
+  const auto folder = kernel::HoldFolderIn(file.Folder().SpotOf(".AppleDouble"));
+  return folder ? EntryAt({folder->Get(), file.Name()}, id, most) : Without(folder.Error());
+}
 
 // --- In their order -----------------------------------------------------------------------------
 
@@ -137,8 +149,8 @@ Content FirstOf(const Attribute (&attributes)[count], std::uint32_t entry, std::
     std::string taken = attribute.take(*value);
     if (!taken.empty()) return taken;
   }
-  for (const char* const prefix : kSidecars) {
-    auto content = EntryBeside(file, prefix, entry, most);
+  for (const auto& entryOf : {EntryBeside, EntryInFolder}) {
+    auto content = entryOf(file, entry, most);
     if (!content) return content;
     const bool isThere =
         entry == AppleDouble::kFinderInfo ? !FinderInfoIn(*content).empty() : !content->empty();

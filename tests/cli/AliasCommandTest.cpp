@@ -100,6 +100,27 @@ TEST(AliasCommand, TellsContainersApartByTheirContent) {
   EXPECT_FALSE(bare.contains("container"));
 }
 
+TEST(AliasCommand, ShowsTheNameInABookmarkInHFSForm) {
+  const auto bookmark = Write(BookmarkToWrite{.components = {"a", "b:c"}, .volumeName = "V"});
+  const TemporaryFolder folder;
+  const json shown = JsonOf(folder.MakeFile("x", bookmark.Bare()));
+  EXPECT_EQ(shown["name"], "b/c");
+  EXPECT_EQ(shown["posix_path"], "/a/b:c");
+}
+
+// What writers put where the file system has no date: 1970-01-01 0:00, in seconds since 2001.
+TEST(AliasCommand, ShowsNoDateOfAVolumeThatHasNone) {
+  const TemporaryFolder folder;
+  const auto shownOf = [&](std::uint64_t bits) {
+    BookmarkWriter writer;
+    const auto date = writer.Add(0x0400, Big(bits, 8));
+    writer.AddTable(1, {{0x2013, date}});
+    return JsonOf(folder.MakeFile("x", writer.Bare()));
+  };
+  EXPECT_FALSE(shownOf(0xC1CD27E440000000).contains("volume_created"));
+  EXPECT_EQ(shownOf(0xC1CD27E43F800000)["volume_created"], "1970-01-01T00:00:01Z");
+}
+
 TEST(AliasCommand, ReadsTheRecordBesideABrokenBookmark) {
   const TemporaryFolder folder;
   const std::string bookmark =

@@ -1,10 +1,13 @@
 // Alias files: which files are ones, where they lead, and what the host's calls answer.
 #include <CoreServices/CoreServices.h>
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/mount.h>
+#include <sys/wait.h>
 #include <sys/xattr.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
@@ -18,6 +21,7 @@
 #include "support/FileSystemImage.h"
 #include "support/OldFormats.h"
 #include "support/OwnMountNamespace.h"
+#include "support/Pipe.h"
 #include "support/Privileges.h"
 #include "support/TemporaryFolder.h"
 
@@ -249,6 +253,64 @@ TEST_F(AliasFiles, OnAFileThatIsGoneFail) {
   EXPECT_EQ(std::memcmp(&item, &before, sizeof item), 0);
 }
 
+// --- Leases -------------------------------------------------------------------------------------
+
+// A process with a lease on a file, as file servers have: fcntl(2), F_SETLEASE. It gives the lease
+// back as soon as another process wants the file, or keeps it.
+class LeaseHolder {
+ public:
+  LeaseHolder(const std::string& file, bool givesBack) {
+    const auto [reading, writing] = MakePipe();
+    mChild = fork();
+    if (mChild == 0) Hold(file, givesBack, writing);
+    close(writing);
+    char byte = 0;
+    mHolds = read(reading, &byte, 1) == 1;
+    close(reading);
+  }
+  ~LeaseHolder() {
+    kill(mChild, SIGKILL);
+    waitpid(mChild, nullptr, 0);
+  }
+  LeaseHolder(const LeaseHolder&) = delete;
+  LeaseHolder& operator=(const LeaseHolder&) = delete;
+
+  bool Holds() const { return mHolds; }
+
+ private:
+  [[noreturn]] static void Hold(const std::string& path, bool givesBack, int ready) {
+    sigset_t wanted;  // told so by SIGIO
+    sigemptyset(&wanted);
+    sigaddset(&wanted, SIGIO);
+    sigprocmask(SIG_BLOCK, &wanted, nullptr);
+    const int file = open(path.c_str(), O_RDWR | O_CLOEXEC);
+    if (fcntl(file, F_SETLEASE, F_WRLCK) == 0 && write(ready, "", 1) == 1) {
+      int signal = 0;
+      sigwait(&wanted, &signal);
+      if (givesBack) fcntl(file, F_SETLEASE, F_UNLCK);
+      pause();
+    }
+    _exit(1);
+  }
+
+  pid_t mChild;
+  bool mHolds;
+};
+
+TEST_F(AliasFiles, UnderALeaseAreReadWhenItIsGivenBack) {
+  const std::string alias = MakeBookmark(Bookmark({"folder", "file"}));
+  const LeaseHolder server(alias, true);
+  if (!server.Holds()) GTEST_SKIP() << "no leases here";
+  EXPECT_EQ(Resolve(alias), (Outcome{mFile}));
+}
+
+TEST_F(AliasFiles, UnderALeaseThatIsKeptCannotBeRead) {
+  const std::string alias = MakeBookmark(Bookmark({"folder", "file"}));
+  const LeaseHolder server(alias, false);
+  if (!server.Holds()) GTEST_SKIP() << "no leases here";
+  EXPECT_EQ(Resolve(alias), Failed(ioErr, false));
+}
+
 // --- What it costs ------------------------------------------------------------------------------
 
 // The system calls of one resolution.
@@ -358,6 +420,22 @@ TEST_F(AliasStores, AppleDoubleInAFolder) {
   MakeFile(".AppleDouble/alias",
            WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)}, {kResourceFork, mFork}}));
   EXPECT_EQ(Resolve(mAlias), (Outcome{mFile}));
+}
+
+// A server's own folder: a link leads to what nobody keeps for this folder's files.
+TEST_F(AliasStores, AFolderOfAppleDoubleThatIsALinkIsNone) {
+  MakeFolder("elsewhere");
+  MakeFile("elsewhere/alias",
+           WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)}, {kResourceFork, mFork}}));
+  MakeLink(".AppleDouble", "elsewhere");
+  EXPECT_EQ(Resolve(mAlias), NoAlias(mAlias));
+}
+
+TEST_F(AliasStores, AttributesOfAnAFPServerAreNoAppleSingle) {
+  Set("user.org.netatalk.Metadata",
+      WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)}}, 0x00051600));
+  Set("user.org.netatalk.ResourceFork", mFork);
+  EXPECT_EQ(Resolve(mAlias), NoAlias(mAlias));
 }
 
 TEST_F(AliasStores, TheFirstThatHasFinderInformationCounts) {
@@ -778,6 +856,19 @@ TEST_F(PlacesOfBookmarks, AreOfTheFirstTable) {
   EXPECT_EQ(Resolve(MakeFile("alias", writer.File())), (Outcome{mFile}));
   writer.AddTable(1, {{0x1004, components}, {0x1010, flags}}, second);
   EXPECT_EQ(Resolve(MakeFile("alias", writer.File())), Failed(nsvErr)) << "tables are not merged";
+}
+
+TEST_F(PlacesOfBookmarks, NeedOneKindOnly) {
+  for (const std::uint64_t flags : {3U, 5U, 6U, 7U}) {
+    for (const char* const item : {"folder", "folder/file"}) {
+      const std::filesystem::path path = item;
+      EXPECT_EQ(Resolve(MakeBookmark({.components = {path.begin(), path.end()},
+                                      .volumeName = "Old Disk",
+                                      .flags = flags})),
+                Failed(fnfErr))
+          << item << ' ' << flags;
+    }
+  }
 }
 
 TEST_F(PlacesOfBookmarks, NeedAKind) {

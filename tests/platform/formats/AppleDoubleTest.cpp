@@ -39,6 +39,16 @@ TEST(AppleDouble, PassesOverWhatIsEmptyOrUnknown) {
   EXPECT_EQ(read->Find(AppleDouble::kResourceFork)->length, 4u);
 }
 
+TEST(AppleDouble, PassesOverAnUnknownEntryOutside) {
+  for (const std::uint32_t unknown : {8U, 15U, 0x80000001U, 0xFFFFFFFFU}) {
+    const std::string bytes = WriteAppleDouble({{unknown, "x"}, {2, "fork"}});
+    const auto read = Read(Changed(bytes, 30, Big(0xFFFFFFFF, 4)));
+    ASSERT_TRUE(read) << unknown;
+    EXPECT_NE(read->Find(AppleDouble::kResourceFork), nullptr);
+    EXPECT_EQ(read->Find(unknown), nullptr);
+  }
+}
+
 TEST(AppleDouble, IsToldByItsMagicNumberAndVersion) {
   const std::string bytes = WriteAppleDouble({{2, "fork"}});
   EXPECT_FALSE(Read(Changed(bytes, 0, Big(0x00051608, 4))));
@@ -53,7 +63,11 @@ TEST(AppleDouble, CutAnywhereIsBroken) {
   }
 }
 
-TEST(AppleDouble, WithAnEntryOutsideIsBroken) {
+TEST(AppleDouble, WithAKnownEntryOutsideIsBroken) {
+  for (const std::uint32_t id : {1U, 2U, 3U, 9U}) {
+    const std::string entry = WriteAppleDouble({{id, "x"}});
+    EXPECT_FALSE(Read(Changed(entry, 30, Big(0xFFFFFFFF, 4)))) << id;
+  }
   const std::string bytes = WriteAppleDouble({{2, "fork"}});
   EXPECT_FALSE(Read(Changed(bytes, 30, Big(0xFFFFFFFF, 4))));
   EXPECT_FALSE(Read(Changed(bytes, 34, Big(0xFFFFFFFF, 4))));

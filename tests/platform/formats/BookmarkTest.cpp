@@ -83,6 +83,15 @@ TEST(BookmarkReading, NeverMergesTables) {
   EXPECT_FALSE(bookmark->volumeName);
 }
 
+TEST(BookmarkReading, WhoseFirstTableIsNotTheTargetsIsBroken) {
+  for (const std::uint32_t level : {0U, 2U, 0xF000U, 0xFFFFFFFFU}) {
+    BookmarkWriter writer;
+    const auto components = writer.Texts({"a"});
+    writer.AddTable(level, {{0x1004, components}});
+    EXPECT_FALSE(ReadBookmark(writer.Bare())) << level;
+  }
+}
+
 TEST(BookmarkReading, OfATableMetTwiceIsBroken) {
   BookmarkWriter writer;
   const auto second = writer.AddTable(2, {});
