@@ -32,8 +32,11 @@ void Put(Json& json, const std::string& key, std::string_view bytes) {
 }
 
 Finding Findings::Answer(std::string_view item, Outcome outcome, std::string text,
-                         const std::function<void(Json&)>& fill) const {
-  if (mFormat.isExistingOnly && outcome == Outcome::kNew) return Failure(item, {outcome, kIsNew});
+                         const std::function<void(Json&)>& fill,
+                         const std::function<void(Json&)>& fillFailure) const {
+  if (mFormat.isExistingOnly && outcome == Outcome::kNew) {
+    return Failure(item, {outcome, kIsNew}, fillFailure);
+  }
   if (mFormat.isJson) {
     Json json = Object(item, outcome);
     fill(json);

@@ -33,9 +33,11 @@ class Findings {
   Findings(const Format& format, std::string key) : mFormat(format), mKey(std::move(key)) {}
 
   // An answer: `text`, or in JSON what `fill` adds to the item's object. A new item fails where
-  // only those are wanted that exist, and a text with a newline where results end with one.
+  // only those are wanted that exist (`fillFailure` as for Failure), and a text with a newline
+  // where results end with one.
   Finding Answer(std::string_view item, Outcome outcome, std::string text,
-                 const std::function<void(Json&)>& fill) const;
+                 const std::function<void(Json&)>& fill,
+                 const std::function<void(Json&)>& fillFailure = {}) const;
 
   // That there is none: the reason is a complaint, or in JSON part of the item's object, with what
   // `fill` adds.

@@ -1,5 +1,5 @@
-// Where the volumes of another machine are here: mounted again under another number, or copied into
-// a folder.
+// Where the volumes of another machine are here, as a person tells it, and which of the mounted
+// ones their records are of.
 #pragma once
 
 #include <tallowmere/Client.h>
@@ -9,7 +9,6 @@
 #include <map>
 #include <optional>
 #include <string>
-#include <string_view>
 #include <vector>
 
 #include "cli/OldRecords.h"
@@ -28,6 +27,13 @@ struct OldPlace {
   std::string old;    // number or name, in UTF-8
   std::string place;  // mount point, name of a volume, or folder
 };
+
+// Nullopt for a text that is no OLD=PLACE.
+std::optional<OldPlace> ReadPlace(const std::string& text);
+
+// By what a record or HFS path names the volume: its name in Mac Roman. A text that is no such name
+// stays as it is.
+std::string KeyOfVolume(const std::string& old);
 
 // Reads a table. Fails at the first line that is none of it, and for what is told twice.
 Result<std::vector<OldPlace>> ReadTable(const std::string& file);
@@ -55,28 +61,5 @@ class OldNumbers {
   bool mIsTable = false;
   std::map<std::string, Result<Known>> mKnown;  // by number as text, or by name in Mac Roman
 };
-
-// The folders into which volumes were copied, by the names that those had.
-class CopiedVolumes {
- public:
-  // Fails for a map without '=' and for one whose place is no folder.
-  static Result<CopiedVolumes> Read(const OldPlaces& places);
-
-  // The item that an HFS path in Mac Roman names, where its volume was copied. Nullopt where it was
-  // not.
-  struct InCopy {
-    std::string folder;              // canonical
-    std::vector<std::string> names;  // on the way from it, in Mac Roman; none for the folder itself
-  };
-  std::optional<InCopy> Find(std::string_view hfsPath) const;
-
- private:
-  std::map<std::string, std::string> mFolders;  // by volume's name in Mac Roman
-};
-
-// The path of an item of a copy that exists. Each name is looked up as an HFS name, precomposed or
-// as the one entry whose HFS form is the same; links on the way are not followed, so that nothing
-// outside the copy is found. kInvalid for a way that climbs.
-Result<std::string> PathInCopy(const CopiedVolumes::InCopy& copy);
 
 }  // namespace tallowmere::cli

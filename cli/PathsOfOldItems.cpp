@@ -7,6 +7,7 @@
 
 #include "cli/Commands.h"
 #include "cli/Conversion.h"
+#include "cli/CopiedVolumes.h"
 #include "cli/Output.h"
 #include "cli/Records.h"
 
@@ -28,24 +29,23 @@ using Path = Conversion<std::string>;
 
 Finding FindingOf(const Findings& findings, const std::string& item, const Path& path,
                   const char* by) {
+  const auto tellMissing = [](Json& json) { json["exists"] = false; };
   if (!path) {
     const bool isMissing = path.Failure().outcome == Outcome::kNothing;
-    return findings.Failure(item, path.Failure(), [isMissing](Json& json) {
-      if (isMissing) json["exists"] = false;
-    });
+    return isMissing ? findings.Failure(item, path.Failure(), tellMissing)
+                     : findings.Failure(item, path.Failure());
   }
-  return findings.Answer(item, path->outcome, path->value, [&](Json& json) {
+  const auto fill = [&](Json& json) {
     Put(json, "path", path->value);
     json["exists"] = path->outcome == Outcome::kFound;
     json["by"] = by;
-  });
+  };
+  return findings.Answer(item, path->outcome, path->value, fill, tellMissing);
 }
 
 bool IsFound(const Path& path) {
   return path && path->outcome == Outcome::kFound;
 }
-
-// --- Records ---
 
 class RecordsToFind {
  public:
@@ -85,17 +85,6 @@ class RecordsToFind {
   const RecordOptions& mOptions;
 };
 
-// --- HFS paths ---
-
-Finding FindInCopy(const Findings& findings, const CopiedVolumes::InCopy& copy,
-                   const std::string& item) {
-  auto path = PathInCopy(copy);
-  if (path) {
-    return FindingOf(findings, item, Converted<std::string>{*path, Outcome::kFound}, kByMap);
-  }
-  return FindingOf(findings, item, path.Failure(), kByMap);
-}
-
 }  // namespace
 
 int PrintPathsOfRecords(const ItemsToAsk& items, const RecordOptions& options) {
@@ -124,8 +113,8 @@ int PrintPathsOfHFSPaths(const ItemsToAsk& items, const OldPlaces& places) {
     const auto hfsPath = HFSNameOfUtf8(item);
     if (!hfsPath) {
       finding = FindingOf(findings, item, Error{Outcome::kInvalid, kNotMacRoman}, kByPath);
-    } else if (const auto copy = copies->Find(*hfsPath)) {
-      finding = FindInCopy(findings, *copy, item);
+    } else if (const auto inCopy = copies->PathOfHFSPath(*hfsPath)) {
+      finding = FindingOf(findings, item, *inCopy, kByMap);
     } else {
       converter.PathOfHFSPath(
           *hfsPath, [&](const Path& path) { finding = FindingOf(findings, item, path, kByPath); });

@@ -63,6 +63,10 @@ std::string CheckPlace(const std::string& text) {
   return text.empty() ? "an empty text is no place" : "";
 }
 
+std::string CheckMap(const std::string& text) {
+  return ReadPlace(text) ? "" : '"' + text + "\" is no OLD-NAME=FOLDER";
+}
+
 // In bytes: 0 to 2^53, which every double holds.
 std::string CheckCount(const std::string& text) {
   constexpr double kMost = 9007199254740992;
@@ -320,6 +324,7 @@ void CommandLine::AddHFSPaths() {
   command
       ->add_option("--map", a.records.places.maps,
                    "The volume that was called so has been copied into a folder")
+      ->check(CheckMap)
       ->type_name("OLD-NAME=FOLDER")
       ->allow_extra_args(false);
   AddTable(command);

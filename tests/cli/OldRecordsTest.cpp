@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <tallowmere/Types.h>
+#include <unistd.h>
 
 #include <bit>
 #include <filesystem>
@@ -206,13 +207,71 @@ TEST_F(ACopiedDisk, HasTheItemsOfItsHFSPaths) {
 }
 
 TEST_F(ACopiedDisk, TellsWhatItLacks) {
-  const json missing = Posix("Old Disk:Folder \xC3\xA9:none");
-  EXPECT_EQ(missing["status"], "nothing");
-  EXPECT_EQ(missing["exists"], false);
-  EXPECT_EQ(StatusOf("Old Disk:no folder:none"), "nothing");
+  const std::string folder = mCopy / "Folder \xC3\xA9";
+  const json made = Posix("Old Disk:Folder \xC3\xA9:none");
+  EXPECT_EQ(made["status"], "new");
+  EXPECT_EQ(made["path"], folder + "/none");
+  EXPECT_EQ(made["exists"], false);
+  EXPECT_EQ(made["by"], "map");
+  const auto errorOf = [this](const std::string& hfsPath) {
+    const json missing = Posix(hfsPath);
+    EXPECT_EQ(missing["status"], "nothing");
+    EXPECT_EQ(missing["exists"], false);
+    return std::string(missing["error"]);
+  };
+  const std::string none = "there is no folder \"" + mCopy.string();
+  EXPECT_EQ(errorOf("Old Disk:no folder:none"), none + "/no folder\"");
+  EXPECT_EQ(errorOf("Old Disk:no folder:no other:none"), none + "/no folder\"");
+  EXPECT_EQ(errorOf("Old Disk:no folder:"), none + "/no folder\"");
+  EXPECT_EQ(errorOf("Old Disk:top:"), none + "/top\"");
+  EXPECT_EQ(errorOf("Old Disk:top:none"), none + "/top\"");
   // As names of Linux these are other files.
-  EXPECT_EQ(StatusOf("Old Disk:lost"), "nothing");
-  EXPECT_EQ(StatusOf("Old Disk:lost:item"), "nothing");
+  EXPECT_EQ(Posix("Old Disk:lost")["status"], "new");
+  EXPECT_EQ(Posix("Old Disk:lost:item")["status"], "nothing");
+}
+
+TEST_F(ACopiedDisk, RefusesWhatNoItemCanBeCalled) {
+  EXPECT_EQ(Posix("Old Disk:..")["error"], "no item has the HFS name \"..\"");
+  EXPECT_EQ(StatusOf("Old Disk:" + std::string(63, 'x')), "new");
+  const json tooLong = Posix("Old Disk:" + std::string(64, 'x'));
+  EXPECT_EQ(tooLong["status"], "invalid");
+  EXPECT_EQ(tooLong["error"], "no new item can keep the HFS name \"" + std::string(64, 'x') + "\"");
+  EXPECT_EQ(StatusOf("Old Disk:" + std::string(256, 'x')), "invalid");
+}
+
+TEST_F(ACopiedDisk, WithExistingHasNoNewItems) {
+  const Output output = Cli({"posix", "--existing", "--map", "Old Disk=" + mCopy.string(),
+                             "Old Disk:none", "Old Disk:top"});
+  EXPECT_EQ(output.status, 1);
+  EXPECT_EQ(output.text, "\n" + (mCopy / "top").string() + "\n");
+  const json made = json::parse(
+      Cli({"posix", "--existing", "--json", "--map", "Old Disk=" + mCopy.string(), "Old Disk:none"})
+          .text);
+  EXPECT_EQ(made["status"], "new");
+  EXPECT_EQ(made["exists"], false);
+  EXPECT_FALSE(made.contains("path"));
+}
+
+TEST_F(ACopiedDisk, ThatMayNotBeLookedAtIsRefused) {
+  if (geteuid() != 0) GTEST_SKIP() << "becoming another user is not permitted here";
+  std::filesystem::permissions(mFolder.Path(), std::filesystem::perms(0755));
+  std::filesystem::create_directories(mCopy / "closed");
+  std::ofstream(mCopy / "closed" / "file") << "x";
+  std::filesystem::permissions(mCopy / "closed", std::filesystem::perms(0700));
+  const auto statusOf = [this](const std::string& hfsPath) {
+    ChildProgram cli("/usr/bin/setpriv",
+                     {"--reuid=65534", "--regid=65534", "--clear-groups", TALLOWMERE_CLI, "posix",
+                      "--json", "--map", "Old Disk=" + mCopy.string(), hfsPath});
+    return std::string(json::parse(cli.ReadToEnd())["status"]);
+  };
+  EXPECT_EQ(statusOf("Old Disk:closed:file"), "refused");
+  EXPECT_EQ(statusOf("Old Disk:closed:\xC3\xA9"), "refused");
+  EXPECT_EQ(statusOf("Old Disk:closed:"), "found");
+  // To find a name as it is, a folder need not be read.
+  std::filesystem::permissions(mCopy / "closed", std::filesystem::perms(0711));
+  EXPECT_EQ(statusOf("Old Disk:closed:file"), "found");
+  EXPECT_EQ(statusOf("Old Disk:closed:none"), "new");
+  EXPECT_EQ(statusOf("Old Disk:closed:\xC3\xA9"), "refused");
 }
 
 TEST_F(ACopiedDisk, HasAccentedNamesInEitherForm) {
@@ -223,8 +282,19 @@ TEST_F(ACopiedDisk, HasAccentedNamesInEitherForm) {
   EXPECT_EQ(StatusOf("Old Disk:r\xC3\xA9sum\xC3\xA9"), "ambiguous");
 }
 
+// As a classic volume shows them that is mounted without a code page.
+TEST_F(ACopiedDisk, HasNamesInMacRomanBytes) {
+  std::ofstream(mCopy / "caf\x8E") << "x";
+  const json found = Posix("Old Disk:caf\xC3\xA9");
+  EXPECT_EQ(found["status"], "found");
+  EXPECT_TRUE(found["path_hex"].get<std::string>().ends_with("6361668e"));
+}
+
 TEST_F(ACopiedDisk, IsNotLeft) {
   EXPECT_EQ(StatusOf("Old Disk:out:outside"), "nothing");
+  EXPECT_EQ(Posix("Old Disk:out:outside")["error"],
+            "\"" + (mCopy / "out").string() + "\" is a link, which is not followed in a copy");
+  EXPECT_EQ(StatusOf("Old Disk:out"), "found");
   EXPECT_EQ(StatusOf("Old Disk::outside"), "invalid");
   EXPECT_EQ(StatusOf("Old Disk:Folder \xC3\xA9:::outside"), "invalid");
 }
@@ -243,11 +313,21 @@ TEST_F(ACopiedDisk, MayBeToldInATable) {
             (mCopy / "top").string() + "\n");
 }
 
+// The other lines may be of other disks, and for other commands.
+TEST_F(ACopiedDisk, ThatATableTellsWronglyFailsAlone) {
+  const std::string table = mFolder.Path() / "table";
+  std::ofstream(table) << "-3=Some Volume\nOld Disk=" << mCopy.string() << "\nGone=/nonexistent\n";
+  const Output output = Cli({"posix", "--volumes", table, "Gone:top", "Old Disk:top"});
+  EXPECT_EQ(output.text, "\n" + (mCopy / "top").string() + "\n");
+  EXPECT_EQ(output.errors, "tallowmere-cli: Gone:top: there is no folder \"/nonexistent\"\n");
+}
+
 TEST_F(ACopiedDisk, ThatIsNoFolderIsRefused) {
   EXPECT_THAT(Cli({"posix", "--map", "Old Disk=/nonexistent", "x:y"}).errors,
               HasSubstr("there is no folder \"/nonexistent\""));
-  EXPECT_THAT(Cli({"posix", "--map", "Old Disk", "x:y"}).errors,
-              HasSubstr("is no OLD-NAME=FOLDER"));
+  const Output noMap = Cli({"posix", "--map", "Old Disk", "x:y"});
+  EXPECT_THAT(noMap.errors, HasSubstr("\"Old Disk\" is no OLD-NAME=FOLDER"));
+  EXPECT_EQ(noMap.status, 2);
   EXPECT_THAT(Cli({"posix", "--map", "A=/", "--map", "A=/etc", "x:y"}).errors,
               HasSubstr("\"A\" has two places"));
 }
