@@ -12,8 +12,16 @@ namespace {
 constexpr const char* kHasNewline = "the answer has a newline; --json or --null-output prints it";
 constexpr const char* kIsNew = "there is no such file or folder, only a folder for it";
 
+// "record 3 at byte 140 of records.bin"
+std::string PlaceOf(const PackedRecord& record) {
+  return "record " + std::to_string(record.number) + " at byte " + std::to_string(record.byte) +
+         " of " + (record.file == "-" ? "standard input" : record.file);
+}
+
 // The message for a person, who has to see which item is meant.
-std::string Complaint(std::string_view item, const std::string& message) {
+std::string Complaint(const Asked& asked, const std::string& message) {
+  if (asked.packed != nullptr) return PlaceOf(*asked.packed) + ": " + message;
+  const std::string_view item = asked.text;
   if (item.empty()) return "\"\": " + message;
   const std::size_t quoted = message.find(std::string(item) + '"');
   const bool isNamed = quoted != std::string::npos && quoted > 0 &&
@@ -31,7 +39,7 @@ void Put(Json& json, const std::string& key, std::string_view bytes) {
   if (!isUtf8) json[key + "_hex"] = Hex(bytes);
 }
 
-Finding Findings::Answer(std::string_view item, Outcome outcome, std::string text,
+Finding Findings::Answer(const Asked& item, Outcome outcome, std::string text,
                          const std::function<void(Json&)>& fill,
                          const std::function<void(Json&)>& fillFailure) const {
   if (mFormat.isExistingOnly && outcome == Outcome::kNew) {
@@ -47,7 +55,7 @@ Finding Findings::Answer(std::string_view item, Outcome outcome, std::string tex
   return {outcome, false, std::move(text), {}};
 }
 
-Finding Findings::Failure(std::string_view item, const Error& error,
+Finding Findings::Failure(const Asked& item, const Error& error,
                           const std::function<void(Json&)>& fill) const {
   if (!mFormat.isJson) return {error.outcome, true, {}, Complaint(item, error.message)};
   Json json = Object(item, error.outcome);
@@ -56,9 +64,13 @@ Finding Findings::Failure(std::string_view item, const Error& error,
   return {error.outcome, true, json.dump(), {}};
 }
 
-Json Findings::Object(std::string_view item, Outcome outcome) const {
+Json Findings::Object(const Asked& item, Outcome outcome) const {
   Json json;
-  Put(json, mKey, item);
+  Put(json, mKey, item.text);
+  if (item.packed != nullptr) {
+    Put(json, "file", item.packed->file);
+    json["byte"] = item.packed->byte;
+  }
   json["status"] = Name(outcome);
   return json;
 }

@@ -10,6 +10,7 @@
 #include <utility>
 
 #include "cli/Format.h"
+#include "cli/OldRecords.h"
 
 namespace tallowmere::cli {
 
@@ -18,6 +19,16 @@ using Json = nlohmann::ordered_json;
 // Stores bytes under a key, as text. Where they are not UTF-8, the text has U+FFFD for each invalid
 // byte, and "KEY_hex" holds all bytes in hexadecimal.
 void Put(Json& json, const std::string& key, std::string_view bytes);
+
+// An item, as JSON and messages show it.
+struct Asked {
+  Asked(std::string_view given) : text(given) {}    // NOLINT(google-explicit-constructor)
+  Asked(const std::string& given) : text(given) {}  // NOLINT(google-explicit-constructor)
+  explicit Asked(const PackedRecord& record) : text(record.hex), packed(&record) {}
+
+  std::string_view text;
+  const PackedRecord* packed = nullptr;  // named by its place in the file
+};
 
 struct Finding {
   Outcome outcome{};
@@ -35,17 +46,17 @@ class Findings {
   // An answer: `text`, or in JSON what `fill` adds to the item's object. A new item fails where
   // only those are wanted that exist (`fillFailure` as for Failure), and a text with a newline
   // where results end with one.
-  Finding Answer(std::string_view item, Outcome outcome, std::string text,
+  Finding Answer(const Asked& item, Outcome outcome, std::string text,
                  const std::function<void(Json&)>& fill,
                  const std::function<void(Json&)>& fillFailure = {}) const;
 
   // That there is none: the reason is a complaint, or in JSON part of the item's object, with what
   // `fill` adds.
-  Finding Failure(std::string_view item, const Error& error,
+  Finding Failure(const Asked& item, const Error& error,
                   const std::function<void(Json&)>& fill = {}) const;
 
  private:
-  Json Object(std::string_view item, Outcome outcome) const;
+  Json Object(const Asked& item, Outcome outcome) const;
 
   Format mFormat;
   std::string mKey;

@@ -14,6 +14,10 @@
 namespace tallowmere::cli {
 namespace {
 
+std::string NameOfFile(const std::string& path) {
+  return path == "-" ? "standard input" : path;
+}
+
 // Fails with the reason of the system.
 Result<std::string> ReadAll(const std::string& path) {
   const int file =
@@ -28,7 +32,7 @@ Result<std::string> ReadAll(const std::string& path) {
   }
   const int error = errno;
   if (file >= 0) close(file);
-  if (got < 0) return Error{Outcome::kInvalid, path + ": " + std::strerror(error)};
+  if (got < 0) return Error{Outcome::kInvalid, NameOfFile(path) + ": " + std::strerror(error)};
   return bytes;
 }
 
@@ -38,38 +42,53 @@ std::string WhyNoRecords(std::size_t size, const RecordForm& form) {
   if (size < form.skip) return "it has fewer bytes than are to be skipped";
   const std::size_t left = (size - form.skip) % form.stride;
   if (left == 0 || left >= protocol::kFileSpecSize) return {};
-  return std::to_string(left) + " bytes at its end are no record of 70";
+  return "the " + std::to_string(left) + " bytes at its end are no record of 70";
+}
+
+// In the other byte order, it is above 24 bits.
+bool IsSmallID(std::int32_t id) {
+  constexpr std::uint32_t kAbove24Bits = 1U << 24;
+  return id != 0 && static_cast<std::uint32_t>(id) < kAbove24Bits;
 }
 
 }  // namespace
 
-Result<std::vector<std::string>> ReadPackedRecords(const std::vector<std::string>& files,
-                                                   const RecordForm& form) {
-  std::vector<std::string> records;
+Result<std::vector<PackedRecord>> ReadPackedRecords(const std::vector<std::string>& files,
+                                                    const RecordForm& form) {
+  std::vector<PackedRecord> records;
   for (const std::string& path : files) {
     const auto bytes = ReadAll(path);
     if (!bytes) return bytes.Failure();
     const std::string reason = WhyNoRecords(bytes->size(), form);
     if (!reason.empty()) {
-      return Error{Outcome::kInvalid, std::string(path).append(": ").append(reason)};
+      return Error{Outcome::kInvalid, NameOfFile(path).append(": ").append(reason)};
     }
+    std::size_t number = 0;
     for (std::size_t at = form.skip; at < bytes->size(); at += form.stride) {
-      records.push_back(Hex(std::string_view(*bytes).substr(at, protocol::kFileSpecSize)));
+      const auto record = std::string_view(*bytes).substr(at, protocol::kFileSpecSize);
+      records.push_back({Hex(record), path, ++number, at});
     }
   }
   return records;
 }
 
 std::optional<std::string> HintAtOtherOrder(const std::string& text, std::endian order,
-                                            bool isKnown) {
+                                            RecordVolume volume) {
   const auto bytes = ReadRecordBytes(text);
   const bool isBig = order == std::endian::big;
   const auto record = bytes ? DecodeFSSpec(*bytes, order) : std::nullopt;
   const auto other =
       bytes ? DecodeFSSpec(*bytes, isBig ? std::endian::little : std::endian::big) : std::nullopt;
-  if (!record || other->vRefNum >= 0 || (record->vRefNum <= 0 && isKnown)) return std::nullopt;
-  return "in the other byte order (--byte-order " + std::string(isBig ? "little" : "big") +
-         ") its volume would be " + std::to_string(other->vRefNum);
+  if (!record || !other) return std::nullopt;
+  const std::string inOther =
+      "in the other byte order (--byte-order " + std::string(isBig ? "little" : "big") + ") its ";
+  if (other->vRefNum < 0 && (record->vRefNum > 0 || volume == RecordVolume::kUnknown)) {
+    return inOther + "volume would be " + std::to_string(other->vRefNum);
+  }
+  if (volume == RecordVolume::kTold && IsSmallID(other->parID) && !IsSmallID(record->parID)) {
+    return inOther + "folder would be " + std::to_string(other->parID);
+  }
+  return std::nullopt;
 }
 
 }  // namespace tallowmere::cli

@@ -68,23 +68,25 @@ Result<OldNumbers> OldNumbers::Read(Client& client, const OldPlaces& places) {
   return numbers;
 }
 
+const Result<OldNumbers::Known>* OldNumbers::KnownOf(const FSSpec& record) const {
+  auto found = mKnown.find(std::to_string(record.vRefNum));
+  if (found == mKnown.end() && record.parID == kParentOfRoots) found = mKnown.find(record.name);
+  return found == mKnown.end() ? nullptr : &found->second;
+}
+
+bool OldNumbers::AreToldFor(const FSSpec& record) const {
+  return mAll || (mIsTable && KnownOf(record) != nullptr);
+}
+
 Result<FSSpec> OldNumbers::Here(FSSpec record) const {
-  if (!AreTold()) return record;
-  std::optional<Result<Known>> known;
-  if (mAll) {
-    known = *mAll;
-  } else {
-    auto found = mKnown.find(std::to_string(record.vRefNum));
-    if (found == mKnown.end() && record.parID == kParentOfRoots) found = mKnown.find(record.name);
-    if (found == mKnown.end()) {
-      return Error{Outcome::kNotAVolume,
-                   "the table has no volume " + std::to_string(record.vRefNum)};
-    }
-    known = found->second;
+  if (!mAll && !mIsTable) return record;
+  if (!AreToldFor(record)) {
+    return Error{Outcome::kNotAVolume, "the table has no volume " + std::to_string(record.vRefNum)};
   }
-  if (!*known) return known->Failure();
-  record.vRefNum = (*known)->number;
-  if (record.parID == kParentOfRoots) record.name = (*known)->name;
+  const Result<Known> known = mAll ? Result<Known>(*mAll) : *KnownOf(record);
+  if (!known) return known.Failure();
+  record.vRefNum = known->number;
+  if (record.parID == kParentOfRoots) record.name = known->name;
   return record;
 }
 

@@ -48,14 +48,17 @@ class OldNumbers {
   // number that the table lacks, or whose place is no volume's.
   Result<FSSpec> Here(FSSpec record) const;
 
-  // Whether volumes are told at all.
-  bool AreTold() const { return mAll || mIsTable; }
+  // Whether the volume of a record is told.
+  bool AreToldFor(const FSSpec& record) const;
 
  private:
   struct Known {
     std::int16_t number;
     std::string name;
   };
+
+  // Null where the table has none.
+  const Result<Known>* KnownOf(const FSSpec& record) const;
 
   std::optional<Known> mAll;
   bool mIsTable = false;

@@ -4,6 +4,7 @@
 #include <memory>
 #include <string>
 #include <utility>
+#include <vector>
 
 #include "cli/Commands.h"
 #include "cli/Conversion.h"
@@ -17,6 +18,7 @@ namespace {
 constexpr const char* kNoRecord =
     "a record is volume:parent:name, the name of at most 63 Mac Roman characters, or its 70 bytes "
     "in hexadecimal or base64";
+constexpr const char* kNoPackedRecord = "the length of its name is above 63";
 constexpr const char* kNotMacRoman = "it has a character that HFS names cannot have";
 
 // How an item was found; the values of "by" in JSON.
@@ -27,8 +29,7 @@ constexpr const char* kByMap = "map";
 
 using Path = Conversion<std::string>;
 
-Finding FindingOf(const Findings& findings, const std::string& item, const Path& path,
-                  const char* by) {
+Finding FindingOf(const Findings& findings, const Asked& item, const Path& path, const char* by) {
   const auto tellMissing = [](Json& json) { json["exists"] = false; };
   if (!path) {
     const bool isMissing = path.Failure().outcome == Outcome::kNothing;
@@ -49,40 +50,58 @@ bool IsFound(const Path& path) {
 
 class RecordsToFind {
  public:
-  RecordsToFind(const Findings& findings, const OldNumbers& numbers, const RecordOptions& options)
-      : mFindings(findings), mNumbers(numbers), mOptions(options) {}
+  // Items are records, or with `packed` the indices of records there.
+  RecordsToFind(const Findings& findings, const OldNumbers& numbers, const RecordOptions& options,
+                const std::vector<PackedRecord>* packed)
+      : mFindings(findings), mNumbers(numbers), mOptions(options), mPacked(packed) {}
 
   void Ask(Converter& converter, const std::string& item, Finding& finding) const {
-    const auto stored = ReadRecord(item, mOptions.form.order);
-    const auto record =
-        stored ? mNumbers.Here(*stored) : Result<FSSpec>(Error{Outcome::kInvalid, kNoRecord});
-    if (!record) return Tell(item, record.Failure(), kByID, finding);
+    const Asked asked = mPacked != nullptr ? Asked((*mPacked)[std::stoul(item)]) : Asked(item);
+    const auto stored = ReadRecord(asked.text, mOptions.form.order);
+    if (!stored) return Tell(asked, Error{Outcome::kInvalid, WhyNone(asked)}, finding);
+    const auto record = mNumbers.Here(*stored);
+    if (!record) return TellFailure(asked, *stored, record.Failure(), finding);
     const auto byID = std::make_shared<Path>(Error{});
-    converter.PathOf(*record, false, [this, byID, &item, &finding](Path path) {
+    converter.PathOf(*record, false, [this, byID, asked, stored = *stored, &finding](Path path) {
       *byID = std::move(path);
-      Tell(item, *byID, kByID, finding);
+      if (!*byID) return TellFailure(asked, stored, byID->Failure(), finding);
+      Tell(asked, *byID, finding);
     });
     if (!mOptions.searchOtherVolumes) return;
-    converter.PathOf(*record, true, [this, byID, &item, &finding](const Path& path) {
-      if (!IsFound(*byID) && IsFound(path)) Tell(item, path, kBySearch, finding);
+    converter.PathOf(*record, true, [this, byID, asked, &finding](const Path& path) {
+      if (!IsFound(*byID) && IsFound(path)) Tell(asked, path, finding, kBySearch);
     });
   }
 
  private:
-  void Tell(const std::string& item, Path path, const char* by, Finding& finding) const {
-    if (!path) {
-      Error error = path.Failure();
-      const bool isKnown = mNumbers.AreTold() || error.outcome != Outcome::kNotAVolume;
-      const auto hint = HintAtOtherOrder(item, mOptions.form.order, isKnown);
-      if (hint) error.message += "; " + *hint;
-      path = std::move(error);
-    }
-    finding = FindingOf(mFindings, item, path, by);
+  static const char* WhyNone(const Asked& asked) {
+    return asked.packed != nullptr ? kNoPackedRecord : kNoRecord;
+  }
+
+  void Tell(const Asked& asked, const Path& path, Finding& finding, const char* by = kByID) const {
+    finding = FindingOf(mFindings, asked, path, by);
+  }
+
+  void TellFailure(const Asked& asked, const FSSpec& stored, Error error, Finding& finding) const {
+    const auto hint = Hint(asked, stored, error.outcome);
+    if (hint) error.message += "; " + *hint;
+    Tell(asked, std::move(error), finding);
+  }
+
+  std::optional<std::string> Hint(const Asked& asked, const FSSpec& stored, Outcome outcome) const {
+    const bool isTold = mNumbers.AreToldFor(stored);
+    const bool isNoVolume = outcome == Outcome::kNotAVolume;
+    if (outcome != Outcome::kNothing && (!isNoVolume || isTold)) return std::nullopt;
+    const RecordVolume volume = isTold       ? RecordVolume::kTold
+                                : isNoVolume ? RecordVolume::kUnknown
+                                             : RecordVolume::kMounted;
+    return HintAtOtherOrder(std::string(asked.text), mOptions.form.order, volume);
   }
 
   const Findings& mFindings;
   const OldNumbers& mNumbers;
   const RecordOptions& mOptions;
+  const std::vector<PackedRecord>* mPacked;
 };
 
 }  // namespace
@@ -94,12 +113,15 @@ int PrintPathsOfRecords(const ItemsToAsk& items, const RecordOptions& options) {
   const auto numbers = OldNumbers::Read(client, options.places);
   if (!numbers) return Complain(numbers.Failure().message);
   ItemsToAsk records = items;
+  std::vector<PackedRecord> all;
   if (options.form.isPacked) {
     auto packed = ReadPackedRecords(items.items, options.form);
     if (!packed) return Complain(packed.Failure().message);
-    records.items = *std::move(packed);
+    all = *std::move(packed);
+    records.items.clear();
+    for (std::size_t i = 0; i < all.size(); ++i) records.items.push_back(std::to_string(i));
   }
-  const RecordsToFind toFind(findings, *numbers, options);
+  const RecordsToFind toFind(findings, *numbers, options, options.form.isPacked ? &all : nullptr);
   return Convert(records, [&](Converter& converter, const std::string& item, Finding& finding) {
     toFind.Ask(converter, item, finding);
   });

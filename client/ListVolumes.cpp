@@ -5,12 +5,26 @@
 
 #include "client/Mounts.h"
 #include "client/ParentIDs.h"
+#include "client/Places.h"
 #include "client/Quoted.h"
 
 namespace tallowmere {
 namespace {
 
 constexpr const char* kRoot = "/";
+
+// A volume whose name begins so is found by its path alone.
+bool IsCertainlyPath(std::string_view text) {
+  return text == "." || text == ".." || text.starts_with('/') || text.starts_with("./") ||
+         text.starts_with("../");
+}
+
+Result<Volume> VolumeCalled(Client& client, std::string_view text) {
+  const auto name = HFSNameOfUtf8(text);
+  if (!name) return Error{Outcome::kNotAVolume, "no volume is called " + Quoted(text)};
+  auto volumes = ListVolumes(client);
+  return volumes ? VolumeWithName(*volumes, *name) : volumes.Failure();
+}
 
 }  // namespace
 
@@ -44,7 +58,10 @@ Result<Volume> VolumeWithName(const std::vector<Volume>& volumes, std::string_vi
 
 Result<Volume> VolumeAt(Client& client, PathView mountPoint) {
   std::string path(mountPoint.Text());
-  auto record = client.RecordOf(mountPoint);
+  auto folder = Places(true).FindFolder(path);
+  if (!folder && folder.Failure().outcome == Outcome::kRefused) return folder.Failure();
+  if (folder) path = (*folder)->PathOrRoot();
+  auto record = client.RecordOf(path);
   if (!record) return record.Failure();
   FSSpec& root = record->value;
   if (record->outcome == Outcome::kFound && root.parID == kParentOfRoots) {
@@ -54,13 +71,16 @@ Result<Volume> VolumeAt(Client& client, PathView mountPoint) {
 }
 
 Result<Volume> FindVolume(Client& client, std::string_view mountPointOrName) {
-  if (mountPointOrName.starts_with('/')) return VolumeAt(client, mountPointOrName);
-  const auto name = HFSNameOfUtf8(mountPointOrName);
-  if (!name) {
-    return Error{Outcome::kNotAVolume, "no volume is called " + Quoted(mountPointOrName)};
-  }
-  auto volumes = ListVolumes(client);
-  return volumes ? VolumeWithName(*volumes, *name) : volumes.Failure();
+  if (IsCertainlyPath(mountPointOrName)) return VolumeAt(client, mountPointOrName);
+  auto byName = VolumeCalled(client, mountPointOrName);
+  if (!byName && byName.Failure().outcome != Outcome::kNotAVolume) return byName;
+  auto byPath = VolumeAt(client, mountPointOrName);
+  if (!byPath && byPath.Failure().outcome == Outcome::kServiceFailed) return byPath;
+  if (!byPath) return !byName && byPath.Failure().outcome == Outcome::kRefused ? byPath : byName;
+  if (!byName || byName->number == byPath->number) return byPath;
+  return Error{Outcome::kAmbiguous, "the volume at " + byName->mountPoint + " is called " +
+                                        Quoted(mountPointOrName) + ", and that is the path of " +
+                                        byPath->mountPoint};
 }
 
 }  // namespace tallowmere

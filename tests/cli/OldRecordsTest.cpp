@@ -18,6 +18,7 @@ namespace {
 
 using nlohmann::json;
 using testing::HasSubstr;
+using testing::Not;
 
 constexpr std::int16_t kForeignNumber = -3000;  // of no volume here
 
@@ -90,7 +91,64 @@ TEST_F(OldRecords, OfTheOtherByteOrderAreHintedAt) {
   const Output output = Cli({"path", Hex(std::endian::big)});
   EXPECT_THAT(output.errors, HasSubstr("in the other byte order (--byte-order " + other +
                                        ") its volume would be -3000"));
-  EXPECT_THAT(Cli({"path", "99:2:x"}).errors, testing::Not(HasSubstr("byte order")));
+  EXPECT_THAT(Cli({"path", "99:2:x"}).errors, Not(HasSubstr("byte order")));
+}
+
+// Foreign numbers are no sign where the volume is told, but parent ids are.
+TEST_F(OldRecords, OfTheOtherByteOrderAreHintedAtWhereTheirVolumeIsTold) {
+  const std::string place = Place();
+  const auto errorOf = [&](FSSpec record, std::endian order) {
+    const std::string bytes = EncodeFSSpec(record, order);
+    const Output output = Cli(
+        {"path", "--packed", "--byte-order", "little", "--volume", place, Write("packed", bytes)});
+    EXPECT_EQ(output.status, 1);
+    return output.errors;
+  };
+  const std::string hint = "in the other byte order (--byte-order big) its ";
+  EXPECT_THAT(errorOf({-1, 3, "x"}, std::endian::big), HasSubstr(hint + "folder would be 3\n"));
+  EXPECT_THAT(errorOf({-3000, 3, "x"}, std::endian::big),
+              HasSubstr(hint + "volume would be -3000\n"));
+  EXPECT_THAT(errorOf({-1, 3, "x"}, std::endian::little), Not(HasSubstr("byte order")));
+  EXPECT_THAT(errorOf({-1, 0x12345678, "x"}, std::endian::little), Not(HasSubstr("byte order")));
+}
+
+TEST_F(OldRecords, OfTheOtherByteOrderAreHintedAtWhereTheTableHasOnlyTheirOtherNumber) {
+  const std::string table = Write("table", "-3=" + Place() + "\n");
+  const std::string packed = Write("packed", EncodeFSSpec({-3, 2, "x"}, std::endian::big));
+  const std::vector<std::string> path{"path", "--packed", "--volumes", table, "--byte-order"};
+  std::vector<std::string> wrong = path;
+  wrong.insert(wrong.end(), {"little", packed});
+  EXPECT_EQ(Cli(wrong).errors,
+            "tallowmere-cli: record 1 at byte 0 of " + packed +
+                ": the table has no volume -513; in the other byte order (--byte-order big) its "
+                "volume would be -3\n");
+}
+
+TEST_F(OldRecords, PackedInAFileAreNamedByTheirPlace) {
+  FSSpec missing = mRecord;
+  missing.parID = 3;  // of no folder
+  const auto bytes = [](const FSSpec& record) { return EncodeFSSpec(record, std::endian::big); };
+  std::string broken = bytes(mRecord);
+  broken[6] = 64;
+  const std::string packed =
+      Write("packed", "HEAD" + bytes(mRecord) + "12" + bytes(missing) + "12" + broken);
+  const std::vector<std::string> path{"path",     "--byte-order", "big", "--volume", Place(),
+                                      "--packed", "--skip",       "4",   "--stride", "72"};
+  std::vector<std::string> plain = path;
+  plain.push_back(packed);
+  const Output output = Cli(plain);
+  EXPECT_EQ(output.text, mFile + "\n\n\n");
+  EXPECT_EQ(output.errors, "tallowmere-cli: record 2 at byte 76 of " + packed +
+                               ": there is neither the item \"" + std::to_string(mNumber) +
+                               ":3:a/b\" nor a folder for it\n"
+                               "tallowmere-cli: record 3 at byte 148 of " +
+                               packed + ": the length of its name is above 63\n");
+  std::vector<std::string> objects = path;
+  objects.insert(objects.end(), {"--json", packed});
+  const json second = json::parse(Lines(Cli(objects).text).at(1));
+  EXPECT_EQ(second["file"], packed);
+  EXPECT_EQ(second["byte"], 76);
+  EXPECT_EQ(second["status"], "nothing");
 }
 
 TEST_F(OldRecords, PackedInAFileAreTakenOneByOne) {

@@ -121,6 +121,57 @@ TEST(FindVolume, TakesANameOrAMountPoint) {
   }
 }
 
+class FindVolumeByPath : public testing::Test {
+ protected:
+  void SetUp() override {
+    if (!EnterOwnMountNamespace()) GTEST_SKIP() << "mounting is not permitted here";
+    mFirst.emplace("none", mFolder.MakeFolder("a/first").string(), "tmpfs");
+    mSecond.emplace("none", mFolder.MakeFolder("b/second").string(), "tmpfs");
+    ASSERT_TRUE(mFirst->IsMounted() && mSecond->IsMounted());
+    std::filesystem::current_path(mFolder.Path());
+  }
+  void TearDown() override { std::filesystem::current_path("/"); }
+
+  std::string PlaceOf(std::string_view text) {
+    const auto volume = FindVolume(mClient, text);
+    return volume ? volume->mountPoint : test::MessageOf(volume);
+  }
+
+  TemporaryFolder mFolder;
+  std::optional<ScopedMount> mFirst;
+  std::optional<ScopedMount> mSecond;
+  Client mClient = StartClient();
+};
+
+TEST_F(FindVolumeByPath, FollowsALink) {
+  const std::string link = mFolder.MakeLink("link", "a/first");
+  EXPECT_EQ(PlaceOf(link), (mFolder.Path() / "a/first").string());
+  EXPECT_EQ(PlaceOf("link"), (mFolder.Path() / "a/first").string());
+}
+
+TEST_F(FindVolumeByPath, TakesARelativePath) {
+  for (const char* const path : {"a/first", "./a/first", "a/../a/first/"}) {
+    EXPECT_EQ(PlaceOf(path), (mFolder.Path() / "a/first").string()) << path;
+  }
+  std::filesystem::current_path(mFolder.Path() / "a/first");
+  EXPECT_EQ(PlaceOf("."), (mFolder.Path() / "a/first").string());
+  EXPECT_EQ(PlaceOf("first"), (mFolder.Path() / "a/first").string());
+  EXPECT_EQ(PlaceOf("a"), "no volume is called \"a\"");
+  std::filesystem::current_path("/");
+}
+
+TEST_F(FindVolumeByPath, RefusesTheNameOfOneVolumeThatIsThePathOfAnother) {
+  mFolder.MakeLink("first", "b/second");
+  const std::string root = mFolder.Path();
+  EXPECT_EQ(PlaceOf("first"), "the volume at " + root +
+                                  "/a/first is called \"first\", and that is "
+                                  "the path of " +
+                                  root + "/b/second");
+  EXPECT_EQ(PlaceOf("./first"), root + "/b/second");
+  mFolder.MakeLink("second", "b/second");
+  EXPECT_EQ(PlaceOf("second"), root + "/b/second");
+}
+
 Outcome OutcomeOf(const Result<Volume>& volume) {
   return volume ? Outcome::kFound : volume.Failure().outcome;
 }

@@ -26,12 +26,13 @@ Result<std::vector<Volume>> ListVolumes(Client& client);
 // that several have, kNotAVolume for one that none has.
 Result<Volume> VolumeWithName(const std::vector<Volume>& volumes, std::string_view name);
 
-// The volume whose root folder is at a path, which becomes its mount point here also where it is
-// not its first one. kNotAVolume for any other path.
+// The volume whose root folder is at a path; links are followed, also a last one. The folder's path
+// becomes its mount point here also where it is not its first one. kNotAVolume for any other path.
 Result<Volume> VolumeAt(Client& client, PathView mountPoint);
 
-// The volume that a person means: by its mount point, for a text that begins with '/', otherwise by
-// its name in UTF-8.
+// The volume that a person means: by its name in UTF-8, or by a path to its root folder, which may
+// be relative or a link. A text that begins with '/', "./" or "../" is a path. kAmbiguous for one
+// that is the name of one volume and the path of another.
 Result<Volume> FindVolume(Client& client, std::string_view mountPointOrName);
 
 }  // namespace tallowmere
