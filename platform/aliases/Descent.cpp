@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "catalog/OwnNames.h"
+#include "catalog/StoredNames.h"
 #include "foundation/PathText.h"
 #include "kernel/Contents.h"
 
@@ -85,8 +86,14 @@ Result<Look> Descent::LookUp(const HeldFolder& folder, const std::string& name,
   if (catalog::IsMissing(look) && spelling == Way::Spelling::kLinux) {
     look = LookUpOtherForms(folder, name);
   }
-  if (look && !IsOnMount(look->Item())) return kOutside;
-  return look;
+  return OnMount(std::move(look));
+}
+
+// What was found, under its stored name.
+Result<Look> Descent::OnMount(Result<Look> look) {
+  if (!look) return look;
+  if (!IsOnMount(look->Item())) return kOutside;
+  return catalog::AsStoredByFolder(mMoment, *look);
 }
 
 Result<HeldFolder> Descent::Enter(const Look& item) {
@@ -113,9 +120,8 @@ Result<HeldFolder> Descent::Follow(const Look& link) {
       at = Climb(HeldFolder(*at));
       continue;
     }
-    const auto next = mMoment.LookUp(*at, name);
-    at = next && IsOnMount(next->Item()) ? Enter(*next)
-                                         : Result<HeldFolder>(next ? kOutside : next.Error());
+    const auto next = OnMount(mMoment.LookUp(*at, name));
+    at = next ? Enter(*next) : Result<HeldFolder>(next.Error());
   }
   return at;
 }

@@ -20,13 +20,14 @@ class Descent {
   // One folder further up; ENOENT at the top of the mount.
   kernel::Result<catalog::HeldFolder> Above(const catalog::HeldFolder& folder);
 
-  // The item at the end of a way from the start, itself not followed when it is a link. kNoFolder
-  // when a folder on the way is missing, ENOENT when the item is, or lies outside, or when a name
-  // is that of two items.
+  // The item at the end of a way from the start, itself not followed when it is a link. Its path
+  // has the names that the folders store. kNoFolder when a folder on the way is missing, ENOENT
+  // when the item is, or lies outside, or when a name is that of two items.
   kernel::Result<catalog::Sighting> Find(const Way& way);
 
  private:
   bool IsOnMount(const kernel::Item& item) const;
+  kernel::Result<catalog::Look> OnMount(kernel::Result<catalog::Look> look);
   kernel::Result<catalog::Look> LookUp(const catalog::HeldFolder& folder, const std::string& name,
                                        Way::Spelling spelling);
   kernel::Result<catalog::Look> LookUpOtherForms(const catalog::HeldFolder& folder,

@@ -7,6 +7,7 @@
 
 #include "foundation/PathText.h"
 #include "kernel/FolderReader.h"
+#include "kernel/Paths.h"
 #include "text/FileNameText.h"
 #include "text/MacRoman.h"
 #include "text/Utf16.h"
@@ -62,6 +63,14 @@ std::optional<std::string> StoredNameOf(FolderListings& listings, const Look& it
   return name ? name : NameOfEntry(listings, item, By::kLetters);
 }
 
+Look UnderStoredName(Moment& moment, const Look& item) {
+  const auto name = StoredNameOf(moment.Knowledge().Listings(), item);
+  if (!name || *name == item.Name()) return item;
+  const auto stored = moment.LookUp(item.Folder(), *name);
+  const bool isIt = stored && AreSame(*item.Folder().Volume(), stored->Seen(), item.Seen());
+  return isIt ? *stored : item;
+}
+
 bool HasLetters(std::string_view name) {
   return std::any_of(name.begin(), name.end(), [](char byte) {
     const auto letter = static_cast<unsigned char>(byte);
@@ -82,12 +91,15 @@ std::string_view MountPointOn(const volumes::Volume& volume, const std::string& 
 }  // namespace
 
 Look AsStored(Moment& moment, const Look& item) {
-  const volumes::Volume& volume = *item.Folder().Volume();
-  if (!volume.Kind().ignoresCase || !HasLetters(item.Name())) return item;
-  const auto name = StoredNameOf(moment.Knowledge().Listings(), item);
-  if (!name || *name == item.Name()) return item;
-  const auto stored = moment.LookUp(item.Folder(), *name);
-  return stored && AreSame(volume, stored->Seen(), item.Seen()) ? *stored : item;
+  const bool ignoresCase = item.Folder().Volume()->Kind().ignoresCase;
+  return ignoresCase && HasLetters(item.Name()) ? UnderStoredName(moment, item) : item;
+}
+
+Look AsStoredByFolder(Moment& moment, const Look& item) {
+  if (!HasLetters(item.Name())) return item;
+  const bool ignoresCase =
+      item.Folder().Volume()->Kind().ignoresCase || kernel::HasCasefold(item.Folder().SpotOf("."));
+  return ignoresCase ? UnderStoredName(moment, item) : item;
 }
 
 std::string StoredPath(Moment& moment, const kernel::Item& reference, const std::string& path) {

@@ -1,7 +1,9 @@
 #include "kernel/Paths.h"
 
 #include <fcntl.h>
+#include <linux/fs.h>
 #include <linux/openat2.h>
+#include <sys/ioctl.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
@@ -81,6 +83,12 @@ Result<Descriptor> HoldFollowing(const Spot& spot) {
 
 Result<Descriptor> OpenForReading(const Spot& spot) {
   return AsResult(openat(spot.folder, spot.name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+}
+
+bool HasCasefold(const Spot& folder) {
+  const auto open = OpenForReading(folder);
+  int flags = 0;
+  return open && ioctl(open->Get(), FS_IOC_GETFLAGS, &flags) == 0 && (flags & FS_CASEFOLD_FL) != 0;
 }
 
 Result<std::string> RealPath(const std::string& path) {

@@ -33,6 +33,10 @@ Result<Descriptor> HoldFollowing(const Spot& spot);
 // Opens a folder for reading its entries; does not follow a link as the last component.
 Result<Descriptor> OpenForReading(const Spot& spot);
 
+// Whether a folder has the attribute by which it ignores letter case, as single folders of ext4,
+// f2fs and tmpfs can: ioctl_iflags(2). False where that cannot be told.
+bool HasCasefold(const Spot& folder);
+
 // The canonical path of what a path leads to, following all links.
 Result<std::string> RealPath(const std::string& path);
 

@@ -10,6 +10,7 @@
 //   posix    version 2, path within the volume, ids             by path, else by id
 //   hfs      version 2, HFS path, ids, dates in local time      likewise
 //   units    version 3, path within the volume, ids             likewise
+//   case     version 2, the path in another letter case, ids    likewise
 //   id       version 2, id                                      by id
 //   parent   version 2, name and id of the folder, local time   by id, while it is there
 //   other    version 3, id; the item with it is another's       never
@@ -26,6 +27,7 @@
 #include <sys/stat.h>
 
 #include <array>
+#include <cctype>
 #include <cerrno>
 #include <cstdint>
 #include <cstring>
@@ -45,7 +47,8 @@ namespace {
 namespace fs = std::filesystem;
 using tallowmere::test::RecordToWrite;
 
-constexpr std::array<const char*, 6> kForms = {"posix", "hfs", "units", "id", "parent", "other"};
+constexpr std::array<const char*, 7> kForms = {"posix", "hfs",    "units", "case",
+                                               "id",    "parent", "other"};
 constexpr std::int64_t k1904 = -2'082'844'800;  // in seconds since 1970
 constexpr unsigned kFractionBits = 16;
 constexpr std::int64_t kTimeZone = -std::int64_t{8} * 60 * 60;  // of the writer
@@ -73,6 +76,16 @@ std::string Exchanged(std::string path) {
 
 std::string UnitsOf(const std::string& hfsName) {
   return tallowmere::test::Units(fs::path(hfsName).u16string());
+}
+
+std::string InOtherCase(std::string path) {
+  for (char& letter : path) {
+    const auto byte = static_cast<unsigned char>(letter);
+    if (byte < 0x80) {
+      letter = static_cast<char>(std::isupper(byte) ? std::tolower(byte) : std::toupper(byte));
+    }
+  }
+  return path;
 }
 
 std::string HFSPath(const std::string& volume, const std::string& path) {
@@ -120,6 +133,7 @@ std::string RecordOf(const std::string& form, const fs::path& top, const fs::pat
     record.tags.push_back({17, tallowmere::test::Big(Precise(creation), 8)});
   }
   if (form == "posix") record.tags.push_back({18, path});
+  if (form == "case") record.tags.push_back({18, InOtherCase(path)});
   if (form == "units") record.tags.push_back({18, '/' + path});
   return Write(record);
 }
@@ -219,7 +233,8 @@ std::string Expected(const Target& target, const std::string& where) {
   return isGone || (hasMoved && target.form == "parent") ? kNothing : "id";
 }
 
-// As Expected; "wrong" for another item than the target, "half" for one that is not all told.
+// As Expected; "wrong" for another item than the target, "half" for one that is not all told,
+// "misspelled" for a path that is not the stored one.
 std::string Told(const Target& target, const nlohmann::json& answer, const struct statx& volume) {
   const bool isFound = answer.at("exists").get<bool>();
   for (const char* const key : {"target", "is_folder", "by"}) {
@@ -230,7 +245,9 @@ std::string Told(const Target& target, const nlohmann::json& answer, const struc
   const struct statx found = StatusOf(answer.at("target").get<std::string>());
   const bool isOnVolume =
       found.stx_dev_major == volume.stx_dev_major && found.stx_dev_minor == volume.stx_dev_minor;
-  return isOnVolume && found.stx_ino == target.number ? answer.at("by") : "wrong";
+  if (!isOnVolume || found.stx_ino != target.number) return "wrong";
+  const std::string by = answer.at("by");
+  return by == "path" && answer.at("target") != target.path ? "misspelled" : by;
 }
 
 int Check(const std::vector<Target>& targets, const std::string& answers, const fs::path& top,

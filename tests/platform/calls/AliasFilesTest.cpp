@@ -2,6 +2,8 @@
 #include <CoreServices/CoreServices.h>
 #include <fcntl.h>
 #include <gtest/gtest.h>
+#include <linux/fs.h>
+#include <sys/ioctl.h>
 #include <sys/mount.h>
 #include <sys/wait.h>
 #include <sys/xattr.h>
@@ -998,6 +1000,62 @@ TEST_P(AliasesOnImages, LeadToTheirTargets) {
   EXPECT_EQ(Resolve(disk + "/by record"), (Outcome{disk + "/folder/file"}));
   EXPECT_EQ(Resolve(disk + "/by bookmark"), (Outcome{disk + "/folder/file"}));
   EXPECT_EQ(Resolve(disk + "/folder/file"), NoAlias(disk + "/folder/file"));
+}
+
+// --- Letter case --------------------------------------------------------------------------------
+
+// What makes a folder ignore it: ioctl_iflags(2), where it has no name yet.
+bool MakeCasefold(const std::string& folder) {
+  const int open = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  int flags = 0;
+  const bool isRead = ioctl(open, FS_IOC_GETFLAGS, &flags) == 0;
+  flags |= FS_CASEFOLD_FL;
+  const bool isDone = isRead && ioctl(open, FS_IOC_SETFLAGS, &flags) == 0;
+  close(open);
+  return isDone;
+}
+
+// One on ext4, and a file in it. The folder above counts letter case.
+class FoldersThatIgnoreCase : public testing::Test {
+ protected:
+  void SetUp() override {
+    if (geteuid() != 0 || !EnterOwnMountNamespace()) GTEST_SKIP() << "may not mount";
+    if (!mImage.IsMade() || !mImage.Mount()) GTEST_SKIP() << "no ext4 with casefold in this kernel";
+    mFolder = mImage.Path() / "Folder";
+    std::filesystem::create_directories(mFolder);
+    ASSERT_TRUE(MakeCasefold(mFolder));
+    std::filesystem::create_directories(mFolder + "/Inner");
+    mFile = mFolder + "/Inner/Caf\u00E9";
+    std::ofstream(mFile) << "x";
+  }
+
+  Outcome ResolveAliasTo(const std::string& path) const {
+    RecordToWrite record;
+    record.volumeName = "mounted";
+    record.name = "CAF\u00C9";
+    record.tags = {{18, path}};
+    std::ofstream(mFolder + "/alias") << "";
+    std::ofstream(mFolder + "/._alias", std::ios::binary) << WriteSidecarOfAlias(Write(record));
+    return Resolve(mFolder + "/alias");
+  }
+
+  FileSystemImage mImage{
+      "ext4", {"mkfs.ext4", "-q", "-F", "-O", "casefold"}, std::uintmax_t{8} << 20};
+  std::string mFolder;
+  std::string mFile;
+};
+
+TEST_F(FoldersThatIgnoreCase, GiveAliasesTheStoredNames) {
+  EXPECT_EQ(ResolveAliasTo("Folder/INNER/CAF\u00C9"), (Outcome{mFile}));
+  EXPECT_EQ(ResolveAliasTo("FOLDER/Inner/Caf\u00E9"), Failed(dirNFErr));
+}
+
+TEST_F(FoldersThatIgnoreCase, FindTheItemOfARecordInOtherCase) {
+  FSSpec spec = SpecOf(mFile);
+  spec.name[1] = 'c';
+  FSRef item{};
+  ASSERT_EQ(FSpMakeFSRef(&spec, &item), noErr);
+  EXPECT_TRUE(std::filesystem::equivalent(PathOf(item), mFile));
 }
 
 INSTANTIATE_TEST_SUITE_P(OfAKind, AliasesOnImages,
