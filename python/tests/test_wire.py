@@ -102,6 +102,8 @@ class Records(unittest.TestCase):
 
     def test_a_text_may_have_an_id_without_a_sign_and_decomposed_accents(self) -> None:
         self.assertEqual(FSSpec.from_text("-1:4294967292:e\u0301"), FSSpec(-1, -4, b"\x8e"))
+        self.assertEqual(FSSpec.from_text("-1:2147483648:a"), FSSpec(-1, -2147483648, b"a"))
+        self.assertEqual(FSSpec.from_text("-1:2147483647:a"), FSSpec(-1, 2147483647, b"a"))
 
     def test_what_is_no_text_of_a_record_is_an_error(self) -> None:
         for text in (

@@ -239,6 +239,8 @@ TEST_F(Conversion, ManyItemsEndInASummary) {
   std::string input;
   for (int i = 0; i < 999; ++i) input += mFile + "\n";
   EXPECT_EQ(Cli({"name", "-"}, input).errors, "");
+  EXPECT_EQ(Cli({"name", "-"}, input + mFile).errors,
+            "tallowmere-cli: 1000 items: 1000 found, 0 new, 0 nothing, 0 failed\n");
   input += mHere + "/new\n" + mHere + "/missing/x\n/proc/1/status\n";
   EXPECT_EQ(Cli({"name", "--json", "-"}, input).errors,
             "tallowmere-cli: 1002 items: 999 found, 1 new, 1 nothing, 1 failed\n");
@@ -309,6 +311,11 @@ TEST_F(Conversion, AnAnswerWithANewlineIsRefusedUnlessItsEndCanBeTold) {
   EXPECT_EQ(json::parse(Cli({"name", "--json", file}).text)["name"], "x\ny");
   EXPECT_EQ(Cli({"name", "--null-output", file}).text, std::string("x\ny\0", 4));
   EXPECT_EQ(Cli({"spec", "--hex", file}).status, 0);
+}
+
+TEST_F(Conversion, AComplaintShowsControlCharactersAsOctalDigits) {
+  EXPECT_THAT(Cli({"name", "/nonexistent/\x1F\x7F\xC2\x80\xC2\x9F\xC2\xA0"}).errors,
+              testing::HasSubstr("/nonexistent/\\037\\177\\302\\200\\302\\237\xC2\xA0"));
 }
 
 TEST_F(Conversion, ALineIsAnsweredBeforeTheNextOneIsThere) {

@@ -169,6 +169,13 @@ TEST_F(OldRecords, InsideLargerStructuresAreTakenByTheirDistance) {
   EXPECT_EQ(output.text, mFile + "\n" + mFile + "\n");
 }
 
+TEST_F(OldRecords, SideBySideHaveADistanceOf70Bytes) {
+  const std::string one = EncodeFSSpec(mRecord);
+  const Output output =
+      Cli({"path", "--packed", "--stride", "70", "--volume", Place(), Write("packed", one + one)});
+  EXPECT_EQ(output.text, mFile + "\n" + mFile + "\n");
+}
+
 TEST_F(OldRecords, AFileThatDoesNotEndWithARecordIsRefused) {
   const std::string one = EncodeFSSpec(mRecord);
   for (const std::string& bytes : {one + "x", one.substr(1)}) {
@@ -202,6 +209,12 @@ TEST_F(OldRecords, OfATableAreOfTheVolumeThatItTells) {
               HasSubstr("the table has no volume " + own));
 }
 
+TEST_F(OldRecords, OfATableWithLinesOfWindowsAreFoundToo) {
+  const std::string table = Write("table", "# disks\r\n\r\n-3000=" + Place() + "\r\n");
+  const std::string rest = ":" + std::to_string(static_cast<std::uint32_t>(mRecord.parID)) + ":a/b";
+  EXPECT_EQ(Cli({"path", "--volumes", table, "--", "-3000" + rest}).text, mFile + "\n");
+}
+
 TEST_F(OldRecords, ATableWithALineThatIsNoneIsRefused) {
   for (const char* const line : {"x", "=x", "x="}) {
     const Output output = Cli({"path", "--volumes", Write("table", line), "1:2:x"});
@@ -222,6 +235,11 @@ TEST_F(OldRecords, TellHowTheyWereFoundAndWhetherTheyExist) {
   const json searched = json::parse(Cli({"path", "--json", "--other-volumes", "--", text}).text);
   EXPECT_EQ(searched["by"], "search");
   EXPECT_EQ(searched["path"], mFile);
+  FSSpec own = mRecord;
+  own.vRefNum = mNumber;
+  const json present =
+      json::parse(Cli({"path", "--json", "--other-volumes", "--", TextOfFSSpec(own)}).text);
+  EXPECT_EQ(present["by"], "id") << "though the search finds it as well";
   const json made =
       json::parse(Cli({"path", "--json", "--volume", Place(), "--", text + "x"}).text);
   EXPECT_EQ(made["status"], "new");

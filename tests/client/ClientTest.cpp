@@ -2,7 +2,10 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <optional>
+#include <string>
+#include <vector>
 
 #include "client/ClientSupport.h"
 #include "client/FindService.h"
@@ -123,20 +126,29 @@ TEST(Client, StartsNoServiceBeforeTheFirstRequest) {
   EXPECT_TRUE(test::HasNoChild());
 }
 
-TEST(Client, TakesNoStandardDescriptorThatItsProgramHasClosed) {
+// Whether a program that has closed these descriptors gets an answer, and still has none of them
+// open: what it prints by mistake must not reach the service.
+bool LeavesClosed(const std::vector<int>& descriptors) {
   const pid_t child = fork();
   if (child == 0) {
-    close(0);
-    close(1);
+    for (const int descriptor : descriptors) close(descriptor);
     Client client = StartClient();
     const bool works = client.GetHFSVolumeName(0).HasValue();
-    // What such a program prints by mistake must not reach the service.
-    const bool untouched = write(1, "x", 1) == -1 && fcntl(0, F_GETFD) == -1;
-    _exit(works && untouched ? 0 : 1);
+    const bool areClosed = std::all_of(descriptors.begin(), descriptors.end(), [](int descriptor) {
+      return fcntl(descriptor, F_GETFD) == -1;
+    });
+    _exit(works && areClosed ? 0 : 1);
   }
   int status = -1;
   waitpid(child, &status, 0);
-  EXPECT_EQ(status, 0);
+  return status == 0;
+}
+
+TEST(Client, TakesNoStandardDescriptorThatItsProgramHasClosed) {
+  EXPECT_TRUE(LeavesClosed({0, 1}));
+  EXPECT_TRUE(LeavesClosed({0, 2}));
+  EXPECT_TRUE(LeavesClosed({1, 2}));
+  EXPECT_TRUE(LeavesClosed({0, 1, 2}));
 }
 
 TEST(Client, TellsTheServiceItsOwnProcessID) {

@@ -386,6 +386,13 @@ TEST_F(AliasStores, Attributes) {
   EXPECT_EQ(Resolve(mAlias), (Outcome{mFile}));
 }
 
+// As most forks are: other resources follow the alias.
+TEST_F(AliasStores, AnAttributeOfAKilobyte) {
+  Set("user.com.apple.FinderInfo", FinderInfo(kAliasFlag));
+  Set("user.com.apple.ResourceFork", mFork + std::string(1024, '\0'));
+  EXPECT_EQ(Resolve(mAlias), (Outcome{mFile}));
+}
+
 TEST_F(AliasStores, AttributesOfAnAFPServer) {
   Set("user.org.netatalk.Metadata",
       WriteAppleDouble({{3, ""}, {kFinderInfo, FinderInfo(kAliasFlag)}}));
@@ -440,6 +447,17 @@ TEST_F(AliasStores, AttributesOfAnAFPServerAreNoAppleSingle) {
   EXPECT_EQ(Resolve(mAlias), NoAlias(mAlias));
 }
 
+TEST_F(AliasStores, AppleDoubleBesideCountsBeforeThatInAFolder) {
+  MakeFile("other");
+  MakeFolder(".AppleDouble");
+  MakeFile(".AppleDouble/alias",
+           WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)},
+                             {kResourceFork, ForkWith(Write(ByPath("other")))}}));
+  MakeFile("._alias",
+           WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)}, {kResourceFork, mFork}}));
+  EXPECT_EQ(Resolve(mAlias), (Outcome{mFile}));
+}
+
 TEST_F(AliasStores, TheFirstThatHasFinderInformationCounts) {
   MakeFile("._alias",
            WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)}, {kResourceFork, mFork}}));
@@ -457,6 +475,15 @@ TEST_F(AliasStores, TheFirstForkThatIsNotEmptyCounts) {
   EXPECT_EQ(Resolve(mAlias), (Outcome{mFile}));
   Set("user.com.apple.ResourceFork", ForkWith(Write(ByPath("other"))));
   EXPECT_EQ(Resolve(mAlias), (Outcome{At("other")}));
+}
+
+// The whole of another file, with a data fork of its own.
+TEST_F(AliasStores, AppleSingleBesideIsNone) {
+  constexpr std::uint32_t kAppleSingle = 0x00051600;
+  MakeFile("._alias",
+           WriteAppleDouble({{kFinderInfo, FinderInfo(kAliasFlag)}, {kResourceFork, mFork}},
+                            kAppleSingle));
+  EXPECT_EQ(Resolve(mAlias), NoAlias(mAlias));
 }
 
 TEST_F(AliasStores, ASidecarThatIsAPipeOrALinkIsNone) {
@@ -596,21 +623,39 @@ TEST_F(VolumesOfAliases, WithTwoDifferentTargetsFindNone) {
   EXPECT_EQ(Resolve(alias), Failed(fnfErr));
 }
 
-TEST_F(VolumesOfAliases, OfAKindThatTheRecordExcludesAreLeftOut) {
-  FileSystemImage image("vfat", {"mkfs.vfat"}, std::uintmax_t{1} << 20);
-  const std::string place = mFolder.MakeFolder("more/Old Disk");
-  if (geteuid() != 0 || !image.IsMade() || !KernelHas("vfat") || !image.Mount()) {
-    GTEST_SKIP() << "no vfat";
+class VolumesOfAliasesOnFAT : public VolumesOfAliases {
+ protected:
+  void SetUp() override {
+    VolumesOfAliases::SetUp();
+    if (IsSkipped()) return;
+    FileSystemImage image("vfat", {"mkfs.vfat"}, std::uintmax_t{1} << 20);
+    mPlace = mFolder.MakeFolder("more/Old Disk");
+    if (geteuid() != 0 || !image.IsMade() || !KernelHas("vfat") || !image.Mount()) {
+      GTEST_SKIP() << "no vfat";
+    }
+    mAnother.emplace(image.Path(), mPlace, nullptr, MS_BIND);
+    image.Unmount();
+    std::filesystem::create_directories(mPlace + "/folder");
+    std::ofstream(mPlace + "/folder/file") << "x";
   }
-  mAnother.emplace(image.Path(), place, nullptr, MS_BIND);
-  image.Unmount();
-  std::filesystem::create_directories(place + "/folder");
-  std::ofstream(place + "/folder/file") << "x";
+  void TearDown() override { mAnother.reset(); }
+
+  std::string mPlace;
+};
+
+TEST_F(VolumesOfAliasesOnFAT, AreLeftOutWhereTheRecordExcludesTheKind) {
   RecordToWrite record = ByPath("folder/file");
   EXPECT_EQ(Resolve(MakeAlias(record)), (Outcome{mFile}));
   record.signature = "BD";
   EXPECT_EQ(Resolve(MakeAlias(record)), Failed(fnfErr));
-  mAnother.reset();
+}
+
+TEST_F(VolumesOfAliasesOnFAT, AreTakenWhereNoOtherHasTheName) {
+  mVolume->Unmount();
+  std::ofstream(mPlace + "/alias").flush();
+  std::ofstream(mPlace + "/._alias", std::ios::binary)
+      << WriteSidecarOfAlias(Write(ByPath("folder/file")));
+  EXPECT_EQ(Resolve(mPlace + "/alias"), (Outcome{mPlace + "/folder/file"}));
 }
 
 TEST_F(VolumesOfAliases, ThatAreNotMountedAreNone) {
@@ -755,6 +800,18 @@ TEST_F(AliasesThatLeave, MayFollowLinksWithinTheVolume) {
   MakeLink("twice", "./a//b/link/");
   EXPECT_EQ(Resolve(MakeAlias(ByPath("a/b/link/file"))), (Outcome{mFile}));
   EXPECT_EQ(Resolve(MakeAlias(ByPath("twice/file"))), (Outcome{mFile}));
+}
+
+TEST_F(AliasesThatLeave, FollowAsManyLinksAsTheKernel) {
+  std::string target = "folder";
+  for (int link = 1; link <= 41; ++link) {
+    const std::string name = "link" + std::to_string(link);
+    MakeLink(name, target);
+    target = name;
+  }
+  EXPECT_TRUE(std::filesystem::exists(At("link40/file")));
+  EXPECT_EQ(Resolve(MakeAlias(ByPath("link40/file"))), (Outcome{mFile}));
+  EXPECT_EQ(Resolve(MakeAlias(ByPath("link41/file"))), Failed(dirNFErr));
 }
 
 TEST_F(AliasesThatLeave, DoNotFollowALinkInTheLastPlace) {

@@ -149,6 +149,14 @@ TEST_F(HFSPathsToRecords, AMissingNameThatFitsNoRecordIsABadName) {
   EXPECT_TRUE(IsUntouched());
 }
 
+TEST_F(HFSPathsToRecords, DotsAreNamesThatNothingHas) {
+  EXPECT_EQ(From("."), "(-37)");
+  EXPECT_EQ(From(".."), "(-37)");
+  EXPECT_EQ(From(":.:file"), "(-120)");
+  EXPECT_EQ(From(":..:top"), "(-120)");
+  EXPECT_EQ(From(Full(mTop + "/a/b/../top")), "(-120)");
+}
+
 TEST_F(HFSPathsToRecords, ALongNameThatExistsGetsAShortRecord) {
   const std::string name(200, 'n');
   mFolder.MakeFile("a/b/" + name);

@@ -774,8 +774,10 @@ TEST_F(AnIndexOfMixedIDs, SkipsFoldersWithoutAPath) {
   kernel::Descriptor folder(open(PathTo("deep").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   const std::string name(250, 'd');
   for (int depth = 0; depth < 40; ++depth) {
+    // Of the folders beside the way down, one is visited before it and one on the way back.
+    ASSERT_EQ(mkdirat(folder.Get(), "one", 0700), 0);
     ASSERT_EQ(mkdirat(folder.Get(), name.c_str(), 0700), 0);
-    ASSERT_EQ(mkdirat(folder.Get(), "side", 0700), 0);
+    ASSERT_EQ(mkdirat(folder.Get(), "other", 0700), 0);
     folder =
         kernel::Descriptor(openat(folder.Get(), name.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   }
@@ -783,6 +785,16 @@ TEST_F(AnIndexOfMixedIDs, SkipsFoldersWithoutAPath) {
     EXPECT_EQ(Find(mID), mSmall);
     EXPECT_EQ(FindAny(mID), mSmall);
   }
+}
+
+TEST_F(AnIndexOfMixedIDs, FindsAFileThatGetsAnIDWhichWasMissingWithoutAChangeOfItsFolder) {
+  const std::string file = mNumbered->MakeFile("deep/1/file", 500);
+  LetChangesAge();
+  EXPECT_EQ(FindAny(500), file);
+  EXPECT_EQ(FindAny(600), "(none)");
+  ASSERT_TRUE(NumberedFileSystem::Renumber(file, 600));
+  EXPECT_EQ(FindAny(600), file);
+  EXPECT_EQ(FindAny(500), "(none)");
 }
 
 // An access to a dead mount never returns; the alarm would then end the test program.

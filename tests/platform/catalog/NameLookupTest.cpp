@@ -111,6 +111,17 @@ TEST_F(NamesInAFolder, ANameOfMixedFormsIsFoundWhenItIsTheOnlyOne) {
             "\x8E\x8E");
 }
 
+TEST_F(NamesInAFolder, ANameOfMixedFormsIsFoundThoughItIsTooLongWithAllItsAccentsApart) {
+  std::string name = "e\xCC\x81";
+  for (int letter = 1; letter < 120; ++letter) name += "\xC3\xA9";
+  Make(name);
+  FSSpec spec{};
+  ASSERT_EQ(FSMakeFSSpec(mInfo.volume, static_cast<SInt32>(mInfo.nodeID),
+                         Str255Of(std::string(120, '\x8E')).bytes, &spec),
+            noErr);
+  EXPECT_EQ(ItemOf(spec), PathTo(name));
+}
+
 TEST_F(NamesInAFolder, TwoNamesOfMixedFormsAreNotFoundByTheirCommonForm) {
   const std::string first =
       "\xC3\xA9"

@@ -83,6 +83,9 @@ void Touch(fuse_ino_t node) {
 void SetAttributes(fuse_req_t request, fuse_ino_t node, struct stat* given, int which,
                    fuse_file_info*) {
   if ((which & FUSE_SET_ATTR_MODE) != 0) nodes[node].about.st_mode = given->st_mode;
+  if ((which & FUSE_SET_ATTR_MTIME) != 0) {
+    nodes[node].about.st_ino = static_cast<ino_t>(given->st_mtim.tv_sec);
+  }
   Touch(node);
   fuse_reply_attr(request, &nodes[node].about, 0);
 }
@@ -204,6 +207,11 @@ std::string NumberedFileSystem::MakeFolder(const std::string& name, unsigned lon
   const std::string path = Path() / (name + "@" + std::to_string(number));
   std::filesystem::create_directory(path);
   return path;
+}
+
+bool NumberedFileSystem::Renumber(const std::string& path, unsigned long number) {
+  const timespec times[] = {{0, UTIME_OMIT}, {static_cast<time_t>(number), 0}};
+  return utimensat(AT_FDCWD, path.c_str(), times, 0) == 0;
 }
 
 std::string NumberedFileSystem::MakeFile(const std::string& name, unsigned long number) const {

@@ -38,6 +38,9 @@ class NumberedFileSystem {
   std::string MakeFolder(const std::string& name, unsigned long number) const;
   std::string MakeFile(const std::string& name, unsigned long number) const;
 
+  // Gives an item another number, without a change of its folder. Returns whether it could.
+  static bool Renumber(const std::string& path, unsigned long number);
+
  private:
   TemporaryFolder mFolder;
   pid_t mServer = -1;

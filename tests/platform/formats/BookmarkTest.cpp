@@ -160,6 +160,15 @@ TEST(BookmarkReading, TellsAFileByAll16Bytes) {
 }
 
 // A list of the same text, whose content would be as large as the product of both.
+TEST(BookmarkReading, TakesTextsOfUpTo1024Bytes) {
+  for (const std::size_t size : {std::size_t{1024}, std::size_t{1025}}) {
+    BookmarkWriter writer;
+    const auto path = writer.Text(std::string(size, '/'));
+    writer.AddTable(1, {{0x2002, path}});
+    EXPECT_EQ(ReadBookmark(writer.Bare()).has_value(), size == 1024) << size;
+  }
+}
+
 TEST(BookmarkReading, DoesNotGrowBeyondItsSize) {
   BookmarkWriter writer;
   const auto text = writer.Text(std::string(100000, 'x'));

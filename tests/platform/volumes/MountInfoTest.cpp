@@ -42,6 +42,13 @@ TEST(MountInfo, EscapesAreUndone) {
   EXPECT_EQ(mounts[0].mountPoint, "/My Disk\tx\ny#z\\040");
 }
 
+TEST(MountInfo, AnEscapeAtTheEndOfAFieldIsUndone) {
+  const auto mounts = ParseMountInfo("2 1 0:5 /a\\134 /My\\040Disk\\040 rw - tmpfs none rw\n");
+  ASSERT_THAT(mounts, SizeIs(1));
+  EXPECT_EQ(mounts[0].root, "/a\\");
+  EXPECT_EQ(mounts[0].mountPoint, "/My Disk ");
+}
+
 TEST(MountInfo, ABackslashThatBeginsNoEscapeStaysAsItIs) {
   EXPECT_EQ(ParseMountInfo("2 1 0:5 / /a\\04 rw - tmpfs none rw\n").at(0).mountPoint, "/a\\04");
   EXPECT_EQ(ParseMountInfo("2 1 0:5 / /a\\89z rw - tmpfs none rw\n").at(0).mountPoint, "/a\\89z");
