@@ -4,14 +4,12 @@
 #include <linux/filter.h>
 #include <linux/seccomp.h>
 #include <sys/prctl.h>
-#include <sys/socket.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
 #include <array>
 #include <cstddef>
 #include <cstdlib>
-#include <cstring>
 #include <vector>
 
 #include "support/DescriptorMessage.h"
@@ -36,22 +34,13 @@ int Listener() {
       syscall(SYS_seccomp, SECCOMP_SET_MODE_FILTER, SECCOMP_FILTER_FLAG_NEW_LISTENER, &program));
 }
 
-bool Send(int socket, int descriptor) {
-  tallowmere::test::DescriptorMessage sent;
-  cmsghdr* const header = CMSG_FIRSTHDR(&sent.message);
-  header->cmsg_level = SOL_SOCKET;
-  header->cmsg_type = SCM_RIGHTS;
-  header->cmsg_len = CMSG_LEN(sizeof descriptor);
-  std::memcpy(CMSG_DATA(header), &descriptor, sizeof descriptor);
-  return sendmsg(socket, &sent.message, 0) == 1;
-}
-
 }  // namespace
 
 int main(int count, char** arguments) {
   if (count < 3) return 1;
   const int listener = Listener();
-  if (listener < 0 || !Send(std::atoi(arguments[1]), listener)) return 2;
+  if (listener < 0) return 2;
+  if (!tallowmere::test::SendDescriptor(std::atoi(arguments[1]), listener)) return 2;
   execv(arguments[2], arguments + 2);
   return 1;
 }

@@ -8,27 +8,11 @@
 
 #include <array>
 #include <cstdlib>
-#include <cstring>
 #include <utility>
 
 #include "support/DescriptorMessage.h"
 
 namespace tallowmere::test {
-namespace {
-
-// Receives a descriptor from a socket; -1 when there is none.
-int Receive(int socket) {
-  DescriptorMessage received;
-  if (recvmsg(socket, &received.message, MSG_CMSG_CLOEXEC) != 1) return -1;
-  const cmsghdr* const header = CMSG_FIRSTHDR(&received.message);
-  if (header == nullptr || header->cmsg_type != SCM_RIGHTS) return -1;
-  int descriptor = -1;
-  std::memcpy(&descriptor, CMSG_DATA(header), sizeof descriptor);
-  return descriptor;
-}
-
-}  // namespace
-
 StoppedService::StoppedService(const std::string& program) {
   std::array<int, 2> ends{};
   if (socketpair(AF_UNIX, SOCK_STREAM, 0, ends.data()) != 0) std::abort();
@@ -37,7 +21,7 @@ StoppedService::StoppedService(const std::string& program) {
       TALLOWMERE_STOP_AT_CALLS,
       std::vector<std::string>{std::to_string(ends[1]), program, std::to_string(getpid())});
   close(ends[1]);
-  mListener = Receive(mSocket);
+  mListener = ReceiveDescriptor(mSocket);
   if (mListener >= 0) mSupervisor = std::thread([this] { Supervise(); });
 }
 
