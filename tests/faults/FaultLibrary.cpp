@@ -170,7 +170,7 @@ __attribute__((constructor)) void Begin() {
   if (memory == MAP_FAILED) _exit(kCannotCatchCalls);
   close(file);
   CatchCalls();
-  BecomeCopies();
+  close(BecomeCopies());
   auto* const page = static_cast<FaultPage*>(memory);
   page->liveAllocations = gOwnPage.liveAllocations.load();
   gPage = page;

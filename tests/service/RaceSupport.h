@@ -12,6 +12,7 @@
 #include <string>
 #include <utility>
 
+#include "support/Copies.h"
 #include "support/EveryRequest.h"
 #include "support/SmallRoot.h"
 #include "support/StoppedService.h"
@@ -54,10 +55,22 @@ inline std::string Answer(ChildProgram& service, unsigned code, const std::strin
   }
 }
 
+// Services that can be stopped.
+inline const Copies& StoppedServices() {
+  static const Copies services(TALLOWMERE_SERVICE, TALLOWMERE_STOP_AT_CALLS);
+  return services;
+}
+
 // A service that is not stopped, for what is true while nothing changes.
 class Bystander : public ChildProgram {
  public:
-  Bystander() : ChildProgram(ServiceToTest(), {std::to_string(getpid())}) {}
+  Bystander() : ChildProgram(Copy) {}
+
+ private:
+  static pid_t Copy(const Streams& streams) {
+    static const Copies services(TALLOWMERE_SERVICE, TALLOWMERE_COPIES_LIBRARY);
+    return services.Make(streams);
+  }
 };
 
 // The path in a response to code 2, 6, 8 or 9; empty when there is none.
@@ -162,7 +175,8 @@ class Truth {
 class InSmallRoot : public testing::Test {
  protected:
   void SetUp() override {
-    static const bool isThere = EnterSmallRoot({ServiceToTest(), TALLOWMERE_STOP_AT_CALLS});
+    static const bool isThere =
+        EnterSmallRoot({TALLOWMERE_SERVICE, TALLOWMERE_STOP_AT_CALLS, TALLOWMERE_COPIES_LIBRARY});
     if (!isThere) GTEST_SKIP() << "mounting is not permitted here";
   }
 };

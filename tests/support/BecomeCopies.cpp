@@ -26,9 +26,9 @@ pid_t Copy() {
 
 }  // namespace
 
-void BecomeCopies() {
+int BecomeCopies() {
   const char* const descriptor = std::getenv(kCopiesSocketVariable);
-  if (descriptor == nullptr) return;
+  if (descriptor == nullptr) return -1;
   const int socket = std::atoi(descriptor);  // NOLINT(cert-err34-c)
   const char ready = 1;
   if (write(socket, &ready, sizeof ready) != sizeof ready) _exit(EXIT_FAILURE);
@@ -43,10 +43,11 @@ void BecomeCopies() {
       if (copy == 0) dup2(streams[static_cast<std::size_t>(i)], i);
       close(streams[static_cast<std::size_t>(i)]);
     }
-    if (copy == 0) break;
-    if (write(socket, &copy, sizeof copy) != sizeof copy) _exit(EXIT_FAILURE);
+    // A copy tells of itself, so that nothing that it sends can come before.
+    const pid_t told = copy == 0 ? getpid() : -1;
+    if (copy <= 0 && write(socket, &told, sizeof told) != sizeof told) _exit(EXIT_FAILURE);
+    if (copy == 0) return socket;
   }
-  close(socket);
 }
 
 }  // namespace tallowmere::test

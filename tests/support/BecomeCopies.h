@@ -6,7 +6,8 @@ namespace tallowmere::test {
 // The environment variable with the original's end of the socket.
 inline constexpr char kCopiesSocketVariable[] = "TALLOWMERE_COPIES_SOCKET";
 
-// Returns in each copy. The original itself ends when the other end of the socket is closed.
-void BecomeCopies();
+// Returns in each copy, with the socket, which the copy closes. The original itself ends when the
+// other end is closed. Returns -1 at once in a program that is not to be copied.
+int BecomeCopies();
 
 }  // namespace tallowmere::test

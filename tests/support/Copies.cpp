@@ -41,4 +41,8 @@ pid_t Copies::Make(const ChildProgram::Streams& streams) const {
   return read(mSocket, &copy, sizeof copy) == sizeof copy ? copy : -1;
 }
 
+int Copies::Descriptor() const {
+  return ReceiveDescriptor(mSocket);
+}
+
 }  // namespace tallowmere::test

@@ -26,6 +26,9 @@ class Copies {
   // Makes a copy with these streams, a child of this process. Returns its id, or -1.
   pid_t Make(const ChildProgram::Streams& streams) const;
 
+  // Waits for the descriptor that the library sends from each copy; -1 when it has none.
+  int Descriptor() const;
+
  private:
   int mSocket = -1;
   std::unique_ptr<ChildProgram> mOriginal;
