@@ -24,6 +24,7 @@
 #include <cstdlib>
 
 #include "faults/FaultPage.h"
+#include "support/BecomeCopies.h"
 
 // Makes a system call with six arguments; returns the kernel's result, with errors negative. The
 // only call in the process that the filter lets pass, recognised by its return address.
@@ -59,7 +60,7 @@ extern "C" void __libc_free(void* block);
 namespace tallowmere::test {
 namespace {
 
-// Holds the counts before the page is there, and where there is none.
+// Holds the counts before the service begins, and where there is no page.
 FaultPage gOwnPage;
 FaultPage* gPage = &gOwnPage;
 
@@ -168,10 +169,11 @@ __attribute__((constructor)) void Begin() {
       mmap(nullptr, sizeof(FaultPage), PROT_READ | PROT_WRITE, MAP_SHARED, file, 0);
   if (memory == MAP_FAILED) _exit(kCannotCatchCalls);
   close(file);
+  CatchCalls();
+  close(BecomeCopies());
   auto* const page = static_cast<FaultPage*>(memory);
   page->liveAllocations = gOwnPage.liveAllocations.load();
   gPage = page;
-  CatchCalls();
 }
 
 // --- Allocations ------------------------------------------------------------------------------

@@ -117,8 +117,9 @@ bool IsCounted() {
 // One question, asked while something fails.
 class Trial {
  public:
-  explicit Trial(Question question)
-      : mRequest(std::move(question.request)),
+  Trial(const Copies& services, Question question)
+      : mServices(services),
+        mRequest(std::move(question.request)),
         mRight(std::move(question.right)),
         mAnswers(std::move(question.honest)) {
     mAnswers.insert(mRight);
@@ -128,7 +129,7 @@ class Trial {
   // SIGSEGV.
   void FailNewServices(int deadlyAllocations) {
     mDeadlyAllocations = deadlyAllocations;
-    FaultyService sound;
+    FaultyService sound(mServices);
     if (!IsAnswered(sound)) return;
     mEffort = sound.EffortSoFar();
     const Holdings once = sound.Holds();
@@ -173,7 +174,7 @@ class Trial {
   }
 
   std::unique_ptr<FaultyService> OldService() const {
-    auto service = std::make_unique<FaultyService>();
+    auto service = std::make_unique<FaultyService>(mServices);
     service->Ask(mRequest);
     service->Ask(mRequest);
     return service;
@@ -190,7 +191,7 @@ class Trial {
   // still to be read. It does so only once: afterwards it takes no more for each answer than a
   // service without faults.
   void FailANewService(const Fault& fault) {
-    FaultyService service(fault);
+    FaultyService service(mServices, fault);
     if (!Survives(service, fault)) return;
     AskAgain(service, fault);
     const std::int64_t learned = service.Holds().allocations;
@@ -261,6 +262,7 @@ class Trial {
     ADD_FAILURE() << fault.Text() << " " << finding;
   }
 
+  const Copies& mServices;
   std::string mRequest;
   std::string mRight;
   Answers mAnswers;
@@ -361,13 +363,18 @@ class Tree {
       Make("/Disk/twins/" + std::to_string(i) + std::string(250, 'f'));
     }
     Make("/Disk/twins/\u00E9te\u0301");
+    mServices = FaultyService::Original();
   }
 
   bool IsMade() const { return mRoot.IsEntered(); }
   bool IsOnImage() const { return mRoot.IsImage(); }
 
+  // REQUIRES: it is made.
+  const Copies& Services() const { return *mServices; }
+
  private:
   TwoVolumeRoot mRoot;
+  std::unique_ptr<Copies> mServices;
 };
 
 struct Case {
@@ -393,13 +400,15 @@ class Faults : public testing::TestWithParam<Case> {
   static void TearDownTestSuite() { tree.reset(); }
 
   void SetUp() override {
-    if (!FaultyService::IsPossible()) GTEST_SKIP() << "no filter of system calls is permitted";
     if (!tree->IsMade()) GTEST_SKIP() << "no mount and no root of its own is permitted";
+    if (!tree->Services().CanMake()) GTEST_SKIP() << "no filter of system calls is permitted";
     const bool isOnImage = std::string(GetParam().item->name).starts_with("OnExt4");
     if (isOnImage && !tree->IsOnImage()) GTEST_SKIP() << "no image can be mounted";
   }
 
-  static Trial MakeTrial() { return Trial(GetParam().item->learn().Ask(GetParam().code)); }
+  static Trial MakeTrial() {
+    return {tree->Services(), GetParam().item->learn().Ask(GetParam().code)};
+  }
 
   static inline std::unique_ptr<Tree> tree;
 };

@@ -44,27 +44,6 @@ FaultPage& Page() {
   return *Shared().page;
 }
 
-// Puts the library into the environment of processes started during its life.
-class LibraryInTheEnvironment {
- public:
-  LibraryInTheEnvironment() {
-    setenv("LD_PRELOAD", TALLOWMERE_FAULT_LIBRARY, 1);
-    setenv(kFaultPageVariable, std::to_string(Shared().file).c_str(), 1);
-  }
-  LibraryInTheEnvironment(const LibraryInTheEnvironment&) = delete;
-  LibraryInTheEnvironment& operator=(const LibraryInTheEnvironment&) = delete;
-  ~LibraryInTheEnvironment() {
-    unsetenv("LD_PRELOAD");
-    unsetenv(kFaultPageVariable);
-  }
-};
-
-std::unique_ptr<ChildProgram> Start() {
-  const LibraryInTheEnvironment library;
-  return std::make_unique<ChildProgram>(TALLOWMERE_SERVICE,
-                                        std::vector<std::string>{std::to_string(getpid())});
-}
-
 bool HasEnded(pid_t process) {
   siginfo_t about{};
   const bool asked =
@@ -82,17 +61,18 @@ std::string Fault::Text() const {
   return std::string(effect == kShortened ? "fewer bytes" : name) + " from call " + ofAll;
 }
 
-FaultyService::FaultyService(const Fault& fault) {
+std::unique_ptr<Copies> FaultyService::Original() {
+  setenv(kFaultPageVariable, std::to_string(Shared().file).c_str(), 1);
+  return std::make_unique<Copies>(TALLOWMERE_SERVICE, TALLOWMERE_FAULT_LIBRARY);
+}
+
+FaultyService::FaultyService(const Copies& copies, const Fault& fault) {
   Page().rests = 0;
   Page().liveAllocations = 0;
   Arm(fault);
-  mProgram = Start();
+  mProgram = std::make_unique<ChildProgram>(
+      [&copies](const ChildProgram::Streams& streams) { return copies.Make(streams); });
   AwaitRest();
-}
-
-bool FaultyService::IsPossible() {
-  FaultyService service;
-  return service.mRests == 1;
 }
 
 void FaultyService::Arm(const Fault& fault) {

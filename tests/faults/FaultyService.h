@@ -11,6 +11,7 @@
 
 #include "faults/FaultPage.h"
 #include "support/ChildProgram.h"
+#include "support/Copies.h"
 
 namespace tallowmere::test {
 
@@ -50,12 +51,12 @@ struct Holdings {
 
 class FaultyService {
  public:
+  // What services are copied from: they have the root folder that this process has now.
+  static std::unique_ptr<Copies> Original();
+
   // Starts a service with this process as its parent. The fault is counted from the start of its
   // program, whatever it is asked.
-  explicit FaultyService(const Fault& fault = {});
-
-  // Whether the kernel lets the library work here.
-  static bool IsPossible();
+  explicit FaultyService(const Copies& copies, const Fault& fault = {});
 
   // Replaces the fault by this one, counted from now.
   void Arm(const Fault& fault);

@@ -12,6 +12,7 @@
 #include <string>
 #include <utility>
 
+#include "support/Copies.h"
 #include "support/EveryRequest.h"
 #include "support/SmallRoot.h"
 #include "support/StoppedService.h"
@@ -54,10 +55,22 @@ inline std::string Answer(ChildProgram& service, unsigned code, const std::strin
   }
 }
 
+// Services that can be stopped.
+inline const Copies& StoppedServices() {
+  static const Copies services(TALLOWMERE_SERVICE, TALLOWMERE_STOP_AT_CALLS);
+  return services;
+}
+
 // A service that runs freely: it gives the reference answers while nothing changes.
 class Bystander : public ChildProgram {
  public:
-  Bystander() : ChildProgram(ServiceToTest(), {std::to_string(getpid())}) {}
+  Bystander() : ChildProgram(Copy) {}
+
+ private:
+  static pid_t Copy(const Streams& streams) {
+    static const Copies services(TALLOWMERE_SERVICE, TALLOWMERE_COPIES_LIBRARY);
+    return services.Make(streams);
+  }
 };
 
 // Returns the path in a response to code 2, 6, 8 or 9, or an empty string when it has none.
@@ -163,7 +176,8 @@ class Truth {
 class InSmallRoot : public testing::Test {
  protected:
   void SetUp() override {
-    static const bool isThere = EnterSmallRoot({ServiceToTest(), TALLOWMERE_STOP_AT_CALLS});
+    static const bool isThere =
+        EnterSmallRoot({TALLOWMERE_SERVICE, TALLOWMERE_STOP_AT_CALLS, TALLOWMERE_COPIES_LIBRARY});
     if (!isThere) GTEST_SKIP() << "mounting is not permitted here";
   }
 };

@@ -91,7 +91,7 @@ TEST_P(Races, ChangeNoAnswerIntoThatOfAnotherItem) {
     Bystander before;
     const Tree tree(before, name);
     const std::string request = tree.Request(code);
-    StoppedService service(ServiceToTest());
+    StoppedService service(StoppedServices());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     if (knowledge == Knowledge::kOfTheItem) Answer(service.Streams(), 7, tree.Request(7));
     Truth truth(tree.Path(), code);
@@ -152,7 +152,7 @@ TEST_P(RacesOnAWay, LeadOnlyIntoFoldersThatWereOnIt) {
     }
     fs::create_symlink(top.Path() / "targets/1", top.Path() / "first/link");
     fs::create_symlink(top.Path() / "targets/2", top.Path() / "second/link");
-    StoppedService service(ServiceToTest());
+    StoppedService service(StoppedServices());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     const Item asked = ItemAt(service.Streams(), top.Path() / way.asked / kName);
     const auto expected =
@@ -187,7 +187,7 @@ TEST_F(InSmallRoot, TheIdOfAFileIsNotTakenForTheFolderInItsPlace) {
     for (int i = 0; i < 20; ++i) fs::remove(top.MakeFile("for a number that is an id"));
     const fs::path file = top.MakeFile("file");
     const fs::path folder = top.MakeFolder("folder");
-    StoppedService service(ServiceToTest());
+    StoppedService service(StoppedServices());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     ItemAt(service.Streams(), file);
     Item asked = ItemAt(service.Streams(), folder / kName);
@@ -234,7 +234,7 @@ TEST_P(RacesBesideTheItem, ALinkToItsFolderVanishesAndNoAnswerChanges) {
     top.MakeFolder("first/inner");
     std::ofstream(first / "inner" / names.item) << "item";
     fs::create_hard_link(first / "inner" / names.item, top.Path() / "another name.aif");
-    StoppedService service(ServiceToTest());
+    StoppedService service(StoppedServices());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     const Item known = ItemAt(service.Streams(), first / "inner" / names.item);
     fs::rename(first / "inner", folder / "inner");
@@ -273,7 +273,7 @@ TEST_P(RacesBesideTheItem, ALinkToItsVolumeVanishesAndNoAnswerChanges) {
     for (int i = 0; i < 20; ++i) fs::remove(top.MakeFile("folder/volume/first"));
     top.MakeFolder("folder/volume/inner");
     std::ofstream(inner / "inner" / names.item) << "item";
-    StoppedService service(ServiceToTest());
+    StoppedService service(StoppedServices());
     if (!service.CanStop()) GTEST_SKIP() << "the kernel does not let us stop a process here";
     const Item known = ItemAt(service.Streams(), inner / "inner" / names.item);
     if (knowledge == Knowledge::kOfAPass) PassOver(service.Streams(), known);

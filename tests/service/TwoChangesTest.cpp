@@ -246,7 +246,7 @@ class RacesOfTwoChanges
     const auto [changes, code, knowledge] = GetParam();
     const Item item = ItemAt(bystander, volume.Path());
     const std::string request = RequestAbout(item, code);
-    StoppedService service(ServiceToTest());
+    StoppedService service(StoppedServices());
     if (knowledge == Knowledge::kOfTheItem) Answer(service.Streams(), 7, RequestAbout(item, 7));
     Truth truth(item.path, code);
     truth.Note(Answer(bystander, code, request));
@@ -278,7 +278,7 @@ class RacesOfTwoChanges
 };
 
 TEST_P(RacesOfTwoChanges, ChangeNoAnswerIntoThatOfAnotherItem) {
-  if (!StoppedService(ServiceToTest()).CanStop()) {
+  if (!StoppedService(StoppedServices()).CanStop()) {
     GTEST_SKIP() << "the kernel does not let us stop a process here";
   }
   const MovingVolume volume(std::get<0>(GetParam()), mDisk);

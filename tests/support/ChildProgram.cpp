@@ -45,27 +45,37 @@ std::string ReadUpTo(int descriptor, std::size_t size) {
   return bytes;
 }
 
-}  // namespace
-
-ChildProgram::ChildProgram(const std::string& path, const std::vector<std::string>& arguments,
-                           BrokenPipe brokenPipe) {
-  const auto input = MakePipe();
-  const auto output = MakePipe();
-  const auto errors = MakePipe();
+pid_t Execute(const std::string& path, const std::vector<std::string>& arguments,
+              ChildProgram::BrokenPipe brokenPipe, const ChildProgram::Streams& streams) {
   std::vector<std::string> command{path};
   command.insert(command.end(), arguments.begin(), arguments.end());
   const auto vector = ArgumentVector(command);
 
-  mProcess = fork();
-  if (mProcess < 0) std::abort();
-  if (mProcess == 0) {
-    signal(SIGPIPE, brokenPipe == BrokenPipe::kEnds ? SIG_DFL : SIG_IGN);
-    dup2(input[0], STDIN_FILENO);
-    dup2(output[1], STDOUT_FILENO);
-    dup2(errors[1], STDERR_FILENO);
+  const pid_t process = fork();
+  if (process == 0) {
+    signal(SIGPIPE, brokenPipe == ChildProgram::BrokenPipe::kEnds ? SIG_DFL : SIG_IGN);
+    dup2(streams[STDIN_FILENO], STDIN_FILENO);
+    dup2(streams[STDOUT_FILENO], STDOUT_FILENO);
+    dup2(streams[STDERR_FILENO], STDERR_FILENO);
     execvp(path.c_str(), vector.data());
     _exit(127);
   }
+  return process;
+}
+
+}  // namespace
+
+ChildProgram::ChildProgram(const std::string& path, const std::vector<std::string>& arguments,
+                           BrokenPipe brokenPipe)
+    : ChildProgram(
+          [&](const Streams& streams) { return Execute(path, arguments, brokenPipe, streams); }) {}
+
+ChildProgram::ChildProgram(const std::function<pid_t(const Streams&)>& start) {
+  const auto input = MakePipe();
+  const auto output = MakePipe();
+  const auto errors = MakePipe();
+  mProcess = start({input[0], output[1], errors[1]});
+  if (mProcess < 0) std::abort();
   mInputReader = input[0];
   mInput = input[1];
   mOutput = output[0];

@@ -3,7 +3,9 @@
 
 #include <sys/types.h>
 
+#include <array>
 #include <cstddef>
+#include <functional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -18,6 +20,12 @@ class ChildProgram {
   // that fails.
   ChildProgram(const std::string& path, const std::vector<std::string>& arguments,
                BrokenPipe brokenPipe = BrokenPipe::kEnds);
+
+  // With a child of this process that `start` makes another way: it gets the child's three standard
+  // streams, and returns its id.
+  using Streams = std::array<int, 3>;
+  explicit ChildProgram(const std::function<pid_t(const Streams&)>& start);
+
   ChildProgram(const ChildProgram&) = delete;
   ChildProgram& operator=(const ChildProgram&) = delete;
   ~ChildProgram();  // kills the program if it still runs

@@ -1,11 +1,11 @@
-// The message that passes a descriptor through a socket, unix(7): one byte, and room for one
-// descriptor.
+// Passes descriptors through a local socket, unix(7): each with one byte.
 #pragma once
 
 #include <sys/socket.h>
 #include <sys/uio.h>
 
 #include <array>
+#include <cstring>
 
 namespace tallowmere::test {
 
@@ -19,7 +19,6 @@ struct DescriptorMessage {
   DescriptorMessage(const DescriptorMessage&) = delete;
   DescriptorMessage& operator=(const DescriptorMessage&) = delete;
 
-  // The message to send or receive, of one byte.
   msghdr message{};
 
  private:
@@ -27,5 +26,26 @@ struct DescriptorMessage {
   iovec data{&byte, 1};
   alignas(cmsghdr) std::array<char, CMSG_SPACE(sizeof(int))> control{};
 };
+
+inline bool SendDescriptor(int socket, int descriptor) {
+  DescriptorMessage sent;
+  cmsghdr* const header = CMSG_FIRSTHDR(&sent.message);
+  header->cmsg_level = SOL_SOCKET;
+  header->cmsg_type = SCM_RIGHTS;
+  header->cmsg_len = CMSG_LEN(sizeof descriptor);
+  std::memcpy(CMSG_DATA(header), &descriptor, sizeof descriptor);
+  return sendmsg(socket, &sent.message, MSG_NOSIGNAL) == 1;
+}
+
+// Waits for a descriptor, which started programs do not inherit; -1 when the other end is closed.
+inline int ReceiveDescriptor(int socket) {
+  DescriptorMessage received;
+  if (recvmsg(socket, &received.message, MSG_CMSG_CLOEXEC) != 1) return -1;
+  const cmsghdr* const header = CMSG_FIRSTHDR(&received.message);
+  if (header == nullptr || header->cmsg_type != SCM_RIGHTS) return -1;
+  int descriptor = -1;
+  std::memcpy(&descriptor, CMSG_DATA(header), sizeof descriptor);
+  return descriptor;
+}
 
 }  // namespace tallowmere::test

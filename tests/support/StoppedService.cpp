@@ -3,41 +3,15 @@
 #include <linux/seccomp.h>
 #include <poll.h>
 #include <sys/ioctl.h>
-#include <sys/socket.h>
 #include <unistd.h>
 
-#include <array>
-#include <cstdlib>
-#include <cstring>
 #include <utility>
 
-#include "support/DescriptorMessage.h"
-
 namespace tallowmere::test {
-namespace {
-
-// Receives a descriptor from a socket; -1 when there is none.
-int Receive(int socket) {
-  DescriptorMessage received;
-  if (recvmsg(socket, &received.message, MSG_CMSG_CLOEXEC) != 1) return -1;
-  const cmsghdr* const header = CMSG_FIRSTHDR(&received.message);
-  if (header == nullptr || header->cmsg_type != SCM_RIGHTS) return -1;
-  int descriptor = -1;
-  std::memcpy(&descriptor, CMSG_DATA(header), sizeof descriptor);
-  return descriptor;
-}
-
-}  // namespace
-
-StoppedService::StoppedService(const std::string& program) {
-  std::array<int, 2> ends{};
-  if (socketpair(AF_UNIX, SOCK_STREAM, 0, ends.data()) != 0) std::abort();
-  mSocket = ends[0];
+StoppedService::StoppedService(const Copies& services) {
   mProgram = std::make_unique<ChildProgram>(
-      TALLOWMERE_STOP_AT_CALLS,
-      std::vector<std::string>{std::to_string(ends[1]), program, std::to_string(getpid())});
-  close(ends[1]);
-  mListener = Receive(mSocket);
+      [&services](const ChildProgram::Streams& streams) { return services.Make(streams); });
+  mListener = services.Descriptor();
   if (mListener >= 0) mSupervisor = std::thread([this] { Supervise(); });
 }
 
@@ -45,7 +19,6 @@ StoppedService::~StoppedService() {
   mProgram.reset();
   if (mSupervisor.joinable()) mSupervisor.join();
   if (mListener >= 0) close(mListener);
-  close(mSocket);
 }
 
 void StoppedService::ChangeAt(int call, std::function<void()> change) {

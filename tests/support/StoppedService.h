@@ -5,16 +5,17 @@
 #include <map>
 #include <memory>
 #include <mutex>
-#include <string>
 #include <thread>
 
 #include "support/ChildProgram.h"
+#include "support/Copies.h"
 
 namespace tallowmere::test {
 
 class StoppedService {
  public:
-  explicit StoppedService(const std::string& program);
+  // Makes a copy of a service with the library of StopAtCalls.cpp.
+  explicit StoppedService(const Copies& services);
   StoppedService(const StoppedService&) = delete;
   StoppedService& operator=(const StoppedService&) = delete;
   ~StoppedService();
@@ -38,7 +39,6 @@ class StoppedService {
  private:
   void Supervise();
 
-  int mSocket = -1;
   int mListener = -1;
   std::unique_ptr<ChildProgram> mProgram;
   std::thread mSupervisor;
