@@ -37,6 +37,7 @@ struct Arguments {
   std::string topic;
   Sound sound;
   bool asHex = false;
+  bool targetsOnly = false;
   RecordOptions records;
 };
 
@@ -202,9 +203,9 @@ class CommandLine {
                       "Items of standard input end with a NUL, not a newline");
   }
 
-  void AddNullOutput(CLI::App* command) {
-    command->add_flag("--null-output", mArguments.items.format.hasNullOutput,
-                      "Results end with a NUL, not a newline; JSON is lines all the same");
+  CLI::Option* AddNullOutput(CLI::App* command) {
+    return command->add_flag("--null-output", mArguments.items.format.hasNullOutput,
+                             "Results end with a NUL, not a newline; JSON is lines all the same");
   }
 
   void AddQuiet(CLI::App* command, const std::string& what) {
@@ -231,6 +232,16 @@ class CommandLine {
                      "Lines OLD-NUMBER-OR-NAME=PLACE tell where volumes are; '#' begins a comment")
         ->check(CheckPlace)
         ->type_name("FILE");
+  }
+
+  void AddMaps(CLI::App* command) {
+    command
+        ->add_option("--map", mArguments.records.places.maps,
+                     "The volume that was called so has been copied into a folder")
+        ->check(CheckMap)
+        ->type_name("OLD-NAME=FOLDER")
+        ->allow_extra_args(false);
+    AddTable(command);
   }
 
   void AddRecordOptions(CLI::App* command);
@@ -321,13 +332,7 @@ void CommandLine::AddHFSPaths() {
                           "  tallowmere-cli posix --map 'Old Disk=/srv/copies/old' 'Old Disk:Mix'",
                           [&a] { return PrintPathsOfHFSPaths(a.items, a.records.places); });
   AddItems(command, "hfspath", "HFS paths, in UTF-8");
-  command
-      ->add_option("--map", a.records.places.maps,
-                   "The volume that was called so has been copied into a folder")
-      ->check(CheckMap)
-      ->type_name("OLD-NAME=FOLDER")
-      ->allow_extra_args(false);
-  AddTable(command);
+  AddMaps(command);
 }
 
 void CommandLine::AddNames() {
@@ -396,13 +401,22 @@ void CommandLine::AddCensusAndAliases() {
   command =
       Add("alias", "Print what each alias file, record or bookmark says, and where it leads now",
           "  tallowmere-cli alias 'Old Disk/Mix alias'\n"
-          "  tallowmere-cli alias --hex --json - <records",
-          [&a] { return PrintAliases(a.items.items, a.items.format, a.asHex); });
+          "  find . -type f -print0 | tallowmere-cli alias -0 --json -\n"
+          "  tallowmere-cli alias --target --map 'Old Disk=/srv/copies/old' 'Mix alias'",
+          [&a] {
+            return PrintAliases(a.items.items, a.items.format,
+                                {a.asHex, a.targetsOnly, a.records.places});
+          });
   AddJson(command);
   AddNullInput(command);
-  AddQuiet(command, "No summary");
+  CLI::Option* const target = command->add_flag(
+      "--target", a.targetsOnly, "A line for each item: the path of where it leads, and no more");
+  AddNullOutput(command)->needs(target);
+  AddQuiet(command, "Neither a progress bar nor a summary");
+  AddNoProgress(command);
   AddItems(command, "file", "Alias files, or files with a record or bookmark");
   command->add_flag("--hex", a.asHex, "The items are bytes as hexadecimal digits");
+  AddMaps(command);
 }
 
 void CommandLine::AddCheck() {
