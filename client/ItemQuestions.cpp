@@ -140,18 +140,20 @@ class HFSPathQuestion final : public ItemQuestion<std::string> {
       return Whole(exchange, *holder + record.name, *holder, FolderOf(GetPlace().path));
     }
     std::string path = holder ? *holder + record.name + protocol::kSeparator : "";
-    if (**mOwn == path || (holder && IsLongNameIn(*holder))) {
+    if (**mOwn == path || (holder && IsLongAndNamedAsHere(record.name))) {
       return Whole(exchange, **mOwn, **mOwn, GetPlace().path);
     }
     return OfMountPoint(exchange, holder, std::move(path));
   }
 
-  // Whether the folder's own path ends with a name in its holder of which the record has but a
-  // short form, and is too long to be asked about.
-  bool IsLongNameIn(const std::string& holder) const {
-    const std::string& own = **mOwn;
-    return own.size() > protocol::kLongestHFSPath && own.starts_with(holder) &&
-           own.find(protocol::kSeparator, holder.size()) == own.size() - 1;
+  // Whether the folder's own path is too long to be asked about, and ends with the folder's name,
+  // of which the record may have but a short form.
+  bool IsLongAndNamedAsHere(const std::string& recordName) const {
+    std::string_view own = **mOwn;
+    if (own.size() <= protocol::kLongestHFSPath) return false;
+    own.remove_suffix(1);
+    const std::string_view name = own.substr(own.rfind(protocol::kSeparator) + 1);
+    return name == recordName || name == HFSNameOfLinuxName(GetPlace().Name());
   }
 
   // Of a folder at which something is mounted that is no volume of its own, the service tells the
