@@ -356,11 +356,7 @@ int PrintAliases(const std::vector<std::string>& arguments, const Format& format
     aliases.Take(report, *item);
     report.ShowProgress(items.Done());
   }
-  const int status = report.Finish();
-  if (const int error = items.ReadError()) {
-    return Complain("standard input: " + std::generic_category().message(error));
-  }
-  return status;
+  return report.Finish(items);
 }
 
 }  // namespace tallowmere::cli

@@ -2,7 +2,6 @@
 
 #include <iostream>
 #include <memory>
-#include <system_error>
 #include <utility>
 #include <vector>
 
@@ -74,11 +73,7 @@ int Convert(const ItemsToAsk& toAsk, const Ask& ask) {
     report.ShowProgress(items.Done());
   }
   if (report.GoesOn()) answerAll();
-  const int status = report.Finish();
-  if (const int error = items.ReadError()) {
-    return Complain("standard input: " + std::generic_category().message(error));
-  }
-  return status;
+  return report.Finish(items);
 }
 
 std::optional<std::string> WhyItDoesNotAnswer(Client& client) {

@@ -42,7 +42,9 @@ std::string WhyNoRecords(std::size_t size, const RecordForm& form) {
   if (size < form.skip) return "it has fewer bytes than are to be skipped";
   const std::size_t left = (size - form.skip) % form.stride;
   if (left == 0 || left >= protocol::kFileSpecSize) return {};
-  return "the " + std::to_string(left) + " bytes at its end are no record of 70";
+  const std::string last =
+      left == 1 ? "its last byte is" : "its last " + std::to_string(left) + " bytes are";
+  return last + " no record of 70 bytes";
 }
 
 // In the other byte order, it is above 24 bits.

@@ -5,12 +5,15 @@
 #include <bit>
 #include <charconv>
 #include <chrono>
+#include <cstdint>
 #include <exception>
+#include <filesystem>
 #include <functional>
 #include <iostream>
 #include <map>
 #include <optional>
 #include <string>
+#include <system_error>
 #include <utility>
 #include <vector>
 
@@ -49,7 +52,15 @@ std::optional<double> ReadNumber(const std::string& text) {
   return number;
 }
 
-// Checks of numbers: return what is wrong, or an empty text.
+// As the parser reads it, which takes a sign as well.
+std::optional<std::size_t> ReadCount(const std::string& text) {
+  std::size_t count = 0;
+  const bool isCount =
+      text.find_first_of("+-") == std::string::npos && CLI::detail::lexical_cast(text, count);
+  return isCount ? std::optional(count) : std::nullopt;
+}
+
+// Checks of values: return what is wrong, or an empty text.
 std::string CheckTime(const std::string& text) {
   const auto seconds = ReadNumber(text);
   return seconds && *seconds > 0 ? "" : text + " is no time above 0";
@@ -64,19 +75,34 @@ std::string CheckPlace(const std::string& text) {
   return text.empty() ? "an empty text is no place" : "";
 }
 
+std::string CheckBits(const std::string& text) {
+  const auto bits = ReadCount(text);
+  return bits && *bits <= UINT16_MAX ? "" : text + " is no number of bits below 65536";
+}
+
+std::string CheckChannels(const std::string& text) {
+  const auto channels = ReadCount(text);
+  return channels && *channels <= UINT8_MAX ? "" : text + " is no number of channels below 256";
+}
+
+std::string CheckFolder(const std::string& text) {
+  std::error_code error;
+  if (std::filesystem::is_directory(text, error)) return "";
+  const bool isHidden = error == std::errc::permission_denied;
+  return isHidden ? '"' + text + "\" cannot be looked at: " + error.message()
+                  : "there is no folder \"" + text + '"';
+}
+
 std::string CheckMap(const std::string& text) {
   return ReadPlace(text) ? "" : '"' + text + "\" is no OLD-NAME=FOLDER";
 }
 
-// In bytes: 0 to 2^53, which every double holds.
 std::string CheckCount(const std::string& text) {
-  constexpr double kMost = 9007199254740992;
-  const auto bytes = ReadNumber(text);
-  return !bytes || (*bytes >= 0 && *bytes <= kMost) ? "" : text + " is no number of bytes";
+  return ReadCount(text) ? "" : text + " is no number of bytes";
 }
 
 std::string CheckStride(const std::string& text) {
-  const auto bytes = ReadNumber(text);
+  const auto bytes = ReadCount(text);
   if (bytes && *bytes < 70) return text + " is less than the 70 bytes of a record";
   return CheckCount(text);
 }
@@ -282,6 +308,7 @@ void CommandLine::AddRecordOptions(CLI::App* command) {
       ->type_name("ORDER");
   CLI::Option* const packed = command->add_flag("--packed", records.form.isPacked,
                                                 "Items are files of records, 70 bytes each");
+  packed->excludes(command->get_option("--null"));
   command->add_option("--skip", records.form.skip, "Bytes in front of a file's first record")
       ->needs(packed)
       ->check(CheckCount);
@@ -373,9 +400,11 @@ void CommandLine::AddAudio() {
           });
   AddJson(command);
   command->add_option("--rate", a.sound.hertz, "In hertz")->check(CheckRate)->capture_default_str();
-  command->add_option("--bits", a.sound.bits, "In a sample")->capture_default_str();
+  command->add_option("--bits", a.sound.bits, "In a sample")
+      ->check(CheckBits)
+      ->capture_default_str();
   command->add_option("--channels", a.sound.channels, "Of the sound")
-      ->check(CLI::Range(0, 255))
+      ->check(CheckChannels)
       ->capture_default_str();
   command->add_option("--format", a.sound.format, "Four-character code")
       ->check([](const std::string& code) {
@@ -396,7 +425,10 @@ void CommandLine::AddCensusAndAliases() {
   AddJson(command);
   AddQuiet(command, "No progress bar");
   AddNoProgress(command);
-  command->add_option("folder", a.folder, "The folder")->required()->check(CLI::ExistingDirectory);
+  command->add_option("folder", a.folder, "The folder")
+      ->required()
+      ->check(CheckFolder)
+      ->type_name("");
 
   command =
       Add("alias", "Print what each alias file, record or bookmark says, and where it leads now",

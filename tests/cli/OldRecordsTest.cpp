@@ -181,7 +181,7 @@ TEST_F(OldRecords, AFileThatDoesNotEndWithARecordIsRefused) {
   for (const std::string& bytes : {one + "x", one.substr(1)}) {
     const Output output = Cli({"path", "--packed", Write("packed", bytes)});
     EXPECT_EQ(output.status, 1);
-    EXPECT_THAT(output.errors, HasSubstr("are no record of 70"));
+    EXPECT_THAT(output.errors, HasSubstr("no record of 70 bytes"));
     EXPECT_EQ(output.text, "");
   }
   EXPECT_THAT(Cli({"path", "--packed", "--skip", "9", Write("packed", "x")}).errors,
@@ -189,6 +189,24 @@ TEST_F(OldRecords, AFileThatDoesNotEndWithARecordIsRefused) {
   EXPECT_THAT(Cli({"path", "--packed", mFolder.Path().string()}).errors,
               HasSubstr("Is a directory"));
   EXPECT_EQ(Cli({"path", "--packed", "--stride", "69", "x"}).status, 2);
+  EXPECT_EQ(Cli({"path", "--packed", Write("packed", one + "x")}).errors,
+            "tallowmere-cli: " + (mFolder.Path() / "packed").string() +
+                ": its last byte is no record of 70 bytes\n");
+}
+
+TEST_F(OldRecords, OptionsOfPackedFilesAreCheckedBeforeAnythingIsRead) {
+  const auto faultOf = [](const std::vector<std::string>& options) {
+    std::vector<std::string> command{"path", "--packed", "/nonexistent"};
+    command.insert(command.end(), options.begin(), options.end());
+    const Output output = Cli(command);
+    EXPECT_EQ(output.status, 2);
+    return output.errors;
+  };
+  EXPECT_THAT(faultOf({"--skip", "-1"}), HasSubstr("--skip: -1 is no number of bytes"));
+  EXPECT_THAT(faultOf({"--stride", "1e3"}), HasSubstr("--stride: 1e3 is no number of bytes"));
+  EXPECT_THAT(faultOf({"--stride", "69"}), HasSubstr("69 is less than the 70 bytes of a record"));
+  // There are no lines for it to end.
+  EXPECT_THAT(faultOf({"--null"}), HasSubstr("excludes"));
 }
 
 TEST_F(OldRecords, OfAVolumeItselfHaveTheNameThatItHasNow) {
