@@ -14,8 +14,8 @@
 namespace tallowmere::cli {
 namespace {
 
-// What one service is asked at a time: enough that waiting for its last answer does not matter, and
-// not too much for memory.
+// What one service is asked at a time: enough that waiting for its last answer costs little, and
+// little enough for memory.
 constexpr std::size_t kMostItems = 1024;
 constexpr std::size_t kMostBytes = 1 << 18;
 

@@ -38,7 +38,7 @@ Result<std::string> FolderAt(const std::string& place) {
 
 // --- Names --------------------------------------------------------------------------------------
 
-// Nullopt for what no file name can be.
+// Adds nothing for a text that no file name can be.
 void AddForm(const std::u16string& text, std::vector<std::string>& forms) {
   if (auto form = text::FileNameOfText(text)) forms.push_back(*std::move(form));
 }
@@ -49,7 +49,7 @@ bool IsUtf8(std::string_view bytes) {
                       [](char16_t unit) { return text::IsEscapedByte(unit); });
 }
 
-// What the name is called where it is not called as it is, most likely first.
+// The other ways to write a name, most likely first.
 std::vector<std::string> OtherFormsOf(const std::string& name) {
   const std::u16string text = text::TextOfFileName(name);
   std::vector<std::string> forms;
@@ -121,7 +121,7 @@ Result<std::optional<std::string>> EntryInAnyForm(const Folder& folder, const st
                                         ", with their accents written in two ways"};
 }
 
-// What the item is called here; nullopt where it is not there.
+// The name of the item as it is stored; nullopt where there is no such item.
 Result<std::optional<std::string>> EntryOf(const Folder& folder, const std::string& name) {
   std::vector<std::string> forms = {name};
   const bool hasOneForm = text::IsAllAscii(std::string_view(name));
@@ -190,7 +190,7 @@ Result<CopiedVolumes> CopiedVolumes::Read(const OldPlaces& places) {
   }
   for (std::size_t i = 0; i < all.size(); ++i) {
     auto folder = FolderAt(all[i].place);
-    // A table may be another command's, too: what it tells of other volumes does not matter.
+    // A table may serve other commands and volumes too: only its own items fail by a wrong line.
     if (!folder && i >= told) return folder.Failure();
     if (!copies.mFolders.emplace(KeyOfVolume(all[i].old), std::move(folder)).second) {
       return Error{Outcome::kAmbiguous, Quoted(all[i].old) + " has two places"};

@@ -12,7 +12,7 @@
 namespace tallowmere::cli {
 namespace {
 
-// From so many items on, a person cannot count what failed.
+// From this many items on, nobody counts failures by hand.
 constexpr std::uint64_t kManyItems = 1000;
 
 }  // namespace

@@ -26,8 +26,8 @@ class Report {
   // Whether the output can still be written.
   bool GoesOn() const;
 
-  // Returns the program's exit status once everything has been printed: also kFailed where the
-  // items could not all be read, with a complaint. After many items, a summary goes to standard
+  // Prints what remains and returns the program's exit status: kFailed also where standard input
+  // could not be read to its end, with a complaint. After many items, prints a summary on standard
   // error.
   int Finish(const Items& items);
 

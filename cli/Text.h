@@ -7,7 +7,7 @@
 
 namespace tallowmere::cli {
 
-// The text with each byte of a control character, and each that is not UTF-8, written as a
+// The text with each byte of a control character, and each byte outside UTF-8, written as a
 // backslash and three octal digits, so that no name can break a table or control a terminal.
 std::string Printable(std::string_view text);
 

@@ -26,7 +26,7 @@ namespace {
 
 using namespace tallowmere::cli;
 
-// Without privilege, a request can take a pass over a whole volume.
+// Without privilege, one request may walk a whole volume.
 constexpr double kSecondsForARequest = 600;
 
 const std::string kHelpTells = "--help tells more";
@@ -52,7 +52,7 @@ std::optional<double> ReadNumber(const std::string& text) {
   return number;
 }
 
-// As the parser reads it, which takes a sign as well.
+// Reads a number as the parser does, but without a sign.
 std::optional<std::size_t> ReadCount(const std::string& text) {
   std::size_t count = 0;
   const bool isCount =
@@ -161,7 +161,7 @@ class CommandLine {
     return kWrongUsage;
   }
 
-  // What the arguments have that no command takes, whatever else is wrong with them.
+  // Names the first argument that no command takes, whatever else is wrong.
   std::optional<std::string> WhatIsUnknown() const {
     const std::vector<std::string> words = mApp.remaining(true);
     const auto end = std::find(words.begin(), words.end(), "--");

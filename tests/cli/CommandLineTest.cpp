@@ -226,7 +226,7 @@ TEST(CommandLine, TheVersionHasAShortOption) {
   EXPECT_EQ(Printed({"-V"}), Printed({"--version"}));
 }
 
-// Its parts are those that a shell runs.
+// As a shell runs them.
 TEST(CommandLine, TheExamplesOfTheHelpRun) {
   ChildProgram shell("/bin/bash",
                      {"-c",

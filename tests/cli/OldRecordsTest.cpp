@@ -94,7 +94,7 @@ TEST_F(OldRecords, OfTheOtherByteOrderAreHintedAt) {
   EXPECT_THAT(Cli({"path", "99:2:x"}).errors, Not(HasSubstr("byte order")));
 }
 
-// Foreign numbers are no sign where the volume is told, but parent ids are.
+// Where the volume is told, any number is right: the parent id gives the hint.
 TEST_F(OldRecords, OfTheOtherByteOrderAreHintedAtWhereTheirVolumeIsTold) {
   const std::string place = Place();
   const auto errorOf = [&](FSSpec record, std::endian order) {
@@ -319,7 +319,7 @@ TEST_F(ACopiedDisk, TellsWhatItLacks) {
   EXPECT_EQ(errorOf("Old Disk:no folder:"), none + "/no folder\"");
   EXPECT_EQ(errorOf("Old Disk:top:"), none + "/top\"");
   EXPECT_EQ(errorOf("Old Disk:top:none"), none + "/top\"");
-  // As names of Linux these are other files.
+  // Linux files with these names are called otherwise in HFS terms.
   EXPECT_EQ(Posix("Old Disk:lost")["status"], "new");
   EXPECT_EQ(Posix("Old Disk:lost:item")["status"], "nothing");
 }
