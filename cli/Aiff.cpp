@@ -38,7 +38,7 @@ void PrintAsJson(const Sound& sound, std::string_view settings) {
   std::cout << json.dump() << '\n';
 }
 
-// What is stored in part is removed, unless it is a device or the like.
+// Removes a file that could not be written whole; leaves devices and the like.
 int Store(const std::string& bytes, const std::string& path) {
   std::ofstream file(path, std::ios::binary);
   if (!file) return Complain(path + ": " + std::generic_category().message(errno));

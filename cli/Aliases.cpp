@@ -14,9 +14,14 @@
 #include <string_view>
 #include <system_error>
 
+#include "cli/CopiedVolumes.h"
+#include "cli/Finding.h"
 #include "cli/Items.h"
 #include "cli/Output.h"
+#include "cli/Report.h"
 #include "cli/Text.h"
+#include "client/Places.h"
+#include "client/Quoted.h"
 
 namespace tallowmere::cli {
 namespace {
@@ -68,36 +73,41 @@ std::string_view NameOf(Found found) {
   }
 }
 
-std::string_view ReasonOf(OSErr result, bool isAlias) {
+// Why no alias could be read, by its result code.
+Error WhyNotRead(OSErr result) {
   switch (result) {
     case nsvErr:
-      return "its volume is not mounted";
+      return {Outcome::kNotAVolume, "it is on no volume"};
     case fnfErr:
-      return isAlias ? "its target is not there, or not certain" : "there is no such file";
+      return {Outcome::kNothing, "there is no such file"};
     case dirNFErr:
-      return isAlias ? "a folder on the way to its target is missing" : "there is no such folder";
+      return {Outcome::kNothing, "there is no such folder"};
     case afpAccessDenied:
-      return "permission denied";
+      return {Outcome::kRefused, "permission denied"};
     case paramErr:
-      return "no alias, or a broken one";
+      return {Outcome::kInvalid, "no alias, or a broken one"};
     default:
-      return "it cannot be read";
+      return {Outcome::kRefused, "it cannot be read"};
   }
 }
 
-Outcome OutcomeOf(OSErr result) {
+// Why an alias leads nowhere.
+Error WhyNoTarget(OSErr result, const Description& d) {
+  const std::string name = d.name.empty() ? "" : " " + Quoted(d.name);
   switch (result) {
-    case noErr:
-      return Outcome::kFound;
     case nsvErr:
-      return Outcome::kNotAVolume;
+      if (d.volumeName.empty()) return {Outcome::kNotAVolume, "it names no volume"};
+      return {Outcome::kNotAVolume, "its volume " + Quoted(d.volumeName) + " is not mounted"};
     case fnfErr:
+      return {Outcome::kNothing, "its target" + name + " is not there, or not certain"};
     case dirNFErr:
-      return Outcome::kNothing;
+      return {Outcome::kNothing, "a folder on the way to its target" + name + " is missing"};
+    case afpAccessDenied:
+      return {Outcome::kRefused, "the way to its target" + name + " is not permitted"};
     case paramErr:
-      return Outcome::kInvalid;
+      return {Outcome::kInvalid, "it is broken"};
     default:
-      return Outcome::kRefused;
+      return {Outcome::kRefused, "the system fails on the way to its target" + name};
   }
 }
 
@@ -152,7 +162,7 @@ class Fields {
     mFields.push_back({key, words, std::move(value)});
   }
   void AddText(const char* key, const char* words, const std::string& text) {
-    if (!text.empty()) Add(key, words, Utf8OfAnyBytes(text));
+    if (!text.empty()) Add(key, words, text);
   }
   void AddDate(const char* key, const char* words, const std::optional<alias::Date>& date) {
     if (date) Add(key, words, TextOf(*date));
@@ -165,104 +175,188 @@ class Fields {
   std::vector<Field> mFields;
 };
 
-void PrintAsJson(const std::string& item, const Answer& answer) {
-  nlohmann::ordered_json json;
-  json["alias"] = Utf8OfAnyBytes(item);
-  if (answer.description) {
-    const Fields fields(*answer.description);
-    for (const Field& field : fields.All()) json[field.key] = field.value;
+// --- Where it leads -----------------------------------------------------------------------------
+
+struct Target {
+  std::string path;
+  bool isFolder;
+  std::string_view by;
+};
+
+Result<Target> CheckKind(const Description& d, const std::string& path) {
+  const auto looked = LookAt(path);
+  if (!looked) return looked.Failure();
+  if (!looked->exists) {
+    return Error{Outcome::kNothing, "there is no file or folder " + Quoted(path)};
   }
-  json["status"] = Name(OutcomeOf(answer.result));
-  json["exists"] = answer.result == noErr;
-  if (answer.result == noErr) {
-    json["target"] = Utf8OfAnyBytes(answer.path);
-    json["is_folder"] = answer.isFolder;
-    json["by"] = NameOf(answer.found);
-  } else {
-    json["error"] = ReasonOf(answer.result, answer.description.has_value());
+  if (looked->isFolder != d.isFolder) {
+    const std::string kind = d.isFolder ? " is no folder" : " is a folder";
+    return Error{Outcome::kNothing, Quoted(path) + kind + ", unlike its target"};
   }
-  std::cout << json.dump() << '\n';
+  return Target{path, looked->isFolder, "map"};
 }
 
-void PrintLine(std::string_view words, const std::string& value) {
-  constexpr std::size_t kWidth = 18;
-  std::cout << "  " << words << std::string(kWidth - words.size(), ' ') << value << '\n';
+// The target in a copy of its volume. All readings of its path that lead to an item lead to one.
+Result<Target> TargetInCopy(const Description& d, const std::string& copy) {
+  Result<Target> found(Error{Outcome::kNothing, "it tells no path on its volume"});
+  for (const auto& way : d.waysOnVolume) {
+    const auto path = PathInCopy(copy, way);
+    auto target = path ? CheckKind(d, path->value) : Result<Target>(path.Failure());
+    if (target && found && !IsSameItem(found->path, target->path)) {
+      return Error{Outcome::kAmbiguous,
+                   "its path leads to " + Quoted(found->path) + " and to " + Quoted(target->path)};
+    }
+    if (!found) found = std::move(target);
+  }
+  return found;
 }
 
-void PrintAsText(const std::string& item, const Answer& answer) {
-  std::cout << Printable(item) << '\n';
-  const Fields fields(*answer.description);
-  for (const Field& field : fields.All()) {
-    PrintLine(field.words, field.value.is_string()
-                               ? Printable(field.value.get_ref<const std::string&>())
-                               : field.value.dump());
+// An alias that leads to a neighbour is followed there; otherwise a copy of its volume counts as
+// the volume.
+Result<Target> TargetOf(const Answer& answer, const CopiedVolumes& copies) {
+  const bool isNeighbour = answer.result == noErr && answer.found == Found::kByLevels;
+  const auto copy = copies.FolderOf(answer.description->volumeName);
+  if (copy && !isNeighbour) {
+    return *copy ? TargetInCopy(*answer.description, **copy) : copy->Failure();
   }
-  if (answer.result == noErr) {
-    PrintLine("leads to",
-              Printable(answer.path) + " (by " + std::string(NameOf(answer.found)) + ")");
-  } else {
-    PrintLine("leads to", "nothing: " + std::string(ReasonOf(answer.result, true)));
-  }
+  if (answer.result != noErr) return WhyNoTarget(answer.result, *answer.description);
+  return Target{answer.path, answer.isFolder, NameOf(answer.found)};
 }
 
 // --- Items --------------------------------------------------------------------------------------
 
-std::optional<std::string> BytesOfHex(const std::string& digits) {
+// Digits may have blanks between them.
+Result<std::string> BytesOfHex(const std::string& digits) {
   std::string bytes;
   for (std::size_t at = 0; (at = digits.find_first_not_of(kBlanks, at)) != std::string::npos;) {
     unsigned byte = 0;
     const char* const begin = digits.data() + at;
     const bool isPair =
         at + 2 <= digits.size() && std::from_chars(begin, begin + 2, byte, 16).ptr == begin + 2;
-    if (!isPair) return std::nullopt;
+    if (!isPair) return Error{Outcome::kInvalid, "it is not in hexadecimal, two digits a byte"};
     bytes.push_back(static_cast<char>(byte));
     at += 2;
   }
+  if (bytes.empty()) return Error{Outcome::kInvalid, "it has no hexadecimal digits"};
   return bytes;
 }
 
-Answer AnswerTo(const std::string& item, bool isHex) {
-  if (isHex) {
-    const auto bytes = BytesOfHex(item);
-    return alias::LookAtBytes(bytes.value_or(""));
+// The path of the file that an item names, without links.
+Result<std::string> FileAt(const std::string& item) {
+  const auto place = Places(true).Find(item);
+  if (!place) return place.Failure();
+  if (!place->exists) return WhyNotRead(fnfErr);
+  std::error_code error;
+  const auto path = std::filesystem::canonical(place->path, error);
+  if (error == std::errc::permission_denied) return WhyNotRead(afpAccessDenied);
+  if (error) return Error{Outcome::kNothing, "it is a link that leads nowhere"};
+  const auto kind = std::filesystem::status(path, error).type();
+  if (kind == std::filesystem::file_type::directory) {
+    return Error{Outcome::kInvalid, "it is a folder, not a file"};
   }
-  std::error_code ignored;
-  auto path = std::filesystem::absolute(item, ignored);
-  const auto name = path.filename();
-  if (name.empty() || name == "." || name == "..") {
-    path = std::filesystem::canonical(path, ignored);
+  if (kind != std::filesystem::file_type::regular) {
+    return Error{Outcome::kInvalid, "it is no regular file"};
   }
-  return alias::LookAtFile(path.string());
+  return path.string();
 }
 
-bool Print(const std::string& item, bool isHex, bool isJson) {
-  const Answer answer = AnswerTo(item, isHex);
-  if (isJson) {
-    PrintAsJson(item, answer);
-  } else if (answer.description) {
-    PrintAsText(item, answer);
-  } else {
-    Complain(item + ": " + std::string(ReasonOf(answer.result, false)));
-  }
-  return answer.result == noErr;
+// What an item says. Fails for one that is no alias.
+Result<Answer> AnswerTo(const std::string& item, bool isHex) {
+  const auto read = isHex ? BytesOfHex(item) : FileAt(item);
+  if (!read) return read.Failure();
+  Answer answer = isHex ? alias::LookAtBytes(*read) : alias::LookAtFile(*read);
+  if (!answer.description) return WhyNotRead(answer.result);
+  return answer;
 }
+
+// --- Printing -----------------------------------------------------------------------------------
+
+void PrintLine(std::string_view words, const std::string& value) {
+  constexpr std::size_t kWidth = 18;
+  std::cout << "  " << words << std::string(kWidth - words.size(), ' ') << value << '\n';
+}
+
+void PrintAsText(const std::string& item, const Description& description,
+                 const Result<Target>& target) {
+  std::cout << Printable(item) << '\n';
+  const Fields fields(description);
+  for (const Field& field : fields.All()) {
+    PrintLine(field.words, field.value.is_string()
+                               ? Printable(field.value.get_ref<const std::string&>())
+                               : field.value.dump());
+  }
+  PrintLine("leads to", target ? Printable(target->path) + " (by " + std::string(target->by) + ")"
+                               : "nothing: " + Printable(target.Failure().message));
+}
+
+void Fill(Json& json, const Description& description) {
+  const Fields fields(description);
+  for (const Field& field : fields.All()) {
+    if (field.value.is_string()) {
+      Put(json, field.key, field.value.get_ref<const std::string&>());
+    } else {
+      json[field.key] = field.value;
+    }
+  }
+}
+
+class Aliases {
+ public:
+  Aliases(const Format& format, const AliasOptions& options, const CopiedVolumes& copies)
+      : mFormat(format), mOptions(options), mCopies(copies), mFindings(format, "alias") {}
+
+  void Take(Report& report, const std::string& item) const {
+    const auto answer = AnswerTo(item, mOptions.areHex);
+    if (!answer) return report.Print(mFindings.Failure(item, answer.Failure()));
+    const Description& description = *answer->description;
+    const auto target = TargetOf(*answer, mCopies);
+    const Finding finding = FindingOf(item, description, target);
+    if (mFormat.isJson || mOptions.targetsOnly) return report.Print(finding);
+    report.Count(finding);
+    PrintAsText(item, description, target);
+  }
+
+ private:
+  Finding FindingOf(const std::string& item, const Description& description,
+                    const Result<Target>& target) const {
+    if (!target) {
+      return mFindings.Failure(item, target.Failure(), [&](Json& json) {
+        Fill(json, description);
+        json["exists"] = false;
+      });
+    }
+    const std::string text = mOptions.targetsOnly ? target->path : "";
+    return mFindings.Answer(item, Outcome::kFound, text, [&](Json& json) {
+      Fill(json, description);
+      json["exists"] = true;
+      Put(json, "target", target->path);
+      json["is_folder"] = target->isFolder;
+      json["by"] = target->by;
+    });
+  }
+
+  const Format& mFormat;
+  const AliasOptions& mOptions;
+  const CopiedVolumes& mCopies;
+  Findings mFindings;
+};
 
 }  // namespace
 
-int PrintAliases(const std::vector<std::string>& arguments, const Format& format, bool areHex) {
+int PrintAliases(const std::vector<std::string>& arguments, const Format& format,
+                 const AliasOptions& options) {
+  const auto copies = CopiedVolumes::Read(options.places);
+  if (!copies) return Complain(copies.Failure().message);
+  Report report(format);
+  const Aliases aliases(format, options, *copies);
   Items items(arguments, format.InputEnd());
-  std::size_t count = 0;
-  std::size_t found = 0;
-  while (const auto item = items.Next([] { std::cout.flush(); })) {
-    ++count;
-    found += Print(*item, areHex, format.isJson) ? 1U : 0U;
+  while (report.GoesOn()) {
+    const auto item = items.Next([] { std::cout.flush(); });
+    if (!item) break;
+    aliases.Take(report, *item);
+    report.ShowProgress(items.Done());
   }
-  if (items.ReadError() != 0) {
-    Complain("standard input: " + std::generic_category().message(items.ReadError()));
-    return kFailed;
-  }
-  if (count > 1 && !format.isQuiet) std::cerr << found << " of " << count << " lead to an item\n";
-  return FinishOutput(found == count ? 0 : kFailed);
+  return report.Finish(items);
 }
 
 }  // namespace tallowmere::cli

@@ -49,7 +49,7 @@ struct Entry {
   std::string trouble;  // why it did not come back
 };
 
-// What is checked at a time.
+// What one checker gets at a time.
 struct Piece {
   std::vector<Entry> entries;
   std::optional<Error> failure;  // of a service; the states of the entries then mean nothing
@@ -110,8 +110,8 @@ class Checker {
     return paths;
   }
 
-  // Asks again about what did not come back, as somebody may have moved the item, or a folder above
-  // it, between the two questions.
+  // Asks again about what did not come back: the item, or a folder above it, may have been moved
+  // between the two questions.
   void Judge(Entry& entry, const Answer<FSSpec>& record, const Answer<std::string>& back) {
     auto trouble = Trouble(entry.path, record, back);
     if (trouble && IsAt(entry.path, entry.status)) {
@@ -138,8 +138,8 @@ class Checker {
   std::optional<Error> mFailure;  // the first of a piece
 };
 
-// Counts the items of a folder, several services checking them at a time, and prints what did not
-// come back.
+// Counts the items of a folder, checks them by several services at a time, and prints those that
+// did not come back.
 class Census {
  public:
   Census(const ClientOptions& options, const Format& format)

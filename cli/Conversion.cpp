@@ -2,7 +2,6 @@
 
 #include <iostream>
 #include <memory>
-#include <system_error>
 #include <utility>
 #include <vector>
 
@@ -15,8 +14,8 @@
 namespace tallowmere::cli {
 namespace {
 
-// What one service is asked at a time: enough that waiting for its last answer does not matter, and
-// not too much for memory.
+// What one service is asked at a time: enough that waiting for its last answer costs little, and
+// little enough for memory.
 constexpr std::size_t kMostItems = 1024;
 constexpr std::size_t kMostBytes = 1 << 18;
 
@@ -74,11 +73,7 @@ int Convert(const ItemsToAsk& toAsk, const Ask& ask) {
     report.ShowProgress(items.Done());
   }
   if (report.GoesOn()) answerAll();
-  const int status = report.Finish();
-  if (const int error = items.ReadError()) {
-    return Complain("standard input: " + std::generic_category().message(error));
-  }
-  return status;
+  return report.Finish(items);
 }
 
 std::optional<std::string> WhyItDoesNotAnswer(Client& client) {

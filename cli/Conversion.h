@@ -21,8 +21,8 @@ using Ask = std::function<void(Converter& converter, const std::string& item, Fi
 // found is printed before waiting for more standard input.
 int Convert(const ItemsToAsk& toAsk, const Ask& ask);
 
-// Why the service answers nothing at all, or nullopt. Asked once before all items, so that a
-// service that cannot be started is reported once.
+// Why the service does not answer at all; nullopt when it does. Asked once, before all items, so
+// that a service that cannot be started is reported once.
 std::optional<std::string> WhyItDoesNotAnswer(Client& client);
 
 }  // namespace tallowmere::cli

@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <memory>
 #include <system_error>
+#include <unordered_map>
 #include <utility>
 
 #include "client/NewNames.h"
@@ -37,7 +38,7 @@ Result<std::string> FolderAt(const std::string& place) {
 
 // --- Names --------------------------------------------------------------------------------------
 
-// Nullopt for what no file name can be.
+// Adds nothing for a text that no file name can be.
 void AddForm(const std::u16string& text, std::vector<std::string>& forms) {
   if (auto form = text::FileNameOfText(text)) forms.push_back(*std::move(form));
 }
@@ -48,7 +49,7 @@ bool IsUtf8(std::string_view bytes) {
                       [](char16_t unit) { return text::IsEscapedByte(unit); });
 }
 
-// What the name is called where it is not called as it is, most likely first.
+// The other ways to write a name, most likely first.
 std::vector<std::string> OtherFormsOf(const std::string& name) {
   const std::u16string text = text::TextOfFileName(name);
   std::vector<std::string> forms;
@@ -72,30 +73,55 @@ Error WhyNotEntered(const std::string& path, int errorNumber) {
           Quoted(path) + " cannot be looked at: " + std::generic_category().message(errorNumber)};
 }
 
-// The entry whose name differs only in how its accents are written, some composed, some not.
-Result<std::optional<std::string>> EntryInAnyForm(const Folder& folder, const std::string& name) {
+// The names of a folder that are not ASCII, by their composed form.
+struct NamesOfFolder {
+  struct stat folder {};
+  std::unordered_map<std::u16string, std::vector<std::string>> names;
+};
+
+bool IsUnchanged(const struct stat& before, const struct stat& now) {
+  const auto same = [](const timespec& one, const timespec& other) {
+    return one.tv_sec == other.tv_sec && one.tv_nsec == other.tv_nsec;
+  };
+  return before.st_dev == now.st_dev && before.st_ino == now.st_ino &&
+         same(before.st_mtim, now.st_mtim) && same(before.st_ctim, now.st_ctim);
+}
+
+// Returns nullopt and sets errno when the folder cannot be read.
+std::optional<NamesOfFolder> ReadNames(const Folder& folder) {
   const int opened = openat(folder.Descriptor(), ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
   const std::unique_ptr<DIR, int (*)(DIR*)> entries(opened < 0 ? nullptr : fdopendir(opened),
                                                     closedir);
-  if (!entries) return WhyNotEntered(folder.PathOrRoot(), errno);
-  const std::u16string wanted = text::Compose(text::TextOfFileName(name));
-  std::optional<std::string> found;
+  NamesOfFolder all;
+  if (!entries || fstat(opened, &all.folder) != 0) return std::nullopt;
   errno = 0;
   while (const dirent* const entry = readdir(entries.get())) {
-    if (text::IsAllAscii(std::string_view(entry->d_name))) continue;
-    if (text::Compose(text::TextOfFileName(entry->d_name)) != wanted) continue;
-    if (found) {
-      return Error{Outcome::kAmbiguous, "the folder " + Quoted(folder.PathOrRoot()) +
-                                            " has two items " + Quoted(name) +
-                                            ", with their accents written in two ways"};
-    }
-    found = entry->d_name;
+    const std::string_view name = entry->d_name;
+    if (!text::IsAllAscii(name))
+      all.names[text::Compose(text::TextOfFileName(name))].emplace_back(name);
   }
-  if (errno != 0) return WhyNotEntered(folder.PathOrRoot(), errno);
-  return found;
+  if (errno != 0) return std::nullopt;
+  return all;
 }
 
-// What the item is called here; nullopt where it is not there.
+// The entry whose name differs only in how its accents are written, some composed, some not.
+Result<std::optional<std::string>> EntryInAnyForm(const Folder& folder, const std::string& name) {
+  // Kept for the next items, most of which are in the same folder.
+  thread_local std::optional<NamesOfFolder> latest;
+  struct stat now {};
+  const bool isKnown =
+      latest && fstat(folder.Descriptor(), &now) == 0 && IsUnchanged(latest->folder, now);
+  if (!isKnown) latest = ReadNames(folder);
+  if (!latest) return WhyNotEntered(folder.PathOrRoot(), errno);
+  const auto found = latest->names.find(text::Compose(text::TextOfFileName(name)));
+  if (found == latest->names.end()) return std::optional<std::string>();
+  if (found->second.size() == 1) return std::optional(found->second.front());
+  return Error{Outcome::kAmbiguous, "the folder " + Quoted(folder.PathOrRoot()) +
+                                        " has two items " + Quoted(name) +
+                                        ", with their accents written in two ways"};
+}
+
+// The name of the item as it is stored; nullopt where there is no such item.
 Result<std::optional<std::string>> EntryOf(const Folder& folder, const std::string& name) {
   std::vector<std::string> forms = {name};
   const bool hasOneForm = text::IsAllAscii(std::string_view(name));
@@ -164,7 +190,7 @@ Result<CopiedVolumes> CopiedVolumes::Read(const OldPlaces& places) {
   }
   for (std::size_t i = 0; i < all.size(); ++i) {
     auto folder = FolderAt(all[i].place);
-    // A table may be another command's, too: what it tells of other volumes does not matter.
+    // A table may serve other commands and volumes too: only its own items fail by a wrong line.
     if (!folder && i >= told) return folder.Failure();
     if (!copies.mFolders.emplace(KeyOfVolume(all[i].old), std::move(folder)).second) {
       return Error{Outcome::kAmbiguous, Quoted(all[i].old) + " has two places"};

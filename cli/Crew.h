@@ -1,6 +1,6 @@
 // Work by several threads at a time, handed over in the order in which it was given.
 //
-// A further thread begins when more work waits than those that there are begin soon.
+// Starts another thread when more work waits than the running ones will soon begin.
 #pragma once
 
 #include <condition_variable>
@@ -22,16 +22,16 @@ class Crew {
  public:
   using Work = std::function<void(Piece&)>;
 
-  // `hire` returns what one thread does with each of its pieces, or, but not the first time,
-  // nothing when there can be no further one. At most `most` threads work, which is asked once,
-  // when there is work for a second one. `handOver` gets each piece that has been worked on, in
-  // Give or Finish.
+  // `hire` returns what one thread does with each of its pieces; from the second call on it may
+  // return nothing, when there can be no more threads. `most` returns the largest number of threads
+  // and is called once, when there is work for a second one. `handOver` gets each finished piece,
+  // in Give or Finish.
   Crew(std::function<std::size_t()> most, std::function<Work()> hire,
        std::function<void(Piece&)> handOver)
       : mAskForMost(std::move(most)), mHire(std::move(hire)), mHandOver(std::move(handOver)) {}
   Crew(const Crew&) = delete;
   Crew& operator=(const Crew&) = delete;
-  // Waits for the pieces that are being worked on; those behind them are dropped.
+  // Waits for the pieces in work; drops those behind them.
   ~Crew() {
     {
       const std::lock_guard lock(mMutex);
@@ -78,7 +78,7 @@ class Crew {
     return mThreads.size() < mMost;
   }
 
-  // Goes on with the threads that there are where the system gives no more.
+  // Keeps to the threads that already run when the system refuses another one.
   void Hire() {
     try {
       if (const Work work = mHire()) {

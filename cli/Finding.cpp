@@ -26,8 +26,8 @@ std::string Complaint(const Asked& asked, const std::string& message) {
   const std::size_t quoted = message.find(std::string(item) + '"');
   const bool isNamed = quoted != std::string::npos && quoted > 0 &&
                        std::strchr("\"/", message[quoted - 1]) != nullptr;
-  if (!isNamed) return Quoted(item) + ": " + message;
-  return std::string(message).replace(quoted, item.size(), Quoted(item));
+  if (!isNamed) return Shortened(item) + ": " + message;
+  return std::string(message).replace(quoted, item.size(), Shortened(item));
 }
 
 }  // namespace

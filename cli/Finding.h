@@ -50,7 +50,7 @@ class Findings {
                  const std::function<void(Json&)>& fill,
                  const std::function<void(Json&)>& fillFailure = {}) const;
 
-  // That there is none: the reason is a complaint, or in JSON part of the item's object, with what
+  // No answer: the reason becomes a complaint, or in JSON part of the item's object, with what
   // `fill` adds.
   Finding Failure(const Asked& item, const Error& error,
                   const std::function<void(Json&)>& fill = {}) const;

@@ -101,7 +101,7 @@ int PrintIdentities(const ItemsToAsk& paths) {
     identities.Take(report, *item, Identify(client, *item));
   }
   identities.Finish();
-  return report.Finish();
+  return report.Finish(items);
 }
 
 }  // namespace tallowmere::cli

@@ -6,8 +6,8 @@
 namespace tallowmere::cli {
 namespace {
 
-// The number of characters to insert, remove, replace or exchange with a neighbour ("optimal string
-// alignment"), by a row for each beginning of `first` as far as it is needed.
+// The number of characters to insert, remove, replace or swap with a neighbour ("optimal string
+// alignment"), computed row by row.
 std::size_t Distance(std::string_view first, std::string_view second) {
   std::vector<std::size_t> before;
   std::vector<std::size_t> last(second.size() + 1);

@@ -7,8 +7,8 @@
 
 namespace tallowmere::cli {
 
-// The one of the words that takes the fewest changes of single characters to become `word`, of
-// which a beginning takes one; the first of several. Empty when each would have to be written anew.
+// Returns the word that takes the fewest changes of single characters to become `word`; a missing
+// ending counts as one change. The first of several; empty when none is near.
 std::string Nearest(std::string_view word, const std::vector<std::string>& words);
 
 }  // namespace tallowmere::cli

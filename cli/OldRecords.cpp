@@ -18,7 +18,7 @@ std::string NameOfFile(const std::string& path) {
   return path == "-" ? "standard input" : path;
 }
 
-// Fails with the reason of the system.
+// Fails with the system's reason.
 Result<std::string> ReadAll(const std::string& path) {
   const int file =
       path == "-" ? dup(STDIN_FILENO) : open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY);
@@ -42,10 +42,12 @@ std::string WhyNoRecords(std::size_t size, const RecordForm& form) {
   if (size < form.skip) return "it has fewer bytes than are to be skipped";
   const std::size_t left = (size - form.skip) % form.stride;
   if (left == 0 || left >= protocol::kFileSpecSize) return {};
-  return "the " + std::to_string(left) + " bytes at its end are no record of 70";
+  const std::string last =
+      left == 1 ? "its last byte is" : "its last " + std::to_string(left) + " bytes are";
+  return last + " no record of 70 bytes";
 }
 
-// In the other byte order, it is above 24 bits.
+// Whether it has at most 24 bits, and so more in the other byte order.
 bool IsSmallID(std::int32_t id) {
   constexpr std::uint32_t kAbove24Bits = 1U << 24;
   return id != 0 && static_cast<std::uint32_t>(id) < kAbove24Bits;

@@ -39,11 +39,12 @@ enum class RecordVolume {
   kTold,     // a person has told it, whatever its number
 };
 
-// What a record that leads nowhere would be in the other byte order, where it looks as if that were
-// its own. Nullopt where it does not, and for a record that is text. Numbers of volumes are
-// negative, so one that is so in the other order alone tells it, or one of no volume. Where the
-// volume is told, the parent id does as well: ids of old volumes count from 16 on, and one above
-// 24 bits is below that in the other order.
+// A hint that a record which leads nowhere is of the other byte order. Nullopt when nothing says
+// so, and for a record that is text. The other order is likely where
+//
+//   - its volume's number is negative there, as all are, and here positive or no volume's
+//   - its volume is told, and the parent id has more than 24 bits here and fewer there: ids of old
+//     volumes count up from 16
 std::optional<std::string> HintAtOtherOrder(const std::string& text, std::endian order,
                                             RecordVolume volume);
 

@@ -31,11 +31,11 @@ struct OldPlace {
 // Nullopt for a text that is no OLD=PLACE.
 std::optional<OldPlace> ReadPlace(const std::string& text);
 
-// By what a record or HFS path names the volume: its name in Mac Roman. A text that is no such name
-// stays as it is.
+// The key of a volume: its name in Mac Roman, as records and HFS paths have it. A text outside Mac
+// Roman, or a number, stays as it is.
 std::string KeyOfVolume(const std::string& old);
 
-// Reads a table. Fails at the first line that is none of it, and for what is told twice.
+// Reads a table. Fails at the first line that is malformed or tells a volume a second time.
 Result<std::vector<OldPlace>> ReadTable(const std::string& file);
 
 // Which volume the records of another machine are of now.

@@ -23,7 +23,7 @@ constexpr auto kPause = std::chrono::milliseconds(200);
 // Moves to the first column and erases the line from there (ECMA-48, "EL").
 constexpr const char* kStartAgain = "\r\x1B[K";
 
-// The most characters of a line that the terminal does not break.
+// The longest line that the terminal does not wrap, in characters.
 std::size_t Room() {
   winsize size{};
   const bool isKnown = ioctl(STDERR_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0;
@@ -36,7 +36,7 @@ bool IsTakenByAPager() {
   return tcgetattr(STDERR_FILENO, &modes) == 0 && (modes.c_lflag & ICANON) == 0;
 }
 
-// The bar alone, and the percents; an empty text when the room is too small for it.
+// The bar with its percentage; empty when there is no room for it.
 std::string BarOf(double done, std::size_t room) {
   if (room < kNarrowest + kRoomForPercents) return {};
   const double part = std::clamp(done, 0.0, 1.0);

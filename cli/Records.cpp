@@ -21,7 +21,7 @@ std::optional<std::string> ReadHex(std::string_view digits) {
   return bytes;
 }
 
-// Nullopt for a character that is none of base64, padding among them.
+// Nullopt for a character outside base64, and for padding.
 std::optional<std::uint32_t> ReadSixBits(char digit) {
   constexpr std::string_view kDigits =
       "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
@@ -29,7 +29,7 @@ std::optional<std::uint32_t> ReadSixBits(char digit) {
   return value == kDigits.npos ? std::nullopt : std::optional(static_cast<std::uint32_t>(value));
 }
 
-// The bytes of whole groups of six bits; what is left over at the end is no byte.
+// Decodes groups of six bits; drops the bits that are left over at the end.
 std::optional<std::string> ReadBase64(std::string_view digits) {
   std::string bytes;
   std::uint32_t bits = 0;

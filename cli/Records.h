@@ -14,8 +14,8 @@ namespace tallowmere::cli {
 // The record's 70 bytes, zeros after the name, as 140 hexadecimal digits.
 std::string HexOfRecord(const FSSpec& spec);
 
-// Reads a record in any of the forms; bytes have their numbers in a byte order, and what follows
-// the name in them is ignored. Nullopt for anything else; see FSSpecOfText.
+// Reads a record in any of the forms. `order` is that of the numbers in bytes; what follows the
+// name there is ignored. Nullopt for anything else; see FSSpecOfText.
 std::optional<FSSpec> ReadRecord(std::string_view text, std::endian order = std::endian::native);
 
 // The 70 bytes that a text is in hexadecimal or base64 (RFC 4648, section 4); nullopt for another.

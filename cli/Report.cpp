@@ -4,6 +4,7 @@
 
 #include <iostream>
 #include <string>
+#include <system_error>
 
 #include "cli/Output.h"
 #include "cli/Text.h"
@@ -11,7 +12,7 @@
 namespace tallowmere::cli {
 namespace {
 
-// From so many items on, a person cannot count what failed.
+// From this many items on, nobody counts failures by hand.
 constexpr std::uint64_t kManyItems = 1000;
 
 }  // namespace
@@ -50,10 +51,13 @@ bool Report::GoesOn() const {
   return std::cout.good();
 }
 
-int Report::Finish() {
+int Report::Finish(const Items& items) {
   mBar.Hide();
   const int status = FinishOutput(mStatus);
   if (mItems >= kManyItems && !mFormat.isQuiet && GoesOn()) Summarize();
+  if (const int error = items.ReadError()) {
+    return Complain("standard input: " + std::generic_category().message(error));
+  }
   return status;
 }
 

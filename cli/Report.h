@@ -5,6 +5,7 @@
 #include <optional>
 
 #include "cli/Finding.h"
+#include "cli/Items.h"
 #include "cli/ProgressBar.h"
 
 namespace tallowmere::cli {
@@ -25,9 +26,10 @@ class Report {
   // Whether the output can still be written.
   bool GoesOn() const;
 
-  // Returns the program's exit status once everything has been printed. After many items, a summary
-  // goes to standard error.
-  int Finish();
+  // Prints what remains and returns the program's exit status: kFailed also where standard input
+  // could not be read to its end, with a complaint. After many items, prints a summary on standard
+  // error.
+  int Finish(const Items& items);
 
  private:
   void Summarize() const;

@@ -28,7 +28,7 @@ Mount MountIn(const std::string& line) {
   return mount;
 }
 
-// Whether a path is another one, or leads into it.
+// Whether a path is a folder's, or leads into it.
 bool IsIn(const std::string& folder, const std::string& path) {
   return folder == "/" ||
          (path.starts_with(folder) && (path.size() == folder.size() || path[folder.size()] == '/'));

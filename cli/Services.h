@@ -6,9 +6,9 @@
 
 namespace tallowmere::cli {
 
-// As many as there are cores for this process; one where two of them could give different answers:
-// where a folder is shown at two mount points, either path of an item may be given, and above mount
-// id 32768 each service gives numbers of its own.
+// One for each core that this process may use; one alone where two services could answer
+// differently: where a folder is shown at two mount points, each may give either path of an item,
+// and above mount id 32768 each assigns numbers of its own.
 std::size_t MostServices();
 
 // Whether all services give the same answers with these mounts (proc_pid_mountinfo(5)).

@@ -49,7 +49,7 @@ std::string Printable(std::string_view text) {
   return printable;
 }
 
-std::string Quoted(std::string_view text) {
+std::string Shortened(std::string_view text) {
   if (text.size() <= PATH_MAX) return std::string(text);
   return std::string(text.substr(0, kPartOfAGiant)) + "... (" + std::to_string(text.size()) +
          " bytes)";

@@ -7,12 +7,12 @@
 
 namespace tallowmere::cli {
 
-// The text with each byte of a control character, and each that is not UTF-8, written as a
+// The text with each byte of a control character, and each byte outside UTF-8, written as a
 // backslash and three octal digits, so that no name can break a table or control a terminal.
 std::string Printable(std::string_view text);
 
 // The text for a message: its beginning and its size when it is longer than any path.
-std::string Quoted(std::string_view text);
+std::string Shortened(std::string_view text);
 
 // The text with U+FFFD for each byte that is not UTF-8.
 std::string Utf8OfAnyBytes(std::string_view bytes);

@@ -57,8 +57,8 @@ class Walk {
     double share;  // of the whole walk
   };
 
-  // An estimate, as nobody knows how much of the tree is left: each subfolder counts as much as any
-  // other, and as much as all items beside them.
+  // An estimate, since the rest of the tree is unknown: each subfolder counts as much as any other,
+  // and as much as all other items together.
   bool Read(const Folder& folder) {
     const auto names = NamesIn(folder.path);
     if (!names) {

@@ -5,12 +5,15 @@
 #include <bit>
 #include <charconv>
 #include <chrono>
+#include <cstdint>
 #include <exception>
+#include <filesystem>
 #include <functional>
 #include <iostream>
 #include <map>
 #include <optional>
 #include <string>
+#include <system_error>
 #include <utility>
 #include <vector>
 
@@ -23,7 +26,7 @@ namespace {
 
 using namespace tallowmere::cli;
 
-// Without privilege, a request can take a pass over a whole volume.
+// Without privilege, one request may walk a whole volume.
 constexpr double kSecondsForARequest = 600;
 
 const std::string kHelpTells = "--help tells more";
@@ -37,6 +40,7 @@ struct Arguments {
   std::string topic;
   Sound sound;
   bool asHex = false;
+  bool targetsOnly = false;
   RecordOptions records;
 };
 
@@ -48,7 +52,15 @@ std::optional<double> ReadNumber(const std::string& text) {
   return number;
 }
 
-// Checks of numbers: return what is wrong, or an empty text.
+// Reads a number as the parser does, but without a sign.
+std::optional<std::size_t> ReadCount(const std::string& text) {
+  std::size_t count = 0;
+  const bool isCount =
+      text.find_first_of("+-") == std::string::npos && CLI::detail::lexical_cast(text, count);
+  return isCount ? std::optional(count) : std::nullopt;
+}
+
+// Checks of values: return what is wrong, or an empty text.
 std::string CheckTime(const std::string& text) {
   const auto seconds = ReadNumber(text);
   return seconds && *seconds > 0 ? "" : text + " is no time above 0";
@@ -63,19 +75,34 @@ std::string CheckPlace(const std::string& text) {
   return text.empty() ? "an empty text is no place" : "";
 }
 
+std::string CheckBits(const std::string& text) {
+  const auto bits = ReadCount(text);
+  return bits && *bits <= UINT16_MAX ? "" : text + " is no number of bits below 65536";
+}
+
+std::string CheckChannels(const std::string& text) {
+  const auto channels = ReadCount(text);
+  return channels && *channels <= UINT8_MAX ? "" : text + " is no number of channels below 256";
+}
+
+std::string CheckFolder(const std::string& text) {
+  std::error_code error;
+  if (std::filesystem::is_directory(text, error)) return "";
+  const bool isHidden = error == std::errc::permission_denied;
+  return isHidden ? '"' + text + "\" cannot be looked at: " + error.message()
+                  : "there is no folder \"" + text + '"';
+}
+
 std::string CheckMap(const std::string& text) {
   return ReadPlace(text) ? "" : '"' + text + "\" is no OLD-NAME=FOLDER";
 }
 
-// In bytes: 0 to 2^53, which every double holds.
 std::string CheckCount(const std::string& text) {
-  constexpr double kMost = 9007199254740992;
-  const auto bytes = ReadNumber(text);
-  return !bytes || (*bytes >= 0 && *bytes <= kMost) ? "" : text + " is no number of bytes";
+  return ReadCount(text) ? "" : text + " is no number of bytes";
 }
 
 std::string CheckStride(const std::string& text) {
-  const auto bytes = ReadNumber(text);
+  const auto bytes = ReadCount(text);
   if (bytes && *bytes < 70) return text + " is less than the 70 bytes of a record";
   return CheckCount(text);
 }
@@ -134,7 +161,7 @@ class CommandLine {
     return kWrongUsage;
   }
 
-  // What the arguments have that no command takes, whatever else is wrong with them.
+  // Names the first argument that no command takes, whatever else is wrong.
   std::optional<std::string> WhatIsUnknown() const {
     const std::vector<std::string> words = mApp.remaining(true);
     const auto end = std::find(words.begin(), words.end(), "--");
@@ -202,9 +229,9 @@ class CommandLine {
                       "Items of standard input end with a NUL, not a newline");
   }
 
-  void AddNullOutput(CLI::App* command) {
-    command->add_flag("--null-output", mArguments.items.format.hasNullOutput,
-                      "Results end with a NUL, not a newline; JSON is lines all the same");
+  CLI::Option* AddNullOutput(CLI::App* command) {
+    return command->add_flag("--null-output", mArguments.items.format.hasNullOutput,
+                             "Results end with a NUL, not a newline; JSON is lines all the same");
   }
 
   void AddQuiet(CLI::App* command, const std::string& what) {
@@ -231,6 +258,16 @@ class CommandLine {
                      "Lines OLD-NUMBER-OR-NAME=PLACE tell where volumes are; '#' begins a comment")
         ->check(CheckPlace)
         ->type_name("FILE");
+  }
+
+  void AddMaps(CLI::App* command) {
+    command
+        ->add_option("--map", mArguments.records.places.maps,
+                     "The volume that was called so has been copied into a folder")
+        ->check(CheckMap)
+        ->type_name("OLD-NAME=FOLDER")
+        ->allow_extra_args(false);
+    AddTable(command);
   }
 
   void AddRecordOptions(CLI::App* command);
@@ -271,6 +308,7 @@ void CommandLine::AddRecordOptions(CLI::App* command) {
       ->type_name("ORDER");
   CLI::Option* const packed = command->add_flag("--packed", records.form.isPacked,
                                                 "Items are files of records, 70 bytes each");
+  packed->excludes(command->get_option("--null"));
   command->add_option("--skip", records.form.skip, "Bytes in front of a file's first record")
       ->needs(packed)
       ->check(CheckCount);
@@ -321,13 +359,7 @@ void CommandLine::AddHFSPaths() {
                           "  tallowmere-cli posix --map 'Old Disk=/srv/copies/old' 'Old Disk:Mix'",
                           [&a] { return PrintPathsOfHFSPaths(a.items, a.records.places); });
   AddItems(command, "hfspath", "HFS paths, in UTF-8");
-  command
-      ->add_option("--map", a.records.places.maps,
-                   "The volume that was called so has been copied into a folder")
-      ->check(CheckMap)
-      ->type_name("OLD-NAME=FOLDER")
-      ->allow_extra_args(false);
-  AddTable(command);
+  AddMaps(command);
 }
 
 void CommandLine::AddNames() {
@@ -368,9 +400,11 @@ void CommandLine::AddAudio() {
           });
   AddJson(command);
   command->add_option("--rate", a.sound.hertz, "In hertz")->check(CheckRate)->capture_default_str();
-  command->add_option("--bits", a.sound.bits, "In a sample")->capture_default_str();
+  command->add_option("--bits", a.sound.bits, "In a sample")
+      ->check(CheckBits)
+      ->capture_default_str();
   command->add_option("--channels", a.sound.channels, "Of the sound")
-      ->check(CLI::Range(0, 255))
+      ->check(CheckChannels)
       ->capture_default_str();
   command->add_option("--format", a.sound.format, "Four-character code")
       ->check([](const std::string& code) {
@@ -391,18 +425,30 @@ void CommandLine::AddCensusAndAliases() {
   AddJson(command);
   AddQuiet(command, "No progress bar");
   AddNoProgress(command);
-  command->add_option("folder", a.folder, "The folder")->required()->check(CLI::ExistingDirectory);
+  command->add_option("folder", a.folder, "The folder")
+      ->required()
+      ->check(CheckFolder)
+      ->type_name("");
 
   command =
       Add("alias", "Print what each alias file, record or bookmark says, and where it leads now",
           "  tallowmere-cli alias 'Old Disk/Mix alias'\n"
-          "  tallowmere-cli alias --hex --json - <records",
-          [&a] { return PrintAliases(a.items.items, a.items.format, a.asHex); });
+          "  find . -type f -print0 | tallowmere-cli alias -0 --json -\n"
+          "  tallowmere-cli alias --target --map 'Old Disk=/srv/copies/old' 'Mix alias'",
+          [&a] {
+            return PrintAliases(a.items.items, a.items.format,
+                                {a.asHex, a.targetsOnly, a.records.places});
+          });
   AddJson(command);
   AddNullInput(command);
-  AddQuiet(command, "No summary");
+  CLI::Option* const target = command->add_flag(
+      "--target", a.targetsOnly, "A line for each item: the path of where it leads, and no more");
+  AddNullOutput(command)->needs(target);
+  AddQuiet(command, "Neither a progress bar nor a summary");
+  AddNoProgress(command);
   AddItems(command, "file", "Alias files, or files with a record or bookmark");
   command->add_flag("--hex", a.asHex, "The items are bytes as hexadecimal digits");
+  AddMaps(command);
 }
 
 void CommandLine::AddCheck() {

@@ -54,7 +54,7 @@ void Batch::Add(const Request<T>& request,
 
 void Batch::Finish() {
   if (!mHasTurn) return;
-  // A handler's exception ends the turn as well when its request was the last one.
+  // When the last request's handler throws, the turn ends as well.
   struct EndOfTurn {
     Batch& batch;
     ~EndOfTurn() {

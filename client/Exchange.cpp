@@ -67,7 +67,7 @@ void Exchange::Finish() {
     mBatch.Finish();
     TellThoseInTurn();
   }
-  // What the root folder of a volume was told without.
+  // Requests that the answers about a volume's root folder did not wait for.
   mBatch.Finish();
   mUnchecked.clear();
   mLost.clear();

@@ -19,7 +19,7 @@ namespace tallowmere::conversion {
 
 class Exchange;
 
-// What somebody has asked, in line with others until it is its turn to be told.
+// A question that waits in line until its answer may be told.
 class Inquiry {
  public:
   Inquiry() = default;
@@ -30,8 +30,8 @@ class Inquiry {
   // Whether everything that was asked for it has been answered.
   virtual bool IsAnswered() const { return mAwaited == 0; }
 
-  // Tells the answer. May ask more first, and wait for it. REQUIRES: IsAnswered(), and all before
-  // it have been told.
+  // Tells the answer; may ask more first, and wait. REQUIRES: IsAnswered(), and all questions
+  // before it have been told.
   virtual void Tell(Exchange& exchange) = 0;
 
  private:
@@ -70,10 +70,9 @@ class Exchange {
   // Waits for all answers and tells them.
   void Finish();
 
-  // Asks for a folder's full path, unless that has been done, and whether it leads back to the
-  // folder; the answer is in the folder. It may not lead back where the folders above cannot be
-  // looked at, and where two volumes have one name. One that is too long to be asked about is taken
-  // as it is.
+  // Asks for a folder's full path, once, and whether it leads back to the folder; the answer goes
+  // into the folder. A path does not lead back where the folders above cannot be looked at, and
+  // where two volumes have one name. One too long to ask about is taken as it is.
   void PutFullPathOf(const std::shared_ptr<Folder>& folder);
 
   // Why the full HFS path of the folder at a path does not lead back to it, asked at once; nullopt

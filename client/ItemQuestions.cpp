@@ -1,5 +1,5 @@
-// The conversions of the path of an item, which all begin with its record: that tells its HFS name,
-// and whether it is on a volume.
+// The conversions of an item's path. Each begins with the item's record, which has its HFS name and
+// tells whether it is on a volume.
 #include <climits>
 #include <utility>
 
@@ -12,7 +12,7 @@
 namespace tallowmere::conversion {
 namespace {
 
-// Of a full path, the service leaves the outermost folders out that do not fit into this.
+// The service leaves the outermost folders that do not fit into this out of a full path.
 constexpr std::size_t kMostBytesOfFolders = 511;
 // A folder in it: a name of Linux, and a colon.
 constexpr std::size_t kLongestFolder = NAME_MAX + 1;
@@ -123,7 +123,7 @@ class HFSPathQuestion final : public ItemQuestion<std::string> {
     if (GetPlace().isFolder) exchange.Put(request::MakeFullPath(GetPlace().path), *this, mOwn);
   }
 
-  // The HFS path of a root folder has no part of that of the folder above, which may be in a kernel
+  // A root folder's HFS path does not depend on the folder above, which may be in a kernel
   // interface.
   bool IsAnswered() const override {
     return ItemQuestion::IsAnswered() &&
@@ -140,23 +140,25 @@ class HFSPathQuestion final : public ItemQuestion<std::string> {
       return Whole(exchange, *holder + record.name, *holder, FolderOf(GetPlace().path));
     }
     std::string path = holder ? *holder + record.name + protocol::kSeparator : "";
-    if (**mOwn == path || (holder && IsLongNameIn(*holder))) {
+    if (**mOwn == path || (holder && IsLongAndNamedAsHere(record.name))) {
       return Whole(exchange, **mOwn, **mOwn, GetPlace().path);
     }
     return OfMountPoint(exchange, holder, std::move(path));
   }
 
-  // Whether the folder's own path ends with a name in its holder of which the record has but a
-  // short form, and is too long to be asked about.
-  bool IsLongNameIn(const std::string& holder) const {
-    const std::string& own = **mOwn;
-    return own.size() > protocol::kLongestHFSPath && own.starts_with(holder) &&
-           own.find(protocol::kSeparator, holder.size()) == own.size() - 1;
+  // Whether the folder's own path is too long to ask about and ends with the folder's name, which
+  // the record may have in its short form.
+  bool IsLongAndNamedAsHere(const std::string& recordName) const {
+    std::string_view own = **mOwn;
+    if (own.size() <= protocol::kLongestHFSPath) return false;
+    own.remove_suffix(1);
+    const std::string_view name = own.substr(own.rfind(protocol::kSeparator) + 1);
+    return name == recordName || name == HFSNameOfLinuxName(GetPlace().Name());
   }
 
-  // Of a folder at which something is mounted that is no volume of its own, the service tells the
-  // path at which that is mounted first, or for a kernel interface that of the folder that holds
-  // it. Where this leads elsewhere, the folder has its path as an item of its holder.
+  // Something is mounted on the folder that is no volume of its own. The service gives the path
+  // where it is mounted first, and for a kernel interface the path of the folder that holds that
+  // one. Where this leads elsewhere, the folder has its path as an item of its holder.
   Result<std::string> OfMountPoint(Exchange& exchange, const Result<std::string>& holder,
                                    std::string path) {
     const std::string& place = GetPlace().path;

@@ -13,7 +13,7 @@ namespace {
 
 constexpr const char* kRoot = "/";
 
-// A volume whose name begins so is found by its path alone.
+// Whether a text is never taken for a volume's name.
 bool IsCertainlyPath(std::string_view text) {
   return text == "." || text == ".." || text.starts_with('/') || text.starts_with("./") ||
          text.starts_with("../");

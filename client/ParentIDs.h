@@ -1,4 +1,4 @@
-// The parent ids in records that are those of no folder.
+// Parent ids in records that belong to no folder.
 #pragma once
 
 #include <cstdint>

@@ -17,7 +17,7 @@ Error Invalid(std::string message) {
   return {Outcome::kInvalid, std::move(message)};
 }
 
-// Below "/", the service puts one slash more in front.
+// Right below "/", the service writes two slashes.
 std::string Plain(std::string path) {
   if (path.starts_with("//")) path.erase(0, 1);
   return path;
@@ -221,7 +221,7 @@ class PathOfFullPath final : public PathQuestion {
     std::string_view hfsPath = mHFSPath;
     if (!hfsPath.ends_with(protocol::kSeparator)) return WithoutVolume(exchange);
     hfsPath.remove_suffix(1);
-    // Without a colon in it, it begins in the current folder; with one at its end, it went up.
+    // A path without a colon begins in the current folder; one that still ends with a colon climbs.
     if (WhyNone(hfsPath) || hfsPath.ends_with(protocol::kSeparator)) return WithoutVolume(exchange);
     auto answer = exchange.AskNow(request::PathAndResult(hfsPath));
     if (!answer) return answer.Failure();
@@ -233,7 +233,7 @@ class PathOfFullPath final : public PathQuestion {
     return Path{std::move(path), Outcome::kFound};
   }
 
-  // That there is no such volume is told of what is in a kernel interface, too.
+  // The service says "no such volume" of what is in a kernel interface, too.
   Error WithoutVolume(Exchange& exchange) const {
     const std::string name = mHFSPath.substr(0, mHFSPath.find(protocol::kSeparator));
     const auto number = exchange.AskNow(request::GetVolRefnumByHFSName(name));
@@ -242,7 +242,7 @@ class PathOfFullPath final : public PathQuestion {
     return {Outcome::kNotAVolume, "no volume is called " + Quoted(Utf8OfHFSName(name))};
   }
 
-  // The path that a new item would have: it is right when its record has the item's name.
+  // The path that a new item would have; right when its record has the item's name.
   Conversion<std::string> New(Exchange& exchange, const std::string& folder,
                               std::string_view name) {
     std::string path = (folder == "/" ? "" : folder) + '/' + LinuxNameOfHFSName(name);

@@ -17,7 +17,7 @@
 namespace tallowmere {
 namespace {
 
-// Enough for the folders on the way to an item, which a listing of a tree comes back to.
+// Enough for the folders on the way to an item, to which a listing of a tree returns.
 constexpr std::size_t kMostFolders = 8;
 
 Error Failed(std::string_view path, int errorNumber) {
@@ -54,7 +54,7 @@ bool IsDots(std::string_view name) {
   return name == "." || name == "..";
 }
 
-// What is in front of the name, with nothing for what is in front of "/" or of a lone name.
+// A path's folder and name. The folder of a lone name is ".".
 struct Split {
   std::string_view folder;
   std::string_view name;
@@ -206,7 +206,7 @@ Result<std::shared_ptr<Folder>> Places::Open(const std::string& text) {
   return folder;
 }
 
-// A folder in one that is known, unless it is a link: its path needs no question.
+// A folder in a known one, unless it is a link: its path is known without asking the system.
 std::shared_ptr<Folder> Places::OpenInKnown(const std::string& text) {
   const Split split = SplitOf(text);
   if (split.name.empty() || IsDots(split.name)) return nullptr;

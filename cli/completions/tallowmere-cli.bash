@@ -12,7 +12,7 @@ _tallowmere_cli() {
     [append]='-0 --null --null-output --existing -q --quiet --no-progress --json'
     [aiff]='--rate --bits --channels --format --output --json'
     [census]='-q --quiet --no-progress --json'
-    [alias]='--hex -0 --null -q --quiet --json'
+    [alias]='--target --map --volumes --hex -0 --null --null-output -q --quiet --no-progress --json'
     [serve-check]='--json'
     [help]=
   )

@@ -28,32 +28,33 @@ set -l conversions '__fish_seen_subcommand_from spec path hfs posix name append'
 set -l identify '__fish_seen_subcommand_from identify'
 set -l census '__fish_seen_subcommand_from census'
 set -l alias '__fish_seen_subcommand_from alias'
-complete -c tallowmere-cli -n $conversions -s q -l quiet -d 'Neither a progress bar nor a summary'
-complete -c tallowmere-cli -n $census -s q -l quiet -d 'No progress bar'
-for condition in $identify $alias
-    complete -c tallowmere-cli -n $condition -s q -l quiet -d 'No summary'
+for condition in $conversions $alias
+    complete -c tallowmere-cli -n $condition -s q -l quiet -d 'Neither a progress bar nor a summary'
+    complete -c tallowmere-cli -n $condition -l null-output -d 'Results end with a NUL'
 end
+complete -c tallowmere-cli -n $census -s q -l quiet -d 'No progress bar'
+complete -c tallowmere-cli -n $identify -s q -l quiet -d 'No summary'
 for condition in $conversions $identify $alias
     complete -c tallowmere-cli -n $condition -s 0 -l null -d 'Items end with a NUL'
 end
 for condition in $conversions $identify
     complete -c tallowmere-cli -n $condition -l existing -d 'Fail for what is new'
 end
-for condition in $conversions $census
+for condition in $conversions $alias $census
     complete -c tallowmere-cli -n $condition -l no-progress -d 'No progress bar'
 end
-complete -c tallowmere-cli -n $conversions -l null-output -d 'Results end with a NUL'
 complete -c tallowmere-cli -n "__fish_seen_subcommand_from $commands; and not __fish_seen_subcommand_from help" -l json -d 'One JSON object a line'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from spec' -l hex -d 'The 70 bytes as hexadecimal digits'
-complete -c tallowmere-cli -n '__fish_seen_subcommand_from alias' -l hex -d 'The items are hexadecimal digits'
+complete -c tallowmere-cli -n $alias -l hex -d 'The items are hexadecimal digits'
+complete -c tallowmere-cli -n $alias -l target -d 'A line for each item: where it leads'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l other-volumes -d 'Look on the other volumes too'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l volume -r -F -d 'Volume of all records'
-complete -c tallowmere-cli -n '__fish_seen_subcommand_from path posix' -l volumes -r -F -d 'Table of old volumes'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from path posix alias' -l volumes -r -F -d 'Table of old volumes'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l byte-order -x -a 'big little' -d 'Of the numbers in bytes'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l packed -d 'Items are files of records'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l skip -x -d 'Bytes before the first record'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from path' -l stride -x -d 'Bytes from record to record'
-complete -c tallowmere-cli -n '__fish_seen_subcommand_from posix' -l map -r -F -d 'Folder of a copied volume'
+complete -c tallowmere-cli -n '__fish_seen_subcommand_from posix alias' -l map -r -F -d 'Folder of a copied volume'
 complete -c tallowmere-cli -n '__fish_seen_subcommand_from volumes aiff serve-check' -f
 
 set -l aiff '__fish_seen_subcommand_from aiff'

@@ -13,6 +13,7 @@
 #include "foundation/ColonsAndSlashes.h"
 #include "foundation/PathText.h"
 #include "kernel/Contents.h"
+#include "names/HFSNames.h"
 #include "stores/Stores.h"
 #include "text/FileNameText.h"
 #include "text/MacRoman.h"
@@ -140,6 +141,16 @@ Description Describe(const Bookmark& bookmark) {
   return d;
 }
 
+std::vector<std::vector<std::string>> WaysOf(const aliases::Target& target) {
+  std::vector<std::vector<std::string>> ways;
+  for (const aliases::Way& way : target.ways) {
+    ways.push_back(way.components);
+    if (way.spelling == aliases::Way::Spelling::kLinux) continue;
+    for (std::string& name : ways.back()) name = names::SpellHFSName(name).precomposed;
+  }
+  return ways;
+}
+
 Container ContainerOf(formats::Container container) {
   switch (container) {
     case formats::Container::kBookmarkFile:
@@ -178,7 +189,9 @@ Answer AnswerTo(catalog::Moment& moment, const formats::AliasContent& content, C
   Answer answer = Failed(noErr);
   answer.description = std::visit([](const auto& read) { return Describe(read); }, content);
   answer.description->container = container;
-  const auto resolved = aliases::Resolve(moment, file, aliases::TargetOf(content));
+  const aliases::Target target = aliases::TargetOf(content);
+  answer.description->waysOnVolume = WaysOf(target);
+  const auto resolved = aliases::Resolve(moment, file, target);
   if (!resolved) {
     answer.result = calls::ResultCodeOfAlias(resolved.Error());
     return answer;

@@ -1,5 +1,6 @@
 // tallowmere-cli alias: records, bookmarks and files with them, told apart by their content.
 #include <gmock/gmock.h>
+#include <sys/stat.h>
 
 #include <filesystem>
 #include <nlohmann/json.hpp>
@@ -73,7 +74,7 @@ TEST(AliasCommand, ShowsWhatARecordSays) {
   EXPECT_EQ(shown["hfs_path"], "Caf\u00E9 Disk of Tallowmere:folder:file");
   EXPECT_EQ(shown["status"], "not-a-volume");
   EXPECT_EQ(shown["exists"], false);
-  EXPECT_EQ(shown["error"], "its volume is not mounted");
+  EXPECT_EQ(shown["error"], "its volume \"Caf\u00E9 Disk of Tallowmere\" is not mounted");
 }
 
 TEST(AliasCommand, TellsContainersApartByTheirContent) {
@@ -171,21 +172,146 @@ TEST(AliasCommand, ReadsItemsFromStandardInputAndCounts) {
   const std::string record = folder.MakeFile("record", Write(Record()));
   const Printed shown =
       RunAlias({"--json", "-"}, record + "\n" + folder.MakeFile("other", "x").string());
-  EXPECT_THAT(shown.output, HasSubstr("its volume is not mounted"));
+  EXPECT_THAT(shown.output, HasSubstr("is not mounted"));
   EXPECT_THAT(shown.output, HasSubstr("no alias, or a broken one"));
-  EXPECT_EQ(shown.errors, "0 of 2 lead to an item\n");
+  EXPECT_EQ(shown.errors, "");
+  std::string many;
+  for (int i = 0; i < 1000; ++i) many += record + "\n";
+  EXPECT_EQ(RunAlias({"--json", "-"}, many).errors,
+            "tallowmere-cli: 1000 items: 0 found, 0 new, 0 nothing, 1000 failed\n");
 }
 
-TEST(AliasCommand, ComplainsOfWhatIsNone) {
+TEST(AliasCommand, NamesWhatIsWrongWithAnItemAndPrintsAnEmptyLineForIt) {
   const TemporaryFolder folder;
-  for (const std::string& item : {folder.MakeFile("x", "text").string(),
-                                  (folder.Path() / "none").string(), folder.Path().string()}) {
+  const std::string here = folder.Path();
+  ASSERT_EQ(mkfifo((here + "/pipe").c_str(), 0600), 0);
+  const std::vector<std::pair<std::string, std::string>> faults = {
+      {folder.MakeFile("x", "text"), "no alias, or a broken one"},
+      {here + "/none", "there is no such file"},
+      {here + "/none/x", "there is no folder \"" + here + "/none\""},
+      {here, "it is a folder, not a file"},
+      {here + "/pipe", "it is no regular file"},
+      {folder.MakeLink("link", "nowhere"), "it is a link that leads nowhere"},
+  };
+  for (const auto& [item, fault] : faults) {
     const Printed shown = RunAlias({item});
-    EXPECT_EQ(shown.output, "");
-    EXPECT_THAT(shown.errors, HasSubstr(item));
+    EXPECT_EQ(shown.output, "\n") << item;
+    EXPECT_EQ(shown.errors, "tallowmere-cli: " + item + ": " + fault + "\n");
     EXPECT_EQ(shown.status, 1);
   }
-  EXPECT_EQ(RunAlias({"--hex", "no digits"}).status, 1);
+}
+
+TEST(AliasCommand, NamesDigitsThatAreNotHexadecimal) {
+  for (const char* const item : {"zz", "abc", "0x41"}) {
+    const Printed shown = RunAlias({"--hex", item});
+    EXPECT_EQ(shown.output, "\n");
+    EXPECT_EQ(shown.errors, std::string("tallowmere-cli: ") + item +
+                                ": it is not in hexadecimal, two digits a byte\n");
+    EXPECT_EQ(shown.status, 1);
+  }
+  EXPECT_EQ(RunAlias({"--hex", " "}).errors, "tallowmere-cli:  : it has no hexadecimal digits\n");
+}
+
+TEST(AliasCommand, ReadsTheFileThatALinkLeadsTo) {
+  const TemporaryFolder folder;
+  folder.MakeFile("record", Write(Record()));
+  EXPECT_EQ(JsonOf(folder.MakeLink("link", "record"))["id"], 42);
+}
+
+TEST(AliasCommand, HasTrueBytesInJsonWhereTheyAreNoUtf8) {
+  const TemporaryFolder folder;
+  RecordToWrite record = Record();
+  record.tags.push_back({18, "/folder/\xFFile"});
+  const json shown = JsonOf(folder.MakeFile("\xFFrecord", Write(record)));
+  EXPECT_EQ(shown["posix_path"], "/folder/\xEF\xBF\xBDile");
+  EXPECT_EQ(shown["posix_path_hex"], "2f666f6c6465722fff696c65");
+  EXPECT_THAT(shown["alias_hex"].get<std::string>(), testing::EndsWith("2fff7265636f7264"));
+}
+
+// So that paste(1) can put items and targets beside each other.
+TEST(AliasCommand, WithTargetPrintsALineForEachItem) {
+  const TemporaryFolder folder;
+  const std::string target = folder.MakeFile("file");
+  RecordToWrite record = Record();
+  record.levelsUp = record.levelsDown = 1;
+  const std::string alias = folder.MakeFile("alias");
+  folder.MakeFile("._alias", WriteSidecarOfAlias(Write(record)));
+  const std::string lost = folder.MakeFile("lost", Write(Record()));
+  const Printed shown = RunAlias({"--target", lost, alias, folder.Path() / "none"});
+  EXPECT_EQ(shown.output, "\n" + target + "\n\n");
+  EXPECT_EQ(shown.status, 1);
+  EXPECT_THAT(shown.errors,
+              HasSubstr(lost + ": its volume \"Caf\u00E9 Disk of Tallowmere\" is not"));
+  EXPECT_EQ(RunAlias({"--target", "--null-output", alias}).output, target + '\0');
+  EXPECT_EQ(RunAlias({"--null-output", alias}).status, 2);
+}
+
+TEST(AliasCommand, SaysOnStandardErrorWhyAnAliasLeadsNowhere) {
+  const TemporaryFolder folder;
+  const std::string lost = folder.MakeFile("lost", Write(Record()));
+  const Printed shown = RunAlias({lost});
+  EXPECT_THAT(shown.output, HasSubstr("leads to          nothing: its volume"));
+  EXPECT_EQ(shown.errors, "tallowmere-cli: " + lost +
+                              ": its volume \"Caf\u00E9 Disk of Tallowmere\" is not mounted\n");
+}
+
+// A copy of the disk that Record() is of.
+class AliasOfACopiedDisk : public testing::Test {
+ protected:
+  AliasOfACopiedDisk() : mCopy(mFolder.Path() / "copy") {
+    mFolder.MakeFolder("copy/folder");
+    mFolder.MakeFile("copy/folder/file");
+    mMap = "Caf\u00E9 Disk of Tallowmere=" + mCopy;
+  }
+  json Leads(const RecordToWrite& record) {
+    const std::string file = mFolder.MakeFile("record", Write(record));
+    return json::parse(RunAlias({"--json", "--map", mMap, file}).output);
+  }
+
+  TemporaryFolder mFolder;
+  std::string mCopy;
+  std::string mMap;
+};
+
+TEST_F(AliasOfACopiedDisk, LeadsToTheItemThere) {
+  for (const bool isPosix : {false, true}) {
+    RecordToWrite record = Record();
+    if (isPosix) record.tags = {{18, "/folder/file"}};
+    const json found = Leads(record);
+    EXPECT_EQ(found["status"], "found") << isPosix;
+    EXPECT_EQ(found["target"], mCopy + "/folder/file");
+    EXPECT_EQ(found["by"], "map");
+    EXPECT_EQ(found["exists"], true);
+  }
+  EXPECT_EQ(RunAlias({"--target", "--map", mMap, (mFolder.Path() / "record").string()}).output,
+            mCopy + "/folder/file\n");
+}
+
+TEST_F(AliasOfACopiedDisk, LeadsToNothingThatIsNoneOrOfAnotherKind) {
+  RecordToWrite record = Record();
+  record.tags = {{18, "/folder/none"}};
+  EXPECT_EQ(Leads(record)["status"], "nothing");
+  EXPECT_EQ(Leads(record)["error"], "there is no file or folder \"" + mCopy + "/folder/none\"");
+  record.tags = {{18, "/folder"}};
+  EXPECT_EQ(Leads(record)["error"], "\"" + mCopy + "/folder\" is a folder, unlike its target");
+  record.tags = {{18, "/none/file"}};
+  EXPECT_EQ(Leads(record)["error"], "there is no folder \"" + mCopy + "/none\"");
+}
+
+TEST_F(AliasOfACopiedDisk, IsNotLeft) {
+  mFolder.MakeFile("file");
+  mFolder.MakeLink("copy/out", "..");
+  RecordToWrite record = Record();
+  for (const char* const path : {"/../file", "/out/file"}) {
+    record.tags = {{18, path}};
+    EXPECT_EQ(Leads(record)["exists"], false) << path;
+  }
+}
+
+TEST_F(AliasOfACopiedDisk, MayBeToldInATable) {
+  const std::string record = mFolder.MakeFile("record", Write(Record()));
+  const std::string table = mFolder.MakeFile("table", mMap + "\n");
+  EXPECT_EQ(RunAlias({"--target", "--volumes", table, record}).output, mCopy + "/folder/file\n");
 }
 
 }  // namespace

@@ -8,7 +8,7 @@
 namespace tallowmere::cli {
 namespace {
 
-// A number of so many bytes, big-endian.
+// A big-endian number of that many bytes.
 std::string Number(std::size_t number, std::size_t size) {
   std::string bytes;
   while (size-- > 0) bytes.push_back(static_cast<char>(number >> (8 * size)));
@@ -21,7 +21,7 @@ std::string Atom(const char* type, std::size_t childCount, const std::string& co
          Number(childCount, 2) + Number(0, 4) + content;
 }
 
-// A leaf within so many atoms, in a container.
+// A leaf nested in that many atoms, in a container.
 std::string Nested(std::size_t atoms) {
   std::string atom = Atom("leaf", 0, "\1");
   for (std::size_t i = 0; i < atoms; ++i) {
@@ -41,7 +41,7 @@ TEST(AtomText, OfAnythingThatIsCutOffIsNone) {
   }
 }
 
-// Whether the text is none, told by a process that has a second for it.
+// Whether there is no text, judged by a process that has one second.
 void ExitWith0IfNone(const std::string& container) {
   const rlimit aSecond{1, 1};
   setrlimit(RLIMIT_CPU, &aSecond);
@@ -62,7 +62,7 @@ TEST(AtomText, OfSixteenAtomsWithinEachOtherIsThereAndOfMoreIsNone) {
   EXPECT_EQ(TextOfAtoms(Nested(16)), std::nullopt);
 }
 
-// As deep as an answer can be: that took more stack than a process has.
+// As deep as an answer can nest: deeper than a stack holds.
 TEST(AtomText, OfAtomsAsDeepAsAnAnswerIsLongIsNone) {
   constexpr std::size_t kAtomHead = 20;
   constexpr std::size_t kLongestSettings = 1 << 20;

@@ -66,7 +66,7 @@ class CensusOfHostileFolder : public testing::Test {
     EXPECT_EQ(result.text, Figures(mItems));
     EXPECT_EQ(result.status, 0);
     if (geteuid() != 0 || HasFailure()) return;
-    // Once more without the privileges with which an item is found by its number.
+    // Once more without the privilege to find an item by its number.
     ASSERT_EQ(chmod(mFolder.Path().c_str(), 0755), 0);
     if (AsPlainUser({"serve-check"}).status != 0) return;  // the programs are out of its reach
     EXPECT_EQ(AsPlainUser({"census", mFolder.Path()}).text, Figures(mItems));
@@ -313,7 +313,7 @@ TEST(Census, TakesARelativeFolderAndALinkToOne) {
   EXPECT_EQ(CensusOf(std::filesystem::relative(folder.Path() / "real")).text, Figures(2));
 }
 
-// A request that an impostor knows, and what it answers: protocol bytes.
+// A request that an impostor answers, and its answer: protocol bytes.
 struct Exchange {
   std::string request;
   std::string answer;
@@ -414,7 +414,7 @@ TEST(Census, IsStatus1WhereSomeItemsComeBackAndOthersDoNot) {
   EXPECT_EQ(result.status, 1);
 }
 
-// As many as several services get.
+// Enough items for several services.
 TEST(Census, TellsWhatDidNotComeBackInTheOrderOfTheWalk) {
   const TemporaryFolder folder;
   const std::string asked = folder.MakeFolder("asked");

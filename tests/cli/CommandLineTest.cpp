@@ -177,6 +177,27 @@ TEST(CommandLine, AWrongOptionIsNamedWhetherOrNotMoreIsMissing) {
   }
 }
 
+TEST(CommandLine, AWrongValueIsNamed) {
+  const auto expect = [](const std::vector<std::string>& arguments, const std::string& fault) {
+    EXPECT_EQ(WhatIsWrongWith(arguments), "tallowmere-cli: " + fault + "; --help tells more\n");
+  };
+  expect({"aiff", "--bits", "x"}, "--bits: x is no number of bits below 65536");
+  expect({"aiff", "--bits", "65536"}, "--bits: 65536 is no number of bits below 65536");
+  expect({"aiff", "--channels", "256"}, "--channels: 256 is no number of channels below 256");
+  expect({"aiff", "--channels", "-1"}, "--channels: -1 is no number of channels below 256");
+  expect({"census", "/nonexistent"}, "folder: there is no folder \"/nonexistent\"");
+  expect({"census", "/etc/passwd"}, "folder: there is no folder \"/etc/passwd\"");
+}
+
+TEST(CommandLine, StandardInputThatCannotBeReadIsStatus1AndOneSentence) {
+  for (const char* const command : {"name -", "identify -", "alias -", "path --packed -"}) {
+    ChildProgram cli("/bin/sh",
+                     {"-c", std::string("exec \"$0\" ") + command + " </", TALLOWMERE_CLI});
+    EXPECT_EQ(cli.ReadErrorsToEnd(), "tallowmere-cli: standard input: Is a directory\n") << command;
+    EXPECT_EQ(cli.Wait(), 1) << command;
+  }
+}
+
 TEST(CommandLine, WordsThatACommandDoesNotTakeAreNamed) {
   EXPECT_EQ(WhatIsWrongWith({"volumes", "/"}),
             "tallowmere-cli: \"volumes\" takes no \"/\"; --help tells more\n");
@@ -205,7 +226,7 @@ TEST(CommandLine, TheVersionHasAShortOption) {
   EXPECT_EQ(Printed({"-V"}), Printed({"--version"}));
 }
 
-// Its parts are those that a shell runs.
+// As a shell runs them.
 TEST(CommandLine, TheExamplesOfTheHelpRun) {
   ChildProgram shell("/bin/bash",
                      {"-c",

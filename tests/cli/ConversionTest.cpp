@@ -173,7 +173,7 @@ std::string CountedService(const TemporaryFolder& folder) {
   return path;
 }
 
-// How many services answer so many items.
+// How many services answer this many items.
 std::size_t ServicesFor(const TemporaryFolder& folder, int items) {
   const std::string started = folder.MakeFile("started", "");
   const std::string service = CountedService(folder);
@@ -247,7 +247,7 @@ TEST_F(Conversion, ManyItemsEndInASummary) {
   EXPECT_EQ(Cli({"name", "--json", "--quiet", "-"}, input).errors, "");
 }
 
-// Of four counts each item is in one.
+// Each item is in exactly one of the four counts.
 TEST_F(Conversion, WhatFailsForBeingNewIsSummedUpAsFailed) {
   std::string input = mFile + "\n" + mHere + "/missing/x\n";
   for (int i = 0; i < 1000; ++i) input += mHere + "/new\n";
@@ -328,7 +328,7 @@ TEST_F(Conversion, ALineIsAnsweredBeforeTheNextOneIsThere) {
   EXPECT_EQ(cli.Wait(), 0);
 }
 
-// Another reader of a descriptor that does not block can have taken what poll promised.
+// With a non-blocking descriptor, another reader can take what poll(2) promised.
 TEST_F(Conversion, AnInputThatHasNothingYetIsWaitedFor) {
   ChildProgram cli("env", {"ASAN_OPTIONS=verify_asan_link_order=0", "TALLOWMERE_UNREADY_READS=3",
                            "LD_PRELOAD=" TALLOWMERE_FAULTY_INPUT, TALLOWMERE_CLI, "name", "-"});
@@ -522,7 +522,7 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
               HasSubstr("an HFS name has at most 63 bytes"));
 }
 
-// Each is a folder of "/", which an HFS path of the kernel's interface itself would not tell.
+// Its path ends with its name; the service alone gives that of the folder above.
 TEST_F(Conversion, AnInterfaceOfTheKernelHasItsOwnHFSPath) {
   const std::string root = Lines(Cli({"hfs", "/"}).text)[0];
   EXPECT_EQ(Cli({"hfs", "/proc"}).text, root + "proc:\n");
@@ -591,7 +591,7 @@ TEST_F(Conversion, AServiceThatCannotBeStartedIsSaidOnce) {
   EXPECT_EQ(output.status, 1);
 }
 
-// A service that dies of a request, the first one excepted, and is whole again after that.
+// A service that dies at its second request and works once it is started again.
 TEST_F(Conversion, AServiceThatDiesOfAnItemIsSaidOfThatItemAndTheRestIsAnswered) {
   const std::string died = mFolder.Path() / "died";
   const std::string script = mFolder.MakeFile(
@@ -677,7 +677,7 @@ TEST_F(Conversion, SettingsOfASoundAreStoredAsTheyAre) {
             "tallowmere-cli: /dev/full: it could not be written\n");
 }
 
-// Ignored, the signal of the limit leaves the write to fail as on a full disk.
+// With the limit's signal ignored, the write fails as on a full disk.
 TEST_F(Conversion, SettingsThatCannotBeStoredLeaveNoFile) {
   const std::string path = mFolder.Path() / "settings";
   ChildProgram cli("/bin/sh", {"-c", "trap '' XFSZ; ulimit -f 0; exec \"$0\" aiff --output \"$1\"",

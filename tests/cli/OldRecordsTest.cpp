@@ -94,7 +94,7 @@ TEST_F(OldRecords, OfTheOtherByteOrderAreHintedAt) {
   EXPECT_THAT(Cli({"path", "99:2:x"}).errors, Not(HasSubstr("byte order")));
 }
 
-// Foreign numbers are no sign where the volume is told, but parent ids are.
+// Where the volume is told, any number is right: the parent id gives the hint.
 TEST_F(OldRecords, OfTheOtherByteOrderAreHintedAtWhereTheirVolumeIsTold) {
   const std::string place = Place();
   const auto errorOf = [&](FSSpec record, std::endian order) {
@@ -181,7 +181,7 @@ TEST_F(OldRecords, AFileThatDoesNotEndWithARecordIsRefused) {
   for (const std::string& bytes : {one + "x", one.substr(1)}) {
     const Output output = Cli({"path", "--packed", Write("packed", bytes)});
     EXPECT_EQ(output.status, 1);
-    EXPECT_THAT(output.errors, HasSubstr("are no record of 70"));
+    EXPECT_THAT(output.errors, HasSubstr("no record of 70 bytes"));
     EXPECT_EQ(output.text, "");
   }
   EXPECT_THAT(Cli({"path", "--packed", "--skip", "9", Write("packed", "x")}).errors,
@@ -189,6 +189,24 @@ TEST_F(OldRecords, AFileThatDoesNotEndWithARecordIsRefused) {
   EXPECT_THAT(Cli({"path", "--packed", mFolder.Path().string()}).errors,
               HasSubstr("Is a directory"));
   EXPECT_EQ(Cli({"path", "--packed", "--stride", "69", "x"}).status, 2);
+  EXPECT_EQ(Cli({"path", "--packed", Write("packed", one + "x")}).errors,
+            "tallowmere-cli: " + (mFolder.Path() / "packed").string() +
+                ": its last byte is no record of 70 bytes\n");
+}
+
+TEST_F(OldRecords, OptionsOfPackedFilesAreCheckedBeforeAnythingIsRead) {
+  const auto faultOf = [](const std::vector<std::string>& options) {
+    std::vector<std::string> command{"path", "--packed", "/nonexistent"};
+    command.insert(command.end(), options.begin(), options.end());
+    const Output output = Cli(command);
+    EXPECT_EQ(output.status, 2);
+    return output.errors;
+  };
+  EXPECT_THAT(faultOf({"--skip", "-1"}), HasSubstr("--skip: -1 is no number of bytes"));
+  EXPECT_THAT(faultOf({"--stride", "1e3"}), HasSubstr("--stride: 1e3 is no number of bytes"));
+  EXPECT_THAT(faultOf({"--stride", "69"}), HasSubstr("69 is less than the 70 bytes of a record"));
+  // There are no lines for it to end.
+  EXPECT_THAT(faultOf({"--null"}), HasSubstr("excludes"));
 }
 
 TEST_F(OldRecords, OfAVolumeItselfHaveTheNameThatItHasNow) {
@@ -301,7 +319,7 @@ TEST_F(ACopiedDisk, TellsWhatItLacks) {
   EXPECT_EQ(errorOf("Old Disk:no folder:"), none + "/no folder\"");
   EXPECT_EQ(errorOf("Old Disk:top:"), none + "/top\"");
   EXPECT_EQ(errorOf("Old Disk:top:none"), none + "/top\"");
-  // As names of Linux these are other files.
+  // Linux files with these names are called otherwise in HFS terms.
   EXPECT_EQ(Posix("Old Disk:lost")["status"], "new");
   EXPECT_EQ(Posix("Old Disk:lost:item")["status"], "nothing");
 }

@@ -37,7 +37,7 @@ TEST(Records, ANameMayHoldColonsAndBeEmpty) {
   EXPECT_EQ(ReadRecord("1:2:"), (FSSpec{1, 2, ""}));
 }
 
-// As long as one in hexadecimal.
+// A text as long as a record in hexadecimal.
 TEST(Records, ATextOf140BytesIsTakenAsText) {
   std::string text = "1:2:a";
   std::string name = "a";

@@ -20,7 +20,7 @@ TEST(Services, DoNotAnswerAlikeWhereAFolderIsShownTwice) {
   EXPECT_FALSE(AllAnswerAlike("30 1 0:7 /a/b /x rw - xfs b rw\n31 1 0:7 /a /y rw - xfs b rw\n"));
 }
 
-// Each gives such a mount a free number when it first meets it.
+// Each service gives such a mount a free number when it first sees it.
 TEST(Services, DoNotAnswerAlikeAboveTheMountIDsThatAreNumbers) {
   EXPECT_TRUE(AllAnswerAlike("32768 1 0:7 / /x rw - tmpfs t rw\n"));
   EXPECT_FALSE(AllAnswerAlike("32769 1 0:7 / /x rw - tmpfs t rw\n"));

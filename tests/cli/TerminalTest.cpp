@@ -81,11 +81,11 @@ TEST_F(Terminal, LongWorkHasAProgressBarAndShortWorkHasNone) {
       "(echo /; sleep 1; echo /; sleep 0.4; echo /) | $CLI name - >/dev/null";
   EXPECT_THAT(OnATerminal(slowly), HasSubstr(" items"));
   EXPECT_THAT(OnATerminal("echo / | $CLI name - >/dev/null"), Not(HasSubstr(" items")));
-  // Not in the way of answers on the same terminal.
+  // No bar where answers go to the same terminal.
   EXPECT_THAT(OnATerminal("(echo /; sleep 1; echo /) | $CLI name -"), Not(HasSubstr(" items")));
 }
 
-// Gives answers for long enough that a bar is drawn.
+// Items that come slowly enough for a bar to be drawn.
 const std::string kSlowly = "(echo /; sleep 0.7; echo /; sleep 0.3; echo /)";
 
 // The widest line that a terminal shows, in characters.
@@ -106,7 +106,7 @@ TEST_F(Terminal, AProgressBarIsNarrowerThanTheTerminal) {
   const std::string slow = "stty cols 40; " + kSlowly + " | $CLI name - >/dev/null";
   EXPECT_THAT(OnATerminal(slow), HasSubstr(" items"));
   EXPECT_LT(Width(OnATerminal(slow)), 40u);
-  // Of arguments, a part is known to be done.
+  // The number of arguments is known, so the bar shows a percentage.
   const TemporaryFolder folder;
   const std::string service =
       folder.MakeFile("late", "#!/bin/sh\nsleep 0.7\nexec " TALLOWMERE_SERVICE " \"$@\"\n");
@@ -124,7 +124,7 @@ TEST_F(Terminal, ProgressIsNotShownToWhoDoesNotWantIt) {
   }
 }
 
-// A pager reads keys one by one: the line is its own.
+// A pager that reads keys one by one owns the terminal's last line.
 TEST_F(Terminal, ProgressIsNotShownWhileAPagerReadsTheAnswers) {
   EXPECT_EQ(
       OnATerminal(kSlowly + " | $CLI name - | (stty -icanon -echo </dev/tty; cat >/dev/null)"), "");

@@ -21,7 +21,7 @@ using testing::Each;
 
 using Text = std::optional<std::string>;
 
-// What a volume number above any is answered with, as printf has it.
+// The answer for a number that no volume has, as printf(1) writes it.
 constexpr const char* kNoSuchVolume = "\\000\\001\\000\\000MWLT";
 
 std::string PathNumbered(std::size_t i) {
@@ -37,7 +37,7 @@ Request<Text> RequestNumbered(std::size_t i) {
   return request::AddHFSName(PathNumbered(i), "x");
 }
 
-// Asks so many and gives the messages, each empty where the answer is the right one.
+// Asks that many questions. Returns a message for each, empty where the answer is right.
 std::vector<std::string> AskedIn(Batch& batch, std::size_t count) {
   std::vector<std::string> messages;
   for (std::size_t i = 0; i < count; ++i) {
@@ -153,7 +153,7 @@ TEST(Batch, AnswersThatAreLongerThanTheirRequestsComeToAnEnd) {
   EXPECT_EQ(answered, 20'000u);
 }
 
-// Adds requests of a never answering service until one of them is given up; how many that took.
+// Adds requests to a service that never answers until one is given up. Returns how many.
 std::size_t RequestsUntilFull(const Request<Text>& request) {
   const TemporaryFolder folder;
   Client client(

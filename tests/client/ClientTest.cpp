@@ -198,7 +198,7 @@ TEST(Client, TheServiceIsFoundOnTheSearchPath) {
             "the service \"tallowmere\" is neither beside this program nor on PATH");
 }
 
-// The status of a child whose root is that folder, in which nothing is beside its program.
+// The exit status of a child whose root is that folder, which holds its program alone.
 int StatusIn(const std::filesystem::path& root, const std::function<bool()>& isRight) {
   const pid_t child = fork();
   if (child == 0) _exit(chroot(root.c_str()) == 0 && isRight() ? 0 : 1);

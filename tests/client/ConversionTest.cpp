@@ -34,11 +34,11 @@ constexpr const char* kDecomposed = "e\xCC\x81";   // é
 constexpr const char* kMacRoman = "\x8E";          // é
 constexpr const char* kJapanese = "\xE6\x97\xA5";  // no letter of Mac Roman
 
-// Its value and its outcome are these.
+// Matches a conversion with this value and outcome.
 MATCHER_P2(Is, value, outcome, "") {
   return arg && arg->value == value && arg->outcome == outcome;
 }
-// It is refused with this outcome.
+// Matches a conversion that fails with this outcome.
 MATCHER_P(Fails, outcome, std::string(Name(outcome))) {
   return !arg && arg.Failure().outcome == outcome;
 }
@@ -473,7 +473,7 @@ TEST_F(Conversions, AFailedServiceIsSaid) {
 
 // --- Long HFS paths ---
 
-// A path of folders with names of that many letters below the folder.
+// Makes nested folders whose names have these numbers of letters. Returns the innermost path.
 std::string Deep(const TemporaryFolder& folder, std::size_t letters, std::size_t folders) {
   std::string path;
   for (std::size_t i = 0; i < folders; ++i) path += std::string(letters, 'x') + '/';
@@ -572,7 +572,7 @@ TEST_F(VolumeConversions, AKernelInterfaceThatIsMountedTwiceHasAnHFSPathAtEachPl
   }
 }
 
-// That of its own volume would lead to the first one of the name.
+// Its path on its own volume would lead to the first volume of that name.
 TEST_F(VolumeConversions, AFolderOfTheSecondNamesakeHasTheHFSPathOfWhereItIsShown) {
   const ScopedMount first("none", mFolder.MakeFolder("a/vol"), "tmpfs");
   const ScopedMount second("none", mFolder.MakeFolder("b/vol"), "tmpfs");

@@ -76,7 +76,7 @@ TEST(Request, ASoundIsSentInItsFourFields) {
       test::ExportSettingsRequest(0xAC440001, 0x1234, 200, "twos"));
 }
 
-// A text as long as a counted string can carry, and the services's answer to it, which lives on.
+// The longest text that a counted string can carry; the service answers it and goes on.
 TEST(Request, APathOf65534BytesIsSentAndALongerOneIsNone) {
   const std::string longest(65534, 'x');
   const std::string sent = SentDuring([&](Client& client) {

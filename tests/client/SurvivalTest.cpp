@@ -30,7 +30,7 @@ std::string FailureOfFirstRequest(const std::string& service) {
   return MessageOf(client.GetHFSVolumeName(0));
 }
 
-// Of a service that takes the request, prints this (as printf has it) and goes on reading.
+// The message of a service that takes the request, prints this (by printf(1)) and goes on reading.
 std::string FailureOfAnswer(const std::string& answer) {
   const TemporaryFolder folder;
   return FailureOfFirstRequest(
@@ -314,7 +314,7 @@ TEST(Client, OneThatTakesTheNameOfAnotherEndsTheOthersService) {
   EXPECT_FALSE(test::HasNoChild());
 }
 
-// A host with two clients, and with a child that outlives it and has what a child inherits.
+// A host with two clients, and a child that outlives it and holds what it inherited.
 TEST(Client, AHostThatIsKilledTakesItsServicesWithIt) {
   prctl(PR_SET_CHILD_SUBREAPER, 1);
   std::array<int, 2> ready{};

@@ -20,7 +20,7 @@ using test::StartClient;
 
 constexpr const char* kInUse = "this thread uses the client already";
 
-// Whether so many names come back, each asked for with a path of its own.
+// Whether this many names come back, each asked for by its own path.
 bool AnswersAreItsOwn(Client& client, const std::string& thread, int count) {
   for (int i = 0; i < count; ++i) {
     const std::string folder = "/missing " + thread + std::to_string(i);

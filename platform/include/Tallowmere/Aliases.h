@@ -9,6 +9,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace tallowmere::alias {
 
@@ -52,6 +53,10 @@ struct Description {
   std::optional<int> levelsDown;
   std::string posixPath;  // within the volume; of bookmarks from the writer's "/"
   std::string hfsPath;    // with the volume's name
+
+  // The ways to the target from its volume's root folder, by names of Linux: one for each reading
+  // of the names, none where the path is not known.
+  std::vector<std::vector<std::string>> waysOnVolume;
 
   std::string server;
   std::string user;
