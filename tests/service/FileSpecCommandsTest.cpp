@@ -82,6 +82,17 @@ TEST_F(FileSpecCommands, TheRecordOfAMissingFileIsThatOfItsFolderAndItsName) {
                                RecordResponse(1, Record(mVolume, mParent, "new"))));
 }
 
+TEST_F(FileSpecCommands, TheRecordOfAMissingFileHasNothingOfAnEarlierOne) {
+  const std::string longest(63, 'x');
+  for (std::size_t length = 1; length < longest.size(); ++length) {
+    const std::string name(length, 'y');
+    EXPECT_TRUE(mService.Answers(RecordRequest(PathTo(longest)),
+                                 RecordResponse(1, Record(mVolume, mParent, longest))));
+    EXPECT_TRUE(mService.Answers(RecordRequest(PathTo(name)),
+                                 RecordResponse(1, Record(mVolume, mParent, name))));
+  }
+}
+
 TEST_F(FileSpecCommands, TheRecordOfAMissingFileInAMissingFolderIsNotUsable) {
   EXPECT_TRUE(mService.Answers(RecordRequest(PathTo("missing/new")),
                                RecordResponse(0, Record(32767, -1, "new"))));
