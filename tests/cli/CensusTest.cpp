@@ -11,6 +11,7 @@
 #include <unistd.h>
 
 #include <cstring>
+#include <fstream>
 #include <iomanip>
 #include <sstream>
 #include <utility>
@@ -473,6 +474,10 @@ TEST(Census, WhatVanishesMeanwhileDoesNotCount) {
   EXPECT_THAT(result.text, Not(HasSubstr("victim")));
   EXPECT_THAT(result.text,
               EndsWith("2 items, 0 came back, 1 did not, 1 vanished meanwhile, 0 left out\n"));
+  std::ofstream(victim).flush();
+  ChildProgram json(TALLOWMERE_CLI, {"--service", service, "census", "--json", path});
+  EXPECT_THAT(json.ReadToEnd(), EndsWith("{\"items\":2,\"came_back\":0,\"missing\":1,"
+                                         "\"vanished\":1,\"left_out\":0}\n"));
 }
 
 TEST(Census, LeavesOutAFolderThatCanBeReadOnlyInPart) {
