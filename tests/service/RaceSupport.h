@@ -177,7 +177,7 @@ class InSmallRoot : public testing::Test {
  protected:
   void SetUp() override {
     static const bool isThere =
-        EnterSmallRoot({TALLOWMERE_SERVICE, TALLOWMERE_STOP_AT_CALLS, TALLOWMERE_COPIES_LIBRARY});
+        EnterSmallRoot({ServiceToTest(), TALLOWMERE_STOP_AT_CALLS, TALLOWMERE_COPIES_LIBRARY});
     if (!isThere) GTEST_SKIP() << "mounting is not permitted here";
   }
 };
