@@ -80,6 +80,11 @@ configure() {
   [ -f "build/$1/build.ninja" ] || cmake --preset "$1" >/dev/null
 }
 
+# run_tests PRESET [ctest's options]: two tests for each processor, as many of them wait.
+run_tests() {
+  ctest --preset "$1" -j "$(($(nproc) * 2))" "${@:2}"
+}
+
 # lint CHECKS: runs these checks of .clang-tidy on all sources but tests and fuzz targets. Starts with
 # the longest source, so that all processors finish at about the same time.
 lint() {

@@ -53,13 +53,14 @@ class FolderTest(unittest.TestCase):
 def children() -> list[int]:
     """The children of this process, also those that ended and were not waited for."""
     found = []
-    for entry in Path("/proc").glob("[0-9]*/stat"):
+    for process in filter(str.isdecimal, os.listdir("/proc")):
         try:
-            fields = entry.read_text().rpartition(")")[2].split()
+            with open(f"/proc/{process}/stat", "rb") as file:
+                fields = file.read().rpartition(b")")[2].split()
         except OSError:
             continue  # it ended meanwhile
         if int(fields[1]) == os.getpid():
-            found.append(int(entry.parent.name))
+            found.append(int(process))
     return found
 
 

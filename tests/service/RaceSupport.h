@@ -57,7 +57,7 @@ inline std::string Answer(ChildProgram& service, unsigned code, const std::strin
 
 // Services that can be stopped.
 inline const Copies& StoppedServices() {
-  static const Copies services(TALLOWMERE_SERVICE, TALLOWMERE_STOP_AT_CALLS);
+  static const Copies services(ServiceToTest(), TALLOWMERE_STOP_AT_CALLS);
   return services;
 }
 
@@ -68,7 +68,7 @@ class Bystander : public ChildProgram {
 
  private:
   static pid_t Copy(const Streams& streams) {
-    static const Copies services(TALLOWMERE_SERVICE, TALLOWMERE_COPIES_LIBRARY);
+    static const Copies services(ServiceToTest(), TALLOWMERE_COPIES_LIBRARY);
     return services.Make(streams);
   }
 };
@@ -177,7 +177,7 @@ class InSmallRoot : public testing::Test {
  protected:
   void SetUp() override {
     static const bool isThere =
-        EnterSmallRoot({TALLOWMERE_SERVICE, TALLOWMERE_STOP_AT_CALLS, TALLOWMERE_COPIES_LIBRARY});
+        EnterSmallRoot({ServiceToTest(), TALLOWMERE_STOP_AT_CALLS, TALLOWMERE_COPIES_LIBRARY});
     if (!isThere) GTEST_SKIP() << "mounting is not permitted here";
   }
 };
