@@ -3,8 +3,6 @@
 // combines what was never there at the same time.
 #include <fcntl.h>
 #include <gtest/gtest.h>
-#include <linux/loop.h>
-#include <sys/ioctl.h>
 #include <sys/mount.h>
 #include <sys/sysmacros.h>
 #include <unistd.h>
@@ -21,6 +19,7 @@
 
 #include "RaceSupport.h"
 #include "support/FileSystemImage.h"
+#include "support/LoopDevice.h"
 #include "support/MountNamespace.h"
 #include "support/TemporaryFolder.h"
 
@@ -41,34 +40,26 @@ class Disk {
     fs::resize_file(image, 32 << 20);
     if (!RunTool({"mkfs.ext4", "-q", "-F", image})) return;
     mImage = open(image.c_str(), O_RDWR | O_CLOEXEC);
-    const int control = open("/dev/loop-control", O_RDWR | O_CLOEXEC);
-    mNumber = static_cast<unsigned>(ioctl(control, LOOP_CTL_GET_FREE));
-    close(control);
-    loop_config config{};
-    config.fd = static_cast<__u32>(mImage);
-    config.info.lo_flags = LO_FLAGS_AUTOCLEAR;
-    mDevice = open(("/dev/loop" + std::to_string(mNumber)).c_str(), O_RDWR | O_CLOEXEC);
-    mIsMade = ioctl(mDevice, LOOP_CONFIGURE, &config) == 0;
+    mDevice.emplace(mImage);
   }
   Disk(const Disk&) = delete;
   Disk& operator=(const Disk&) = delete;
   ~Disk() {
-    close(mDevice);
+    if (mDevice) mDevice->Close();
     close(mImage);
   }
 
-  bool IsMade() const { return mIsMade; }
+  bool IsMade() const { return mDevice && mDevice->IsAttached(); }
   int Mount(const fs::path& place) const {
     constexpr unsigned kLoopDevices = 7;  // the kernel's Documentation/admin-guide/devices.txt
-    if (!fs::exists("/disk")) mknod("/disk", S_IFBLK | 0600, makedev(kLoopDevices, mNumber));
+    if (!fs::exists("/disk"))
+      mknod("/disk", S_IFBLK | 0600, makedev(kLoopDevices, mDevice->Number()));
     return mount("/disk", place.c_str(), "ext4", 0, "");
   }
 
  private:
   int mImage = -1;
-  unsigned mNumber = 0;
-  int mDevice = -1;
-  bool mIsMade = false;
+  std::optional<LoopDevice> mDevice;
 };
 
 enum class Changes {

@@ -4,8 +4,6 @@
 #include <dirent.h>
 #include <fcntl.h>
 #include <fuse.h>
-#include <linux/loop.h>
-#include <sys/ioctl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -15,6 +13,7 @@
 #include <vector>
 
 #include "Served.h"
+#include "support/LoopDevice.h"
 
 namespace tallowmere::soak {
 namespace {
@@ -93,13 +92,8 @@ std::string BlockDevice() {
   constexpr off_t kSize = 1 << 20;
   std::FILE* const file = std::tmpfile();
   if (file == nullptr || ftruncate(fileno(file), kSize) != 0) return "";
-  const int control = open("/dev/loop-control", O_RDWR | O_CLOEXEC);
-  const std::string device = "/dev/loop" + std::to_string(ioctl(control, LOOP_CTL_GET_FREE));
-  loop_config config{};
-  config.fd = static_cast<__u32>(fileno(file));
-  config.info.lo_flags = LO_FLAGS_AUTOCLEAR;
-  const int loop = open(device.c_str(), O_RDWR | O_CLOEXEC);
-  return ioctl(loop, LOOP_CONFIGURE, &config) == 0 ? device : "";
+  const test::LoopDevice device(fileno(file));
+  return device.IsAttached() ? device.Path() : "";
 }
 
 [[noreturn]] void Serve(const std::string& folder, const std::string& place) {

@@ -3,10 +3,8 @@
 #define FUSE_USE_VERSION 34
 #include <fcntl.h>
 #include <fuse_lowlevel.h>
-#include <linux/loop.h>
 #include <signal.h>
 #include <strings.h>
-#include <sys/ioctl.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -19,6 +17,8 @@
 #include <ctime>
 #include <thread>
 #include <vector>
+
+#include "support/LoopDevice.h"
 
 namespace tallowmere::test {
 namespace {
@@ -140,16 +140,10 @@ void ReadFolder(fuse_req_t request, fuse_ino_t folder, size_t size, off_t offset
 // Returns a block device that lasts as long as the process, or an empty string on failure.
 std::string MakeBlockDevice(const std::string& file) {
   constexpr off_t kSize = 1 << 20;
-  loop_config config{};
-  config.fd = static_cast<__u32>(open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
-  config.info.lo_flags = LO_FLAGS_AUTOCLEAR;
-  const int control = open("/dev/loop-control", O_RDWR | O_CLOEXEC);
-  const int number = ioctl(control, LOOP_CTL_GET_FREE);
-  std::string device = "/dev/loop" + std::to_string(number);
-  const int loop = open(device.c_str(), O_RDWR | O_CLOEXEC);
-  const bool isMade = ftruncate(static_cast<int>(config.fd), kSize) == 0 &&
-                      ioctl(loop, LOOP_CONFIGURE, &config) == 0;
-  return isMade ? device : "";
+  const int content = open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600);
+  if (ftruncate(content, kSize) != 0) return "";
+  const LoopDevice device(content);
+  return device.IsAttached() ? device.Path() : "";
 }
 
 [[noreturn]] void Serve(const std::string& place, NumberedFileSystem::On on) {
