@@ -21,6 +21,7 @@ constexpr long kNanosecondsInASecond = 1'000'000'000;
 std::chrono::nanoseconds later{0};
 bool isUntyped = false;
 std::function<void(int)> beforeEntries;
+std::function<void(const char*)> beforeOpenat2;
 int openat2Error = 0;
 std::uint32_t fuseType = 0;
 
@@ -74,6 +75,9 @@ extern "C" long syscall(long number, ...) noexcept {
   va_start(arguments, number);
   for (long& argument : given) argument = va_arg(arguments, long);
   va_end(arguments);
+  if (number == SYS_openat2 && beforeOpenat2) {
+    beforeOpenat2(reinterpret_cast<const char*>(given[1]));
+  }
   return real(number, given[0], given[1], given[2], given[3], given[4], given[5]);
 }
 
@@ -111,6 +115,14 @@ RefusedOpenat2::RefusedOpenat2(int error) {
 
 RefusedOpenat2::~RefusedOpenat2() {
   openat2Error = 0;
+}
+
+BeforeOpenat2::BeforeOpenat2(std::function<void(const char*)> happens) {
+  beforeOpenat2 = std::move(happens);
+}
+
+BeforeOpenat2::~BeforeOpenat2() {
+  beforeOpenat2 = nullptr;
 }
 
 BeforeEntries::BeforeEntries(std::function<void(int)> happens) {

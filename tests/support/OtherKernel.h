@@ -45,6 +45,15 @@ class RefusedOpenat2 {
   ~RefusedOpenat2();
 };
 
+// Does something whenever openat2 is about to open this path.
+class BeforeOpenat2 {
+ public:
+  explicit BeforeOpenat2(std::function<void(const char* path)> happens);
+  BeforeOpenat2(const BeforeOpenat2&) = delete;
+  BeforeOpenat2& operator=(const BeforeOpenat2&) = delete;
+  ~BeforeOpenat2();
+};
+
 // Does something whenever entries of a folder are about to be read: getdents64 of this descriptor.
 class BeforeEntries {
  public:

@@ -9,6 +9,7 @@
 
 #include "platform/HostCalls.h"
 #include "support/FileSystemImage.h"
+#include "support/OtherKernel.h"
 #include "support/OwnMountNamespace.h"
 #include "support/Privileges.h"
 #include "support/TemporaryFolder.h"
@@ -67,6 +68,26 @@ TEST_F(TheCatalog, FindsWhatMovesInAFolderWhoseNameMeansItsParentInAUrl) {
   EXPECT_EQ(FindFolder(id), volume / "a/%2E%2E/c");
   std::filesystem::rename(volume / "a/%2E%2E", volume / "a/%2e");
   EXPECT_EQ(FindFolder(id), volume / "a/%2e/c");
+}
+
+TEST_F(TheCatalog, FindsWhatMovesBetweenThePassThatMeetsItAndTheLastLook) {
+  for (int i = 0; i < 20; ++i) Make("filler/" + std::to_string(i));
+  const std::string before = Make("a/folder");
+  const std::string after = Make("b") + "/folder";
+  for (const char* const name : {"/a", "/a/folder", "/b"}) {
+    std::filesystem::permissions(Top() + name, std::filesystem::perms(0777));
+  }
+  const auto id = static_cast<std::uint32_t>(InodeOf(before));
+  // Without privilege, as with it a handle finds the folder and no pass is made.
+  EXPECT_TRUE(HoldsForNobody([&] {
+    bool hasMoved = false;
+    const BeforeOpenat2 looks([&](const char* path) {
+      if (hasMoved || path != before) return;
+      hasMoved = true;
+      std::filesystem::rename(before, after);
+    });
+    return FindFolder(id) == after && hasMoved;
+  }));
 }
 
 TEST_F(TheCatalog, DoesNotTakeAFileForAFolder) {
