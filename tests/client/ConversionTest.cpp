@@ -1,4 +1,5 @@
 // What conversions answer, and what they refuse that the raw requests answer.
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/mount.h>
@@ -57,16 +58,20 @@ class Conversions : public testing::Test {
     record.name = name;
     return record;
   }
-  // The id of a folder that has been removed.
+  // The id of a folder that has been removed. It is held open, so that no other gets the id.
   std::int32_t LostFolder() {
-    mFolder.MakeFolder("lost");
+    mLost = open(mFolder.MakeFolder("lost").c_str(), O_PATH | O_CLOEXEC);
     const auto id = RawRecordOf(In("lost/x")).parID;
     rmdir(In("lost").c_str());
     return id;
   }
+  void TearDown() override {
+    if (mLost >= 0) close(mLost);
+  }
 
   TemporaryFolder mFolder;
   Client mClient = StartClient();
+  int mLost = -1;
 };
 
 // --- What is there ---
