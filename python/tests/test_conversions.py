@@ -223,6 +223,8 @@ class Nothing(ConversionTest):
         spec = self.client.record_of(self.make("f")).value
         gone = self.client.record_of(self.make_folder("gone")).value
         inside = self.client.record_of(self.make("gone", "f")).value
+        # Held open, so that no other folder gets its id.
+        self.addCleanup(os.close, os.open(self.path("gone"), os.O_PATH))
         os.remove(self.path("gone", "f"))
         os.rmdir(self.path("gone"))
         self.assertEqual(self.client.path_of(gone).outcome, Outcome.NEW)
