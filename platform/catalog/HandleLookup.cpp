@@ -29,8 +29,11 @@ class Questions {
     const auto item = kernel::OpenByHandle(mRoot->Get(), handle);
     if (!item) return item.Error().number == ESTALE ? Reply::kGone : Reply::kUnknown;
     const auto status = kernel::ReadStatus(kernel::AtOpen(item->Get()));
+    if (!status) return Reply::kUnknown;
+    // It has no name any more, and keeps its number for as long as somebody has it open.
+    if (status->links == 0) return Reply::kGone;
     const auto path = kernel::PathOfDescriptor(*item);
-    if (!status || !path) return Reply::kUnknown;
+    if (!path) return Reply::kUnknown;
     opened.push_back({*path, status->item});
     return Reply::kOpened;
   }

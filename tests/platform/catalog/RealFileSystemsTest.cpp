@@ -401,7 +401,13 @@ TEST_F(ARealFileSystem, Ext4IsNotSearchedByAPrivilegedProcess) {
   const FSSpec present = SpecOf(top + "/folder 3/below/deeper");
   const FSSpec missing = MakeRecord(present.vRefNum, 0x1000, "x");
   const FSSpec inAFile = MakeRecord(present.vRefNum, IDOf(top + "/folder 3/below/file"), "x");
-  for (const FSSpec& spec : {present, missing, inAFile}) {
+  // Removed, but still open.
+  const std::string gone = top + "/gone";
+  ASSERT_EQ(mkdir(gone.c_str(), 0755), 0);
+  const kernel::Descriptor held(open(gone.c_str(), O_PATH | O_CLOEXEC));
+  const FSSpec inWhatIsGone = MakeRecord(present.vRefNum, IDOf(gone), "x");
+  ASSERT_EQ(rmdir(gone.c_str()), 0);
+  for (const FSSpec& spec : {present, missing, inAFile, inWhatIsGone}) {
     const std::string calls = CallsOfResolving(spec);
     EXPECT_NE(calls.find("open_by_handle_at"), std::string::npos) << calls;
     EXPECT_EQ(calls.find("getdents64"), std::string::npos) << calls;
