@@ -3,12 +3,12 @@
 #include "cli/Commands.h"
 #include "cli/Conversion.h"
 #include "cli/Records.h"
+#include "cli/Text.h"
 
 namespace tallowmere::cli {
 namespace {
 
 constexpr const char* kPathKey = "path";
-constexpr const char* kNotMacRoman = "it has a character that HFS names cannot have";
 
 // The handler that writes down what `answer` makes of the conversion's value, or why there is none.
 template <class Value, class Answer>
@@ -37,8 +37,8 @@ auto TellHFSText(const Findings& findings, const std::string& item, Finding& fin
       });
 }
 
-Finding Invalid(const Findings& findings, const std::string& item, const char* reason) {
-  return findings.Failure(item, {Outcome::kInvalid, reason});
+Finding Invalid(const Findings& findings, const std::string& item, std::string reason) {
+  return findings.Failure(item, {Outcome::kInvalid, std::move(reason)});
 }
 
 }  // namespace
@@ -77,7 +77,7 @@ int PrintPathsOfNames(const ItemsToAsk& items, const std::string& folder) {
   return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
     const auto name = HFSNameOfUtf8(item);
     if (!name) {
-      finding = Invalid(findings, item, kNotMacRoman);
+      finding = Invalid(findings, item, WhyNotHFSNames(item));
     } else {
       converter.PathInFolder(folder, *name, TellPath(findings, item, finding));
     }

@@ -11,6 +11,7 @@
 #include "cli/CopiedVolumes.h"
 #include "cli/Output.h"
 #include "cli/Records.h"
+#include "cli/Text.h"
 
 namespace tallowmere::cli {
 namespace {
@@ -19,7 +20,6 @@ constexpr const char* kNoRecord =
     "a record is volume:parent:name, the name of at most 63 Mac Roman characters, or its 70 bytes "
     "in hexadecimal or base64";
 constexpr const char* kNoPackedRecord = "the length of its name is above 63";
-constexpr const char* kNotMacRoman = "it has a character that HFS names cannot have";
 
 // How an item was found; the values of "by" in JSON.
 constexpr const char* kByID = "id";
@@ -134,7 +134,7 @@ int PrintPathsOfHFSPaths(const ItemsToAsk& items, const OldPlaces& places) {
   return Convert(items, [&](Converter& converter, const std::string& item, Finding& finding) {
     const auto hfsPath = HFSNameOfUtf8(item);
     if (!hfsPath) {
-      finding = FindingOf(findings, item, Error{Outcome::kInvalid, kNotMacRoman}, kByPath);
+      finding = FindingOf(findings, item, Error{Outcome::kInvalid, WhyNotHFSNames(item)}, kByPath);
     } else if (const auto inCopy = copies->PathOfHFSPath(*hfsPath)) {
       finding = FindingOf(findings, item, *inCopy, kByMap);
     } else {

@@ -63,6 +63,11 @@ std::string Utf8OfAnyBytes(std::string_view bytes) {
   return text::FileNameOfText(text).value_or("");
 }
 
+std::string WhyNotHFSNames(std::string_view text) {
+  if (Utf8OfAnyBytes(text) != text) return "it is not UTF-8";
+  return "it has a character that HFS names cannot have";
+}
+
 std::size_t CharacterCount(std::string_view text) {
   const auto begins = [](char c) { return (static_cast<unsigned char>(c) & 0xC0) != 0x80; };
   return static_cast<std::size_t>(std::count_if(text.begin(), text.end(), begins));

@@ -17,6 +17,9 @@ std::string Shortened(std::string_view text);
 // The text with U+FFFD for each byte that is not UTF-8.
 std::string Utf8OfAnyBytes(std::string_view bytes);
 
+// Why a text cannot stand for HFS names, for a message.
+std::string WhyNotHFSNames(std::string_view text);
+
 // The number of characters in a UTF-8 text.
 std::size_t CharacterCount(std::string_view text);
 

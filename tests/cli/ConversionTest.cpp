@@ -518,6 +518,8 @@ TEST_F(Conversion, EachFailureIsOneSentenceAndTheRestIsAnswered) {
   EXPECT_EQ(errorsOf({"append", mHere, ".."}), prefix + "no item has the HFS name \"..\"\n");
   EXPECT_EQ(errorsOf({"append", mHere, "\xE6\x97\xA5"}),
             prefix + "\xE6\x97\xA5: it has a character that HFS names cannot have\n");
+  EXPECT_EQ(errorsOf({"append", mHere, "caf\x8E"}), prefix + "caf\\216: it is not UTF-8\n");
+  EXPECT_EQ(errorsOf({"posix", "Root:caf\x8E"}), prefix + "Root:caf\\216: it is not UTF-8\n");
   EXPECT_THAT(errorsOf({"append", mHere, std::string(256, 'x')}),
               HasSubstr("an HFS name has at most 63 bytes"));
 }

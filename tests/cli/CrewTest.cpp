@@ -2,9 +2,13 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <chrono>
+#include <mutex>
 #include <numeric>
 #include <set>
 #include <stdexcept>
+#include <thread>
+#include <vector>
 
 #include "cli/Crew.h"
 
@@ -14,15 +18,11 @@ namespace {
 using testing::ElementsAre;
 
 // Hands over twice each number, after less work for greater ones.
-std::vector<int> Doubled(std::size_t threads, int numbers,
-                         std::set<std::thread::id>* workers = nullptr) {
+std::vector<int> Doubled(std::size_t threads, int numbers) {
   std::vector<int> doubled;
-  std::mutex mutex;
-  const auto work = [&](int& number) {
+  const auto work = [](int& number) {
     std::this_thread::sleep_for(std::chrono::microseconds(number % 2 == 0 ? 500 : 0));
     number *= 2;
-    const std::lock_guard lock(mutex);
-    if (workers != nullptr) workers->insert(std::this_thread::get_id());
   };
   Crew<int> crew([threads] { return threads; }, [&] { return work; },
                  [&](int number) { doubled.push_back(number); });
@@ -39,9 +39,26 @@ TEST(Crew, HandsOverInTheOrderOfGiving) {
 }
 
 TEST(Crew, WorksWithAsManyThreadsAsItMayForMuchWorkAndWithOneForLittle) {
-  for (const auto& [numbers, expected] : {std::pair(100, 3U), {1, 1U}, {2, 1U}}) {
+  constexpr std::size_t kThreads = 3;
+  for (const auto& [numbers, expected] : {std::pair(100, kThreads), {1, 1U}, {2, 1U}}) {
+    std::mutex mutex;
     std::set<std::thread::id> workers;
-    Doubled(3, numbers, &workers);
+    const auto areAllAtWork = [&, most = expected] {
+      const std::lock_guard lock(mutex);
+      workers.insert(std::this_thread::get_id());
+      return workers.size() >= most;
+    };
+    // Each keeps its first piece until the others have theirs, for ten seconds at most.
+    const auto work = [&](int&) {
+      for (int i = 0; i < 1000 && !areAllAtWork(); ++i) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(10));
+      }
+    };
+    {
+      Crew<int> crew([] { return kThreads; }, [&] { return work; }, [](int) {});
+      for (int i = 0; i < numbers; ++i) crew.Give(i);
+      crew.Finish();
+    }
     EXPECT_EQ(workers.size(), expected) << numbers;
   }
 }
