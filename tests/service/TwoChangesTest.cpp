@@ -234,7 +234,8 @@ class RacesOfTwoChanges
   // Returns how many changes happened during the request. The bystander has seen the volume at each
   // of its places, but is only asked while nothing changes.
   int Race(const MovingVolume& volume, Bystander& bystander, int call, int between) const {
-    const auto [changes, code, knowledge] = GetParam();
+    const unsigned code = std::get<1>(GetParam());
+    const Knowledge knowledge = std::get<2>(GetParam());
     const Item item = ItemAt(bystander, volume.Path());
     const std::string request = RequestAbout(item, code);
     StoppedService service(StoppedServices());

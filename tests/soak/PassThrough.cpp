@@ -75,7 +75,7 @@ int ReadFolder(const char* path, void* buffer, fuse_fill_dir_t add, off_t, fuse_
   while (const dirent* const entry = readdir(folder)) {
     struct stat about {};
     about.st_ino = served.oneNumber ? kOneNumber : entry->d_ino;
-    about.st_mode = DTTOIF(entry->d_type);
+    about.st_mode = static_cast<mode_t>(DTTOIF(entry->d_type));
     add(buffer, entry->d_name, &about, 0, fuse_fill_dir_flags{});
   }
   closedir(folder);
