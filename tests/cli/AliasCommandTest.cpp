@@ -144,13 +144,18 @@ TEST(AliasCommand, GoesTheKernelsWayToAFile) {
   EXPECT_EQ(JsonOf(folder.Path() / "link/../record")["id"], 42);
 }
 
+// Makes an alias file that leads to "file" in the same folder, and returns its path.
+std::string MakeAliasOfFile(const TemporaryFolder& folder) {
+  RecordToWrite record = Record();
+  record.levelsUp = record.levelsDown = 1;
+  folder.MakeFile("._alias", WriteSidecarOfAlias(Write(record)));
+  return folder.MakeFile("alias");
+}
+
 TEST(AliasCommand, TellsWhereAnAliasFileLeads) {
   const TemporaryFolder folder;
   const std::string target = folder.MakeFile("file");
-  RecordToWrite record = Record();
-  record.levelsUp = record.levelsDown = 1;
-  const std::string alias = folder.MakeFile("alias");
-  folder.MakeFile("._alias", WriteSidecarOfAlias(Write(record)));
+  const std::string alias = MakeAliasOfFile(folder);
   const json shown = JsonOf(alias);
   EXPECT_EQ(shown["container"], "alias file");
   EXPECT_EQ(shown["exists"], true);
@@ -232,10 +237,7 @@ TEST(AliasCommand, HasTrueBytesInJsonWhereTheyAreNoUtf8) {
 TEST(AliasCommand, WithTargetPrintsALineForEachItem) {
   const TemporaryFolder folder;
   const std::string target = folder.MakeFile("file");
-  RecordToWrite record = Record();
-  record.levelsUp = record.levelsDown = 1;
-  const std::string alias = folder.MakeFile("alias");
-  folder.MakeFile("._alias", WriteSidecarOfAlias(Write(record)));
+  const std::string alias = MakeAliasOfFile(folder);
   const std::string lost = folder.MakeFile("lost", Write(Record()));
   const Printed shown = RunAlias({"--target", lost, alias, folder.Path() / "none"});
   EXPECT_EQ(shown.output, "\n" + target + "\n\n");
